@@ -1,0 +1,29 @@
+# Compiler settings that every target of the project shares: link `vyra::options` privately.
+option(VYRA_WARNINGS_AS_ERRORS "Treat compiler warnings as errors" OFF)
+option(VYRA_COVERAGE "Instrument for line and branch coverage" OFF)
+set(VYRA_SANITIZE "" CACHE STRING "Sanitizers to build with, as -fsanitize takes them")
+
+add_library(vyra_options INTERFACE)
+add_library(vyra::options ALIAS vyra_options)
+target_compile_features(vyra_options INTERFACE cxx_std_20)
+target_compile_options(vyra_options INTERFACE
+    -Wall -Wextra -Wpedantic -Wshadow -Wconversion
+    $<$<BOOL:${VYRA_WARNINGS_AS_ERRORS}>:-Werror>)
+# Version 1.2 of the OpenCL interface is the one the library is written against.
+target_compile_definitions(vyra_options INTERFACE
+    CL_TARGET_OPENCL_VERSION=120 CL_USE_DEPRECATED_OPENCL_1_1_APIS)
+
+if(VYRA_SANITIZE)
+    add_compile_options(-fsanitize=${VYRA_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
+    add_link_options(-fsanitize=${VYRA_SANITIZE})
+endif()
+if(VYRA_COVERAGE)
+    add_compile_options(--coverage)
+    add_link_options(--coverage)
+endif()
+
+find_program(VYRA_CCACHE ccache)
+if(VYRA_CCACHE AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
+    set(CMAKE_C_COMPILER_LAUNCHER ${VYRA_CCACHE})
+    set(CMAKE_CXX_COMPILER_LAUNCHER ${VYRA_CCACHE})
+endif()
