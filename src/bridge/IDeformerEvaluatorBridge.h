@@ -1,0 +1,37 @@
+// Where the modules of the host find the deformer evaluator.
+#pragma once
+
+#include "VyraOpenCLExport.h"
+
+namespace em {
+class Id;
+}
+
+// The interface of the deformer evaluator.
+class VYRA_OPENCL_API IDeformerEvaluatorBridgeAPI {
+public:
+    IDeformerEvaluatorBridgeAPI();
+    IDeformerEvaluatorBridgeAPI(const IDeformerEvaluatorBridgeAPI& other);
+    IDeformerEvaluatorBridgeAPI& operator=(const IDeformerEvaluatorBridgeAPI& other);
+    virtual ~IDeformerEvaluatorBridgeAPI();
+
+    // Runs the deformers of evaluation `id`.
+    virtual void evaluate(const em::Id& id) = 0;
+};
+
+// The one place in the process where an evaluator is published. The object is borrowed: its publisher keeps
+// it alive while it is published and withdraws it with setAPI(nullptr). Nothing is locked; callers order
+// publishing and reading.
+class VYRA_OPENCL_API IDeformerEvaluatorBridge {
+public:
+    IDeformerEvaluatorBridge& operator=(const IDeformerEvaluatorBridge& other);
+    IDeformerEvaluatorBridge& operator=(IDeformerEvaluatorBridge&& other) noexcept;
+
+    // The published object, or null.
+    static IDeformerEvaluatorBridgeAPI* getAPI();
+    // Publishes `api`, or withdraws with null. The object published before is not told.
+    static void setAPI(IDeformerEvaluatorBridgeAPI* api);
+
+private:
+    static IDeformerEvaluatorBridgeAPI* sfAPI;
+};

@@ -1,0 +1,62 @@
+// What a data buffer holds.
+#pragma once
+
+#include "VyraOpenCLExport.h"
+#include "host/Tplug.h"
+#include "host/TuniqueString.h"
+
+// Describes the contents of a device buffer: the name of the data, the plug that it belongs to, how many
+// elements of how many bytes, the size of the memory, and whether the memory may be written.
+//
+//      |<-------------- capacityInBytes --------------->|
+//      | element 0 | element 1 | ... | element count-1 |  slack  |
+//      |<- size -->|
+//
+// The bytes asked for are element size times element count, a 32-bit product; the capacity is recorded on
+// its own and may differ. A plain value: one object is not written by one thread while another uses it.
+class VYRA_OPENCL_API TopenCLDataBufferDescriptor {
+public:
+    // Any value may be stored: 0 is read-only, everything else is read-write.
+    enum Tpermissions : int {
+        kReadOnly = 0,
+        kReadWrite = 1,
+    };
+
+    // The empty name, the null plug, sizes 0, read-write.
+    TopenCLDataBufferDescriptor();
+
+    // Sizes and capacity in bytes.
+    TopenCLDataBufferDescriptor(const Tplug& plug, const TuniqueString& name, Tpermissions permissions,
+                                unsigned int elementSizeInBytes, unsigned int elementCount,
+                                unsigned int capacityInBytes);
+
+    // The description of an output that is derived from `other`: name and layout are kept, the plug is
+    // the output's, and the permissions are folded to kReadOnly or kReadWrite.
+    TopenCLDataBufferDescriptor(const Tplug& plug, const TopenCLDataBufferDescriptor& other);
+
+    const TuniqueString& name() const { return fName; }
+    const Tplug& plug() const { return fPlug; }
+    unsigned int elementSizeInBytes() const { return fElementSizeInBytes; }
+    unsigned int elementCount() const { return fElementCount; }
+    unsigned int capacityInBytes() const { return fCapacityInBytes; }
+    bool isReadOnly() const { return fPermissions == kReadOnly; }
+    bool hasEmptyName();
+
+    // Each stores its argument unchanged.
+    void setName(const TuniqueString& name) { fName = name; }
+    void setPlug(const Tplug& plug) { fPlug = plug; }
+    void setPermissions(Tpermissions permissions) { fPermissions = permissions; }
+    void setElementSizeInBytes(unsigned int size) { fElementSizeInBytes = size; }
+    void setElementCount(unsigned int count) { fElementCount = count; }
+    void setCapacityInBytes(unsigned int capacity) { fCapacityInBytes = capacity; }
+
+private:
+    static const TuniqueString sfEmptyName;
+
+    TuniqueString fName;
+    Tplug fPlug;
+    unsigned int fElementSizeInBytes = 0;
+    unsigned int fElementCount = 0;
+    unsigned int fCapacityInBytes = 0;
+    Tpermissions fPermissions = kReadWrite;
+};

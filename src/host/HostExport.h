@@ -1,0 +1,12 @@
+// The export macro of the host's interfaces.
+#pragma once
+
+#if defined(_WIN32)
+#if defined(VYRA_HOST_BUILDING)
+#define VYRA_HOST_API __declspec(dllexport)
+#else
+#define VYRA_HOST_API __declspec(dllimport)
+#endif
+#else
+#define VYRA_HOST_API __attribute__((visibility("default")))
+#endif
