@@ -19,9 +19,9 @@ public:
     virtual void evaluate(const em::Id& id) = 0;
 };
 
-// The one place in the process where an evaluator is published. The object is borrowed: its publisher keeps
-// it alive while it is published and withdraws it with setAPI(nullptr). Nothing is locked; callers order
-// publishing and reading.
+// The one place in the process where an evaluator is published. The object is borrowed: its
+// publisher keeps it alive while it is published and withdraws it with setAPI(nullptr). Nothing is
+// locked; callers order publishing and reading.
 class VYRA_OPENCL_API IDeformerEvaluatorBridge {
 public:
     IDeformerEvaluatorBridge& operator=(const IDeformerEvaluatorBridge& other);

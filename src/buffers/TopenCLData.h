@@ -15,24 +15,27 @@
 
 // A concurrent map from a data name and a plug to a data buffer.
 //
-// setData, getData, getSinglePlug, empty and iteration may run at the same time; iteration may or may not
-// see what is inserted meanwhile. Writing a key that is present is a plain assignment: give each key one
-// writer at a time and no reader meanwhile. Copying, assigning and destroying need the maps to themselves.
-// Entries are never removed one by one, so a reference to a stored buffer stays valid until the map is
-// assigned to or destroyed. Running out of memory raises std::bad_alloc and keeps what was there.
+// setData, getData, getSinglePlug, empty and iteration may run at the same time; iteration may or
+// may not see what is inserted meanwhile. Writing a key that is present is a plain assignment: give
+// each key one writer at a time and no reader meanwhile. Copying, assigning and destroying need the
+// maps to themselves. Entries are never removed one by one, so a reference to a stored buffer stays
+// valid until the map is assigned to or destroyed. Running out of memory raises std::bad_alloc and
+// keeps what was there.
 class VYRA_OPENCL_API TopenCLData {
 public:
     using Key = std::pair<TuniqueString, Tplug>;
 
-    // With h the plug's hash and n the name's: h xor (F(n) + 0x9e3779b9 + (h << 6) + (h >> 2)) in 64-bit
-    // arithmetic that wraps. F is the 64-bit FNV-1a hash of the eight bytes of n, least significant first;
-    // the rest is the usual combination of two hashes with the golden ratio's bits.
+    // With h the plug's hash and n the name's: h xor (F(n) + 0x9e3779b9 + (h << 6) + (h >> 2)) in
+    // 64-bit arithmetic that wraps. F is the 64-bit FNV-1a hash of the eight bytes of n, least
+    // significant first; the rest is the usual combination of two hashes with the golden ratio's
+    // bits.
     struct KeyHash {
         std::size_t operator()(const Key& key) const;
     };
 
-    using Map = tbb::concurrent_unordered_map<Key, TopenCLDataBuffer, KeyHash, std::equal_to<Key>,
-                                              tbb::tbb_allocator<std::pair<const Key, TopenCLDataBuffer>>>;
+    using Map =
+        tbb::concurrent_unordered_map<Key, TopenCLDataBuffer, KeyHash, std::equal_to<Key>,
+                                      tbb::tbb_allocator<std::pair<const Key, TopenCLDataBuffer>>>;
     using iterator = Map::iterator;
     using const_iterator = Map::const_iterator;
 

@@ -8,9 +8,9 @@
 // One memory object, the event that says when its contents are ready, and what it holds.
 //
 // Copies share the memory object and the event, each with references of its own; the last one to go
-// releases them. A plain value: one object is not written by one thread while another uses it, distinct
-// copies may be used on different threads. A retain or release that fails is reported as a warning, and
-// the value changes all the same.
+// releases them. A plain value: one object is not written by one thread while another uses it,
+// distinct copies may be used on different threads. A retain or release that fails is reported as a
+// warning, and the value changes all the same.
 class VYRA_OPENCL_API TopenCLDataBuffer {
 public:
     // Empty handles and a default descriptor: what look-ups return when they find nothing.
@@ -19,8 +19,8 @@ public:
     TopenCLDataBuffer();
     explicit TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor);
     // Shares both handles; the descriptor is taken whole, its capacity included.
-    TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor, const AutoCLObject<cl_mem>& buffer,
-                      const AutoCLObject<cl_event>& readyEvent);
+    TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor,
+                      const AutoCLObject<cl_mem>& buffer, const AutoCLObject<cl_event>& readyEvent);
     TopenCLDataBuffer(const Tplug& plug, const TuniqueString& name,
                       TopenCLDataBufferDescriptor::Tpermissions permissions,
                       unsigned int elementSizeInBytes, unsigned int elementCount,

@@ -5,15 +5,16 @@
 #include "host/Tplug.h"
 #include "host/TuniqueString.h"
 
-// Describes the contents of a device buffer: the name of the data, the plug that it belongs to, how many
-// elements of how many bytes, the size of the memory, and whether the memory may be written.
+// Describes the contents of a device buffer: the name of the data, the plug that it belongs to, how
+// many elements of how many bytes, the size of the memory, and whether the memory may be written.
 //
 //      |<-------------- capacityInBytes --------------->|
 //      | element 0 | element 1 | ... | element count-1 |  slack  |
 //      |<- size -->|
 //
-// The bytes asked for are element size times element count, a 32-bit product; the capacity is recorded on
-// its own and may differ. A plain value: one object is not written by one thread while another uses it.
+// The bytes asked for are element size times element count, a 32-bit product; the capacity is
+// recorded on its own and may differ. A plain value: one object is not written by one thread while
+// another uses it.
 class VYRA_OPENCL_API TopenCLDataBufferDescriptor {
 public:
     // Any value may be stored: 0 is read-only, everything else is read-write.
@@ -26,12 +27,12 @@ public:
     TopenCLDataBufferDescriptor();
 
     // Sizes and capacity in bytes.
-    TopenCLDataBufferDescriptor(const Tplug& plug, const TuniqueString& name, Tpermissions permissions,
-                                unsigned int elementSizeInBytes, unsigned int elementCount,
-                                unsigned int capacityInBytes);
+    TopenCLDataBufferDescriptor(const Tplug& plug, const TuniqueString& name,
+                                Tpermissions permissions, unsigned int elementSizeInBytes,
+                                unsigned int elementCount, unsigned int capacityInBytes);
 
-    // The description of an output that is derived from `other`: name and layout are kept, the plug is
-    // the output's, and the permissions are folded to kReadOnly or kReadWrite.
+    // The description of an output that is derived from `other`: name and layout are kept, the plug
+    // is the output's, and the permissions are folded to kReadOnly or kReadWrite.
     TopenCLDataBufferDescriptor(const Tplug& plug, const TopenCLDataBufferDescriptor& other);
 
     const TuniqueString& name() const { return fName; }

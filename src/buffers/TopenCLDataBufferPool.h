@@ -11,13 +11,13 @@ class TopenCLData;
 
 // Hands out data buffers and takes all of them back at once. Memory is freed only with the pool.
 //
-// The pool keeps a copy of every buffer that it hands out, with references of its own; what the caller
-// later does to its copy does not reach the pool's. The ready event that a buffer had when it was handed
-// out comes along with the memory's next user.
+// The pool keeps a copy of every buffer that it hands out, with references of its own; what the
+// caller later does to its copy does not reach the pool's. The ready event that a buffer had when
+// it was handed out comes along with the memory's next user.
 //
-// createBuffer, createOutputBuffer and releaseBuffers may be called from any thread. collectDataForPlug
-// takes no lock and must not overlap with them on the same pool. OpenCL failures do not throw. Needs
-// TopenCLInfo::initialize to have run.
+// createBuffer, createOutputBuffer and releaseBuffers may be called from any thread.
+// collectDataForPlug takes no lock and must not overlap with them on the same pool. OpenCL failures
+// do not throw. Needs TopenCLInfo::initialize to have run.
 class VYRA_OPENCL_API TopenCLDataBufferPool {
 public:
     TopenCLDataBufferPool();
@@ -26,14 +26,15 @@ public:
     TopenCLDataBufferPool(const TopenCLDataBufferPool&) = delete;
     TopenCLDataBufferPool& operator=(const TopenCLDataBufferPool&) = delete;
 
-    // A buffer of at least element size times element count bytes (a 32-bit product): the free one that
-    // fits best, the first of equals, else new memory of exactly that size. The buffer records the size of
-    // its memory as capacity. When the memory cannot be created the result has no memory: test buffer().
+    // A buffer of at least element size times element count bytes (a 32-bit product): the free one
+    // that fits best, the first of equals, else new memory of exactly that size. The buffer records
+    // the size of its memory as capacity. When the memory cannot be created the result has no
+    // memory: test buffer().
     TopenCLDataBuffer createBuffer(const TopenCLDataBufferDescriptor& descriptor);
     TopenCLDataBuffer createBuffer(const TopenCLDataBuffer& buffer);
 
-    // The output of a deformer for `plug`: the memory of `input` itself where that may be written (nothing
-    // is recorded then), else a writable buffer of the same name and layout from the pool.
+    // The output of a deformer for `plug`: the memory of `input` itself where that may be written
+    // (nothing is recorded then), else a writable buffer of the same name and layout from the pool.
     TopenCLDataBuffer createOutputBuffer(const TopenCLDataBuffer& input, const Tplug& plug);
 
     // Makes every buffer handed out so far free for reuse, though callers may still hold copies.

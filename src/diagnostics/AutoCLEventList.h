@@ -10,9 +10,10 @@ class TopenCLBuffer;
 
 // An array of events for the wait-list arguments of an enqueue call: `list.size(), list.array()`.
 //
-// The list borrows: the holders that it is filled from must stay alive, and keep their handles, for as
-// long as it is used. Events keep the order of addition; one that is added twice is held twice. One list
-// belongs to one thread at a time. Running out of memory raises std::bad_alloc and changes nothing.
+// The list borrows: the holders that it is filled from must stay alive, and keep their handles, for
+// as long as it is used. Events keep the order of addition; one that is added twice is held twice.
+// One list belongs to one thread at a time. Running out of memory raises std::bad_alloc and changes
+// nothing.
 class VYRA_OPENCL_API AutoCLEventList {
 public:
     AutoCLEventList();

@@ -35,7 +35,10 @@ public:
             retainCLObject(fHandle);
     }
 
-    AutoCLObject(AutoCLObject&& other) noexcept : fHandle(other.fHandle) { other.fHandle = nullptr; }
+    AutoCLObject(AutoCLObject&& other) noexcept : fHandle(other.fHandle)
+    {
+        other.fHandle = nullptr;
+    }
 
     ~AutoCLObject()
     {
@@ -65,8 +68,8 @@ public:
         return *this;
     }
 
-    // Takes over the reference that the caller owns to `handle`, such as the one that a create function
-    // returns; null empties the holder. Does nothing when it is the handle held already.
+    // Takes over the reference that the caller owns to `handle`, such as the one that a create
+    // function returns; null empties the holder. Does nothing when it is the handle held already.
     void adopt(T handle)
     {
         if (handle == fHandle)

@@ -3,9 +3,10 @@
 
 #include <CL/cl.h>
 
-// How a report ends: the runtime's set-up ends its reports with a line break, everything else does not.
+// How a report ends: the runtime's set-up ends its reports with a line break, everything else does
+// not.
 enum class CLReportStyle { kPlain, kSetUp };
 
-// Reports a `status` other than CL_SUCCESS as a warning with the code's name. Returns whether `status`
-// is CL_SUCCESS, so that a step can stop on it; ignoring the result means going on.
+// Reports a `status` other than CL_SUCCESS as a warning with the code's name. Returns whether
+// `status` is CL_SUCCESS, so that a step can stop on it; ignoring the result means going on.
 bool succeeded(cl_int status, CLReportStyle style = CLReportStyle::kPlain);

@@ -14,8 +14,8 @@ public:
     // `name` is borrowed and must outlive the object.
     explicit TenvironmentVariable(const char* name);
 
-    // The value as a decimal integer; `defaultValue` when the variable is not set, is not an integer
-    // or does not fit 32 bits.
+    // The value as a decimal integer; `defaultValue` when the variable is not set, is not an
+    // integer or does not fit 32 bits.
     std::int32_t asInt32(std::int32_t defaultValue) const;
 
 private:

@@ -12,6 +12,6 @@ struct GLDisplayProperty {
     cl_context_properties value = 0;
 };
 
-// On Windows CL_WGL_HDC_KHR with GetDC(window), which is never released; elsewhere the display of the
-// context that is current on the calling thread, and `window` is not looked at.
+// On Windows CL_WGL_HDC_KHR with GetDC(window), which is never released; elsewhere the display of
+// the context that is current on the calling thread, and `window` is not looked at.
 VYRA_HOST_API GLDisplayProperty glDisplayProperty(void* window);

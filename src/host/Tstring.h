@@ -5,8 +5,8 @@
 
 #include <string>
 
-// A sequence of bytes with a NUL behind the last one. Lengths are 32-bit and count bytes. One object
-// belongs to one thread at a time.
+// A sequence of bytes with a NUL behind the last one. Lengths are 32-bit and count bytes. One
+// object belongs to one thread at a time.
 class VYRA_HOST_API Tstring {
 public:
     Tstring() = default;

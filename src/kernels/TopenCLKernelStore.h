@@ -16,13 +16,14 @@
 class TstringArray;
 
 // Builds each program once per name and option string, keeps it while kernels made from it are
-// outstanding, and hands out a new kernel object for every request, so that no two callers share the
-// arguments of one.
+// outstanding, and hands out a new kernel object for every request, so that no two callers share
+// the arguments of one.
 //
-// Programs from files (named by their path) and from source texts share one cache; the text itself is not
-// part of the key. Any number of threads may call; they take turns, and a turn that misses the cache lasts
-// for the reading of a file and a whole build. Failing OpenCL calls are reported as warnings and give an
-// empty result; a failed build also hands its log to the warning sink. Nothing that failed is remembered.
+// Programs from files (named by their path) and from source texts share one cache; the text itself
+// is not part of the key. Any number of threads may call; they take turns, and a turn that misses
+// the cache lasts for the reading of a file and a whole build. Failing OpenCL calls are reported as
+// warnings and give an empty result; a failed build also hands its log to the warning sink. Nothing
+// that failed is remembered.
 class VYRA_OPENCL_API TopenCLKernelStore {
 public:
     TopenCLKernelStore();
@@ -31,14 +32,15 @@ public:
     TopenCLKernelStore(const TopenCLKernelStore&) = delete;
     TopenCLKernelStore& operator=(const TopenCLKernelStore&) = delete;
 
-    // Called once, before anybody else uses the store. The handles are borrowed. A null `context` changes
-    // nothing.
+    // Called once, before anybody else uses the store. The handles are borrowed. A null `context`
+    // changes nothing.
     void initialize(cl_context context, cl_device_id device, OpenCLProvider provider);
 
     // A new kernel `kernelName` of the program in the file `fileName`, taken exactly as given. Null
-    // `buildFlags` stand for the default options (an empty text does not); `includeDirs` may be null. The
-    // caller owns the result's reference and gives the kernel back with freeKernel. Wraps clCreateKernel
-    // and, for a program that is not cached, clCreateProgramWithSource and clBuildProgram.
+    // `buildFlags` stand for the default options (an empty text does not); `includeDirs` may be
+    // null. The caller owns the result's reference and gives the kernel back with freeKernel. Wraps
+    // clCreateKernel and, for a program that is not cached, clCreateProgramWithSource and
+    // clBuildProgram.
     AutoCLObject<cl_kernel> getKernel(const char* fileName, const char* buildFlags,
                                       const char* kernelName, const TstringArray* includeDirs);
 
@@ -47,8 +49,8 @@ public:
                                                 const char* buildFlags, const char* kernelName,
                                                 const TstringArray* includeDirs);
 
-    // Gives back a kernel of this store; its program goes with the last one. True when the kernel was found,
-    // and for an empty holder. The caller's own reference is not touched.
+    // Gives back a kernel of this store; its program goes with the last one. True when the kernel
+    // was found, and for an empty holder. The caller's own reference is not touched.
     bool freeKernel(const AutoCLObject<cl_kernel>& kernel);
 
 private:

@@ -12,12 +12,13 @@
 
 class TopenCLKernelStore;
 
-// The one object that holds platform, device, context, queues, kernel store, shared buffers and options.
+// The one object that holds platform, device, context, queues, kernel store, shared buffers and
+// options.
 //
-// The host calls initialize once, before anything else of the library; the object then lives until the
-// process ends, valid or not. Start-up stops at the first failure and says so on standard error; what it
-// had decided by then stays readable. Everything is read without synchronisation afterwards: only the three
-// set operations write, and they are not to overlap with readers.
+// The host calls initialize once, before anything else of the library; the object then lives until
+// the process ends, valid or not. Start-up stops at the first failure and says so on standard
+// error; what it had decided by then stays readable. Everything is read without synchronisation
+// afterwards: only the three set operations write, and they are not to overlap with readers.
 class VYRA_OPENCL_API TopenCLInfo {
 public:
     // How OpenCL waits for the renderer.
@@ -30,13 +31,14 @@ public:
     enum CLToGraphicsSyncMode {
         kCLToGraphicsImplicit = 1,   // the sharing extension orders the two
         kCLToGraphicsEventQuery = 2, // the host polls the release event
-        kCLToGraphicsSyncObject = 3, // the OpenGL stream waits for a sync object made from the event
-        kCLToGraphicsFinish = 4,     // the host calls clFinish
+        kCLToGraphicsSyncObject =
+            3,                   // the OpenGL stream waits for a sync object made from the event
+        kCLToGraphicsFinish = 4, // the host calls clFinish
     };
 
-    // Creates the runtime object from the renderer's native window, its OpenGL context (or ID3D11Device when
-    // `usingDX`) and the PCI vendor id of its adapter; `reserved` is ignored. Once only: a later call changes
-    // nothing. Returns isValid().
+    // Creates the runtime object from the renderer's native window, its OpenGL context (or
+    // ID3D11Device when `usingDX`) and the PCI vendor id of its adapter; `reserved` is ignored.
+    // Once only: a later call changes nothing. Returns isValid().
     static bool initialize(void* window, void* graphicsContext, void* reserved, bool usingDX,
                            bool usingGLCoreProfile, unsigned vendorId);
     // The object. Only after initialize.
@@ -48,7 +50,8 @@ public:
     // Wrap clFinish and clFlush.
     static void finish();
     static void flush();
-    // Whether `event` is done. Null, and an event that cannot be asked, count as done. Wraps clGetEventInfo.
+    // Whether `event` is done. Null, and an event that cannot be asked, count as done. Wraps
+    // clGetEventInfo.
     static bool IsEventComplete(cl_event event);
 
     // Member-wise copies: handles and kernel store are shared, nothing is retained.
@@ -86,31 +89,34 @@ public:
     {
         return fPlatformSupportsDoublePrecision && fAllowDoublePrecisionSupport;
     }
-    // Returns whether the stored value changed. Without the platform's support it can only become false.
+    // Returns whether the stored value changed. Without the platform's support it can only become
+    // false.
     bool setAllowDoublePrecisionSupport(bool allow);
 
     // The least number of vertices for which the host is to deform with OpenCL.
     int minimumBufferSize() const { return fUseMinimumBufferSize ? fMinimumBufferSize : 0; }
     bool useMinimumBufferSize() const { return fUseMinimumBufferSize; }
-    // 2000 on NVIDIA, 500 elsewhere, or VYRA_OPENCL_DEFORMER_MIN_VERTS, which is read on every call.
+    // 2000 on NVIDIA, 500 elsewhere, or VYRA_OPENCL_DEFORMER_MIN_VERTS, which is read on every
+    // call.
     int getDefaultMinimumBufferSize() const;
     // Returns whether the stored value changed. A negative `size` stands for the default.
     bool setMinimumBufferSize(int size);
     bool setUseMinimumBufferSize(bool use);
 
-    // A new in-order queue, whose reference is the caller's; null, reported, when it cannot be made. The
-    // out-parameter may be null and receives false. Wraps clCreateCommandQueue.
+    // A new in-order queue, whose reference is the caller's; null, reported, when it cannot be
+    // made. The out-parameter may be null and receives false. Wraps clCreateCommandQueue.
     cl_command_queue createOpenCLCommandQueue(bool* usingOutOfOrderExecution);
-    // Sizes a one-dimensional launch of `workItemCount` work-items: the kernel's work-group size on the
-    // device, and the count rounded up to a multiple of it. Kernels guard the work-items beyond the count.
-    // An OpenCL status; on failure the outputs are not written. Wraps clGetKernelWorkGroupInfo.
+    // Sizes a one-dimensional launch of `workItemCount` work-items: the kernel's work-group size on
+    // the device, and the count rounded up to a multiple of it. Kernels guard the work-items beyond
+    // the count. An OpenCL status; on failure the outputs are not written. Wraps
+    // clGetKernelWorkGroupInfo.
     int getWorkGroupSizes(cl_kernel kernel, std::size_t workItemCount, std::size_t& globalWorkSize,
                           std::size_t& localWorkSize) const;
 
     // The host's resource directory, asked for once. The first call must not overlap with another.
     Tstring& getAbsolutePathToResources();
-    // Reads a kernel source file, unchanged, behind `preamble`. False when it cannot be read, is empty, or
-    // is 2 GiB or larger. Safe from any thread.
+    // Reads a kernel source file, unchanged, behind `preamble`. False when it cannot be read, is
+    // empty, or is 2 GiB or larger. Safe from any thread.
     static bool oclLoadProgSource(Tstring& source, const char* fileName, const char* preamble);
 
 private:
