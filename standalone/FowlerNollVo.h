@@ -1,0 +1,35 @@
+// The FNV-1a hash of a byte sequence (Fowler, Noll and Vo; RFC 9923).
+#pragma once
+
+#include <cstdint>
+#include <string_view>
+
+namespace vyra::host {
+
+template <class Word>
+struct FowlerNollVo;
+
+template <>
+struct FowlerNollVo<std::uint32_t> {
+    static constexpr std::uint32_t offsetBasis = 0x811c9dc5u;
+    static constexpr std::uint32_t prime = 0x01000193u;
+};
+
+template <>
+struct FowlerNollVo<std::uint64_t> {
+    static constexpr std::uint64_t offsetBasis = 0xcbf29ce484222325u;
+    static constexpr std::uint64_t prime = 0x00000100000001b3u;
+};
+
+template <class Word>
+constexpr Word fowlerNollVo(std::string_view bytes)
+{
+    Word hash = FowlerNollVo<Word>::offsetBasis;
+    for (const char byte : bytes) {
+        hash ^= static_cast<unsigned char>(byte);
+        hash *= FowlerNollVo<Word>::prime;
+    }
+    return hash;
+}
+
+} // namespace vyra::host

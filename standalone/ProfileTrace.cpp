@@ -1,0 +1,139 @@
+// Writes what the profiler recorded as Chrome trace-event JSON ("Trace Event Format").
+#include "standalone/ProfileLog.h"
+#include "standalone/ProfileRecorder.h"
+
+#include <QFile>
+#include <QJsonDocument>
+#include <QJsonObject>
+#include <QString>
+
+#include <map>
+#include <set>
+#include <string>
+#include <utility>
+
+namespace {
+
+using vyra::host::ProfileEvent;
+using vyra::host::ThreadProfile;
+
+// All rows are of one process. Tracks are rows too, numbered behind any thread.
+constexpr int processId = 1;
+constexpr int firstTrackRow = 1'000'000;
+
+double microseconds(std::int64_t nanoseconds)
+{
+    return static_cast<double>(nanoseconds) / 1000.0;
+}
+
+QString categoryName(std::uint32_t id)
+{
+    return id == vyra::host::mainCategoryId ? QStringLiteral("main") : QString::number(id);
+}
+
+QJsonObject eventObject(const ProfileEvent& event, int row)
+{
+    QJsonObject object{{"name", QString::fromUtf8(event.name.asChar())},
+                       {"cat", categoryName(event.categoryId)},
+                       {"pid", processId},
+                       {"tid", row},
+                       {"ts", microseconds(event.beginNs)}};
+    if (event.endNs == vyra::host::stillOpen) {
+        object["ph"] = "B";
+    } else {
+        object["ph"] = "X";
+        object["dur"] = microseconds(event.endNs - event.beginNs);
+    }
+    QJsonObject arguments{{"color", static_cast<qint64>(event.color)}};
+    if (*event.description.asChar() != '\0') {
+        arguments["description"] = QString::fromUtf8(event.description.asChar());
+    }
+    object["args"] = arguments;
+    return object;
+}
+
+QJsonObject rowName(const std::string& name, int row)
+{
+    return {{"name", "thread_name"},
+            {"ph", "M"},
+            {"pid", processId},
+            {"tid", row},
+            {"args", QJsonObject{{"name", QString::fromStdString(name)}}}};
+}
+
+// Writes objects as the elements of the file's one array, one a line.
+class TraceFile {
+public:
+    explicit TraceFile(const std::string& path) : fFile(QString::fromStdString(path))
+    {
+        fGood = fFile.open(QIODevice::WriteOnly | QIODevice::Truncate);
+        write("{\"traceEvents\":[");
+    }
+
+    void add(const QJsonObject& object)
+    {
+        write(std::exchange(fSeparator, ",\n"));
+        write(QJsonDocument(object).toJson(QJsonDocument::Compact));
+    }
+
+    // True when all of it reached the file.
+    bool finish()
+    {
+        write("\n]}\n");
+        fGood = fGood && fFile.flush();
+        fFile.close();
+        return fGood;
+    }
+
+private:
+    void write(const QByteArray& bytes) { fGood = fGood && fFile.write(bytes) == bytes.size(); }
+
+    QFile fFile;
+    const char* fSeparator = "\n";
+    bool fGood = false;
+};
+
+// Gives every thread and track with events its row, named before its first event.
+class RowTable {
+public:
+    explicit RowTable(TraceFile& file) : fFile(file) {}
+
+    int row(const ProfileEvent& event, const std::string& threadName, int threadRow)
+    {
+        const std::string track = event.track.asChar();
+        if (track.empty()) {
+            return named(threadRow, threadName);
+        }
+        const int newRow = firstTrackRow + static_cast<int>(fTracks.size());
+        return named(fTracks.try_emplace(track, newRow).first->second, track);
+    }
+
+private:
+    int named(int row, const std::string& name)
+    {
+        if (fNamed.insert(row).second) {
+            fFile.add(rowName(name, row));
+        }
+        return row;
+    }
+
+    TraceFile& fFile;
+    std::map<std::string, int> fTracks;
+    std::set<int> fNamed;
+};
+
+} // namespace
+
+bool ProfileRecorder::writeChromeTrace(const std::string& path)
+{
+    TraceFile file(path);
+    RowTable rows(file);
+    int threadRow = 0;
+    for (const ThreadProfile& thread : vyra::host::ProfileLog::copyAll()) {
+        ++threadRow;
+        for (const ProfileEvent& event : thread.events) {
+            file.add(eventObject(event, rows.row(event, thread.threadName, threadRow)));
+        }
+    }
+    return file.finish();
+}
