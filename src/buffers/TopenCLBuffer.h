@@ -80,8 +80,6 @@ private:
     void createMemory(std::size_t size, void* hostPtr, int* error);
     void mapMemory(std::size_t size, int* error);
     void unmapMemory();
-    int growAndUpload(cl_command_queue queue, cl_uint blocking, std::size_t offset,
-                      std::size_t size, void* hostPtr, cl_uint numEvents, const cl_event* waitList);
     int enqueueWrite(cl_command_queue queue, cl_uint blocking, std::size_t offset, std::size_t size,
                      const void* hostPtr, cl_uint numEvents, const cl_event* waitList);
 

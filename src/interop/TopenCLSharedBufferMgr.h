@@ -114,7 +114,7 @@ private:
     void ReleaseBufferBatch();
     void acquireBatch();
     int dissolveBatch();
-    void leaveBatch(TopenCLSharedBuffer& record);
+    void leaveBatch(const TopenCLSharedBuffer& record);
     void releaseAlone(const TopenCLSharedBuffer& record);
 
     std::unique_ptr<TopenCLSharedBufferMgrImpl> fImpl;

@@ -6,6 +6,7 @@
 #include "host/Tstring.h"
 #include "runtime/OpenCLProvider.h"
 
+#include <cstddef>
 #include <list>
 #include <unordered_map>
 #include <utility>

@@ -126,15 +126,15 @@ private:
     void cleanUpOpenCL();
 
     // The steps of start-up; false stops it.
-    void start(void* window, void* graphicsContext, unsigned vendorId);
-    bool choosePlatform(unsigned vendorId, Tstring& vendor, cl_platform_id& platform,
-                        Tstring& extensions);
-    bool findPlatformByVendor(const Tstring& vendor, cl_platform_id& platform, Tstring& extensions);
+    bool choosePlatform(unsigned vendorId, cl_platform_id& platform, Tstring& extensions);
+    static bool findPlatformByVendor(const Tstring& vendor, cl_platform_id& platform,
+                                     Tstring& extensions);
     bool setupDirectXExtensionFunctions(Tstring* extensions);
+    bool chooseDeviceAndContext(void* window, void* graphicsContext, cl_platform_id platform);
+    bool decideAsyncReadback();
+    bool judgeNVIDIADriver();
     bool setupExtensionFunctions(Tstring* extensions);
-    void finalizeExtensionFunctions();
-    bool decideAsyncReadback(const Tstring& vendor);
-    bool createContext(const cl_context_properties* properties);
+    static void finalizeExtensionFunctions();
     bool decideDoublePrecision(cl_platform_id platform);
     void createQueuesAndKernelStore();
     bool readComputeUnitCount();

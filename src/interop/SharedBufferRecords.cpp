@@ -1,0 +1,150 @@
+// Part of TopenCLSharedBufferMgr: its construction, and how shared buffers come and go.
+#include "diagnostics/CLStatusReport.h"
+#include "host/Environment.h"
+#include "interop/SharedBufferMgrBlock.h"
+#include "interop/TopenCLSharedBufferMgr.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/InteropFunctions.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <utility>
+
+namespace {
+
+// A manager has been constructed in this process: the message of the first is not considered again.
+constinit bool sfConstructedOnce = false;
+
+} // namespace
+
+TopenCLSharedBufferMgr::TopenCLSharedBufferMgr()
+    : fImpl(std::make_unique<TopenCLSharedBufferMgrImpl>()), fEvaluationId(kNoEvaluation)
+{
+    const bool forceThreading = VyraGetEnv("VYRA_OPENCL_FORCE_THREADING") != nullptr;
+    fBatchingEnabled = !forceThreading;
+    if (std::exchange(sfConstructedOnce, true))
+        return;
+    if (forceThreading)
+        std::fprintf(stderr, "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n");
+}
+
+TopenCLSharedBufferMgr::TopenCLSharedBufferMgr(const TopenCLSharedBufferMgr& other)
+    : fImpl(std::make_unique<TopenCLSharedBufferMgrImpl>()), fBatch(other.fBatch),
+      fBuffers(other.fBuffers), fBatchDirty(other.fBatchDirty), fAcquireEvent(other.fAcquireEvent),
+      fEvaluationId(other.fEvaluationId), fBatchAcquired(other.fBatchAcquired),
+      fBatchingEnabled(other.fBatchingEnabled), fReleaseEvent(other.fReleaseEvent)
+{
+}
+
+TopenCLSharedBufferMgr& TopenCLSharedBufferMgr::operator=(const TopenCLSharedBufferMgr& other)
+{
+    if (this == &other)
+        return *this;
+    // The list owns its references; the copy begins with an empty one.
+    for (cl_event event : fImpl->fReleaseWaitEvents)
+        releaseCLObject(event);
+    fImpl->fReleaseWaitEvents.clear();
+    fImpl->fGraphicsWaitEvents.clear();
+
+    fBatch = other.fBatch;
+    fBuffers = other.fBuffers;
+    fBatchDirty = other.fBatchDirty;
+    fAcquireEvent = other.fAcquireEvent;
+    fEvaluationId = other.fEvaluationId;
+    fBatchAcquired = other.fBatchAcquired;
+    fBatchingEnabled = other.fBatchingEnabled;
+    fReleaseEvent = other.fReleaseEvent;
+    return *this;
+}
+
+TopenCLSharedBufferMgr::~TopenCLSharedBufferMgr()
+{
+    // The lists go first, before the events that they may borrow; the members follow in reverse
+    // order.
+    fImpl.reset();
+}
+
+const TopenCLSharedBuffer* TopenCLSharedBufferMgr::CreateSharedCLBuffer(cl_context context,
+                                                                        cl_mem_flags flags,
+                                                                        void* graphicsBuffer,
+                                                                        int* errcode)
+{
+    AutoCLObject<cl_mem> created;
+    created.adopt(sfCreateSharedCLBuffer(context, flags, graphicsBuffer, errcode));
+    if (*errcode != CL_SUCCESS || !created.get())
+        return nullptr;
+
+    const std::scoped_lock lock(fImpl->fMutex);
+    TopenCLSharedBuffer& record = fBuffers[created.get()];
+    // An exchange: the reference of a record that was there already goes with `created`.
+    record.fMem = std::move(created);
+    fBatchDirty = true;
+    return &record;
+}
+
+int TopenCLSharedBufferMgr::DestroySharedCLBuffer(const TopenCLSharedBuffer* buffer)
+{
+    const std::scoped_lock lock(fImpl->fMutex);
+    int result = CL_SUCCESS;
+    if (buffer->fInBatch)
+        result = fBatchAcquired ? CL_INVALID_VALUE : dissolveBatch();
+    fBuffers.erase(buffer->fMem.get());
+    fBatchDirty = true;
+    return result;
+}
+
+// Waits for the batch's last release and leaves every buffer on its own. Returns the status of the
+// wait.
+int TopenCLSharedBufferMgr::dissolveBatch()
+{
+    int result = CL_SUCCESS;
+    if (fReleaseEvent.get()) {
+        const cl_event released = fReleaseEvent.get();
+        result = ocl.clWaitForEvents(1, &released);
+        succeeded(result);
+    }
+    fBatch.clear();
+    for (auto& [memory, record] : fBuffers)
+        record.fInBatch = false;
+    return result;
+}
+
+int TopenCLSharedBufferMgr::DestroyBatchedSharedCLBuffer(const TopenCLSharedBuffer* buffer)
+{
+    const std::scoped_lock lock(fImpl->fMutex);
+    if (buffer->fInBatch)
+        leaveBatch(*buffer);
+    fBuffers.erase(buffer->fMem.get());
+    return CL_SUCCESS;
+}
+
+// Takes one buffer out of the batch, which keeps the order of the others.
+void TopenCLSharedBufferMgr::leaveBatch(const TopenCLSharedBuffer& record)
+{
+    const auto member = std::find_if(fBatch.begin(), fBatch.end(), [&](const auto& memory) {
+        return memory.get() == record.fMem.get();
+    });
+    if (member == fBatch.end())
+        return;
+    if (fBatchAcquired)
+        releaseAlone(record);
+    fBatch.erase(member);
+}
+
+// Releases one buffer of the acquired batch, after all events handed over so far, and waits for it.
+// The events stay listed, since the rest of the batch waits for them too.
+void TopenCLSharedBufferMgr::releaseAlone(const TopenCLSharedBuffer& record)
+{
+    std::vector<cl_event>& waitList = fImpl->fWaitListScratch;
+    fImpl->fReleaseWaitEvents.copyTo(waitList);
+
+    AutoCLObject<cl_event> released;
+    succeeded(sfEnqueueReleaseSharedObjects(
+        TopenCLInfo::theOne().openCLCommandQueue(), 1, bareHandles(&record.fMem),
+        static_cast<cl_uint>(waitList.size()), waitList.empty() ? nullptr : waitList.data(),
+        released.receive()));
+    // A failed release leaves no event to wait for.
+    if (released.get())
+        succeeded(ocl.clWaitForEvents(1, bareHandles(&released)));
+}

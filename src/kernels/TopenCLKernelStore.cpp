@@ -1,0 +1,176 @@
+#include "kernels/TopenCLKernelStore.h"
+
+#include "diagnostics/CLInternalWarning.h"
+#include "diagnostics/CLStatusReport.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <algorithm>
+#include <memory>
+#include <new>
+
+namespace {
+
+constexpr std::size_t kInitialBuckets = 8;
+constexpr float kMaximumLoadFactor = 1.0F;
+
+} // namespace
+
+std::size_t TopenCLKernelStore::ProgramKeyHash::operator()(const ProgramKey& key) const
+{
+    return key.first.hash() + key.second.hash();
+}
+
+TopenCLKernelStore::TopenCLKernelStore() : fPrograms(kInitialBuckets)
+{
+    fPrograms.max_load_factor(kMaximumLoadFactor);
+}
+
+TopenCLKernelStore::~TopenCLKernelStore()
+{
+    const tbb::spin_mutex::scoped_lock lock(fLock);
+    fPrograms.clear();
+}
+
+void TopenCLKernelStore::initialize(cl_context context, cl_device_id device,
+                                    OpenCLProvider provider)
+{
+    if (!context)
+        return;
+    fContext = context;
+    fDevice = device;
+    fProvider = provider;
+}
+
+AutoCLObject<cl_kernel> TopenCLKernelStore::getKernel(const char* fileName, const char* buildFlags,
+                                                      const char* kernelName,
+                                                      const TstringArray* includeDirs)
+{
+    const tbb::spin_mutex::scoped_lock lock(fLock);
+    ProgramInfo* program = getProgram(fileName, buildFlags, includeDirs);
+    return program ? createKernel(*program, kernelName) : AutoCLObject<cl_kernel>();
+}
+
+AutoCLObject<cl_kernel> TopenCLKernelStore::getKernelFromString(const char* source,
+                                                                const char* programName,
+                                                                const char* buildFlags,
+                                                                const char* kernelName,
+                                                                const TstringArray* includeDirs)
+{
+    const tbb::spin_mutex::scoped_lock lock(fLock);
+    ProgramInfo* program = getProgramFromString(source, programName, buildFlags, includeDirs);
+    return program ? createKernel(*program, kernelName) : AutoCLObject<cl_kernel>();
+}
+
+// A new kernel with two references: the result's, and the one in the program's list.
+AutoCLObject<cl_kernel> TopenCLKernelStore::createKernel(ProgramInfo& program,
+                                                         const char* kernelName)
+{
+    AutoCLObject<cl_kernel> kernel;
+    cl_int status = CL_SUCCESS;
+    kernel.adopt(ocl.clCreateKernel(program.fProgram.get(), kernelName, &status));
+    succeeded(status);
+    if (kernel.get())
+        program.fKernels.push_back(kernel);
+    return kernel;
+}
+
+bool TopenCLKernelStore::freeKernel(const AutoCLObject<cl_kernel>& kernel)
+{
+    if (!kernel.get())
+        return true;
+    const tbb::spin_mutex::scoped_lock lock(fLock);
+    for (auto program = fPrograms.begin(); program != fPrograms.end(); ++program) {
+        auto& kernels = program->second.fKernels;
+        const auto found = std::find_if(kernels.begin(), kernels.end(), [&](const auto& handedOut) {
+            return handedOut.get() == kernel.get();
+        });
+        if (found == kernels.end())
+            continue;
+        kernels.erase(found);
+        if (kernels.empty())
+            fPrograms.erase(program);
+        return true;
+    }
+    return false;
+}
+
+TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::getProgram(const char* fileName,
+                                                                const char* buildFlags,
+                                                                const TstringArray* includeDirs)
+{
+    ProgramKey key(fileName, expandBuildFlags(buildFlags, includeDirs));
+    if (const auto entry = fPrograms.find(key); entry != fPrograms.end())
+        return &entry->second;
+
+    Tstring source;
+    if (!TopenCLInfo::oclLoadProgSource(source, fileName, ""))
+        return nullptr;
+    return cacheProgram(std::move(key), source.asChar());
+}
+
+TopenCLKernelStore::ProgramInfo*
+TopenCLKernelStore::getProgramFromString(const char* source, const char* programName,
+                                         const char* buildFlags, const TstringArray* includeDirs)
+{
+    ProgramKey key(programName, expandBuildFlags(buildFlags, includeDirs));
+    if (const auto entry = fPrograms.find(key); entry != fPrograms.end())
+        return &entry->second;
+    return cacheProgram(std::move(key), source);
+}
+
+// Builds the program of a key that is not cached. Null, and nothing cached, when it cannot be
+// built.
+TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::cacheProgram(ProgramKey&& key,
+                                                                  const char* source)
+{
+    AutoCLObject<cl_program> program;
+    program.adopt(getProgramFromString(source, key.second.asChar()));
+    if (!program.get())
+        return nullptr;
+    ProgramInfo& info = fPrograms[std::move(key)];
+    info.fProgram = std::move(program);
+    return &info;
+}
+
+// A built program with one reference, which is the caller's; null when it cannot be built.
+cl_program TopenCLKernelStore::getProgramFromString(const char* source, const char* options)
+{
+    Tstring buildOptions(options);
+    if (fProvider == kNVIDIAProvider)
+        buildOptions += " -cl-nv-verbose";
+
+    cl_int status = CL_SUCCESS;
+    cl_program program = ocl.clCreateProgramWithSource(fContext, 1, &source, nullptr, &status);
+    succeeded(status);
+    if (!program)
+        return nullptr;
+
+    succeeded(ocl.clBuildProgram(program, 1, &fDevice, buildOptions.asChar(), nullptr, nullptr));
+    cl_build_status buildStatus = CL_BUILD_ERROR;
+    const bool known = succeeded(ocl.clGetProgramBuildInfo(
+        program, fDevice, CL_PROGRAM_BUILD_STATUS, sizeof buildStatus, &buildStatus, nullptr));
+    if (known && buildStatus == CL_BUILD_SUCCESS)
+        return program;
+
+    reportBuildLog(program);
+    ocl.clReleaseProgram(program); // the only reference; nobody could act on a failure
+    return nullptr;
+}
+
+// Hands what the compiler said to the warning sink, if it said anything.
+void TopenCLKernelStore::reportBuildLog(cl_program program)
+{
+    std::size_t size = 0;
+    if (!succeeded(
+            ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, 0, nullptr, &size)))
+        return;
+    // Without memory for the log there is no log: the program must still be released.
+    const std::unique_ptr<char[]> log(new (std::nothrow) char[size + 1]());
+    if (size == 0 || !log)
+        return;
+    if (succeeded(ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, size, log.get(),
+                                            nullptr)) &&
+        log[0] != '\0')
+        CLInternalWarning("%s", log.get());
+}

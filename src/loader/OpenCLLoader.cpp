@@ -1,0 +1,49 @@
+#include "loader/OpenCLLoader.h"
+
+#include "loader/SharedLibrary.h"
+
+constinit OpenCLEntryPoints ocl;
+
+namespace {
+
+#if defined(_WIN32)
+constexpr const char* kSystemLibrary = "OpenCL.dll";
+#else
+constexpr const char* kSystemLibrary = "libOpenCL.so.1";
+#endif
+
+// Fills `entry` and returns whether it was found.
+template <typename Function>
+bool resolve(void* library, const char* name, Function& entry)
+{
+    void* address = findSymbol(library, name);
+    if (!address && ocl.clGetExtensionFunctionAddress)
+        address = ocl.clGetExtensionFunctionAddress(name);
+    entry = reinterpret_cast<Function>(address);
+    return entry != nullptr;
+}
+
+} // namespace
+
+OpenCLLoadStatus loadOpenCL(const char* name)
+{
+    void* library = openSharedLibrary(name ? name : kSystemLibrary);
+    if (!library)
+        return OpenCLLoadStatus::kNoLibrary;
+
+    // First, since the others may be found through it.
+    bool complete =
+        resolve(library, "clGetExtensionFunctionAddress", ocl.clGetExtensionFunctionAddress);
+
+#define VYRA_RESOLVE_CORE(entry) complete = resolve(library, #entry, ocl.entry) && complete;
+#define VYRA_RESOLVE(entry) resolve(library, #entry, ocl.entry);
+#define VYRA_RESOLVE_TYPED(type, entry) resolve(library, #entry, ocl.entry);
+    VYRA_OPENCL_CORE_ENTRY_POINTS(VYRA_RESOLVE_CORE)
+    VYRA_OPENCL_GL_ENTRY_POINTS(VYRA_RESOLVE)
+    VYRA_OPENCL_D3D11_ENTRY_POINTS(VYRA_RESOLVE_TYPED)
+#undef VYRA_RESOLVE_CORE
+#undef VYRA_RESOLVE
+#undef VYRA_RESOLVE_TYPED
+
+    return complete ? OpenCLLoadStatus::kLoaded : OpenCLLoadStatus::kNoCoreEntryPoint;
+}

@@ -1,0 +1,245 @@
+// The choice of the device, and the parts of TopenCLInfo that ask what it can do.
+#include "runtime/DeviceSelection.h"
+
+#include "diagnostics/CLStatusReport.h"
+#include "host/Environment.h"
+#include "host/GLDisplay.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/DriverVersion.h"
+#include "runtime/InteropFunctions.h"
+#include "runtime/PlatformSelection.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <exception>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace {
+
+// More devices than any machine shares with one renderer.
+constexpr std::size_t kMaximumDevices = 64;
+using DeviceList = std::array<cl_device_id, kMaximumDevices>;
+
+// Room for a driver version, a device name or a platform version.
+using InfoText = std::array<char, 128>;
+
+cl_context_properties asProperty(void* handle)
+{
+    return reinterpret_cast<cl_context_properties>(handle);
+}
+
+// Reads what the value has room for. False, reported, when the query fails.
+template <typename Value>
+bool readDeviceInfo(cl_device_id device, cl_device_info name, Value& value)
+{
+    return succeeded(ocl.clGetDeviceInfo(device, name, sizeof value, &value, nullptr),
+                     CLReportStyle::kSetUp);
+}
+
+// Sets `isGPU` when the type is a GPU and nothing else besides.
+bool readIsGPU(cl_device_id device, bool& isGPU)
+{
+    cl_device_type type = 0;
+    if (!readDeviceInfo(device, CL_DEVICE_TYPE, type))
+        return false;
+    isGPU = type == CL_DEVICE_TYPE_GPU;
+    return true;
+}
+
+// Reads devices of the OpenGL context into `value`; `size` receives the number of bytes.
+bool readGLContextInfo(const ContextProperties& properties, cl_gl_context_info name,
+                       std::size_t room, void* value, std::size_t& size)
+{
+    size = 0;
+    return succeeded(ocl.clGetGLContextInfoKHR(properties.data(), name, room, value, &size),
+                     CLReportStyle::kSetUp);
+}
+
+// Takes the first GPU among `devices`, `current` before the others where it is one of them.
+// `chosen` stays null when there is no GPU; false when a query fails.
+bool chooseGPU(const DeviceList& devices, std::size_t count, cl_device_id current,
+               cl_device_id& chosen)
+{
+    const auto end = devices.begin() + static_cast<std::ptrdiff_t>(count);
+    bool isGPU = false;
+    if (current && std::find(devices.begin(), end, current) != end) {
+        if (!readIsGPU(current, isGPU))
+            return false;
+        if (isGPU) {
+            chosen = current;
+            return true;
+        }
+    }
+    for (auto device = devices.begin(); device != end; ++device) {
+        if (!readIsGPU(*device, isGPU))
+            return false;
+        if (isGPU) {
+            chosen = *device;
+            return true;
+        }
+    }
+    return true;
+}
+
+std::optional<int> ignoreDriverVersion()
+{
+    const char* value = std::getenv("VYRA_OPENCL_IGNORE_DRIVER_VERSION");
+    return value ? std::optional<int>(std::atoi(value)) : std::nullopt;
+}
+
+} // namespace
+
+ContextProperties openGLContextProperties(void* window, void* glContext, cl_platform_id platform)
+{
+    const GLDisplayProperty display = glDisplayProperty(window);
+    return {CL_GL_CONTEXT_KHR, asProperty(glContext), display.name,
+            display.value,     CL_CONTEXT_PLATFORM,   asProperty(platform)};
+}
+
+ContextProperties d3d11ContextProperties(void* d3dDevice, cl_platform_id platform)
+{
+    return {kCLContextD3D11Device, asProperty(d3dDevice), CL_CONTEXT_PLATFORM,
+            asProperty(platform)};
+}
+
+bool chooseDeviceForOpenGL(const ContextProperties& properties, cl_device_id& device)
+{
+    // A runtime without the query cannot share with OpenGL at all.
+    if (ocl.clGetGLContextInfoKHR) {
+        DeviceList devices{};
+        std::size_t listBytes = 0;
+        cl_device_id current = nullptr;
+        std::size_t currentBytes = 0;
+        if (!readGLContextInfo(properties, CL_DEVICES_FOR_GL_CONTEXT_KHR, sizeof devices,
+                               devices.data(), listBytes) ||
+            !readGLContextInfo(properties, CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, sizeof current,
+                               &current, currentBytes))
+            return false;
+        const std::size_t count = std::min(listBytes / sizeof(cl_device_id), devices.size());
+        if (!chooseGPU(devices, count, current, device))
+            return false;
+    }
+    if (!device)
+        std::fprintf(stderr,
+                     "OpenCL evaluator is unable to find a GPU device that can share VBOs with "
+                     "OpenGL.\n");
+    return device != nullptr;
+}
+
+bool chooseDeviceForD3D11(void* d3dDevice, cl_platform_id platform, cl_device_id& device)
+{
+    DeviceList devices{};
+    cl_uint count = 0;
+    if (!succeeded(sfGetDeviceIDsFromD3D11(
+                       platform, kCLD3D11Device, d3dDevice, kCLPreferredDevicesForD3D11,
+                       static_cast<cl_uint>(devices.size()), devices.data(), &count),
+                   CLReportStyle::kSetUp))
+        return false;
+    device = devices.front();
+    return device != nullptr;
+}
+
+bool reportDevice(cl_device_id device)
+{
+    InfoText name{};
+    if (!readDeviceInfo(device, CL_DEVICE_NAME, name))
+        return false;
+    std::fprintf(stderr, "Choosing OpenCL Device %s.  ", name.data());
+
+    bool isGPU = false;
+    if (!readIsGPU(device, isGPU))
+        return false;
+    std::fprintf(stderr, "Device Type: %s  ", isGPU ? "GPU" : "Non-GPU");
+
+    cl_bool available = CL_FALSE;
+    if (!readDeviceInfo(device, CL_DEVICE_AVAILABLE, available))
+        return false;
+    if (!available) {
+        std::fprintf(stderr, "GL shared device is not available, no OpenCL will be used\n");
+        return false;
+    }
+    std::fprintf(stderr, "Device is available.\n");
+    return true;
+}
+
+bool TopenCLInfo::decideAsyncReadback()
+{
+    if (fProvider == kNVIDIAProvider)
+        return judgeNVIDIADriver();
+    fSupportsAsyncReadback = fProvider == kIntelProvider || fProvider == kAMDProvider;
+    return true;
+}
+
+// False when the driver is one of those whose OpenCL fails, or its version cannot be asked for.
+bool TopenCLInfo::judgeNVIDIADriver()
+{
+    InfoText text{};
+    if (!readDeviceInfo(fDevice, CL_DRIVER_VERSION, text))
+        return false;
+    try {
+        const DriverVersion version = parseDriverVersion(std::string(text.data()));
+        const DriverVerdict verdict = judgeDriver(version, ignoreDriverVersion());
+        if (!verdict.usable) {
+            std::fprintf(stderr,
+                         "\nOpenCL is not supported by NVidia drivers between version 361.91 and "
+                         "368.86.  To enabled OpenCL for this driver version set "
+                         "VYRA_OPENCL_IGNORE_DRIVER_VERSION=1.\n");
+            return false;
+        }
+        fDriverSupportsImplicitSync = verdict.implicitSync;
+        fSupportsAsyncReadback = verdict.asyncReadback;
+    } catch (...) {
+        std::fprintf(stderr,
+                     "Unable to detect NVidia driver version.  Disabling asynchronous read-back "
+                     "for OpenCL.\n");
+        fSupportsAsyncReadback = false;
+    }
+    return true;
+}
+
+bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
+{
+    InfoText version{};
+    if (!succeeded(ocl.clGetPlatformInfo(platform, CL_PLATFORM_VERSION, sizeof version,
+                                         version.data(), nullptr),
+                   CLReportStyle::kSetUp))
+        return false;
+
+    constexpr std::size_t kVersionPrefix = 10;
+    if (std::strncmp(version.data(), "OpenCL 1.0", kVersionPrefix) == 0 ||
+        std::strncmp(version.data(), "OpenCL 1.1", kVersionPrefix) == 0) {
+        // Before version 1.2 double precision is an extension; a failing query reads as "not
+        // there".
+        std::vector<char> extensions;
+        queryPlatformInfo(platform, CL_PLATFORM_EXTENSIONS, extensions);
+        fPlatformSupportsDoublePrecision = platformText(extensions).findMB("cl_khr_fp64") != -1;
+    } else {
+        cl_device_fp_config config = 0;
+        if (!readDeviceInfo(fDevice, CL_DEVICE_DOUBLE_FP_CONFIG, config))
+            return false;
+        fPlatformSupportsDoublePrecision = config != 0;
+    }
+
+    if (!fPlatformSupportsDoublePrecision &&
+        TenvironmentVariable("VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT").asInt32(0) != 0) {
+        std::fprintf(stderr,
+                     "Vyra OpenCL is not supported on device because double precision is not "
+                     "supported.\n");
+        return false;
+    }
+    return true;
+}
+
+bool TopenCLInfo::readComputeUnitCount()
+{
+    cl_uint count = 0;
+    if (!readDeviceInfo(fDevice, CL_DEVICE_MAX_COMPUTE_UNITS, count))
+        return false;
+    fComputeUnitCount = count;
+    return true;
+}

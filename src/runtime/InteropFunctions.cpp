@@ -1,0 +1,136 @@
+// The interop function table, and the parts of TopenCLInfo that fill it.
+#include "runtime/InteropFunctions.h"
+
+#include "host/Environment.h"
+#include "host/GLFunctionTable.h"
+#include "runtime/SyncModes.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <cstdio>
+
+constinit D3D11GetDeviceIDs sfGetDeviceIDsFromD3D11 = nullptr;
+constinit CreateSharedCLBuffer sfCreateSharedCLBuffer = nullptr;
+constinit EnqueueSharedObjects sfPendingEnqueueAcquireSharedObjects = nullptr;
+constinit EnqueueSharedObjects sfPendingEnqueueReleaseSharedObjects = nullptr;
+constinit EnqueueSharedObjects sfEnqueueAcquireSharedObjects = nullptr;
+constinit EnqueueSharedObjects sfEnqueueReleaseSharedObjects = nullptr;
+
+namespace {
+
+// The entry points of one Direct3D 11 extension.
+struct D3D11Extension {
+    D3D11GetDeviceIDs getDeviceIDs;
+    D3D11CreateBuffer createBuffer;
+    D3D11EnqueueObjects enqueueAcquire;
+    D3D11EnqueueObjects enqueueRelease;
+};
+
+// Fills the table; false when an entry point is missing. The device query is set in either case.
+bool useD3D11Extension(const D3D11Extension& extension)
+{
+    sfGetDeviceIDsFromD3D11 = extension.getDeviceIDs;
+    if (!extension.getDeviceIDs || !extension.createBuffer || !extension.enqueueAcquire ||
+        !extension.enqueueRelease)
+        return false;
+    sfCreateSharedCLBuffer = extension.createBuffer;
+    sfPendingEnqueueAcquireSharedObjects = extension.enqueueAcquire;
+    sfPendingEnqueueReleaseSharedObjects = extension.enqueueRelease;
+    return true;
+}
+
+cl_mem CL_API_CALL createFromGLBuffer(cl_context context, cl_mem_flags flags, void* resource,
+                                      cl_int* error)
+{
+    return ocl.clCreateFromGLBuffer(context, flags, *static_cast<const cl_GLuint*>(resource),
+                                    error);
+}
+
+// Fills the table; false when an entry point of OpenGL sharing is missing.
+bool useGLSharing()
+{
+    if (!ocl.clCreateFromGLBuffer || !ocl.clEnqueueAcquireGLObjects ||
+        !ocl.clEnqueueReleaseGLObjects || !ocl.clGetGLContextInfoKHR)
+        return false;
+    sfCreateSharedCLBuffer = createFromGLBuffer;
+    sfPendingEnqueueAcquireSharedObjects = ocl.clEnqueueAcquireGLObjects;
+    sfPendingEnqueueReleaseSharedObjects = ocl.clEnqueueReleaseGLObjects;
+    return true;
+}
+
+bool listsExtension(const Tstring& extensions, const char* name)
+{
+    return extensions.findMB(name) != -1;
+}
+
+} // namespace
+
+bool TopenCLInfo::setupDirectXExtensionFunctions(Tstring* extensions)
+{
+    if (!fUsingDX)
+        return true;
+    // Both extensions order the two sides themselves; no variable changes that.
+    fGraphicsToCLSyncMode = kGraphicsToCLImplicit;
+    fCLToGraphicsSyncMode = kCLToGraphicsImplicit;
+
+    if (listsExtension(*extensions, "cl_nv_d3d11_sharing")) {
+        if (useD3D11Extension({ocl.clGetDeviceIDsFromD3D11NV, ocl.clCreateFromD3D11BufferNV,
+                               ocl.clEnqueueAcquireD3D11ObjectsNV,
+                               ocl.clEnqueueReleaseD3D11ObjectsNV})) {
+            fUsingKHRD3D11Sharing = false;
+            return true;
+        }
+        std::printf(
+            "Error: found cl_nv_d3d11_sharing extension but failed to get function pointers.");
+        return false;
+    }
+    if (listsExtension(*extensions, "cl_khr_d3d11_sharing")) {
+        if (useD3D11Extension({ocl.clGetDeviceIDsFromD3D11KHR, ocl.clCreateFromD3D11BufferKHR,
+                               ocl.clEnqueueAcquireD3D11ObjectsKHR,
+                               ocl.clEnqueueReleaseD3D11ObjectsKHR})) {
+            fUsingKHRD3D11Sharing = true;
+            return true;
+        }
+        std::printf(
+            "Error: found cl_khr_d3d11_sharing extension but failed to get function pointers.");
+        return false;
+    }
+    std::fprintf(stderr, "Error: using D3D11 but found no OpenCL/D3D11 interop extension.");
+    return false;
+}
+
+bool TopenCLInfo::setupExtensionFunctions(Tstring* extensions)
+{
+    if (fUsingDX)
+        return true;
+    const SyncModeVariables variables = readSyncModeVariables();
+    if (variables.forceFinish != 0) {
+        fGraphicsToCLSyncMode = kGraphicsToCLFinish;
+        fCLToGraphicsSyncMode = kCLToGraphicsFinish;
+    } else {
+        const GLFunctionTable* gl = GLFunctionTable::fpGlobalFunctionTable;
+        const SyncAbilities abilities{
+            .glEvent = listsExtension(*extensions, "cl_khr_gl_event"),
+            .arbSync = gl && gl->syncObjectsUsable(),
+            .implicitSyncTrusted = fProvider != kNVIDIAProvider || fDriverSupportsImplicitSync,
+        };
+        fGraphicsToCLSyncMode = chooseGraphicsToCLSyncMode(variables.graphicsToCL, abilities);
+        fCLToGraphicsSyncMode = chooseCLToGraphicsSyncMode(variables.clToGraphics, abilities);
+    }
+
+    if (useGLSharing())
+        return true;
+    std::fprintf(stderr, "Error: found cl_khr_gl_sharing but failed to get function pointers");
+    return false;
+}
+
+void TopenCLInfo::finalizeExtensionFunctions()
+{
+    sfEnqueueAcquireSharedObjects = sfPendingEnqueueAcquireSharedObjects;
+    sfEnqueueReleaseSharedObjects = sfPendingEnqueueReleaseSharedObjects;
+}
+
+bool TopenCLInfo::supportsThreadedSharing() const
+{
+    static const bool sfForceThreading = VyraGetEnv("VYRA_OPENCL_FORCE_THREADING") != nullptr;
+    return sfForceThreading || fProvider != kNVIDIAProvider || fUsingDX || fUsingKHRD3D11Sharing;
+}

@@ -1,0 +1,36 @@
+// Every static object of the library that needs a constructor, in the order of construction;
+// unloading destroys them in reverse. They stand in one file because the order across files is
+// undefined.
+#include "buffers/TopenCLData.h"
+#include "buffers/TopenCLDataBuffer.h"
+#include "buffers/TopenCLDataBufferDescriptor.h"
+#include "host/Profiler.h"
+#include "host/Trace.h"
+#include "interop/SharedBufferMgrBlock.h"
+
+const TuniqueString TopenCLData::sfPositionsName("positions");
+const TuniqueString TopenCLData::sfNormalsName("normals");
+const TuniqueString TopenCLData::sfGeometryMatrixName("geometryMatrix");
+const TuniqueString TopenCLData::sfInverseGeometryMatrixName("inverseGeometryMatrix");
+const TuniqueString TopenCLData::sfNormalIdxToPositionIdxName("normalIdxToPositionIdx");
+
+// Before the null data buffer, which takes this name.
+const TuniqueString TopenCLDataBufferDescriptor::sfEmptyName("");
+const TopenCLDataBuffer TopenCLDataBuffer::fsNULL;
+
+namespace {
+
+// Kept for developers' traces of the kernel store; nothing writes to it.
+const TdbTrace clKernelTrace(1, "clKernel", TdebugOutput::sCerr(),
+                             "Errors and warnings from the OpenCL Kernel Store");
+
+} // namespace
+
+const profiler::EventType
+    sfAcquireBatchEventType(profiler::categories().main(), profiler::Colors::kColor14,
+                            "GPUOverrideAcquireQuorSharedBufferBatch",
+                            "Acquiring the quorview shared buffer from the OpenCl buffer manager");
+const profiler::EventType
+    sfReleaseBatchEventType(profiler::categories().main(), profiler::Colors::kColor14,
+                            "GPUOverrideReleaseQuorSharedBufferBatch",
+                            "Releasing the quorview shared buffer from the OpenCl buffer manager");
