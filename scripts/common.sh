@@ -1,0 +1,51 @@
+# What the project's commands have in common. Sourced, not run; expects `set -euo pipefail`.
+
+project_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
+
+fail() {
+    printf '%s: %s\n' "${0##*/}" "$1" >&2
+    exit "${2:-1}"
+}
+
+# Installs what scripts/packages.txt names and the machine lacks. Needs root only then.
+install_packages() {
+    local wanted missing=() package
+    mapfile -t wanted < <(grep -vE '^[[:space:]]*(#|$)' "$project_dir/scripts/packages.txt")
+    command -v dpkg-query >/dev/null ||
+        fail "this machine has no Debian packages; install the counterparts of scripts/packages.txt by hand"
+    for package in "${wanted[@]}"; do
+        [[ $(dpkg-query -W -f='${db:Status-Status}' "$package" 2>/dev/null) == installed ]] ||
+            missing+=("$package")
+    done
+    ((${#missing[@]})) || return 0
+
+    local as_root=()
+    if ((EUID != 0)); then
+        command -v sudo >/dev/null || fail "run as root: apt-get install ${missing[*]}"
+        as_root=(sudo)
+    fi
+    printf 'Installing %d missing packages: %s\n' "${#missing[@]}" "${missing[*]}"
+    run_quietly "$(mktemp -t vyra-packages.XXXXXX.log)" "${as_root[@]}" apt-get update
+    run_quietly "$(mktemp -t vyra-packages.XXXXXX.log)" "${as_root[@]}" env DEBIAN_FRONTEND=noninteractive \
+        apt-get install --yes --no-install-recommends "${missing[@]}"
+}
+
+# Runs a command with its output in a log, which is shown only when the command fails.
+run_quietly() {
+    local log=$1
+    shift
+    if ! "$@" >"$log" 2>&1; then
+        cat "$log" >&2
+        fail "failed: $* (the output above is in $log)"
+    fi
+}
+
+# Configures and builds a preset; its files are in build/PRESET.
+build_preset() {
+    local preset=$1 build_dir=$project_dir/build/$1
+    mkdir -p "$build_dir"
+    printf 'Building (%s) ...\n' "$preset"
+    cd "$project_dir"
+    run_quietly "$build_dir/configure.log" cmake --preset "$preset"
+    run_quietly "$build_dir/build.log" cmake --build --preset "$preset"
+}
