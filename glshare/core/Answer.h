@@ -1,0 +1,45 @@
+// Answers in the form of OpenCL's information queries.
+#pragma once
+
+#include "core/OpenCl.h"
+
+#include <cstddef>
+#include <cstring>
+#include <span>
+
+namespace glshare {
+
+// Where a query wants its answer; each pointer may be null.
+struct Query {
+    std::size_t size; // bytes at `value`
+    void* value;
+    std::size_t* sizeNeeded;
+};
+
+// CL_INVALID_VALUE if the answer does not fit.
+inline cl_int answer(std::span<const std::byte> bytes, const Query& query)
+{
+    if (query.value != nullptr) {
+        if (query.size < bytes.size())
+            return CL_INVALID_VALUE;
+        std::memcpy(query.value, bytes.data(), bytes.size());
+    }
+    if (query.sizeNeeded != nullptr)
+        *query.sizeNeeded = bytes.size();
+    return CL_SUCCESS;
+}
+
+template <typename T>
+cl_int answerWith(const T& value, const Query& query)
+{
+    return answer(std::as_bytes(std::span<const T, 1>(&value, 1)), query);
+}
+
+// Fills in an error code that a caller may not want.
+inline void setError(cl_int* result, cl_int error)
+{
+    if (result != nullptr)
+        *result = error;
+}
+
+} // namespace glshare

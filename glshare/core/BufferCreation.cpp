@@ -1,0 +1,96 @@
+#include "core/BufferCreation.h"
+
+#include "core/Registry.h"
+#include "core/Switches.h"
+
+#include <utility>
+
+namespace glshare {
+
+namespace {
+
+// Fills in the size and, if the storage can be used in place, its address and what keeps it alive.
+// The address is taken once more after pinning: only then is it known to stay. False if there is no
+// such buffer, or one without storage.
+bool describe(SharedBuffer& buffer, const GlDevice& device, bool inPlace)
+{
+    buffer.size = device.bufferSize(buffer.name).value_or(0);
+    if (buffer.size == 0)
+        return false;
+    if (!inPlace || device.address(buffer.name, buffer.size) == nullptr)
+        return true;
+    buffer.pin = device.pin(buffer.name);
+    buffer.storage = device.address(buffer.name, buffer.size);
+    return true;
+}
+
+void unpin(const SharedBuffer& buffer)
+{
+    if (buffer.pin == 0)
+        return;
+    buffer.context->worker().post([pin = buffer.pin](GlDevice* device) {
+        if (device != nullptr)
+            device->unpin(pin);
+    });
+}
+
+// The runtime calls this when nothing uses the memory object any more, on any thread.
+void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
+{
+    if (const std::shared_ptr<SharedBuffer> buffer = Registry::get().remove(memory))
+        unpin(*buffer);
+}
+
+cl_mem createMemory(cl_context handle, const SharedBuffer& buffer, cl_int& error)
+{
+    const cl_mem_flags where =
+        buffer.storage != nullptr ? CL_MEM_USE_HOST_PTR : CL_MEM_ALLOC_HOST_PTR;
+    return runtime().clCreateBuffer(handle, buffer.flags | where, buffer.size, buffer.storage,
+                                    &error);
+}
+
+bool areValidFlags(cl_mem_flags flags)
+{
+    return flags == CL_MEM_READ_WRITE || flags == CL_MEM_READ_ONLY || flags == CL_MEM_WRITE_ONLY;
+}
+
+} // namespace
+
+cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContext>& context,
+                          cl_mem_flags flags, cl_GLuint name, cl_int& error)
+{
+    auto buffer = std::make_shared<SharedBuffer>();
+    buffer->context = context;
+    buffer->name = name;
+    buffer->flags = flags == 0 ? cl_mem_flags{CL_MEM_READ_WRITE} : flags;
+    if (!areValidFlags(buffer->flags)) {
+        error = CL_INVALID_VALUE;
+        return nullptr;
+    }
+
+    const bool inPlace = switches().zeroCopy && context->canUseHostMemory();
+    bool isBuffer = false;
+    context->worker().call([&](GlDevice* device) {
+        isBuffer = device != nullptr && describe(*buffer, *device, inPlace);
+    });
+    if (!isBuffer) {
+        error = CL_INVALID_GL_OBJECT;
+        return nullptr;
+    }
+
+    buffer->memory = createMemory(handle, *buffer, error);
+    if (buffer->memory == nullptr) {
+        unpin(*buffer);
+        return nullptr;
+    }
+    cl_mem memory = buffer->memory;
+    Registry::get().add(handle, std::move(buffer));
+    error = runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
+    if (error == CL_SUCCESS)
+        return memory;
+    onDestroyed(memory, nullptr);
+    runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
+    return nullptr;
+}
+
+} // namespace glshare

@@ -1,0 +1,93 @@
+#include "core/ContextProperties.h"
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+
+namespace glshare {
+
+namespace {
+
+// The values of the OpenGL entries; zero where the list has none, which is the default of each.
+struct GlEntries {
+    cl_context_properties context = 0;
+    cl_context_properties egl = 0;
+    cl_context_properties glx = 0;
+    cl_context_properties wgl = 0;
+    cl_context_properties cgl = 0;
+
+    cl_context_properties* find(cl_context_properties name)
+    {
+        switch (name) {
+        case CL_GL_CONTEXT_KHR:
+            return &context;
+        case CL_EGL_DISPLAY_KHR:
+            return &egl;
+        case CL_GLX_DISPLAY_KHR:
+            return &glx;
+        case CL_WGL_HDC_KHR:
+            return &wgl;
+        case CL_CGL_SHAREGROUP_KHR:
+            return &cgl;
+        default:
+            return nullptr;
+        }
+    }
+};
+
+void* pointerOf(cl_context_properties value)
+{
+    return reinterpret_cast<void*>(value); // NOLINT(performance-no-int-to-ptr): the API's own form
+}
+
+cl_int findBinding(const GlEntries& gl, std::optional<GlBinding>& binding)
+{
+    const std::array displays{gl.egl, gl.glx, gl.wgl, gl.cgl};
+    const auto given = std::ranges::count_if(displays, [](auto value) { return value != 0; });
+    if (given > 1 || gl.wgl != 0 || gl.cgl != 0)
+        return CL_INVALID_OPERATION;
+    if (gl.context == 0)
+        return CL_SUCCESS;
+    if (given == 0)
+        return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
+    const GlBinding wanted =
+        gl.glx != 0 ? GlBinding{WindowSystem::Glx, pointerOf(gl.glx), pointerOf(gl.context)}
+                    : GlBinding{WindowSystem::Egl, pointerOf(gl.egl), pointerOf(gl.context)};
+    if (!isShareable(wanted))
+        return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
+    binding = wanted;
+    return CL_SUCCESS;
+}
+
+} // namespace
+
+ContextProperties parseProperties(const cl_context_properties* list)
+{
+    ContextProperties result;
+    GlEntries gl;
+    std::vector<cl_context_properties> glNames;
+    for (; list != nullptr && *list != 0; list += 2) {
+        const cl_context_properties name = list[0];
+        const cl_context_properties value = list[1];
+        result.original.insert(result.original.end(), {name, value});
+        if (cl_context_properties* entry = gl.find(name)) {
+            if (std::ranges::find(glNames, name) != glNames.end())
+                result.error = CL_INVALID_PROPERTY;
+            glNames.push_back(name);
+            *entry = value;
+            continue;
+        }
+        if (name == CL_CONTEXT_PLATFORM)
+            result.platform = static_cast<cl_platform_id>(pointerOf(value));
+        if (name == CL_CONTEXT_INTEROP_USER_SYNC)
+            result.userSynchronises = value == CL_TRUE;
+        result.forRuntime.insert(result.forRuntime.end(), {name, value});
+    }
+    result.original.push_back(0);
+    result.forRuntime.push_back(0);
+    if (result.error == CL_SUCCESS)
+        result.error = findBinding(gl, result.binding);
+    return result;
+}
+
+} // namespace glshare

@@ -1,0 +1,186 @@
+#include "core/Copies.h"
+
+#include "core/Counters.h"
+
+#include <cstddef>
+#include <memory>
+#include <utility>
+#include <vector>
+
+namespace glshare {
+
+namespace {
+
+// Owns the references of a list of events.
+class Events {
+public:
+    Events() = default;
+    ~Events()
+    {
+        for (cl_event event : events_)
+            runtime().clReleaseEvent(event);
+    }
+    Events(const Events&) = delete;
+    Events& operator=(const Events&) = delete;
+
+    // For a call that stores an event: a place at the end of the list, kept if the call succeeds.
+    template <typename Call>
+    cl_int add(Call call)
+    {
+        cl_event event = nullptr;
+        const cl_int error = call(&event);
+        if (error == CL_SUCCESS)
+            events_.push_back(event);
+        return error;
+    }
+
+    [[nodiscard]] cl_uint count() const { return static_cast<cl_uint>(events_.size()); }
+    [[nodiscard]] const cl_event* data() const { return events_.data(); }
+
+private:
+    std::vector<cl_event> events_;
+};
+
+// One batch of copies, from its commands to the end of its work. Shared by the caller, the
+// runtime's callback and the worker's job.
+struct Batch {
+    SharedBuffers buffers;
+    std::vector<void*> mapped; // where each buffer lies while it is mapped
+    CopyDirection direction;
+    cl_event copied = nullptr; // the user event; owned
+
+    ~Batch()
+    {
+        if (copied != nullptr)
+            runtime().clReleaseEvent(copied);
+    }
+};
+
+using BatchPointer = std::shared_ptr<Batch>;
+
+bool copy(GlDevice& device, const SharedBuffer& buffer, void* mapped, CopyDirection direction)
+{
+    return direction == CopyDirection::FromGl ? device.read(buffer.name, mapped, buffer.size)
+                                              : device.write(buffer.name, mapped, buffer.size);
+}
+
+// A buffer that is gone by now keeps what it holds: the application broke the rules after the
+// command was given, and all that is left is to end well.
+void copyAll(Batch& batch, GlDevice* device)
+{
+    for (std::size_t i = 0; i < batch.buffers.size(); ++i) {
+        const SharedBuffer& buffer = *batch.buffers[i];
+        if (device != nullptr && copy(*device, buffer, batch.mapped[i], batch.direction))
+            counters().bytesCopied += buffer.size;
+        else
+            ++counters().failedCopies;
+    }
+    runtime().clSetUserEventStatus(batch.copied, CL_COMPLETE);
+}
+
+// Comes on a thread of the runtime's, which must not be kept: the worker does the work.
+void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* user)
+{
+    const std::unique_ptr<BatchPointer> owner(static_cast<BatchPointer*>(user));
+    const BatchPointer batch = *owner;
+    if (status < 0) {
+        runtime().clSetUserEventStatus(batch->copied, status);
+        return;
+    }
+    const std::shared_ptr<SharingContext> context = batch->buffers.front()->context;
+    context->worker().post([batch](GlDevice* device) { copyAll(*batch, device); });
+}
+
+cl_int mapAll(cl_command_queue queue, Batch& batch, std::span<const cl_event> waitList,
+              Events& events)
+{
+    const cl_map_flags access =
+        batch.direction == CopyDirection::FromGl ? CL_MAP_WRITE : CL_MAP_READ;
+    for (const auto& buffer : batch.buffers) {
+        const cl_int error = events.add([&](cl_event* event) {
+            cl_int status = CL_SUCCESS;
+            void* mapped = runtime().clEnqueueMapBuffer(
+                queue, buffer->memory, CL_FALSE, access, 0, buffer->size,
+                static_cast<cl_uint>(waitList.size()), waitList.data(), event, &status);
+            if (status == CL_SUCCESS)
+                batch.mapped.push_back(mapped);
+            return status;
+        });
+        if (error != CL_SUCCESS)
+            return error;
+    }
+    return CL_SUCCESS;
+}
+
+cl_int unmapAll(cl_command_queue queue, const Batch& batch, Events& events)
+{
+    cl_int result = CL_SUCCESS;
+    for (std::size_t i = 0; i < batch.mapped.size(); ++i) {
+        const cl_int error = events.add([&](cl_event* event) {
+            return runtime().clEnqueueUnmapMemObject(queue, batch.buffers[i]->memory,
+                                                     batch.mapped[i], 1, &batch.copied, event);
+        });
+        if (error != CL_SUCCESS)
+            result = error;
+    }
+    return result;
+}
+
+// The commands after the maps. The callback comes last: until it is set, the caller alone decides
+// about the user event.
+cl_int enqueueRest(cl_command_queue queue, const BatchPointer& batch, const Events& maps,
+                   Events& unmaps, cl_event* done)
+{
+    Events mapped;
+    cl_int error = mapped.add([&](cl_event* event) {
+        return runtime().clEnqueueMarkerWithWaitList(queue, maps.count(), maps.data(), event);
+    });
+    if (error == CL_SUCCESS)
+        error = unmapAll(queue, *batch, unmaps);
+    if (error != CL_SUCCESS)
+        return error;
+    error = runtime().clEnqueueMarkerWithWaitList(queue, unmaps.count(), unmaps.data(), done);
+    if (error != CL_SUCCESS)
+        return error;
+    auto owner = std::make_unique<BatchPointer>(batch);
+    error = runtime().clSetEventCallback(*mapped.data(), CL_COMPLETE, onMapped, owner.get());
+    if (error != CL_SUCCESS) {
+        runtime().clReleaseEvent(std::exchange(*done, nullptr)); // the caller gets none
+        return error;
+    }
+    static_cast<void>(owner.release()); // onMapped's
+    return CL_SUCCESS;
+}
+
+} // namespace
+
+cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers, CopyDirection direction,
+                     std::span<const cl_event> waitList, cl_event* done)
+{
+    cl_context context = nullptr;
+    cl_int error =
+        runtime().clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof context, &context, nullptr);
+    if (error != CL_SUCCESS)
+        return error;
+    const auto batch = std::make_shared<Batch>();
+    batch->buffers = std::move(buffers);
+    batch->direction = direction;
+    batch->copied = runtime().clCreateUserEvent(context, &error);
+    if (error != CL_SUCCESS)
+        return error;
+
+    Events maps;
+    Events unmaps;
+    error = mapAll(queue, *batch, waitList, maps);
+    if (error == CL_SUCCESS)
+        error = enqueueRest(queue, batch, maps, unmaps, done);
+    if (error == CL_SUCCESS)
+        return CL_SUCCESS;
+    // What was mapped is unmapped again, if that is not in the queue already.
+    if (unmaps.count() == 0)
+        static_cast<void>(unmapAll(queue, *batch, unmaps));
+    runtime().clSetUserEventStatus(batch->copied, CL_COMPLETE);
+    return error;
+}
+
+} // namespace glshare

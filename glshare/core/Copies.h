@@ -1,0 +1,24 @@
+// Acquires and releases that have to copy: commands in the application's queue around work on the
+// GL side.
+#pragma once
+
+#include "core/SharingContext.h"
+
+#include <span>
+
+namespace glshare {
+
+enum class CopyDirection { FromGl, ToGl };
+
+// Enqueues the copies of `buffers`, which is not empty and of one context, after `waitList` and in
+// the order of `queue`. Never waits. On success `done` gets an event, owned by the caller, that
+// completes after the last copy; on failure nothing is left in the queue that would not complete.
+//
+//   in the queue   map each buffer ─► unmap each buffer ─► done
+//                        │                 ▲
+//   the worker           └───► copies ─────┘ (a user event)
+[[nodiscard]] cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers,
+                                   CopyDirection direction, std::span<const cl_event> waitList,
+                                   cl_event* done);
+
+} // namespace glshare

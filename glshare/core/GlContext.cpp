@@ -1,0 +1,19 @@
+#include "core/GlContext.h"
+
+namespace glshare {
+
+bool isShareable(const GlBinding& binding)
+{
+    return binding.windowSystem == WindowSystem::Glx
+               ? isShareableGlx(binding.display, binding.context)
+               : isShareableEgl(binding.display, binding.context);
+}
+
+std::unique_ptr<GlContext> createSharingContext(const GlBinding& binding)
+{
+    return binding.windowSystem == WindowSystem::Glx
+               ? createGlxContext(binding.display, binding.context)
+               : createEglContext(binding.display, binding.context);
+}
+
+} // namespace glshare

@@ -1,0 +1,51 @@
+// The OpenGL functions this program calls, resolved at run time: nothing links an OpenGL library,
+// so a process that shares through EGL never loads GLX, and the other way round.
+#pragma once
+
+#include <GL/gl.h>
+#include <GL/glext.h>
+
+namespace glshare {
+
+struct GlFunctions {
+    using Resolver = void* (*)(const char* name);
+
+    // Fills the table; false if a function is missing. The functions act on the context that is
+    // current on the calling thread.
+    [[nodiscard]] bool load(Resolver resolve);
+
+    const GLubyte*(APIENTRYP getString)(GLenum) = nullptr;
+    void(APIENTRYP finish)() = nullptr;
+    GLenum(APIENTRYP getError)() = nullptr;
+
+    PFNGLISBUFFERPROC isBuffer = nullptr;
+    PFNGLGENBUFFERSPROC genBuffers = nullptr;
+    PFNGLBINDBUFFERPROC bindBuffer = nullptr;
+    PFNGLBINDBUFFERBASEPROC bindBufferBase = nullptr;
+    PFNGLBUFFERDATAPROC bufferData = nullptr;
+    PFNGLCOPYBUFFERSUBDATAPROC copyBufferSubData = nullptr;
+    PFNGLGETBUFFERPARAMETERI64VPROC getBufferParameteri64v = nullptr;
+    PFNGLMAPBUFFERRANGEPROC mapBufferRange = nullptr;
+    PFNGLUNMAPBUFFERPROC unmapBuffer = nullptr;
+
+    PFNGLFENCESYNCPROC fenceSync = nullptr;
+    PFNGLISSYNCPROC isSync = nullptr;
+    PFNGLCLIENTWAITSYNCPROC clientWaitSync = nullptr;
+
+    PFNGLCREATESHADERPROC createShader = nullptr;
+    PFNGLSHADERSOURCEPROC shaderSource = nullptr;
+    PFNGLCOMPILESHADERPROC compileShader = nullptr;
+    PFNGLCREATEPROGRAMPROC createProgram = nullptr;
+    PFNGLATTACHSHADERPROC attachShader = nullptr;
+    PFNGLTRANSFORMFEEDBACKVARYINGSPROC transformFeedbackVaryings = nullptr;
+    PFNGLLINKPROGRAMPROC linkProgram = nullptr;
+    PFNGLGETPROGRAMIVPROC getProgramiv = nullptr;
+    PFNGLUSEPROGRAMPROC useProgram = nullptr;
+    PFNGLGENTRANSFORMFEEDBACKSPROC genTransformFeedbacks = nullptr;
+    PFNGLDELETETRANSFORMFEEDBACKSPROC deleteTransformFeedbacks = nullptr;
+    PFNGLBINDTRANSFORMFEEDBACKPROC bindTransformFeedback = nullptr;
+    PFNGLBEGINTRANSFORMFEEDBACKPROC beginTransformFeedback = nullptr;
+    PFNGLENDTRANSFORMFEEDBACKPROC endTransformFeedback = nullptr;
+};
+
+} // namespace glshare

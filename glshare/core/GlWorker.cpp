@@ -1,0 +1,75 @@
+#include "core/GlWorker.h"
+
+#include "core/GlWorkerLoop.h"
+
+#include <future>
+#include <utility>
+
+namespace glshare {
+
+std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
+{
+    auto loop = std::make_shared<Loop>(std::move(context));
+    std::promise<bool> started;
+    std::future<bool> isRunning = started.get_future();
+    std::unique_ptr<GlWorker> worker(new GlWorker(loop));
+    worker->thread_ = std::thread([loop = std::move(loop), promise = std::move(started)]() mutable {
+        const bool isUsable = loop->begin();
+        promise.set_value(isUsable);
+        if (isUsable)
+            loop->run();
+    });
+    if (!isRunning.get())
+        return nullptr;
+    Loop::listenForDisplay(worker->loop_);
+    Loop::listenForExit(worker->loop_);
+    return worker;
+}
+
+GlWorker::GlWorker(std::shared_ptr<Loop> loop) : loop_(std::move(loop)) {}
+
+GlWorker::~GlWorker()
+{
+    stop();
+}
+
+void GlWorker::stop()
+{
+    const bool ends = loop_->requestStop();
+    if (!ends || thread_.get_id() == std::this_thread::get_id())
+        thread_.detach();
+    else
+        thread_.join();
+}
+
+void GlWorker::post(Job job)
+{
+    loop_->post(std::move(job));
+}
+
+void GlWorker::call(const Job& job)
+{
+    std::promise<void> done;
+    loop_->post([&](GlDevice* device) {
+        job(device);
+        done.set_value();
+    });
+    done.get_future().wait();
+}
+
+void GlWorker::watch(Watch watch)
+{
+    loop_->watch(std::move(watch));
+}
+
+bool GlWorker::callerSharesObjects() const
+{
+    return loop_->callerSharesObjects();
+}
+
+void GlWorker::finishCaller() const
+{
+    loop_->finishCaller();
+}
+
+} // namespace glshare

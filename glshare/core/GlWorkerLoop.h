@@ -1,0 +1,70 @@
+// What runs on a worker's thread; part of GlWorker. It outlives the GlWorker where that ends on its
+// own thread or in a process that is exiting.
+#pragma once
+
+#include "core/GlWorker.h"
+
+#include <atomic>
+#include <condition_variable>
+#include <deque>
+#include <mutex>
+#include <optional>
+#include <vector>
+
+namespace glshare {
+
+class GlWorker::Loop {
+public:
+    explicit Loop(std::unique_ptr<GlContext> context);
+
+    // On the worker's thread: takes the context; false if it cannot be used.
+    [[nodiscard]] bool begin();
+
+    // On the worker's thread: works until requestStop, and then until nothing is left to do.
+    void run();
+
+    // The following on any thread.
+
+    void post(Job job);
+    void watch(Watch watch);
+
+    // False if the thread will not end any more, since the process is exiting.
+    [[nodiscard]] bool requestStop();
+
+    [[nodiscard]] bool callerSharesObjects() const;
+    void finishCaller() const;
+
+    // Lets go of the GL side when its display closes, and parks the thread when the process exits:
+    // the exit handlers of the drivers must not run beside a thread that uses them.
+    static void listenForDisplay(const std::shared_ptr<Loop>& loop);
+    static void listenForExit(const std::shared_ptr<Loop>& loop);
+
+private:
+    struct Running;
+    using Lock = std::unique_lock<std::mutex>;
+
+    void leaveDisplay();
+    void park();
+    static void parkAll();
+
+    // With the lock held; the lock is given up while foreign code runs.
+    void runJob(Lock& lock);
+    void lookAtWatches(Lock& lock);
+    void letGoOfDisplay(Lock& lock);
+    [[nodiscard]] GlDevice* device();
+
+    std::unique_ptr<GlContext> context_;
+    std::optional<GlDevice> device_; // unchanged once begin has returned
+    std::atomic<bool> hasGl_{false};
+
+    std::mutex mutex_; // guards everything below
+    std::condition_variable changed_;
+    std::deque<Job> jobs_;
+    std::vector<Watch> watches_;
+    bool isBusy_ = false;
+    bool isStopping_ = false;
+    bool isDisplayClosing_ = false;
+    bool isExiting_ = false;
+};
+
+} // namespace glshare

@@ -1,0 +1,258 @@
+// Implements GlContext for GLX.
+//
+// The context lives on the application's own display connection: the drivers share objects between
+// contexts of one connection, and each connection has a screen object of its own that must outlive
+// the storage. Xlib locks a connection by itself since 1.8; applications on older ones that use
+// several threads call XInitThreads anyway. When the application closes the connection, Xlib tells
+// us first.
+#include "core/GlContext.h"
+
+#include <GL/glx.h>
+#include <X11/Xlib.h>
+#include <dlfcn.h>
+
+#include <array>
+#include <functional>
+#include <map>
+#include <mutex>
+#include <utility>
+
+namespace glshare {
+
+namespace {
+
+// XESetCloseDisplay, which only Xlib's internal header declares. That header suits no C++ program.
+using CloseDisplayHook = int (*)(Display*, XExtCodes*);
+using SetCloseDisplay = CloseDisplayHook (*)(Display*, int extension, CloseDisplayHook);
+
+// The libraries are never closed: their hooks and exit handlers may outlive every context.
+struct GlxFunctions {
+    decltype(&::glXGetProcAddressARB) getProcAddress = nullptr;
+    decltype(&::glXChooseFBConfig) chooseFBConfig = nullptr;
+    decltype(&::glXDestroyContext) destroyContext = nullptr;
+    decltype(&::glXGetCurrentContext) getCurrentContext = nullptr;
+    decltype(&::glXMakeContextCurrent) makeContextCurrent = nullptr;
+    decltype(&::glXQueryContext) queryContext = nullptr;
+    PFNGLXCREATECONTEXTATTRIBSARBPROC createContextAttribs = nullptr;
+    decltype(&::XAddExtension) addExtension = nullptr;
+    SetCloseDisplay setCloseDisplay = nullptr;
+    decltype(&::XSetErrorHandler) setErrorHandler = nullptr;
+    decltype(&::XSync) sync = nullptr;
+    decltype(&::XFree) free = nullptr;
+    bool complete = false;
+
+    GlxFunctions()
+    {
+        void* gl = dlopen("libGL.so.1", RTLD_LAZY);
+        void* x11 = dlopen("libX11.so.6", RTLD_LAZY);
+        if (gl == nullptr || x11 == nullptr)
+            return;
+        const auto found = [](void* library, auto& function, const char* name) {
+            function =
+                reinterpret_cast<std::remove_reference_t<decltype(function)>>(dlsym(library, name));
+            return function != nullptr;
+        };
+        complete = found(gl, getProcAddress, "glXGetProcAddressARB") &&
+                   found(gl, chooseFBConfig, "glXChooseFBConfig") &&
+                   found(gl, destroyContext, "glXDestroyContext") &&
+                   found(gl, getCurrentContext, "glXGetCurrentContext") &&
+                   found(gl, makeContextCurrent, "glXMakeContextCurrent") &&
+                   found(gl, queryContext, "glXQueryContext") &&
+                   found(x11, addExtension, "XAddExtension") &&
+                   found(x11, setCloseDisplay, "XESetCloseDisplay") &&
+                   found(x11, setErrorHandler, "XSetErrorHandler") && found(x11, sync, "XSync") &&
+                   found(x11, free, "XFree");
+        if (!complete)
+            return;
+        createContextAttribs = reinterpret_cast<PFNGLXCREATECONTEXTATTRIBSARBPROC>(
+            getProcAddress(reinterpret_cast<const GLubyte*>("glXCreateContextAttribsARB")));
+        complete = createContextAttribs != nullptr;
+    }
+};
+
+const GlxFunctions& glx()
+{
+    static const GlxFunctions theFunctions;
+    return theFunctions;
+}
+
+void* resolveGl(const char* name)
+{
+    return reinterpret_cast<void*>(glx().getProcAddress(reinterpret_cast<const GLubyte*>(name)));
+}
+
+// Who must be told when a display connection closes, and with that which connections have our hook.
+class OpenDisplays {
+public:
+    using Listener = std::function<void()>;
+
+    // Sets the hook where there is none yet.
+    void open(Display* display);
+
+    void listen(Display* display, GLXContext context, Listener listener);
+
+    // Destroys a context, unless its display is closed or is closing.
+    void destroy(Display* display, GLXContext context);
+
+private:
+    // Xlib's hook: runs in XCloseDisplay, before GLX's own, since the newest extension comes first.
+    static int closing(Display* display, XExtCodes* codes);
+
+    std::mutex mutex_; // guards listeners_
+    std::map<Display*, std::map<GLXContext, Listener>> listeners_;
+};
+
+OpenDisplays& openDisplays()
+{
+    // Never destroyed, so that a display closed at exit still finds it.
+    static auto* const theDisplays = new OpenDisplays;
+    return *theDisplays;
+}
+
+void OpenDisplays::open(Display* display)
+{
+    const std::scoped_lock lock(mutex_);
+    if (!listeners_.try_emplace(display).second)
+        return;
+    if (const XExtCodes* codes = glx().addExtension(display); codes != nullptr)
+        glx().setCloseDisplay(display, codes->extension, closing);
+}
+
+void OpenDisplays::listen(Display* display, GLXContext context, Listener listener)
+{
+    const std::scoped_lock lock(mutex_);
+    listeners_[display].insert_or_assign(context, std::move(listener));
+}
+
+// The lock is held throughout, so that the display cannot go in the meantime. An entry without
+// listeners stays as long as its display: it says that the hook is set.
+void OpenDisplays::destroy(Display* display, GLXContext context)
+{
+    const std::scoped_lock lock(mutex_);
+    const auto entry = listeners_.find(display);
+    if (entry == listeners_.end())
+        return;
+    entry->second.erase(context);
+    glx().destroyContext(display, context);
+}
+
+int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
+{
+    OpenDisplays& displays = openDisplays();
+    std::map<GLXContext, Listener> listeners;
+    {
+        const std::scoped_lock lock(displays.mutex_);
+        if (auto entry = displays.listeners_.extract(display))
+            listeners = std::move(entry.mapped());
+    }
+    for (const auto& [context, listener] : listeners)
+        listener();
+    return 0;
+}
+
+class GlxContext final : public GlContext {
+public:
+    GlxContext(Display* display, GLXContext context) : display_(display), context_(context) {}
+
+    ~GlxContext() override
+    {
+        if (context_ != nullptr)
+            openDisplays().destroy(display_, context_);
+    }
+
+    bool makeCurrent() override
+    {
+        return glx().makeContextCurrent(display_, None, None, context_) == True;
+    }
+
+    void releaseCurrent() override { glx().makeContextCurrent(display_, None, None, nullptr); }
+
+    void abandon() override { context_ = nullptr; }
+
+    bool callerHasContext() const override { return glx().getCurrentContext() != nullptr; }
+
+    GlFunctions::Resolver resolver() const override { return resolveGl; }
+
+    void onDisplayClosing(std::function<void()> closing) override
+    {
+        openDisplays().listen(display_, context_, std::move(closing));
+    }
+
+private:
+    Display* display_;
+    GLXContext context_;
+};
+
+// Xlib ends the process on an error that nobody handles, and has one handler for all threads. This
+// one takes its place while a context is created, which is the only request that can be refused.
+class ErrorTrap {
+public:
+    explicit ErrorTrap(Display* display) : display_(display)
+    {
+        glx().sync(display_, False);
+        previous_ = glx().setErrorHandler([](Display*, XErrorEvent*) { return 0; });
+    }
+    ~ErrorTrap()
+    {
+        glx().sync(display_, False);
+        glx().setErrorHandler(previous_);
+    }
+    ErrorTrap(const ErrorTrap&) = delete;
+    ErrorTrap& operator=(const ErrorTrap&) = delete;
+
+private:
+    Display* display_;
+    XErrorHandler previous_ = nullptr;
+};
+
+GLXFBConfig configOf(Display* display, GLXContext context)
+{
+    int id = 0;
+    int screen = 0;
+    glx().queryContext(display, context, GLX_FBCONFIG_ID, &id);
+    glx().queryContext(display, context, GLX_SCREEN, &screen);
+    const std::array<int, 3> wanted{GLX_FBCONFIG_ID, id, None};
+    int count = 0;
+    GLXFBConfig* found = glx().chooseFBConfig(display, screen, wanted.data(), &count);
+    if (found == nullptr)
+        return nullptr;
+    GLXFBConfig config = count > 0 ? *found : nullptr;
+    glx().free(found);
+    return config;
+}
+
+} // namespace
+
+// GLX offers no question that is safe to ask about a handle that may be bad.
+bool isShareableGlx(void* display, void* context)
+{
+    return display != nullptr && context != nullptr && glx().complete;
+}
+
+std::unique_ptr<GlContext> createGlxContext(void* display, void* shareContext)
+{
+    if (!isShareableGlx(display, shareContext))
+        return nullptr;
+    auto* const x = static_cast<Display*>(display);
+    auto* const share = static_cast<GLXContext>(shareContext);
+
+    // 3.3 is the oldest version that has all we call, and works without a drawable.
+    const std::array<int, 7> attributes{GLX_CONTEXT_MAJOR_VERSION_ARB,
+                                        3,
+                                        GLX_CONTEXT_MINOR_VERSION_ARB,
+                                        3,
+                                        GLX_CONTEXT_PROFILE_MASK_ARB,
+                                        GLX_CONTEXT_CORE_PROFILE_BIT_ARB,
+                                        None};
+    const ErrorTrap trap(x);
+    GLXFBConfig config = configOf(x, share);
+    if (config == nullptr)
+        return nullptr;
+    GLXContext context = glx().createContextAttribs(x, config, share, True, attributes.data());
+    if (context == nullptr)
+        return nullptr;
+    openDisplays().open(x);
+    return std::make_unique<GlxContext>(x, context);
+}
+
+} // namespace glshare

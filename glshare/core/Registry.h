@@ -1,0 +1,57 @@
+// Which of the application's handles mean something here. Handles that are not found belong to the
+// runtime alone.
+#pragma once
+
+#include "core/SharingContext.h"
+
+#include <cstddef>
+#include <memory>
+#include <mutex>
+#include <unordered_map>
+
+namespace glshare {
+
+// Safe from any thread.
+class Registry {
+public:
+    // Never destroyed: objects may be released in exit handlers.
+    static Registry& get();
+
+    // A context lives here as long as the application holds references to it or to shared buffers
+    // in it. The application's references are counted here, as the runtime's own count has other
+    // owners too.
+    void add(cl_context handle, std::shared_ptr<SharingContext> context);
+    void retain(cl_context handle);
+    void release(cl_context handle);
+    [[nodiscard]] std::shared_ptr<SharingContext> find(cl_context handle);
+
+    void add(cl_context handle, std::shared_ptr<SharedBuffer> buffer);
+    [[nodiscard]] std::shared_ptr<SharedBuffer> find(cl_mem handle);
+
+    // The records of `count` handles in their order, up to the first that is unknown.
+    [[nodiscard]] SharedBuffers find(const cl_mem* handles, std::size_t count);
+
+    // When the runtime destroys the memory object. Null if it is unknown.
+    std::shared_ptr<SharedBuffer> remove(cl_mem handle);
+
+private:
+    struct ContextEntry {
+        std::shared_ptr<SharingContext> context;
+        std::size_t references = 1; // the application's
+        std::size_t buffers = 0;
+    };
+    struct BufferEntry {
+        cl_context context;
+        std::shared_ptr<SharedBuffer> buffer;
+    };
+
+    // Under the lock: the context if nobody needs its entry any more. The caller drops it without
+    // the lock, as that ends a thread.
+    [[nodiscard]] std::shared_ptr<SharingContext> takeUnused(cl_context handle);
+
+    std::mutex mutex_; // guards both maps
+    std::unordered_map<cl_context, ContextEntry> contexts_;
+    std::unordered_map<cl_mem, BufferEntry> buffers_;
+};
+
+} // namespace glshare

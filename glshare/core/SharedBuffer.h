@@ -1,0 +1,30 @@
+// An OpenCL memory object made from an OpenGL buffer.
+#pragma once
+
+#include "core/OpenCl.h"
+
+#include <cstddef>
+#include <memory>
+
+namespace glshare {
+
+class SharingContext;
+
+// Everything but the last two fields is fixed once the object exists; those are guarded by the
+// sharing context.
+struct SharedBuffer {
+    cl_mem memory = nullptr; // the runtime's own object, borrowed: this record ends with it
+    std::shared_ptr<SharingContext> context;
+    cl_GLuint name = 0;
+    std::size_t size = 0; // bytes
+    cl_mem_flags flags = 0;
+    // The GL storage that `memory` lies over, kept alive by `pin`; null if it has storage of its
+    // own.
+    void* storage = nullptr;
+    cl_GLuint pin = 0;
+
+    bool isAcquired = false;
+    bool isCopied = false; // how it was acquired; the release goes the same way
+};
+
+} // namespace glshare

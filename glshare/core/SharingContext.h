@@ -1,0 +1,43 @@
+// What this program keeps for an OpenCL context that was made with an OpenGL context in its
+// properties.
+#pragma once
+
+#include "core/ContextProperties.h"
+#include "core/GlWorker.h"
+#include "core/SharedBuffer.h"
+
+#include <memory>
+#include <mutex>
+#include <span>
+#include <vector>
+
+namespace glshare {
+
+using SharedBuffers = std::vector<std::shared_ptr<SharedBuffer>>;
+
+class SharingContext {
+public:
+    // `canUseHostMemory` says that every device of the context works in the host's own memory.
+    SharingContext(std::unique_ptr<GlWorker> worker, ContextProperties properties,
+                   bool canUseHostMemory);
+
+    [[nodiscard]] const ContextProperties& properties() const { return properties_; }
+    [[nodiscard]] bool canUseHostMemory() const { return canUseHostMemory_; }
+    [[nodiscard]] GlWorker& worker() const { return *worker_; }
+
+    // Whether a command given on the calling thread must be ordered against the OpenGL context that
+    // is current there.
+    [[nodiscard]] bool isOrderedWithCaller() const;
+
+    // Marks all as acquired, or as released, in one step; false, and nothing changed, if one of
+    // them is so already, or stands in the list twice.
+    [[nodiscard]] bool setAcquired(const SharedBuffers& buffers, bool acquired);
+
+private:
+    std::unique_ptr<GlWorker> worker_;
+    ContextProperties properties_;
+    bool canUseHostMemory_;
+    std::mutex mutex_; // guards SharedBuffer::isAcquired
+};
+
+} // namespace glshare

@@ -1,0 +1,138 @@
+// Implements the context functions of EntryPoints.h.
+#include "core/Answer.h"
+#include "core/Devices.h"
+#include "core/Registry.h"
+#include "entry/EntryPoints.h"
+
+#include <algorithm>
+#include <memory>
+#include <span>
+#include <utility>
+#include <vector>
+
+namespace glshare::entry {
+
+namespace {
+
+bool shareByThemselves(std::span<const cl_device_id> devices)
+{
+    return !devices.empty() && std::ranges::all_of(devices, sharesByItself);
+}
+
+bool workInHostMemory(std::span<const cl_device_id> devices)
+{
+    return std::ranges::all_of(
+        devices, [](cl_device_id device) { return (ownType(device) & CL_DEVICE_TYPE_CPU) != 0; });
+}
+
+// Makes a context on `devices`. `create` asks the runtime for it, with the properties it gets.
+template <typename Create>
+cl_context createSharing(const cl_context_properties* properties,
+                         std::span<const cl_device_id> devices, cl_int* error, Create create)
+{
+    ContextProperties parsed = parseProperties(properties);
+    if (parsed.original == parsed.forRuntime || shareByThemselves(devices))
+        return create(properties, error);
+    if (parsed.error != CL_SUCCESS) {
+        setError(error, parsed.error);
+        return nullptr;
+    }
+    if (!parsed.binding)
+        return create(parsed.forRuntime.data(), error);
+
+    std::unique_ptr<GlContext> gl = createSharingContext(*parsed.binding);
+    std::unique_ptr<GlWorker> worker = gl == nullptr ? nullptr : GlWorker::start(std::move(gl));
+    if (worker == nullptr) {
+        setError(error, CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR);
+        return nullptr;
+    }
+    cl_context context = create(parsed.forRuntime.data(), error);
+    if (context != nullptr)
+        Registry::get().add(context,
+                            std::make_shared<SharingContext>(std::move(worker), std::move(parsed),
+                                                             workInHostMemory(devices)));
+    return context;
+}
+
+} // namespace
+
+cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl_uint count,
+                                     const cl_device_id* devices, ContextNotify notify, void* user,
+                                     cl_int* error)
+{
+    const std::span<const cl_device_id> list(devices, devices == nullptr ? 0 : count);
+    return createSharing(
+        properties, list, error, [&](const cl_context_properties* forRuntime, cl_int* result) {
+            return runtime().clCreateContext(forRuntime, count, devices, notify, user, result);
+        });
+}
+
+cl_context CL_API_CALL createContextFromType(const cl_context_properties* properties,
+                                             cl_device_type type, ContextNotify notify, void* user,
+                                             cl_int* error)
+{
+    const auto asked = typeToAskFor(type);
+    if (!asked) {
+        setError(error, CL_DEVICE_NOT_FOUND);
+        return nullptr;
+    }
+    const ContextProperties parsed = parseProperties(properties);
+    const std::vector<cl_device_id> devices = devicesOf(platformOrFirst(parsed.platform), type);
+    return createSharing(
+        properties, devices, error, [&](const cl_context_properties* forRuntime, cl_int* result) {
+            return runtime().clCreateContextFromType(forRuntime, *asked, notify, user, result);
+        });
+}
+
+cl_int CL_API_CALL retainContext(cl_context context)
+{
+    const cl_int error = runtime().clRetainContext(context);
+    if (error == CL_SUCCESS)
+        Registry::get().retain(context);
+    return error;
+}
+
+// Our own record goes first: afterwards the handle may be another context's.
+cl_int CL_API_CALL releaseContext(cl_context context)
+{
+    Registry::get().release(context);
+    return runtime().clReleaseContext(context);
+}
+
+cl_int CL_API_CALL getContextInfo(cl_context context, cl_context_info name, std::size_t size,
+                                  void* value, std::size_t* sizeNeeded)
+{
+    if (name == CL_CONTEXT_PROPERTIES) {
+        if (const auto sharing = Registry::get().find(context))
+            return answer(std::as_bytes(std::span(sharing->properties().original)),
+                          {size, value, sizeNeeded});
+    }
+    return runtime().clGetContextInfo(context, name, size, value, sizeNeeded);
+}
+
+cl_int CL_API_CALL getGlContextInfo(const cl_context_properties* properties,
+                                    cl_gl_context_info name, std::size_t size, void* value,
+                                    std::size_t* sizeNeeded)
+{
+    const ContextProperties parsed = parseProperties(properties);
+    cl_platform_id platform = platformOrFirst(parsed.platform);
+    const std::vector<cl_device_id> devices = devicesOf(platform, CL_DEVICE_TYPE_ALL);
+    if (devices.empty())
+        return CL_INVALID_PLATFORM;
+    if (shareByThemselves(devices))
+        return runtime().clGetGLContextInfoKHR(properties, name, size, value, sizeNeeded);
+    if (parsed.error != CL_SUCCESS)
+        return parsed.error;
+    if (!parsed.binding)
+        return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
+    switch (name) {
+    case CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR:
+        return answerWith(devices.front(), {size, value, sizeNeeded});
+    case CL_DEVICES_FOR_GL_CONTEXT_KHR:
+        return answer(std::as_bytes(std::span(devices)), {size, value, sizeNeeded});
+    default:
+        return CL_INVALID_VALUE;
+    }
+}
+
+} // namespace glshare::entry

@@ -1,0 +1,60 @@
+#include "EglTestContext.h"
+
+#include <EGL/eglext.h>
+
+#include <array>
+
+EGLDisplay EglTestContext::display()
+{
+    static EGLDisplay const theDisplay = [] {
+        const auto getPlatformDisplay = reinterpret_cast<PFNEGLGETPLATFORMDISPLAYEXTPROC>(
+            eglGetProcAddress("eglGetPlatformDisplayEXT"));
+        EGLDisplay display =
+            getPlatformDisplay == nullptr
+                ? EGL_NO_DISPLAY
+                : getPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr);
+        return eglInitialize(display, nullptr, nullptr) == EGL_TRUE ? display : EGL_NO_DISPLAY;
+    }();
+    return theDisplay;
+}
+
+EglTestContext::EglTestContext(const EglTestContext* share)
+{
+    eglBindAPI(EGL_OPENGL_API);
+    const std::array<EGLint, 5> wanted{EGL_SURFACE_TYPE, EGL_PBUFFER_BIT, EGL_RENDERABLE_TYPE,
+                                       EGL_OPENGL_BIT, EGL_NONE};
+    EGLConfig config = nullptr;
+    EGLint count = 0;
+    if (eglChooseConfig(display(), wanted.data(), &config, 1, &count) != EGL_TRUE || count == 0)
+        return;
+    const std::array<EGLint, 5> attributes{EGL_CONTEXT_MAJOR_VERSION, 4, EGL_CONTEXT_MINOR_VERSION,
+                                           5, EGL_NONE};
+    context_ = eglCreateContext(
+        display(), config, share == nullptr ? EGL_NO_CONTEXT : share->context_, attributes.data());
+}
+
+EglTestContext::~EglTestContext()
+{
+    destroy();
+}
+
+void EglTestContext::makeCurrent() const
+{
+    eglBindAPI(EGL_OPENGL_API);
+    eglMakeCurrent(display(), EGL_NO_SURFACE, EGL_NO_SURFACE, context_);
+}
+
+void EglTestContext::releaseCurrent()
+{
+    eglMakeCurrent(display(), EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
+}
+
+void EglTestContext::destroy()
+{
+    if (context_ == EGL_NO_CONTEXT)
+        return;
+    if (eglGetCurrentContext() == context_)
+        releaseCurrent();
+    eglDestroyContext(display(), context_);
+    context_ = EGL_NO_CONTEXT;
+}

@@ -1,0 +1,31 @@
+// An OpenGL context for tests, which needs no display.
+#pragma once
+
+#include <EGL/egl.h>
+
+class EglTestContext {
+public:
+    // The process's one display without a window system, initialised; EGL_NO_DISPLAY if there is
+    // none.
+    static EGLDisplay display();
+
+    // Shares its objects with `share`, which may be null. Not current on any thread; valid() tells.
+    explicit EglTestContext(const EglTestContext* share = nullptr);
+    ~EglTestContext();
+
+    EglTestContext(const EglTestContext&) = delete;
+    EglTestContext& operator=(const EglTestContext&) = delete;
+
+    [[nodiscard]] bool valid() const { return context_ != EGL_NO_CONTEXT; }
+    [[nodiscard]] EGLContext handle() const { return context_; }
+
+    // On the calling thread.
+    void makeCurrent() const;
+    static void releaseCurrent();
+
+    // Destroys the context early.
+    void destroy();
+
+private:
+    EGLContext context_ = EGL_NO_CONTEXT;
+};
