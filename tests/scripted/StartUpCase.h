@@ -1,0 +1,71 @@
+// One start-up of the library: what it meets, and what it prints, answers and leaves.
+#pragma once
+
+#include "ScriptedTest.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <functional>
+#include <ostream>
+#include <utility>
+
+namespace scripted {
+
+struct StartUp {
+    World world;
+    StartArguments arguments;
+    std::vector<std::pair<const char*, const char*>> environment;
+    std::vector<Fault> faults;
+
+    std::string error;  // on standard error; preset to the text of a start-up without incident
+    std::string output; // on standard output
+    Lines warnings;
+    Lines misuse;
+    bool valid = true;
+    OpenCLProvider provider = kIntelProvider;
+    int minimumBufferSize = 500;
+    bool asyncReadback = true;
+    bool doublePrecision = true;
+    std::string device = "device#1";
+    std::pair<int, int> modes{1, 1}; // graphics to OpenCL, OpenCL to graphics
+    Lines left{"context#1 x1", "queue#1 x1", "queue#2 x1"};
+
+    // The texts of the steps so far, for a start-up that goes on or stops there.
+    std::string platformText(const std::string& vendor) const;
+    std::string deviceText(const std::string& name = "Scripted GPU") const;
+
+    // Start-up stops, having printed `text` last, before it has chosen a platform, a device, or
+    // after it has made the context. Later steps' answers keep their initial values.
+    void stopsBeforePlatform(const std::string& text);
+    void stopsBeforeDevice(const std::string& text);
+    void stopsWithContext(const std::string& text);
+    // The n-th call of `function` fails with CL_OUT_OF_RESOURCES, which is reported.
+    void fails(const std::string& function, unsigned nth = 1);
+};
+
+struct StartUpRow {
+    const char* name;
+    std::function<void(StartUp&)> set;
+};
+inline void PrintTo(const StartUpRow& row, std::ostream* out)
+{
+    *out << row.name;
+}
+
+class StartUpTest : public ScriptedTest {
+protected:
+    void run(const StartUp& expected);
+};
+
+// The listing of all platforms, with the line of the one that is taken.
+std::string listing(const World& world, std::size_t taken);
+
+inline constexpr std::size_t kNoPlatform = 64; // more than any world has
+inline const std::string kAttempt = "OpenCL evaluator is attempting to initialize OpenCL.\n";
+inline const std::string kOutOfResources = "OpenCL error: CL_OUT_OF_RESOURCES\n";
+
+inline std::string rowName(const ::testing::TestParamInfo<StartUpRow>& info)
+{
+    return info.param.name;
+}
+
+} // namespace scripted

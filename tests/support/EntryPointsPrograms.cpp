@@ -1,0 +1,94 @@
+// Entry points of programs and kernels. A program builds unless its source holds "#error", and has
+// every kernel whose name its source mentions.
+#include "Entry.h"
+
+using namespace scripted;
+
+extern "C" {
+
+cl_program clCreateProgramWithSource(cl_context context, cl_uint count, const char** sources,
+                                     const std::size_t* lengths, cl_int* error)
+{
+    Entry call("clCreateProgramWithSource", context, count, sources[0], lengths);
+    call.object(Kind::kContext, context);
+    const auto program = call.create<cl_program>(Kind::kProgram);
+    if (program)
+        call.object(Kind::kProgram, program)->source = sources[0];
+    return call.result(program, error);
+}
+
+cl_int clBuildProgram(cl_program program, cl_uint deviceCount, const cl_device_id* devices,
+                      const char* options, void(CL_CALLBACK* notify)(cl_program, void*),
+                      void* userData)
+{
+    Entry call("clBuildProgram", program, List{deviceCount, devices}, options);
+    Object* object = call.object(Kind::kProgram, program);
+    for (cl_uint i = 0; i < deviceCount; ++i)
+        call.object(Kind::kDevice, devices[i]);
+    call.require(!notify && !userData, CL_INVALID_VALUE, "not synchronous");
+    if (!call.ok())
+        return call.status();
+    object->built = object->source.find("#error") == std::string::npos;
+    return object->built ? CL_SUCCESS : call.answerWith(CL_BUILD_PROGRAM_FAILURE);
+}
+
+cl_int clGetProgramBuildInfo(cl_program program, cl_device_id device, cl_program_build_info query,
+                             std::size_t room, void* value, std::size_t* size)
+{
+    Entry call("clGetProgramBuildInfo", program, device, query);
+    const Object* object = call.object(Kind::kProgram, program);
+    call.object(Kind::kDevice, device);
+    if (!call.ok())
+        return call.status();
+    if (query == CL_PROGRAM_BUILD_LOG)
+        return call.answer(query, call.world().buildLog, room, value, size);
+    call.require(query == CL_PROGRAM_BUILD_STATUS, CL_INVALID_VALUE, "unknown query");
+    const cl_build_status status = object->built ? CL_BUILD_SUCCESS : CL_BUILD_ERROR;
+    return call.answer(query, &status, sizeof status, room, value, size);
+}
+
+cl_int clRetainProgram(cl_program program)
+{
+    return Entry("clRetainProgram", program).retain(Kind::kProgram, program);
+}
+
+cl_int clReleaseProgram(cl_program program)
+{
+    return Entry("clReleaseProgram", program).release(Kind::kProgram, program);
+}
+
+cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
+{
+    Entry call("clCreateKernel", program, name);
+    const Object* object = call.object(Kind::kProgram, program);
+    call.require(!object || object->built, CL_INVALID_PROGRAM_EXECUTABLE, "not built");
+    if (call.ok() && object->source.find(name) == std::string::npos)
+        call.answerWith(CL_INVALID_KERNEL_NAME);
+    return call.result(call.create<cl_kernel>(Kind::kKernel), error);
+}
+
+cl_int clRetainKernel(cl_kernel kernel)
+{
+    return Entry("clRetainKernel", kernel).retain(Kind::kKernel, kernel);
+}
+
+cl_int clReleaseKernel(cl_kernel kernel)
+{
+    return Entry("clReleaseKernel", kernel).release(Kind::kKernel, kernel);
+}
+
+cl_int clGetKernelWorkGroupInfo(cl_kernel kernel, cl_device_id device,
+                                cl_kernel_work_group_info query, std::size_t room, void* value,
+                                std::size_t* size)
+{
+    Entry call("clGetKernelWorkGroupInfo", kernel, device, query);
+    call.object(Kind::kKernel, kernel);
+    const Object* object = call.object(Kind::kDevice, device);
+    call.require(query == CL_KERNEL_WORK_GROUP_SIZE, CL_INVALID_VALUE, "unknown query");
+    if (!call.ok())
+        return call.status();
+    const std::size_t groupSize = call.script(*object).workGroupSize;
+    return call.answer(query, &groupSize, sizeof groupSize, room, value, size);
+}
+
+} // extern "C"

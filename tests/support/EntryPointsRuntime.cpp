@@ -1,0 +1,123 @@
+// Entry points of platforms, devices, contexts and queues.
+#include "Entry.h"
+
+#include <algorithm>
+
+using namespace scripted;
+
+extern "C" {
+
+cl_int clGetPlatformIDs(cl_uint room, cl_platform_id* platforms, cl_uint* count)
+{
+    Entry call("clGetPlatformIDs", room, platforms);
+    if (!call.ok())
+        return call.status();
+    const auto& all = call.platforms();
+    if (platforms)
+        std::copy_n(all.begin(), std::min<std::size_t>(room, all.size()), platforms);
+    if (count)
+        *count = static_cast<cl_uint>(all.size());
+    return CL_SUCCESS;
+}
+
+cl_int clGetPlatformInfo(cl_platform_id platform, cl_platform_info query, std::size_t room,
+                         void* value, std::size_t* size)
+{
+    Entry call("clGetPlatformInfo", platform, query);
+    const Object* object = call.object(Kind::kPlatform, platform);
+    if (!object)
+        return call.status();
+    const PlatformScript& script = call.world().platforms[object->index];
+    switch (query) {
+    case CL_PLATFORM_VENDOR:
+        return call.answer(query, script.vendor, room, value, size);
+    case CL_PLATFORM_NAME:
+        return call.answer(query, script.name, room, value, size);
+    case CL_PLATFORM_VERSION:
+        return call.answer(query, script.version, room, value, size);
+    case CL_PLATFORM_EXTENSIONS:
+        return call.answer(query, script.extensions, room, value, size);
+    default:
+        call.require(false, CL_INVALID_VALUE, "unknown query");
+        return call.status();
+    }
+}
+
+cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t room, void* value,
+                       std::size_t* size)
+{
+    Entry call("clGetDeviceInfo", device, query);
+    const Object* object = call.object(Kind::kDevice, device);
+    if (!object)
+        return call.status();
+    const DeviceScript& script = call.script(*object);
+    const auto number = [&](const auto& field) {
+        return call.answer(query, &field, sizeof field, room, value, size);
+    };
+    switch (query) {
+    case CL_DEVICE_TYPE:
+        return number(script.type);
+    case CL_DEVICE_NAME:
+        return call.answer(query, script.name, room, value, size);
+    case CL_DRIVER_VERSION:
+        return call.answer(query, script.driverVersion, room, value, size);
+    case CL_DEVICE_AVAILABLE:
+        return number(static_cast<cl_bool>(script.available));
+    case CL_DEVICE_DOUBLE_FP_CONFIG:
+        return number(script.doublePrecision);
+    case CL_DEVICE_QUEUE_PROPERTIES:
+        return number(script.queueProperties);
+    case CL_DEVICE_MAX_COMPUTE_UNITS:
+        return number(script.computeUnits);
+    default:
+        call.require(false, CL_INVALID_VALUE, "unknown query");
+        return call.status();
+    }
+}
+
+cl_context clCreateContext(const cl_context_properties* properties, cl_uint deviceCount,
+                           const cl_device_id* devices,
+                           void(CL_CALLBACK* notify)(const char*, const void*, std::size_t, void*),
+                           void* userData, cl_int* error)
+{
+    Entry call("clCreateContext", PropertyList{properties}, List{deviceCount, devices}, userData);
+    for (cl_uint i = 0; i < deviceCount; ++i)
+        call.object(Kind::kDevice, devices[i]);
+    call.rememberNotify(notify);
+    return call.result(call.create<cl_context>(Kind::kContext), error);
+}
+
+cl_command_queue clCreateCommandQueue(cl_context context, cl_device_id device,
+                                      cl_command_queue_properties properties, cl_int* error)
+{
+    Entry call("clCreateCommandQueue", context, device, properties);
+    call.object(Kind::kContext, context);
+    call.object(Kind::kDevice, device);
+    return call.result(call.create<cl_command_queue>(Kind::kQueue), error);
+}
+
+cl_int clFinish(cl_command_queue queue)
+{
+    Entry call("clFinish", queue);
+    call.object(Kind::kQueue, queue);
+    return call.status();
+}
+
+cl_int clFlush(cl_command_queue queue)
+{
+    Entry call("clFlush", queue);
+    call.object(Kind::kQueue, queue);
+    return call.status();
+}
+
+cl_int clReleaseContext(cl_context context)
+{
+    return Entry("clReleaseContext", context).release(Kind::kContext, context);
+}
+
+cl_int clReleaseCommandQueue(cl_command_queue queue)
+{
+    return Entry("clReleaseCommandQueue", queue).release(Kind::kQueue, queue);
+}
+
+} // extern "C"

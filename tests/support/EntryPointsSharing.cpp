@@ -1,0 +1,185 @@
+// Entry points of the sharing extensions, and the look-up through which alone they are found.
+#include "Entry.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <stdexcept>
+
+#include <CL/cl_gl.h>
+
+using namespace scripted;
+
+namespace {
+
+using MemList = List<cl_mem>;
+
+// The status of commands in the wrong order differs between OpenGL and Direct3D 11.
+struct SharingNames {
+    const char* create;
+    const char* acquire;
+    const char* release;
+    cl_int alreadyAcquired;
+    cl_int notAcquired;
+};
+constexpr cl_int kD3DAlreadyAcquired = -1008;
+constexpr cl_int kD3DNotAcquired = -1009;
+constexpr SharingNames kGL = {"clCreateFromGLBuffer", "clEnqueueAcquireGLObjects",
+                              "clEnqueueReleaseGLObjects", CL_INVALID_GL_OBJECT,
+                              CL_INVALID_GL_OBJECT};
+constexpr SharingNames kNV = {"clCreateFromD3D11BufferNV", "clEnqueueAcquireD3D11ObjectsNV",
+                              "clEnqueueReleaseD3D11ObjectsNV", kD3DAlreadyAcquired,
+                              kD3DNotAcquired};
+constexpr SharingNames kKHR = {"clCreateFromD3D11BufferKHR", "clEnqueueAcquireD3D11ObjectsKHR",
+                               "clEnqueueReleaseD3D11ObjectsKHR", kD3DAlreadyAcquired,
+                               kD3DNotAcquired};
+
+template <typename Resource>
+cl_mem createShared(const SharingNames& names, cl_context context, cl_mem_flags flags,
+                    Resource resource, cl_int* error)
+{
+    Entry call(names.create, context, flags, resource);
+    call.object(Kind::kContext, context);
+    const std::optional<cl_mem> scripted = call.nextSharedMem();
+    if (scripted && *scripted)
+        call.retain(Kind::kMem, *scripted);
+    if (scripted)
+        return call.result(*scripted, error);
+    const auto mem = call.create<cl_mem>(Kind::kMem);
+    if (mem)
+        call.object(Kind::kMem, mem)->shared = true;
+    return call.result(mem, error);
+}
+
+// Acquire and release: every object has to be shared and on the other side.
+cl_int changeSide(Entry& call, bool acquire, cl_int wrongSide, cl_command_queue queue,
+                  const MemList& mems, const WaitList& list, cl_event* event)
+{
+    call.require((mems.count == 0) == (mems.items == nullptr), CL_INVALID_VALUE,
+                 "count and pointer of the objects disagree");
+    std::vector<Object*> objects;
+    for (cl_uint i = 0; call.ok() && i < mems.count; ++i) {
+        Object* object = call.object(Kind::kMem, mems.items[i]);
+        if (object && call.require(object->shared && object->acquired != acquire, wrongSide,
+                                   acquire ? "already acquired" : "not acquired"))
+            objects.push_back(object);
+    }
+    call.command(queue, list, event);
+    for (Object* object : objects)
+        object->acquired = call.ok() ? acquire : object->acquired;
+    return call.status();
+}
+
+template <const SharingNames& kNames>
+cl_int enqueueAcquire(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_uint waitCount,
+                      const cl_event* waitList, cl_event* event)
+{
+    const MemList objects{count, mems};
+    const WaitList list{waitCount, waitList};
+    Entry call(kNames.acquire, queue, objects, list);
+    return changeSide(call, true, kNames.alreadyAcquired, queue, objects, list, event);
+}
+
+template <const SharingNames& kNames>
+cl_int enqueueRelease(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_uint waitCount,
+                      const cl_event* waitList, cl_event* event)
+{
+    const MemList objects{count, mems};
+    const WaitList list{waitCount, waitList};
+    Entry call(kNames.release, queue, objects, list);
+    return changeSide(call, false, kNames.notAcquired, queue, objects, list, event);
+}
+
+cl_mem createFromGLBuffer(cl_context context, cl_mem_flags flags, cl_GLuint buffer, cl_int* error)
+{
+    return createShared(kGL, context, flags, buffer, error);
+}
+
+template <const SharingNames& kNames>
+cl_mem createFromD3DBuffer(cl_context context, cl_mem_flags flags, void* buffer, cl_int* error)
+{
+    // A Direct3D 11 buffer is a number in the log: its address, which tests choose.
+    return createShared(kNames, context, flags, reinterpret_cast<std::uintptr_t>(buffer), error);
+}
+
+cl_int getGLContextInfo(const cl_context_properties* properties, cl_gl_context_info query,
+                        std::size_t room, void* value, std::size_t* size)
+{
+    Entry call("clGetGLContextInfoKHR", PropertyList{properties}, query, room);
+    const auto& all = call.devices();
+    std::vector<cl_device_id> answer;
+    if (query == CL_DEVICES_FOR_GL_CONTEXT_KHR) {
+        for (const std::size_t index : call.world().glDevices)
+            answer.push_back(all[index]);
+    } else if (query == CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR) {
+        const auto current = call.world().currentGLDevice;
+        answer.push_back(current ? all[*current] : nullptr);
+    } else {
+        call.require(false, CL_INVALID_VALUE, "unknown query");
+    }
+    return call.answer(query, answer.data(), answer.size() * sizeof(cl_device_id), room, value,
+                       size);
+}
+
+cl_int deviceIDsFromD3D(Entry& call, cl_platform_id platform, cl_uint room, cl_device_id* devices,
+                        cl_uint* count)
+{
+    call.object(Kind::kPlatform, platform);
+    if (!call.ok())
+        return call.status();
+    const auto& indices = call.world().d3dDevices;
+    for (std::size_t i = 0; devices && i < std::min<std::size_t>(room, indices.size()); ++i)
+        devices[i] = call.devices()[indices[i]];
+    if (count)
+        *count = static_cast<cl_uint>(indices.size());
+    return CL_SUCCESS;
+}
+
+template <bool kIsKHR>
+cl_int getDeviceIDsFromD3D11(cl_platform_id platform, cl_uint source, void* object, cl_uint set,
+                             cl_uint room, cl_device_id* devices, cl_uint* count)
+{
+    Entry call(kIsKHR ? "clGetDeviceIDsFromD3D11KHR" : "clGetDeviceIDsFromD3D11NV", platform,
+               source, reinterpret_cast<std::uintptr_t>(object), set, room);
+    return deviceIDsFromD3D(call, platform, room, devices, count);
+}
+
+struct NamedFunction {
+    const char* name;
+    void* address;
+};
+template <typename Function>
+void* addressOf(Function* function)
+{
+    return reinterpret_cast<void*>(function);
+}
+const NamedFunction kExtensionFunctions[] = {
+    {"clGetGLContextInfoKHR", addressOf(&getGLContextInfo)},
+    {kGL.create, addressOf(&createFromGLBuffer)},
+    {kGL.acquire, addressOf(&enqueueAcquire<kGL>)},
+    {kGL.release, addressOf(&enqueueRelease<kGL>)},
+    {"clGetDeviceIDsFromD3D11NV", addressOf(&getDeviceIDsFromD3D11<false>)},
+    {kNV.create, addressOf(&createFromD3DBuffer<kNV>)},
+    {kNV.acquire, addressOf(&enqueueAcquire<kNV>)},
+    {kNV.release, addressOf(&enqueueRelease<kNV>)},
+    {"clGetDeviceIDsFromD3D11KHR", addressOf(&getDeviceIDsFromD3D11<true>)},
+    {kKHR.create, addressOf(&createFromD3DBuffer<kKHR>)},
+    {kKHR.acquire, addressOf(&enqueueAcquire<kKHR>)},
+    {kKHR.release, addressOf(&enqueueRelease<kKHR>)},
+};
+
+} // namespace
+
+extern "C" void* clGetExtensionFunctionAddress(const char* name)
+{
+    const Entry call("clGetExtensionFunctionAddress", name);
+    if (call.world().lookUp == LookUp::kThrowsStandardException)
+        throw std::runtime_error("scripted look-up");
+    if (call.world().lookUp == LookUp::kThrowsNumber)
+        throw 1;
+    const auto found = std::find_if(
+        std::begin(kExtensionFunctions), std::end(kExtensionFunctions),
+        [name](const NamedFunction& entry) { return std::string(name) == entry.name; });
+    const bool there =
+        found != std::end(kExtensionFunctions) && !call.world().missing.contains(name);
+    return there ? found->address : nullptr;
+}

@@ -1,0 +1,32 @@
+// The host that a scripted test describes, in place of the parts of the stand-in host that would
+// need a window, a GPU or a clock.
+//
+// What is defined here takes the place of the stand-in's own definition, since the tests'
+// executables contain the library's objects and so bind to the executable's symbols first. Strings,
+// plugs, environment look-ups and the trace channel remain the stand-in's. Every call of the
+// library is a line in the runtime's log.
+#pragma once
+
+#include "host/GLDisplay.h"
+
+#include <cstddef>
+
+class QOpenGLWindow;
+
+namespace scripted {
+
+struct HostScript {
+    GLDisplayProperty display{0x200A, 77}; // CL_GLX_DISPLAY_KHR
+    bool sampling = false;                 // the profiler records
+    QOpenGLWindow* resourceWindow = nullptr;
+};
+HostScript& host();
+
+// What the memory monitor counts at present, in bytes.
+std::size_t deviceMemory();
+
+// The renderer's OpenGL function table.
+void installFunctionTable(bool syncObjects, bool syncFromCLEvent);
+void removeFunctionTable();
+
+} // namespace scripted

@@ -1,0 +1,104 @@
+// The scripted OpenCL runtime behind the entry points: what a test sets, and what it reads.
+//
+// The entry points live in a shared library that has the name of the OpenCL library. The tests'
+// executables are linked to it, so it is in the process already when the code under test opens
+// OpenCL by name, and the loader hands it out. Extension entry points are not exported: they are
+// found through clGetExtensionFunctionAddress alone, unless the world leaves them out.
+//
+// Any thread may call an entry point. What is declared here is for the test's own thread, while
+// nobody else calls.
+#pragma once
+
+#include "Faults.h"
+#include "Ledger.h"
+#include "World.h"
+
+#include <atomic>
+#include <deque>
+#include <string>
+#include <vector>
+
+namespace scripted {
+
+// A spin lock without a trace in ThreadSanitizer's eyes: the runtime's library is built without it.
+// A mutex here would order the threads of the code under test and so hide their races.
+class QuietLock {
+public:
+    void lock()
+    {
+        while (fHeld.test_and_set(std::memory_order_acquire))
+            ;
+    }
+    void unlock() { fHeld.clear(std::memory_order_release); }
+
+private:
+    std::atomic_flag fHeld;
+};
+
+using ContextNotify = void(CL_CALLBACK*)(const char*, const void*, std::size_t, void*);
+
+class FakeRuntime {
+public:
+    // Forgets everything and makes the platforms and devices of `world`.
+    void describe(const World& world);
+
+    // The calls since the last take, OpenCL's, OpenGL's and the host's in one order, each as text:
+    //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, ptr, [event#1]) = event#3
+    //     clCreateBuffer(context#1, 4, 64, null) ! -4
+    // Lists are in brackets; the first form names what the call made, the second its status.
+    std::vector<std::string> takeCalls();
+    // Calls of OpenCL and OpenGL since describe.
+    unsigned callCount() const { return fCallCount; }
+    // A line of the host's in the same log.
+    void log(std::string line);
+
+    void plan(const Fault& fault) { fFaults.plan(fault); }
+    void clearFaults() { fFaults.clear(); }
+
+    // Wrong use that a validating runtime would refuse: "clReleaseEvent: event#1 is dead".
+    std::vector<std::string> takeMisuse();
+
+    std::vector<std::string> balance() const { return fLedger.balance(); }
+    std::string name(const void* handle) const { return fLedger.name(handle); }
+    // References of a living object, else 0.
+    unsigned references(Kind kind, const void* handle);
+    // Bytes of a living memory object.
+    std::size_t memSize(cl_mem mem);
+
+    // What the queries of every event made from now on answer, in turn; the last one stays. The
+    // default is one CL_COMPLETE. Waiting for an event completes it.
+    void scriptEventStatuses(std::deque<cl_int> statuses) { fEventStatuses = std::move(statuses); }
+    // What the next glClientWaitSync calls return; without any, that the fence was signalled.
+    void scriptClientWaits(std::deque<unsigned> results) { fClientWaits = std::move(results); }
+    // The next creation from a renderer's buffer returns this memory object, with one more
+    // reference; null: it returns null, with success.
+    void scriptNextSharedMem(cl_mem mem) { fNextSharedMem = mem; }
+
+    // Calls what was given to clCreateContext for errors.
+    void raiseContextError(const char* text) { fNotify(text, nullptr, 0, nullptr); }
+
+private:
+    friend class Entry;
+
+    void addDevice(const DeviceScript& script);
+
+    QuietLock fLock;
+    World fWorld;
+    Ledger fLedger;
+    Faults fFaults;
+    std::vector<cl_platform_id> fPlatforms; // in the world's order, as the devices
+    std::vector<cl_device_id> fDevices;
+    std::vector<DeviceScript> fDeviceScripts;
+    std::vector<std::string> fCalls;
+    std::vector<std::string> fMisuse;
+    unsigned fCallCount = 0;
+    std::deque<cl_int> fEventStatuses{CL_COMPLETE};
+    std::deque<unsigned> fClientWaits;
+    ContextNotify fNotify = nullptr;
+    std::optional<cl_mem> fNextSharedMem;
+};
+
+// The process's one.
+FakeRuntime& runtime();
+
+} // namespace scripted

@@ -1,0 +1,58 @@
+// Every object that the scripted runtime has handed out, with its explicit references.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <deque>
+#include <map>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+#include <CL/cl.h>
+
+namespace scripted {
+
+// kSync is an OpenGL sync object: it is deleted, not counted.
+enum class Kind { kPlatform, kDevice, kContext, kQueue, kMem, kEvent, kProgram, kKernel, kSync };
+inline constexpr std::size_t kKindCount = 9;
+
+struct Object {
+    Kind kind;
+    unsigned ordinal; // counts from 1 within the kind
+    unsigned references = 1;
+
+    std::size_t index = 0;         // platforms and devices: place in the world
+    std::size_t size = 0;          // memory objects: bytes
+    bool shared = false;           // memory objects: made from a renderer's buffer
+    bool acquired = false;         // shared memory objects
+    bool mapped = false;           // memory objects
+    bool built = false;            // programs: built successfully
+    std::string source{};          // programs
+    std::deque<cl_int> statuses{}; // events: what the next queries answer; the last one stays
+};
+
+// Handles are numbers, not addresses: a dead one is recognised without touching it. Their order is
+// scattered, so that nothing is in order of creation by accident.
+class Ledger {
+public:
+    // A new object with one reference.
+    void* create(Kind kind);
+    // The living object of that kind, or null. Valid until it dies.
+    Object* alive(Kind kind, const void* handle);
+    // Takes one reference; the object dies with the last one.
+    void release(const void* handle);
+
+    // "mem#2" for anything that was ever handed out (dead or alive), "null", or "ptr".
+    std::string name(const void* handle) const;
+    // One line per living object, in order of kind and creation: "mem#2 x1".
+    std::vector<std::string> balance() const;
+
+private:
+    std::map<const void*, Object> fAlive;
+    std::unordered_map<const void*, std::string> fDead;
+    std::array<unsigned, kKindCount> fCreated{};
+    unsigned fSerial = 0;
+};
+
+} // namespace scripted

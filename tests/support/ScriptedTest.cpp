@@ -1,0 +1,100 @@
+#include "ScriptedTest.h"
+
+#include "diagnostics/CLWarningSink.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <cstdlib>
+#include <mutex>
+#include <utility>
+
+namespace scripted {
+namespace {
+
+std::mutex warningsLock;
+Lines pendingWarnings;
+
+void keepWarning(const char* text)
+{
+    const std::scoped_lock guard(warningsLock);
+    pendingWarnings.emplace_back(text);
+}
+
+void* opaque(std::uintptr_t number)
+{
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): nobody looks behind the host's handles.
+    return reinterpret_cast<void*>(number);
+}
+
+Lines livingObjects()
+{
+    Lines objects = runtime().balance();
+    std::erase_if(objects, [](const std::string& line) {
+        return line.starts_with("platform") || line.starts_with("device");
+    });
+    return objects;
+}
+
+} // namespace
+
+void setEnvironment(const char* name, const char* value)
+{
+#if defined(_WIN32)
+    _putenv_s(name, value);
+#else
+    setenv(name, value, 1);
+#endif
+}
+
+ScriptedTest::ScriptedTest()
+{
+    setCLWarningSink(keepWarning);
+    installFunctionTable(true, true);
+}
+
+void ScriptedTest::TearDown()
+{
+    Lines expected = leftByStart;
+    expected.insert(expected.end(), fExpectedLeft.begin(), fExpectedLeft.end());
+    EXPECT_EQ(livingObjects(), expected) << "objects left alive";
+    EXPECT_EQ(runtime().takeMisuse(), fExpectedMisuse) << "wrong use of the runtime";
+    EXPECT_EQ(warnings(), Lines{}) << "warnings that the test did not read";
+}
+
+bool ScriptedTest::startWatched()
+{
+    runtime().describe(world);
+    for (const Fault& fault : faults)
+        runtime().plan(fault);
+    testing::internal::CaptureStderr();
+    testing::internal::CaptureStdout();
+    const bool valid = TopenCLInfo::initialize(
+        opaque(arguments.window), opaque(arguments.graphicsContext), nullptr, arguments.usingDX,
+        arguments.usingGLCoreProfile, arguments.vendorId);
+    printedError = testing::internal::GetCapturedStderr();
+    printedOutput = testing::internal::GetCapturedStdout();
+    leftByStart = livingObjects();
+    runtime().clearFaults();
+    return valid;
+}
+
+bool ScriptedTest::start()
+{
+    const bool valid = startWatched();
+    calls();
+    return valid;
+}
+
+Lines ScriptedTest::callsOf(const std::string& prefix)
+{
+    Lines lines = calls();
+    std::erase_if(lines, [&prefix](const std::string& line) { return !line.starts_with(prefix); });
+    return lines;
+}
+
+Lines ScriptedTest::warnings()
+{
+    const std::scoped_lock guard(warningsLock);
+    return std::exchange(pendingWarnings, {});
+}
+
+} // namespace scripted

@@ -1,0 +1,64 @@
+// The fixture of all tests on the scripted runtime.
+//
+// Start-up happens once per process, so each test is a process of its own: run them through CTest.
+// A test ends with every object accounted for, every wrong use declared and every warning read.
+#pragma once
+
+#include "FakeHost.h"
+#include "FakeRuntime.h"
+
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace scripted {
+
+using Lines = std::vector<std::string>;
+
+// What the host passes to start-up.
+struct StartArguments {
+    std::uintptr_t window = 3;
+    std::uintptr_t graphicsContext = 5;
+    bool usingDX = false;
+    bool usingGLCoreProfile = true;
+    unsigned vendorId = 0x8086;
+};
+
+void setEnvironment(const char* name, const char* value);
+
+class ScriptedTest : public ::testing::Test {
+protected:
+    ScriptedTest();
+    void TearDown() override;
+
+    // Describes `world` to the runtime and starts the library; returns whether it is valid. What
+    // start-up prints, logs and leaves alive is taken as given from here on.
+    bool start();
+    // The same, keeping what start-up prints and logs for the test to read.
+    bool startWatched();
+
+    // Since the last reading: all calls, those whose text begins with `prefix`, and the warnings.
+    Lines calls() { return runtime().takeCalls(); }
+    Lines callsOf(const std::string& prefix);
+    static Lines warnings();
+
+    // The test leaves wrong use, which some rules prescribe after a failure; in order.
+    void expectMisuse(const std::string& note) { fExpectedMisuse.push_back(note); }
+    // Objects that stay alive beyond those of start-up.
+    void expectLeft(const Lines& objects) { fExpectedLeft = objects; }
+
+    World world;
+    StartArguments arguments;
+    std::vector<Fault> faults; // of start-up
+    std::string printedError;  // what start-up wrote to standard error
+    std::string printedOutput; // and to standard output
+    Lines leftByStart;         // what start-up left alive, besides platforms and devices
+
+private:
+    Lines fExpectedMisuse;
+    Lines fExpectedLeft;
+};
+
+} // namespace scripted
