@@ -9,6 +9,8 @@ target_compile_features(vyra_options INTERFACE cxx_std_20)
 target_compile_options(vyra_options INTERFACE
     -Wall -Wextra -Wpedantic -Wshadow -Wconversion
     $<$<BOOL:${VYRA_WARNINGS_AS_ERRORS}>:-Werror>)
+# Qt's `emit` and `slots` macros break oneTBB's headers.
+target_compile_definitions(vyra_options INTERFACE QT_NO_KEYWORDS)
 # Version 1.2 of the OpenCL interface is the one the library is written against.
 target_compile_definitions(vyra_options INTERFACE
     CL_TARGET_OPENCL_VERSION=120 CL_USE_DEPRECATED_OPENCL_1_1_APIS)

@@ -1,0 +1,45 @@
+#include "bridge/IDeformerEvaluatorBridge.h"
+#include "host/EvaluationId.h"
+
+#include <memory>
+
+#include <gtest/gtest.h>
+
+namespace {
+
+class Evaluator : public IDeformerEvaluatorBridgeAPI {
+public:
+    explicit Evaluator(bool& destroyed) : fDestroyed(destroyed) {}
+    ~Evaluator() override { fDestroyed = true; }
+    void evaluate(const em::Id& id) override { lastEvaluation = id.value(); }
+
+    int lastEvaluation = -1;
+
+private:
+    bool& fDestroyed;
+};
+
+} // namespace
+
+TEST(Bridge, PublishesOneBorrowedEvaluator)
+{
+    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);
+
+    bool destroyed = false;
+    auto first = std::make_unique<Evaluator>(destroyed);
+    bool otherDestroyed = false;
+    Evaluator second(otherDestroyed);
+    IDeformerEvaluatorBridge::setAPI(first.get());
+    IDeformerEvaluatorBridge::getAPI()->evaluate(em::Id(7));
+    EXPECT_EQ(first->lastEvaluation, 7);
+
+    IDeformerEvaluatorBridge::setAPI(&second);
+    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second);
+    EXPECT_FALSE(destroyed) << "the bridge deleted what it only borrowed";
+
+    IDeformerEvaluatorBridge::setAPI(nullptr);
+    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);
+    std::unique_ptr<IDeformerEvaluatorBridgeAPI> base = std::move(first);
+    base.reset();
+    EXPECT_TRUE(destroyed) << "deleting through the interface must destroy the evaluator";
+}

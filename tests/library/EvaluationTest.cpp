@@ -1,0 +1,216 @@
+// Whole evaluations: the renderer writes, OpenCL deforms, the renderer reads, and the numbers are
+// right in every pair of synchronisation modes.
+#include "LibraryTest.h"
+
+#include "host/EvaluationId.h"
+#include "kernels/TopenCLKernelStore.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <thread>
+
+namespace {
+
+constexpr std::size_t kElements = 3000;
+constexpr int kFrames = 12;
+
+struct Modes {
+    const char* description;
+    const char* graphicsToCL;
+    const char* clToGraphics;
+    const char* forceThreading = nullptr;
+};
+
+void PrintTo(const Modes& modes, std::ostream* stream)
+{
+    *stream << modes.description;
+}
+
+// One mesh: its vertex buffer at the renderer, its record, its kernels and its queue.
+struct Mesh {
+    unsigned glBuffer = 0;
+    const TopenCLSharedBuffer* shared = nullptr;
+    AutoCLObject<cl_kernel> add;
+    AutoCLObject<cl_kernel> scale;
+    cl_command_queue queue = nullptr;
+    AutoCLObject<cl_event> released; // of a release on its own
+};
+
+class Evaluation : public LibraryTest, public testing::WithParamInterface<Modes> {
+protected:
+    void SetUp() override
+    {
+        // Where a mode is explicit, the sharing layer must not order things by itself.
+        const bool implicit =
+            GetParam().graphicsToCL[0] == '1' || GetParam().clToGraphics[0] == '1';
+        start({{"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", GetParam().graphicsToCL},
+               {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", GetParam().clToGraphics},
+               {"VYRA_OPENCL_FORCE_THREADING", GetParam().forceThreading},
+               {"GLSHARE_GL_EVENT", implicit ? nullptr : "0"}});
+    }
+
+    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+
+    Mesh makeMesh()
+    {
+        Mesh mesh;
+        mesh.glBuffer = makeGLBuffer(std::vector<float>(kElements, 0.0F));
+        mesh.add = deformKernel("add");
+        mesh.scale = deformKernel("scale");
+        mesh.queue = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);
+        share(mesh);
+        return mesh;
+    }
+
+    void share(Mesh& mesh)
+    {
+        int error = CL_SUCCESS;
+        mesh.shared = manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
+                                                     CL_MEM_READ_WRITE, &mesh.glBuffer, &error);
+        ASSERT_NE(mesh.shared, nullptr) << error;
+    }
+
+    // What the renderer draws from before the evaluation.
+    void writeThroughGL(const Mesh& mesh, float value)
+    {
+        const std::vector<float> values(kElements, value);
+        gl().glBindBuffer(GL_ARRAY_BUFFER, mesh.glBuffer);
+        gl().glBufferSubData(GL_ARRAY_BUFFER, 0, kElements * sizeof(float), values.data());
+    }
+
+    // A deformer: x -> 2 (x + 1), with its input acquired and its last event handed over.
+    static void deform(Mesh& mesh)
+    {
+        AutoCLObject<cl_event> acquired;
+        ASSERT_EQ(
+            manager().EnqueueAcquireSharedCLBuffer(mesh.queue, mesh.shared, acquired.receive()),
+            CL_SUCCESS);
+        ASSERT_NE(acquired.get(), nullptr);
+        const cl_mem memory = mesh.shared->fMem.get();
+        const auto added =
+            enqueueDeform(mesh.queue, mesh.add.get(), memory, 1.0F, kElements, {acquired.get()});
+        const auto scaled =
+            enqueueDeform(mesh.queue, mesh.scale.get(), memory, 2.0F, kElements, {added.get()});
+        const cl_event last = scaled.get();
+        if (mesh.shared->fInBatch) {
+            manager().EnqueueReleaseBatchedSharedCLBuffer(1, &last);
+        } else {
+            ASSERT_EQ(manager().EnqueueReleaseSharedCLBuffer(mesh.queue, 1, &memory, 1, &last,
+                                                             mesh.released.receive()),
+                      CL_SUCCESS);
+        }
+        clFlush(mesh.queue);
+    }
+
+    static void deformInParallel(std::vector<Mesh>& meshes)
+    {
+        std::vector<std::thread> deformers;
+        for (Mesh& mesh : meshes)
+            deformers.emplace_back([&mesh] { deform(mesh); });
+        for (std::thread& deformer : deformers)
+            deformer.join();
+    }
+
+    // What the modes leave to the host before it draws.
+    static void waitAsTheHostDoes(std::vector<Mesh>& meshes)
+    {
+        TopenCLInfo::flush();
+        const cl_event batchReleased = *manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr);
+        if (TopenCLInfo::theOne().clToGraphicsSyncMode() == TopenCLInfo::kCLToGraphicsEventQuery) {
+            while (!TopenCLInfo::IsEventComplete(batchReleased))
+                std::this_thread::yield();
+        }
+        if (TopenCLInfo::theOne().useCLFinish())
+            TopenCLInfo::finish();
+        // Releases of single buffers came from threads that know of no OpenGL context.
+        for (Mesh& mesh : meshes) {
+            if (const cl_event event = mesh.released.get()) {
+                EXPECT_EQ(clWaitForEvents(1, &event), CL_SUCCESS);
+            }
+            mesh.released.reset();
+        }
+    }
+
+    void evaluate(std::vector<Mesh>& meshes, int frame)
+    {
+        if (TopenCLInfo::theOne().useGLFinish())
+            gl().glFinish();
+        const em::Id id(static_cast<std::uint16_t>(frame));
+        manager().PreEvaluate(id);
+        deformInParallel(meshes);
+        manager().PostEvaluate(id);
+        waitAsTheHostDoes(meshes);
+    }
+
+    void expectEverywhere(const Mesh& mesh, float value, int frame)
+    {
+        EXPECT_EQ(readGLBuffer(mesh.glBuffer, kElements), std::vector<float>(kElements, value))
+            << "frame " << frame;
+    }
+
+    void renderingComplete()
+    {
+        manager().RenderingComplete();
+        gl().glFlush();
+    }
+};
+
+} // namespace
+
+TEST_P(Evaluation, NumbersArriveInGLMemory)
+{
+    std::vector<Mesh> meshes;
+    for (int index = 0; index < 3; ++index)
+        meshes.push_back(makeMesh());
+    for (int frame = 0; frame < kFrames; ++frame) {
+        for (std::size_t index = 0; index < meshes.size(); ++index)
+            writeThroughGL(meshes[index],
+                           static_cast<float>(frame * 10) + static_cast<float>(index));
+        renderingComplete();
+        evaluate(meshes, frame);
+        for (std::size_t index = 0; index < meshes.size(); ++index) {
+            const float input = static_cast<float>(frame * 10) + static_cast<float>(index);
+            expectEverywhere(meshes[index], 2.0F * (input + 1.0F), frame);
+        }
+        if (frame == kFrames / 3)
+            meshes.push_back(makeMesh()); // on its own until it joins the batch
+    }
+    EXPECT_EQ(meshes.back().shared->fInBatch, GetParam().forceThreading == nullptr);
+    for (Mesh& mesh : meshes)
+        manager().DestroySharedCLBuffer(mesh.shared);
+}
+
+TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
+{
+    std::vector<Mesh> meshes;
+    for (int index = 0; index < 3; ++index)
+        meshes.push_back(makeMesh());
+    for (int frame = 0; frame < kFrames; ++frame) {
+        for (const Mesh& mesh : meshes)
+            writeThroughGL(mesh, 5.0F);
+        renderingComplete();
+        if (TopenCLInfo::theOne().useGLFinish())
+            gl().glFinish();
+        const em::Id id(static_cast<std::uint16_t>(frame));
+        manager().PreEvaluate(id);
+        // The middle mesh changes its level of detail: its buffer goes and another comes.
+        EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(meshes[1].shared), CL_SUCCESS);
+        gl().glDeleteBuffers(1, &meshes[1].glBuffer);
+        meshes[1].glBuffer = makeGLBuffer(std::vector<float>(kElements, 5.0F));
+        gl().glFinish();
+        share(meshes[1]);
+        EXPECT_FALSE(meshes[1].shared->fInBatch);
+        deformInParallel(meshes);
+        manager().PostEvaluate(id);
+        waitAsTheHostDoes(meshes);
+        for (const Mesh& mesh : meshes)
+            expectEverywhere(mesh, 12.0F, frame);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Modes, Evaluation,
+    testing::Values(Modes{"implicit, implicit", "1", "1"}, Modes{"implicit, event query", "1", "2"},
+                    Modes{"explicit, event query", "2", "2"},
+                    Modes{"explicit, sync object", "2", "3"}, Modes{"explicit, clFinish", "2", "4"},
+                    Modes{"glFinish, sync object", "3", "3"}, Modes{"glFinish, clFinish", "3", "4"},
+                    Modes{"nothing batched", "1", "2", "1"}));

@@ -1,0 +1,149 @@
+// Kernels from real source files on a real compiler.
+#include "LibraryTest.h"
+
+#include "diagnostics/CLWarningSink.h"
+#include "host/TstringArray.h"
+#include "kernels/TopenCLKernelStore.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <filesystem>
+#include <fstream>
+#include <set>
+#include <thread>
+
+#include <gmock/gmock.h>
+
+namespace {
+
+class KernelStore : public LibraryTest {
+protected:
+    void SetUp() override { start(); }
+
+    static TopenCLKernelStore& store() { return TopenCLInfo::theOne().kernelStore(); }
+
+    static cl_uint referencesOf(const AutoCLObject<cl_kernel>& kernel)
+    {
+        cl_uint count = 0;
+        clGetKernelInfo(kernel.get(), CL_KERNEL_REFERENCE_COUNT, sizeof count, &count, nullptr);
+        return count;
+    }
+
+    static cl_program programOf(const AutoCLObject<cl_kernel>& kernel)
+    {
+        cl_program program = nullptr;
+        clGetKernelInfo(kernel.get(), CL_KERNEL_PROGRAM, sizeof program, &program, nullptr);
+        return program;
+    }
+};
+
+} // namespace
+
+TEST_F(KernelStore, BuildsOnceAndHandsOutANewKernelEachTime)
+{
+    AutoCLObject<cl_kernel> first = deformKernel("add");
+    const AutoCLObject<cl_kernel> second = deformKernel("scale");
+    ASSERT_NE(first.get(), nullptr);
+    ASSERT_NE(second.get(), nullptr);
+    EXPECT_EQ(programOf(first), programOf(second));
+    EXPECT_NE(deformKernel("add").get(), first.get());
+    EXPECT_EQ(referencesOf(first), 2u) << "the caller's and the store's";
+
+    EXPECT_TRUE(store().freeKernel(first));
+    EXPECT_EQ(referencesOf(first), 1u);
+    EXPECT_FALSE(store().freeKernel(first)) << "given back already";
+    EXPECT_TRUE(store().freeKernel(AutoCLObject<cl_kernel>()));
+}
+
+TEST_F(KernelStore, AProgramGoesWithItsLastKernelAndIsReadAnew)
+{
+    const std::filesystem::path path =
+        std::filesystem::temp_directory_path() / "vyra-kernel-store-test.cl";
+    std::ofstream(path) << "__kernel void before(__global int* data) { data[0] = 1; }\n";
+    const auto request = [&](const char* name) {
+        return store().getKernel(path.c_str(), nullptr, name, nullptr);
+    };
+    AutoCLObject<cl_kernel> kernel = request("before");
+    ASSERT_NE(kernel.get(), nullptr);
+    std::ofstream(path) << "__kernel void after(__global int* data) { data[0] = 2; }\n";
+    EXPECT_EQ(request("after").get(), nullptr)
+        << "the cached program serves while its kernel is out";
+    EXPECT_TRUE(store().freeKernel(kernel));
+    EXPECT_NE(request("after").get(), nullptr);
+    std::filesystem::remove(path);
+}
+
+namespace {
+
+// The sink is a plain function, so what it collects is the process's.
+std::vector<std::string> collectedWarnings;
+
+} // namespace
+
+TEST_F(KernelStore, WhatDoesNotCompileSaysWhyAndIsNotRemembered)
+{
+    setCLWarningSink([](const char* text) { collectedWarnings.emplace_back(text); });
+    EXPECT_EQ(store().getKernel(kernelPath("broken.cl").c_str(), nullptr, "broken", nullptr).get(),
+              nullptr);
+    EXPECT_THAT(collectedWarnings, testing::Contains("OpenCL error: CL_BUILD_PROGRAM_FAILURE"));
+    EXPECT_THAT(collectedWarnings, testing::Contains(testing::HasSubstr("undeclared_amount")));
+
+    collectedWarnings.clear();
+    EXPECT_EQ(store().getKernel(kernelPath("absent.cl").c_str(), nullptr, "add", nullptr).get(),
+              nullptr);
+    EXPECT_EQ(store().getKernel(VYRA_TEST_KERNELS, nullptr, "add", nullptr).get(), nullptr)
+        << "a directory is no source file";
+    EXPECT_THAT(collectedWarnings, testing::IsEmpty());
+
+    EXPECT_EQ(deformKernel("subtract").get(), nullptr);
+    EXPECT_THAT(collectedWarnings, testing::ElementsAre("OpenCL error: CL_INVALID_KERNEL_NAME"));
+    setCLWarningSink(nullptr);
+    EXPECT_NE(deformKernel("add").get(), nullptr);
+}
+
+TEST_F(KernelStore, FlagsIncludeDirectoriesAndPrecisionReachTheCompiler)
+{
+    constexpr const char* kSource = "#include \"deform.cl\"\n"
+                                    "#ifdef SupportsDoublePrecision\n"
+                                    "__kernel void inDouble(__global int* d) { d[0] = AMOUNT; }\n"
+                                    "#else\n"
+                                    "__kernel void inSingle(__global int* d) { d[0] = AMOUNT; }\n"
+                                    "#endif\n";
+    TstringArray directories;
+    directories.append("  " VYRA_TEST_KERNELS " ");
+    const auto request = [&](const char* name) {
+        return store().getKernelFromString(kSource, "precision", "-DAMOUNT=3", name, &directories);
+    };
+    ASSERT_TRUE(TopenCLInfo::theOne().supportsDoublePrecision());
+    EXPECT_NE(request("inDouble").get(), nullptr);
+    EXPECT_NE(request("add").get(), nullptr) << "from the included file";
+    ASSERT_TRUE(TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false));
+    EXPECT_NE(request("inSingle").get(), nullptr) << "other options are another program";
+    EXPECT_EQ(request("inDouble").get(), nullptr);
+}
+
+TEST_F(KernelStore, ThreadsGetKernelsOfTheirOwn)
+{
+    constexpr int kThreads = 4;
+    constexpr int kRequests = 50;
+    std::vector<std::vector<AutoCLObject<cl_kernel>>> perThread(kThreads);
+    std::vector<std::thread> threads;
+    for (auto& kernels : perThread) {
+        threads.emplace_back([&kernels] {
+            for (int request = 0; request < kRequests; ++request) {
+                kernels.push_back(deformKernel(request % 2 ? "add" : "scale"));
+                if (request % 3 == 0) {
+                    EXPECT_TRUE(store().freeKernel(kernels.back()));
+                }
+            }
+        });
+    }
+    for (std::thread& thread : threads)
+        thread.join();
+    std::set<cl_kernel> distinct;
+    for (const auto& kernels : perThread) {
+        for (const auto& kernel : kernels)
+            distinct.insert(kernel.get());
+    }
+    EXPECT_EQ(distinct.size(), std::size_t{kThreads * kRequests});
+    EXPECT_EQ(distinct.count(nullptr), 0u);
+}
