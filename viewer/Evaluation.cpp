@@ -1,0 +1,207 @@
+#include "viewer/Evaluation.h"
+
+#include "diagnostics/CLErrorCodes.h"
+#include "runtime/TopenCLInfo.h"
+#include "viewer/ProfileScope.h"
+
+#include <algorithm>
+#include <atomic>
+#include <string>
+#include <thread>
+
+#include <tbb/parallel_for.h>
+
+namespace viewer {
+namespace {
+
+Status statusOf(cl_int status, const char* what)
+{
+    if (status == CL_SUCCESS)
+        return {};
+    return Failure{ExitCode::kOpenCLError, std::string("OpenCL failed to ") + what + " (" +
+                                               CLErrorCodeStr(status) +
+                                               "); check the driver, or use --allow-cpu"};
+}
+
+void pollUntilComplete(cl_event event)
+{
+    while (!TopenCLInfo::IsEventComplete(event))
+        std::this_thread::yield();
+}
+
+} // namespace
+
+Evaluation::Evaluation(QOpenGLFunctions_3_3_Core& gl, const OpenCLFunctions& cl, Scene& scene)
+    : fGL(gl), fCL(cl), fScene(scene), fWorkers(cl),
+      fBatchReleased(
+          TopenCLInfo::theOne().sharedBufferMgr().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr))
+{
+}
+
+Evaluation::~Evaluation()
+{
+    TopenCLInfo::finish();
+}
+
+Status Evaluation::adopt(CharacterMesh& mesh)
+{
+    if (!fWorkers.valid())
+        return Failure{ExitCode::kOpenCLError,
+                       "OpenCL makes no command queues; check the driver, or use --allow-cpu"};
+    const auto least = static_cast<std::size_t>(TopenCLInfo::theOne().minimumBufferSize());
+    mesh.onOpenCL = mesh.mesh().vertexCount() >= least;
+    if (!mesh.onOpenCL)
+        return {};
+    if (!mesh.evaluator) {
+        mesh.evaluator =
+            std::make_unique<MeshEvaluator>(fCL, ++fMeshNumber, mesh.mesh().hasBones());
+        if (!mesh.evaluator->valid())
+            return Failure{ExitCode::kOpenCLError,
+                           std::string("the kernels in ") +
+                               TopenCLInfo::theOne().getAbsolutePathToResources().asChar() +
+                               "/kernels cannot be built; check that they are there and that the "
+                               "OpenCL driver can compile"};
+        fCounts.kernelsServed += mesh.evaluator->kernelCount();
+    }
+    cl_int status = mesh.evaluator->setMesh(mesh.mesh(), fWorkers.all().front()->queue());
+    if (status == CL_SUCCESS)
+        status = mesh.positions.share();
+    if (status == CL_SUCCESS)
+        status = mesh.normals.share();
+    return statusOf(status, "take over a vertex buffer");
+}
+
+Status Evaluation::evaluate(const em::Id& id, const std::function<Status()>& whileOpen)
+{
+    const ProfileScope scope("Evaluate");
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    TopenCLSharedBufferMgr& manager = info.sharedBufferMgr();
+
+    if (info.useGLFinish())
+        fGL.glFinish();
+    manager.PreEvaluate(id);
+    Status failure = whileOpen();
+    // A thread without an OpenGL context acquires a buffer outside the batch, and no mode orders
+    // that behind the renderer's commands.
+    if (!allBatched())
+        fGL.glFinish();
+
+    if (!failure)
+        failure = deformMeshes();
+    if (Status unreleased = releaseSingles(); !failure)
+        failure = unreleased;
+    manager.PostEvaluate(id);
+    TopenCLInfo::flush();
+
+    countCommands();
+    return failure;
+}
+
+Status Evaluation::deformMeshes()
+{
+    std::atomic<cl_int> firstError{CL_SUCCESS};
+    fWorkers.arena().execute([&] {
+        tbb::parallel_for(std::size_t{0}, fScene.meshes().size(), [&](std::size_t i) {
+            CharacterMesh& mesh = *fScene.meshes()[i];
+            if (!mesh.onOpenCL)
+                return;
+            const ProfileScope scope("Deform");
+            const cl_int status = mesh.evaluator->evaluate(mesh.pose, fWorkers.forThisThread(),
+                                                           mesh.positions, mesh.normals, fHandover);
+            cl_int none = CL_SUCCESS;
+            if (status != CL_SUCCESS)
+                firstError.compare_exchange_strong(none, status);
+        });
+    });
+    return statusOf(firstError, "deform a mesh");
+}
+
+// One command for all of them, on this thread, whose current context makes a release come before
+// the drawing where the sharing extension orders the two; on the primary queue, which is the one
+// that TopenCLInfo::finish waits for.
+Status Evaluation::releaseSingles()
+{
+    if (fHandover.singles.empty())
+        return {};
+    std::vector<cl_mem> buffers;
+    AutoCLEventList waits;
+    for (const Handover::Single& single : fHandover.singles) {
+        buffers.push_back(single.memory);
+        waits.add(single.written);
+    }
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    const cl_int status = info.sharedBufferMgr().EnqueueReleaseSharedCLBuffer(
+        info.openCLCommandQueue(), static_cast<unsigned>(buffers.size()), buffers.data(),
+        waits.size(), waits.array(), fSinglesReleased.receive());
+    fCounts.releases += 1;
+    return statusOf(status, "release vertex buffers");
+}
+
+bool Evaluation::allBatched() const
+{
+    return std::all_of(fScene.meshes().begin(), fScene.meshes().end(), [](const auto* mesh) {
+        return !mesh->onOpenCL ||
+               (mesh->positions.shared()->fInBatch && mesh->normals.shared()->fInBatch);
+    });
+}
+
+void Evaluation::countCommands()
+{
+    std::vector<cl_event> events;
+    for (const AutoCLObject<cl_event>& event : fHandover.acquired)
+        events.push_back(event.get());
+    std::sort(events.begin(), events.end());
+    const auto distinct = std::unique(events.begin(), events.end()) - events.begin();
+    fCounts.evaluations += 1;
+    fCounts.acquires += static_cast<std::size_t>(distinct);
+    fCounts.releases += *fBatchReleased ? 1 : 0;
+    fHandover.singles.clear();
+    fHandover.acquired.clear();
+}
+
+void Evaluation::waitUntilDrawable()
+{
+    const ProfileScope scope("Wait for OpenCL");
+    switch (TopenCLInfo::theOne().clToGraphicsSyncMode()) {
+    case TopenCLInfo::kCLToGraphicsImplicit:
+        break; // the releases come before what this thread draws
+    case TopenCLInfo::kCLToGraphicsEventQuery:
+        pollUntilComplete(*fBatchReleased);
+        pollUntilComplete(fSinglesReleased.get());
+        break;
+    case TopenCLInfo::kCLToGraphicsSyncObject:
+        // PostEvaluate made the OpenGL stream wait, unless the library was told not to batch.
+        if (!allBatched())
+            waitForSingles();
+        break;
+    case TopenCLInfo::kCLToGraphicsFinish:
+        TopenCLInfo::finish();
+        break;
+    }
+}
+
+void Evaluation::renderingComplete()
+{
+    TopenCLInfo::theOne().sharedBufferMgr().RenderingComplete();
+    // A fence that nobody flushes may never be signalled.
+    fGL.glFlush();
+}
+
+void Evaluation::waitForSingles()
+{
+    const cl_event event = fSinglesReleased.get();
+    if (event)
+        fCL.clWaitForEvents(1, &event);
+}
+
+EvaluationCounts Evaluation::counts() const
+{
+    EvaluationCounts counts = fCounts;
+    for (const auto& worker : fWorkers.all()) {
+        counts.buffersCreated += worker->buffersCreated();
+        counts.buffersReused += worker->buffersReused();
+    }
+    return counts;
+}
+
+} // namespace viewer

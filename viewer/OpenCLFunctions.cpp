@@ -1,0 +1,46 @@
+#include "viewer/OpenCLFunctions.h"
+
+#include <QLibrary>
+
+namespace viewer {
+namespace {
+
+// libOpenCL.so.1; Windows' OpenCL.dll has no version.
+constexpr int kLoaderVersion = 1;
+
+template <typename Function>
+bool resolve(QLibrary& library, const char* name, Function& function)
+{
+    function = reinterpret_cast<Function>(library.resolve(name));
+    return function != nullptr;
+}
+
+bool resolveAll(QLibrary& library, OpenCLFunctions& cl)
+{
+    return resolve(library, "clGetPlatformIDs", cl.clGetPlatformIDs) &&
+           resolve(library, "clGetPlatformInfo", cl.clGetPlatformInfo) &&
+           resolve(library, "clGetDeviceInfo", cl.clGetDeviceInfo) &&
+           resolve(library, "clCreateCommandQueue", cl.clCreateCommandQueue) &&
+           resolve(library, "clReleaseCommandQueue", cl.clReleaseCommandQueue) &&
+           resolve(library, "clSetKernelArg", cl.clSetKernelArg) &&
+           resolve(library, "clEnqueueNDRangeKernel", cl.clEnqueueNDRangeKernel) &&
+           resolve(library, "clEnqueueCopyBuffer", cl.clEnqueueCopyBuffer) &&
+           resolve(library, "clGetEventProfilingInfo", cl.clGetEventProfilingInfo) &&
+           resolve(library, "clWaitForEvents", cl.clWaitForEvents) &&
+           resolve(library, "clFlush", cl.clFlush) && resolve(library, "clFinish", cl.clFinish);
+}
+
+} // namespace
+
+Result<OpenCLFunctions> loadOpenCLFunctions()
+{
+    QLibrary library("OpenCL", kLoaderVersion);
+    OpenCLFunctions cl;
+    if (!library.load() || !resolveAll(library, cl))
+        return Failure{ExitCode::kNoOpenCL,
+                       "there is no OpenCL on this machine; install an OpenCL driver (on Debian "
+                       "without a GPU: pocl-opencl-icd), or use --allow-cpu"};
+    return cl;
+}
+
+} // namespace viewer

@@ -1,0 +1,82 @@
+#include "viewer/OpenCLStart.h"
+
+#include "host/Environment.h"
+#include "runtime/TopenCLInfo.h"
+#include "viewer/GraphicsVendor.h"
+#include "viewer/OpenCLPlatforms.h"
+
+#include <optional>
+
+#include <QByteArray>
+#include <QOpenGLContext>
+#include <QOpenGLFunctions>
+#include <QOpenGLWindow>
+#include <qopenglcontext_platform.h>
+
+namespace viewer {
+namespace {
+
+constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
+
+// The window system's own handle of the context, which OpenCL wants to hear.
+void* nativeContext(QOpenGLContext& context)
+{
+#if defined(Q_OS_WIN)
+    if (auto* wgl = context.nativeInterface<QNativeInterface::QWGLContext>())
+        return wgl->nativeContext();
+#else
+#if QT_CONFIG(xcb_glx_plugin)
+    if (auto* glx = context.nativeInterface<QNativeInterface::QGLXContext>())
+        return glx->nativeContext();
+#endif
+#if QT_CONFIG(egl)
+    if (auto* egl = context.nativeInterface<QNativeInterface::QEGLContext>())
+        return egl->nativeContext();
+#endif
+#endif
+    return nullptr;
+}
+
+std::string glText(QOpenGLContext& context, unsigned name)
+{
+    const auto* text = context.functions()->glGetString(name);
+    return text ? reinterpret_cast<const char*>(text) : "";
+}
+
+// Sets the variable from which the library takes the platform, where the adapter does not tell it.
+Status choosePlatform(const OpenCLFunctions& cl, const std::string& platform, bool adapterIsKnown)
+{
+    if (!platform.empty()) {
+        qputenv(kPlatformVariable, QByteArray::fromStdString(platform));
+        return {};
+    }
+    if (adapterIsKnown || VyraGetEnv(kPlatformVariable))
+        return {};
+    const Result<std::string> vendor = sharingVendor(openCLPlatforms(cl));
+    if (!vendor)
+        return vendor.failure();
+    qputenv(kPlatformVariable, QByteArray::fromStdString(vendor.value()));
+    return {};
+}
+
+} // namespace
+
+Status startOpenCL(QOpenGLWindow& window, const OpenCLFunctions& cl, const std::string& platform)
+{
+    QOpenGLContext& context = *window.context();
+    const std::optional<unsigned> vendorId =
+        pciVendorId(glText(context, GL_VENDOR), glText(context, GL_RENDERER));
+    if (Status failure = choosePlatform(cl, platform, vendorId.has_value()))
+        return failure;
+
+    constexpr bool kUsingDirect3D = false;
+    constexpr bool kUsingCoreProfile = true;
+    if (!TopenCLInfo::initialize(reinterpret_cast<void*>(window.winId()), nativeContext(context),
+                                 nullptr, kUsingDirect3D, kUsingCoreProfile, vendorId.value_or(0)))
+        return Failure{ExitCode::kNoOpenCL,
+                       "OpenCL cannot be used with this renderer, for the reason above; name "
+                       "another platform with --platform, or use --allow-cpu"};
+    return {};
+}
+
+} // namespace viewer

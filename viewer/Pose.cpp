@@ -1,0 +1,104 @@
+#include "viewer/Pose.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace viewer {
+namespace {
+
+QVector3D mix(const QVector3D& from, const QVector3D& to, float fraction)
+{
+    return from + (to - from) * fraction;
+}
+
+QQuaternion mix(const QQuaternion& from, const QQuaternion& to, float fraction)
+{
+    return QQuaternion::slerp(from, to, fraction);
+}
+
+template <typename T>
+T sampleKeys(const std::vector<Key<T>>& keys, double seconds)
+{
+    const auto next =
+        std::upper_bound(keys.begin(), keys.end(), seconds,
+                         [](double time, const auto& key) { return time < key.seconds; });
+    if (next == keys.begin())
+        return keys.front().value;
+    if (next == keys.end())
+        return keys.back().value;
+    const Key<T>& before = *(next - 1);
+    const double fraction = (seconds - before.seconds) / (next->seconds - before.seconds);
+    return mix(before.value, next->value, static_cast<float>(fraction));
+}
+
+QMatrix4x4 localTransform(const Channel& channel, double seconds)
+{
+    QMatrix4x4 local;
+    if (!channel.positions.empty())
+        local.translate(sample(channel.positions, seconds));
+    if (!channel.rotations.empty())
+        local.rotate(sample(channel.rotations, seconds));
+    if (!channel.scales.empty())
+        local.scale(sample(channel.scales, seconds));
+    return local;
+}
+
+double wrapped(double seconds, double length)
+{
+    return length > 0 ? seconds - length * std::floor(seconds / length) : 0.0;
+}
+
+} // namespace
+
+QVector3D sample(const std::vector<Key<QVector3D>>& keys, double seconds)
+{
+    return sampleKeys(keys, seconds);
+}
+
+QQuaternion sample(const std::vector<Key<QQuaternion>>& keys, double seconds)
+{
+    return sampleKeys(keys, seconds);
+}
+
+Pose poseAt(const Model& model, const Animation* animation, double seconds)
+{
+    Pose pose(model.nodes.size());
+    std::transform(model.nodes.begin(), model.nodes.end(), pose.begin(),
+                   [](const Node& node) { return node.local; });
+    if (animation) {
+        const double time = wrapped(seconds, animation->seconds);
+        for (const Channel& channel : animation->channels)
+            pose[channel.node] = localTransform(channel, time);
+    }
+    for (std::size_t i = 0; i < pose.size(); ++i) {
+        if (model.nodes[i].parent != i)
+            pose[i] = pose[model.nodes[i].parent] * pose[i];
+    }
+    return pose;
+}
+
+MatrixRows rowsOf(const QMatrix4x4& matrix)
+{
+    MatrixRows rows;
+    for (int row = 0; row < 3; ++row) {
+        for (int column = 0; column < 4; ++column)
+            rows[static_cast<std::size_t>(4 * row + column)] = matrix(row, column);
+    }
+    return rows;
+}
+
+std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose)
+{
+    std::vector<MatrixRows> matrices;
+    matrices.reserve(mesh.bones.size());
+    for (const Bone& bone : mesh.bones)
+        matrices.push_back(rowsOf(pose[bone.node] * bone.offset));
+    return matrices;
+}
+
+QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose)
+{
+    return mesh.hasBones() ? QMatrix4x4() : pose[mesh.node];
+}
+
+} // namespace viewer

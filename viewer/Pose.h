@@ -1,0 +1,40 @@
+// Where the nodes of a model are at a moment of an animation, and what that means for its meshes.
+#pragma once
+
+#include "viewer/Model.h"
+
+#include <array>
+#include <vector>
+
+#include <QMatrix4x4>
+
+namespace viewer {
+
+// The value at a time between keys: linear for vectors, spherical for rotations (the shorter way).
+// Before the first key its value, behind the last key its value. `keys` is not empty.
+QVector3D sample(const std::vector<Key<QVector3D>>& keys, double seconds);
+QQuaternion sample(const std::vector<Key<QQuaternion>>& keys, double seconds);
+
+// For each node of a model the transform from its space to the model's.
+using Pose = std::vector<QMatrix4x4>;
+
+// The pose at `seconds`, which wraps around the animation's length. Null stands for rest.
+Pose poseAt(const Model& model, const Animation* animation, double seconds);
+
+// The upper three rows of a transform: what the kernels take. A point is transformed by the three
+// dot products of the rows with (x, y, z, 1).
+//
+//     | r0.x r0.y r0.z r0.w |
+//     | r1.x r1.y r1.z r1.w |
+//     | r2.x r2.y r2.z r2.w |
+using MatrixRows = std::array<float, 12>;
+MatrixRows rowsOf(const QMatrix4x4& matrix);
+
+// For each bone of the mesh the transform from the mesh at rest to the model's space.
+std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
+
+// The transform from the space in which the mesh's deformers leave it (the model's where bones took
+// it there, else its node's) to the model's.
+QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose);
+
+} // namespace viewer

@@ -1,0 +1,150 @@
+#include "viewer/Scene.h"
+
+#include "viewer/DetailLevel.h"
+#include "viewer/Pose.h"
+
+#include <cmath>
+
+#include <tbb/parallel_for.h>
+
+namespace viewer {
+namespace {
+
+// Free ground between two characters, in their largest extent.
+constexpr float kGap = 0.25f;
+// Neighbours differ by this part of a turn, the golden ratio's: no two move alike.
+constexpr double kPhaseStep = 0.61803398875;
+// How far a whole character twists, head against feet, and how long one sway takes.
+constexpr double kLargestTwist = 0.5; // radians
+constexpr double kTwistPeriod = 4.0;  // seconds
+constexpr double kFullTurn = 6.28318530718;
+// How much the tints of a crowd differ from white.
+constexpr float kTintDepth = 0.18f;
+
+QVector3D tintOf(int number)
+{
+    if (number == 0)
+        return {1, 1, 1};
+    const double angle = kFullTurn * kPhaseStep * number;
+    const auto channel = [angle](double shift) {
+        return 1.0f - kTintDepth * static_cast<float>(0.5 + 0.5 * std::cos(angle + shift));
+    };
+    return {channel(0), channel(kFullTurn / 3), channel(2 * kFullTurn / 3)};
+}
+
+GLuint createIndexBuffer(QOpenGLFunctions_3_3_Core& gl, const Mesh& mesh)
+{
+    GLuint buffer = 0;
+    gl.glGenBuffers(1, &buffer);
+    gl.glBindVertexArray(0);
+    gl.glBindBuffer(GL_ELEMENT_ARRAY_BUFFER, buffer);
+    gl.glBufferData(GL_ELEMENT_ARRAY_BUFFER,
+                    static_cast<GLsizeiptr>(mesh.triangles.size() * sizeof(std::uint32_t)),
+                    mesh.triangles.data(), GL_STATIC_DRAW);
+    return buffer;
+}
+
+} // namespace
+
+Scene::Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation,
+             int crowd)
+    : fGL(gl), fModel(model), fAnimation(animation), fSpace(characterSpace(model, animation))
+{
+    for (const Mesh& mesh : fModel.meshes) {
+        auto levels = std::make_unique<MeshLevels>();
+        levels->meshes[0] = mesh;
+        levels->meshes[1] = coarserMesh(mesh);
+        for (std::size_t level = 0; level < MeshLevels::kCount; ++level)
+            levels->indexBuffers[level] = createIndexBuffer(gl, levels->meshes[level]);
+        fLevels.push_back(std::move(levels));
+    }
+
+    const int columns = static_cast<int>(std::ceil(std::sqrt(static_cast<double>(crowd))));
+    const int rows = (crowd + columns - 1) / columns;
+    const float stepX = fSpace.size.x() + kGap;
+    const float stepZ = fSpace.size.z() + kGap;
+    for (int i = 0; i < crowd; ++i) {
+        QMatrix4x4 placement;
+        placement.translate(
+            (static_cast<float>(i % columns) - 0.5f * static_cast<float>(columns - 1)) * stepX, 0,
+            (static_cast<float>(i / columns) - 0.5f * static_cast<float>(rows - 1)) * stepZ);
+        createCharacter(placement, i, crowd);
+    }
+    fSize = {stepX * static_cast<float>(columns - 1) + fSpace.size.x(), fSpace.size.y(),
+             stepZ * static_cast<float>(rows - 1) + fSpace.size.z()};
+}
+
+Scene::~Scene()
+{
+    for (CharacterMesh* mesh : fMeshes) {
+        mesh->positions.destroy(fGL, EvaluationState::kClosed);
+        mesh->normals.destroy(fGL, EvaluationState::kClosed);
+        fGL.glDeleteVertexArrays(1, &mesh->vertexArray);
+    }
+    for (const auto& levels : fLevels)
+        fGL.glDeleteBuffers(MeshLevels::kCount, levels->indexBuffers);
+}
+
+void Scene::createCharacter(const QMatrix4x4& placement, int number, int crowd)
+{
+    Character character;
+    character.placement = placement;
+    character.tint = crowd > 1 ? tintOf(number) : QVector3D(1, 1, 1);
+    const double cycle = fAnimation ? fAnimation->seconds : 0.0;
+    character.phase = std::fmod(kPhaseStep * number, 1.0) * std::max(cycle, kTwistPeriod);
+    for (const auto& levels : fLevels) {
+        auto mesh = std::make_unique<CharacterMesh>();
+        mesh->levels = levels.get();
+        createBuffers(*mesh);
+        fMeshes.push_back(mesh.get());
+        character.meshes.push_back(std::move(mesh));
+    }
+    fCharacters.push_back(std::move(character));
+}
+
+void Scene::createBuffers(CharacterMesh& mesh)
+{
+    mesh.positions.create(fGL, mesh.mesh().positions);
+    mesh.normals.create(fGL, mesh.mesh().normals);
+    fGL.glGenVertexArrays(1, &mesh.vertexArray);
+    fGL.glBindVertexArray(mesh.vertexArray);
+    const VertexBuffer* attributes[] = {&mesh.positions, &mesh.normals};
+    for (GLuint location = 0; location < 2; ++location) {
+        fGL.glBindBuffer(GL_ARRAY_BUFFER, attributes[location]->name());
+        fGL.glVertexAttribPointer(location, 3, GL_FLOAT, GL_FALSE, 0, nullptr);
+        fGL.glEnableVertexAttribArray(location);
+    }
+    fGL.glBindBuffer(GL_ELEMENT_ARRAY_BUFFER, mesh.levels->indexBuffers[mesh.level]);
+    fGL.glBindVertexArray(0);
+}
+
+void Scene::changeLevel(CharacterMesh& mesh, EvaluationState state)
+{
+    mesh.positions.destroy(fGL, state);
+    mesh.normals.destroy(fGL, state);
+    fGL.glDeleteVertexArrays(1, &mesh.vertexArray);
+    mesh.level = (mesh.level + 1) % MeshLevels::kCount;
+    createBuffers(mesh);
+}
+
+void Scene::pose(double seconds)
+{
+    tbb::parallel_for(std::size_t{0}, fCharacters.size(), [&](std::size_t i) {
+        poseCharacter(fCharacters[i], seconds + fCharacters[i].phase);
+    });
+}
+
+void Scene::poseCharacter(Character& character, double seconds) const
+{
+    const Pose pose = poseAt(fModel, fAnimation, seconds);
+    const double twist = kLargestTwist * std::sin(kFullTurn * seconds / kTwistPeriod);
+    const float height = std::max(fSpace.size.y(), kGap);
+    for (const auto& mesh : character.meshes) {
+        mesh->pose.bones = boneMatrices(mesh->mesh(), pose);
+        mesh->pose.geometryMatrix = fSpace.fromModel * meshToModel(mesh->mesh(), pose);
+        mesh->pose.inverseGeometryMatrix = mesh->pose.geometryMatrix.inverted();
+        mesh->pose.twist = static_cast<float>(twist) / height;
+    }
+}
+
+} // namespace viewer

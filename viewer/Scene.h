@@ -1,0 +1,86 @@
+// The characters on the stage.
+#pragma once
+
+#include "viewer/CharacterSpace.h"
+#include "viewer/Deformation.h"
+#include "viewer/MeshEvaluator.h"
+#include "viewer/Model.h"
+#include "viewer/VertexBuffer.h"
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <QMatrix4x4>
+#include <QOpenGLFunctions_3_3_Core>
+#include <QVector3D>
+
+namespace viewer {
+
+// The two levels of detail of a mesh, which all characters share.
+struct MeshLevels {
+    static constexpr std::size_t kCount = 2;
+    Mesh meshes[kCount]; // the finest first
+    GLuint indexBuffers[kCount] = {};
+};
+
+// One mesh of one character.
+struct CharacterMesh {
+    const MeshLevels* levels = nullptr;
+    std::size_t level = 0;
+    VertexBuffer positions;
+    VertexBuffer normals;
+    GLuint vertexArray = 0;
+    std::unique_ptr<MeshEvaluator> evaluator; // kept for the run once it was needed
+    bool onOpenCL = false;                    // else it is deformed on the CPU
+    MeshPose pose;
+
+    const Mesh& mesh() const { return levels->meshes[level]; }
+};
+
+struct Character {
+    QMatrix4x4 placement; // from the character's space to the stage
+    QVector3D tint;       // that tells it from its neighbours, near 1
+    double phase = 0;     // seconds ahead of the others
+    std::vector<std::unique_ptr<CharacterMesh>> meshes;
+};
+
+// Characters on a grid, each at a moment of the animation of its own. All operations need the
+// renderer's context to be current.
+class Scene {
+public:
+    // Borrows everything. `animation` is of the model, or null.
+    Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation, int crowd);
+    ~Scene();
+    Scene(const Scene&) = delete;
+    Scene& operator=(const Scene&) = delete;
+
+    // Moves every character to its pose at this time, in parallel.
+    void pose(double seconds);
+
+    // Replaces both vertex buffers of a mesh by those of its other level of detail, not yet shared.
+    void changeLevel(CharacterMesh& mesh, EvaluationState state);
+
+    const std::vector<Character>& characters() const { return fCharacters; }
+    // All meshes of all characters.
+    const std::vector<CharacterMesh*>& meshes() const { return fMeshes; }
+    std::size_t meshesPerCharacter() const { return fLevels.size(); }
+    QVector3D size() const { return fSize; } // of the stage, centred at the origin, feet at y = 0
+
+private:
+    void createCharacter(const QMatrix4x4& placement, int number, int crowd);
+    void createBuffers(CharacterMesh& mesh);
+    void poseCharacter(Character& character, double seconds) const;
+
+    QOpenGLFunctions_3_3_Core& fGL;
+    const Model& fModel;
+    const Animation* fAnimation;
+    CharacterSpace fSpace;
+    QVector3D fSize;
+    std::vector<std::unique_ptr<MeshLevels>> fLevels;
+    std::vector<Character> fCharacters;
+    std::vector<CharacterMesh*> fMeshes;
+};
+
+} // namespace viewer

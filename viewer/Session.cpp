@@ -1,0 +1,281 @@
+#include "viewer/Session.h"
+
+#include "runtime/TopenCLInfo.h"
+#include "standalone/DeviceMemory.h"
+#include "viewer/CpuDeformation.h"
+#include "viewer/ModelImport.h"
+#include "viewer/OpenCLStart.h"
+#include "viewer/ProfileScope.h"
+
+#include <algorithm>
+#include <chrono>
+#include <cstdio>
+#include <filesystem>
+
+#include <QOpenGLContext>
+#include <QOpenGLVersionFunctionsFactory>
+
+namespace viewer {
+namespace {
+
+// Evaluations are numbered in 15 bits, which leaves out the one number that names none.
+constexpr int kEvaluationNumbers = 0x8000;
+
+float aspectOf(const QSize& size)
+{
+    return static_cast<float>(size.width()) / static_cast<float>(std::max(size.height(), 1));
+}
+
+const char* nameOf(TopenCLInfo::GraphicsToCLSyncMode mode)
+{
+    switch (mode) {
+    case TopenCLInfo::kGraphicsToCLImplicit:
+        return "1, implicit";
+    case TopenCLInfo::kGraphicsToCLExplicit:
+        return "2, explicit (fence)";
+    case TopenCLInfo::kGraphicsToCLFinish:
+        return "3, glFinish";
+    }
+    return "unknown";
+}
+
+const char* nameOf(TopenCLInfo::CLToGraphicsSyncMode mode)
+{
+    switch (mode) {
+    case TopenCLInfo::kCLToGraphicsImplicit:
+        return "1, implicit";
+    case TopenCLInfo::kCLToGraphicsEventQuery:
+        return "2, event query";
+    case TopenCLInfo::kCLToGraphicsSyncObject:
+        return "3, sync object";
+    case TopenCLInfo::kCLToGraphicsFinish:
+        return "4, clFinish";
+    }
+    return "unknown";
+}
+
+Result<const Animation*> chooseAnimation(const Model& model, const std::string& name)
+{
+    if (name.empty())
+        return model.animations.empty() ? nullptr : &model.animations.front();
+    std::string known;
+    for (const Animation& animation : model.animations) {
+        if (animation.name == name)
+            return &animation;
+        known += (known.empty() ? "'" : ", '") + animation.name + "'";
+    }
+    return Failure{ExitCode::kModel,
+                   "the model has no animation '" + name + "'; " +
+                       (known.empty() ? "it has none at all" : "it has " + known)};
+}
+
+std::string deviceName(const OpenCLFunctions& cl)
+{
+    char name[256] = "";
+    cl.clGetDeviceInfo(TopenCLInfo::theOne().openCLDevice(), CL_DEVICE_NAME, sizeof(name), name,
+                       nullptr);
+    return name;
+}
+
+} // namespace
+
+Session::Session(const Options& options, QOpenGLWindow& window) : fOptions(options), fWindow(window)
+{
+}
+
+// The evaluation first, which waits for OpenCL; then the shared buffers, with the scene; the
+// context goes last, with the window.
+Session::~Session() = default;
+
+Status Session::start(const QSize& pictureSize)
+{
+    fGL = QOpenGLVersionFunctionsFactory::get<QOpenGLFunctions_3_3_Core>(fWindow.context());
+    if (!fGL)
+        return Failure{ExitCode::kNoGraphics, "the graphics driver has no OpenGL 3.3; update it, "
+                                              "or install Mesa's software renderer"};
+    if (Status failure = loadModel())
+        return failure;
+    fHost = std::make_unique<GLHost>(fWindow);
+    fScene = std::make_unique<Scene>(*fGL, fModel, fAnimation, fOptions.crowd);
+    if (Status failure = startOpenCLIfPossible())
+        return failure;
+    fRenderer = std::make_unique<Renderer>(*fGL);
+    if (Status failure = fRenderer->initialize())
+        return failure;
+    resize(pictureSize);
+    fCamera.frame(fScene->size(), aspectOf(pictureSize));
+    return {};
+}
+
+Status Session::loadModel()
+{
+    Result<Model> model = importModel(fOptions.model);
+    if (!model)
+        return model.failure();
+    fModel = std::move(model.value());
+    const Result<const Animation*> animation = chooseAnimation(fModel, fOptions.animation);
+    if (!animation)
+        return animation.failure();
+    fAnimation = animation.value();
+    return {};
+}
+
+Status Session::startOpenCLIfPossible()
+{
+    Result<OpenCLFunctions> cl = loadOpenCLFunctions();
+    Status failure = cl ? startOpenCL(fWindow, cl.value(), fOptions.platform) : cl.failure();
+    if (failure && !fOptions.allowCpu)
+        return failure;
+    if (failure) {
+        std::fprintf(stderr, "vyra-viewer: going on without OpenCL: %s\n", failure->text.c_str());
+        return {};
+    }
+    fCL = cl.value();
+    if (fOptions.minimumVertices)
+        TopenCLInfo::theOne().setMinimumBufferSize(*fOptions.minimumVertices);
+    fEvaluation = std::make_unique<Evaluation>(*fGL, fCL, *fScene);
+    for (CharacterMesh* mesh : fScene->meshes()) {
+        if (Status refused = fEvaluation->adopt(*mesh))
+            return refused;
+    }
+    return {};
+}
+
+Status Session::renderFrame(double seconds)
+{
+    fScene->pose(seconds);
+
+    const auto begin = std::chrono::steady_clock::now();
+    if (Status failure = evaluate())
+        return failure;
+    const auto end = std::chrono::steady_clock::now();
+    fEvaluationMs.push_back(std::chrono::duration<double, std::milli>(end - begin).count());
+
+    {
+        const ProfileScope scope("Draw");
+        fRenderer->draw(*fScene, fCamera, *fCanvas);
+    }
+    if (fOptions.verify) {
+        const ProfileScope scope("Verify");
+        if (!fDeviation)
+            fDeviation.emplace();
+        fDeviation->include(verify(*fGL, *fScene));
+    }
+    if (fEvaluation)
+        fEvaluation->renderingComplete();
+    const Status failure = writePicture();
+    ++fFrame;
+    return failure;
+}
+
+// From here to the return is what the report calls the evaluation time.
+Status Session::evaluate()
+{
+    Status failure;
+    if (levelChangeIsDue(EvaluationState::kClosed))
+        failure = changeLevels(EvaluationState::kClosed);
+    if (!failure && fEvaluation) {
+        const em::Id id(static_cast<std::uint16_t>(fFrame % kEvaluationNumbers));
+        failure = fEvaluation->evaluate(id, [this]() -> Status {
+            return levelChangeIsDue(EvaluationState::kOpen) ? changeLevels(EvaluationState::kOpen)
+                                                            : Status{};
+        });
+    }
+    if (failure)
+        return failure;
+    deformOnCpu(*fGL, *fScene);
+    if (fEvaluation)
+        fEvaluation->waitUntilDrawable();
+    return {};
+}
+
+// --resize-every changes the level of detail in turn before and during an evaluation; the key does
+// so before.
+bool Session::levelChangeIsDue(EvaluationState state) const
+{
+    if (fChangeAll && state == EvaluationState::kClosed)
+        return true;
+    if (fOptions.resizeEvery == 0 || fFrame == 0 || fFrame % fOptions.resizeEvery != 0)
+        return false;
+    const bool isOddChange = (fFrame / fOptions.resizeEvery) % 2 == 1;
+    return isOddChange == (state == EvaluationState::kOpen);
+}
+
+Status Session::changeLevels(EvaluationState state)
+{
+    if (fEvaluation)
+        fEvaluation->waitForSingles();
+    // One mesh of each character, a different one each time, so that buffers in the batch and new
+    // ones outside meet in one evaluation.
+    const std::size_t count = fScene->meshesPerCharacter();
+    const auto change = static_cast<std::size_t>(fFrame / std::max(fOptions.resizeEvery, 1));
+    for (std::size_t i = 0; i < fScene->meshes().size(); ++i) {
+        if (!fChangeAll && i % count != change % count)
+            continue;
+        CharacterMesh& mesh = *fScene->meshes()[i];
+        fScene->changeLevel(mesh, state);
+        if (!fEvaluation)
+            continue;
+        if (Status failure = fEvaluation->adopt(mesh))
+            return failure;
+    }
+    fChangeAll = false;
+    return {};
+}
+
+void Session::resize(const QSize& pictureSize)
+{
+    fCanvas = std::make_unique<Canvas>(pictureSize);
+    fCamera.setAspect(aspectOf(pictureSize));
+}
+
+Status Session::writePicture() const
+{
+    if (fOptions.output.empty() || fFrame % fOptions.every != 0)
+        return {};
+    std::error_code error;
+    std::filesystem::create_directories(fOptions.output, error);
+    const QString file = QString("%1/frame-%2.png")
+                             .arg(QString::fromStdString(fOptions.output))
+                             .arg(fFrame, 4, 10, QChar('0'));
+    if (fCanvas->image().save(file))
+        return {};
+    return Failure{ExitCode::kOutput, "the picture '" + file.toStdString() +
+                                          "' cannot be written; choose another folder with "
+                                          "--output"};
+}
+
+OpenCLFacts Session::openCLFacts() const
+{
+    const TopenCLInfo& info = TopenCLInfo::theOne();
+    const DeviceMemoryUse memory = deviceMemoryUse();
+    OpenCLFacts facts;
+    facts.device = deviceName(fCL);
+    facts.graphicsToCL = nameOf(info.graphicsToCLSyncMode());
+    facts.clToGraphics = nameOf(info.clToGraphicsSyncMode());
+    facts.doublePrecision = info.supportsDoublePrecision();
+    facts.minimumVertices = info.minimumBufferSize();
+    facts.counts = fEvaluation->counts();
+    facts.deviceBytes = memory.currentBytes;
+    facts.peakDeviceBytes = memory.peakBytes;
+    return facts;
+}
+
+std::string Session::report() const
+{
+    RunFacts facts;
+    if (fEvaluation)
+        facts.openCL = openCLFacts();
+    facts.renderer = reinterpret_cast<const char*>(fGL->glGetString(GL_RENDERER));
+    facts.characters = fScene->characters().size();
+    facts.meshes = fScene->meshes().size();
+    for (const CharacterMesh* mesh : fScene->meshes()) {
+        facts.vertices += mesh->mesh().vertexCount();
+        facts.meshesOnCpu += mesh->onOpenCL ? 0 : 1;
+    }
+    facts.evaluationMs = fEvaluationMs;
+    facts.deviation = fDeviation;
+    return reportText(facts);
+}
+
+} // namespace viewer

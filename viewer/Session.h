@@ -1,0 +1,78 @@
+// One run of the viewer: a model on a stage, deformed and drawn frame after frame.
+#pragma once
+
+#include "viewer/Camera.h"
+#include "viewer/Canvas.h"
+#include "viewer/Evaluation.h"
+#include "viewer/Failure.h"
+#include "viewer/Model.h"
+#include "viewer/OpenCLFunctions.h"
+#include "viewer/Options.h"
+#include "viewer/Renderer.h"
+#include "viewer/Report.h"
+#include "viewer/Scene.h"
+#include "viewer/Verification.h"
+
+#include "standalone/GLHost.h"
+
+#include <memory>
+#include <optional>
+#include <vector>
+
+#include <QOpenGLFunctions_3_3_Core>
+#include <QOpenGLWindow>
+
+namespace viewer {
+
+// All operations, and the destruction, need the window's context to be current.
+class Session {
+public:
+    // Borrows the options and the window, whose context is valid.
+    Session(const Options& options, QOpenGLWindow& window);
+    ~Session();
+    Session(const Session&) = delete;
+    Session& operator=(const Session&) = delete;
+
+    // Loads the model and starts OpenCL, or goes on without it where that is allowed.
+    Status start(const QSize& pictureSize);
+    // Evaluates, draws and, where asked for, compares and writes one frame.
+    Status renderFrame(double seconds);
+    // Draws into a picture of this size from now on.
+    void resize(const QSize& pictureSize);
+    // Before the next frame every mesh changes its level of detail.
+    void changeDetail() { fChangeAll = true; }
+
+    Camera& camera() { return fCamera; }
+    Canvas& canvas() { return *fCanvas; }
+    // False when a frame was beyond the bound of --verify.
+    bool verified() const { return !fDeviation || fDeviation->withinBound(); }
+    std::string report() const;
+
+private:
+    Status loadModel();
+    Status startOpenCLIfPossible();
+    Status evaluate();
+    Status changeLevels(EvaluationState state);
+    bool levelChangeIsDue(EvaluationState state) const;
+    Status writePicture() const;
+    OpenCLFacts openCLFacts() const;
+
+    const Options& fOptions;
+    QOpenGLWindow& fWindow;
+    QOpenGLFunctions_3_3_Core* fGL = nullptr; // the context's
+    std::unique_ptr<GLHost> fHost;
+    OpenCLFunctions fCL;
+    Model fModel;
+    const Animation* fAnimation = nullptr; // of fModel
+    std::unique_ptr<Scene> fScene;
+    std::unique_ptr<Evaluation> fEvaluation; // null: without OpenCL
+    std::unique_ptr<Renderer> fRenderer;
+    std::unique_ptr<Canvas> fCanvas;
+    Camera fCamera;
+    bool fChangeAll = false;
+    int fFrame = 0;
+    std::vector<double> fEvaluationMs;
+    std::optional<Deviation> fDeviation;
+};
+
+} // namespace viewer

@@ -1,0 +1,32 @@
+// Compares what stands in the renderer's vertex buffers with the CPU reference.
+#pragma once
+
+#include "viewer/Scene.h"
+
+#include <QOpenGLFunctions_3_3_Core>
+
+namespace viewer {
+
+// The largest differences over all vertices. A value that is not a number counts as infinite.
+struct Deviation {
+    double position = 0; // in parts of the character's largest extent
+    double normal = 0;   // length of the difference of two vectors of length 1
+
+    void include(const Deviation& other);
+    bool withinBound() const;
+};
+
+// A few units in the last place of single precision, in which kernels sum up four bones and turn by
+// sines and cosines that the default build options allow to be approximate.
+inline constexpr double kPositionBound = 1e-5;
+inline constexpr double kNormalBound = 1e-4;
+
+// `toCharacter` leads from the space of both surfaces to the character's, where positions are
+// compared.
+Deviation compare(const Surface& actual, const Surface& expected, const QMatrix4x4& toCharacter);
+
+// Reads every vertex buffer of the scene back from OpenGL. On the renderer's thread, its context
+// current, when the frame may be drawn.
+Deviation verify(QOpenGLFunctions_3_3_Core& gl, const Scene& scene);
+
+} // namespace viewer

@@ -1,0 +1,144 @@
+// vyra-viewer: an animated character, deformed by OpenCL straight into the vertex buffers that
+// OpenGL draws from.
+#include "viewer/Options.h"
+#include "viewer/Session.h"
+#include "viewer/ViewerWindow.h"
+
+#include "standalone/ProfileRecorder.h"
+
+#include <cstdio>
+#include <cstdlib>
+#include <memory>
+
+#include <QCoreApplication>
+#include <QGuiApplication>
+#include <QSurfaceFormat>
+
+namespace {
+
+using viewer::ExitCode;
+using viewer::Failure;
+using viewer::Options;
+using viewer::Session;
+using viewer::Status;
+using viewer::ViewerWindow;
+
+// Time between two frames that are rendered without a clock.
+constexpr double kSecondsPerFrame = 1.0 / 30.0;
+
+int tell(const Failure& failure)
+{
+    std::fprintf(stderr, "vyra-viewer: %s\n", failure.text.c_str());
+    return static_cast<int>(failure.code);
+}
+
+// Qt ends the process when it finds no display.
+void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QString& message)
+{
+    if (type != QtFatalMsg) {
+        std::fprintf(stderr, "%s\n", qPrintable(message));
+        return;
+    }
+    const int code =
+        tell({ExitCode::kNoGraphics, "there is no display; start one, or run "
+                                     "this under a virtual one: xvfb-run -a vyra-viewer ..."});
+    std::_Exit(code);
+}
+
+QSurfaceFormat surfaceFormat(bool waitForDisplay)
+{
+    QSurfaceFormat format;
+    format.setVersion(3, 3);
+    format.setProfile(QSurfaceFormat::CoreProfile);
+    format.setSwapInterval(waitForDisplay ? 1 : 0);
+    return format;
+}
+
+Status renderFrames(Session& session, ViewerWindow& window, int frames)
+{
+    for (int i = 0; i < frames; ++i) {
+        if (Status failure = session.renderFrame(i * kSecondsPerFrame))
+            return failure;
+        window.present(session);
+        QGuiApplication::processEvents();
+        window.makeCurrent();
+    }
+    return {};
+}
+
+Status playInWindow(Session& session, ViewerWindow& window)
+{
+    window.play(session);
+    QGuiApplication::exec();
+    window.stop();
+    window.makeCurrent();
+    return window.failure();
+}
+
+Status run(const Options& options, bool& verified)
+{
+    ViewerWindow window;
+    if (Status failure = window.open(options.size))
+        return failure;
+    window.makeCurrent();
+    Session session(options, window);
+    if (Status failure = session.start(options.size))
+        return failure;
+
+    const Status failure = options.frames ? renderFrames(session, window, *options.frames)
+                                          : playInWindow(session, window);
+    verified = session.verified();
+    std::fputs(session.report().c_str(), stdout);
+    return failure;
+}
+
+Status runTraced(const Options& options, bool& verified)
+{
+    if (options.trace.empty())
+        return run(options, verified);
+    ProfileRecorder::nameThread("Main thread");
+    ProfileRecorder::start();
+    Status failure = run(options, verified);
+    ProfileRecorder::stop();
+    if (!failure && !ProfileRecorder::writeChromeTrace(options.trace))
+        return Failure{ExitCode::kOutput, "the trace '" + options.trace +
+                                              "' cannot be written; choose another file with "
+                                              "--trace"};
+    return failure;
+}
+
+QStringList argumentsOf(int argc, char* argv[])
+{
+    QStringList arguments;
+    for (int i = 0; i < argc; ++i)
+        arguments.append(QString::fromLocal8Bit(argv[i]));
+    return arguments;
+}
+
+} // namespace
+
+int main(int argc, char* argv[])
+{
+    const viewer::Result<Options> options = viewer::parseOptions(argumentsOf(argc, argv));
+    if (!options)
+        return tell(options.failure());
+    if (options.value().help) {
+        const QCoreApplication application(argc, argv);
+        std::fputs(viewer::helpText().c_str(), stdout);
+        return static_cast<int>(ExitCode::kSuccess);
+    }
+
+    const bool plays = !options.value().frames;
+    QSurfaceFormat::setDefaultFormat(surfaceFormat(plays));
+    qInstallMessageHandler(sayThatThereIsNoDisplay);
+    const QGuiApplication application(argc, argv);
+    qInstallMessageHandler(nullptr);
+
+    bool verified = true;
+    if (const Status failure = runTraced(options.value(), verified))
+        return tell(*failure);
+    if (!verified)
+        return tell({ExitCode::kDeviation, "a frame deviates from the CPU reference by more than "
+                                           "the bound; see the report"});
+    return static_cast<int>(ExitCode::kSuccess);
+}

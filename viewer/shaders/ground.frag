@@ -1,0 +1,30 @@
+// Behind lighting.glsl and backdrop.glsl.
+in vec3 stagePosition;
+
+uniform float clearRadius; // up to here the ground is fully there; at twice as much it is gone
+uniform vec2 pictureSize;
+
+out vec4 colour;
+
+const vec3 kGroundColour = vec3(0.80, 0.79, 0.78);
+const float kTile = 0.5;
+
+// 1 on the lines between tiles, anti-aliased; they fade before they would flicker.
+float tileLines(vec2 place)
+{
+    vec2 width = fwidth(place);
+    vec2 distance = abs(fract(place - 0.5) - 0.5);
+    vec2 line = 1.0 - smoothstep(vec2(0.0), 1.5 * width, distance);
+    return max(line.x, line.y) * (1.0 - smoothstep(0.05, 0.35, max(width.x, width.y)));
+}
+
+void main()
+{
+    float fade = 1.0 - smoothstep(clearRadius, 2.0 * clearRadius, length(stagePosition.xz));
+    vec3 up = vec3(0.0, 1.0, 0.0);
+    float key = lightDirection.y * keyVisibility(stagePosition);
+    vec3 albedo = toLinear(kGroundColour) * (1.0 - 0.16 * tileLines(stagePosition.xz / kTile));
+    vec3 lit = toScreen(albedo * (key * kKeyColour + ambientLight(up)) * 0.62);
+    vec3 behind = backdropColour(gl_FragCoord.y / pictureSize.y);
+    colour = vec4(mix(behind, lit, fade), 1.0);
+}

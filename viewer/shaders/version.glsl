@@ -1,0 +1,1 @@
+#version 330 core
