@@ -41,13 +41,18 @@ private:
     std::vector<cl_event> events_;
 };
 
-// One batch of copies, from its commands to the end of its work. Shared by the caller, the
-// runtime's callback and the worker's job.
+// One batch of copies, from its commands to the end of its work.
 struct Batch {
     SharedBuffers buffers;
     std::vector<void*> mapped; // where each buffer lies while it is mapped
     CopyDirection direction;
     cl_event copied = nullptr; // the user event; owned
+    // All are held until the batch is settled, since runtimes still touch the events of commands
+    // that failed.
+    Events maps;
+    Events allMapped; // one marker
+    Events unmaps;
+    bool isSettled = false; // the user event has its status; the worker's alone
 
     ~Batch()
     {
@@ -66,7 +71,7 @@ bool copy(GlDevice& device, const SharedBuffer& buffer, void* mapped, CopyDirect
 
 // A buffer that is gone by now keeps what it holds: the application broke the rules after the
 // command was given, and all that is left is to end well.
-void copyAll(Batch& batch, GlDevice* device)
+void copyAll(const Batch& batch, GlDevice* device)
 {
     for (std::size_t i = 0; i < batch.buffers.size(); ++i) {
         const SharedBuffer& buffer = *batch.buffers[i];
@@ -75,29 +80,49 @@ void copyAll(Batch& batch, GlDevice* device)
         else
             ++counters().failedCopies;
     }
+}
+
+// On the worker, once the commands before the copies have ended with `status`. If they have failed,
+// only the unmapping is left to do.
+void settle(Batch& batch, cl_int status, GlDevice* device)
+{
+    if (std::exchange(batch.isSettled, true))
+        return;
+    if (status == CL_COMPLETE)
+        copyAll(batch, device);
     runtime().clSetUserEventStatus(batch.copied, CL_COMPLETE);
 }
 
-// Comes on a thread of the runtime's, which must not be kept: the worker does the work.
+// Comes on a thread of the runtime's, which must not be kept, nor enter the runtime again.
 void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* user)
 {
-    const std::unique_ptr<BatchPointer> owner(static_cast<BatchPointer*>(user));
-    const BatchPointer batch = *owner;
-    if (status < 0) {
-        runtime().clSetUserEventStatus(batch->copied, status);
+    const std::unique_ptr<std::weak_ptr<Batch>> owner(static_cast<std::weak_ptr<Batch>*>(user));
+    const BatchPointer batch = owner->lock();
+    if (batch == nullptr)
         return;
-    }
     const std::shared_ptr<SharingContext> context = batch->buffers.front()->context;
-    context->worker().post([batch](GlDevice* device) { copyAll(*batch, device); });
+    context->worker().post([batch, status](GlDevice* device) { settle(*batch, status, device); });
 }
 
-cl_int mapAll(cl_command_queue queue, Batch& batch, std::span<const cl_event> waitList,
-              Events& events)
+// Not every runtime calls back when a command fails, so that the worker has a look at times. The
+// watch is what keeps the batch.
+bool hasEnded(Batch& batch, GlDevice* device)
+{
+    cl_int status = CL_QUEUED;
+    if (!batch.isSettled)
+        runtime().clGetEventInfo(*batch.allMapped.data(), CL_EVENT_COMMAND_EXECUTION_STATUS,
+                                 sizeof status, &status, nullptr);
+    if (status < 0)
+        settle(batch, status, device);
+    return batch.isSettled;
+}
+
+cl_int mapAll(cl_command_queue queue, Batch& batch, std::span<const cl_event> waitList)
 {
     const cl_map_flags access =
         batch.direction == CopyDirection::FromGl ? CL_MAP_WRITE : CL_MAP_READ;
     for (const auto& buffer : batch.buffers) {
-        const cl_int error = events.add([&](cl_event* event) {
+        const cl_int error = batch.maps.add([&](cl_event* event) {
             cl_int status = CL_SUCCESS;
             void* mapped = runtime().clEnqueueMapBuffer(
                 queue, buffer->memory, CL_FALSE, access, 0, buffer->size,
@@ -112,11 +137,11 @@ cl_int mapAll(cl_command_queue queue, Batch& batch, std::span<const cl_event> wa
     return CL_SUCCESS;
 }
 
-cl_int unmapAll(cl_command_queue queue, const Batch& batch, Events& events)
+cl_int unmapAll(cl_command_queue queue, Batch& batch)
 {
     cl_int result = CL_SUCCESS;
     for (std::size_t i = 0; i < batch.mapped.size(); ++i) {
-        const cl_int error = events.add([&](cl_event* event) {
+        const cl_int error = batch.unmaps.add([&](cl_event* event) {
             return runtime().clEnqueueUnmapMemObject(queue, batch.buffers[i]->memory,
                                                      batch.mapped[i], 1, &batch.copied, event);
         });
@@ -126,24 +151,27 @@ cl_int unmapAll(cl_command_queue queue, const Batch& batch, Events& events)
     return result;
 }
 
-// The commands after the maps. The callback comes last: until it is set, the caller alone decides
-// about the user event.
-cl_int enqueueRest(cl_command_queue queue, const BatchPointer& batch, const Events& maps,
-                   Events& unmaps, cl_event* done)
+// The commands after the maps. The last one waits for the maps too, so that it fails if they do.
+// The callback comes at the end: until it is set, the caller alone decides about the user event.
+cl_int enqueueRest(cl_command_queue queue, const BatchPointer& batch, cl_event* done)
 {
-    Events mapped;
-    cl_int error = mapped.add([&](cl_event* event) {
-        return runtime().clEnqueueMarkerWithWaitList(queue, maps.count(), maps.data(), event);
+    cl_int error = batch->allMapped.add([&](cl_event* event) {
+        return runtime().clEnqueueMarkerWithWaitList(queue, batch->maps.count(), batch->maps.data(),
+                                                     event);
     });
     if (error == CL_SUCCESS)
-        error = unmapAll(queue, *batch, unmaps);
+        error = unmapAll(queue, *batch);
     if (error != CL_SUCCESS)
         return error;
-    error = runtime().clEnqueueMarkerWithWaitList(queue, unmaps.count(), unmaps.data(), done);
+    std::vector<cl_event> all(batch->unmaps.data(), batch->unmaps.data() + batch->unmaps.count());
+    all.push_back(*batch->allMapped.data());
+    error = runtime().clEnqueueMarkerWithWaitList(queue, static_cast<cl_uint>(all.size()),
+                                                  all.data(), done);
     if (error != CL_SUCCESS)
         return error;
-    auto owner = std::make_unique<BatchPointer>(batch);
-    error = runtime().clSetEventCallback(*mapped.data(), CL_COMPLETE, onMapped, owner.get());
+    auto owner = std::make_unique<std::weak_ptr<Batch>>(batch);
+    error =
+        runtime().clSetEventCallback(*batch->allMapped.data(), CL_COMPLETE, onMapped, owner.get());
     if (error != CL_SUCCESS) {
         runtime().clReleaseEvent(std::exchange(*done, nullptr)); // the caller gets none
         return error;
@@ -157,28 +185,29 @@ cl_int enqueueRest(cl_command_queue queue, const BatchPointer& batch, const Even
 cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers, CopyDirection direction,
                      std::span<const cl_event> waitList, cl_event* done)
 {
-    cl_context context = nullptr;
+    cl_context handle = nullptr;
     cl_int error =
-        runtime().clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof context, &context, nullptr);
+        runtime().clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof handle, &handle, nullptr);
     if (error != CL_SUCCESS)
         return error;
     const auto batch = std::make_shared<Batch>();
     batch->buffers = std::move(buffers);
     batch->direction = direction;
-    batch->copied = runtime().clCreateUserEvent(context, &error);
+    batch->copied = runtime().clCreateUserEvent(handle, &error);
     if (error != CL_SUCCESS)
         return error;
 
-    Events maps;
-    Events unmaps;
-    error = mapAll(queue, *batch, waitList, maps);
+    error = mapAll(queue, *batch, waitList);
     if (error == CL_SUCCESS)
-        error = enqueueRest(queue, batch, maps, unmaps, done);
-    if (error == CL_SUCCESS)
+        error = enqueueRest(queue, batch, done);
+    if (error == CL_SUCCESS) {
+        batch->buffers.front()->context->worker().watch(
+            [batch](GlDevice* device) { return hasEnded(*batch, device); });
         return CL_SUCCESS;
+    }
     // What was mapped is unmapped again, if that is not in the queue already.
-    if (unmaps.count() == 0)
-        static_cast<void>(unmapAll(queue, *batch, unmaps));
+    if (batch->unmaps.count() == 0)
+        static_cast<void>(unmapAll(queue, *batch));
     runtime().clSetUserEventStatus(batch->copied, CL_COMPLETE);
     return error;
 }

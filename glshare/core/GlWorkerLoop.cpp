@@ -10,7 +10,7 @@ namespace glshare {
 namespace {
 
 // Between two looks at what is watched: short beside a frame, long beside a look.
-constexpr std::chrono::microseconds kWatchInterval{100};
+constexpr std::chrono::microseconds kWatchInterval{250};
 
 // An exiting process waits this long for a job that is running, which is a copy at most.
 constexpr std::chrono::seconds kExitPatience{1};

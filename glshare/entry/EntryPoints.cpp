@@ -41,6 +41,8 @@ void installEntryPoints(cl_icd_dispatch& table)
 
 namespace {
 
+constexpr std::string_view kCreateEventFromGlSync = "clCreateEventFromGLsyncKHR";
+
 struct NamedFunction {
     std::string_view name;
     void* address;
@@ -52,9 +54,7 @@ NamedFunction named(std::string_view name, Function* function)
     return {name, reinterpret_cast<void*>(function)};
 }
 
-} // namespace
-
-void* findExtensionFunction(const char* name)
+void* findFunction(std::string_view name)
 {
     static const std::array theFunctions{
         named("clGetGLContextInfoKHR", entry::getGlContextInfo),
@@ -67,32 +67,42 @@ void* findExtensionFunction(const char* name)
         named("clGetGLTextureInfo", entry::getGlTextureInfo),
         named("clEnqueueAcquireGLObjects", entry::enqueueAcquireGlObjects),
         named("clEnqueueReleaseGLObjects", entry::enqueueReleaseGlObjects),
+        named(kCreateEventFromGlSync, entry::createEventFromGlSync),
         named(GLSHARE_GET_COUNTERS_NAME, getCounters),
     };
-    if (name == nullptr)
-        return nullptr;
     for (const NamedFunction& function : theFunctions) {
         if (function.name == name)
             return function.address;
     }
-    if (switches().glEvent && std::string_view(name) == "clCreateEventFromGLsyncKHR")
-        return reinterpret_cast<void*>(entry::createEventFromGlSync);
     return nullptr;
 }
+
+// The loader has an entry point of its own for every name it knows, so that a function which is not
+// offered must be hidden from it.
+template <typename AskBelow>
+void* lookUp(const char* name, AskBelow askBelow)
+{
+    const std::string_view wanted = name == nullptr ? std::string_view() : name;
+    if (wanted == kCreateEventFromGlSync && !switches().glEvent)
+        return nullptr;
+    void* own = findFunction(wanted);
+    return own != nullptr ? own : askBelow();
+}
+
+} // namespace
 
 namespace entry {
 
 void* CL_API_CALL getExtensionFunctionAddress(const char* name)
 {
-    void* own = findExtensionFunction(name);
-    return own != nullptr ? own : runtime().clGetExtensionFunctionAddress(name);
+    return lookUp(name, [name] { return runtime().clGetExtensionFunctionAddress(name); });
 }
 
 void* CL_API_CALL getExtensionFunctionAddressForPlatform(cl_platform_id platform, const char* name)
 {
-    void* own = findExtensionFunction(name);
-    return own != nullptr ? own
-                          : runtime().clGetExtensionFunctionAddressForPlatform(platform, name);
+    return lookUp(name, [platform, name] {
+        return runtime().clGetExtensionFunctionAddressForPlatform(platform, name);
+    });
 }
 
 } // namespace entry

@@ -9,10 +9,6 @@ namespace glshare {
 // Replaces the functions below in `table`, which otherwise stays as it is.
 void installEntryPoints(cl_icd_dispatch& table);
 
-// The function of that name if this program implements it, else null. For look-ups of extension
-// functions.
-[[nodiscard]] void* findExtensionFunction(const char* name);
-
 namespace entry {
 
 cl_int CL_API_CALL getPlatformInfo(cl_platform_id platform, cl_platform_info name, std::size_t size,

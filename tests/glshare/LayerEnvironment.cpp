@@ -1,5 +1,6 @@
-// The entry of the test programs: puts the layer that was built in front of the runtime. The OpenCL
-// loader looks at the environment when its first function is called.
+// The entry of the test programs: puts the layer that was built in front of the runtime, and sets
+// the environment variables given as arguments of the form NAME=VALUE. The OpenCL loader and the
+// layer look at the environment when the first OpenCL function is called.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -8,5 +9,7 @@ int main(int argc, char** argv)
 {
     setenv("OPENCL_LAYERS", GLSHARE_LAYER, 1);
     testing::InitGoogleTest(&argc, argv);
+    for (int i = 1; i < argc; ++i)
+        putenv(argv[i]);
     return RUN_ALL_TESTS();
 }
