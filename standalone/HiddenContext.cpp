@@ -63,9 +63,8 @@ void HiddenContext::serve()
         task->done = true;
         fChanged.notify_all();
     }
-    // A context is destroyed on its own thread.
+    // Current nowhere, the context can be destroyed from any thread.
     fContext->doneCurrent();
-    fContext.reset();
 }
 
 } // namespace vyra::host

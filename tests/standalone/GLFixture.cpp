@@ -2,6 +2,9 @@
 
 #include <QDeadlineTimer>
 
+#include <dlfcn.h>
+#include <link.h>
+
 #include <chrono>
 
 namespace {
@@ -12,6 +15,18 @@ char programName[] = "vyra-host-gl-tests";
 char* arguments[] = {programName, nullptr};
 
 constexpr auto windowTimeout = std::chrono::seconds(20);
+
+// Keeps what is loaded now until the process ends: what the static objects of a driver hold reads
+// as leaked once the driver is unloaded.
+void keepModulesLoaded()
+{
+    dl_iterate_phdr(
+        [](dl_phdr_info* module, std::size_t, void*) {
+            dlopen(module->dlpi_name, RTLD_NOLOAD | RTLD_NODELETE | RTLD_LAZY);
+            return 0;
+        },
+        nullptr);
+}
 
 } // namespace
 
@@ -41,6 +56,7 @@ void GLTest::SetUp()
 
 void GLTest::TearDown()
 {
+    keepModulesLoaded();
     // A context goes before the surface that it is current on.
     fContext.reset();
 }

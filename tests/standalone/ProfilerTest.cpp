@@ -36,7 +36,7 @@ public:
         const QJsonDocument document = QJsonDocument::fromJson(file.readAll(), &error);
         EXPECT_EQ(error.error, QJsonParseError::NoError) << error.errorString().toStdString();
         Trace trace;
-        for (const QJsonValue& value : document.object()["traceEvents"].toArray()) {
+        for (const auto& value : document.object()["traceEvents"].toArray()) {
             trace.fObjects.push_back(value.toObject());
         }
         return trace;
@@ -133,6 +133,7 @@ TEST(Profiler, KeepsEveryEventOfEveryThreadInARowOfItsOwn)
     ProfileRecorder::start();
     {
         std::vector<std::jthread> threads;
+        threads.reserve(threadCount);
         for (int i = 0; i < threadCount; ++i) {
             threads.emplace_back([i] {
                 const std::string name = "work" + std::to_string(i);
