@@ -15,6 +15,7 @@
 #include <functional>
 #include <map>
 #include <mutex>
+#include <span>
 #include <utility>
 
 namespace glshare {
@@ -28,7 +29,8 @@ using SetCloseDisplay = CloseDisplayHook (*)(Display*, int extension, CloseDispl
 // The libraries are never closed: their hooks and exit handlers may outlive every context.
 struct GlxFunctions {
     decltype(&::glXGetProcAddressARB) getProcAddress = nullptr;
-    decltype(&::glXChooseFBConfig) chooseFBConfig = nullptr;
+    decltype(&::glXGetFBConfigs) getFBConfigs = nullptr;
+    decltype(&::glXGetFBConfigAttrib) getFBConfigAttrib = nullptr;
     decltype(&::glXDestroyContext) destroyContext = nullptr;
     decltype(&::glXGetCurrentContext) getCurrentContext = nullptr;
     decltype(&::glXMakeContextCurrent) makeContextCurrent = nullptr;
@@ -53,7 +55,8 @@ struct GlxFunctions {
             return function != nullptr;
         };
         complete = found(gl, getProcAddress, "glXGetProcAddressARB") &&
-                   found(gl, chooseFBConfig, "glXChooseFBConfig") &&
+                   found(gl, getFBConfigs, "glXGetFBConfigs") &&
+                   found(gl, getFBConfigAttrib, "glXGetFBConfigAttrib") &&
                    found(gl, destroyContext, "glXDestroyContext") &&
                    found(gl, getCurrentContext, "glXGetCurrentContext") &&
                    found(gl, makeContextCurrent, "glXMakeContextCurrent") &&
@@ -205,20 +208,27 @@ private:
     XErrorHandler previous_ = nullptr;
 };
 
+// The configuration of the application's context. It is searched for by hand, since
+// glXChooseFBConfig does not return every configuration by its number.
 GLXFBConfig configOf(Display* display, GLXContext context)
 {
-    int id = 0;
+    int wanted = 0;
     int screen = 0;
-    glx().queryContext(display, context, GLX_FBCONFIG_ID, &id);
+    glx().queryContext(display, context, GLX_FBCONFIG_ID, &wanted);
     glx().queryContext(display, context, GLX_SCREEN, &screen);
-    const std::array<int, 3> wanted{GLX_FBCONFIG_ID, id, None};
     int count = 0;
-    GLXFBConfig* found = glx().chooseFBConfig(display, screen, wanted.data(), &count);
-    if (found == nullptr)
+    GLXFBConfig* all = glx().getFBConfigs(display, screen, &count);
+    if (all == nullptr)
         return nullptr;
-    GLXFBConfig config = count > 0 ? *found : nullptr;
-    glx().free(found);
-    return config;
+    GLXFBConfig found = nullptr;
+    for (GLXFBConfig config : std::span(all, static_cast<std::size_t>(count))) {
+        int id = 0;
+        glx().getFBConfigAttrib(display, config, GLX_FBCONFIG_ID, &id);
+        if (id == wanted)
+            found = config;
+    }
+    glx().free(all);
+    return found;
 }
 
 } // namespace
