@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <limits>
 
 #include <QtMath>
 
@@ -11,7 +12,8 @@ namespace {
 // A portrait lens: little distortion.
 constexpr float kVerticalFieldOfView = 30.0f; // degrees
 // Air around what is framed.
-constexpr float kMargin = 1.12f;
+constexpr float kMargin = 1.15f;
+constexpr float kLowest = std::numeric_limits<float>::lowest();
 constexpr float kLowestPitch = 2.0f;
 constexpr float kHighestPitch = 85.0f;
 constexpr float kZoomPerStep = 0.9f;
@@ -20,14 +22,6 @@ constexpr float kNearest = 0.25f;
 constexpr float kFarthest = 4.0f;
 
 } // namespace
-
-void Camera::frame(const QVector3D& stageSize, float aspect)
-{
-    fAspect = aspect;
-    fTarget = {0, stageSize.y() / 2, 0};
-    fFittingDistance = fittingDistance(stageSize);
-    fDistance = fFittingDistance;
-}
 
 void Camera::orbit(float yaw, float pitch)
 {
@@ -65,22 +59,28 @@ QMatrix4x4 Camera::toClip() const
     return projection * view();
 }
 
-// The smallest distance at which every corner of the stage is inside the picture.
-float Camera::fittingDistance(const QVector3D& stageSize) const
+// With the camera at (x, y) in its own plane, a point is inside the picture as long as the distance
+// is at least z + |px - x| / tangent, and likewise for y. The x at which the farthest points on
+// both sides ask for the same distance is the best one.
+void Camera::frame(const std::vector<QVector3D>& points, float aspect)
 {
+    fAspect = aspect;
+    fTarget = {};
+    const QMatrix4x4 rotation = view();
     const float tangentY = std::tan(qDegreesToRadians(kVerticalFieldOfView / 2)) / kMargin;
     const float tangentX = tangentY * fAspect;
-    const QMatrix4x4 rotation = view();
-    float distance = 0;
-    for (int corner = 0; corner < 8; ++corner) {
-        const QVector3D offset((corner & 1 ? 0.5f : -0.5f) * stageSize.x(),
-                               (corner & 2 ? 0.5f : -0.5f) * stageSize.y(),
-                               (corner & 4 ? 0.5f : -0.5f) * stageSize.z());
-        const QVector3D seen = rotation.mapVector(offset); // the camera looks along -z
-        distance = std::max({distance, std::abs(seen.x()) / tangentX + seen.z(),
-                             std::abs(seen.y()) / tangentY + seen.z()});
+    float right = kLowest, left = kLowest, top = kLowest, bottom = kLowest;
+    for (const QVector3D& point : points) {
+        const QVector3D seen = rotation.mapVector(point); // the camera looks along -z
+        right = std::max(right, seen.z() + seen.x() / tangentX);
+        left = std::max(left, seen.z() - seen.x() / tangentX);
+        top = std::max(top, seen.z() + seen.y() / tangentY);
+        bottom = std::max(bottom, seen.z() - seen.y() / tangentY);
     }
-    return distance;
+    const QVector3D middle(tangentX * (right - left) / 2, tangentY * (top - bottom) / 2, 0);
+    fTarget = rotation.transposed().mapVector(middle); // a rotation's inverse
+    fFittingDistance = std::max(right + left, top + bottom) / 2;
+    fDistance = fFittingDistance;
 }
 
 } // namespace viewer

@@ -1,6 +1,8 @@
 // A camera that circles around the stage.
 #pragma once
 
+#include <vector>
+
 #include <QMatrix4x4>
 #include <QVector3D>
 
@@ -8,9 +10,9 @@ namespace viewer {
 
 class Camera {
 public:
-    // Looks at the middle of a stage of this size (feet at y = 0), from a distance that shows all
-    // of it in a picture of this shape (width by height).
-    void frame(const QVector3D& stageSize, float aspect);
+    // Comes as near as it can with all of these points inside a picture of this shape (width by
+    // height), seen from the present angles. `points` is not empty.
+    void frame(const std::vector<QVector3D>& points, float aspect);
     // The picture has another shape now.
     void setAspect(float aspect) { fAspect = aspect; }
     // Angles in degrees; the camera stays above the ground and short of the zenith.
@@ -23,7 +25,6 @@ public:
 
 private:
     QMatrix4x4 view() const;
-    float fittingDistance(const QVector3D& stageSize) const;
 
     QVector3D fTarget;
     float fYaw = 28;   // degrees, from the front to the side

@@ -4,6 +4,7 @@
 #include "viewer/Pose.h"
 
 #include <algorithm>
+#include <array>
 #include <limits>
 
 namespace viewer {
@@ -26,14 +27,40 @@ struct Bounds {
     }
 };
 
-void include(const Model& model, const Pose& pose, Bounds& bounds)
+// Towards the faces, edges and corners of a cube.
+std::vector<QVector3D> outlineDirections()
 {
-    for (const Mesh& mesh : model.meshes) {
-        const Surface surface = skin(mesh, boneMatrices(mesh, pose));
-        const QMatrix4x4 toModel = meshToModel(mesh, pose);
-        for (const QVector3D& position : surface.positions)
-            bounds.include(toModel.map(position));
+    std::vector<QVector3D> directions;
+    for (const float x : {-1.0f, 0.0f, 1.0f}) {
+        for (const float y : {-1.0f, 0.0f, 1.0f}) {
+            for (const float z : {-1.0f, 0.0f, 1.0f})
+                directions.emplace_back(x, y, z);
+        }
     }
+    return directions;
+}
+
+// All vertices of a pose, in the model's space.
+std::vector<QVector3D> vertices(const Model& model, const Pose& pose)
+{
+    std::vector<QVector3D> points;
+    for (const Mesh& mesh : model.meshes) {
+        const QMatrix4x4 toModel = meshToModel(mesh, pose);
+        for (const QVector3D& position : skin(mesh, boneMatrices(mesh, pose)).positions)
+            points.push_back(toModel.map(position));
+    }
+    return points;
+}
+
+// Appends the outermost of the points in each direction.
+void appendOutline(const std::vector<QVector3D>& points, std::vector<QVector3D>& outline)
+{
+    static const std::vector<QVector3D> directions = outlineDirections();
+    for (const QVector3D& direction : directions)
+        outline.push_back(*std::max_element(
+            points.begin(), points.end(), [&](const QVector3D& a, const QVector3D& b) {
+                return QVector3D::dotProduct(a, direction) < QVector3D::dotProduct(b, direction);
+            }));
 }
 
 } // namespace
@@ -41,10 +68,14 @@ void include(const Model& model, const Pose& pose, Bounds& bounds)
 CharacterSpace characterSpace(const Model& model, const Animation* animation)
 {
     Bounds bounds;
+    std::vector<QVector3D> outline;
     const int poses = animation && animation->seconds > 0 ? kMeasuredPoses : 1;
     for (int i = 0; i < poses; ++i) {
         const double seconds = animation ? animation->seconds * i / poses : 0.0;
-        include(model, poseAt(model, animation, seconds), bounds);
+        const std::vector<QVector3D> points = vertices(model, poseAt(model, animation, seconds));
+        appendOutline(points, outline);
+        for (const QVector3D& point : points)
+            bounds.include(point);
     }
 
     const QVector3D size = bounds.highest - bounds.lowest;
@@ -56,6 +87,8 @@ CharacterSpace characterSpace(const Model& model, const Animation* animation)
     space.fromModel.scale(scale);
     space.fromModel.translate(-middle.x(), -bounds.lowest.y(), -middle.z());
     space.size = size * scale;
+    for (const QVector3D& point : outline)
+        space.outline.push_back(space.fromModel.map(point));
     return space;
 }
 

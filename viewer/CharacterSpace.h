@@ -3,6 +3,8 @@
 
 #include "viewer/Model.h"
 
+#include <vector>
+
 #include <QMatrix4x4>
 #include <QVector3D>
 
@@ -11,7 +13,8 @@ namespace viewer {
 // Feet at y = 0, upright along y, centred on the y axis, the largest extent 1.
 struct CharacterSpace {
     QMatrix4x4 fromModel;
-    QVector3D size; // extent in this space, over the whole animation
+    QVector3D size;                 // extent in this space, over the whole animation
+    std::vector<QVector3D> outline; // the outermost points of the measured poses, in this space
 };
 
 // Measures the model over one cycle of the animation (null: at rest), without the twist.

@@ -5,7 +5,8 @@
 
 namespace viewer {
 
-DeformerKernel::DeformerKernel(const OpenCLFunctions& cl, const char* file, const char* name)
+DeformerKernel::DeformerKernel(const OpenCLFunctions& cl, const char* file, const char* name,
+                               KernelCounts& counts)
     : fCL(cl)
 {
     TopenCLInfo& info = TopenCLInfo::theOne();
@@ -13,6 +14,10 @@ DeformerKernel::DeformerKernel(const OpenCLFunctions& cl, const char* file, cons
     path += "/kernels/";
     path += file;
     fKernel = info.kernelStore().getKernel(path.asChar(), nullptr, name, nullptr);
+    if (!valid())
+        return;
+    counts.served += 1;
+    counts.programs.insert(file);
 }
 
 DeformerKernel::~DeformerKernel()

@@ -6,10 +6,18 @@
 #include "viewer/OpenCLFunctions.h"
 
 #include <cstddef>
+#include <set>
+#include <string>
 
 #include <CL/cl.h>
 
 namespace viewer {
+
+// What all kernels of a run were asked for.
+struct KernelCounts {
+    std::size_t served = 0;
+    std::set<std::string> programs; // each built once, since their kernels are kept
+};
 
 // Asks the store once and gives the kernel back at the end: a store whose last kernel goes drops
 // the program too, and would build it again for the next request. One thread at a time uses an
@@ -17,7 +25,8 @@ namespace viewer {
 class DeformerKernel {
 public:
     // `file` is a name in the folder "kernels" of the resource directory.
-    DeformerKernel(const OpenCLFunctions& cl, const char* file, const char* name);
+    DeformerKernel(const OpenCLFunctions& cl, const char* file, const char* name,
+                   KernelCounts& counts);
     ~DeformerKernel();
     DeformerKernel(const DeformerKernel&) = delete;
     DeformerKernel& operator=(const DeformerKernel&) = delete;

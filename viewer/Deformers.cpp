@@ -58,8 +58,9 @@ void publish(Flow& flow, const DeformerPlugs& plugs, const AutoCLObject<cl_event
 
 } // namespace
 
-SkinDeformer::SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs)
-    : fPlugs(plugs), fKernel(cl, "skin.cl", "skin"),
+SkinDeformer::SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs,
+                           KernelCounts& counts)
+    : fPlugs(plugs), fKernel(cl, "skin.cl", "skin", counts),
       fBoneIndices(TuniqueString("boneIndices"), plugs.input),
       fBoneWeights(TuniqueString("boneWeights"), plugs.input),
       fBones(TuniqueString("bones"), plugs.input)
@@ -96,8 +97,9 @@ cl_int SkinDeformer::evaluate(const std::vector<MatrixRows>& bones, WorkerQueue&
     return status;
 }
 
-TwistDeformer::TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs)
-    : fPlugs(plugs), fKernel(cl, "twist.cl", "twist"),
+TwistDeformer::TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs,
+                             KernelCounts& counts)
+    : fPlugs(plugs), fKernel(cl, "twist.cl", "twist", counts),
       fGeometryMatrix(TopenCLData::sGeometryMatrixName(), plugs.input),
       fInverseGeometryMatrix(TopenCLData::sInverseGeometryMatrixName(), plugs.input)
 {

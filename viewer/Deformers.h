@@ -25,7 +25,7 @@ struct DeformerPlugs {
 
 class SkinDeformer {
 public:
-    SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs);
+    SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs, KernelCounts& counts);
 
     bool valid() const { return fKernel.valid(); }
     // Uploads the weights of a mesh with bones, after `waits`.
@@ -45,7 +45,7 @@ private:
 
 class TwistDeformer {
 public:
-    TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs);
+    TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs, KernelCounts& counts);
 
     bool valid() const { return fKernel.valid(); }
     // Changes a writable input in place; the output of a read-only one becomes memory of the

@@ -53,15 +53,14 @@ Status Evaluation::adopt(CharacterMesh& mesh)
     if (!mesh.onOpenCL)
         return {};
     if (!mesh.evaluator) {
-        mesh.evaluator =
-            std::make_unique<MeshEvaluator>(fCL, ++fMeshNumber, mesh.mesh().hasBones());
+        mesh.evaluator = std::make_unique<MeshEvaluator>(fCL, ++fMeshNumber, mesh.mesh().hasBones(),
+                                                         fKernelCounts);
         if (!mesh.evaluator->valid())
             return Failure{ExitCode::kOpenCLError,
                            std::string("the kernels in ") +
                                TopenCLInfo::theOne().getAbsolutePathToResources().asChar() +
                                "/kernels cannot be built; check that they are there and that the "
                                "OpenCL driver can compile"};
-        fCounts.kernelsServed += mesh.evaluator->kernelCount();
     }
     cl_int status = mesh.evaluator->setMesh(mesh.mesh(), fWorkers.all().front()->queue());
     if (status == CL_SUCCESS)
@@ -197,6 +196,8 @@ void Evaluation::waitForSingles()
 EvaluationCounts Evaluation::counts() const
 {
     EvaluationCounts counts = fCounts;
+    counts.programsBuilt = fKernelCounts.programs.size();
+    counts.kernelsServed = fKernelCounts.served;
     for (const auto& worker : fWorkers.all()) {
         counts.buffersCreated += worker->buffersCreated();
         counts.buffersReused += worker->buffersReused();

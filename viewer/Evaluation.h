@@ -20,6 +20,7 @@ struct EvaluationCounts {
     // Commands, over all evaluations, by the events that they gave.
     std::size_t acquires = 0;
     std::size_t releases = 0;
+    std::size_t programsBuilt = 0;
     std::size_t kernelsServed = 0;
     std::size_t buffersCreated = 0; // by the pools
     std::size_t buffersReused = 0;
@@ -69,6 +70,7 @@ private:
     const cl_event* fBatchReleased; // where the library keeps the event of its last release
     AutoCLObject<cl_event> fSinglesReleased; // of the last evaluation that had any
     std::uint64_t fMeshNumber = 0;
+    KernelCounts fKernelCounts;
     EvaluationCounts fCounts;
 };
 

@@ -18,14 +18,15 @@ AutoCLEventList listOf(const std::array<AutoCLObject<cl_event>, 2>& events)
 
 } // namespace
 
-MeshEvaluator::MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones)
+MeshEvaluator::MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones,
+                             KernelCounts& counts)
     : fCL(cl), fRest(number, kRest), fSkinned(number, hasBones ? kSkinned : kRest),
       fTwisted(number, kTwisted), fRestPositions(TopenCLData::sPositionsName(), fRest),
       fRestNormals(TopenCLData::sNormalsName(), fRest),
-      fTwist(cl, DeformerPlugs{fSkinned, fTwisted})
+      fTwist(cl, DeformerPlugs{fSkinned, fTwisted}, counts)
 {
     if (hasBones)
-        fSkin.emplace(cl, DeformerPlugs{fRest, fSkinned});
+        fSkin.emplace(cl, DeformerPlugs{fRest, fSkinned}, counts);
 }
 
 bool MeshEvaluator::valid() const

@@ -31,11 +31,11 @@ struct Handover {
 class MeshEvaluator {
 public:
     // `number` tells the mesh from all others.
-    MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones);
+    MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones,
+                  KernelCounts& counts);
 
     // False when a kernel is missing.
     bool valid() const;
-    std::size_t kernelCount() const { return fSkin ? 2 : 1; }
 
     // Uploads the mesh at rest. Again for another level of detail. A status of OpenCL.
     cl_int setMesh(const Mesh& mesh, cl_command_queue queue);

@@ -20,7 +20,9 @@ constexpr char kSampleModels[] = "/usr/share/assimp/models";
 // For files that do not say how long a tick of their animation is; Assimp's documentation names it.
 constexpr double kDefaultTicksPerSecond = 25.0;
 // A light clay, for materials without a colour of their own.
-const QVector3D kDefaultColour(0.80f, 0.74f, 0.68f);
+const QVector3D kDefaultColour(0.82f, 0.70f, 0.58f);
+// Greys are what exporters write when the colour comes from a texture.
+constexpr float kLeastColour = 0.05f;
 
 constexpr unsigned kPostProcessing = aiProcess_JoinIdenticalVertices | aiProcess_Triangulate |
                                      aiProcess_GenSmoothNormals | aiProcess_LimitBoneWeights |
@@ -60,10 +62,9 @@ QVector3D materialColour(const aiScene& scene, unsigned material)
     aiColor3D colour;
     if (scene.mMaterials[material]->Get(AI_MATKEY_COLOR_DIFFUSE, colour) != aiReturn_SUCCESS)
         return kDefaultColour;
-    // Black and white are what exporters write when the colour comes from a texture.
     const float darkest = std::min({colour.r, colour.g, colour.b});
     const float brightest = std::max({colour.r, colour.g, colour.b});
-    if (brightest < 0.05f || darkest > 0.95f)
+    if (brightest - darkest < kLeastColour)
         return kDefaultColour;
     return {colour.r, colour.g, colour.b};
 }

@@ -72,8 +72,8 @@ void Renderer::draw(const Scene& scene, const Camera& camera, Canvas& canvas)
     canvas.bind();
     fGL.glViewport(0, 0, canvas.size().width(), canvas.size().height());
     fGL.glClear(GL_COLOR_BUFFER_BIT | GL_DEPTH_BUFFER_BIT);
-    drawBackdrop();
-    drawGround(scene, camera, canvas.size());
+    drawBackdrop(camera);
+    drawGround(scene, camera);
     drawCharacters(scene, camera);
     fGL.glBindVertexArray(0);
 }
@@ -91,17 +91,19 @@ void Renderer::drawShadows(const Scene& scene)
     }
 }
 
-void Renderer::drawBackdrop()
+void Renderer::drawBackdrop(const Camera& camera)
 {
     fGL.glDepthMask(GL_FALSE);
     fGL.glDepthFunc(GL_LEQUAL);
     fBackdrop.bind();
+    fBackdrop.setUniformValue("fromClip", camera.toClip().inverted());
+    fBackdrop.setUniformValue("eye", camera.eye());
     fGL.glBindVertexArray(fNoVertices);
     fGL.glDrawArrays(GL_TRIANGLES, 0, 3);
     fGL.glDepthMask(GL_TRUE);
 }
 
-void Renderer::drawGround(const Scene& scene, const Camera& camera, const QSize& pictureSize)
+void Renderer::drawGround(const Scene& scene, const Camera& camera)
 {
     const float reach = kGroundReach + std::max(scene.size().x(), scene.size().z());
     fGround.bind();
@@ -109,7 +111,6 @@ void Renderer::drawGround(const Scene& scene, const Camera& camera, const QSize&
     fGround.setUniformValue("toClip", camera.toClip());
     fGround.setUniformValue("halfSize", reach);
     fGround.setUniformValue("clearRadius", kClearGround * reach);
-    fGround.setUniformValue("pictureSize", QSizeF(pictureSize));
     fGL.glBindVertexArray(fNoVertices);
     fGL.glDrawArrays(GL_TRIANGLE_STRIP, 0, 4);
 }

@@ -26,8 +26,8 @@ public:
 
 private:
     void drawShadows(const Scene& scene);
-    void drawBackdrop();
-    void drawGround(const Scene& scene, const Camera& camera, const QSize& pictureSize);
+    void drawBackdrop(const Camera& camera);
+    void drawGround(const Scene& scene, const Camera& camera);
     void drawCharacters(const Scene& scene, const Camera& camera);
     void setLight(QOpenGLShaderProgram& program);
     void drawMesh(const CharacterMesh& mesh);

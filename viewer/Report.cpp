@@ -65,7 +65,7 @@ void addCounts(const OpenCLFacts& cl, Lines& line)
     line("Acquires per frame") << std::setprecision(3)
                                << perEvaluation(counts.acquires, counts.evaluations);
     line("Releases per frame") << perEvaluation(counts.releases, counts.evaluations);
-    line("Kernels") << cl.programsBuilt << " programs built, " << counts.kernelsServed
+    line("Kernels") << counts.programsBuilt << " programs built, " << counts.kernelsServed
                     << " kernels served";
     line("Pool buffers") << counts.buffersCreated << " created, " << counts.buffersReused
                          << " times reused";

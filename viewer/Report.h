@@ -19,7 +19,6 @@ struct OpenCLFacts {
     bool doublePrecision = false;
     int minimumVertices = 0;
     EvaluationCounts counts;
-    std::size_t programsBuilt = 0;
     std::size_t deviceBytes = 0;
     std::size_t peakDeviceBytes = 0;
 };

@@ -85,6 +85,16 @@ Scene::~Scene()
         fGL.glDeleteBuffers(MeshLevels::kCount, levels->indexBuffers);
 }
 
+std::vector<QVector3D> Scene::outline() const
+{
+    std::vector<QVector3D> points;
+    for (const Character& character : fCharacters) {
+        for (const QVector3D& point : fSpace.outline)
+            points.push_back(character.placement.map(point));
+    }
+    return points;
+}
+
 void Scene::createCharacter(const QMatrix4x4& placement, int number, int crowd)
 {
     Character character;

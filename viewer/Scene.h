@@ -67,6 +67,8 @@ public:
     const std::vector<CharacterMesh*>& meshes() const { return fMeshes; }
     std::size_t meshesPerCharacter() const { return fLevels.size(); }
     QVector3D size() const { return fSize; } // of the stage, centred at the origin, feet at y = 0
+    // The outermost points of all characters over the animation.
+    std::vector<QVector3D> outline() const;
 
 private:
     void createCharacter(const QMatrix4x4& placement, int number, int crowd);

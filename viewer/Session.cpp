@@ -103,7 +103,7 @@ Status Session::start(const QSize& pictureSize)
     if (Status failure = fRenderer->initialize())
         return failure;
     resize(pictureSize);
-    fCamera.frame(fScene->size(), aspectOf(pictureSize));
+    fCamera.frame(fScene->outline(), aspectOf(pictureSize));
     return {};
 }
 

@@ -32,16 +32,14 @@ int tell(const Failure& failure)
     return static_cast<int>(failure.code);
 }
 
-// Qt ends the process when it finds no display.
-void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QString& message)
+// Qt ends the process when it finds no display, after messages that are of no use to the user.
+void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QString&)
 {
-    if (type != QtFatalMsg) {
-        std::fprintf(stderr, "%s\n", qPrintable(message));
+    if (type != QtFatalMsg)
         return;
-    }
     const int code =
         tell({ExitCode::kNoGraphics, "there is no display; start one, or run "
-                                     "this under a virtual one: xvfb-run -a vyra-viewer ..."});
+                                     "this under a virtual one: xvfb-run -a vyra-viewer"});
     std::_Exit(code);
 }
 

@@ -55,7 +55,7 @@ kernel void skin(const uint vertexCount, global const float* positions,
     const real4 second = cross(row2, row0);
     const real4 third = cross(row0, row1);
     const real4 normal = toReal4((float4)(vload3(vertexId, normals), 0.0f));
-    const real sign = dot(row0.xyz, first.xyz) < 0 ? -1 : 1;
-    const real3 carried = sign * (real3)(dot(first, normal), dot(second, normal), dot(third, normal));
-    vstore3(unitLength(convert_float3(carried)), vertexId, skinnedNormals);
+    const float sign = dot(row0, first) < 0 ? -1.0f : 1.0f; // cross products have no fourth part
+    const float3 carried = (float3)(dot(first, normal), dot(second, normal), dot(third, normal));
+    vstore3(unitLength(sign * carried), vertexId, skinnedNormals);
 }

@@ -1,8 +1,8 @@
 // Behind backdrop.glsl.
-in float height;
+in vec3 direction;
 out vec4 colour;
 
 void main()
 {
-    colour = vec4(backdropColour(height), 1.0);
+    colour = vec4(backdropColour(normalize(direction).y), 1.0);
 }

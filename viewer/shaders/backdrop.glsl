@@ -1,5 +1,8 @@
-// The paper behind the stage, from the lower edge (0) to the upper edge (1) of the picture.
-vec3 backdropColour(float height)
+// The paper behind the stage, by how far one looks up: the sine of the angle above the horizon. Up
+// to the horizon it has the colour of the lit ground, which fades into it.
+vec3 backdropColour(float elevation)
 {
-    return mix(vec3(0.80, 0.81, 0.83), vec3(0.55, 0.62, 0.72), smoothstep(0.15, 1.0, height));
+    const vec3 kHorizon = vec3(0.80, 0.80, 0.80);
+    const vec3 kZenith = vec3(0.52, 0.59, 0.68);
+    return mix(kHorizon, kZenith, smoothstep(0.0, 0.55, elevation));
 }

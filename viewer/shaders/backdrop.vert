@@ -1,10 +1,15 @@
 #version 330 core
 // One triangle over the whole picture, at the far end.
-out float height;
+
+uniform mat4 fromClip; // to the stage
+uniform vec3 eye;
+
+out vec3 direction;
 
 void main()
 {
     vec2 corner = vec2(gl_VertexID & 1, gl_VertexID >> 1) * 4.0 - 1.0;
-    height = corner.y * 0.5 + 0.5;
     gl_Position = vec4(corner, 1.0, 1.0);
+    vec4 far = fromClip * gl_Position;
+    direction = far.xyz / far.w - eye;
 }

@@ -9,8 +9,10 @@ out vec4 colour;
 
 void main()
 {
-    vec3 normal = normalize(stageNormal);
     vec3 toEye = normalize(eye - stagePosition);
+    vec3 normal = normalize(stageNormal);
+    // Files with normals that look inside exist, and open meshes show their backs.
+    normal = faceforward(normal, -toEye, normal);
     float facing = dot(normal, lightDirection);
 
     // Off the surface, so that a surface does not shade itself.

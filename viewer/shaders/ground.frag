@@ -2,7 +2,6 @@
 in vec3 stagePosition;
 
 uniform float clearRadius; // up to here the ground is fully there; at twice as much it is gone
-uniform vec2 pictureSize;
 
 out vec4 colour;
 
@@ -25,6 +24,5 @@ void main()
     float key = lightDirection.y * keyVisibility(stagePosition);
     vec3 albedo = toLinear(kGroundColour) * (1.0 - 0.16 * tileLines(stagePosition.xz / kTile));
     vec3 lit = toScreen(albedo * (key * kKeyColour + ambientLight(up)) * 0.62);
-    vec3 behind = backdropColour(gl_FragCoord.y / pictureSize.y);
-    colour = vec4(mix(behind, lit, fade), 1.0);
+    colour = vec4(mix(backdropColour(0.0), lit, fade), 1.0);
 }

@@ -6,7 +6,7 @@ uniform float shadowBlur;    // radius of the penumbra, in parts of the shadow m
 uniform sampler2DShadow shadowMap;
 
 const vec3 kKeyColour = vec3(1.00, 0.94, 0.86) * 2.1;
-const vec3 kSkyColour = vec3(0.62, 0.72, 0.88) * 0.75;
+const vec3 kSkyColour = vec3(0.70, 0.77, 0.88) * 0.75;
 const vec3 kBounceColour = vec3(0.50, 0.44, 0.38) * 0.45;
 
 // Points of a sunflower: even over the disc.
@@ -19,10 +19,12 @@ float keyVisibility(vec3 point)
     vec3 place = (toLight * vec4(point, 1.0)).xyz * 0.5 + 0.5;
     if (any(lessThan(place, vec3(0.0))) || any(greaterThan(place, vec3(1.0))))
         return 1.0;
+    // Turned differently at neighbouring pixels, the few points look like many.
+    float turn = fract(52.9829189 * fract(dot(gl_FragCoord.xy, vec2(0.06711056, 0.00583715))));
     float visible = 0.0;
     for (int i = 0; i < kShadowTaps; ++i) {
         float radius = shadowBlur * sqrt((float(i) + 0.5) / float(kShadowTaps));
-        float angle = kGoldenAngle * float(i);
+        float angle = kGoldenAngle * float(i) + 6.2831853 * turn;
         vec2 offset = radius * vec2(cos(angle), sin(angle));
         visible += texture(shadowMap, vec3(place.xy + offset, place.z));
     }
