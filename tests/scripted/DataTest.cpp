@@ -1,0 +1,240 @@
+// Data buffers, the evaluation data map, and the pool against a plain model.
+#include "ScriptedTest.h"
+#include "buffers/TopenCLData.h"
+#include "buffers/TopenCLDataBufferPool.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <random>
+#include <string>
+
+using namespace scripted;
+
+namespace {
+
+using Descriptor = TopenCLDataBufferDescriptor;
+
+const Tplug kPlug(1, 2);
+const Tplug kOtherPlug(3, 4);
+const TuniqueString kName("positions");
+
+Descriptor describe(unsigned bytes, const Tplug& plug = kPlug)
+{
+    return {plug, kName, Descriptor::kReadWrite, 1, bytes, 0};
+}
+
+class DataTest : public ScriptedTest {
+protected:
+    void SetUp() override { ASSERT_TRUE(start()); }
+    // A data buffer with memory of its own.
+    static TopenCLDataBuffer makeData(const Descriptor& descriptor = describe(4))
+    {
+        AutoCLObject<cl_mem> mem;
+        mem.adopt(
+            ocl.clCreateBuffer(TopenCLInfo::theOne().openCLContext(), 1, 4, nullptr, nullptr));
+        return {descriptor, mem, {}};
+    }
+};
+
+TEST_F(DataTest, EqualityIsNameAndPlug)
+{
+    const TopenCLDataBuffer data = makeData();
+    EXPECT_TRUE(data == makeData(describe(9)));
+    EXPECT_TRUE(data != makeData(describe(4, kOtherPlug)));
+    TopenCLDataBuffer renamed = data;
+    renamed.descriptor().setName(TuniqueString("normals"));
+    EXPECT_FALSE(renamed == data);
+}
+
+TEST_F(DataTest, TheNullBufferIsEmptyAndWritable)
+{
+    TopenCLDataBuffer null = TopenCLDataBuffer::fsNULL;
+    EXPECT_EQ(null.buffer().get(), nullptr);
+    EXPECT_EQ(null.bufferReadyEvent().get(), nullptr);
+    EXPECT_TRUE(null.descriptor().hasEmptyName());
+    EXPECT_TRUE(null.descriptor().plug() == Tplug::fsNULL);
+    EXPECT_FALSE(null.descriptor().isReadOnly());
+    EXPECT_EQ(null.descriptor().elementCount() + null.descriptor().elementSizeInBytes() +
+                  null.descriptor().capacityInBytes(),
+              0U);
+}
+
+TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
+{
+    Descriptor input = describe(12);
+    input.setCapacityInBytes(99);
+    for (const int value : {0, 1, 7, -1}) {
+        input.setPermissions(static_cast<Descriptor::Tpermissions>(value));
+        const Descriptor output(kOtherPlug, input);
+        EXPECT_EQ(input.isReadOnly(), value == 0);
+        EXPECT_EQ(output.isReadOnly(), value == 0);
+        EXPECT_TRUE(output.plug() == kOtherPlug && output.name() == kName);
+        EXPECT_EQ(output.capacityInBytes(), 99U);
+        EXPECT_EQ(output.elementCount(), 12U);
+    }
+}
+
+TEST_F(DataTest, MovesTakeOrExchangeHandles)
+{
+    TopenCLDataBuffer first = makeData();  // mem#1
+    TopenCLDataBuffer second = makeData(); // mem#2
+    calls();
+    second = std::move(first);
+    EXPECT_EQ(runtime().name(second.buffer().get()), "mem#1");
+    EXPECT_EQ(runtime().name(first.buffer().get()), "mem#2"); // NOLINT(bugprone-use-after-move)
+    const TopenCLDataBuffer third(std::move(second));
+    EXPECT_EQ(second.buffer().get(), nullptr); // NOLINT(bugprone-use-after-move)
+    first.setBuffer(first.buffer(), 77);
+    EXPECT_EQ(calls(), Lines{});
+    EXPECT_EQ(first.descriptor().capacityInBytes(), 77U);
+}
+
+TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
+{
+    TopenCLData data;
+    EXPECT_TRUE(data.empty());
+    EXPECT_TRUE(data.getSinglePlug() == Tplug::fsNULL);
+    EXPECT_EQ(&data.getData(kName, kPlug), &TopenCLDataBuffer::fsNULL);
+    data.setData(kName, kPlug, makeData()); // mem#1
+    data.setData(kName, kPlug, makeData()); // mem#2 replaces it
+    EXPECT_EQ(std::distance(data.begin(), data.end()), 1);
+    EXPECT_EQ(runtime().name(data.getData(kName, kPlug).buffer().get()), "mem#2");
+    EXPECT_EQ(callsOf("clReleaseMemObject(mem#1)").size(), 3U); // its temporaries and the map's
+
+    const TuniqueString& normals = TopenCLData::sNormalsName();
+    data.setData(normals, kPlug, makeData());
+    EXPECT_TRUE(data.getSinglePlug() == kPlug);
+    const TopenCLData copy(data);
+    EXPECT_EQ(runtime().references(Kind::kMem, data.getData(normals, kPlug).buffer().get()), 2U);
+    data.setData(kName, kOtherPlug, makeData());
+    EXPECT_TRUE(data.getSinglePlug() == Tplug::fsNULL);
+    EXPECT_TRUE(copy.getSinglePlug() == kPlug) << "a copy is a map of its own";
+
+    TopenCLData& itself = data;
+    data = itself;
+    EXPECT_EQ(std::distance(data.cbegin(), data.cend()), 3);
+    data = copy;
+    EXPECT_EQ(&data.getData(kName, kOtherPlug), &TopenCLDataBuffer::fsNULL);
+}
+
+// The hash, written out apart from the library's own.
+TEST_F(DataTest, TheKeyHashFollowsItsFormula)
+{
+    for (const char* text : {"", "positions", "normalIdxToPositionIdx"}) {
+        const TuniqueString name(text);
+        for (const Tplug& plug : {kPlug, kOtherPlug, Tplug::fsNULL}) {
+            std::uint64_t folded = 14695981039346656037ULL;
+            std::uint64_t bytes = name.hash();
+            for (int i = 0; i < 8; ++i, bytes /= 256)
+                folded = (folded ^ bytes % 256) * 1099511628211ULL;
+            const std::uint64_t h = plug.hash();
+            EXPECT_EQ(TopenCLData::KeyHash{}({name, plug}),
+                      h ^ (folded + 2654435769ULL + h * 64 + h / 4));
+        }
+    }
+}
+
+// What the pool should do, in a list of capacities.
+class PoolModel {
+public:
+    // The capacity that a request gets; its memory's place in the free list, or none.
+    std::pair<unsigned, bool> request(unsigned bytes)
+    {
+        auto best = fFree.end();
+        for (auto entry = fFree.begin(); entry != fFree.end(); ++entry) {
+            if (*entry >= bytes && (best == fFree.end() || *entry < *best))
+                best = entry;
+        }
+        const bool reused = best != fFree.end();
+        const unsigned capacity = reused ? *best : bytes;
+        if (reused)
+            fFree.erase(best);
+        fUsed.push_back(capacity);
+        return {capacity, reused};
+    }
+    void release()
+    {
+        fFree.insert(fFree.end(), fUsed.begin(), fUsed.end());
+        fUsed.clear();
+    }
+
+private:
+    std::vector<unsigned> fFree;
+    std::vector<unsigned> fUsed;
+};
+
+TEST_F(DataTest, ThePoolHandsOutTheBestFit)
+{
+    std::mt19937 random(20); // any number: the sequences only have to vary
+    for (int sequence = 0; sequence < 200; ++sequence) {
+        PoolModel model;
+        TopenCLDataBufferPool pool;
+        for (int step = 0; step < 60; ++step) {
+            if (random() % 6 == 0) {
+                pool.releaseBuffers();
+                model.release();
+                continue;
+            }
+            const auto bytes =
+                static_cast<unsigned>(random() % 9 * 50); // few sizes, so that many fit exactly
+            const auto [capacity, reused] = model.request(bytes);
+            calls();
+            const TopenCLDataBuffer buffer = pool.createBuffer(describe(bytes));
+            ASSERT_EQ(buffer.descriptor().capacityInBytes(), capacity);
+            ASSERT_EQ(runtime().memSize(buffer.buffer().get()), capacity);
+            ASSERT_EQ(callsOf("clCreateBuffer").empty(), reused || bytes == 0);
+            ASSERT_EQ(deviceMemory(), 0U);
+        }
+    }
+}
+
+TEST_F(DataTest, ThePoolTakesTheFirstOfEqualsWithItsEvent)
+{
+    TopenCLDataBufferPool pool;
+    const cl_mem first = pool.createBuffer(describe(200)).buffer().get();
+    const cl_mem second = pool.createBuffer(describe(200)).buffer().get();
+    pool.createBuffer(describe(100));
+    pool.releaseBuffers();
+    EXPECT_EQ(pool.createBuffer(describe(150)).buffer().get(), first);
+    EXPECT_EQ(pool.createBuffer(describe(150)).buffer().get(), second);
+    EXPECT_EQ(runtime().memSize(pool.createBuffer(describe(150)).buffer().get()), 150U);
+}
+
+TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
+{
+    TopenCLDataBufferPool pool;
+    TopenCLDataBuffer input = makeData();
+    const TopenCLDataBuffer inPlace = pool.createOutputBuffer(input, kOtherPlug);
+    EXPECT_EQ(inPlace.buffer().get(), input.buffer().get());
+    EXPECT_TRUE(inPlace.descriptor().plug() == kOtherPlug);
+
+    input.descriptor().setPermissions(Descriptor::kReadOnly);
+    const TopenCLDataBuffer pooled = pool.createOutputBuffer(input, kOtherPlug);
+    EXPECT_NE(pooled.buffer().get(), input.buffer().get());
+    EXPECT_FALSE(pooled.descriptor().isReadOnly());
+    EXPECT_TRUE(pooled.descriptor().name() == kName);
+
+    TopenCLData data;
+    pool.collectDataForPlug(kPlug, data);
+    EXPECT_TRUE(data.empty()) << "in-place outputs are not the pool's";
+    const TopenCLDataBuffer later = pool.createBuffer(pooled); // same name and plug: it wins
+    pool.collectDataForPlug(kOtherPlug, data);
+    EXPECT_EQ(data.getData(kName, kOtherPlug).buffer().get(), later.buffer().get());
+    pool.releaseBuffers();
+    TopenCLData none;
+    pool.collectDataForPlug(kOtherPlug, none);
+    EXPECT_TRUE(none.empty());
+}
+
+TEST_F(DataTest, MemoryThatCannotBeMadeStaysOutOfThePool)
+{
+    TopenCLDataBufferPool pool;
+    runtime().plan({.function = "clCreateBuffer"});
+    const TopenCLDataBuffer failed = pool.createBuffer(describe(50));
+    EXPECT_EQ(failed.buffer().get(), nullptr);
+    EXPECT_EQ(failed.descriptor().capacityInBytes(), 50U);
+    pool.releaseBuffers();
+    EXPECT_NE(pool.createBuffer(describe(50)).buffer().get(), nullptr);
+}
+
+} // namespace

@@ -1,0 +1,182 @@
+// Holders of OpenCL objects and event lists: exact counts of retains and releases.
+#include "ScriptedTest.h"
+#include "buffers/TopenCLBuffer.h"
+#include "diagnostics/AutoCLEventList.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <array>
+
+using namespace scripted;
+
+namespace {
+
+using Mem = AutoCLObject<cl_mem>;
+
+class HolderTest : public ScriptedTest {
+protected:
+    void SetUp() override { ASSERT_TRUE(start()); }
+
+    cl_mem makeMem()
+    {
+        const cl_mem mem =
+            ocl.clCreateBuffer(TopenCLInfo::theOne().openCLContext(), 1, 4, nullptr, nullptr);
+        calls();
+        return mem;
+    }
+    // A holder of a new event.
+    AutoCLObject<cl_event> makeEvent()
+    {
+        const Mem mem = adopted(makeMem());
+        AutoCLObject<cl_event> event;
+        ocl.clEnqueueReadBuffer(TopenCLInfo::theOne().openCLCommandQueue(), mem.get(), CL_FALSE, 0,
+                                4, &event, 0, nullptr, event.receive());
+        return event;
+    }
+    static Mem adopted(cl_mem mem)
+    {
+        Mem holder;
+        holder.adopt(mem);
+        return holder;
+    }
+};
+
+TEST_F(HolderTest, EmptyHoldersMakeNoCall)
+{
+    Mem empty;
+    Mem copy(empty);
+    copy = empty;
+    empty.reset();
+    empty.adopt(nullptr);
+    EXPECT_EQ(*empty.receive(), nullptr);
+    EXPECT_EQ(calls(), Lines{});
+}
+
+TEST_F(HolderTest, EachOperationMakesExactlyItsCalls)
+{
+    Mem first = adopted(makeMem());  // mem#1
+    Mem second = adopted(makeMem()); // mem#2
+    EXPECT_EQ(calls(), Lines{}) << "adopting retained or released";
+
+    Mem copy(first);
+    EXPECT_EQ(calls(), Lines{"clRetainMemObject(mem#1)"});
+    copy = first;
+    Mem& itself = copy;
+    copy = itself;
+    copy.adopt(first.get());
+    EXPECT_EQ(calls(), Lines{}) << "the same handle";
+    copy = second;
+    EXPECT_EQ(calls(), (Lines{"clReleaseMemObject(mem#1)", "clRetainMemObject(mem#2)"}));
+    copy = Mem();
+    EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#2)"});
+
+    Mem moved(std::move(first));
+    EXPECT_EQ(first.get(), nullptr); // NOLINT(bugprone-use-after-move): what a move leaves
+    moved = std::move(second);
+    EXPECT_EQ(runtime().name(moved.get()), "mem#2");
+    EXPECT_EQ(runtime().name(second.get()), "mem#1"); // NOLINT(bugprone-use-after-move)
+    EXPECT_EQ(calls(), Lines{}) << "moves exchange";
+
+    moved.adopt(makeMem()); // mem#3
+    second = Mem();
+    EXPECT_EQ(*moved.receive(), nullptr);
+    EXPECT_EQ(calls(), (Lines{"clReleaseMemObject(mem#2)", "clReleaseMemObject(mem#1)",
+                              "clReleaseMemObject(mem#3)"}));
+}
+
+TEST_F(HolderTest, CopyAssigningAnEmptyHolderReleasesOnce)
+{
+    const Mem empty;
+    Mem holder = adopted(makeMem());
+    holder = empty;
+    EXPECT_EQ(holder.get(), nullptr);
+    EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#1)"});
+}
+
+TEST_F(HolderTest, FailingCountsAreReportedAndChangeNothingElse)
+{
+    Mem holder = adopted(makeMem());
+    runtime().plan({.function = "clRetainMemObject"});
+    runtime().plan({.function = "clReleaseMemObject", .status = CL_INVALID_MEM_OBJECT});
+    Mem copy(holder);
+    EXPECT_EQ(copy.get(), holder.get());
+    copy.reset();
+    EXPECT_EQ(copy.get(), nullptr);
+    EXPECT_EQ(warnings(),
+              (Lines{"OpenCL error: CL_OUT_OF_RESOURCES", "OpenCL error: CL_INVALID_MEM_OBJECT"}));
+}
+
+TEST_F(HolderTest, EventsKernelsAndProgramsUseTheirOwnCalls)
+{
+    const AutoCLObject<cl_event> event = makeEvent();
+    calls();
+    {
+        const AutoCLObject<cl_event> copy(event);
+    }
+    EXPECT_EQ(calls(), (Lines{"clRetainEvent(event#1)", "clReleaseEvent(event#1)"}));
+
+    const char* source = "deform";
+    const TopenCLInfo& info = TopenCLInfo::theOne();
+    AutoCLObject<cl_program> program;
+    program.adopt(
+        ocl.clCreateProgramWithSource(info.openCLContext(), 1, &source, nullptr, nullptr));
+    const cl_device_id device = info.openCLDevice();
+    ocl.clBuildProgram(program.get(), 1, &device, "", nullptr, nullptr);
+    AutoCLObject<cl_kernel> kernel;
+    kernel.adopt(ocl.clCreateKernel(program.get(), source, nullptr));
+    calls();
+    {
+        const AutoCLObject<cl_kernel> kernelCopy(kernel);
+        const AutoCLObject<cl_program> programCopy(program);
+    }
+    EXPECT_EQ(calls(), (Lines{"clRetainKernel(kernel#1)", "clRetainProgram(program#1)",
+                              "clReleaseProgram(program#1)", "clReleaseKernel(kernel#1)"}));
+}
+
+TEST_F(HolderTest, EventListsBorrowInOrder)
+{
+    std::array<AutoCLObject<cl_event>, 5> events{
+        makeEvent(), makeEvent(), {}, makeEvent(), makeEvent()};
+    calls();
+    AutoCLEventList list;
+    EXPECT_EQ(list.size(), 0U);
+    EXPECT_EQ(list.array(), nullptr);
+    list.add(events[2]); // empty: skipped
+    EXPECT_EQ(list.array(), nullptr);
+    for (const auto& event : events)
+        list.add(event);
+    list.add(events[0]);
+    const AutoCLEventList copy(list);
+    AutoCLEventList assigned;
+    assigned.add(events[4]);
+    assigned = copy;
+    AutoCLEventList& itself = assigned;
+    assigned = itself;
+
+    ASSERT_EQ(assigned.size(), 5U);
+    const std::vector<cl_event> expected{events[0].get(), events[1].get(), events[3].get(),
+                                         events[4].get(), events[0].get()};
+    EXPECT_EQ(std::vector<cl_event>(assigned.array(), assigned.array() + 5), expected);
+    assigned = AutoCLEventList();
+    EXPECT_EQ(assigned.array(), nullptr);
+    EXPECT_EQ(calls(), Lines{}) << "lists count no references";
+}
+
+TEST_F(HolderTest, EventListsTakeTheReadyEventsOfBuffers)
+{
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    std::array<TopenCLBuffer, 3> buffers;
+    char bytes[4] = {};
+    for (TopenCLBuffer& buffer : buffers)
+        buffer.ensureBufferCapacity(sizeof bytes);
+    buffers[0].uploadDataToGPU(queue, CL_FALSE, 0, sizeof bytes, bytes, 0, nullptr);
+    buffers[2].uploadDataToGPU(queue, CL_FALSE, 0, sizeof bytes, bytes, 0, nullptr);
+    AutoCLEventList list;
+    for (TopenCLBuffer& buffer : buffers)
+        list.add(buffer);
+    ASSERT_EQ(list.size(), 2U);
+    EXPECT_EQ(list.array()[0], buffers[0].bufferReadyEvent().get());
+    EXPECT_EQ(list.array()[1], buffers[2].bufferReadyEvent().get());
+}
+
+} // namespace

@@ -1,0 +1,175 @@
+// Queues, events and work-group sizes.
+#include "ScriptedTest.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
+
+using namespace scripted;
+
+namespace {
+
+// A kernel and an event of the runtime's own, outside the library.
+cl_event makeEvent()
+{
+    const TopenCLInfo& info = TopenCLInfo::theOne();
+    const cl_mem mem = ocl.clCreateBuffer(info.openCLContext(), 1, 4, nullptr, nullptr);
+    cl_event event = nullptr;
+    ocl.clEnqueueReadBuffer(info.openCLCommandQueue(), mem, CL_FALSE, 0, 4, &event, 0, nullptr,
+                            &event);
+    ocl.clReleaseMemObject(mem);
+    return event;
+}
+
+class QueueTest : public ScriptedTest {
+protected:
+    cl_kernel makeKernel()
+    {
+        const TopenCLInfo& info = TopenCLInfo::theOne();
+        const cl_device_id device = info.openCLDevice();
+        const char* source = "kernel void deform() {}";
+        fProgram =
+            ocl.clCreateProgramWithSource(info.openCLContext(), 1, &source, nullptr, nullptr);
+        ocl.clBuildProgram(fProgram, 1, &device, "", nullptr, nullptr);
+        fKernel = ocl.clCreateKernel(fProgram, "deform", nullptr);
+        calls();
+        return fKernel;
+    }
+    void TearDown() override
+    {
+        if (fKernel) {
+            ocl.clReleaseKernel(fKernel);
+            ocl.clReleaseProgram(fProgram);
+        }
+        ScriptedTest::TearDown();
+    }
+
+private:
+    cl_kernel fKernel = nullptr;
+    cl_program fProgram = nullptr;
+};
+
+TEST_F(QueueTest, BothQueuesAreFinishedAndFlushedInTurn)
+{
+    TopenCLInfo::finish(); // there is no runtime yet: nothing
+    ASSERT_TRUE(start());
+    TopenCLInfo::finish();
+    TopenCLInfo::flush();
+    EXPECT_EQ(calls(), (Lines{"clFinish(queue#1)", "clFinish(queue#2)", "clFlush(queue#1)",
+                              "clFlush(queue#2)"}));
+}
+
+TEST_F(QueueTest, ANullSecondaryQueueIsHarmless)
+{
+    faults = {{.function = "clCreateCommandQueue", .nth = 2}};
+    ASSERT_TRUE(start());
+    EXPECT_EQ(warnings().size(), 1U);
+    TopenCLInfo::finish();
+    EXPECT_EQ(calls(), (Lines{"clFinish(queue#1)", "clFinish(null) ! -36"}));
+    EXPECT_EQ(warnings(), Lines{});
+    expectMisuse("clFinish: null");
+}
+
+TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
+{
+    ASSERT_TRUE(start());
+    bool outOfOrder = true;
+    const cl_command_queue first = TopenCLInfo::theOne().createOpenCLCommandQueue(&outOfOrder);
+    const cl_command_queue second = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);
+    EXPECT_FALSE(outOfOrder);
+    EXPECT_EQ(calls(), (Lines{"clGetDeviceInfo(device#1, 4138)",
+                              "clCreateCommandQueue(context#1, device#1, 0) = queue#3",
+                              "clGetDeviceInfo(device#1, 4138)",
+                              "clCreateCommandQueue(context#1, device#1, 0) = queue#4"}));
+    EXPECT_NE(first, second);
+    expectLeft({"queue#3 x1", "queue#4 x1"});
+}
+
+struct EventRow {
+    const char* name;
+    bool amd;
+    std::deque<cl_int> statuses;
+    unsigned failing; // the query that fails, or 0
+    bool complete;
+    std::size_t queries;
+};
+void PrintTo(const EventRow& row, std::ostream* out)
+{
+    *out << row.name;
+}
+
+class EventQuery : public ScriptedTest, public ::testing::WithParamInterface<EventRow> {};
+
+TEST_P(EventQuery, AnswersAfterAsManyLooksAsNeeded)
+{
+    const EventRow& row = GetParam();
+    if (row.amd) {
+        world.platforms[0].vendor = "Advanced Micro Devices, Inc.";
+        arguments.vendorId = 0x1002;
+    }
+    ASSERT_TRUE(start());
+    runtime().scriptEventStatuses(row.statuses);
+    const cl_event event = makeEvent();
+    calls();
+    if (row.failing != 0)
+        runtime().plan({.function = "clGetEventInfo", .nth = row.failing});
+
+    EXPECT_EQ(TopenCLInfo::IsEventComplete(event), row.complete);
+    EXPECT_EQ(calls().size(), row.queries);
+    EXPECT_EQ(warnings(), row.failing ? Lines{"OpenCL error: CL_OUT_OF_RESOURCES"} : Lines{});
+    EXPECT_TRUE(TopenCLInfo::IsEventComplete(nullptr));
+    EXPECT_EQ(calls(), Lines{});
+    ocl.clReleaseEvent(event);
+}
+INSTANTIATE_TEST_SUITE_P(
+    Queue, EventQuery,
+    ::testing::Values(EventRow{"Done", false, {CL_COMPLETE}, 0, true, 1},
+                      EventRow{"Running", false, {CL_RUNNING, CL_COMPLETE}, 0, false, 1},
+                      EventRow{"Failed", false, {-5}, 0, false, 1},
+                      EventRow{"QueryFails", false, {CL_RUNNING}, 1, true, 1},
+                      EventRow{"DoneOnAMD", true, {CL_COMPLETE}, 0, true, 1},
+                      EventRow{"SecondLookOnAMD", true, {CL_QUEUED, CL_COMPLETE}, 0, true, 2},
+                      EventRow{"RunningOnAMD", true, {CL_RUNNING}, 0, false, 2},
+                      EventRow{"SecondQueryFailsOnAMD", true, {CL_RUNNING}, 2, true, 2}),
+    [](const auto& row) { return std::string(row.param.name); });
+
+TEST_F(QueueTest, WorkGroupSizesRoundUpToMultiples)
+{
+    ASSERT_TRUE(start());
+    const cl_kernel kernel = makeKernel();
+    const std::pair<std::size_t, std::size_t> rows[] = {
+        {0, 0}, {1, 64}, {63, 64}, {64, 64}, {65, 128}, {1000, 1024}, {1024, 1024}, {1025, 1088}};
+    for (const auto& [count, expected] : rows) {
+        std::size_t global = 1;
+        std::size_t local = 1;
+        EXPECT_EQ(TopenCLInfo::theOne().getWorkGroupSizes(kernel, count, global, local), 0);
+        EXPECT_EQ(global, expected) << count;
+        EXPECT_EQ(local, 64U);
+    }
+}
+
+TEST_F(QueueTest, AnEmptyWorkGroupAnswerMeans256)
+{
+    world.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
+    ASSERT_TRUE(start());
+    std::size_t global = 1;
+    std::size_t local = 1;
+    EXPECT_EQ(TopenCLInfo::theOne().getWorkGroupSizes(makeKernel(), 257, global, local), 0);
+    EXPECT_EQ(global, 512U);
+    EXPECT_EQ(local, 256U);
+}
+
+TEST_F(QueueTest, FailingWorkGroupQueriesWriteNothing)
+{
+    ASSERT_TRUE(start());
+    std::size_t global = 3;
+    std::size_t local = 4;
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    EXPECT_EQ(info.getWorkGroupSizes(nullptr, 1, global, local), CL_INVALID_KERNEL);
+    const cl_kernel kernel = makeKernel();
+    runtime().plan({.function = "clGetKernelWorkGroupInfo", .status = CL_INVALID_KERNEL});
+    EXPECT_EQ(info.getWorkGroupSizes(kernel, 1, global, local), CL_INVALID_KERNEL);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL\n"});
+    EXPECT_EQ(global, 3U);
+    EXPECT_EQ(local, 4U);
+}
+
+} // namespace

@@ -1,0 +1,230 @@
+// The rules of driver versions and synchronisation modes, row by row: pure functions.
+#include "ScriptedTest.h"
+#include "runtime/DriverVersion.h"
+#include "runtime/SyncModes.h"
+
+#include <climits>
+#include <stdexcept>
+
+using namespace scripted;
+
+namespace {
+
+constexpr int kUnset = INT_MIN; // VYRA_OPENCL_IGNORE_DRIVER_VERSION is not set
+
+struct DriverRow {
+    const char* version;
+    int ignore;
+    bool usable;
+    bool implicitSync;
+    bool asyncReadback;
+};
+
+const DriverRow kDriverRows[] = {
+    {"359.90", kUnset, true, false, false},
+    {"359.91", kUnset, true, false, true},
+    {"360.00", kUnset, true, false, true},
+    {"361.91", kUnset, true, false, true},
+    {"361.92", kUnset, false, false, true},
+    {"362.00", kUnset, false, false, true},
+    {"368.85", kUnset, false, false, true},
+    {"368.86", kUnset, true, false, true},
+    {"369.00", kUnset, true, false, true},
+    {"385.30", kUnset, true, false, true},
+    {"385.31", kUnset, true, true, true},
+    {"386.00", kUnset, true, true, true},
+    {"365.10", -1, false, false, true},
+    {"365.10", 0, true, false, true},
+    {"365.10", 1, true, true, true},
+    {"300.00", 2, true, true, false},
+    {"385.31", 0, true, true, true},
+    {"400.99", -1, true, true, true},
+    // Only the first three characters and the two behind the fourth count.
+    {"385x31.9", kUnset, true, true, true},
+    {" 99.99", kUnset, true, false, false},
+    {"385. 9", kUnset, true, false, true},
+
+    {"385.3", kUnset, true, false, true},
+    {"999.99", kUnset, true, true, true},
+};
+
+TEST(DriverVersionRule, EachRow)
+{
+    for (const DriverRow& row : kDriverRows) {
+        SCOPED_TRACE(std::string(row.version) + " with " + std::to_string(row.ignore));
+        const std::optional<int> ignore =
+            row.ignore == kUnset ? std::nullopt : std::optional(row.ignore);
+        const DriverVerdict verdict = judgeDriver(parseDriverVersion(row.version), ignore);
+        EXPECT_EQ(verdict.usable, row.usable);
+        EXPECT_EQ(verdict.implicitSync, row.implicitSync);
+        EXPECT_EQ(verdict.asyncReadback, row.asyncReadback);
+    }
+}
+
+TEST(DriverVersionRule, UnreadableVersionsRaise)
+{
+    for (const char* text :
+         {"", "385", "38", "abc.31", "385.", "385.xy", "   .31", "385.  ", "3610.92"}) {
+        SCOPED_TRACE(text);
+        EXPECT_THROW(parseDriverVersion(text), std::exception);
+    }
+}
+
+enum Message { kSilent, kUnstable, kUsesGLFinish, kUsesEventInfo };
+const char* const kMessages[] = {
+    "",
+    "VYRA_GRAPHICSTOOPENCL_SYNC_MODE=1 (Implicit Graphics to OpenCL synchronization) is not "
+    "supported because cl_khr_gl_event is not supported.  Vyra will run in implicit sync mode but "
+    "expect unstable results.\n",
+    "Overriding VYRA_GRAPHICSTOOPENCL_SYNC_MODE=2 (Explicit Graphics to OpenCL synchronization) "
+    "because GL_ARB_sync is not supported.  Using glFinish to synchronize.\n",
+    "Overriding VYRA_OPENCLTOGRAPHICS_SYNC_MODE=1 (Implicit OpenCL to Graphics synchronization) "
+    "because cl_khr_gl_event is not supported.  Using clGetEventInfo to synchronize.\n"};
+
+struct SyncRow {
+    int variable;
+    SyncAbilities abilities; // glEvent, arbSync, implicitSyncTrusted
+    int mode;
+    Message message;
+};
+
+constexpr SyncAbilities kAll{true, true, true};
+constexpr SyncAbilities kNone{false, false, true};
+
+const SyncRow kGraphicsToCLRows[] = {
+    {0, {true, false, false}, 1, kSilent},
+    {0, kAll, 1, kSilent},
+    {0, {false, true, true}, 2, kSilent},
+    {0, kNone, 3, kSilent},
+    {-1, {false, true, true}, 2, kSilent},
+    {4, {false, true, true}, 2, kSilent},
+    {1, kAll, 1, kSilent},
+    {1, {false, true, true}, 1, kUnstable},
+    {2, kAll, 2, kSilent},
+    {2, {false, true, true}, 2, kSilent},
+    {2, {true, false, true}, 3, kUsesGLFinish},
+    {3, kAll, 3, kSilent},
+    {3, kNone, 3, kSilent},
+};
+const SyncRow kCLToGraphicsRows[] = {
+    {0, kAll, 1, kSilent},
+    {0, {true, false, true}, 1, kSilent},
+    {0, {true, true, false}, 2, kSilent},
+    {0, {false, true, true}, 2, kSilent},
+    {0, kNone, 2, kSilent},
+    {-7, kAll, 1, kSilent},
+    {5, {false, true, true}, 2, kSilent},
+    {1, {true, false, false}, 1, kSilent},
+    {1, {false, true, true}, 2, kUsesEventInfo},
+    {2, kAll, 2, kSilent},
+    {3, kNone, 3, kSilent},
+    {4, kAll, 4, kSilent},
+};
+
+template <typename Choose>
+void expectModes(const Choose& choose, const SyncRow& row)
+{
+    SCOPED_TRACE("variable " + std::to_string(row.variable) + ", event " +
+                 std::to_string(row.abilities.glEvent) + ", sync " +
+                 std::to_string(row.abilities.arbSync));
+    const auto choice = choose(row.variable, row.abilities);
+    EXPECT_EQ(choice.mode, row.mode);
+    EXPECT_STREQ(choice.message ? choice.message : "", kMessages[row.message]);
+}
+
+TEST(SyncModeRule, EachRow)
+{
+    for (const SyncRow& row : kGraphicsToCLRows)
+        expectModes(chooseGraphicsToCLSyncMode, row);
+    for (const SyncRow& row : kCLToGraphicsRows)
+        expectModes(chooseCLToGraphicsSyncMode, row);
+}
+
+// The way from the world to the rules, through start-up.
+struct WorldRow {
+    const char* name;
+    const char* extensions;
+    int functionTable; // -1: none, 0: without sync objects, 1: with them
+    const char* forceFinish;
+    const char* graphicsToCL;
+    const char* clToGraphics;
+    std::pair<int, int> modes;
+    std::pair<bool, bool> finishes; // useGLFinish, useCLFinish
+};
+void PrintTo(const WorldRow& row, std::ostream* out)
+{
+    *out << row.name;
+}
+
+const char* const kEvents = "cl_khr_gl_sharing cl_khr_gl_event";
+const char* const kNoEvents = "cl_khr_gl_sharing";
+
+class SyncModesInTheWorld : public ScriptedTest, public ::testing::WithParamInterface<WorldRow> {};
+
+TEST_P(SyncModesInTheWorld, StartUpChoosesThem)
+{
+    const WorldRow& row = GetParam();
+    world.platforms[0].extensions = row.extensions;
+    removeFunctionTable();
+    if (row.functionTable >= 0)
+        installFunctionTable(row.functionTable == 1, true);
+    setEnvironment("VYRA_OPENCL_FORCE_FINISH", row.forceFinish);
+    setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", row.graphicsToCL);
+    setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", row.clToGraphics);
+    ASSERT_TRUE(start());
+    const TopenCLInfo& info = TopenCLInfo::theOne();
+    EXPECT_EQ(info.graphicsToCLSyncMode(), row.modes.first);
+    EXPECT_EQ(info.clToGraphicsSyncMode(), row.modes.second);
+    EXPECT_EQ(info.useGLFinish(), row.finishes.first);
+    EXPECT_EQ(info.useCLFinish(), row.finishes.second);
+    EXPECT_EQ(printedError.find("SYNC_MODE"), std::string::npos) << printedError;
+}
+INSTANTIATE_TEST_SUITE_P(
+    Rules, SyncModesInTheWorld,
+    ::testing::Values(WorldRow{"Implicit", kEvents, 0, "0", "0", "0", {1, 1}, {false, false}},
+                      WorldRow{"Explicit", kNoEvents, 1, "0", "0", "0", {2, 2}, {false, false}},
+                      WorldRow{"NoSyncObjects", kNoEvents, 0, "0", "0", "0", {3, 2}, {true, false}},
+                      WorldRow{
+                          "NoFunctionTable", kNoEvents, -1, "0", "0", "0", {3, 2}, {true, false}},
+                      WorldRow{"Finish", kEvents, 1, "-2", "1", "1", {3, 4}, {true, true}},
+                      WorldRow{"NoNumber", kEvents, 1, "no", "2x", "", {1, 1}, {false, false}}),
+    [](const auto& row) { return std::string(row.param.name); });
+
+// One process for each row: the answer is remembered.
+struct ThreadingRow {
+    const char* name;
+    bool nvidia;
+    const char* force; // VYRA_OPENCL_FORCE_THREADING, or null
+    bool usingDX;
+    bool threaded;
+};
+void PrintTo(const ThreadingRow& row, std::ostream* out)
+{
+    *out << row.name;
+}
+
+class ThreadedSharing : public ScriptedTest, public ::testing::WithParamInterface<ThreadingRow> {};
+
+TEST_P(ThreadedSharing, IsRefusedOnNVIDIAWithOpenGLAlone)
+{
+    const ThreadingRow& row = GetParam();
+    if (row.nvidia) {
+        world.platforms[0].vendor = "NVIDIA Corporation";
+        world.platforms[0].devices[0].driverVersion = "400.00";
+        arguments.vendorId = 0x10DE;
+    }
+    world.platforms[0].extensions += " cl_nv_d3d11_sharing";
+    arguments.usingDX = row.usingDX;
+    if (row.force)
+        setEnvironment("VYRA_OPENCL_FORCE_THREADING", row.force);
+    ASSERT_TRUE(start());
+    EXPECT_EQ(TopenCLInfo::theOne().supportsThreadedSharing(), row.threaded);
+}
+INSTANTIATE_TEST_SUITE_P(Rules, ThreadedSharing,
+                         ::testing::Values(ThreadingRow{"NVIDIA", true, nullptr, false, false},
+                                           ThreadingRow{"Intel", false, nullptr, false, true},
+                                           ThreadingRow{"Forced", true, "0", false, true},
+                                           ThreadingRow{"Direct3D", true, nullptr, true, true}),
+                         [](const auto& row) { return std::string(row.param.name); });
+
+} // namespace
