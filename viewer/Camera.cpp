@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <limits>
 
 #include <QtMath>
 
@@ -13,13 +12,42 @@ namespace {
 constexpr float kVerticalFieldOfView = 30.0f; // degrees
 // Air around what is framed.
 constexpr float kMargin = 1.15f;
-constexpr float kLowest = std::numeric_limits<float>::lowest();
 constexpr float kLowestPitch = 2.0f;
 constexpr float kHighestPitch = 85.0f;
 constexpr float kZoomPerStep = 0.9f;
 // Limits of zooming, in parts of the distance that shows everything.
 constexpr float kNearest = 0.25f;
 constexpr float kFarthest = 4.0f;
+// Each step of framing leaves a fraction of the error: after these nothing is seen of it.
+constexpr int kFramingSteps = 8;
+
+// The smallest distance at which all points, as seen from `middle`, are within the tangents.
+float fittingDistance(const std::vector<QVector3D>& seen, const QVector3D& middle, float tangentX,
+                      float tangentY)
+{
+    float distance = 0;
+    for (const QVector3D& point : seen) {
+        const QVector3D offset = point - middle;
+        distance = std::max({distance, point.z() + std::abs(offset.x()) / tangentX,
+                             point.z() + std::abs(offset.y()) / tangentY});
+    }
+    return distance;
+}
+
+// How much farther the points reach to the right than to the left, and up than down, as tangents.
+QVector3D imbalance(const std::vector<QVector3D>& seen, const QVector3D& middle, float distance)
+{
+    QVector3D most;
+    QVector3D least;
+    for (const QVector3D& point : seen) {
+        const QVector3D tangent = (point - middle) / (distance - point.z());
+        for (int axis = 0; axis < 2; ++axis) {
+            most[axis] = std::max(most[axis], tangent[axis]);
+            least[axis] = std::min(least[axis], tangent[axis]);
+        }
+    }
+    return most + least;
+}
 
 } // namespace
 
@@ -59,28 +87,26 @@ QMatrix4x4 Camera::toClip() const
     return projection * view();
 }
 
-// With the camera at (x, y) in its own plane, a point is inside the picture as long as the distance
-// is at least z + |px - x| / tangent, and likewise for y. The x at which the farthest points on
-// both sides ask for the same distance is the best one.
+// In turn: the distance at which everything is inside, then the shift that leaves the same room on
+// opposite sides of the picture.
 void Camera::frame(const std::vector<QVector3D>& points, float aspect)
 {
     fAspect = aspect;
     fTarget = {};
     const QMatrix4x4 rotation = view();
+    std::vector<QVector3D> seen; // the camera looks along -z
+    for (const QVector3D& point : points)
+        seen.push_back(rotation.mapVector(point));
+
     const float tangentY = std::tan(qDegreesToRadians(kVerticalFieldOfView / 2)) / kMargin;
-    const float tangentX = tangentY * fAspect;
-    float right = kLowest, left = kLowest, top = kLowest, bottom = kLowest;
-    for (const QVector3D& point : points) {
-        const QVector3D seen = rotation.mapVector(point); // the camera looks along -z
-        right = std::max(right, seen.z() + seen.x() / tangentX);
-        left = std::max(left, seen.z() - seen.x() / tangentX);
-        top = std::max(top, seen.z() + seen.y() / tangentY);
-        bottom = std::max(bottom, seen.z() - seen.y() / tangentY);
+    QVector3D middle;
+    for (int i = 0; i < kFramingSteps; ++i) {
+        fFittingDistance = fittingDistance(seen, middle, tangentY * fAspect, tangentY);
+        middle += imbalance(seen, middle, fFittingDistance) * fFittingDistance / 2;
     }
-    const QVector3D middle(tangentX * (right - left) / 2, tangentY * (top - bottom) / 2, 0);
-    fTarget = rotation.transposed().mapVector(middle); // a rotation's inverse
-    fFittingDistance = std::max(right + left, top + bottom) / 2;
+    fFittingDistance = fittingDistance(seen, middle, tangentY * fAspect, tangentY);
     fDistance = fFittingDistance;
+    fTarget = rotation.transposed().mapVector(middle); // a rotation's inverse
 }
 
 } // namespace viewer

@@ -20,7 +20,7 @@ constexpr char kSampleModels[] = "/usr/share/assimp/models";
 // For files that do not say how long a tick of their animation is; Assimp's documentation names it.
 constexpr double kDefaultTicksPerSecond = 25.0;
 // A light clay, for materials without a colour of their own.
-const QVector3D kDefaultColour(0.82f, 0.70f, 0.58f);
+const QVector3D kDefaultColour(0.76f, 0.57f, 0.43f);
 // Greys are what exporters write when the colour comes from a texture.
 constexpr float kLeastColour = 0.05f;
 
@@ -85,6 +85,22 @@ void copyVertices(const aiMesh& source, Mesh& mesh)
     }
 }
 
+// Files with normals that look inside exist: those of a closed mesh look away from its middle.
+void turnNormalsOutside(Mesh& mesh)
+{
+    QVector3D middle;
+    for (const QVector3D& position : mesh.positions)
+        middle += position / static_cast<float>(mesh.vertexCount());
+    float outside = 0;
+    for (std::size_t i = 0; i < mesh.vertexCount(); ++i)
+        outside +=
+            QVector3D::dotProduct(mesh.normals[i], (mesh.positions[i] - middle).normalized());
+    if (outside >= 0)
+        return;
+    for (QVector3D& normal : mesh.normals)
+        normal = -normal;
+}
+
 // Puts a weight into the first free place of its vertex.
 void addInfluence(Mesh& mesh, std::size_t vertex, std::uint32_t bone, float weight)
 {
@@ -137,6 +153,7 @@ Mesh copyMesh(const aiScene& scene, const aiMesh& source, std::size_t node, cons
     mesh.node = node;
     mesh.colour = materialColour(scene, source.mMaterialIndex);
     copyVertices(source, mesh);
+    turnNormalsOutside(mesh);
     if (source.HasBones())
         copyBones(source, nodes, mesh);
     return mesh;

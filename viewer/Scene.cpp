@@ -19,7 +19,7 @@ constexpr double kLargestTwist = 0.5; // radians
 constexpr double kTwistPeriod = 4.0;  // seconds
 constexpr double kFullTurn = 6.28318530718;
 // How much the tints of a crowd differ from white.
-constexpr float kTintDepth = 0.18f;
+constexpr float kTintDepth = 0.13f;
 
 QVector3D tintOf(int number)
 {

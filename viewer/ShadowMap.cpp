@@ -10,8 +10,8 @@ constexpr int kTexels = 2048;
 // part.
 constexpr float kSlopeBias = 1.5f;
 constexpr float kConstantBias = 4.0f;
-// Room around the stage for shadows that fall beyond it.
-constexpr float kShadowRoom = 1.25f;
+// How far beyond the stage shadows fall, in the characters' height.
+constexpr float kShadowReach = 1.0f;
 
 } // namespace
 
@@ -53,7 +53,7 @@ QVector3D ShadowMap::towardsLight() const
 
 void ShadowMap::aim(const QVector3D& stageSize)
 {
-    fRadius = kShadowRoom * stageSize.length() / 2;
+    fRadius = stageSize.length() / 2 + kShadowReach * stageSize.y();
     const QVector3D middle(0, stageSize.y() / 2, 0);
     QMatrix4x4 projection;
     projection.ortho(-fRadius, fRadius, -fRadius, fRadius, -fRadius, fRadius);

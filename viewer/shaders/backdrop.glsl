@@ -4,5 +4,5 @@ vec3 backdropColour(float elevation)
 {
     const vec3 kHorizon = vec3(0.80, 0.80, 0.80);
     const vec3 kZenith = vec3(0.52, 0.59, 0.68);
-    return mix(kHorizon, kZenith, smoothstep(0.0, 0.55, elevation));
+    return mix(kHorizon, kZenith, smoothstep(-0.02, 0.42, elevation));
 }

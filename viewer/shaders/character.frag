@@ -11,16 +11,14 @@ void main()
 {
     vec3 toEye = normalize(eye - stagePosition);
     vec3 normal = normalize(stageNormal);
-    // Files with normals that look inside exist, and open meshes show their backs.
-    normal = faceforward(normal, -toEye, normal);
     float facing = dot(normal, lightDirection);
 
     // Off the surface, so that a surface does not shade itself.
-    float key = max(facing, 0.0) * keyVisibility(stagePosition + 0.012 * normal);
+    float key = max(facing, 0.0) * keyVisibility(stagePosition + 0.02 * normal);
     vec3 halfway = normalize(lightDirection + toEye);
     float shine = 0.16 * key * pow(max(dot(normal, halfway), 0.0), 36.0);
     float rim = 0.30 * pow(1.0 - max(dot(normal, toEye), 0.0), 3.5) * (0.5 + 0.5 * normal.y);
 
     vec3 light = key * kKeyColour + ambientLight(normal);
-    colour = vec4(toScreen(toLinear(albedo) * light * 0.62 + shine * kKeyColour + rim * kSkyColour), 1.0);
+    colour = vec4(toScreen(toLinear(albedo) * light * 0.72 + shine * kKeyColour + rim * kSkyColour), 1.0);
 }

@@ -5,9 +5,9 @@ uniform mat4 toLight;        // from the stage to the shadow map's clip space
 uniform float shadowBlur;    // radius of the penumbra, in parts of the shadow map
 uniform sampler2DShadow shadowMap;
 
-const vec3 kKeyColour = vec3(1.00, 0.94, 0.86) * 2.1;
-const vec3 kSkyColour = vec3(0.70, 0.77, 0.88) * 0.75;
-const vec3 kBounceColour = vec3(0.50, 0.44, 0.38) * 0.45;
+const vec3 kKeyColour = vec3(1.00, 0.94, 0.86) * 2.35;
+const vec3 kSkyColour = vec3(0.70, 0.77, 0.88) * 0.58;
+const vec3 kBounceColour = vec3(0.50, 0.44, 0.38) * 0.36;
 
 // Points of a sunflower: even over the disc.
 const int kShadowTaps = 16;
