@@ -12,6 +12,7 @@ extern "C" {
 #endif
 
 /* Totals since the process started, over all contexts. */
+/* NOLINTNEXTLINE(modernize-use-using): C programs include this */
 typedef struct glshare_counters {
     uint64_t acquired_in_place; /* acquires of a buffer whose GL storage OpenCL uses directly */
     uint64_t acquired_by_copy;  /* acquires that copied from the GL buffer */
@@ -21,6 +22,7 @@ typedef struct glshare_counters {
 } glshare_counters;
 
 /* Fills `counters`. Safe from any thread. */
+/* NOLINTNEXTLINE(modernize-use-using): C programs include this */
 typedef void (*glshare_get_counters_fn)(glshare_counters* counters);
 #define GLSHARE_GET_COUNTERS_NAME "glshareGetCounters"
 

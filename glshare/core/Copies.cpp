@@ -186,8 +186,8 @@ cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers, CopyDirectio
                      std::span<const cl_event> waitList, cl_event* done)
 {
     cl_context handle = nullptr;
-    cl_int error =
-        runtime().clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof handle, &handle, nullptr);
+    cl_int error = runtime().clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof(cl_context),
+                                                   &handle, nullptr);
     if (error != CL_SUCCESS)
         return error;
     const auto batch = std::make_shared<Batch>();

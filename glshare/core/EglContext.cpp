@@ -1,55 +1,14 @@
 // Implements GlContext for EGL.
+#include "core/EglFunctions.h"
 #include "core/GlContext.h"
 
-#include <EGL/egl.h>
 #include <EGL/eglext.h>
-#include <dlfcn.h>
 
 #include <array>
 
 namespace glshare {
 
 namespace {
-
-// The library is never closed: its threads and exit handlers may outlive every context.
-struct EglFunctions {
-    decltype(&::eglGetProcAddress) getProcAddress = nullptr;
-    decltype(&::eglBindAPI) bindApi = nullptr;
-    decltype(&::eglChooseConfig) chooseConfig = nullptr;
-    decltype(&::eglCreateContext) createContext = nullptr;
-    decltype(&::eglDestroyContext) destroyContext = nullptr;
-    decltype(&::eglGetCurrentContext) getCurrentContext = nullptr;
-    decltype(&::eglMakeCurrent) makeCurrent = nullptr;
-    decltype(&::eglQueryContext) queryContext = nullptr;
-    decltype(&::eglQueryAPI) queryApi = nullptr;
-    decltype(&::eglReleaseThread) releaseThread = nullptr;
-    bool complete = false;
-
-    EglFunctions()
-    {
-        void* library = dlopen("libEGL.so.1", RTLD_LAZY);
-        if (library == nullptr)
-            return;
-        const auto found = [library](auto& function, const char* name) {
-            function =
-                reinterpret_cast<std::remove_reference_t<decltype(function)>>(dlsym(library, name));
-            return function != nullptr;
-        };
-        complete = found(getProcAddress, "eglGetProcAddress") && found(bindApi, "eglBindAPI") &&
-                   found(chooseConfig, "eglChooseConfig") &&
-                   found(createContext, "eglCreateContext") &&
-                   found(destroyContext, "eglDestroyContext") &&
-                   found(getCurrentContext, "eglGetCurrentContext") &&
-                   found(makeCurrent, "eglMakeCurrent") && found(queryContext, "eglQueryContext") &&
-                   found(queryApi, "eglQueryAPI") && found(releaseThread, "eglReleaseThread");
-    }
-};
-
-const EglFunctions& egl()
-{
-    static const EglFunctions theFunctions;
-    return theFunctions;
-}
 
 void* resolveGl(const char* name)
 {

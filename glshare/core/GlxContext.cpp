@@ -6,10 +6,7 @@
 // several threads call XInitThreads anyway. When the application closes the connection, Xlib tells
 // us first.
 #include "core/GlContext.h"
-
-#include <GL/glx.h>
-#include <X11/Xlib.h>
-#include <dlfcn.h>
+#include "core/GlxFunctions.h"
 
 #include <array>
 #include <functional>
@@ -21,63 +18,6 @@
 namespace glshare {
 
 namespace {
-
-// XESetCloseDisplay, which only Xlib's internal header declares. That header suits no C++ program.
-using CloseDisplayHook = int (*)(Display*, XExtCodes*);
-using SetCloseDisplay = CloseDisplayHook (*)(Display*, int extension, CloseDisplayHook);
-
-// The libraries are never closed: their hooks and exit handlers may outlive every context.
-struct GlxFunctions {
-    decltype(&::glXGetProcAddressARB) getProcAddress = nullptr;
-    decltype(&::glXGetFBConfigs) getFBConfigs = nullptr;
-    decltype(&::glXGetFBConfigAttrib) getFBConfigAttrib = nullptr;
-    decltype(&::glXDestroyContext) destroyContext = nullptr;
-    decltype(&::glXGetCurrentContext) getCurrentContext = nullptr;
-    decltype(&::glXMakeContextCurrent) makeContextCurrent = nullptr;
-    decltype(&::glXQueryContext) queryContext = nullptr;
-    PFNGLXCREATECONTEXTATTRIBSARBPROC createContextAttribs = nullptr;
-    decltype(&::XAddExtension) addExtension = nullptr;
-    SetCloseDisplay setCloseDisplay = nullptr;
-    decltype(&::XSetErrorHandler) setErrorHandler = nullptr;
-    decltype(&::XSync) sync = nullptr;
-    decltype(&::XFree) free = nullptr;
-    bool complete = false;
-
-    GlxFunctions()
-    {
-        void* gl = dlopen("libGL.so.1", RTLD_LAZY);
-        void* x11 = dlopen("libX11.so.6", RTLD_LAZY);
-        if (gl == nullptr || x11 == nullptr)
-            return;
-        const auto found = [](void* library, auto& function, const char* name) {
-            function =
-                reinterpret_cast<std::remove_reference_t<decltype(function)>>(dlsym(library, name));
-            return function != nullptr;
-        };
-        complete = found(gl, getProcAddress, "glXGetProcAddressARB") &&
-                   found(gl, getFBConfigs, "glXGetFBConfigs") &&
-                   found(gl, getFBConfigAttrib, "glXGetFBConfigAttrib") &&
-                   found(gl, destroyContext, "glXDestroyContext") &&
-                   found(gl, getCurrentContext, "glXGetCurrentContext") &&
-                   found(gl, makeContextCurrent, "glXMakeContextCurrent") &&
-                   found(gl, queryContext, "glXQueryContext") &&
-                   found(x11, addExtension, "XAddExtension") &&
-                   found(x11, setCloseDisplay, "XESetCloseDisplay") &&
-                   found(x11, setErrorHandler, "XSetErrorHandler") && found(x11, sync, "XSync") &&
-                   found(x11, free, "XFree");
-        if (!complete)
-            return;
-        createContextAttribs = reinterpret_cast<PFNGLXCREATECONTEXTATTRIBSARBPROC>(
-            getProcAddress(reinterpret_cast<const GLubyte*>("glXCreateContextAttribsARB")));
-        complete = createContextAttribs != nullptr;
-    }
-};
-
-const GlxFunctions& glx()
-{
-    static const GlxFunctions theFunctions;
-    return theFunctions;
-}
 
 void* resolveGl(const char* name)
 {

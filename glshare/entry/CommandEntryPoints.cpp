@@ -38,7 +38,7 @@ cl_int share(SharingCommand command, const RawRequest& raw, PassDown passDown)
 {
     cl_context handle = nullptr;
     if (raw.queue == nullptr ||
-        runtime().clGetCommandQueueInfo(raw.queue, CL_QUEUE_CONTEXT, sizeof handle, &handle,
+        runtime().clGetCommandQueueInfo(raw.queue, CL_QUEUE_CONTEXT, sizeof(cl_context), &handle,
                                         nullptr) != CL_SUCCESS)
         return CL_INVALID_COMMAND_QUEUE;
     const auto context = Registry::get().find(handle);

@@ -28,8 +28,9 @@ template <typename PassDown>
 cl_int askRuntime(cl_mem memory, PassDown passDown)
 {
     cl_context context = nullptr;
-    if (memory == nullptr || runtime().clGetMemObjectInfo(memory, CL_MEM_CONTEXT, sizeof context,
-                                                          &context, nullptr) != CL_SUCCESS)
+    if (memory == nullptr ||
+        runtime().clGetMemObjectInfo(memory, CL_MEM_CONTEXT, sizeof(cl_context), &context,
+                                     nullptr) != CL_SUCCESS)
         return CL_INVALID_MEM_OBJECT;
     return runtimeShares(context) ? passDown() : CL_INVALID_GL_OBJECT;
 }

@@ -51,6 +51,9 @@ protected:
     cl_event gate_ = nullptr; // opened by the test
 };
 
+// What cl_khr_gl_event alone promises; runs only where it is switched on.
+using GlEventTest = CommandOrderTest;
+
 // Without an OpenGL context on the calling thread nothing waits: neither the caller, nor the
 // command for less than its wait list, nor what follows in the queue for less than the command.
 TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackTheQueue)
@@ -172,10 +175,8 @@ TEST_F(CommandOrderTest, UserSynchronisationSwitchesTheImpliedOrderOff)
 }
 
 // Results of drawing that nobody has waited for, but the implied order.
-TEST_F(CommandOrderTest, AcquireComesAfterPendingDrawing)
+TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
 {
-    if (!offersGlEvent())
-        GTEST_SKIP() << "only cl_khr_gl_event promises this, and it is switched off";
     constexpr GLsizei kSide = 1024;
     constexpr std::size_t kPixels = std::size_t{kSide} * kSide;
     const GLuint pixels = makeGlBuffer(Numbers(kPixels, 0));
@@ -214,10 +215,8 @@ TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
     clReleaseEvent(event);
 }
 
-TEST_F(CommandOrderTest, EventsFollowGlSyncObjects)
+TEST_F(GlEventTest, EventsFollowGlSyncObjects)
 {
-    if (!offersGlEvent())
-        GTEST_SKIP() << "cl_khr_gl_event is switched off";
     const auto createEvent = reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
         clGetExtensionFunctionAddressForPlatform(platform_, "clCreateEventFromGLsyncKHR"));
     ASSERT_NE(createEvent, nullptr);

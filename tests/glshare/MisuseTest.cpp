@@ -258,8 +258,8 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
         EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
         EXPECT_EQ(error, row.error);
         cl_device_id device = nullptr;
-        EXPECT_EQ(getInfo(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, sizeof device, &device,
-                          nullptr),
+        EXPECT_EQ(getInfo(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, sizeof(cl_device_id),
+                          &device, nullptr),
                   row.error);
     }
 }

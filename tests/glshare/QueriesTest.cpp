@@ -89,21 +89,21 @@ TEST_F(QueriesTest, GlContextInfoNamesTheDevices)
     std::size_t size = 0;
     cl_device_id device = nullptr;
     EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
-                                    sizeof device, &device, &size),
+                                    sizeof(cl_device_id), &device, &size),
               CL_SUCCESS);
     EXPECT_EQ(device, device_);
-    EXPECT_EQ(size, sizeof device);
+    EXPECT_EQ(size, sizeof(cl_device_id));
     device = nullptr;
-    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR, sizeof device,
-                                    &device, &size),
+    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR,
+                                    sizeof(cl_device_id), &device, &size),
               CL_SUCCESS);
     EXPECT_EQ(device, device_);
     EXPECT_EQ(
         clGetGLContextInfoKHR(list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR, 1, &device, nullptr),
         CL_INVALID_VALUE);
-    EXPECT_EQ(
-        clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, sizeof device, &device, nullptr),
-        CL_INVALID_VALUE);
+    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device,
+                                    nullptr),
+              CL_INVALID_VALUE);
 }
 
 TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
