@@ -1,12 +1,5 @@
 #include "bridge/IDeformerEvaluatorBridge.h"
 
-IDeformerEvaluatorBridgeAPI::IDeformerEvaluatorBridgeAPI() = default;
-IDeformerEvaluatorBridgeAPI::IDeformerEvaluatorBridgeAPI(const IDeformerEvaluatorBridgeAPI&) =
-    default;
-IDeformerEvaluatorBridgeAPI&
-IDeformerEvaluatorBridgeAPI::operator=(const IDeformerEvaluatorBridgeAPI&) = default;
-IDeformerEvaluatorBridgeAPI::~IDeformerEvaluatorBridgeAPI() = default;
-
 constinit IDeformerEvaluatorBridgeAPI* IDeformerEvaluatorBridge::sfAPI = nullptr;
 
 IDeformerEvaluatorBridge&

@@ -2,28 +2,15 @@
 #pragma once
 
 #include "VyraOpenCLExport.h"
-
-namespace em {
-class Id;
-}
-
-// The interface of the deformer evaluator.
-class VYRA_OPENCL_API IDeformerEvaluatorBridgeAPI {
-public:
-    IDeformerEvaluatorBridgeAPI();
-    IDeformerEvaluatorBridgeAPI(const IDeformerEvaluatorBridgeAPI& other);
-    IDeformerEvaluatorBridgeAPI& operator=(const IDeformerEvaluatorBridgeAPI& other);
-    virtual ~IDeformerEvaluatorBridgeAPI();
-
-    // Runs the deformers of evaluation `id`.
-    virtual void evaluate(const em::Id& id) = 0;
-};
+#include "bridge/IDeformerEvaluatorBridgeAPI.h"
 
 // The one place in the process where an evaluator is published. The object is borrowed: its
 // publisher keeps it alive while it is published and withdraws it with setAPI(nullptr). Nothing is
 // locked; callers order publishing and reading.
 class VYRA_OPENCL_API IDeformerEvaluatorBridge {
 public:
+    IDeformerEvaluatorBridge() = default;
+    IDeformerEvaluatorBridge(const IDeformerEvaluatorBridge& other) = default;
     IDeformerEvaluatorBridge& operator=(const IDeformerEvaluatorBridge& other);
     IDeformerEvaluatorBridge& operator=(IDeformerEvaluatorBridge&& other) noexcept;
 

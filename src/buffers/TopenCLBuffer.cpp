@@ -6,6 +6,7 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <limits>
+#include <utility>
 
 namespace {
 
@@ -56,7 +57,7 @@ TopenCLBuffer::TopenCLBuffer(cl_context context, cl_mem_flags flags, std::size_t
 }
 
 TopenCLBuffer::TopenCLBuffer(cl_context context, cl_mem_flags flags, TopenCLDataBuffer dataBuffer)
-    : fDataBuffer(dataBuffer), fMemFlags(flags), fContext(context)
+    : fDataBuffer(std::move(dataBuffer)), fMemFlags(flags), fContext(context)
 {
     TopenCLDataBufferDescriptor& descriptor = fDataBuffer.descriptor();
     descriptor.setCapacityInBytes(descriptor.elementCount() * descriptor.elementSizeInBytes());
@@ -95,7 +96,7 @@ int TopenCLBuffer::ensureBufferCapacity(std::size_t bytes)
         return CL_SUCCESS;
     const cl_event event = readyEvent.get();
     const cl_int status = ocl.clWaitForEvents(1, &event);
-    succeeded(status);
+    reportFailure(status);
     readyEvent.reset();
     return status;
 }
@@ -121,9 +122,9 @@ int TopenCLBuffer::uploadDataToGPU(cl_command_queue queue, cl_uint blocking, std
         return error;
     }
     allocateOpenCLBuffer(offset + size, nullptr, &error);
-    succeeded(error);
+    reportFailure(error);
     const cl_int status = enqueueWrite(queue, blocking, offset, size, hostPtr, numEvents, waitList);
-    succeeded(status);
+    reportFailure(status);
     return status;
 }
 
@@ -169,15 +170,15 @@ void TopenCLBuffer::allocateOpenCLBuffer(std::size_t size, void* hostPtr, int* e
             return;
         reset();
     }
-    createMemory(size, hostPtr, error);
-    if (!hostPtr && *error == CL_SUCCESS && wantsMapping(fMemFlags))
+    *error = createMemory(size, hostPtr);
+    if (*error == CL_SUCCESS && !hostPtr && wantsMapping(fMemFlags))
         mapMemory(size, error);
     bufferReadyEvent().reset();
 }
 
 // Counts the memory, then creates it; a creation that fails leaves nothing held and nothing
 // counted.
-void TopenCLBuffer::createMemory(std::size_t size, void* hostPtr, int* error)
+int TopenCLBuffer::createMemory(std::size_t size, void* hostPtr)
 {
     const unsigned int capacity = static_cast<unsigned int>(size);
     fDataBuffer.descriptor().setCapacityInBytes(capacity);
@@ -185,12 +186,17 @@ void TopenCLBuffer::createMemory(std::size_t size, void* hostPtr, int* error)
     fDeviceMemoryCounted = true;
 
     const cl_mem_flags flags = hostPtr ? fMemFlags | CL_MEM_COPY_HOST_PTR : fMemFlags;
-    fDataBuffer.buffer().adopt(ocl.clCreateBuffer(fContext, flags, capacity, hostPtr, error));
-    if (!buffer().get()) {
-        memoryMonitor().ReduceFromDeviceMemory(capacity);
-        fDeviceMemoryCounted = false;
-        fDataBuffer.descriptor().setCapacityInBytes(0);
-    }
+    int status = CL_SUCCESS;
+    fDataBuffer.buffer().adopt(ocl.clCreateBuffer(fContext, flags, capacity, hostPtr, &status));
+    if (status == CL_SUCCESS && buffer().get())
+        return CL_SUCCESS;
+
+    memoryMonitor().ReduceFromDeviceMemory(capacity);
+    fDeviceMemoryCounted = false;
+    fDataBuffer.buffer().reset();
+    fDataBuffer.descriptor().setCapacityInBytes(0);
+    // A runtime that gives neither a handle nor a reason has failed all the same.
+    return status == CL_SUCCESS ? CL_MEM_OBJECT_ALLOCATION_FAILURE : status;
 }
 
 void TopenCLBuffer::mapMemory(std::size_t size, int* error)
@@ -205,11 +211,12 @@ void TopenCLBuffer::mapMemory(std::size_t size, int* error)
 void TopenCLBuffer::unmapMemory()
 {
     cl_event* unmapped = bufferReadyEvent().receive();
-    succeeded(ocl.clEnqueueUnmapMemObject(TopenCLInfo::theOne().openCLCommandQueue(),
-                                          buffer().get(), fMappedPointer, 0, nullptr, unmapped));
+    reportFailure(ocl.clEnqueueUnmapMemObject(TopenCLInfo::theOne().openCLCommandQueue(),
+                                              buffer().get(), fMappedPointer, 0, nullptr,
+                                              unmapped));
     // A failed unmapping leaves no event to wait for.
     if (*unmapped)
-        succeeded(ocl.clWaitForEvents(1, unmapped));
+        reportFailure(ocl.clWaitForEvents(1, unmapped));
     fMappedPointer = nullptr;
 }
 

@@ -21,7 +21,8 @@
 // CL_MEM_HOST_NO_ACCESS: for writing with CL_MEM_HOST_WRITE_ONLY, else for reading with
 // CL_MEM_HOST_READ_ONLY, else with no map flag.
 //
-// One object is used by one thread at a time. Needs TopenCLInfo::initialize to have run.
+// One object is used by one thread at a time. The default constructor and the mapping need
+// TopenCLInfo::initialize to have run.
 class VYRA_OPENCL_API TopenCLBuffer {
 public:
     // In the runtime's context, CL_MEM_READ_ONLY. Creates no memory.
@@ -50,9 +51,10 @@ public:
     int ensureBufferCapacity(std::size_t bytes);
 
     // Writes `size` bytes from `hostPtr` at `offset`, after the events of `waitList`; the write's
-    // event becomes the ready event. A buffer that is too small grows first: at offset 0 the memory
-    // is created with the data in it and no event remains; at another offset the bytes before it
-    // are undefined. CL_INVALID_OPERATION (-59) for a read-only buffer. Wraps clEnqueueWriteBuffer.
+    // event becomes the ready event. A buffer that is too small waits for `waitList` and grows
+    // first: at offset 0 the memory is created with the data in it and no event remains; at another
+    // offset the bytes before it are undefined. 0 bytes are always fine; otherwise a read-only
+    // buffer gives CL_INVALID_OPERATION (-59). Wraps clEnqueueWriteBuffer.
     int uploadDataToGPU(cl_command_queue queue, cl_uint blocking, std::size_t offset,
                         std::size_t size, void* hostPtr, cl_uint numEvents,
                         const cl_event* waitList);
@@ -77,7 +79,7 @@ public:
 
 private:
     void allocateOpenCLBuffer(std::size_t size, void* hostPtr, int* error);
-    void createMemory(std::size_t size, void* hostPtr, int* error);
+    int createMemory(std::size_t size, void* hostPtr);
     void mapMemory(std::size_t size, int* error);
     void unmapMemory();
     int enqueueWrite(cl_command_queue queue, cl_uint blocking, std::size_t offset, std::size_t size,

@@ -29,8 +29,15 @@ TopenCLData::~TopenCLData() = default;
 
 TopenCLData& TopenCLData::operator=(const TopenCLData& other)
 {
-    if (this != &other)
+    if (this == &other)
+        return *this;
+    try {
         fMap = other.fMap;
+    } catch (...) {
+        // The container would keep what it had copied by then.
+        fMap.clear();
+        throw;
+    }
     return *this;
 }
 

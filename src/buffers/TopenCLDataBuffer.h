@@ -17,7 +17,7 @@ public:
     static const TopenCLDataBuffer fsNULL;
 
     TopenCLDataBuffer();
-    explicit TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor);
+    TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor);
     // Shares both handles; the descriptor is taken whole, its capacity included.
     TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor,
                       const AutoCLObject<cl_mem>& buffer, const AutoCLObject<cl_event>& readyEvent);

@@ -8,9 +8,9 @@
 // Describes the contents of a device buffer: the name of the data, the plug that it belongs to, how
 // many elements of how many bytes, the size of the memory, and whether the memory may be written.
 //
-//      |<-------------- capacityInBytes --------------->|
-//      | element 0 | element 1 | ... | element count-1 |  slack  |
-//      |<- size -->|
+//     |<------------------ capacityInBytes ------------------->|
+//     | element 0 | element 1 | ... | element count-1 |  slack  |
+//     |<- size -->|
 //
 // The bytes asked for are element size times element count, a 32-bit product; the capacity is
 // recorded on its own and may differ. A plain value: one object is not written by one thread while

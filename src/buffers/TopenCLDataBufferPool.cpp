@@ -13,10 +13,9 @@ TopenCLDataBuffer TopenCLDataBufferPool::createBuffer(const TopenCLDataBufferDes
 {
     const std::scoped_lock lock(fMutex);
     const unsigned int requiredBytes = descriptor.elementSizeInBytes() * descriptor.elementCount();
-    // The list's room first: when there is none, nothing has been taken yet.
-    fUsedBuffers.emplace_back();
-
     TopenCLDataBuffer result(descriptor);
+    // The list's room before the memory: when there is none, nothing has been taken yet.
+    fUsedBuffers.emplace_back();
     if (!takeBestFit(requiredBytes, result))
         createMemory(requiredBytes, result);
 

@@ -5,33 +5,33 @@
 
 void retainCLObject(cl_mem handle)
 {
-    succeeded(ocl.clRetainMemObject(handle));
+    reportFailure(ocl.clRetainMemObject(handle));
 }
 void releaseCLObject(cl_mem handle)
 {
-    succeeded(ocl.clReleaseMemObject(handle));
+    reportFailure(ocl.clReleaseMemObject(handle));
 }
 void retainCLObject(cl_event handle)
 {
-    succeeded(ocl.clRetainEvent(handle));
+    reportFailure(ocl.clRetainEvent(handle));
 }
 void releaseCLObject(cl_event handle)
 {
-    succeeded(ocl.clReleaseEvent(handle));
+    reportFailure(ocl.clReleaseEvent(handle));
 }
 void retainCLObject(cl_kernel handle)
 {
-    succeeded(ocl.clRetainKernel(handle));
+    reportFailure(ocl.clRetainKernel(handle));
 }
 void releaseCLObject(cl_kernel handle)
 {
-    succeeded(ocl.clReleaseKernel(handle));
+    reportFailure(ocl.clReleaseKernel(handle));
 }
 void retainCLObject(cl_program handle)
 {
-    succeeded(ocl.clRetainProgram(handle));
+    reportFailure(ocl.clRetainProgram(handle));
 }
 void releaseCLObject(cl_program handle)
 {
-    succeeded(ocl.clReleaseProgram(handle));
+    reportFailure(ocl.clReleaseProgram(handle));
 }

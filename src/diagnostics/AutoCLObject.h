@@ -6,7 +6,8 @@
 #include <CL/cl.h>
 
 // The runtime's reference counting, one pair per kind of handle. A status other than CL_SUCCESS is
-// reported as a warning and otherwise ignored. `handle` is never null.
+// reported as a warning and otherwise ignored, also the one that the runtime gives for a null
+// handle.
 VYRA_OPENCL_API void retainCLObject(cl_mem handle);
 VYRA_OPENCL_API void releaseCLObject(cl_mem handle);
 VYRA_OPENCL_API void retainCLObject(cl_event handle);

@@ -33,14 +33,9 @@ std::unique_ptr<char[]> formatMessage(const char* format, va_list arguments)
 
 } // namespace
 
-CLWarningSink setCLWarningSink(CLWarningSink sink)
+void setCLWarningSink(CLWarningSink sink)
 {
-    return currentSink.exchange(sink ? sink : discardWarning);
-}
-
-CLWarningSink clWarningSink()
-{
-    return currentSink.load();
+    currentSink = sink ? sink : discardWarning;
 }
 
 void CLInternalWarning(const char* format, ...)
@@ -49,5 +44,6 @@ void CLInternalWarning(const char* format, ...)
     va_start(arguments, format);
     const std::unique_ptr<char[]> text = formatMessage(format, arguments);
     va_end(arguments);
-    clWarningSink()(text ? text.get() : "");
+    const CLWarningSink sink = currentSink;
+    sink(text ? text.get() : "");
 }

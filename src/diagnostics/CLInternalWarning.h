@@ -6,8 +6,4 @@
 // Formats a printf-style message, whole and of any length, and hands it to the warning sink. The
 // built-in sink writes nothing. Never fails towards its caller: a message that cannot be formatted
 // is handed on empty. Safe from any thread.
-#if defined(__GNUC__)
-__attribute__((format(printf, 1, 2)))
-#endif
-VYRA_OPENCL_API void
-CLInternalWarning(const char* format, ...);
+[[gnu::format(printf, 1, 2)]] VYRA_OPENCL_API void CLInternalWarning(const char* format, ...);

@@ -3,21 +3,18 @@
 #include "diagnostics/CLErrorCodes.h"
 #include "diagnostics/CLInternalWarning.h"
 
-#include <cstdio>
-
-bool succeeded(cl_int status, CLReportStyle style)
+void reportFailure(cl_int status, CLReportStyle style)
 {
     if (status == CL_SUCCESS)
-        return true;
-    if (style == CLReportStyle::kSetUp)
+        return;
+    if (style == CLReportStyle::kWithLineBreak)
         CLInternalWarning("OpenCL error: %s\n", CLErrorCodeStr(status));
     else
         CLInternalWarning("OpenCL error: %s", CLErrorCodeStr(status));
-    return false;
 }
 
-void CL_CALLBACK contextErrorCallback(const char* errorInfo, const void* /*privateInfo*/,
-                                      std::size_t /*privateInfoSize*/, void* /*userData*/)
+bool succeeded(cl_int status, CLReportStyle style)
 {
-    std::fprintf(stderr, "OpenCL Error: %s\n", errorInfo);
+    reportFailure(status, style);
+    return status == CL_SUCCESS;
 }

@@ -6,8 +6,5 @@
 using CLWarningSink = void (*)(const char* text);
 
 // Makes `sink` the receiver of all warnings from now on; null restores the built-in sink, which
-// writes nothing. Returns the sink that it replaces. Safe from any thread.
-CLWarningSink setCLWarningSink(CLWarningSink sink);
-
-// The present receiver. Never null.
-CLWarningSink clWarningSink();
+// writes nothing. Safe from any thread.
+void setCLWarningSink(CLWarningSink sink);

@@ -2,6 +2,7 @@
 #include "diagnostics/CLStatusReport.h"
 #include "host/EvaluationId.h"
 #include "interop/GraphicsSync.h"
+#include "interop/ProfilerScope.h"
 #include "interop/SharedBufferMgrBlock.h"
 #include "interop/TopenCLSharedBufferMgr.h"
 #include "loader/OpenCLLoader.h"
@@ -35,10 +36,10 @@ void TopenCLSharedBufferMgr::PreEvaluate(const em::Id& id)
     fEvaluationId = id.value();
     fReleaseEvent.reset();
     if (!fBatch.empty())
-        acquireBatch();
+        AcquireBatch();
 }
 
-void TopenCLSharedBufferMgr::acquireBatch()
+void TopenCLSharedBufferMgr::AcquireBatch()
 {
     const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
     fBatchAcquired = true;
@@ -49,10 +50,10 @@ void TopenCLSharedBufferMgr::acquireBatch()
                                                         bareHandles(fBatch.data()), 0, nullptr,
                                                         fAcquireEvent.receive());
     if (const cl_event acquired = fAcquireEvent.get()) {
-        fImpl->fReleaseWaitEvents.append(&acquired, 1);
+        fImpl->fReleaseWaitEvents.append(acquired);
         ocl.clRetainEvent(acquired); // the list's reference, paid back by ReleaseBufferBatch
     }
-    succeeded(status);
+    reportFailure(status);
 }
 
 // Makes the batch anew from the records, in the order of their handles. Takes no lock.
@@ -89,9 +90,10 @@ const cl_event* TopenCLSharedBufferMgr::EnqueueReleaseBatchedSharedCLBuffer(unsi
 {
     // While nothing is batched no release would ever pay the references back.
     if (fBatchingEnabled && events) {
-        for (unsigned int index = 0; index < numEvents; ++index)
+        for (unsigned int index = 0; index < numEvents; ++index) {
             retainCLObject(events[index]); // paid back by ReleaseBufferBatch
-        fImpl->fReleaseWaitEvents.append(events, numEvents);
+            fImpl->fReleaseWaitEvents.append(events[index]);
+        }
     }
     return bareHandles(&fReleaseEvent);
 }
@@ -106,7 +108,7 @@ int TopenCLSharedBufferMgr::EnqueueReleaseSharedCLBuffer(cl_command_queue queue,
         sfEnqueueReleaseSharedObjects(queue, numMemObjects, memObjects, numEvents, waitList, event);
     if (fBatchingEnabled && status == CL_SUCCESS && event && *event &&
         graphicsWaitsForSyncObjects())
-        fImpl->fGraphicsWaitEvents.append(event, 1);
+        fImpl->fGraphicsWaitEvents.append(*event);
     return status;
 }
 
@@ -140,7 +142,7 @@ void TopenCLSharedBufferMgr::ReleaseBufferBatch()
         fImpl->fReleaseWaitEvents.copyTo(waitList);
         fImpl->fReleaseWaitEvents.clear();
 
-        succeeded(sfEnqueueReleaseSharedObjects(
+        reportFailure(sfEnqueueReleaseSharedObjects(
             queue, static_cast<cl_uint>(fBatch.size()), bareHandles(fBatch.data()),
             static_cast<cl_uint>(waitList.size()), waitList.empty() ? nullptr : waitList.data(),
             fReleaseEvent.receive()));

@@ -25,7 +25,7 @@ constexpr std::uint64_t kFenceWaitNanoseconds = 1'000'000'000;
 constinit std::atomic<GLsync> sfGraphicsFence = nullptr;
 
 // Held from taking the fence out until it is deleted, so that nobody overtakes a wait.
-constinit std::mutex fenceWaiters;
+constinit std::mutex sfFenceWaitMutex;
 
 // The host's table when sync objects are usable, else null.
 GLFunctionTable* syncObjectFunctions()
@@ -54,7 +54,7 @@ void WaitForGraphicsFence()
     if (!gl)
         return;
 
-    const std::scoped_lock lock(fenceWaiters);
+    const std::scoped_lock lock(sfFenceWaitMutex);
     GLsync fence = sfGraphicsFence.exchange(nullptr);
     if (!fence)
         return;

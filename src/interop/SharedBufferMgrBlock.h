@@ -1,21 +1,15 @@
-// The block behind the shared-buffer manager: its lock, its event lists, its profiler scopes.
-// Internal.
+// The block behind the shared-buffer manager: its lock and its event lists. Internal.
 #pragma once
-
-#include "host/Profiler.h"
 
 #include <atomic>
 #include <cstddef>
+#include <cstdint>
 #include <mutex>
 #include <thread>
 #include <vector>
 
 #include <CL/cl.h>
 #include <tbb/concurrent_vector.h>
-
-// The event types of the batch's acquire and release, built when the library is loaded.
-extern const profiler::EventType sfAcquireBatchEventType;
-extern const profiler::EventType sfReleaseBatchEventType;
 
 // The value of an evaluation id while no evaluation is open.
 inline constexpr std::uint16_t kNoEvaluation = 0xFFFE;
@@ -26,11 +20,10 @@ class ConcurrentEventList {
 public:
     ConcurrentEventList() { fEvents.reserve(kReservedEvents); }
 
-    void append(const cl_event* events, std::size_t count)
+    void append(cl_event event)
     {
-        for (std::size_t index = 0; index < count; ++index)
-            fEvents.push_back(events[index]);
-        fWritten.fetch_add(count, std::memory_order_release);
+        fEvents.push_back(event);
+        fWritten.fetch_add(1, std::memory_order_release);
     }
 
     // Replaces the contents of `events` by the events appended so far, in order. May run beside
@@ -53,7 +46,6 @@ public:
         fWritten = 0;
     }
 
-    bool empty() const { return fEvents.empty(); }
     auto begin() const { return fEvents.begin(); }
     auto end() const { return fEvents.end(); }
 
@@ -74,28 +66,6 @@ struct TopenCLSharedBufferMgrImpl {
     std::mutex fMutex;
     // Events of single releases that the renderer waits for. Borrowed.
     ConcurrentEventList fGraphicsWaitEvents;
-};
-
-// An event of the host's profiler from construction to destruction, when the profiler records.
-class ProfilerScope {
-public:
-    explicit ProfilerScope(const profiler::EventType& type) : fActive(profiler::samplingActive())
-    {
-        if (fActive)
-            fEvent =
-                profiler::eventBegin(type.categoryId(), type.color(), type.name(), "", nullptr, 0);
-    }
-    ~ProfilerScope()
-    {
-        if (fActive)
-            profiler::eventEnd(fEvent);
-    }
-    ProfilerScope(const ProfilerScope&) = delete;
-    ProfilerScope& operator=(const ProfilerScope&) = delete;
-
-private:
-    bool fActive;
-    profiler::EventId fEvent = 0;
 };
 
 // Holders have the layout of bare handles, so an array of them serves as an array of handles.

@@ -71,6 +71,7 @@ const TopenCLSharedBuffer* TopenCLSharedBufferMgr::CreateSharedCLBuffer(cl_conte
                                                                         int* errcode)
 {
     AutoCLObject<cl_mem> created;
+    *errcode = CL_SUCCESS;
     created.adopt(sfCreateSharedCLBuffer(context, flags, graphicsBuffer, errcode));
     if (*errcode != CL_SUCCESS || !created.get())
         return nullptr;
@@ -88,7 +89,7 @@ int TopenCLSharedBufferMgr::DestroySharedCLBuffer(const TopenCLSharedBuffer* buf
     const std::scoped_lock lock(fImpl->fMutex);
     int result = CL_SUCCESS;
     if (buffer->fInBatch)
-        result = fBatchAcquired ? CL_INVALID_VALUE : dissolveBatch();
+        result = fBatchAcquired ? CL_INVALID_VALUE : DissolveBatch();
     fBuffers.erase(buffer->fMem.get());
     fBatchDirty = true;
     return result;
@@ -96,13 +97,13 @@ int TopenCLSharedBufferMgr::DestroySharedCLBuffer(const TopenCLSharedBuffer* buf
 
 // Waits for the batch's last release and leaves every buffer on its own. Returns the status of the
 // wait.
-int TopenCLSharedBufferMgr::dissolveBatch()
+int TopenCLSharedBufferMgr::DissolveBatch()
 {
     int result = CL_SUCCESS;
     if (fReleaseEvent.get()) {
         const cl_event released = fReleaseEvent.get();
         result = ocl.clWaitForEvents(1, &released);
-        succeeded(result);
+        reportFailure(result);
     }
     fBatch.clear();
     for (auto& [memory, record] : fBuffers)
@@ -114,13 +115,13 @@ int TopenCLSharedBufferMgr::DestroyBatchedSharedCLBuffer(const TopenCLSharedBuff
 {
     const std::scoped_lock lock(fImpl->fMutex);
     if (buffer->fInBatch)
-        leaveBatch(*buffer);
+        LeaveBatch(*buffer);
     fBuffers.erase(buffer->fMem.get());
     return CL_SUCCESS;
 }
 
 // Takes one buffer out of the batch, which keeps the order of the others.
-void TopenCLSharedBufferMgr::leaveBatch(const TopenCLSharedBuffer& record)
+void TopenCLSharedBufferMgr::LeaveBatch(const TopenCLSharedBuffer& record)
 {
     const auto member = std::find_if(fBatch.begin(), fBatch.end(), [&](const auto& memory) {
         return memory.get() == record.fMem.get();
@@ -128,23 +129,23 @@ void TopenCLSharedBufferMgr::leaveBatch(const TopenCLSharedBuffer& record)
     if (member == fBatch.end())
         return;
     if (fBatchAcquired)
-        releaseAlone(record);
+        ReleaseAlone(record);
     fBatch.erase(member);
 }
 
 // Releases one buffer of the acquired batch, after all events handed over so far, and waits for it.
 // The events stay listed, since the rest of the batch waits for them too.
-void TopenCLSharedBufferMgr::releaseAlone(const TopenCLSharedBuffer& record)
+void TopenCLSharedBufferMgr::ReleaseAlone(const TopenCLSharedBuffer& record)
 {
     std::vector<cl_event>& waitList = fImpl->fWaitListScratch;
     fImpl->fReleaseWaitEvents.copyTo(waitList);
 
     AutoCLObject<cl_event> released;
-    succeeded(sfEnqueueReleaseSharedObjects(
+    reportFailure(sfEnqueueReleaseSharedObjects(
         TopenCLInfo::theOne().openCLCommandQueue(), 1, bareHandles(&record.fMem),
         static_cast<cl_uint>(waitList.size()), waitList.empty() ? nullptr : waitList.data(),
         released.receive()));
     // A failed release leaves no event to wait for.
     if (released.get())
-        succeeded(ocl.clWaitForEvents(1, bareHandles(&released)));
+        reportFailure(ocl.clWaitForEvents(1, bareHandles(&released)));
 }

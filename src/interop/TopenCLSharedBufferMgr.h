@@ -3,6 +3,7 @@
 
 #include "VyraOpenCLExport.h"
 #include "diagnostics/AutoCLObject.h"
+#include "interop/TopenCLSharedBuffer.h"
 
 #include <cstdint>
 #include <map>
@@ -15,15 +16,6 @@ namespace em {
 class Id;
 }
 struct TopenCLSharedBufferMgrImpl;
-
-// The record of one shared buffer. Its address stays valid until the record is destroyed.
-struct VYRA_OPENCL_API TopenCLSharedBuffer {
-    // The memory object made from the renderer's buffer. First, so that the record's address serves
-    // as a list of one memory object.
-    AutoCLObject<cl_mem> fMem;
-    // The buffer is acquired and released with the manager's batch, not on its own.
-    bool fInBatch = false;
-};
 
 // Makes OpenCL memory objects of the renderer's vertex buffers and takes all of them through the
 // cycle of acquire and release together.
@@ -39,11 +31,10 @@ struct VYRA_OPENCL_API TopenCLSharedBuffer {
 //       EnqueueReleaseBatchedSharedCLBuffer(...) hands the last events over
 //     PostEvaluate(id)                           one release, after all events handed over
 //     ... drawing ...
-//     RenderingComplete()                        the fence that the next acquire waits for, where
-//     needed
+//     RenderingComplete()                        the fence that the next acquire waits for
 //
-// PreEvaluate and PostEvaluate come in pairs and overlap with no other operation of the manager.
-// Between them the acquire and release operations, and at any time the create and destroy
+// PreEvaluate and PostEvaluate come in pairs and overlap with no other operation of the manager. At
+// any other time the create and destroy operations, and between the two the acquire and release
 // operations, may be called from several threads. RenderingComplete belongs to the renderer's
 // thread, its OpenGL context current.
 //
@@ -112,17 +103,17 @@ public:
 private:
     void UpdateBufferBatch();
     void ReleaseBufferBatch();
-    void acquireBatch();
-    int dissolveBatch();
-    void leaveBatch(const TopenCLSharedBuffer& record);
-    void releaseAlone(const TopenCLSharedBuffer& record);
+    void AcquireBatch();
+    int DissolveBatch();
+    void LeaveBatch(const TopenCLSharedBuffer& record);
+    void ReleaseAlone(const TopenCLSharedBuffer& record);
 
     std::unique_ptr<TopenCLSharedBufferMgrImpl> fImpl;
     std::vector<AutoCLObject<cl_mem>> fBatch;       // in the order of fBuffers at the last rebuild
     std::map<cl_mem, TopenCLSharedBuffer> fBuffers; // guarded by the block's mutex
     bool fBatchDirty = false;                       // records came or went since the last rebuild
     AutoCLObject<cl_event> fAcquireEvent;           // of the last batch acquire
-    std::uint16_t fEvaluationId;                    // of the open evaluation
+    std::uint16_t fEvaluationId;                    // of the open evaluation; 0xFFFE when none is
     bool fBatchAcquired = false;                    // acquired and not released since
     bool fBatchingEnabled = true;
     AutoCLObject<cl_event> fReleaseEvent; // of the last batch release

@@ -2,6 +2,7 @@
 #include "host/Application.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <limits>
@@ -43,12 +44,12 @@ bool TopenCLInfo::oclLoadProgSource(Tstring& source, const char* fileName, const
     const std::size_t preambleLength = std::strlen(preamble);
     const long size = fileSize(file.get());
     // Also refuses what is no file: a directory opens here and tells an absurd size.
-    constexpr auto kTextLimit = static_cast<std::size_t>(std::numeric_limits<int>::max());
-    if (size < 0 || preambleLength >= kTextLimit ||
-        static_cast<std::size_t>(size) >= kTextLimit - preambleLength)
+    if (size < 0 || size > std::numeric_limits<std::int32_t>::max())
+        return false;
+    const std::size_t textLength = preambleLength + static_cast<std::size_t>(size);
+    if (textLength >= std::numeric_limits<std::uint32_t>::max())
         return false;
 
-    const std::size_t textLength = preambleLength + static_cast<std::size_t>(size);
     source.setLength(static_cast<unsigned int>(textLength + 1));
     std::memcpy(source.data(), preamble, preambleLength);
     // One element of the file's size: an empty file counts as unreadable.

@@ -69,7 +69,7 @@ AutoCLObject<cl_kernel> TopenCLKernelStore::createKernel(ProgramInfo& program,
     AutoCLObject<cl_kernel> kernel;
     cl_int status = CL_SUCCESS;
     kernel.adopt(ocl.clCreateKernel(program.fProgram.get(), kernelName, &status));
-    succeeded(status);
+    reportFailure(status);
     if (kernel.get())
         program.fKernels.push_back(kernel);
     return kernel;
@@ -142,11 +142,12 @@ cl_program TopenCLKernelStore::getProgramFromString(const char* source, const ch
 
     cl_int status = CL_SUCCESS;
     cl_program program = ocl.clCreateProgramWithSource(fContext, 1, &source, nullptr, &status);
-    succeeded(status);
+    reportFailure(status);
     if (!program)
         return nullptr;
 
-    succeeded(ocl.clBuildProgram(program, 1, &fDevice, buildOptions.asChar(), nullptr, nullptr));
+    reportFailure(
+        ocl.clBuildProgram(program, 1, &fDevice, buildOptions.asChar(), nullptr, nullptr));
     cl_build_status buildStatus = CL_BUILD_ERROR;
     const bool known = succeeded(ocl.clGetProgramBuildInfo(
         program, fDevice, CL_PROGRAM_BUILD_STATUS, sizeof buildStatus, &buildStatus, nullptr));
@@ -165,11 +166,12 @@ void TopenCLKernelStore::reportBuildLog(cl_program program)
     if (!succeeded(
             ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, 0, nullptr, &size)))
         return;
+    if (size == 0)
+        return;
     // Without memory for the log there is no log: the program must still be released.
     const std::unique_ptr<char[]> log(new (std::nothrow) char[size + 1]());
-    if (size == 0 || !log)
-        return;
-    if (succeeded(ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, size, log.get(),
+    if (log &&
+        succeeded(ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, size, log.get(),
                                             nullptr)) &&
         log[0] != '\0')
         CLInternalWarning("%s", log.get());

@@ -25,16 +25,16 @@ bool resolve(void* library, const char* name, Function& entry)
 
 } // namespace
 
-OpenCLLoadStatus loadOpenCL(const char* name)
+OpenCLLoadStatus loadOpenCL()
 {
-    void* library = openSharedLibrary(name ? name : kSystemLibrary);
+    void* library = openSharedLibrary(kSystemLibrary);
     if (!library)
         return OpenCLLoadStatus::kNoLibrary;
 
     // First, since the others may be found through it.
-    bool complete =
-        resolve(library, "clGetExtensionFunctionAddress", ocl.clGetExtensionFunctionAddress);
+    resolve(library, "clGetExtensionFunctionAddress", ocl.clGetExtensionFunctionAddress);
 
+    bool complete = true;
 #define VYRA_RESOLVE_CORE(entry) complete = resolve(library, #entry, ocl.entry) && complete;
 #define VYRA_RESOLVE(entry) resolve(library, #entry, ocl.entry);
 #define VYRA_RESOLVE_TYPED(type, entry) resolve(library, #entry, ocl.entry);

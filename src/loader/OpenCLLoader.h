@@ -93,7 +93,7 @@ enum class OpenCLLoadStatus : int {
     kNoCoreEntryPoint, // it lacks a function of OpenCL 1.0
 };
 
-// Opens the library `name`, by default the system's OpenCL loader, and fills the table; each entry
-// is looked up in the library first, then with clGetExtensionFunctionAddress. Never ends the
-// process. May throw standard exceptions.
-OpenCLLoadStatus loadOpenCL(const char* name = nullptr);
+// Opens the system's OpenCL loader library and fills the table; each entry is looked up in the
+// library first, then with clGetExtensionFunctionAddress. Never ends the process. May throw
+// standard exceptions.
+OpenCLLoadStatus loadOpenCL();

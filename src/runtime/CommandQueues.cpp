@@ -30,14 +30,14 @@ cl_command_queue TopenCLInfo::createOpenCLCommandQueue(bool* usingOutOfOrderExec
     cl_command_queue_properties supported = 0;
     if (!succeeded(ocl.clGetDeviceInfo(fDevice, CL_DEVICE_QUEUE_PROPERTIES, sizeof supported,
                                        &supported, nullptr),
-                   CLReportStyle::kSetUp))
+                   CLReportStyle::kWithLineBreak))
         return nullptr;
 
     cl_int status = CL_SUCCESS;
     cl_command_queue queue = ocl.clCreateCommandQueue(fContext, fDevice, 0, &status);
     if (status == CL_INVALID_VALUE || status == CL_INVALID_QUEUE_PROPERTIES)
         queue = ocl.clCreateCommandQueue(fContext, fDevice, 0, &status);
-    return succeeded(status, CLReportStyle::kSetUp) ? queue : nullptr;
+    return succeeded(status, CLReportStyle::kWithLineBreak) ? queue : nullptr;
 }
 
 void TopenCLInfo::finish()
@@ -63,7 +63,7 @@ bool TopenCLInfo::IsEventComplete(cl_event event)
     cl_int executionStatus = -1;
     if (!readExecutionStatus(event, executionStatus) || executionStatus == CL_COMPLETE)
         return true;
-    // AMD's runtime brings the status up to date only when it is asked; the second look sees it.
+    // On AMD a second look decides.
     if (theOne().fProvider == kAMDProvider && !readExecutionStatus(event, executionStatus))
         return true;
     return executionStatus == CL_COMPLETE;
@@ -82,7 +82,7 @@ int TopenCLInfo::getWorkGroupSizes(cl_kernel kernel, std::size_t workItemCount,
     const cl_int status =
         ocl.clGetKernelWorkGroupInfo(kernel, fDevice, CL_KERNEL_WORK_GROUP_SIZE,
                                      sizeof workGroupSize, &workGroupSize, &answeredBytes);
-    if (!succeeded(status, CLReportStyle::kSetUp))
+    if (!succeeded(status, CLReportStyle::kWithLineBreak))
         return status;
 
     // No runtime answers 0 for a valid kernel, but one that did would be divided by.

@@ -14,7 +14,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <exception>
 #include <optional>
 #include <string>
 #include <vector>
@@ -38,7 +37,7 @@ template <typename Value>
 bool readDeviceInfo(cl_device_id device, cl_device_info name, Value& value)
 {
     return succeeded(ocl.clGetDeviceInfo(device, name, sizeof value, &value, nullptr),
-                     CLReportStyle::kSetUp);
+                     CLReportStyle::kWithLineBreak);
 }
 
 // Sets `isGPU` when the type is a GPU and nothing else besides.
@@ -57,7 +56,7 @@ bool readGLContextInfo(const ContextProperties& properties, cl_gl_context_info n
 {
     size = 0;
     return succeeded(ocl.clGetGLContextInfoKHR(properties.data(), name, room, value, &size),
-                     CLReportStyle::kSetUp);
+                     CLReportStyle::kWithLineBreak);
 }
 
 // Takes the first GPU among `devices`, `current` before the others where it is one of them.
@@ -84,27 +83,6 @@ bool chooseGPU(const DeviceList& devices, std::size_t count, cl_device_id curren
         }
     }
     return true;
-}
-
-std::optional<int> ignoreDriverVersion()
-{
-    const char* value = std::getenv("VYRA_OPENCL_IGNORE_DRIVER_VERSION");
-    return value ? std::optional<int>(std::atoi(value)) : std::nullopt;
-}
-
-} // namespace
-
-ContextProperties openGLContextProperties(void* window, void* glContext, cl_platform_id platform)
-{
-    const GLDisplayProperty display = glDisplayProperty(window);
-    return {CL_GL_CONTEXT_KHR, asProperty(glContext), display.name,
-            display.value,     CL_CONTEXT_PLATFORM,   asProperty(platform)};
-}
-
-ContextProperties d3d11ContextProperties(void* d3dDevice, cl_platform_id platform)
-{
-    return {kCLContextD3D11Device, asProperty(d3dDevice), CL_CONTEXT_PLATFORM,
-            asProperty(platform)};
 }
 
 bool chooseDeviceForOpenGL(const ContextProperties& properties, cl_device_id& device)
@@ -134,14 +112,41 @@ bool chooseDeviceForOpenGL(const ContextProperties& properties, cl_device_id& de
 bool chooseDeviceForD3D11(void* d3dDevice, cl_platform_id platform, cl_device_id& device)
 {
     DeviceList devices{};
-    cl_uint count = 0;
     if (!succeeded(sfGetDeviceIDsFromD3D11(
                        platform, kCLD3D11Device, d3dDevice, kCLPreferredDevicesForD3D11,
-                       static_cast<cl_uint>(devices.size()), devices.data(), &count),
-                   CLReportStyle::kSetUp))
+                       static_cast<cl_uint>(devices.size()), devices.data(), nullptr),
+                   CLReportStyle::kWithLineBreak))
         return false;
     device = devices.front();
     return device != nullptr;
+}
+
+std::optional<int> ignoreDriverVersion()
+{
+    const char* value = std::getenv("VYRA_OPENCL_IGNORE_DRIVER_VERSION");
+    return value ? std::optional<int>(std::atoi(value)) : std::nullopt;
+}
+
+} // namespace
+
+ContextProperties openGLContextProperties(void* window, void* glContext, cl_platform_id platform)
+{
+    const GLDisplayProperty display = glDisplayProperty(window);
+    return {CL_GL_CONTEXT_KHR, asProperty(glContext), display.name,
+            display.value,     CL_CONTEXT_PLATFORM,   asProperty(platform)};
+}
+
+ContextProperties d3d11ContextProperties(void* d3dDevice, cl_platform_id platform)
+{
+    return {kCLContextD3D11Device, asProperty(d3dDevice), CL_CONTEXT_PLATFORM,
+            asProperty(platform)};
+}
+
+bool chooseDevice(bool usingDX, void* graphicsContext, cl_platform_id platform,
+                  const ContextProperties& properties, cl_device_id& device)
+{
+    return usingDX ? chooseDeviceForD3D11(graphicsContext, platform, device)
+                   : chooseDeviceForOpenGL(properties, device);
 }
 
 bool reportDevice(cl_device_id device)
@@ -207,7 +212,7 @@ bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
     InfoText version{};
     if (!succeeded(ocl.clGetPlatformInfo(platform, CL_PLATFORM_VERSION, sizeof version,
                                          version.data(), nullptr),
-                   CLReportStyle::kSetUp))
+                   CLReportStyle::kWithLineBreak))
         return false;
 
     constexpr std::size_t kVersionPrefix = 10;

@@ -14,15 +14,13 @@ using ContextProperties = std::array<cl_context_properties, 7>;
 ContextProperties openGLContextProperties(void* window, void* glContext, cl_platform_id platform);
 ContextProperties d3d11ContextProperties(void* d3dDevice, cl_platform_id platform);
 
-// The GPU device that shares with the OpenGL context of `properties`: its current device where that
-// is a GPU of the list, else the first GPU of the list. False, and said, when there is none or a
-// query fails.
-bool chooseDeviceForOpenGL(const ContextProperties& properties, cl_device_id& device);
+// The device for the renderer. With OpenGL, the one that shares with the context of `properties`:
+// its current device where that is a GPU of the list, else the first GPU of the list; it is said
+// when there is none. With Direct3D 11, the one that prefers to share with the device
+// `graphicsContext`. False when there is none, or, reported, when a query fails.
+bool chooseDevice(bool usingDX, void* graphicsContext, cl_platform_id platform,
+                  const ContextProperties& properties, cl_device_id& device);
 
-// The device that prefers to share with `d3dDevice`, through the function that the interop table
-// holds. False when there is none, or, reported, when the query fails.
-bool chooseDeviceForD3D11(void* d3dDevice, cl_platform_id platform, cl_device_id& device);
-
-// Prints name, type and availability of `device`. False, and said, when it is not available or a
-// query fails.
+// Prints name, type and availability of `device`. False when it is not available, which is said,
+// or, reported, when a query fails.
 bool reportDevice(cl_device_id device);

@@ -1,5 +1,6 @@
 // Part of TopenCLInfo: start-up and clean-up.
 #include "diagnostics/CLStatusReport.h"
+#include "diagnostics/ContextErrorCallback.h"
 #include "host/Application.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "loader/OpenCLLoader.h"
@@ -38,6 +39,18 @@ bool loadRuntime()
     return false;
 }
 
+// Says which platform was chosen, or that there is none, which is false.
+bool reportPlatform(const Tstring& vendor, cl_platform_id platform)
+{
+    if (!platform) {
+        std::fprintf(stderr, "OpenCL evaluator failed to find OpenCL device with vendor %s.\n",
+                     vendor.asChar());
+        return false;
+    }
+    std::fprintf(stderr, "OpenCL evaluator choosing OpenCL platform %s.\n", vendor.asChar());
+    return true;
+}
+
 } // namespace
 
 bool TopenCLInfo::initialize(void* window, void* graphicsContext, void* reserved, bool usingDX,
@@ -58,15 +71,26 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
     if (disabledByUser() || !loadRuntime())
         return;
 
+    const std::optional<Tstring> vendor = chooseVendor(vendorId);
+    if (!vendor)
+        return;
     cl_platform_id platform = nullptr;
     Tstring extensions;
-    if (!choosePlatform(vendorId, platform, extensions))
+    // A search that fails behind the match has found its platform all the same.
+    findPlatformByVendor(*vendor, platform, extensions);
+    if (!reportPlatform(*vendor, platform))
         return;
+    fProvider = providerOfVendor(*vendor);
     setMinimumBufferSize(getDefaultMinimumBufferSize());
 
     if (!setupDirectXExtensionFunctions(&extensions))
         return;
-    if (!chooseDeviceAndContext(window, graphicsContext, platform))
+    const ContextProperties properties =
+        usingDX ? d3d11ContextProperties(graphicsContext, platform)
+                : openGLContextProperties(window, graphicsContext, platform);
+    if (!chooseDevice(usingDX, graphicsContext, platform, properties, fDevice))
+        return;
+    if (!decideAsyncReadback() || !createContext(properties.data()))
         return;
     if (!setupExtensionFunctions(&extensions))
         return;
@@ -81,40 +105,11 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
     TresourceGuard::initializeOffset();
 }
 
-// The vendor, its platform, and its class.
-bool TopenCLInfo::choosePlatform(unsigned vendorId, cl_platform_id& platform, Tstring& extensions)
+bool TopenCLInfo::createContext(const cl_context_properties* properties)
 {
-    const std::optional<Tstring> vendor = chooseVendor(vendorId);
-    if (!vendor)
-        return false;
-    // A search that fails behind the match has found its platform all the same.
-    findPlatformByVendor(*vendor, platform, extensions);
-    if (!platform) {
-        std::fprintf(stderr, "OpenCL evaluator failed to find OpenCL device with vendor %s.\n",
-                     vendor->asChar());
-        return false;
-    }
-    std::fprintf(stderr, "OpenCL evaluator choosing OpenCL platform %s.\n", vendor->asChar());
-    fProvider = providerOfVendor(*vendor);
-    return true;
-}
-
-// The device that shares with the renderer, what its driver is good for, and a context on it.
-bool TopenCLInfo::chooseDeviceAndContext(void* window, void* graphicsContext,
-                                         cl_platform_id platform)
-{
-    const ContextProperties properties =
-        fUsingDX ? d3d11ContextProperties(graphicsContext, platform)
-                 : openGLContextProperties(window, graphicsContext, platform);
-    const bool found = fUsingDX ? chooseDeviceForD3D11(graphicsContext, platform, fDevice)
-                                : chooseDeviceForOpenGL(properties, fDevice);
-    if (!found || !decideAsyncReadback())
-        return false;
-
     cl_int status = CL_SUCCESS;
-    fContext =
-        ocl.clCreateContext(properties.data(), 1, &fDevice, contextErrorCallback, nullptr, &status);
-    return succeeded(status, CLReportStyle::kSetUp);
+    fContext = ocl.clCreateContext(properties, 1, &fDevice, contextErrorCallback, nullptr, &status);
+    return succeeded(status, CLReportStyle::kWithLineBreak);
 }
 
 void TopenCLInfo::createQueuesAndKernelStore()
@@ -130,8 +125,7 @@ TopenCLInfo::~TopenCLInfo()
     cleanUpOpenCL();
 }
 
-// Context and queues are dropped, not released: commands of the host may still be under way in
-// them.
+// Context and queues are forgotten, not released.
 void TopenCLInfo::cleanUpOpenCL()
 {
     delete fKernelStore;

@@ -57,6 +57,15 @@ bool useGLSharing()
     return true;
 }
 
+// The chosen mode, after telling the user what there is to tell.
+template <typename Mode>
+Mode tellChoice(const SyncModeChoice<Mode>& choice)
+{
+    if (choice.message)
+        std::fputs(choice.message, stderr);
+    return choice.mode;
+}
+
 bool listsExtension(const Tstring& extensions, const char* name)
 {
     return extensions.findMB(name) != -1;
@@ -113,8 +122,10 @@ bool TopenCLInfo::setupExtensionFunctions(Tstring* extensions)
             .arbSync = gl && gl->syncObjectsUsable(),
             .implicitSyncTrusted = fProvider != kNVIDIAProvider || fDriverSupportsImplicitSync,
         };
-        fGraphicsToCLSyncMode = chooseGraphicsToCLSyncMode(variables.graphicsToCL, abilities);
-        fCLToGraphicsSyncMode = chooseCLToGraphicsSyncMode(variables.clToGraphics, abilities);
+        fGraphicsToCLSyncMode =
+            tellChoice(chooseGraphicsToCLSyncMode(variables.graphicsToCL, abilities));
+        fCLToGraphicsSyncMode =
+            tellChoice(chooseCLToGraphicsSyncMode(variables.clToGraphics, abilities));
     }
 
     if (useGLSharing())

@@ -4,9 +4,8 @@
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBuffer.h"
 #include "buffers/TopenCLDataBufferDescriptor.h"
-#include "host/Profiler.h"
 #include "host/Trace.h"
-#include "interop/SharedBufferMgrBlock.h"
+#include "interop/ProfilerScope.h"
 
 const TuniqueString TopenCLData::sfPositionsName("positions");
 const TuniqueString TopenCLData::sfNormalsName("normals");

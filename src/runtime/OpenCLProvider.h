@@ -2,7 +2,7 @@
 #pragma once
 
 // The class of a platform's vendor, for the rules that differ by vendor.
-enum OpenCLProvider {
+enum OpenCLProvider : int {
     kNVIDIAProvider = 0,  // "NVIDIA Corporation"
     kAMDProvider = 1,     // "Advanced Micro Devices, Inc."
     kIntelProvider = 2,   // "Intel(R) Corporation"

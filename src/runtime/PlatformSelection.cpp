@@ -36,14 +36,14 @@ struct VendorId {
 constexpr std::array<VendorId, 4> kVendorIds = {{
     {0x10DE, kNVIDIAVendor},
     {0x1002, kAMDVendor},
-    {0x3EA, kAMDVendor}, // 1002 written in decimal: some renderers report it so
+    {0x3EA, kAMDVendor}, // 1002 written in decimal
     {0x8086, kIntelVendor},
 }};
 
 bool readPlatformText(cl_platform_id platform, cl_platform_info name, Tstring& text)
 {
     std::vector<char> value;
-    if (!succeeded(queryPlatformInfo(platform, name, value), CLReportStyle::kSetUp))
+    if (!succeeded(queryPlatformInfo(platform, name, value), CLReportStyle::kWithLineBreak))
         return false;
     text = platformText(value);
     return true;
@@ -111,7 +111,8 @@ bool TopenCLInfo::findPlatformByVendor(const Tstring& vendor, cl_platform_id& pl
     if (ocl.clGetPlatformIDs(0, nullptr, &count) != CL_SUCCESS || count == 0)
         return false;
     std::vector<cl_platform_id> platforms(count);
-    if (!succeeded(ocl.clGetPlatformIDs(count, platforms.data(), nullptr), CLReportStyle::kSetUp))
+    if (!succeeded(ocl.clGetPlatformIDs(count, platforms.data(), nullptr),
+                   CLReportStyle::kWithLineBreak))
         return false;
 
     if (sfListPlatforms)

@@ -2,42 +2,24 @@
 
 #include "host/Environment.h"
 
-#include <cstdio>
-
 namespace {
 
-TopenCLInfo::GraphicsToCLSyncMode forcedGraphicsToCLSyncMode(int variable,
-                                                             const SyncAbilities& abilities)
-{
-    if (variable == TopenCLInfo::kGraphicsToCLImplicit && !abilities.glEvent)
-        std::fprintf(
-            stderr,
-            "VYRA_GRAPHICSTOOPENCL_SYNC_MODE=1 (Implicit Graphics to OpenCL synchronization) is "
-            "not supported because cl_khr_gl_event is not supported.  Vyra will run in implicit "
-            "sync mode but expect unstable results.\n");
-    if (variable == TopenCLInfo::kGraphicsToCLExplicit && !abilities.arbSync) {
-        std::fprintf(stderr,
-                     "Overriding VYRA_GRAPHICSTOOPENCL_SYNC_MODE=2 (Explicit Graphics to OpenCL "
-                     "synchronization) because GL_ARB_sync is not supported.  Using glFinish to "
-                     "synchronize.\n");
-        return TopenCLInfo::kGraphicsToCLFinish;
-    }
-    return static_cast<TopenCLInfo::GraphicsToCLSyncMode>(variable);
-}
+using GraphicsToCLChoice = SyncModeChoice<TopenCLInfo::GraphicsToCLSyncMode>;
+using CLToGraphicsChoice = SyncModeChoice<TopenCLInfo::CLToGraphicsSyncMode>;
 
-TopenCLInfo::CLToGraphicsSyncMode forcedCLToGraphicsSyncMode(int variable,
-                                                             const SyncAbilities& abilities)
-{
-    if (variable == TopenCLInfo::kCLToGraphicsImplicit && !abilities.glEvent) {
-        std::fprintf(
-            stderr,
-            "Overriding VYRA_OPENCLTOGRAPHICS_SYNC_MODE=1 (Implicit OpenCL to Graphics "
-            "synchronization) because cl_khr_gl_event is not supported.  Using clGetEventInfo to "
-            "synchronize.\n");
-        return TopenCLInfo::kCLToGraphicsEventQuery;
-    }
-    return static_cast<TopenCLInfo::CLToGraphicsSyncMode>(variable);
-}
+constexpr const char* kImplicitUnstable = "VYRA_GRAPHICSTOOPENCL_SYNC_MODE=1 (Implicit Graphics to "
+                                          "OpenCL synchronization) is not supported "
+                                          "because cl_khr_gl_event is not supported.  Vyra will "
+                                          "run in implicit sync mode but expect unstable "
+                                          "results.\n";
+constexpr const char* kExplicitOverridden =
+    "Overriding VYRA_GRAPHICSTOOPENCL_SYNC_MODE=2 (Explicit Graphics to OpenCL synchronization) "
+    "because "
+    "GL_ARB_sync is not supported.  Using glFinish to synchronize.\n";
+constexpr const char* kImplicitOverridden =
+    "Overriding VYRA_OPENCLTOGRAPHICS_SYNC_MODE=1 (Implicit OpenCL to Graphics synchronization) "
+    "because "
+    "cl_khr_gl_event is not supported.  Using clGetEventInfo to synchronize.\n";
 
 } // namespace
 
@@ -50,25 +32,41 @@ SyncModeVariables readSyncModeVariables()
     return variables;
 }
 
-TopenCLInfo::GraphicsToCLSyncMode chooseGraphicsToCLSyncMode(int variable,
-                                                             const SyncAbilities& abilities)
+GraphicsToCLChoice chooseGraphicsToCLSyncMode(int variable, const SyncAbilities& abilities)
 {
-    if (variable >= TopenCLInfo::kGraphicsToCLImplicit &&
-        variable <= TopenCLInfo::kGraphicsToCLFinish)
-        return forcedGraphicsToCLSyncMode(variable, abilities);
+    switch (variable) {
+    case TopenCLInfo::kGraphicsToCLImplicit:
+        return {TopenCLInfo::kGraphicsToCLImplicit,
+                abilities.glEvent ? nullptr : kImplicitUnstable};
+    case TopenCLInfo::kGraphicsToCLExplicit:
+        if (!abilities.arbSync)
+            return {TopenCLInfo::kGraphicsToCLFinish, kExplicitOverridden};
+        return {TopenCLInfo::kGraphicsToCLExplicit};
+    case TopenCLInfo::kGraphicsToCLFinish:
+        return {TopenCLInfo::kGraphicsToCLFinish};
+    default:
+        break; // automatic
+    }
     if (abilities.glEvent)
-        return TopenCLInfo::kGraphicsToCLImplicit;
-    return abilities.arbSync ? TopenCLInfo::kGraphicsToCLExplicit
-                             : TopenCLInfo::kGraphicsToCLFinish;
+        return {TopenCLInfo::kGraphicsToCLImplicit};
+    return {abilities.arbSync ? TopenCLInfo::kGraphicsToCLExplicit
+                              : TopenCLInfo::kGraphicsToCLFinish};
 }
 
-TopenCLInfo::CLToGraphicsSyncMode chooseCLToGraphicsSyncMode(int variable,
-                                                             const SyncAbilities& abilities)
+CLToGraphicsChoice chooseCLToGraphicsSyncMode(int variable, const SyncAbilities& abilities)
 {
-    if (variable >= TopenCLInfo::kCLToGraphicsImplicit &&
-        variable <= TopenCLInfo::kCLToGraphicsFinish)
-        return forcedCLToGraphicsSyncMode(variable, abilities);
-    return abilities.glEvent && abilities.implicitSyncTrusted
-               ? TopenCLInfo::kCLToGraphicsImplicit
-               : TopenCLInfo::kCLToGraphicsEventQuery;
+    switch (variable) {
+    case TopenCLInfo::kCLToGraphicsImplicit:
+        if (!abilities.glEvent)
+            return {TopenCLInfo::kCLToGraphicsEventQuery, kImplicitOverridden};
+        return {TopenCLInfo::kCLToGraphicsImplicit};
+    case TopenCLInfo::kCLToGraphicsEventQuery:
+    case TopenCLInfo::kCLToGraphicsSyncObject:
+    case TopenCLInfo::kCLToGraphicsFinish:
+        return {static_cast<TopenCLInfo::CLToGraphicsSyncMode>(variable)};
+    default:
+        break; // automatic
+    }
+    const bool implicit = abilities.glEvent && abilities.implicitSyncTrusted;
+    return {implicit ? TopenCLInfo::kCLToGraphicsImplicit : TopenCLInfo::kCLToGraphicsEventQuery};
 }

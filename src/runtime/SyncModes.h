@@ -17,12 +17,19 @@ SyncModeVariables readSyncModeVariables();
 struct SyncAbilities {
     bool glEvent = false;             // the platform lists cl_khr_gl_event
     bool arbSync = false;             // the renderer has GL_ARB_sync
-    bool implicitSyncTrusted = false; // not an NVIDIA driver that is known to release too early
+    bool implicitSyncTrusted = false; // no NVIDIA driver that is too old for it
 };
 
-// The mode for a variable's value and the abilities. Where a forced mode is overridden or
-// unsupported, that is said on standard error.
-TopenCLInfo::GraphicsToCLSyncMode chooseGraphicsToCLSyncMode(int variable,
-                                                             const SyncAbilities& abilities);
-TopenCLInfo::CLToGraphicsSyncMode chooseCLToGraphicsSyncMode(int variable,
-                                                             const SyncAbilities& abilities);
+// A mode, and what the user is told when a forced mode is overridden or unsupported; null when
+// nothing is.
+template <typename Mode>
+struct SyncModeChoice {
+    Mode mode;
+    const char* message = nullptr;
+};
+
+// The mode for a variable's value and the abilities.
+SyncModeChoice<TopenCLInfo::GraphicsToCLSyncMode>
+chooseGraphicsToCLSyncMode(int variable, const SyncAbilities& abilities);
+SyncModeChoice<TopenCLInfo::CLToGraphicsSyncMode>
+chooseCLToGraphicsSyncMode(int variable, const SyncAbilities& abilities);

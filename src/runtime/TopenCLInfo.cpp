@@ -6,7 +6,7 @@
 
 namespace {
 
-// Below these counts the transfer to the device costs more than the CPU takes for the mesh.
+// Vertices.
 constexpr int kMinimumBufferSizeOnNVIDIA = 2000;
 constexpr int kMinimumBufferSizeElsewhere = 500;
 

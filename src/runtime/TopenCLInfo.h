@@ -16,24 +16,24 @@ class TopenCLKernelStore;
 // options.
 //
 // The host calls initialize once, before anything else of the library; the object then lives until
-// the process ends, valid or not. Start-up stops at the first failure and says so on standard
-// error; what it had decided by then stays readable. Everything is read without synchronisation
-// afterwards: only the three set operations write, and they are not to overlap with readers.
+// the process ends, valid or not. Start-up stops at the first failure and says so on standard error
+// where the user can do something about it; failing OpenCL calls are reported as warnings. What it
+// had decided by then stays readable. Everything is read without synchronisation afterwards: only
+// the three set operations write, and they are not to overlap with readers.
 class VYRA_OPENCL_API TopenCLInfo {
 public:
     // How OpenCL waits for the renderer.
-    enum GraphicsToCLSyncMode {
+    enum GraphicsToCLSyncMode : int {
         kGraphicsToCLImplicit = 1, // the sharing extension orders the two
         kGraphicsToCLExplicit = 2, // acquires wait for an OpenGL fence set after drawing
         kGraphicsToCLFinish = 3,   // the host calls glFinish
     };
     // How the renderer waits for OpenCL.
-    enum CLToGraphicsSyncMode {
+    enum CLToGraphicsSyncMode : int {
         kCLToGraphicsImplicit = 1,   // the sharing extension orders the two
         kCLToGraphicsEventQuery = 2, // the host polls the release event
-        kCLToGraphicsSyncObject =
-            3,                   // the OpenGL stream waits for a sync object made from the event
-        kCLToGraphicsFinish = 4, // the host calls clFinish
+        kCLToGraphicsSyncObject = 3, // the OpenGL stream waits for a sync object
+        kCLToGraphicsFinish = 4,     // the host calls clFinish
     };
 
     // Creates the runtime object from the renderer's native window, its OpenGL context (or
@@ -50,8 +50,8 @@ public:
     // Wrap clFinish and clFlush.
     static void finish();
     static void flush();
-    // Whether `event` is done. Null, and an event that cannot be asked, count as done. Wraps
-    // clGetEventInfo.
+    // Whether `event` is done. Null, and an event that cannot be asked, count as done; a command
+    // that ended with an error does not. Wraps clGetEventInfo.
     static bool IsEventComplete(cl_event event);
 
     // Member-wise copies: handles and kernel store are shared, nothing is retained.
@@ -68,6 +68,7 @@ public:
     // Only when start-up got as far as the queues.
     TopenCLKernelStore& kernelStore() const { return *fKernelStore; }
     TopenCLSharedBufferMgr& sharedBufferMgr() { return fSharedBufferMgr; }
+    const TopenCLSharedBufferMgr& sharedBufferMgr() const { return fSharedBufferMgr; }
 
     GraphicsToCLSyncMode graphicsToCLSyncMode() const { return fGraphicsToCLSyncMode; }
     CLToGraphicsSyncMode clToGraphicsSyncMode() const { return fCLToGraphicsSyncMode; }
@@ -96,15 +97,16 @@ public:
     // The least number of vertices for which the host is to deform with OpenCL.
     int minimumBufferSize() const { return fUseMinimumBufferSize ? fMinimumBufferSize : 0; }
     bool useMinimumBufferSize() const { return fUseMinimumBufferSize; }
-    // 2000 on NVIDIA, 500 elsewhere, or VYRA_OPENCL_DEFORMER_MIN_VERTS, which is read on every
-    // call.
+    // 2000 on NVIDIA, 500 elsewhere, or VYRA_OPENCL_DEFORMER_MIN_VERTS, which is read, and said on
+    // standard error, on every call.
     int getDefaultMinimumBufferSize() const;
     // Returns whether the stored value changed. A negative `size` stands for the default.
     bool setMinimumBufferSize(int size);
     bool setUseMinimumBufferSize(bool use);
 
-    // A new in-order queue, whose reference is the caller's; null, reported, when it cannot be
-    // made. The out-parameter may be null and receives false. Wraps clCreateCommandQueue.
+    // A new in-order queue, whose reference is the caller's. Null without a context or a device
+    // and, reported, when a call fails. The out-parameter may be null and receives false. Wraps
+    // clCreateCommandQueue.
     cl_command_queue createOpenCLCommandQueue(bool* usingOutOfOrderExecution);
     // Sizes a one-dimensional launch of `workItemCount` work-items: the kernel's work-group size on
     // the device, and the count rounded up to a multiple of it. Kernels guard the work-items beyond
@@ -116,7 +118,7 @@ public:
     // The host's resource directory, asked for once. The first call must not overlap with another.
     Tstring& getAbsolutePathToResources();
     // Reads a kernel source file, unchanged, behind `preamble`. False when it cannot be read, is
-    // empty, or is 2 GiB or larger. Safe from any thread.
+    // empty, or is 2 GiB or larger; `source` then holds nothing of use. Safe from any thread.
     static bool oclLoadProgSource(Tstring& source, const char* fileName, const char* preamble);
 
 private:
@@ -126,13 +128,12 @@ private:
     void cleanUpOpenCL();
 
     // The steps of start-up; false stops it.
-    bool choosePlatform(unsigned vendorId, cl_platform_id& platform, Tstring& extensions);
     static bool findPlatformByVendor(const Tstring& vendor, cl_platform_id& platform,
                                      Tstring& extensions);
     bool setupDirectXExtensionFunctions(Tstring* extensions);
-    bool chooseDeviceAndContext(void* window, void* graphicsContext, cl_platform_id platform);
     bool decideAsyncReadback();
     bool judgeNVIDIADriver();
+    bool createContext(const cl_context_properties* properties);
     bool setupExtensionFunctions(Tstring* extensions);
     static void finalizeExtensionFunctions();
     bool decideDoublePrecision(cl_platform_id platform);
