@@ -140,6 +140,15 @@ TEST(UniqueString, GivesAllThreadsOneHandleForOneText)
     }
 }
 
+TEST(UniqueString, KeepsTextsOfEqualHashApart)
+{
+    const TuniqueString one("8yn0iYCKYHlIj4-BwPqk");
+    const TuniqueString other("GReLUrM4wMqfg9yzV3KQ");
+    ASSERT_EQ(one.hash(), other.hash());
+    EXPECT_FALSE(one == other);
+    EXPECT_STREQ(other.asChar(), "GReLUrM4wMqfg9yzV3KQ");
+}
+
 TEST(UniqueString, ReadsNullAsTheEmptyText)
 {
     EXPECT_EQ(TuniqueString(nullptr), TuniqueString(""));
