@@ -49,3 +49,20 @@ build_preset() {
     run_quietly "$build_dir/configure.log" cmake --preset "$preset"
     run_quietly "$build_dir/build.log" cmake --build --preset "$preset"
 }
+
+# A display, a GPU to draw with, and an OpenCL runtime that is not the CPU's.
+has_display_and_gpu() {
+    [[ -n ${DISPLAY:-} ]] && compgen -G '/dev/dri/renderD*' >/dev/null &&
+        compgen -G '/etc/OpenCL/vendors/*.icd' | grep -qv pocl
+}
+
+# The viewer, on what this machine has.
+viewer() {
+    local program=$project_dir/build/release/bin/vyra-viewer
+    if has_display_and_gpu; then
+        "$program" "$@"
+    else
+        OPENCL_LAYERS=$project_dir/build/release/lib/libglshare.so \
+            "$project_dir/tests/support/with-display" "$program" "$@"
+    fi
+}
