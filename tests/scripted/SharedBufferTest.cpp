@@ -1,0 +1,235 @@
+// What the shared-buffer manager does beside the rules of its model: creation's odd answers, the
+// host's window, timeouts, profiling, missing abilities, copies.
+#include "ScriptedTest.h"
+#include "host/EvaluationId.h"
+#include "host/GLFunctionTable.h"
+#include "interop/TopenCLSharedBufferMgr.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <memory>
+
+#include <QGuiApplication>
+#include <QOpenGLWindow>
+
+using namespace scripted;
+
+namespace {
+
+const em::Id kId(1);
+
+class SharedBufferTest : public ScriptedTest {
+protected:
+    void startWith(const char* graphicsToCL, const char* clToGraphics)
+    {
+        setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", graphicsToCL);
+        setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", clToGraphics);
+        ASSERT_TRUE(start());
+    }
+    const TopenCLSharedBuffer* create(int expectedStatus = CL_SUCCESS)
+    {
+        unsigned glBuffer = 7;
+        int status = 1;
+        const auto* buffer = manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
+                                                            CL_MEM_WRITE_ONLY, &glBuffer, &status);
+        EXPECT_EQ(status, expectedStatus);
+        return buffer;
+    }
+    void destroy(const TopenCLSharedBuffer* buffer) { manager().DestroySharedCLBuffer(buffer); }
+    // One evaluation of a batch, so that what is left alive is what the manager keeps: the events
+    // of its acquire and release.
+    void expectEventsLeft() { expectLeft({"event#1 x1", "event#2 x1"}); }
+    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+};
+
+TEST_F(SharedBufferTest, AHandleWithAStatusIsReleasedOnce)
+{
+    startWith("1", "1");
+    runtime().plan({.function = "clCreateFromGLBuffer", .status = -60, .withHandle = true});
+    EXPECT_EQ(create(-60), nullptr);
+    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 2, 7) = mem#1 ! -60",
+                              "clReleaseMemObject(mem#1)"}));
+    manager().PreEvaluate(kId); // nothing became of it
+    EXPECT_EQ(calls(), Lines{});
+    manager().PostEvaluate(kId);
+}
+
+TEST_F(SharedBufferTest, NoHandleWithSuccessIsNoBuffer)
+{
+    startWith("1", "1");
+    runtime().scriptNextSharedMem(nullptr);
+    EXPECT_EQ(create(), nullptr);
+    EXPECT_EQ(calls().size(), 1U);
+}
+
+TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
+{
+    startWith("1", "1");
+    const auto* first = create();
+    manager().PreEvaluate(kId);
+    manager().PostEvaluate(kId);
+    ASSERT_TRUE(first->fInBatch);
+    runtime().scriptNextSharedMem(first->fMem.get());
+    EXPECT_EQ(create(), first);
+    EXPECT_TRUE(first->fInBatch);
+    EXPECT_EQ(runtime().references(Kind::kMem, first->fMem.get()), 2U) << "record and batch";
+    destroy(first);
+    expectEventsLeft();
+}
+
+TEST_F(SharedBufferTest, BuffersWithoutMemoryAreRefused)
+{
+    startWith("1", "1");
+    const TopenCLSharedBuffer empty;
+    cl_event event = nullptr;
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue, nullptr, &event), CL_INVALID_ARG_VALUE);
+    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue, &empty, &event), CL_INVALID_ARG_VALUE);
+    EXPECT_EQ(calls(), Lines{});
+}
+
+TEST_F(SharedBufferTest, SingleCommandsPassTheirArgumentsOn)
+{
+    startWith("1", "3");
+    const auto* buffer = create();
+    const cl_mem mem = buffer->fMem.get();
+    const cl_command_queue queue = TopenCLInfo::theOne().secondaryOpenCLCommandQueue();
+    cl_event event = nullptr;
+    manager().EnqueueAcquireSharedCLBuffer(queue, buffer, &event);
+    calls();
+    EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 1, &event, nullptr), 0);
+    EXPECT_EQ(calls(), Lines{"clEnqueueReleaseGLObjects(queue#2, [mem#1], [event#1])"});
+    // A failed release returns its status, and its event is not waited for.
+    cl_event released = event;
+    runtime().plan({.function = "clEnqueueReleaseGLObjects", .status = -36});
+    EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, &released), -36);
+    calls();
+    destroy(buffer);
+    manager().PreEvaluate(kId);
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("gl"), Lines{});
+    ocl.clReleaseEvent(event);
+}
+
+TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
+{
+    startWith("2", "1");
+    setEnvironment("QT_QPA_PLATFORM", "offscreen");
+    int argc = 0;
+    const QGuiApplication application(argc, nullptr);
+    QOpenGLWindow window;
+    host().resourceWindow = &window;
+    const auto* buffer = create();
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    for (const unsigned last : {0x911AU, 0x911CU, 0x911DU}) { // signalled, satisfied, failed
+        manager().RenderingComplete();
+        runtime().scriptClientWaits({0x911B, 0x911B, last});
+        calls();
+        manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+        const Lines waiting = calls();
+        EXPECT_EQ(waiting.size(), 7U);
+        EXPECT_EQ(waiting[0], "resourceWindow()");
+        EXPECT_EQ(waiting[1], "makeCurrent()");
+        EXPECT_THAT(waiting[4], ::testing::MatchesRegex("glClientWaitSync.*, 1, 1000000000."));
+        EXPECT_THAT(waiting[5], ::testing::StartsWith("glDeleteSync"));
+        const cl_mem mem = buffer->fMem.get();
+        manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, nullptr);
+    }
+    manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+    EXPECT_EQ(callsOf("gl"), Lines{}) << "each fence is waited for once";
+    destroy(buffer);
+    host().resourceWindow = nullptr;
+}
+
+struct AbilityRow {
+    const char* name;
+    int functionTable; // -1: none, 0: no sync objects, 1: sync objects, 2: from events, too
+    std::size_t fences;
+    std::size_t graphicsWaits;
+};
+void PrintTo(const AbilityRow& row, std::ostream* out)
+{
+    *out << row.name;
+}
+
+class GraphicsAbilities : public SharedBufferTest,
+                          public ::testing::WithParamInterface<AbilityRow> {};
+
+TEST_P(GraphicsAbilities, OnlyUsableFunctionsAreCalled)
+{
+    startWith("2", "3"); // chosen while everything was usable
+    removeFunctionTable();
+    if (GetParam().functionTable >= 0)
+        installFunctionTable(GetParam().functionTable > 0, GetParam().functionTable != 1);
+    const auto* buffer = create();
+    manager().RenderingComplete();
+    EXPECT_EQ(callsOf("glFenceSync").size(), GetParam().fences);
+    manager().PreEvaluate(kId);
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("glWaitSync").size(), GetParam().graphicsWaits);
+    destroy(buffer);
+    expectEventsLeft();
+}
+INSTANTIATE_TEST_SUITE_P(SharedBuffers, GraphicsAbilities,
+                         ::testing::Values(AbilityRow{"NoTable", -1, 0, 0},
+                                           AbilityRow{"OnlySyncFromEvents", 0, 0, 0},
+                                           AbilityRow{"OnlySyncObjects", 1, 1, 0},
+                                           AbilityRow{"All", 2, 1, 1}),
+                         [](const auto& row) { return std::string(row.param.name); });
+
+TEST_F(SharedBufferTest, ASyncObjectThatCannotBeMadeIsSkipped)
+{
+    startWith("1", "3");
+    const auto* buffer = create();
+    manager().PreEvaluate(kId);
+    runtime().plan({.function = "glCreateSyncFromCLeventARB"});
+    calls();
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("gl").size(), 1U);
+    destroy(buffer);
+    expectEventsLeft();
+}
+
+TEST_F(SharedBufferTest, TheProfilerSeesEveryEvaluationEvenWithoutWork)
+{
+    startWith("1", "1");
+    host().sampling = true;
+    manager().PreEvaluate(kId);
+    manager().PreEvaluate(kId); // open already: the scope all the same
+    manager().PostEvaluate(kId);
+    const std::string acquire =
+        "eventBegin(main, 14, GPUOverrideAcquireQuorSharedBufferBatch, \"\", null, 0)";
+    EXPECT_EQ(calls(),
+              (Lines{acquire, "eventEnd(5)", acquire, "eventEnd(5)",
+                     "eventBegin(main, 14, GPUOverrideReleaseQuorSharedBufferBatch, \"\", null, 0)",
+                     "eventEnd(5)"}));
+}
+
+TEST_F(SharedBufferTest, ACopyHasReferencesOfItsOwnAndAnEmptyList)
+{
+    startWith("1", "1");
+    const auto* buffer = create();
+    manager().PreEvaluate(kId);
+    cl_event handed = nullptr;
+    manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, &handed);
+    manager().EnqueueReleaseBatchedSharedCLBuffer(1, &handed);
+    {
+        const TopenCLSharedBufferMgr copy(manager());
+        EXPECT_EQ(runtime().references(Kind::kMem, buffer->fMem.get()), 4U);
+        // The list of the target pays its references back.
+        TopenCLSharedBufferMgr target;
+        target.EnqueueReleaseBatchedSharedCLBuffer(1, &handed);
+        const unsigned before = runtime().references(Kind::kEvent, handed);
+        target = copy;
+        TopenCLSharedBufferMgr& itself = target;
+        target = itself;
+        EXPECT_EQ(runtime().references(Kind::kEvent, handed), before); // one less, one more
+    }
+    EXPECT_EQ(runtime().references(Kind::kMem, buffer->fMem.get()), 2U);
+    manager().PostEvaluate(kId);
+    destroy(buffer);
+    ocl.clReleaseEvent(handed);
+    expectEventsLeft();
+}
+
+} // namespace
