@@ -21,13 +21,14 @@ constexpr float kFarthest = 4.0f;
 // Each step of framing leaves a fraction of the error: after these nothing is seen of it.
 constexpr int kFramingSteps = 8;
 
-// The smallest distance at which all points, as seen from `middle`, are within the tangents.
-float fittingDistance(const std::vector<QVector3D>& seen, const QVector3D& middle, float tangentX,
+// The smallest distance at which all points, as seen from a camera shifted by `shift`, are within
+// the tangents.
+float fittingDistance(const std::vector<QVector3D>& seen, const QVector3D& shift, float tangentX,
                       float tangentY)
 {
     float distance = 0;
     for (const QVector3D& point : seen) {
-        const QVector3D offset = point - middle;
+        const QVector3D offset = point - shift;
         distance = std::max({distance, point.z() + std::abs(offset.x()) / tangentX,
                              point.z() + std::abs(offset.y()) / tangentY});
     }
@@ -35,12 +36,12 @@ float fittingDistance(const std::vector<QVector3D>& seen, const QVector3D& middl
 }
 
 // How much farther the points reach to the right than to the left, and up than down, as tangents.
-QVector3D imbalance(const std::vector<QVector3D>& seen, const QVector3D& middle, float distance)
+QVector3D imbalance(const std::vector<QVector3D>& seen, const QVector3D& shift, float distance)
 {
     QVector3D most;
     QVector3D least;
     for (const QVector3D& point : seen) {
-        const QVector3D tangent = (point - middle) / (distance - point.z());
+        const QVector3D tangent = (point - shift) / (distance - point.z());
         for (int axis = 0; axis < 2; ++axis) {
             most[axis] = std::max(most[axis], tangent[axis]);
             least[axis] = std::min(least[axis], tangent[axis]);
@@ -92,21 +93,26 @@ QMatrix4x4 Camera::toClip() const
 void Camera::frame(const std::vector<QVector3D>& points, float aspect)
 {
     fAspect = aspect;
-    fTarget = {};
-    const QMatrix4x4 rotation = view();
-    std::vector<QVector3D> seen; // the camera looks along -z
+    QVector3D middle;
     for (const QVector3D& point : points)
-        seen.push_back(rotation.mapVector(point));
+        middle += point / static_cast<float>(points.size());
+    fTarget = middle;
+    const QMatrix4x4 toView = view();
+    const QMatrix4x4 fromView = toView.inverted();
+    // As seen from the middle; the camera looks along -z.
+    std::vector<QVector3D> seen;
+    for (const QVector3D& point : points)
+        seen.push_back(toView.mapVector(point - middle));
 
     const float tangentY = std::tan(qDegreesToRadians(kVerticalFieldOfView / 2)) / kMargin;
-    QVector3D middle;
+    QVector3D shift;
     for (int i = 0; i < kFramingSteps; ++i) {
-        fFittingDistance = fittingDistance(seen, middle, tangentY * fAspect, tangentY);
-        middle += imbalance(seen, middle, fFittingDistance) * fFittingDistance / 2;
+        fFittingDistance = fittingDistance(seen, shift, tangentY * fAspect, tangentY);
+        shift += imbalance(seen, shift, fFittingDistance) * fFittingDistance / 2;
     }
-    fFittingDistance = fittingDistance(seen, middle, tangentY * fAspect, tangentY);
+    fFittingDistance = fittingDistance(seen, shift, tangentY * fAspect, tangentY);
     fDistance = fFittingDistance;
-    fTarget = rotation.transposed().mapVector(middle); // a rotation's inverse
+    fTarget = middle + fromView.mapVector(shift);
 }
 
 } // namespace viewer

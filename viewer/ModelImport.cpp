@@ -252,8 +252,6 @@ Result<Model> importModel(const std::string& name)
 
     Assimp::Importer importer;
     importer.SetPropertyInteger(AI_CONFIG_PP_LBW_MAX_WEIGHTS, static_cast<int>(kBonesPerVertex));
-    importer.SetPropertyInteger(AI_CONFIG_PP_SBP_REMOVE,
-                                aiPrimitiveType_POINT | aiPrimitiveType_LINE);
     const aiScene* scene = importer.ReadFile(*file, kPostProcessing);
     if (!scene || !scene->mRootNode)
         return Failure{ExitCode::kModel, "the model '" + *file + "' cannot be read (" +

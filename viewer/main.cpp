@@ -129,7 +129,9 @@ int main(int argc, char* argv[])
     const bool plays = !options.value().frames;
     QSurfaceFormat::setDefaultFormat(surfaceFormat(plays));
     qInstallMessageHandler(sayThatThereIsNoDisplay);
-    const QGuiApplication application(argc, argv);
+    // Only the program's name: Qt would take --platform for an option of its own.
+    int ownArguments = 1;
+    const QGuiApplication application(ownArguments, argv);
     qInstallMessageHandler(nullptr);
 
     bool verified = true;
