@@ -3,7 +3,10 @@
 #include "core/Counters.h"
 
 #include <cstddef>
+#include <cstdint>
+#include <map>
 #include <memory>
+#include <mutex>
 #include <utility>
 #include <vector>
 
@@ -63,6 +66,39 @@ struct Batch {
 
 using BatchPointer = std::shared_ptr<Batch>;
 
+// The batches whose callback is outstanding, by number: it may come late, or never, and then finds
+// nothing. Safe from any thread.
+class OutstandingBatches {
+public:
+    // Never destroyed, as a callback may come while the process exits.
+    static OutstandingBatches& get()
+    {
+        static auto* const theBatches = new OutstandingBatches;
+        return *theBatches;
+    }
+
+    std::uintptr_t add(const BatchPointer& batch)
+    {
+        const std::scoped_lock lock(mutex_);
+        std::erase_if(batches_, [](const auto& entry) { return entry.second.expired(); });
+        batches_.emplace(++last_, batch);
+        return last_;
+    }
+
+    // Null if the batch is gone.
+    BatchPointer take(std::uintptr_t number)
+    {
+        const std::scoped_lock lock(mutex_);
+        const auto found = batches_.extract(number);
+        return found ? found.mapped().lock() : nullptr;
+    }
+
+private:
+    std::mutex mutex_; // guards the rest
+    std::map<std::uintptr_t, std::weak_ptr<Batch>> batches_;
+    std::uintptr_t last_ = 0;
+};
+
 bool copy(GlDevice& device, const SharedBuffer& buffer, void* mapped, CopyDirection direction)
 {
     return direction == CopyDirection::FromGl ? device.read(buffer.name, mapped, buffer.size)
@@ -94,10 +130,10 @@ void settle(Batch& batch, cl_int status, GlDevice* device)
 }
 
 // Comes on a thread of the runtime's, which must not be kept, nor enter the runtime again.
-void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* user)
+void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* number)
 {
-    const std::unique_ptr<std::weak_ptr<Batch>> owner(static_cast<std::weak_ptr<Batch>*>(user));
-    const BatchPointer batch = owner->lock();
+    const BatchPointer batch =
+        OutstandingBatches::get().take(reinterpret_cast<std::uintptr_t>(number));
     if (batch == nullptr)
         return;
     const std::shared_ptr<SharingContext> context = batch->buffers.front()->context;
@@ -169,15 +205,13 @@ cl_int enqueueRest(cl_command_queue queue, const BatchPointer& batch, cl_event* 
                                                   all.data(), done);
     if (error != CL_SUCCESS)
         return error;
-    auto owner = std::make_unique<std::weak_ptr<Batch>>(batch);
-    error =
-        runtime().clSetEventCallback(*batch->allMapped.data(), CL_COMPLETE, onMapped, owner.get());
-    if (error != CL_SUCCESS) {
+    const std::uintptr_t number = OutstandingBatches::get().add(batch);
+    error = runtime().clSetEventCallback(
+        *batch->allMapped.data(), CL_COMPLETE, onMapped,
+        reinterpret_cast<void*>(number)); // NOLINT(performance-no-int-to-ptr)
+    if (error != CL_SUCCESS)
         runtime().clReleaseEvent(std::exchange(*done, nullptr)); // the caller gets none
-        return error;
-    }
-    static_cast<void>(owner.release()); // onMapped's
-    return CL_SUCCESS;
+    return error;
 }
 
 } // namespace

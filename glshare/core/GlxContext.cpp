@@ -14,6 +14,7 @@
 #include <mutex>
 #include <span>
 #include <utility>
+#include <vector>
 
 namespace glshare {
 
@@ -37,12 +38,16 @@ public:
     // Destroys a context, unless its display is closed or is closing.
     void destroy(Display* display, GLXContext context);
 
+    // For a context that is left behind: remembers it, so that it does not look lost.
+    void keep(GLXContext context);
+
 private:
     // Xlib's hook: runs in XCloseDisplay, before GLX's own, since the newest extension comes first.
     static int closing(Display* display, XExtCodes* codes);
 
-    std::mutex mutex_; // guards listeners_
+    std::mutex mutex_; // guards the rest
     std::map<Display*, std::map<GLXContext, Listener>> listeners_;
+    std::vector<GLXContext> kept_;
 };
 
 OpenDisplays& openDisplays()
@@ -79,6 +84,12 @@ void OpenDisplays::destroy(Display* display, GLXContext context)
     glx().destroyContext(display, context);
 }
 
+void OpenDisplays::keep(GLXContext context)
+{
+    const std::scoped_lock lock(mutex_);
+    kept_.push_back(context);
+}
+
 int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
 {
     OpenDisplays& displays = openDisplays();
@@ -110,7 +121,7 @@ public:
 
     void releaseCurrent() override { glx().makeContextCurrent(display_, None, None, nullptr); }
 
-    void abandon() override { context_ = nullptr; }
+    void abandon() override { openDisplays().keep(std::exchange(context_, nullptr)); }
 
     bool callerHasContext() const override { return glx().getCurrentContext() != nullptr; }
 

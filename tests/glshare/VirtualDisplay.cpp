@@ -60,8 +60,9 @@ void VirtualDisplay::startServer()
     if (server_ == 0) {
         close(ends[0]);
         prctl(PR_SET_PDEATHSIG, SIGKILL);
+        // Without -noreset the server would start over whenever its last client leaves.
         execlp("Xvfb", "Xvfb", "-displayfd", descriptor.c_str(), "-screen", "0", "320x240x24",
-               "-nolisten", "tcp", nullptr);
+               "-nolisten", "tcp", "-noreset", nullptr);
         _exit(1);
     }
     close(ends[1]);
