@@ -133,6 +133,7 @@ void Bench::makeManager(int buffers)
 {
     dropManager();
     manager = std::make_unique<TopenCLSharedBufferMgr>();
+    shared.reserve(4); // so that only the library allocates in an operation
     for (int i = 0; i < buffers; ++i)
         createShared();
 }

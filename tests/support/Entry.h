@@ -106,6 +106,7 @@ private:
     void begin(const char* function, std::initializer_list<std::string> arguments);
     void* createHandle(Kind kind);
 
+    InsideRuntime fInside;
     FakeRuntime& fRuntime = runtime();
     std::scoped_lock<QuietLock> fGuard;
     std::string fLine;

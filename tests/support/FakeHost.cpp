@@ -6,6 +6,7 @@
 #include "host/Profiler.h"
 #include "host/ResourceWindow.h"
 
+#include <sstream>
 #include <string>
 
 #include <QOpenGLWindow>
@@ -13,17 +14,27 @@
 namespace scripted {
 namespace {
 
+// Writes one line: the parts, one after the other.
+template <typename... Parts>
+void log(const Parts&... parts)
+{
+    const InsideRuntime inside;
+    std::ostringstream line;
+    (line << ... << parts);
+    runtime().log(line.str());
+}
+
 class CountingMonitor : public Zyl::Objects::AMemoryMonitor {
 public:
     void AddToDeviceMemory(std::size_t size) override
     {
         fTotal += size;
-        runtime().log("AddToDeviceMemory(" + std::to_string(size) + ")");
+        log("AddToDeviceMemory(", size, ")");
     }
     void ReduceFromDeviceMemory(std::size_t size) override
     {
         fTotal -= size;
-        runtime().log("ReduceFromDeviceMemory(" + std::to_string(size) + ")");
+        log("ReduceFromDeviceMemory(", size, ")");
     }
     std::size_t total() const { return fTotal; }
 
@@ -53,41 +64,42 @@ std::size_t deviceMemory()
 } // namespace scripted
 
 using scripted::host;
+using scripted::log;
 using scripted::runtime;
 
 Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int adapter)
 {
     if (adapter != 0)
-        runtime().log("MemoryMonitor of another adapter");
+        log("MemoryMonitor of another adapter");
     return scripted::monitor();
 }
 
 Tstring TappLocale::getResourcesLocation()
 {
-    runtime().log("getResourcesLocation()");
+    log("getResourcesLocation()");
     return "scripted/resources";
 }
 
 void TresourceGuard::initializeOffset()
 {
-    runtime().log("initializeOffset()");
+    log("initializeOffset()");
 }
 
 GLDisplayProperty glDisplayProperty(void* window)
 {
-    runtime().log("glDisplayProperty(" + runtime().name(window) + ")");
+    log("glDisplayProperty(", runtime().name(window), ")");
     return host().display;
 }
 
 QOpenGLWindow* Q3dPort::resourceWindow()
 {
-    runtime().log("resourceWindow()");
+    log("resourceWindow()");
     return host().resourceWindow;
 }
 
 void QOpenGLWindow::makeCurrent()
 {
-    runtime().log("makeCurrent()");
+    log("makeCurrent()");
 }
 
 bool profiler::samplingActive()
@@ -100,14 +112,13 @@ profiler::EventId profiler::eventBegin(std::uint32_t categoryId, Color color, co
                                        std::uint32_t dataSize)
 {
     const bool isMain = categoryId == categories().main().id();
-    runtime().log("eventBegin(" + std::string(isMain ? "main" : "another category") + ", " +
-                  std::to_string(color) + ", " + name + ", \"" + description + "\", " +
-                  (data ? "data" : "null") + ", " + std::to_string(dataSize) + ")");
+    log("eventBegin(", isMain ? "main" : "another category", ", ", color, ", ", name, ", \"",
+        description, "\", ", data ? "data" : "null", ", ", dataSize, ")");
     constexpr EventId kEvent = 5; // only its way to eventEnd matters
     return kEvent;
 }
 
 void profiler::eventEnd(EventId event)
 {
-    runtime().log("eventEnd(" + std::to_string(event) + ")");
+    log("eventEnd(", event, ")");
 }

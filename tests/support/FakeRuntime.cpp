@@ -67,4 +67,21 @@ FakeRuntime& runtime()
     return theRuntime;
 }
 
+namespace {
+thread_local int callsInside = 0;
+} // namespace
+
+bool insideRuntime()
+{
+    return callsInside > 0;
+}
+InsideRuntime::InsideRuntime()
+{
+    ++callsInside;
+}
+InsideRuntime::~InsideRuntime()
+{
+    --callsInside;
+}
+
 } // namespace scripted

@@ -101,4 +101,16 @@ private:
 // The process's one.
 FakeRuntime& runtime();
 
+// The calling thread is inside the scripted runtime or host: its allocations are not the library's.
+bool insideRuntime();
+
+// Marks the calling thread so, while it lives.
+class InsideRuntime {
+public:
+    InsideRuntime();
+    ~InsideRuntime();
+    InsideRuntime(const InsideRuntime&) = delete;
+    InsideRuntime& operator=(const InsideRuntime&) = delete;
+};
+
 } // namespace scripted

@@ -1,0 +1,207 @@
+// What several threads may do at once. ThreadSanitizer sees the library, not the runtime below it
+// (see QuietLock), so a lock that is missing shows as a race here; the counts show it elsewhere.
+#include "ScriptedTest.h"
+#include "buffers/TopenCLData.h"
+#include "buffers/TopenCLDataBufferPool.h"
+#include "host/EvaluationId.h"
+#include "interop/TopenCLSharedBufferMgr.h"
+#include "kernels/TopenCLKernelStore.h"
+#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <barrier>
+#include <functional>
+#include <thread>
+
+using namespace scripted;
+
+namespace {
+
+constexpr int kThreads = 4;
+constexpr int kRounds = 200;
+
+// Runs `body` on all threads, which begin together; the argument is the thread's number.
+void onThreads(const std::function<void(int)>& body)
+{
+    std::barrier start(kThreads);
+    std::vector<std::jthread> threads;
+    for (int thread = 0; thread < kThreads; ++thread) {
+        threads.emplace_back([&, thread] {
+            start.arrive_and_wait();
+            body(thread);
+        });
+    }
+}
+
+class ThreadTest : public ScriptedTest {
+protected:
+    void startWith(const char* graphicsToCL, const char* clToGraphics)
+    {
+        setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", graphicsToCL);
+        setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", clToGraphics);
+        ASSERT_TRUE(start());
+    }
+    static const TopenCLSharedBuffer* create()
+    {
+        unsigned glBuffer = 7;
+        int status = 0;
+        return manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
+                                              CL_MEM_READ_WRITE, &glBuffer, &status);
+    }
+    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+    static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
+};
+
+TEST_F(ThreadTest, KernelRequestsTakeTurns)
+{
+    startWith("1", "1");
+    TopenCLKernelStore& store = TopenCLInfo::theOne().kernelStore();
+    onThreads([&store](int thread) {
+        const char* const names[] = {"a", "b", "c"};
+        for (int round = 0; round < kRounds; ++round) {
+            const char* name = names[(thread + round) % 3];
+            const auto kernel = store.getKernelFromString("skin", name, "", "skin", nullptr);
+            EXPECT_NE(kernel.get(), nullptr);
+            EXPECT_TRUE(store.freeKernel(kernel));
+        }
+    });
+}
+
+TEST_F(ThreadTest, PoolBuffersAreHandedOutOnceAndTakenBackByAnyone)
+{
+    startWith("1", "1");
+    TopenCLDataBufferPool pool;
+    const TopenCLDataBufferDescriptor descriptor(Tplug(1, 2), TuniqueString("positions"),
+                                                 TopenCLDataBufferDescriptor::kReadWrite, 4, 16, 0);
+    std::vector<cl_mem> taken[kThreads];
+    onThreads([&](int thread) {
+        for (int round = 0; round < kRounds; ++round)
+            taken[thread].push_back(pool.createBuffer(descriptor).buffer().get());
+    });
+    std::set<cl_mem> distinct;
+    for (const auto& list : taken)
+        distinct.insert(list.begin(), list.end());
+    EXPECT_EQ(distinct.size(), std::size_t{kThreads * kRounds});
+
+    onThreads([&](int) {
+        for (int round = 0; round < kRounds; ++round) {
+            EXPECT_NE(pool.createBuffer(descriptor).buffer().get(), nullptr);
+            pool.releaseBuffers();
+        }
+    });
+}
+
+TEST_F(ThreadTest, TheDataMapIsFilledAndReadAtOnce)
+{
+    startWith("1", "1");
+    TopenCLData data;
+    onThreads([&data](int thread) {
+        const TuniqueString name("positions");
+        for (int round = 0; round < kRounds; ++round) {
+            const Tplug own(static_cast<std::uint64_t>(thread), static_cast<std::uint64_t>(round));
+            data.setData(name, own, TopenCLDataBuffer(own, name, {}, 4, 1, 4));
+            EXPECT_EQ(data.getData(name, own).descriptor().capacityInBytes(), 4U);
+            data.getData(name, Tplug(static_cast<std::uint64_t>(kThreads), 0));
+            data.getSinglePlug();
+        }
+    });
+    EXPECT_EQ(std::distance(data.begin(), data.end()), kThreads * kRounds);
+}
+
+TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
+{
+    startWith("1", "3");
+    const auto* batched = create();
+    manager().PreEvaluate(em::Id(1));
+    std::vector<const TopenCLSharedBuffer*> alone(kThreads);
+    for (auto& buffer : alone)
+        buffer = create();
+    calls();
+    onThreads([&](int thread) {
+        const TopenCLSharedBuffer* own = alone[static_cast<std::size_t>(thread)];
+        const cl_mem mem = own->fMem.get();
+        std::vector<AutoCLObject<cl_event>> kept(2 * kRounds);
+        for (int round = 0; round < kRounds; ++round) {
+            cl_event acquired = nullptr;
+            manager().EnqueueAcquireSharedCLBuffer(queue(), batched, &acquired);
+            manager().EnqueueReleaseBatchedSharedCLBuffer(1, &acquired);
+            ocl.clReleaseEvent(acquired);
+            manager().EnqueueAcquireSharedCLBuffer(queue(), own, nullptr);
+            manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, nullptr);
+        }
+    });
+    calls();
+    manager().PostEvaluate(em::Id(1));
+    const Lines released = callsOf("clReleaseEvent(event#1)");
+    EXPECT_EQ(released.size(), std::size_t{kThreads * kRounds + 1});
+    manager().DestroySharedCLBuffer(batched);
+    for (const auto* buffer : alone)
+        manager().DestroySharedCLBuffer(buffer);
+    expectLeft({"event#1 x1", "event#2 x1"});
+}
+
+TEST_F(ThreadTest, SingleReleasesAreAllRecordedForTheRenderer)
+{
+    startWith("1", "3");
+    std::vector<const TopenCLSharedBuffer*> alone(kThreads);
+    for (auto& buffer : alone)
+        buffer = create();
+    std::vector<AutoCLObject<cl_event>> kept(kThreads);
+    onThreads([&](int thread) {
+        const auto index = static_cast<std::size_t>(thread);
+        const cl_mem mem = alone[index]->fMem.get();
+        manager().EnqueueAcquireSharedCLBuffer(queue(), alone[index], nullptr);
+        manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, kept[index].receive());
+    });
+    calls();
+    manager().PostEvaluate(em::Id(1));
+    EXPECT_EQ(callsOf("glWaitSync").size(), std::size_t{kThreads});
+    for (const auto* buffer : alone)
+        manager().DestroyBatchedSharedCLBuffer(buffer);
+}
+
+TEST_F(ThreadTest, SharedBuffersComeAndGoAtOnce)
+{
+    startWith("1", "1");
+    onThreads([](int thread) {
+        for (int round = 0; round < kRounds; ++round) {
+            const auto* buffer = create();
+            ASSERT_NE(buffer, nullptr);
+            if ((thread + round) % 2)
+                EXPECT_EQ(manager().DestroySharedCLBuffer(buffer), 0);
+            else
+                EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(buffer), 0);
+        }
+    });
+}
+
+TEST_F(ThreadTest, OneThreadWaitsForTheFenceAndNobodyOvertakesIt)
+{
+    startWith("2", "1");
+    std::vector<const TopenCLSharedBuffer*> buffers(kThreads);
+    for (auto& buffer : buffers)
+        buffer = create();
+    for (int round = 0; round < kRounds; ++round) {
+        manager().RenderingComplete();
+        runtime().scriptClientWaits(std::deque<unsigned>(20, 0x911B)); // a long wait
+        calls();
+        onThreads([&](int thread) {
+            manager().EnqueueAcquireSharedCLBuffer(
+                queue(), buffers[static_cast<std::size_t>(thread)], nullptr);
+        });
+        Lines lines = calls();
+        std::erase(lines, "resourceWindow()");
+        // 21 waits, one deletion, and only then the acquires.
+        ASSERT_EQ(lines.size(), std::size_t{22 + kThreads});
+        EXPECT_THAT(lines[20], ::testing::StartsWith("glClientWaitSync"));
+        EXPECT_THAT(lines[21], ::testing::StartsWith("glDeleteSync"));
+        for (const auto* buffer : buffers) {
+            const cl_mem mem = buffer->fMem.get();
+            manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, nullptr);
+        }
+    }
+    for (const auto* buffer : buffers)
+        manager().DestroySharedCLBuffer(buffer);
+}
+
+} // namespace
