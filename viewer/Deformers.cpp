@@ -80,6 +80,7 @@ cl_int SkinDeformer::evaluate(const std::vector<MatrixRows>& bones, WorkerQueue&
     const cl_int uploaded = fBones.write(worker.queue(), bones.data(), bones.size(), lastUse);
     if (uploaded != CL_SUCCESS)
         return uploaded;
+    worker.trace("Upload bones", fBones.buffer().bufferReadyEvent());
     Flow flow = connect(data, fPlugs, worker);
     if (!flow.complete())
         return CL_MEM_OBJECT_ALLOCATION_FAILURE;
@@ -92,9 +93,11 @@ cl_int SkinDeformer::evaluate(const std::vector<MatrixRows>& bones, WorkerQueue&
                         flow.inPositions.buffer().get(), flow.inNormals.buffer().get(),
                         fBoneIndices.memory(), fBoneWeights.memory(), fBones.memory(),
                         flow.outPositions.buffer().get(), flow.outNormals.buffer().get());
-    if (status == CL_SUCCESS)
-        publish(flow, fPlugs, done, data);
-    return status;
+    if (status != CL_SUCCESS)
+        return status;
+    worker.trace("skin", done);
+    publish(flow, fPlugs, done, data);
+    return CL_SUCCESS;
 }
 
 TwistDeformer::TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs,
@@ -125,6 +128,8 @@ cl_int TwistDeformer::evaluate(const MeshPose& pose, WorkerQueue& worker,
     const cl_int uploaded = uploadMatrices(pose, worker.queue(), lastUse, data);
     if (uploaded != CL_SUCCESS)
         return uploaded;
+    worker.trace("Upload matrix", fGeometryMatrix.buffer().bufferReadyEvent());
+    worker.trace("Upload matrix", fInverseGeometryMatrix.buffer().bufferReadyEvent());
     Flow flow = connect(data, fPlugs, worker);
     if (!flow.complete())
         return CL_MEM_OBJECT_ALLOCATION_FAILURE;
@@ -138,9 +143,11 @@ cl_int TwistDeformer::evaluate(const MeshPose& pose, WorkerQueue& worker,
                         flow.inPositions.buffer().get(), flow.inNormals.buffer().get(),
                         fGeometryMatrix.memory(), fInverseGeometryMatrix.memory(), pose.twist,
                         flow.outPositions.buffer().get(), flow.outNormals.buffer().get());
-    if (status == CL_SUCCESS)
-        publish(flow, fPlugs, done, data);
-    return status;
+    if (status != CL_SUCCESS)
+        return status;
+    worker.trace("twist", done);
+    publish(flow, fPlugs, done, data);
+    return CL_SUCCESS;
 }
 
 } // namespace viewer

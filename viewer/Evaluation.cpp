@@ -184,6 +184,7 @@ void Evaluation::renderingComplete()
     TopenCLInfo::theOne().sharedBufferMgr().RenderingComplete();
     // A fence that nobody flushes may never be signalled.
     fGL.glFlush();
+    fWorkers.recordCommands();
 }
 
 void Evaluation::waitForSingles()

@@ -97,9 +97,11 @@ cl_int MeshEvaluator::enqueueWrite(const TuniqueString& name, const VertexBuffer
     waits.add(source.bufferReadyEvent());
     const std::size_t bytes =
         std::size_t{source.descriptor().elementSizeInBytes()} * source.descriptor().elementCount();
-    return fCL.clEnqueueCopyBuffer(worker.queue(), source.buffer().get(),
-                                   target.shared()->fMem.get(), 0, 0, bytes, waits.size(),
-                                   waits.array(), written.receive());
+    const cl_int copied =
+        fCL.clEnqueueCopyBuffer(worker.queue(), source.buffer().get(), target.shared()->fMem.get(),
+                                0, 0, bytes, waits.size(), waits.array(), written.receive());
+    worker.trace("Write vertices", written);
+    return copied;
 }
 
 void MeshEvaluator::handOver(const VertexBuffer& target, const AutoCLObject<cl_event>& written,

@@ -25,6 +25,7 @@ bool resolveAll(QLibrary& library, OpenCLFunctions& cl)
            resolve(library, "clSetKernelArg", cl.clSetKernelArg) &&
            resolve(library, "clEnqueueNDRangeKernel", cl.clEnqueueNDRangeKernel) &&
            resolve(library, "clEnqueueCopyBuffer", cl.clEnqueueCopyBuffer) &&
+           resolve(library, "clEnqueueMarkerWithWaitList", cl.clEnqueueMarkerWithWaitList) &&
            resolve(library, "clGetEventProfilingInfo", cl.clGetEventProfilingInfo) &&
            resolve(library, "clWaitForEvents", cl.clWaitForEvents) &&
            resolve(library, "clFlush", cl.clFlush) && resolve(library, "clFinish", cl.clFinish);

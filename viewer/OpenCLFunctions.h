@@ -19,6 +19,7 @@ struct OpenCLFunctions {
     decltype(&::clSetKernelArg) clSetKernelArg = nullptr;
     decltype(&::clEnqueueNDRangeKernel) clEnqueueNDRangeKernel = nullptr;
     decltype(&::clEnqueueCopyBuffer) clEnqueueCopyBuffer = nullptr;
+    decltype(&::clEnqueueMarkerWithWaitList) clEnqueueMarkerWithWaitList = nullptr;
     decltype(&::clGetEventProfilingInfo) clGetEventProfilingInfo = nullptr;
     decltype(&::clWaitForEvents) clWaitForEvents = nullptr;
     decltype(&::clFlush) clFlush = nullptr;

@@ -17,22 +17,35 @@ constexpr float kDegreesPerPixel = 0.4f;
 // Qt counts eighths of a degree, and a notch of a usual wheel is 15 degrees.
 constexpr float kUnitsPerNotch = 120.0f;
 
+// A window whose context cannot be made ends the process, so this is asked first.
+bool openGLIsUsable()
+{
+    QOpenGLContext context;
+    return context.create() &&
+           context.format().version() >= QSurfaceFormat::defaultFormat().version();
+}
+
+Status noOpenGL()
+{
+    return Failure{ExitCode::kNoGraphics, "there is no OpenGL 3.3 on this display; install a "
+                                          "graphics driver, or Mesa's software renderer"};
+}
+
 } // namespace
 
 Status ViewerWindow::open(const QSize& size)
 {
+    if (!openGLIsUsable())
+        return noOpenGL();
     setTitle("vyra-viewer");
     resize(size);
     show();
     QElapsedTimer timer;
     timer.start();
-    while (!isValid() && timer.elapsed() < kOpenTimeoutMs)
+    while (!isValid() && !isExposed() && timer.elapsed() < kOpenTimeoutMs)
         QGuiApplication::processEvents(QEventLoop::WaitForMoreEvents | QEventLoop::AllEvents,
                                        kEventSliceMs);
-    if (isValid())
-        return {};
-    return Failure{ExitCode::kNoGraphics, "no OpenGL context can be made on this display; install "
-                                          "a graphics driver, or Mesa's software renderer"};
+    return isValid() ? Status{} : noOpenGL();
 }
 
 void ViewerWindow::play(Session& session)

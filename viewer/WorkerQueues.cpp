@@ -1,10 +1,31 @@
 #include "viewer/WorkerQueues.h"
 
+#include "host/Profiler.h"
 #include "runtime/TopenCLInfo.h"
+
+#include <string>
+#include <utility>
 
 namespace viewer {
 
-WorkerQueue::WorkerQueue(const OpenCLFunctions& cl, cl_command_queue queue) : fCL(cl), fQueue(queue)
+namespace {
+
+// A queue of the library's own kind; while the profiler samples, one that notes when its commands
+// run.
+cl_command_queue createQueue(const OpenCLFunctions& cl)
+{
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    if (!profiler::samplingActive())
+        return info.createOpenCLCommandQueue(nullptr);
+    return cl.clCreateCommandQueue(info.openCLContext(), info.openCLDevice(),
+                                   CL_QUEUE_PROFILING_ENABLE, nullptr);
+}
+
+} // namespace
+
+WorkerQueue::WorkerQueue(const OpenCLFunctions& cl, cl_command_queue queue,
+                         std::unique_ptr<CommandTimeline> timeline)
+    : fCL(cl), fQueue(queue), fTimeline(std::move(timeline))
 {
 }
 
@@ -25,17 +46,46 @@ TopenCLDataBuffer WorkerQueue::createOutputBuffer(const TopenCLDataBuffer& input
     return output;
 }
 
+void WorkerQueue::trace(const char* name, const AutoCLObject<cl_event>& event)
+{
+    if (fTimeline)
+        fTimeline->add(name, event);
+}
+
+void WorkerQueue::recordCommands()
+{
+    if (fTimeline)
+        fTimeline->record();
+}
+
 WorkerQueues::WorkerQueues(const OpenCLFunctions& cl)
 {
     fArena.initialize();
     for (int i = 0; i < fArena.max_concurrency(); ++i) {
-        cl_command_queue queue = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);
-        if (!queue) {
+        if (!addQueue(cl)) {
             fQueues.clear();
             return;
         }
-        fQueues.push_back(std::make_unique<WorkerQueue>(cl, queue));
     }
+}
+
+bool WorkerQueues::addQueue(const OpenCLFunctions& cl)
+{
+    cl_command_queue queue = createQueue(cl);
+    if (!queue)
+        return false;
+    std::unique_ptr<CommandTimeline> timeline;
+    if (profiler::samplingActive())
+        timeline = std::make_unique<CommandTimeline>(
+            cl, queue, "OpenCL queue " + std::to_string(fQueues.size() + 1));
+    fQueues.push_back(std::make_unique<WorkerQueue>(cl, queue, std::move(timeline)));
+    return true;
+}
+
+void WorkerQueues::recordCommands()
+{
+    for (const auto& worker : fQueues)
+        worker->recordCommands();
 }
 
 WorkerQueue& WorkerQueues::forThisThread()

@@ -2,9 +2,9 @@
 #pragma once
 
 #include "buffers/TopenCLDataBufferPool.h"
+#include "viewer/CommandTimeline.h"
 #include "viewer/OpenCLFunctions.h"
 
-#include <atomic>
 #include <memory>
 #include <unordered_set>
 #include <vector>
@@ -21,7 +21,9 @@ namespace viewer {
 // at a time uses an object.
 class WorkerQueue {
 public:
-    WorkerQueue(const OpenCLFunctions& cl, cl_command_queue queue); // takes over the queue
+    // Takes over the queue. `timeline` shows its commands, or is null.
+    WorkerQueue(const OpenCLFunctions& cl, cl_command_queue queue,
+                std::unique_ptr<CommandTimeline> timeline);
     ~WorkerQueue();
     WorkerQueue(const WorkerQueue&) = delete;
     WorkerQueue& operator=(const WorkerQueue&) = delete;
@@ -32,6 +34,11 @@ public:
     TopenCLDataBuffer createOutputBuffer(const TopenCLDataBuffer& input, const Tplug& plug);
     void releaseBuffers() { fPool.releaseBuffers(); }
 
+    // Notes a command of this queue for the trace, if there is one. `name` is borrowed until
+    // recordCommands(), which waits for the commands.
+    void trace(const char* name, const AutoCLObject<cl_event>& event);
+    void recordCommands();
+
     // Of the buffers from the pool: those with memory that it made, and those it had already.
     std::size_t buffersCreated() const { return fSeen.size(); }
     std::size_t buffersReused() const { return fReused; }
@@ -40,6 +47,7 @@ private:
     const OpenCLFunctions& fCL;
     cl_command_queue fQueue;
     TopenCLDataBufferPool fPool;
+    std::unique_ptr<CommandTimeline> fTimeline;
     std::unordered_set<cl_mem> fSeen; // the pool keeps all of them alive
     std::size_t fReused = 0;
 };
@@ -48,6 +56,9 @@ private:
 class WorkerQueues {
 public:
     explicit WorkerQueues(const OpenCLFunctions& cl);
+
+    // Waits for all commands and puts them on the host's timeline, where that is sampled.
+    void recordCommands();
 
     // Every thread that works in this arena has a queue.
     tbb::task_arena& arena() { return fArena; }
@@ -58,6 +69,8 @@ public:
     const std::vector<std::unique_ptr<WorkerQueue>>& all() const { return fQueues; }
 
 private:
+    bool addQueue(const OpenCLFunctions& cl);
+
     tbb::task_arena fArena;
     std::vector<std::unique_ptr<WorkerQueue>> fQueues; // by the thread's index in the arena
 };

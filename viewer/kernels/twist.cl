@@ -42,8 +42,8 @@ kernel void twist(const uint vertexCount, global const float* positions,
     normal.y -= twistPerHeight * (point.z * normal.x - point.x * normal.z);
 
     const float angle = twistPerHeight * point.y;
-    const float c = cos(angle);
-    const float s = sin(angle);
+    float c;
+    const float s = sincos(angle, &c);
     vstore3(transformPoint(inverseGeometryMatrix, turn(point, c, s)), vertexId, twistedPositions);
     vstore3(unitLength(transformTransposed(geometryMatrix, turn(normal, c, s))), vertexId,
             twistedNormals);
