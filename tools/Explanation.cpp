@@ -1,0 +1,45 @@
+#include "tools/Explanation.h"
+
+#include "tools/Words.h"
+
+#include <utility>
+
+namespace info {
+namespace {
+
+ExitCode exitCodeOf(const Explanation& explanation)
+{
+    if (explanation.stop)
+        return explanation.stop->step == Step::kRenderer ? ExitCode::kNoGraphics : ExitCode::kOff;
+    const std::optional<SelfTest>& test = explanation.facts.selfTest;
+    return test && test->passed ? ExitCode::kOn : ExitCode::kSelfTestFailed;
+}
+
+std::string summaryOf(const Explanation& explanation)
+{
+    if (explanation.stop)
+        return std::string("OpenCL is off: ") + stepName(explanation.stop->step).failure + ".";
+    const Platform* platform = chosenPlatform(explanation.facts);
+    const Device* device = chosenDevice(explanation.facts);
+    const std::string where = (device ? " on " + device->name : "") +
+                              (platform ? ", platform " + quoted(platform->name) : "");
+    return explanation.exitCode == ExitCode::kOn
+               ? "OpenCL is on" + where + ", and the self-test is right."
+               : "OpenCL is on" + where + ", but the self-test failed.";
+}
+
+} // namespace
+
+Explanation explain(Facts facts)
+{
+    Explanation explanation;
+    explanation.facts = std::move(facts);
+    explanation.stop = findStop(explanation.facts);
+    explanation.decisions = explainDecisions(explanation.facts);
+    explanation.variables = explainVariables(explanation.facts);
+    explanation.exitCode = exitCodeOf(explanation);
+    explanation.summary = summaryOf(explanation);
+    return explanation;
+}
+
+} // namespace info

@@ -1,0 +1,28 @@
+#include "tools/OpenCLCalls.h"
+
+#include "loader/SharedLibrary.h"
+
+namespace info {
+namespace {
+
+template <typename Function>
+void resolve(void* library, const char* name, Function& function)
+{
+    function = reinterpret_cast<Function>(findSymbol(library, name));
+}
+
+} // namespace
+
+OpenCLCalls findOpenCLCalls()
+{
+    OpenCLCalls calls;
+    void* library = openSharedLibrary("libOpenCL.so.1");
+    if (!library)
+        return calls;
+    resolve(library, "clGetDeviceIDs", calls.clGetDeviceIDs);
+    resolve(library, "clSetKernelArg", calls.clSetKernelArg);
+    resolve(library, "clEnqueueNDRangeKernel", calls.clEnqueueNDRangeKernel);
+    return calls;
+}
+
+} // namespace info

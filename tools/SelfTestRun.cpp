@@ -1,0 +1,104 @@
+#include "tools/SelfTestRun.h"
+
+#include "kernels/TopenCLKernelStore.h"
+#include "tools/RenderWindow.h"
+#include "tools/SelfTestEvaluation.h"
+#include "tools/WarningLog.h"
+
+#include <algorithm>
+
+#include <QFile>
+#include <QOpenGLExtraFunctions>
+
+namespace info {
+namespace {
+
+constexpr std::size_t kVertices = 10000; // a character's face; above every default minimum
+constexpr std::size_t kFloats = kVertices * 3;
+// Enough for a median; the whole test stays well under a second on a processor.
+constexpr int kEvaluations = 15;
+
+double median(std::vector<double> values)
+{
+    const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
+    std::nth_element(values.begin(), middle, values.end());
+    return *middle;
+}
+
+AutoCLObject<cl_kernel> buildKernel(double& milliseconds)
+{
+    QFile file(":/kernels/self_test.cl");
+    if (!file.open(QIODevice::ReadOnly))
+        return {};
+    const QByteArray source = file.readAll();
+    const Stopwatch stopwatch;
+    AutoCLObject<cl_kernel> kernel = TopenCLInfo::theOne().kernelStore().getKernelFromString(
+        source.constData(), "self_test.cl", nullptr, "deform", nullptr);
+    milliseconds = stopwatch.milliseconds();
+    return kernel;
+}
+
+// The evaluations run free, as a host's do, and then once more with a wait behind each stage, so
+// that the stages can be told apart.
+void runEvaluations(SelfTestEvaluation& evaluation, SelfTest& test)
+{
+    std::vector<double> whole, acquire, kernel, release, read;
+    for (int index = 0; index < 2 * kEvaluations; ++index) {
+        const bool inStages = index >= kEvaluations;
+        const EvaluationTimes times = evaluation.run(index, inStages);
+        if (!evaluation.problem().empty())
+            break;
+        ++test.evaluations;
+        read.push_back(times.read);
+        if (inStages) {
+            acquire.push_back(times.acquire);
+            kernel.push_back(times.kernel);
+            release.push_back(times.release);
+        } else {
+            whole.push_back(times.whole);
+        }
+    }
+    test.problem = evaluation.problem();
+    test.status = evaluation.status();
+    if (!test.problem.empty())
+        return;
+    test.passed = true;
+    test.times.firstEvaluation = whole.front();
+    test.times.evaluation = median(whole);
+    test.times.acquire = median(acquire);
+    test.times.kernel = median(kernel);
+    test.times.release = median(release);
+    test.times.read = median(read);
+}
+
+void runWithKernel(RenderWindow& window, const AutoCLObject<cl_kernel>& kernel, SelfTest& test)
+{
+    SharedVertices vertices(*window.context().extraFunctions(), kFloats);
+    if (!vertices.record()) {
+        test.problem = "OpenCL refuses to share a vertex buffer";
+        test.status = vertices.status();
+        return;
+    }
+    SelfTestEvaluation evaluation(vertices, kernel.get(), kFloats);
+    runEvaluations(evaluation, test);
+    TopenCLInfo::finish();
+}
+
+} // namespace
+
+SelfTest runSelfTest(RenderWindow& window, WarningLog& warnings)
+{
+    SelfTest test;
+    test.vertices = kVertices;
+    const AutoCLObject<cl_kernel> kernel = buildKernel(test.times.kernelBuild);
+    if (kernel.get()) {
+        runWithKernel(window, kernel, test);
+        TopenCLInfo::theOne().kernelStore().freeKernel(kernel);
+    } else {
+        test.problem = "the kernel cannot be built; the warnings hold the build log";
+    }
+    test.warnings = warnings.take();
+    return test;
+}
+
+} // namespace info
