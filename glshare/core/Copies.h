@@ -2,13 +2,11 @@
 // GL side.
 #pragma once
 
-#include "core/SharingContext.h"
+#include "core/CopyBatch.h"
 
 #include <span>
 
 namespace glshare {
-
-enum class CopyDirection { FromGl, ToGl };
 
 // Enqueues the copies of `buffers`, which is not empty and of one context, after `waitList` and in
 // the order of `queue`. Never waits. On success `done` gets an event, owned by the caller, that

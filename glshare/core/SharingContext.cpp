@@ -32,4 +32,10 @@ bool SharingContext::setAcquired(const SharedBuffers& buffers, bool acquired)
     return true;
 }
 
+void SharingContext::keep(std::shared_ptr<const void> thing)
+{
+    const std::scoped_lock lock(mutex_);
+    kept_.push_back(std::move(thing));
+}
+
 } // namespace glshare

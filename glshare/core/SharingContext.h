@@ -33,11 +33,15 @@ public:
     // them is so already, or stands in the list twice.
     [[nodiscard]] bool setAcquired(const SharedBuffers& buffers, bool acquired);
 
+    // Keeps something as long as the context.
+    void keep(std::shared_ptr<const void> thing);
+
 private:
     std::unique_ptr<GlWorker> worker_;
     ContextProperties properties_;
     bool canUseHostMemory_;
-    std::mutex mutex_; // guards SharedBuffer::isAcquired
+    std::mutex mutex_; // guards SharedBuffer::isAcquired and the following
+    std::vector<std::shared_ptr<const void>> kept_;
 };
 
 } // namespace glshare

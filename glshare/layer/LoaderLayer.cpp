@@ -44,11 +44,15 @@ extern "C" {
                                                               const cl_icd_dispatch** table)
 {
     static cl_icd_dispatch theTable;
-    if (below == nullptr || countNeeded == nullptr || table == nullptr || count < kFunctions)
+    // A second initialisation would put this layer on top of itself, which never ends.
+    static bool isInitialised = false;
+    if (isInitialised || below == nullptr || countNeeded == nullptr || table == nullptr ||
+        count < kFunctions)
         return CL_INVALID_VALUE;
     theTable = *below;
     glshare::setRuntime(*below);
     glshare::installEntryPoints(theTable);
+    isInitialised = true;
     *countNeeded = kFunctions;
     *table = &theTable;
     return CL_SUCCESS;

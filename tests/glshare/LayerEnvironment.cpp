@@ -7,9 +7,16 @@
 
 // AddressSanitizer asks this in builds that have it. Freed memory that it keeps back in large
 // amounts would look like a leak to the test that watches the size of the process.
-extern "C" const char* __asan_default_options()
+extern "C" [[gnu::visibility("default")]] const char* __asan_default_options()
 {
     return "quarantine_size_mb=16";
+}
+
+// ThreadSanitizer asks this. The runtime and the OpenGL driver are not built for it, so that it
+// cannot see how they synchronise.
+extern "C" [[gnu::visibility("default")]] const char* __tsan_default_suppressions()
+{
+    return "deadlock:libpocl\nrace:libpocl\nrace:swrast_dri\n";
 }
 
 int main(int argc, char** argv)
