@@ -6,6 +6,8 @@
 #include "buffers/TopenCLBuffer.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
+#include "host/EvaluationId.h"
+#include "interop/GraphicsSync.h"
 #include "interop/TopenCLSharedBufferMgr.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
@@ -22,37 +24,150 @@ public:
     Bench() = default;
     Bench(const Bench&) = delete;
     Bench& operator=(const Bench&) = delete;
-    ~Bench();
+    ~Bench()
+    {
+        dropManager();
+        for (cl_command_queue queue : fQueues)
+            clReleaseCommandQueue(queue);
+    }
 
     // A buffer with a mapping, and with a pending write where asked.
-    void makeBuffer(std::size_t bytes, bool pending = false);
-    int upload(std::size_t offset, std::size_t size);
-    int readBack();
-    int wrap(); // a buffer around the buffer's data, and copies of it
+    void makeBuffer(std::size_t bytes, bool pending = false)
+    {
+        buffer.reset();
+        buffer.emplace(info().openCLContext(), CL_MEM_ALLOC_HOST_PTR | CL_MEM_HOST_WRITE_ONLY);
+        buffer->ensureBufferCapacity(bytes);
+        if (pending)
+            upload(0, 1);
+    }
+    int upload(std::size_t offset, std::size_t size)
+    {
+        return buffer->uploadDataToGPU(queue(), CL_FALSE, offset, size, fBytes.data(), 0, nullptr);
+    }
+    int readBack()
+    {
+        return buffer->readBackDataFromGPU(queue(), CL_FALSE, 0, 8, fBytes.data(), 0, nullptr);
+    }
+    int wrap() // a buffer around the buffer's data, and copies of it
+    {
+        TopenCLBuffer wrapped(info().openCLContext(), 1, buffer->openCLDataBuffer());
+        TopenCLBuffer copy(wrapped);
+        copy = *buffer;
+        return int{copy.buffer().get() == buffer->buffer().get()};
+    }
+    int eventComplete()
+    {
+        return int{TopenCLInfo::IsEventComplete(buffer->bufferReadyEvent().get())};
+    }
 
     // A pool with one free buffer; none where `bytes` is 0.
-    void makePool(unsigned bytes);
-    int fromPool(unsigned bytes); // 1: with memory
-    int output();
-    int mapTwice(); // a map, its copy and an overwrite
+    void makePool(unsigned bytes)
+    {
+        data = {};
+        pool.emplace();
+        if (bytes == 0)
+            return;
+        data = pool->createBuffer(describe(bytes));
+        pool->releaseBuffers();
+    }
+    int fromPool(unsigned bytes)
+    {
+        return int{pool->createBuffer(describe(bytes)).buffer().get() != nullptr};
+    }
+    int output()
+    {
+        return int{pool->createOutputBuffer(data, Tplug()).buffer().get() == data.buffer().get()};
+    }
+    int mapTwice() // a map, its copy and an overwrite
+    {
+        TopenCLData map;
+        map.setData(TopenCLData::sPositionsName(), Tplug(), data);
+        TopenCLData copy(map);
+        copy.setData(TopenCLData::sPositionsName(), Tplug(), TopenCLDataBuffer::fsNULL);
+        copy = map;
+        return int{copy.empty()};
+    }
 
-    void makeStore();
-    int getKernel(); // 1: a kernel, kept
-    int workGroupSizes();
-    int makeQueue(); // 1: a queue
+    void makeStore()
+    {
+        kernel.reset();
+        store = std::make_unique<TopenCLKernelStore>();
+        store->initialize(info().openCLContext(), info().openCLDevice(), kIntelProvider);
+    }
+    int getKernel()
+    {
+        kernel = store->getKernelFromString("skin", "program", "", "skin", nullptr);
+        return int{kernel.get() != nullptr};
+    }
+    int workGroupSizes()
+    {
+        std::size_t global = 0;
+        std::size_t local = 0;
+        return info().getWorkGroupSizes(kernel.get(), 100, global, local);
+    }
+    int makeQueue()
+    {
+        const cl_command_queue made = info().createOpenCLCommandQueue(nullptr);
+        if (made)
+            fQueues.push_back(made);
+        return int{made != nullptr};
+    }
 
     // A manager with as many buffers.
-    void makeManager(int buffers);
-    int createShared(); // 1: a record, kept
-    int destroy();      // the first
-    int leaveBatch();
-    int open();
-    int close();
+    void makeManager(int buffers)
+    {
+        dropManager();
+        manager = std::make_unique<TopenCLSharedBufferMgr>();
+        shared.reserve(4); // so that only the library allocates in an operation
+        for (int i = 0; i < buffers; ++i)
+            createShared();
+    }
+    int createShared()
+    {
+        unsigned glBuffer = 7;
+        int status = CL_SUCCESS;
+        const auto* record =
+            manager->CreateSharedCLBuffer(info().openCLContext(), 1, &glBuffer, &status);
+        if (record)
+            shared.push_back(record);
+        return int{record != nullptr};
+    }
+    int destroy() { return manager->DestroySharedCLBuffer(takeFirst()); }
+    int leaveBatch() { return manager->DestroyBatchedSharedCLBuffer(takeFirst()); }
+    int open()
+    {
+        manager->PreEvaluate(em::Id(1));
+        return 0;
+    }
+    int close()
+    {
+        manager->PostEvaluate(em::Id(1));
+        return 0;
+    }
     int evaluate() { return open() + close(); }
-    int acquire();
-    int release();
-    int handOver();
-    int copyManager();
+    int acquire()
+    {
+        return manager->EnqueueAcquireSharedCLBuffer(queue(), shared.front(),
+                                                     fEvents.emplace_back().receive());
+    }
+    int release()
+    {
+        const cl_mem mem = shared.front()->fMem.get();
+        return manager->EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr,
+                                                     fEvents.emplace_back().receive());
+    }
+    int handOver()
+    {
+        const cl_event event = fEvents.back().get();
+        return int{*manager->EnqueueReleaseBatchedSharedCLBuffer(1, &event) != nullptr};
+    }
+    int copyManager()
+    {
+        const TopenCLSharedBufferMgr copy(*manager);
+        TopenCLSharedBufferMgr assigned;
+        assigned = copy;
+        return 0;
+    }
 
     std::optional<TopenCLBuffer> buffer;
     std::optional<TopenCLDataBufferPool> pool;
@@ -63,7 +178,34 @@ public:
     std::vector<const TopenCLSharedBuffer*> shared;
 
 private:
-    void dropManager();
+    static TopenCLInfo& info() { return TopenCLInfo::theOne(); }
+    static cl_command_queue queue() { return info().openCLCommandQueue(); }
+    static TopenCLDataBufferDescriptor describe(unsigned bytes)
+    {
+        return {Tplug(),
+                TopenCLData::sPositionsName(),
+                TopenCLDataBufferDescriptor::kReadWrite,
+                1,
+                bytes,
+                0};
+    }
+    const TopenCLSharedBuffer* takeFirst()
+    {
+        const auto* record = shared.front();
+        shared.erase(shared.begin());
+        return record;
+    }
+    // An evaluation that is open is closed, and the fence waited for: both outlive the manager.
+    void dropManager()
+    {
+        if (!manager)
+            return;
+        close();
+        manager.reset();
+        shared.clear();
+        fEvents.clear();
+        WaitForGraphicsFence();
+    }
 
     std::vector<AutoCLObject<cl_event>> fEvents;
     std::vector<cl_command_queue> fQueues;

@@ -140,312 +140,79 @@ const std::string kCreate = "clCreateBuffer";
 const std::string kMap = "clEnqueueMapBuffer";
 const std::string kWait = "clWaitForEvents";
 const std::string kWrite = "clEnqueueWriteBuffer";
-const std::string kAcquireGL = "clEnqueueAcquireGLObjects";
-const std::string kReleaseGL = "clEnqueueReleaseGLObjects";
-const std::string kNoMemory = kWrite + ": null";
-const std::string kNotAcquired = kReleaseGL + ": not acquired";
-const std::string kAlreadyAcquired = kAcquireGL + ": already acquired";
-
-const Row kBufferRows[] = {
-    {"EnsureEmpty",
-     [](Bench& b) { b.makeBuffer(0); },
-     [](Bench& b) { return b.buffer->ensureBufferCapacity(64); },
-     {{kCreate, kTheStatus}, {kMap, kTheStatus}},
-     {{kCreate, 0}, {kMap, 0}},
-     {},
-     true},
-    {"EnsureGrows",
-     [](Bench& b) { b.makeBuffer(64); },
-     [](Bench& b) { return b.buffer->ensureBufferCapacity(65); },
-     {{kCreate, kTheStatus}, {kMap, kTheStatus}},
-     {{kCreate, 0}, {kMap, 0}},
-     {},
-     true},
-    {"EnsurePending",
-     [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) { return b.buffer->ensureBufferCapacity(64); },
-     {{kWait, kTheStatus}},
-     {},
-     {}},
-    {"UploadFitting",
-     [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) { return b.upload(0, 64); },
-     {{kWrite, kTheStatus}},
-     {{kWrite, 0}},
-     {}},
-    {"UploadGrowsAtTheStart",
-     [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) { return b.upload(0, 65); },
-     {{kCreate, kTheStatus}},
-     {{kCreate, 0}},
-     {},
-     true},
-    {"UploadGrowsElsewhere",
-     [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) { return b.upload(8, 64); },
-     {{kCreate, CL_INVALID_MEM_OBJECT}, {kWrite, kTheStatus}},
-     {{kCreate, 2}},
-     {kNoMemory},
-     true},
-    {"ReadBack",
-     [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) { return b.readBack(); },
-     {{"clEnqueueReadBuffer", kTheStatus}},
-     {{"clEnqueueReadBuffer", 0}},
-     {}},
-    {"Reset",
-     [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) {
-         b.buffer->reset();
-         return static_cast<int>(b.buffer->capacityInBytes());
-     },
-     {},
-     {},
-     {},
-     true},
-    {"WrapAndCopy", [](Bench& b) { b.makeBuffer(64, true); }, [](Bench& b) { return b.wrap(); }},
-    {"PoolCreates",
-     [](Bench& b) { b.makePool(0); },
-     [](Bench& b) { return b.fromPool(64); },
-     {{kCreate, 0}},
-     {{kCreate, 0}},
-     {}},
-    {"PoolReuses",
-     [](Bench& b) { b.makePool(64); },
-     [](Bench& b) { return b.fromPool(64); },
-     {},
-     {},
-     {},
-     true},
-    {"PoolTakesBack",
-     [](Bench& b) {
-         b.makePool(64);
-         b.fromPool(64);
-     },
-     [](Bench& b) {
-         b.pool->releaseBuffers();
-         return 0;
-     },
-     {},
-     {},
-     {},
-     true},
-    {"PoolOutputInPlace", [](Bench& b) { b.makePool(64); }, [](Bench& b) { return b.output(); }},
-    {"DataMap", [](Bench& b) { b.makePool(64); }, [](Bench& b) { return b.mapTwice(); }},
-};
-INSTANTIATE_TEST_SUITE_P(Buffers, FaultSweep, ::testing::ValuesIn(kBufferRows),
-                         ::testing::PrintToStringParamName());
-
+const std::string kRead = "clEnqueueReadBuffer";
+const std::string kProgram = "clCreateProgramWithSource";
 const std::string kBuild = "clBuildProgram";
-const std::string kMakeKernel = "clCreateKernel";
-
-const Row kRuntimeRows[] = {
-    {"KernelBuilt",
-     [](Bench& b) { b.makeStore(); },
-     [](Bench& b) { return b.getKernel(); },
-     {{"clCreateProgramWithSource", 0},
-      {kBuild, 0},
-      {"clGetProgramBuildInfo", 0},
-      {kMakeKernel, 0}},
-     {{kBuild, 2}, {"clGetProgramBuildInfo", 2}},
-     {}},
-    {"KernelFromTheCache",
-     [](Bench& b) {
-         b.makeStore();
-         b.getKernel();
-     },
-     [](Bench& b) { return b.getKernel(); },
-     {{kMakeKernel, 0}},
-     {},
-     {}},
-    {"KernelGivenBack",
-     [](Bench& b) {
-         b.makeStore();
-         b.getKernel();
-     },
-     [](Bench& b) { return static_cast<int>(b.store->freeKernel(b.kernel)); },
-     {},
-     {},
-     {},
-     true},
-    {"StoreGoes",
-     [](Bench& b) {
-         b.makeStore();
-         b.getKernel();
-     },
-     [](Bench& b) {
-         b.store.reset();
-         return 0;
-     },
-     {},
-     {},
-     {},
-     true},
-    {"WorkGroupSizes",
-     [](Bench& b) {
-         b.makeStore();
-         b.getKernel();
-     },
-     [](Bench& b) { return b.workGroupSizes(); },
-     {{"clGetKernelWorkGroupInfo", kTheStatus}},
-     {},
-     {}},
-    {"EventQuery", [](Bench& b) { b.makeBuffer(64, true); },
-     [](Bench& b) {
-         return static_cast<int>(TopenCLInfo::IsEventComplete(b.buffer->bufferReadyEvent().get()));
-     }},
-    {"FinishAndFlush",
-     [](Bench&) {},
-     [](Bench&) {
-         TopenCLInfo::finish();
-         TopenCLInfo::flush();
-         return 0;
-     },
-     {},
-     {{"clFinish", 0}, {"clFlush", 0}},
-     {}},
-    {"Queue",
-     [](Bench&) {},
-     [](Bench& b) { return b.makeQueue(); },
-     {{"clGetDeviceInfo", 0}, {"clCreateCommandQueue", 0}},
-     {},
-     {}},
-};
-INSTANTIATE_TEST_SUITE_P(Runtime, FaultSweep, ::testing::ValuesIn(kRuntimeRows),
-                         ::testing::PrintToStringParamName());
-
+const std::string kBuilt = "clGetProgramBuildInfo";
+const std::string kKernel = "clCreateKernel";
+const std::string kGroups = "clGetKernelWorkGroupInfo";
 const std::string kFromGL = "clCreateFromGLBuffer";
-const std::set<std::string> kAfterFailedAcquire = {kNotAcquired};
-const std::set<std::string> kAfterFailedRelease = {kAlreadyAcquired, kNotAcquired};
+const std::string kAcquire = "clEnqueueAcquireGLObjects";
+const std::string kRelease = "clEnqueueReleaseGLObjects";
+const std::string kRetainEvent = "clRetainEvent";
+const std::string kNoMemory = kWrite + ": null";
+const std::set<std::string> kNotAcquired = {kRelease + ": not acquired"};
+const std::set<std::string> kNotReleased = {kAcquire + ": already acquired",
+                                            kRelease + ": not acquired"};
+using B = Bench;
 
-const Row kSharedRows[] = {
-    {"Create",
-     [](Bench& b) { b.makeManager(0); },
-     [](Bench& b) { return b.createShared(); },
-     {{kFromGL, 0}},
-     {{kFromGL, 0}},
-     {}},
-    {"DestroyAlone",
-     [](Bench& b) { b.makeManager(2); },
-     [](Bench& b) { return b.destroy(); },
-     {},
-     {},
-     {},
-     true},
-    {"DestroyBatched",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.evaluate();
-     },
-     [](Bench& b) { return b.destroy(); },
-     {{kWait, kTheStatus}},
-     {},
-     {},
-     true},
-    {"DestroyAcquired",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.open();
-     },
-     [](Bench& b) { return b.destroy(); },
-     {},
-     {},
-     {},
-     true},
-    {"LeaveTheBatch",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.evaluate();
-     },
-     [](Bench& b) { return b.leaveBatch(); },
-     {},
-     {},
-     {},
-     true},
-    {"LeaveTheAcquiredBatch",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.open();
-     },
-     [](Bench& b) { return b.leaveBatch(); },
-     {},
-     {},
-     kAfterFailedRelease,
-     true},
-    {"PreEvaluate",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.manager->RenderingComplete();
-     },
-     [](Bench& b) { return b.open(); },
-     {},
-     {{"clRetainEvent", 0}},
-     kAfterFailedAcquire,
-     true},
-    {"AcquireBatched",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.open();
-     },
-     [](Bench& b) { return b.acquire(); },
-     {},
-     {{"clRetainEvent", 0}},
-     {}},
-    {"AcquireAlone",
-     [](Bench& b) {
-         b.makeManager(1);
-         b.manager->RenderingComplete();
-     },
-     [](Bench& b) { return b.acquire(); },
-     {{kAcquireGL, kTheStatus}},
-     {{kAcquireGL, 0}},
-     {},
-     true},
-    {"ReleaseAlone",
-     [](Bench& b) {
-         b.makeManager(1);
-         b.acquire();
-     },
-     [](Bench& b) { return b.release(); },
-     {{kReleaseGL, kTheStatus}},
-     {{kReleaseGL, 0}},
-     {},
-     true},
-    {"HandOver",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.open();
-         b.acquire();
-     },
-     [](Bench& b) { return b.handOver(); }},
-    {"PostEvaluate",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.open();
-         b.createShared();
-     },
-     [](Bench& b) { return b.close(); },
-     {},
-     {},
-     kAfterFailedRelease,
-     true},
-    {"RenderingComplete",
-     [](Bench& b) {
-         b.makeManager(1);
-         b.manager->RenderingComplete();
-     },
-     [](Bench& b) {
-         b.manager->RenderingComplete();
-         return 0;
-     }},
-    {"Copy",
-     [](Bench& b) {
-         b.makeManager(2);
-         b.open();
-     },
-     [](Bench& b) { return b.copyManager(); }},
+// A row is a sentence, not a column.
+// clang-format off
+const Row kBufferRows[] = {
+    {"EnsureEmpty", [](B& b) { b.makeBuffer(0); }, [](B& b) { return b.buffer->ensureBufferCapacity(64); },
+     {{kCreate, kTheStatus}, {kMap, kTheStatus}}, {{kCreate, 0}, {kMap, 0}}, {}, true},
+    {"EnsureGrows", [](B& b) { b.makeBuffer(64); }, [](B& b) { return b.buffer->ensureBufferCapacity(65); },
+     {{kCreate, kTheStatus}, {kMap, kTheStatus}}, {{kCreate, 0}, {kMap, 0}}, {}, true},
+    {"EnsurePending", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.buffer->ensureBufferCapacity(64); }, {{kWait, kTheStatus}}},
+    {"UploadFitting", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.upload(0, 64); }, {{kWrite, kTheStatus}}, {{kWrite, 0}}},
+    {"UploadGrowsAtTheStart", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.upload(0, 65); },
+     {{kCreate, kTheStatus}}, {{kCreate, 0}}, {}, true},
+    {"UploadGrowsElsewhere", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.upload(8, 64); },
+     {{kCreate, CL_INVALID_MEM_OBJECT}, {kWrite, kTheStatus}}, {{kCreate, 2}}, {kNoMemory}, true},
+    {"ReadBack", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.readBack(); }, {{kRead, kTheStatus}}, {{kRead, 0}}},
+    {"Reset", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { b.buffer->reset(); return 0; }, {}, {}, {}, true},
+    {"WrapAndCopy", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.wrap(); }},
+    {"PoolCreates", [](B& b) { b.makePool(0); }, [](B& b) { return b.fromPool(64); }, {{kCreate, 0}}, {{kCreate, 0}}},
+    {"PoolReuses", [](B& b) { b.makePool(64); }, [](B& b) { return b.fromPool(64); }, {}, {}, {}, true},
+    {"PoolTakesBack", [](B& b) { b.makePool(64); b.fromPool(64); }, [](B& b) { b.pool->releaseBuffers(); return 0; }, {}, {}, {}, true},
+    {"PoolOutputInPlace", [](B& b) { b.makePool(64); }, [](B& b) { return b.output(); }},
+    {"DataMap", [](B& b) { b.makePool(64); }, [](B& b) { return b.mapTwice(); }},
 };
-INSTANTIATE_TEST_SUITE_P(Shared, FaultSweep, ::testing::ValuesIn(kSharedRows),
-                         ::testing::PrintToStringParamName());
+const Row kRuntimeRows[] = {
+    {"KernelBuilt", [](B& b) { b.makeStore(); }, [](B& b) { return b.getKernel(); },
+     {{kProgram, 0}, {kBuild, 0}, {kBuilt, 0}, {kKernel, 0}}, {{kBuild, 2}, {kBuilt, 2}}},
+    {"KernelFromTheCache", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return b.getKernel(); }, {{kKernel, 0}}},
+    {"KernelGivenBack", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return int{b.store->freeKernel(b.kernel)}; }, {}, {}, {}, true},
+    {"StoreGoes", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { b.store.reset(); return 0; }, {}, {}, {}, true},
+    {"WorkGroupSizes", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return b.workGroupSizes(); }, {{kGroups, kTheStatus}}},
+    {"EventQuery", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.eventComplete(); }},
+    {"FinishAndFlush", [](B&) {}, [](B&) { TopenCLInfo::finish(); TopenCLInfo::flush(); return 0; }, {}, {{"clFinish", 0}, {"clFlush", 0}}},
+    {"Queue", [](B&) {}, [](B& b) { return b.makeQueue(); }, {{"clGetDeviceInfo", 0}, {"clCreateCommandQueue", 0}}},
+};
+const Row kSharedRows[] = {
+    {"Create", [](B& b) { b.makeManager(0); }, [](B& b) { return b.createShared(); }, {{kFromGL, 0}}, {{kFromGL, 0}}},
+    {"DestroyAlone", [](B& b) { b.makeManager(2); }, [](B& b) { return b.destroy(); }, {}, {}, {}, true},
+    {"DestroyBatched", [](B& b) { b.makeManager(2); b.evaluate(); }, [](B& b) { return b.destroy(); }, {{kWait, kTheStatus}}, {}, {}, true},
+    {"DestroyAcquired", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.destroy(); }, {}, {}, {}, true},
+    {"LeaveTheBatch", [](B& b) { b.makeManager(2); b.evaluate(); }, [](B& b) { return b.leaveBatch(); }, {}, {}, {}, true},
+    {"LeaveTheAcquiredBatch", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.leaveBatch(); }, {}, {}, kNotReleased, true},
+    {"PreEvaluate", [](B& b) { b.makeManager(2); b.manager->RenderingComplete(); }, [](B& b) { return b.open(); },
+     {}, {{kRetainEvent, 0}}, kNotAcquired, true},
+    {"AcquireBatched", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.acquire(); }, {}, {{kRetainEvent, 0}}},
+    {"AcquireAlone", [](B& b) { b.makeManager(1); b.manager->RenderingComplete(); }, [](B& b) { return b.acquire(); },
+     {{kAcquire, kTheStatus}}, {{kAcquire, 0}}, {}, true},
+    {"ReleaseAlone", [](B& b) { b.makeManager(1); b.acquire(); }, [](B& b) { return b.release(); },
+     {{kRelease, kTheStatus}}, {{kRelease, 0}}, {}, true},
+    {"HandOver", [](B& b) { b.makeManager(2); b.open(); b.acquire(); }, [](B& b) { return b.handOver(); }},
+    {"PostEvaluate", [](B& b) { b.makeManager(2); b.open(); b.createShared(); }, [](B& b) { return b.close(); }, {}, {}, kNotReleased, true},
+    {"RenderingComplete", [](B& b) { b.makeManager(1); b.manager->RenderingComplete(); }, [](B& b) { b.manager->RenderingComplete(); return 0; }},
+    {"Copy", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.copyManager(); }},
+};
+// clang-format on
+
+const auto kName = ::testing::PrintToStringParamName();
+INSTANTIATE_TEST_SUITE_P(Buffers, FaultSweep, ::testing::ValuesIn(kBufferRows), kName);
+INSTANTIATE_TEST_SUITE_P(Runtime, FaultSweep, ::testing::ValuesIn(kRuntimeRows), kName);
+INSTANTIATE_TEST_SUITE_P(Shared, FaultSweep, ::testing::ValuesIn(kSharedRows), kName);
 
 } // namespace

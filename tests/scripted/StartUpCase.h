@@ -5,6 +5,7 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <functional>
+#include <optional>
 #include <ostream>
 #include <utility>
 
@@ -16,10 +17,9 @@ struct StartUp {
     std::vector<std::pair<const char*, const char*>> environment;
     std::vector<Fault> faults;
 
-    std::string error;  // on standard error; preset to the text of a start-up without incident
-    std::string output; // on standard output
+    std::optional<std::string> error; // on standard error; else that of a start-up without incident
+    std::string output;               // on standard output
     Lines warnings;
-    Lines misuse;
     bool valid = true;
     OpenCLProvider provider = kIntelProvider;
     int minimumBufferSize = 500;
@@ -29,9 +29,15 @@ struct StartUp {
     std::pair<int, int> modes{1, 1}; // graphics to OpenCL, OpenCL to graphics
     Lines left{"context#1 x1", "queue#1 x1", "queue#2 x1"};
 
-    // The texts of the steps so far, for a start-up that goes on or stops there.
-    std::string platformText(const std::string& vendor) const;
-    std::string deviceText(const std::string& name = "Scripted GPU") const;
+    PlatformScript& platform() { return world.platforms[0]; }
+    DeviceScript& firstDevice() { return world.platforms[0].devices[0]; }
+    // The platform is another vendor's.
+    void onVendor(const char* vendor, OpenCLProvider expectedProvider, unsigned id);
+    void onNVIDIA(const char* driver);
+
+    // What is printed as far as the platform, and all of it.
+    std::string platformText() const;
+    std::string wholeText() const;
 
     // Start-up stops, having printed `text` last, before it has chosen a platform, a device, or
     // after it has made the context. Later steps' answers keep their initial values.
@@ -56,11 +62,17 @@ protected:
     void run(const StartUp& expected);
 };
 
+// A table of start-ups.
+class StartUpRows : public StartUpTest, public ::testing::WithParamInterface<StartUpRow> {};
+
 // The listing of all platforms, with the line of the one that is taken.
 std::string listing(const World& world, std::size_t taken);
 
 inline constexpr std::size_t kNoPlatform = 64; // more than any world has
 inline const std::string kAttempt = "OpenCL evaluator is attempting to initialize OpenCL.\n";
+inline const std::string kIntel = "Intel(R) Corporation";
+inline const std::string kNamed = "Choosing OpenCL Device Scripted GPU.  ";
+inline const std::string kReported = kNamed + "Device Type: GPU  Device is available.\n";
 inline const std::string kOutOfResources = "OpenCL error: CL_OUT_OF_RESOURCES\n";
 
 inline std::string rowName(const ::testing::TestParamInfo<StartUpRow>& info)

@@ -2,280 +2,115 @@
 // queues, compute units.
 #include "StartUpCase.h"
 
+#include <sstream>
+
 using namespace scripted;
 
 namespace {
 
 const std::string kNoGPU =
     "OpenCL evaluator is unable to find a GPU device that can share VBOs with OpenGL.\n";
-const std::string kNoGLFunctions =
-    "Error: found cl_khr_gl_sharing but failed to get function pointers";
-const std::string kNoDouble =
-    "Vyra OpenCL is not supported on device because double precision is not supported.\n";
-const std::string kDriverRange =
-    "\nOpenCL is not supported by NVidia drivers between version 361.91 and 368.86.  To enabled "
-    "OpenCL for this driver version set VYRA_OPENCL_IGNORE_DRIVER_VERSION=1.\n";
+const std::string kNoGL = "Error: found cl_khr_gl_sharing but failed to get function pointers";
 
-// Three devices that share with OpenGL; the driving one is left to the row.
-void threeDevices(StartUp& c, cl_device_type first, cl_device_type second, cl_device_type third)
+// Three devices that share with OpenGL, driven by one of them or by none (-1); the device expected.
+void threeDevices(StartUp& c, const cl_device_type (&types)[3], int current, const char* device)
 {
-    c.world.platforms[0].devices = {{.type = first}, {.type = second}, {.type = third}};
+    c.platform().devices = {{.type = types[0]}, {.type = types[1]}, {.type = types[2]}};
     c.world.glDevices = {0, 1, 2};
+    c.world.currentGLDevice.reset();
+    if (current >= 0)
+        c.world.currentGLDevice = static_cast<std::size_t>(current);
+    c.device = device;
 }
 
-void missesGL(StartUp& c, const char* function)
-{
-    c.world.missing = {function};
-    c.stopsWithContext(kNoGLFunctions);
-}
-
-// A failing query of the device report, which stops after `printed`.
-void reportStops(StartUp& c, unsigned nthDeviceQuery, const std::string& printed)
-{
-    c.fails("clGetDeviceInfo", nthDeviceQuery);
-    c.stopsWithContext(printed);
-}
-
-void onNVIDIA(StartUp& c, const char* driver)
-{
-    c.arguments.vendorId = 0x10DE;
-    c.world.platforms[0].vendor = "NVIDIA Corporation";
-    c.world.platforms[0].devices[0].driverVersion = driver;
-    c.error = c.platformText("NVIDIA Corporation") + c.deviceText();
-}
-
-// The creations of the primary queue fail with these statuses, the last attempt's one stays.
-void primaryQueueFails(StartUp& c, cl_int status, unsigned attempts, const char* name)
+// The primary queue cannot be made; the attempts fail with this status.
+void primaryQueueFails(StartUp& c, cl_int status, unsigned attempts, const std::string& name)
 {
     for (unsigned nth = 1; nth <= attempts; ++nth)
         c.faults.push_back({.function = "clCreateCommandQueue", .status = status, .nth = nth});
-    c.warnings = {std::string("OpenCL error: ") + name + "\n"};
+    c.warnings = {"OpenCL error: " + name + "\n"};
     c.valid = false;
     c.left = {"context#1 x1", "queue#1 x1"};
 }
 
+// A row is a sentence, not a column.
+// clang-format off
 const StartUpRow kDeviceRows[] = {
-    {"CurrentDeviceOfTheList",
-     [](StartUp& c) {
-         threeDevices(c, 4, 4, 4);
-         c.world.currentGLDevice = 1;
-         c.device = "device#2";
-     }},
-    {"CurrentDeviceOutsideTheList",
-     [](StartUp& c) {
-         threeDevices(c, 2, 4, 4);
-         c.world.glDevices = {0, 1};
-         c.world.currentGLDevice = 2;
-         c.device = "device#2";
-     }},
-    {"NoCurrentDevice",
-     [](StartUp& c) {
-         threeDevices(c, 2, 8, 4);
-         c.world.currentGLDevice.reset();
-         c.device = "device#3";
-     }},
-    {"CurrentDeviceNoGPU",
-     [](StartUp& c) {
-         threeDevices(c, 2, 4, 4);
-         c.device = "device#2";
-     }},
-    {"DefaultGPUIsNoGPU",
-     [](StartUp& c) {
-         threeDevices(c, 5, 2, 5);
-         c.stopsBeforeDevice(kNoGPU);
-     }},
-    {"NoDeviceShares",
-     [](StartUp& c) {
-         c.world.glDevices.clear();
-         c.stopsBeforeDevice(kNoGPU);
-     }},
-    {"UnwrittenDeviceTypeIsNoGPU",
-     [](StartUp& c) {
-         c.world.emptyAnswers = {CL_DEVICE_TYPE};
-         c.stopsBeforeDevice(kNoGPU);
-     }},
-    {"UnwrittenDevicesAreNone",
-     [](StartUp& c) {
-         c.world.emptyAnswers = {0x2007, 0x2006};
-         c.stopsBeforeDevice(kNoGPU);
-     }},
-    {"GLContextQueryMissing",
-     [](StartUp& c) {
-         c.world.missing = {"clGetGLContextInfoKHR"};
-         c.stopsBeforeDevice(kNoGPU);
-     }},
-    {"GLDevicesFail",
-     [](StartUp& c) {
-         c.fails("clGetGLContextInfoKHR", 1);
-         c.stopsBeforeDevice("");
-     }},
-    {"CurrentGLDeviceFails",
-     [](StartUp& c) {
-         c.fails("clGetGLContextInfoKHR", 2);
-         c.stopsBeforeDevice("");
-     }},
-    {"TypeOfCurrentDeviceFails",
-     [](StartUp& c) {
-         c.fails("clGetDeviceInfo", 1);
-         c.stopsBeforeDevice("");
-     }},
-    {"TypeOfListedDeviceFails",
-     [](StartUp& c) {
-         c.world.currentGLDevice.reset();
-         c.fails("clGetDeviceInfo", 1);
-         c.stopsBeforeDevice("");
-     }},
-    {"ContextFails",
-     [](StartUp& c) {
-         c.fails("clCreateContext");
-         c.stopsWithContext("");
-         c.modes = {3, 4};
-         c.left = {};
-     }},
-    {"CreateFromGLMissing", [](StartUp& c) { missesGL(c, "clCreateFromGLBuffer"); }},
-    {"AcquireGLMissing", [](StartUp& c) { missesGL(c, "clEnqueueAcquireGLObjects"); }},
-    {"ReleaseGLMissing", [](StartUp& c) { missesGL(c, "clEnqueueReleaseGLObjects"); }},
-    {"DeviceNameFails", [](StartUp& c) { reportStops(c, 2, ""); }},
-    {"DeviceTypeFails",
-     [](StartUp& c) { reportStops(c, 3, "Choosing OpenCL Device Scripted GPU.  "); }},
-    {"AvailabilityFails",
-     [](StartUp& c) {
-         reportStops(c, 4, "Choosing OpenCL Device Scripted GPU.  Device Type: GPU  ");
-     }},
-    {"DeviceUnavailable",
-     [](StartUp& c) {
-         c.world.platforms[0].devices[0].available = false;
-         c.stopsWithContext("Choosing OpenCL Device Scripted GPU.  Device Type: GPU  GL shared "
-                            "device is not available, no OpenCL will be used\n");
-     }},
-    {"PlatformVersionFails",
-     [](StartUp& c) {
-         c.fails("clGetPlatformInfo", 9);
-         c.stopsWithContext(
-             "Choosing OpenCL Device Scripted GPU.  Device Type: GPU  Device is available.\n");
-     }},
-    {"DoublePrecisionFails",
-     [](StartUp& c) {
-         c.fails("clGetDeviceInfo", 5);
-         c.stopsWithContext(
-             "Choosing OpenCL Device Scripted GPU.  Device Type: GPU  Device is available.\n");
-     }},
-    {"DoubleByExtensionOn11",
-     [](StartUp& c) {
-         c.world.platforms[0].version = "OpenCL 1.1 scripted";
-         c.world.platforms[0].extensions += " cl_khr_fp64";
-         c.world.platforms[0].devices[0].doublePrecision = 0;
-         c.error = c.platformText("Intel(R) Corporation") + c.deviceText();
-     }},
-    {"NoDoubleByExtensionOn10",
-     [](StartUp& c) {
-         c.world.platforms[0].version = "OpenCL 1.0";
-         c.error = c.platformText("Intel(R) Corporation") + c.deviceText();
-         c.doublePrecision = false;
-     }},
-    {"ExtensionFailsOn10AndCountsAsNone",
-     [](StartUp& c) {
-         c.world.platforms[0].version = "OpenCL 1.0";
-         c.world.platforms[0].extensions += " cl_khr_fp64";
+    {"CurrentDeviceOfTheList", [](StartUp& c) { threeDevices(c, {4, 4, 4}, 1, "device#2"); }},
+    {"CurrentDeviceOutsideTheList", [](StartUp& c) { threeDevices(c, {2, 4, 4}, 2, "device#2"); c.world.glDevices = {0, 1}; }},
+    {"NoCurrentDevice", [](StartUp& c) { threeDevices(c, {2, 8, 4}, -1, "device#3"); }},
+    {"CurrentDeviceNoGPU", [](StartUp& c) { threeDevices(c, {2, 4, 4}, 0, "device#2"); }},
+    {"DefaultGPUIsNoGPU", [](StartUp& c) { threeDevices(c, {5, 2, 5}, 0, ""); c.stopsBeforeDevice(kNoGPU); }},
+    {"NoDeviceShares", [](StartUp& c) { c.world.glDevices.clear(); c.stopsBeforeDevice(kNoGPU); }},
+    {"UnwrittenTypeIsNoGPU", [](StartUp& c) { c.world.emptyAnswers = {CL_DEVICE_TYPE}; c.stopsBeforeDevice(kNoGPU); }},
+    {"UnwrittenDevicesAreNone", [](StartUp& c) { c.world.emptyAnswers = {0x2007, 0x2006}; c.stopsBeforeDevice(kNoGPU); }},
+    {"GLContextQueryMissing", [](StartUp& c) { c.world.missing = {"clGetGLContextInfoKHR"}; c.stopsBeforeDevice(kNoGPU); }},
+    {"GLDevicesFail", [](StartUp& c) { c.fails("clGetGLContextInfoKHR", 1); c.stopsBeforeDevice(""); }},
+    {"CurrentGLDeviceFails", [](StartUp& c) { c.fails("clGetGLContextInfoKHR", 2); c.stopsBeforeDevice(""); }},
+    {"TypeOfCurrentDeviceFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
+    {"TypeOfListedDeviceFails", [](StartUp& c) { c.world.currentGLDevice.reset(); c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
+    {"ContextFails", [](StartUp& c) { c.fails("clCreateContext"); c.stopsWithContext(""); c.modes = {3, 4}; c.left = {}; }},
+    {"CreateFromGLMissing", [](StartUp& c) { c.world.missing = {"clCreateFromGLBuffer"}; c.stopsWithContext(kNoGL); }},
+    {"AcquireGLMissing", [](StartUp& c) { c.world.missing = {"clEnqueueAcquireGLObjects"}; c.stopsWithContext(kNoGL); }},
+    {"ReleaseGLMissing", [](StartUp& c) { c.world.missing = {"clEnqueueReleaseGLObjects"}; c.stopsWithContext(kNoGL); }},
+    {"DeviceNameFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 2); c.stopsWithContext(""); }},
+    {"DeviceTypeFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 3); c.stopsWithContext(kNamed); }},
+    {"AvailabilityFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 4); c.stopsWithContext(kNamed + "Device Type: GPU  "); }},
+    {"DeviceUnavailable", [](StartUp& c) {
+         c.firstDevice().available = false;
+         c.stopsWithContext(kNamed + "Device Type: GPU  GL shared device is not available, no OpenCL will be used\n"); }},
+    {"PlatformVersionFails", [](StartUp& c) { c.fails("clGetPlatformInfo", 9); c.stopsWithContext(kReported); }},
+    {"DoublePrecisionFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 5); c.stopsWithContext(kReported); }},
+    {"DoubleByExtensionOn11", [](StartUp& c) {
+         c.platform().version = "OpenCL 1.1 scripted";
+         c.platform().extensions += " cl_khr_fp64";
+         c.firstDevice().doublePrecision = 0; }},
+    {"NoDoubleByExtensionOn10", [](StartUp& c) { c.platform().version = "OpenCL 1.0"; c.doublePrecision = false; }},
+    {"FailingExtensionsOn10CountAsNone", [](StartUp& c) {
+         c.platform().version = "OpenCL 1.0";
+         c.platform().extensions += " cl_khr_fp64";
          c.faults = {{.function = "clGetPlatformInfo", .nth = 10, .onwards = true}};
-         c.error = c.platformText("Intel(R) Corporation") + c.deviceText();
-         c.doublePrecision = false;
-     }},
-    {"NoDoubleByDeviceOn12",
-     [](StartUp& c) {
-         c.world.platforms[0].devices[0].doublePrecision = 0;
+         c.doublePrecision = false; }},
+    {"NoDoubleByDeviceOn12", [](StartUp& c) {
+         c.firstDevice().doublePrecision = 0;
          c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "0"}};
-         c.doublePrecision = false;
-     }},
-    {"DoubleDemandedAndThere",
-     [](StartUp& c) {
-         c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1"}};
-     }},
-    {"DoubleDemandedAndMissing",
-     [](StartUp& c) {
-         c.world.platforms[0].devices[0].doublePrecision = 0;
+         c.doublePrecision = false; }},
+    {"DoubleDemandedAndThere", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1"}}; }},
+    {"DoubleDemandedAndMissing", [](StartUp& c) {
+         c.firstDevice().doublePrecision = 0;
          c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "-1"}};
-         c.stopsWithContext("Choosing OpenCL Device Scripted GPU.  Device Type: GPU  Device is "
-                            "available.\n" +
-                            kNoDouble);
-     }},
-    {"DriverRefused",
-     [](StartUp& c) {
-         onNVIDIA(c, "365.10");
-         c.stopsBeforeDevice(kDriverRange);
-         c.provider = kNVIDIAProvider;
-         c.minimumBufferSize = 2000;
-         c.device = "device#1";
-     }},
-    {"DriverUnreadable",
-     [](StartUp& c) {
-         onNVIDIA(c, "abc");
-         c.error = c.platformText("NVIDIA Corporation") +
-                   "Unable to detect NVidia driver version.  Disabling asynchronous read-back for "
-                   "OpenCL.\n" +
-                   c.deviceText();
-         c.provider = kNVIDIAProvider;
-         c.minimumBufferSize = 2000;
+         c.stopsWithContext(kReported + "Vyra OpenCL is not supported on device because double precision is not supported.\n"); }},
+    {"DriverRefused", [](StartUp& c) {
+         c.onNVIDIA("365.10");
+         c.stopsBeforeDevice("\nOpenCL is not supported by NVidia drivers between version 361.91 and 368.86.  To enabled "
+                             "OpenCL for this driver version set VYRA_OPENCL_IGNORE_DRIVER_VERSION=1.\n");
+         c.device = "device#1"; }},
+    {"DriverUnreadable", [](StartUp& c) {
+         c.onNVIDIA("abc");
+         c.error = c.platformText() + "Unable to detect NVidia driver version.  Disabling asynchronous read-back for OpenCL.\n" + kReported + "\n";
          c.asyncReadback = false;
-         c.modes = {1, 2};
-     }},
-    {"DriverVersionFails",
-     [](StartUp& c) {
-         onNVIDIA(c, "400.00");
-         c.fails("clGetDeviceInfo", 2);
-         c.stopsBeforeDevice("");
-         c.provider = kNVIDIAProvider;
-         c.minimumBufferSize = 2000;
-         c.device = "device#1";
-     }},
-    {"OlderDriverQueriesEvents",
-     [](StartUp& c) {
-         onNVIDIA(c, "385.30");
-         c.provider = kNVIDIAProvider;
-         c.minimumBufferSize = 2000;
-         c.modes = {1, 2};
-     }},
-    {"IgnoredOlderDriverIsImplicit",
-     [](StartUp& c) {
-         onNVIDIA(c, "365.10");
+         c.modes = {1, 2}; }},
+    {"UnreadableDriverIsNotTrustedByTheVariable", [](StartUp& c) {
+         c.onNVIDIA("abc");
          c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}};
-         c.provider = kNVIDIAProvider;
-         c.minimumBufferSize = 2000;
-     }},
-    {"ModesFromTheEnvironment",
-     [](StartUp& c) {
-         c.environment = {{"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2"},
-                          {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", "3"}};
-         c.modes = {2, 3};
-     }},
-    {"OneRetryOfTheQueue",
-     [](StartUp& c) { c.faults = {{.function = "clCreateCommandQueue", .status = -35}}; }},
+         c.error = c.platformText() + "Unable to detect NVidia driver version.  Disabling asynchronous read-back for OpenCL.\n" + kReported + "\n";
+         c.asyncReadback = false;
+         c.modes = {1, 2}; }},
+    {"DriverVersionFails", [](StartUp& c) { c.onNVIDIA("400.00"); c.fails("clGetDeviceInfo", 2); c.stopsBeforeDevice(""); c.device = "device#1"; }},
+    {"OlderDriverQueriesEvents", [](StartUp& c) { c.onNVIDIA("385.30"); c.modes = {1, 2}; }},
+    {"IgnoredOlderDriverIsImplicit", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
+    {"ModesFromTheEnvironment", [](StartUp& c) {
+         c.environment = {{"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2"}, {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", "3"}};
+         c.modes = {2, 3}; }},
+    {"OneRetryOfTheQueue", [](StartUp& c) { c.faults = {{.function = "clCreateCommandQueue", .status = -35}}; }},
     {"RetryOfTheQueueFails", [](StartUp& c) { primaryQueueFails(c, -30, 2, "CL_INVALID_VALUE"); }},
-    {"NoRetryForOtherStatuses",
-     [](StartUp& c) { primaryQueueFails(c, -6, 1, "CL_OUT_OF_HOST_MEMORY"); }},
-    {"QueuePropertiesFail",
-     [](StartUp& c) {
-         primaryQueueFails(c, 0, 0, "CL_OUT_OF_RESOURCES");
-         c.faults = {{.function = "clGetDeviceInfo", .nth = 6}};
-     }},
-    {"SecondaryQueueFails",
-     [](StartUp& c) {
-         c.fails("clCreateCommandQueue", 2);
-         c.left = {"context#1 x1", "queue#1 x1"};
-     }},
+    {"NoRetryForOtherStatuses", [](StartUp& c) { primaryQueueFails(c, -6, 1, "CL_OUT_OF_HOST_MEMORY"); }},
+    {"QueuePropertiesFail", [](StartUp& c) { primaryQueueFails(c, 0, 0, "CL_OUT_OF_RESOURCES"); c.faults = {{.function = "clGetDeviceInfo", .nth = 6}}; }},
+    {"SecondaryQueueFails", [](StartUp& c) { c.fails("clCreateCommandQueue", 2); c.left = {"context#1 x1", "queue#1 x1"}; }},
     {"ComputeUnitsFail", [](StartUp& c) { c.fails("clGetDeviceInfo", 8); }},
 };
-
-class DeviceStartUp : public StartUpTest, public ::testing::WithParamInterface<StartUpRow> {};
-
-TEST_P(DeviceStartUp, PrintsAnswersAndLeaves)
-{
-    StartUp expected;
-    expected.error = expected.platformText("Intel(R) Corporation") + expected.deviceText();
-    GetParam().set(expected);
-    run(expected);
-}
-INSTANTIATE_TEST_SUITE_P(StartUp, DeviceStartUp, ::testing::ValuesIn(kDeviceRows), rowName);
+// clang-format on
+INSTANTIATE_TEST_SUITE_P(Device, StartUpRows, ::testing::ValuesIn(kDeviceRows), rowName);
 
 using DeviceStartUpOnce = ScriptedTest;
 
