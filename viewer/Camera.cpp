@@ -101,6 +101,7 @@ void Camera::frame(const std::vector<QVector3D>& points, float aspect)
     const QMatrix4x4 fromView = toView.inverted();
     // As seen from the middle; the camera looks along -z.
     std::vector<QVector3D> seen;
+    seen.reserve(points.size());
     for (const QVector3D& point : points)
         seen.push_back(toView.mapVector(point - middle));
 

@@ -102,6 +102,7 @@ Surface skin(const Mesh& mesh, const std::vector<MatrixRows>& bones)
     if (!mesh.hasBones())
         return {mesh.positions, mesh.normals};
     std::vector<Affine> matrices;
+    matrices.reserve(bones.size());
     for (const MatrixRows& rows : bones)
         matrices.push_back(wide(rows));
 

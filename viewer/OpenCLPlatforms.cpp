@@ -51,6 +51,7 @@ std::vector<OpenCLPlatform> openCLPlatforms(const OpenCLFunctions& cl)
     if (cl.clGetPlatformIDs(count, ids.data(), nullptr) != CL_SUCCESS)
         return {};
     std::vector<OpenCLPlatform> platforms;
+    platforms.reserve(count);
     for (cl_platform_id id : ids)
         platforms.push_back({platformText(cl, id, CL_PLATFORM_VENDOR),
                              platformText(cl, id, CL_PLATFORM_EXTENSIONS)});

@@ -71,8 +71,10 @@ Status startOpenCL(QOpenGLWindow& window, const OpenCLFunctions& cl, const std::
 
     constexpr bool kUsingDirect3D = false;
     constexpr bool kUsingCoreProfile = true;
-    if (!TopenCLInfo::initialize(reinterpret_cast<void*>(window.winId()), nativeContext(context),
-                                 nullptr, kUsingDirect3D, kUsingCoreProfile, vendorId.value_or(0)))
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): the library takes a window's number as a pointer
+    void* const nativeWindow = reinterpret_cast<void*>(window.winId());
+    if (!TopenCLInfo::initialize(nativeWindow, nativeContext(context), nullptr, kUsingDirect3D,
+                                 kUsingCoreProfile, vendorId.value_or(0)))
         return Failure{ExitCode::kNoOpenCL,
                        "OpenCL cannot be used with this renderer, for the reason above; name "
                        "another platform with --platform, or use --allow-cpu"};

@@ -80,9 +80,10 @@ Pose poseAt(const Model& model, const Animation* animation, double seconds)
 MatrixRows rowsOf(const QMatrix4x4& matrix)
 {
     MatrixRows rows;
+    auto next = rows.begin();
     for (int row = 0; row < 3; ++row) {
         for (int column = 0; column < 4; ++column)
-            rows[static_cast<std::size_t>(4 * row + column)] = matrix(row, column);
+            *next++ = matrix(row, column);
     }
     return rows;
 }

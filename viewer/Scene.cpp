@@ -21,6 +21,42 @@ constexpr double kFullTurn = 6.28318530718;
 // How much the tints of a crowd differ from white.
 constexpr float kTintDepth = 0.13f;
 
+// Places for a crowd, as many rows as columns, the middle at the origin.
+class Grid {
+public:
+    Grid(int crowd, const QVector3D& character)
+        : fColumns(static_cast<int>(std::ceil(std::sqrt(static_cast<double>(crowd))))),
+          fRows((crowd + fColumns - 1) / fColumns), fCharacter(character)
+    {
+    }
+
+    QMatrix4x4 placement(int number) const
+    {
+        const int row = number / fColumns;
+        const int column = number % fColumns;
+        QMatrix4x4 placement;
+        placement.translate(fromMiddle(column, fColumns) * (fCharacter.x() + kGap), 0,
+                            fromMiddle(row, fRows) * (fCharacter.z() + kGap));
+        return placement;
+    }
+
+    QVector3D size() const
+    {
+        return {static_cast<float>(fColumns) * (fCharacter.x() + kGap) - kGap, fCharacter.y(),
+                static_cast<float>(fRows) * (fCharacter.z() + kGap) - kGap};
+    }
+
+private:
+    static float fromMiddle(int index, int count)
+    {
+        return static_cast<float>(index) - 0.5f * static_cast<float>(count - 1);
+    }
+
+    int fColumns;
+    int fRows;
+    QVector3D fCharacter; // size of one
+};
+
 QVector3D tintOf(int number)
 {
     if (number == 0)
@@ -59,19 +95,10 @@ Scene::Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation*
         fLevels.push_back(std::move(levels));
     }
 
-    const int columns = static_cast<int>(std::ceil(std::sqrt(static_cast<double>(crowd))));
-    const int rows = (crowd + columns - 1) / columns;
-    const float stepX = fSpace.size.x() + kGap;
-    const float stepZ = fSpace.size.z() + kGap;
-    for (int i = 0; i < crowd; ++i) {
-        QMatrix4x4 placement;
-        placement.translate(
-            (static_cast<float>(i % columns) - 0.5f * static_cast<float>(columns - 1)) * stepX, 0,
-            (static_cast<float>(i / columns) - 0.5f * static_cast<float>(rows - 1)) * stepZ);
-        createCharacter(placement, i, crowd);
-    }
-    fSize = {stepX * static_cast<float>(columns - 1) + fSpace.size.x(), fSpace.size.y(),
-             stepZ * static_cast<float>(rows - 1) + fSpace.size.z()};
+    const Grid grid(crowd, fSpace.size);
+    for (int i = 0; i < crowd; ++i)
+        createCharacter(grid.placement(i), i, crowd);
+    fSize = grid.size();
 }
 
 Scene::~Scene()

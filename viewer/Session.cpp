@@ -163,7 +163,7 @@ Status Session::renderFrame(double seconds)
     }
     if (fEvaluation)
         fEvaluation->renderingComplete();
-    const Status failure = writePicture();
+    Status failure = writePicture();
     ++fFrame;
     return failure;
 }

@@ -46,6 +46,7 @@ Deviation verify(QOpenGLFunctions_3_3_Core& gl, const Scene& scene)
 {
     const std::vector<CharacterMesh*>& meshes = scene.meshes();
     std::vector<Surface> actual;
+    actual.reserve(meshes.size());
     for (const CharacterMesh* mesh : meshes)
         actual.push_back({mesh->positions.read(gl), mesh->normals.read(gl)});
 

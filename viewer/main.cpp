@@ -83,8 +83,8 @@ Status run(const Options& options, bool& verified)
     if (Status failure = session.start(options.size))
         return failure;
 
-    const Status failure = options.frames ? renderFrames(session, window, *options.frames)
-                                          : playInWindow(session, window);
+    Status failure = options.frames ? renderFrames(session, window, *options.frames)
+                                    : playInWindow(session, window);
     verified = session.verified();
     std::fputs(session.report().c_str(), stdout);
     return failure;
