@@ -59,17 +59,19 @@ cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
 }
 
 // The marker waits for the maps too, so that it fails if they do.
-cl_int enqueueDone(cl_command_queue queue, const CopyEvents& events, cl_event* done)
+cl_int enqueueDone(cl_command_queue queue, CopyEvents& events)
 {
     std::vector<cl_event> all(events.unmaps.data(), events.unmaps.data() + events.unmaps.size());
     all.push_back(events.mapped.back());
-    return runtime().clEnqueueMarkerWithWaitList(queue, static_cast<cl_uint>(all.size()),
-                                                 all.data(), done);
+    return events.done.add([&](cl_event* event) {
+        return runtime().clEnqueueMarkerWithWaitList(queue, static_cast<cl_uint>(all.size()),
+                                                     all.data(), event);
+    });
 }
 
 // The commands after the maps. The copies are asked for at the end: until then the caller alone
 // decides about the user event.
-cl_int enqueueRest(cl_command_queue queue, const std::shared_ptr<CopyBatch>& batch, cl_event* done)
+cl_int enqueueRest(cl_command_queue queue, const std::shared_ptr<CopyBatch>& batch)
 {
     CopyEvents& events = *batch->events;
     cl_int error = events.mapped.add([&](cl_event* event) {
@@ -79,12 +81,9 @@ cl_int enqueueRest(cl_command_queue queue, const std::shared_ptr<CopyBatch>& bat
     if (error == CL_SUCCESS)
         error = unmapAll(queue, *batch);
     if (error == CL_SUCCESS)
-        error = enqueueDone(queue, events, done);
-    if (error != CL_SUCCESS)
-        return error;
-    error = copyWhenMapped(batch);
-    if (error != CL_SUCCESS)
-        runtime().clReleaseEvent(std::exchange(*done, nullptr)); // the caller gets none
+        error = enqueueDone(queue, events);
+    if (error == CL_SUCCESS)
+        error = copyWhenMapped(batch);
     return error;
 }
 
@@ -101,9 +100,11 @@ cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers, CopyDirectio
         return error;
     error = mapAll(queue, *batch, waitList);
     if (error == CL_SUCCESS)
-        error = enqueueRest(queue, batch, done);
-    if (error == CL_SUCCESS)
-        return CL_SUCCESS;
+        error = enqueueRest(queue, batch);
+    if (error == CL_SUCCESS) {
+        *done = batch->events->done.back();
+        return runtime().clRetainEvent(*done); // the caller's reference
+    }
     // What was mapped is unmapped again, if that is not in the queue already.
     if (batch->events->unmaps.empty())
         static_cast<void>(unmapAll(queue, *batch));

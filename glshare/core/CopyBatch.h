@@ -18,6 +18,7 @@ struct CopyEvents {
     EventList mapped; // one marker, after all maps
     EventList copied; // one user event, completed by the worker
     EventList unmaps;
+    EventList done; // the marker whose event the application gets
 };
 
 struct CopyBatch {

@@ -5,6 +5,7 @@
 #include <chrono>
 #include <future>
 #include <thread>
+#include <utility>
 
 namespace {
 
@@ -174,6 +175,32 @@ TEST_F(CommandOrderTest, UserSynchronisationSwitchesTheImpliedOrderOff)
     clReleaseContext(context);
 }
 
+// Draws a triangle over the whole target, whose fragments write -1 to the buffer of binding 0, each
+// to its own place. Nothing waits for it, nor flushes.
+void drawIntoBuffer(GLsizei side)
+{
+    const char* vertex =
+        "#version 450\nvoid main() { gl_Position = vec4(gl_VertexID == 1 ? 3 : -1, "
+        "gl_VertexID == 2 ? 3 : -1, 0, 1); }";
+    const char* fragment =
+        "#version 450\nlayout(location = 0) uniform int side; layout(std430, binding = 0) buffer "
+        "Numbers { int numbers[]; }; void main() { "
+        "numbers[int(gl_FragCoord.y) * side + int(gl_FragCoord.x)] = -1; }";
+    const GLuint program = glCreateProgram();
+    for (const auto& [stage, text] :
+         {std::pair(GL_VERTEX_SHADER, vertex), std::pair(GL_FRAGMENT_SHADER, fragment)}) {
+        const GLuint shader = glCreateShader(static_cast<GLenum>(stage));
+        glShaderSource(shader, 1, &text, nullptr);
+        glCompileShader(shader);
+        glAttachShader(program, shader);
+    }
+    glLinkProgram(program);
+    glUseProgram(program);
+    glUniform1i(0, side);
+    glViewport(0, 0, side, side);
+    glDrawArrays(GL_TRIANGLES, 0, 3);
+}
+
 // Results of drawing that nobody has waited for, but the implied order.
 TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
 {
@@ -183,36 +210,48 @@ TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
     cl_mem memory = share(pixels);
     GLuint target = 0;
     GLuint frame = 0;
+    GLuint vertices = 0;
     glGenTextures(1, &target);
     glBindTexture(GL_TEXTURE_2D, target);
     glTexStorage2D(GL_TEXTURE_2D, 1, GL_RGBA8, kSide, kSide);
     glGenFramebuffers(1, &frame);
     glBindFramebuffer(GL_FRAMEBUFFER, frame);
     glFramebufferTexture2D(GL_FRAMEBUFFER, GL_COLOR_ATTACHMENT0, GL_TEXTURE_2D, target, 0);
-    glClearColor(1, 1, 1, 1);
-    glClear(GL_COLOR_BUFFER_BIT);
-    glBindBuffer(GL_PIXEL_PACK_BUFFER, pixels);
-    glReadPixels(0, 0, kSide, kSide, GL_RGBA, GL_UNSIGNED_BYTE, nullptr);
-    glBindBuffer(GL_PIXEL_PACK_BUFFER, 0);
+    glGenVertexArrays(1, &vertices);
+    glBindVertexArray(vertices);
+    glBindBufferBase(GL_SHADER_STORAGE_BUFFER, 0, pixels);
+    glFinish();
+    drawIntoBuffer(kSide);
 
     EXPECT_EQ(acquire(memory), CL_SUCCESS);
-    EXPECT_EQ(readCl(memory, kPixels), Numbers(kPixels, -1));
+    EXPECT_TRUE(readCl(memory, kPixels) == Numbers(kPixels, -1));
     EXPECT_EQ(release(memory), CL_SUCCESS);
     clReleaseMemObject(memory);
 }
 
-// The failure of what it waits for is the command's own, and ends there.
+// The failure of what it waits for is the command's own, in a queue of either kind.
 TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
 {
-    cl_event event = nullptr;
-    onOtherThread([&] {
-        EXPECT_EQ(acquire(memory_, {gate_}, &event), CL_SUCCESS);
-        clFlush(queue_);
-    });
-    clSetUserEventStatus(gate_, -5);
-    clWaitForEvents(1, &event);
-    EXPECT_LT(statusOf(event), CL_COMPLETE);
-    clReleaseEvent(event);
+    for (const cl_command_queue_properties kind :
+         {cl_command_queue_properties{0},
+          cl_command_queue_properties{CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE}}) {
+        SCOPED_TRACE(kind);
+        cl_command_queue queue = clCreateCommandQueue(context_, device_, kind, nullptr);
+        cl_mem memory = share(buffer_);
+        cl_event gate = clCreateUserEvent(context_, nullptr);
+        cl_event event = nullptr;
+        onOtherThread([&] {
+            EXPECT_EQ(clEnqueueAcquireGLObjects(queue, 1, &memory, 1, &gate, &event), CL_SUCCESS);
+            clFlush(queue);
+        });
+        clSetUserEventStatus(gate, -5);
+        clWaitForEvents(1, &event);
+        EXPECT_LT(statusOf(event), CL_COMPLETE);
+        clReleaseEvent(event);
+        clReleaseEvent(gate);
+        clReleaseMemObject(memory);
+        clReleaseCommandQueue(queue);
+    }
 }
 
 TEST_F(GlEventTest, EventsFollowGlSyncObjects)
