@@ -1,0 +1,50 @@
+# What lets other projects find the installed library: a CMake package, pkg-config files, and the
+# examples. Included after the rooms.
+include(CMakePackageConfigHelpers)
+
+set(VYRA_CMAKE_PACKAGE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/VyraOpenCL)
+install(EXPORT VyraOpenCLTargets
+    NAMESPACE VyraOpenCL::
+    DESTINATION ${VYRA_CMAKE_PACKAGE_DIR}
+    COMPONENT Development)
+configure_package_config_file(
+    ${CMAKE_CURRENT_LIST_DIR}/VyraOpenCLConfig.cmake.in
+    ${PROJECT_BINARY_DIR}/packaging/VyraOpenCLConfig.cmake
+    INSTALL_DESTINATION ${VYRA_CMAKE_PACKAGE_DIR}
+    NO_SET_AND_CHECK_MACRO)
+write_basic_package_version_file(
+    ${PROJECT_BINARY_DIR}/packaging/VyraOpenCLConfigVersion.cmake COMPATIBILITY SameMajorVersion)
+install(FILES
+    ${PROJECT_BINARY_DIR}/packaging/VyraOpenCLConfig.cmake
+    ${PROJECT_BINARY_DIR}/packaging/VyraOpenCLConfigVersion.cmake
+    DESTINATION ${VYRA_CMAKE_PACKAGE_DIR}
+    COMPONENT Development)
+
+# The files name the prefix as seen from their own folder, so that an installation can be moved.
+set(VYRA_PKG_CONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+file(RELATIVE_PATH VYRA_PREFIX_FROM_PKG_CONFIG
+    ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
+string(REGEX REPLACE "/$" "" VYRA_PREFIX_FROM_PKG_CONFIG ${VYRA_PREFIX_FROM_PKG_CONFIG})
+foreach(library vyra-opencl vyra-host)
+    configure_file(${CMAKE_CURRENT_LIST_DIR}/${library}.pc.in
+        ${PROJECT_BINARY_DIR}/packaging/${library}.pc @ONLY)
+    install(FILES ${PROJECT_BINARY_DIR}/packaging/${library}.pc
+        DESTINATION ${VYRA_PKG_CONFIG_DIR}
+        COMPONENT Development)
+endforeach()
+
+set(VYRA_EXAMPLES_DIR ${CMAKE_INSTALL_DATADIR}/doc/libvyra-opencl-dev/examples)
+install(FILES
+    ${PROJECT_SOURCE_DIR}/examples/smallest_evaluator.cpp
+    ${PROJECT_SOURCE_DIR}/examples/published_evaluator.cpp
+    DESTINATION ${VYRA_EXAMPLES_DIR}
+    COMPONENT Development)
+install(DIRECTORY
+    ${PROJECT_SOURCE_DIR}/examples/with-cmake
+    ${PROJECT_SOURCE_DIR}/examples/with-pkg-config
+    DESTINATION ${VYRA_EXAMPLES_DIR}
+    COMPONENT Development)
+
+find_program(VYRA_GZIP gzip)
+include(VyraManPages)
+include(VyraDebian)
