@@ -13,7 +13,7 @@ class TopenCLData;
 //
 // The pool keeps a copy of every buffer that it hands out, with references of its own; what the
 // caller later does to its copy does not reach the pool's. The ready event that a buffer had when
-// it was handed out comes along with the memory's next user.
+// it was handed out (none, where the pool made the memory) comes along with the memory's next user.
 //
 // createBuffer, createOutputBuffer and releaseBuffers may be called from any thread.
 // collectDataForPlug takes no lock and must not overlap with them on the same pool. OpenCL failures
