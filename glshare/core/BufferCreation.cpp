@@ -9,44 +9,30 @@ namespace glshare {
 
 namespace {
 
-// Fills in the size and, if the storage can be used in place, its address and what keeps it alive.
-// The address is taken once more after pinning: only then is it known to stay. False if there is no
-// such buffer, or one without storage.
+// Fills in the size and, if it can be used in place, the storage. False if there is no such buffer,
+// or one without storage.
 bool describe(SharedBuffer& buffer, const GlDevice& device, bool inPlace)
 {
     buffer.size = device.bufferSize(buffer.name).value_or(0);
     if (buffer.size == 0)
         return false;
-    if (!inPlace || device.address(buffer.name, buffer.size) == nullptr)
-        return true;
-    buffer.pin = device.pin(buffer.name);
-    buffer.storage = device.address(buffer.name, buffer.size);
+    if (inPlace)
+        buffer.storage = StorageHold(buffer.context, device, buffer.name, buffer.size);
     return true;
-}
-
-void unpin(const SharedBuffer& buffer)
-{
-    if (buffer.pin == 0)
-        return;
-    buffer.context->worker().post([pin = buffer.pin](GlDevice* device) {
-        if (device != nullptr)
-            device->unpin(pin);
-    });
 }
 
 // The runtime calls this when nothing uses the memory object any more, on any thread.
 void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
 {
-    if (const std::shared_ptr<SharedBuffer> buffer = Registry::get().remove(memory))
-        unpin(*buffer);
+    Registry::get().remove(memory);
 }
 
 cl_mem createMemory(cl_context handle, const SharedBuffer& buffer, cl_int& error)
 {
     const cl_mem_flags where =
-        buffer.storage != nullptr ? CL_MEM_USE_HOST_PTR : CL_MEM_ALLOC_HOST_PTR;
-    return runtime().clCreateBuffer(handle, buffer.flags | where, buffer.size, buffer.storage,
-                                    &error);
+        buffer.storage.address() != nullptr ? CL_MEM_USE_HOST_PTR : CL_MEM_ALLOC_HOST_PTR;
+    return runtime().clCreateBuffer(handle, buffer.flags | where, buffer.size,
+                                    buffer.storage.address(), &error);
 }
 
 bool areValidFlags(cl_mem_flags flags)
@@ -79,10 +65,8 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
     }
 
     buffer->memory = createMemory(handle, *buffer, error);
-    if (buffer->memory == nullptr) {
-        unpin(*buffer);
+    if (buffer->memory == nullptr)
         return nullptr;
-    }
     cl_mem memory = buffer->memory;
     Registry::get().add(handle, std::move(buffer));
     error = runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);

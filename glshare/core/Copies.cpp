@@ -1,6 +1,5 @@
 #include "core/Copies.h"
 
-#include <cstddef>
 #include <utility>
 #include <vector>
 
@@ -26,14 +25,12 @@ cl_int mapAll(cl_command_queue queue, CopyBatch& batch, std::span<const cl_event
 {
     const cl_map_flags access =
         batch.direction == CopyDirection::FromGl ? CL_MAP_WRITE : CL_MAP_READ;
-    for (const auto& buffer : batch.buffers) {
+    for (CopyItem& item : batch.items) {
         const cl_int error = batch.events->maps.add([&](cl_event* event) {
             cl_int status = CL_SUCCESS;
-            void* pointer = runtime().clEnqueueMapBuffer(
-                queue, buffer->memory, CL_FALSE, access, 0, buffer->size,
+            item.pointer = runtime().clEnqueueMapBuffer(
+                queue, item.buffer->memory, CL_FALSE, access, 0, item.buffer->size,
                 static_cast<cl_uint>(waitList.size()), waitList.data(), event, &status);
-            if (status == CL_SUCCESS)
-                batch.pointers.push_back(pointer);
             return status;
         });
         if (error != CL_SUCCESS)
@@ -46,10 +43,11 @@ cl_int mapAll(cl_command_queue queue, CopyBatch& batch, std::span<const cl_event
 cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
 {
     cl_int result = CL_SUCCESS;
-    for (std::size_t i = 0; i < batch.pointers.size(); ++i) {
+    for (const CopyItem& item : batch.items) {
+        if (item.pointer == nullptr)
+            continue;
         const cl_int error = batch.events->unmaps.add([&](cl_event* event) {
-            return runtime().clEnqueueUnmapMemObject(queue, batch.buffers[i]->memory,
-                                                     batch.pointers[i], 1,
+            return runtime().clEnqueueUnmapMemObject(queue, item.buffer->memory, item.pointer, 1,
                                                      batch.events->copied.data(), event);
         });
         if (error != CL_SUCCESS)
@@ -89,11 +87,11 @@ cl_int enqueueRest(cl_command_queue queue, const std::shared_ptr<CopyBatch>& bat
 
 } // namespace
 
-cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers, CopyDirection direction,
+cl_int enqueueCopies(cl_command_queue queue, std::vector<CopyItem> items, CopyDirection direction,
                      std::span<const cl_event> waitList, cl_event* done)
 {
     const auto batch = std::make_shared<CopyBatch>();
-    batch->buffers = std::move(buffers);
+    batch->items = std::move(items);
     batch->direction = direction;
     cl_int error = createUserEvent(queue, batch->events->copied);
     if (error != CL_SUCCESS)

@@ -5,17 +5,18 @@
 #include "core/CopyBatch.h"
 
 #include <span>
+#include <vector>
 
 namespace glshare {
 
-// Enqueues the copies of `buffers`, which is not empty and of one context, after `waitList` and in
+// Enqueues the copies of `items`, which is not empty and of one context, after `waitList` and in
 // the order of `queue`. Never waits. On success `done` gets an event, owned by the caller, that
 // completes after the last copy; on failure nothing is left in the queue that would not complete.
 //
 //   in the queue   map each buffer ─► unmap each buffer ─► done
 //                        │                 ▲
 //   the worker           └───► copies ─────┘ (a user event)
-[[nodiscard]] cl_int enqueueCopies(cl_command_queue queue, SharedBuffers buffers,
+[[nodiscard]] cl_int enqueueCopies(cl_command_queue queue, std::vector<CopyItem> items,
                                    CopyDirection direction, std::span<const cl_event> waitList,
                                    cl_event* done);
 

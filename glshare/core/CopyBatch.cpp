@@ -2,8 +2,8 @@
 
 #include "core/Counters.h"
 
-#include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <map>
 #include <mutex>
 #include <utility>
@@ -45,20 +45,27 @@ private:
     std::uintptr_t last_ = 0;
 };
 
-bool copy(GlDevice& device, const SharedBuffer& buffer, void* mapped, CopyDirection direction)
+bool copy(const CopyItem& item, CopyDirection direction, GlDevice* device)
 {
-    return direction == CopyDirection::FromGl ? device.read(buffer.name, mapped, buffer.size)
-                                              : device.write(buffer.name, mapped, buffer.size);
+    const bool fromGl = direction == CopyDirection::FromGl;
+    const SharedBuffer& buffer = *item.buffer;
+    if (void* storage = item.storage.address(); storage != nullptr) {
+        std::memcpy(fromGl ? item.pointer : storage, fromGl ? storage : item.pointer, buffer.size);
+        return true;
+    }
+    if (device == nullptr)
+        return false;
+    return fromGl ? device->read(buffer.name, item.pointer, buffer.size)
+                  : device->write(buffer.name, item.pointer, buffer.size);
 }
 
 // A buffer that is gone by now keeps what it holds: the application broke the rules after the
 // command was given, and all that is left is to end well.
 void copyAll(const CopyBatch& batch, GlDevice* device)
 {
-    for (std::size_t i = 0; i < batch.buffers.size(); ++i) {
-        const SharedBuffer& buffer = *batch.buffers[i];
-        if (device != nullptr && copy(*device, buffer, batch.pointers[i], batch.direction))
-            counters().bytesCopied += buffer.size;
+    for (const CopyItem& item : batch.items) {
+        if (copy(item, batch.direction, device))
+            counters().bytesCopied += item.buffer->size;
         else
             ++counters().failedCopies;
     }
@@ -66,7 +73,7 @@ void copyAll(const CopyBatch& batch, GlDevice* device)
 
 SharingContext& contextOf(const CopyBatch& batch)
 {
-    return *batch.buffers.front()->context;
+    return *batch.items.front().buffer->context;
 }
 
 // On the worker, once the maps have ended with `status`. Runtimes still touch the events of
@@ -89,7 +96,7 @@ void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* number)
         OutstandingBatches::get().take(reinterpret_cast<std::uintptr_t>(number));
     if (batch == nullptr)
         return;
-    const std::shared_ptr<SharingContext> context = batch->buffers.front()->context;
+    const std::shared_ptr<SharingContext> context = batch->items.front().buffer->context;
     context->worker().post([batch, status](GlDevice* device) { settle(*batch, status, device); });
 }
 

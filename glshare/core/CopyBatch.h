@@ -21,9 +21,17 @@ struct CopyEvents {
     EventList done; // the marker whose event the application gets
 };
 
+// One buffer to copy.
+struct CopyItem {
+    std::shared_ptr<SharedBuffer> buffer;
+    // The buffer's storage at the time of the command, which the copy then needs no OpenGL for; if
+    // nothing is held, the copy goes by the buffer's name.
+    StorageHold storage;
+    void* pointer = nullptr; // where the memory object lies while it is mapped
+};
+
 struct CopyBatch {
-    SharedBuffers buffers;       // not empty, and of one context
-    std::vector<void*> pointers; // where each buffer lies while it is mapped
+    std::vector<CopyItem> items; // not empty, and of one context
     CopyDirection direction = CopyDirection::FromGl;
     std::shared_ptr<CopyEvents> events = std::make_shared<CopyEvents>();
     bool isSettled = false; // `copied` has its status; touched by the worker alone

@@ -72,19 +72,22 @@ SharedBuffers Registry::find(const cl_mem* handles, std::size_t count)
     return result;
 }
 
-std::shared_ptr<SharedBuffer> Registry::remove(cl_mem handle)
+// What is dropped is dropped without the lock: the record may be the last owner of its context, and
+// that ends a thread.
+void Registry::remove(cl_mem handle)
 {
+    std::shared_ptr<SharedBuffer> buffer;
     std::shared_ptr<SharingContext> unused;
     const std::scoped_lock lock(mutex_);
     const auto found = buffers_.find(handle);
     if (found == buffers_.end())
-        return nullptr;
-    const BufferEntry entry = std::move(found->second);
+        return;
+    cl_context owner = found->second.context;
+    buffer = std::move(found->second.buffer);
     buffers_.erase(found);
-    if (const auto context = contexts_.find(entry.context); context != contexts_.end())
+    if (const auto context = contexts_.find(owner); context != contexts_.end())
         --context->second.buffers;
-    unused = takeUnused(entry.context);
-    return entry.buffer;
+    unused = takeUnused(owner);
 }
 
 std::shared_ptr<SharingContext> Registry::takeUnused(cl_context handle)

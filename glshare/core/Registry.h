@@ -31,8 +31,8 @@ public:
     // The records of `count` handles in their order, up to the first that is unknown.
     [[nodiscard]] SharedBuffers find(const cl_mem* handles, std::size_t count);
 
-    // When the runtime destroys the memory object. Null if it is unknown.
-    std::shared_ptr<SharedBuffer> remove(cl_mem handle);
+    // When the runtime destroys the memory object. Does nothing if it is unknown.
+    void remove(cl_mem handle);
 
 private:
     struct ContextEntry {

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "core/OpenCl.h"
+#include "core/StorageHold.h"
 
 #include <cstddef>
 #include <memory>
@@ -18,10 +19,8 @@ struct SharedBuffer {
     cl_GLuint name = 0;
     std::size_t size = 0; // bytes
     cl_mem_flags flags = 0;
-    // The GL storage that `memory` lies over, kept alive by `pin`; null if it has storage of its
-    // own.
-    void* storage = nullptr;
-    cl_GLuint pin = 0;
+    // The GL storage that `memory` lies over; nothing if it has storage of its own.
+    StorageHold storage;
 
     bool isAcquired = false;
     bool isCopied = false; // how it was acquired; the release goes the same way

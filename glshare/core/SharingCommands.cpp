@@ -6,9 +6,10 @@
 #include "core/Registry.h"
 
 #include <algorithm>
-#include <iterator>
+#include <cstddef>
 #include <memory>
 #include <utility>
+#include <vector>
 
 namespace glshare {
 
@@ -35,27 +36,53 @@ cl_int findAll(const SharingRequest& request, const std::shared_ptr<SharingConte
     return areAllHere ? CL_SUCCESS : CL_INVALID_CONTEXT;
 }
 
-// Decides for each buffer whether it must be copied. What the GL side looks like counts as it is
-// now, when the command is given: OpenGL's earlier calls have been made, its later ones must wait
-// for the release. CL_INVALID_GL_OBJECT if a buffer is gone or has become too small.
-cl_int inspect(const SharingContext& context, const SharedBuffers& buffers)
+// Decides for each buffer whether it must be copied, and lists those. What the GL side looks like
+// counts as it is now, when the command is given: OpenGL's earlier calls have been made, its later
+// ones must wait for the release. CL_INVALID_GL_OBJECT if a buffer is gone or has become too small.
+cl_int inspect(const SharedBuffers& buffers, const GlDevice& device, std::vector<CopyItem>& copies)
 {
-    cl_int result = CL_SUCCESS;
+    for (const auto& buffer : buffers) {
+        void* const storage = buffer->storage.address();
+        buffer->isCopied =
+            storage == nullptr || device.address(buffer->name, buffer->size) != storage;
+        if (!buffer->isCopied)
+            continue;
+        if (device.bufferSize(buffer->name).value_or(0) < buffer->size)
+            return CL_INVALID_GL_OBJECT;
+        copies.push_back(
+            {buffer, StorageHold(buffer->context, device, buffer->name, buffer->size)});
+    }
+    return CL_SUCCESS;
+}
+
+cl_int prepareAcquire(const SharingContext& context, const SharedBuffers& buffers,
+                      std::vector<CopyItem>& copies)
+{
+    cl_int result = CL_INVALID_GL_OBJECT;
     context.worker().call([&](GlDevice* device) {
-        for (const auto& buffer : buffers) {
-            if (device == nullptr) {
-                result = CL_INVALID_GL_OBJECT;
-                return;
-            }
-            buffer->isCopied = buffer->storage == nullptr ||
-                               device->address(buffer->name, buffer->size) != buffer->storage;
-            if (buffer->isCopied && device->bufferSize(buffer->name).value_or(0) < buffer->size) {
-                result = CL_INVALID_GL_OBJECT;
-                return;
-            }
-        }
+        if (device != nullptr)
+            result = inspect(buffers, *device, copies);
     });
     return result;
+}
+
+// What was copied on the way in is copied on the way out. In place there is nothing to ask OpenGL.
+void prepareRelease(const SharingContext& context, const SharedBuffers& buffers,
+                    std::vector<CopyItem>& copies)
+{
+    for (const auto& buffer : buffers) {
+        if (buffer->isCopied)
+            copies.push_back({buffer, {}});
+    }
+    if (copies.empty())
+        return;
+    context.worker().call([&](GlDevice* device) {
+        if (device == nullptr)
+            return;
+        for (CopyItem& item : copies)
+            item.storage =
+                StorageHold(item.buffer->context, *device, item.buffer->name, item.buffer->size);
+    });
 }
 
 void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
@@ -69,25 +96,16 @@ void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
 }
 
 // The commands in the queue. In place nothing has to be done, and the command is a marker.
-cl_int enqueue(SharingCommand command, const SharingRequest& request, const SharedBuffers& buffers,
+cl_int enqueue(SharingCommand command, const SharingRequest& request, std::vector<CopyItem> copies,
                cl_event* done)
 {
-    SharedBuffers copied;
-    std::ranges::copy_if(buffers, std::back_inserter(copied),
-                         [](const auto& buffer) { return buffer->isCopied; });
-    const std::size_t copies = copied.size();
-    const cl_int error =
-        copied.empty()
-            ? runtime().clEnqueueMarkerWithWaitList(request.queue,
-                                                    static_cast<cl_uint>(request.waitList.size()),
-                                                    request.waitList.data(), done)
-            : enqueueCopies(request.queue, std::move(copied),
-                            command == SharingCommand::Acquire ? CopyDirection::FromGl
-                                                               : CopyDirection::ToGl,
-                            request.waitList, done);
-    if (error == CL_SUCCESS)
-        count(command, copies, buffers.size() - copies);
-    return error;
+    if (copies.empty())
+        return runtime().clEnqueueMarkerWithWaitList(request.queue,
+                                                     static_cast<cl_uint>(request.waitList.size()),
+                                                     request.waitList.data(), done);
+    const auto direction =
+        command == SharingCommand::Acquire ? CopyDirection::FromGl : CopyDirection::ToGl;
+    return enqueueCopies(request.queue, std::move(copies), direction, request.waitList, done);
 }
 
 // Hands the event to the application, or gives it back if it is not wanted.
@@ -106,15 +124,21 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
                         const SharingContext& context, const SharedBuffers& buffers)
 {
     const bool isOrdered = context.isOrderedWithCaller();
+    std::vector<CopyItem> copies;
     if (command == SharingCommand::Acquire) {
         if (isOrdered)
             context.worker().finishCaller();
-        if (const cl_int error = inspect(context, buffers); error != CL_SUCCESS)
+        if (const cl_int error = prepareAcquire(context, buffers, copies); error != CL_SUCCESS)
             return error;
+    } else {
+        prepareRelease(context, buffers, copies);
     }
+    const std::size_t copied = copies.size();
     cl_event done = nullptr;
-    if (const cl_int error = enqueue(command, request, buffers, &done); error != CL_SUCCESS)
+    if (const cl_int error = enqueue(command, request, std::move(copies), &done);
+        error != CL_SUCCESS)
         return error;
+    count(command, copied, buffers.size() - copied);
     // A wait that fails tells of a command before this one, and so will the event.
     if (command == SharingCommand::Release && isOrdered)
         static_cast<void>(runtime().clWaitForEvents(1, &done));

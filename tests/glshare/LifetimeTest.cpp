@@ -48,7 +48,8 @@ TEST_F(LifetimeTest, ContextsTakeTheirWorkerAlong)
         glDeleteBuffers(1, &buffer);
         clReleaseContext(context);
     }
-    EXPECT_EQ(threadsOfProcess(), before);
+    // Threads of what was there before may have ended in the meantime.
+    EXPECT_LE(threadsOfProcess(), before);
 }
 
 // The application's last reference to the context is not the last one.
