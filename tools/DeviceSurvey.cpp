@@ -12,6 +12,9 @@
 namespace info {
 namespace {
 
+// Only Windows looks at the native window.
+constexpr void* kNoWindow = nullptr;
+
 // More than any machine has on one platform.
 constexpr std::size_t kMaximumDevices = 64;
 
@@ -46,7 +49,7 @@ int askForSharingDevices(cl_platform_id platform, RenderWindow& window, DeviceId
     if (!ocl.clGetGLContextInfoKHR || !window.facts().usable)
         return CL_SUCCESS;
     const ContextProperties properties =
-        openGLContextProperties(window.nativeWindow(), window.nativeContext(), platform);
+        openGLContextProperties(kNoWindow, window.nativeContext(), platform);
     std::array<cl_device_id, kMaximumDevices> list{};
     std::size_t bytes = 0;
     int status = ocl.clGetGLContextInfoKHR(properties.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR,
@@ -56,7 +59,7 @@ int askForSharingDevices(cl_platform_id platform, RenderWindow& window, DeviceId
     const std::size_t count = std::min(bytes / sizeof(cl_device_id), list.size());
     ids.sharing.assign(list.begin(), list.begin() + static_cast<std::ptrdiff_t>(count));
     return ocl.clGetGLContextInfoKHR(properties.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
-                                     sizeof ids.current, &ids.current, nullptr);
+                                     sizeof(cl_device_id), &ids.current, nullptr);
 }
 
 std::string deviceText(cl_device_id device, cl_device_info name)

@@ -21,8 +21,8 @@ std::string summaryOf(const Explanation& explanation)
         return std::string("OpenCL is off: ") + stepName(explanation.stop->step).failure + ".";
     const Platform* platform = chosenPlatform(explanation.facts);
     const Device* device = chosenDevice(explanation.facts);
-    const std::string where = (device ? " on " + device->name : "") +
-                              (platform ? ", platform " + quoted(platform->name) : "");
+    const std::string where = " (" + (device ? device->name : "unknown device") + " of " +
+                              (platform ? platform->vendor : "unknown vendor") + ")";
     return explanation.exitCode == ExitCode::kOn
                ? "OpenCL is on" + where + ", and the self-test is right."
                : "OpenCL is on" + where + ", but the self-test failed.";

@@ -87,11 +87,6 @@ void RenderWindow::open()
     fFacts.syncObjects = fHost->syncObjectsUsable();
 }
 
-void* RenderWindow::nativeWindow() const
-{
-    return fFacts.usable ? reinterpret_cast<void*>(fWindow->winId()) : nullptr;
-}
-
 void* RenderWindow::nativeContext() const
 {
     if (!fFacts.usable)

@@ -26,9 +26,8 @@ public:
     RenderWindow& operator=(const RenderWindow&) = delete;
 
     const Renderer& facts() const { return fFacts; }
-    // The window system's own handles, as the library's start-up takes them; null where the
-    // renderer is not usable.
-    void* nativeWindow() const;
+    // The window system's own handle, as the library's start-up takes it; null where the renderer
+    // is not usable.
     void* nativeContext() const;
 
     QOpenGLContext& context() { return *fContext; }

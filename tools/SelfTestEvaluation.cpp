@@ -105,7 +105,7 @@ AutoCLObject<cl_event> SelfTestEvaluation::enqueueKernel(float offset, cl_event 
     std::size_t global = 0;
     std::size_t local = 0;
     AutoCLObject<cl_event> deformed;
-    if (succeeded(fCalls.clSetKernelArg(fKernel, 0, sizeof memory, &memory), "argument refused") &&
+    if (succeeded(fCalls.clSetKernelArg(fKernel, 0, sizeof(cl_mem), &memory), "argument refused") &&
         succeeded(fCalls.clSetKernelArg(fKernel, 1, sizeof offset, &offset), "argument refused") &&
         succeeded(fCalls.clSetKernelArg(fKernel, 2, sizeof count, &count), "argument refused") &&
         succeeded(TopenCLInfo::theOne().getWorkGroupSizes(fKernel, fFloats, global, local),

@@ -8,6 +8,9 @@
 namespace info {
 namespace {
 
+// Only Windows looks at the native window.
+constexpr void* kNoWindow = nullptr;
+
 // The answer does not reach the decisions here: the library only keeps it for the host.
 constexpr bool kUsingCoreProfile = false;
 
@@ -36,8 +39,8 @@ StartUp runStartUp(const RenderWindow& window, unsigned vendorId, WarningLog& wa
         return startUp;
     startUp.attempted = true;
     CapturedOutput output;
-    startUp.valid = TopenCLInfo::initialize(window.nativeWindow(), window.nativeContext(), nullptr,
-                                            false, kUsingCoreProfile, vendorId);
+    startUp.valid = TopenCLInfo::initialize(kNoWindow, window.nativeContext(), nullptr, false,
+                                            kUsingCoreProfile, vendorId);
     startUp.output = output.finish();
     startUp.warnings = warnings.take();
     readOutcome(startUp);

@@ -81,7 +81,7 @@ std::optional<int> codeOfName(std::string_view name)
 
 std::string statusName(int code)
 {
-    const std::string name = CLErrorCodeStr(code);
+    std::string name = CLErrorCodeStr(code);
     if (!number(name))
         return name;
     const Code* known = find(code);

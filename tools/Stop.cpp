@@ -3,6 +3,8 @@
 #include "tools/StatusCodes.h"
 #include "tools/StopTexts.h"
 
+#include <algorithm>
+
 namespace info {
 namespace {
 
@@ -83,11 +85,10 @@ Step stepOfStop(const Facts& facts)
 // The call that failed last is the one that start-up stopped at.
 std::optional<int> statusOfStop(const StartUp& startUp)
 {
-    for (auto warning = startUp.warnings.rbegin(); warning != startUp.warnings.rend(); ++warning) {
-        if (const std::optional<int> status = statusInWarning(*warning))
-            return status;
-    }
-    return std::nullopt;
+    const auto failed = std::find_if(
+        startUp.warnings.rbegin(), startUp.warnings.rend(),
+        [](const std::string& warning) { return statusInWarning(warning).has_value(); });
+    return failed != startUp.warnings.rend() ? statusInWarning(*failed) : std::nullopt;
 }
 
 } // namespace

@@ -12,6 +12,12 @@
 namespace info {
 namespace {
 
+constexpr char kSelfTestRemedy[] =
+    "Run this again with VYRA_OPENCL_FORCE_FINISH=1. If the numbers are right then, the driver "
+    "does "
+    "not order OpenCL and OpenGL as it promises: let the host run with that variable, and update "
+    "the driver. If they stay wrong, the driver's sharing or its compiler fails.";
+
 std::string milliseconds(double value)
 {
     std::array<char, 32> text{};
@@ -149,8 +155,10 @@ void addSelfTest(Sheet& sheet, const SelfTest& test)
                             : "FAILED: " + test.problem);
     if (test.status != CL_SUCCESS)
         sheet.row("Status", describeStatus(test.status));
-    if (!test.passed)
+    if (!test.passed) {
+        sheet.row("What helps", kSelfTestRemedy);
         return;
+    }
     sheet.row("Building the kernel", milliseconds(test.times.kernelBuild));
     sheet.row("First evaluation", milliseconds(test.times.firstEvaluation));
     sheet.row("Evaluation, median", milliseconds(test.times.evaluation));

@@ -42,7 +42,7 @@ public:
         if (value.isObject())
             checkMembers(where, schema, value.toObject());
         int index = 0;
-        for (const QJsonValue& item : value.toArray())
+        for (const QJsonValue item : value.toArray())
             check(where + "/" + QString::number(index++), schema["items"].toObject(), item);
     }
 
@@ -65,7 +65,7 @@ private:
 
     void checkMembers(const QString& where, const QJsonObject& schema, const QJsonObject& object)
     {
-        for (const QJsonValue& required : schema["required"].toArray()) {
+        for (const QJsonValue required : schema["required"].toArray()) {
             if (!object.contains(required.toString()))
                 complain(where, "lacks " + required.toString());
         }
