@@ -81,9 +81,11 @@ TEST_F(DataTest, MovesTakeOrExchangeHandles)
     calls();
     second = std::move(first);
     EXPECT_EQ(runtime().name(second.buffer().get()), "mem#1");
-    EXPECT_EQ(runtime().name(first.buffer().get()), "mem#2"); // NOLINT(bugprone-use-after-move)
+    EXPECT_EQ(runtime().name(first.buffer().get()),
+              "mem#2"); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
     const TopenCLDataBuffer third(std::move(second));
-    EXPECT_EQ(second.buffer().get(), nullptr); // NOLINT(bugprone-use-after-move)
+    EXPECT_EQ(second.buffer().get(),
+              nullptr); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
     first.setBuffer(first.buffer(), 77);
     EXPECT_EQ(calls(), Lines{});
     EXPECT_EQ(first.descriptor().capacityInBytes(), 77U);

@@ -71,10 +71,12 @@ TEST_F(HolderTest, EachOperationMakesExactlyItsCalls)
     EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#2)"});
 
     Mem moved(std::move(first));
-    EXPECT_EQ(first.get(), nullptr); // NOLINT(bugprone-use-after-move): what a move leaves
+    EXPECT_EQ(first.get(), nullptr); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move):
+                                     // what a move leaves
     moved = std::move(second);
     EXPECT_EQ(runtime().name(moved.get()), "mem#2");
-    EXPECT_EQ(runtime().name(second.get()), "mem#1"); // NOLINT(bugprone-use-after-move)
+    EXPECT_EQ(runtime().name(second.get()),
+              "mem#1"); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
     EXPECT_EQ(calls(), Lines{}) << "moves exchange";
 
     moved.adopt(makeMem()); // mem#3
@@ -111,7 +113,8 @@ TEST_F(HolderTest, EventsKernelsAndProgramsUseTheirOwnCalls)
     const AutoCLObject<cl_event> event = makeEvent();
     calls();
     {
-        const AutoCLObject<cl_event> copy(event);
+        const AutoCLObject<cl_event> copy(
+            event); // NOLINT(performance-unnecessary-copy-initialization)
     }
     EXPECT_EQ(calls(), (Lines{"clRetainEvent(event#1)", "clReleaseEvent(event#1)"}));
 
@@ -126,8 +129,10 @@ TEST_F(HolderTest, EventsKernelsAndProgramsUseTheirOwnCalls)
     kernel.adopt(ocl.clCreateKernel(program.get(), source, nullptr));
     calls();
     {
-        const AutoCLObject<cl_kernel> kernelCopy(kernel);
-        const AutoCLObject<cl_program> programCopy(program);
+        const AutoCLObject<cl_kernel> kernelCopy(
+            kernel); // NOLINT(performance-unnecessary-copy-initialization)
+        const AutoCLObject<cl_program> programCopy(
+            program); // NOLINT(performance-unnecessary-copy-initialization)
     }
     EXPECT_EQ(calls(), (Lines{"clRetainKernel(kernel#1)", "clRetainProgram(program#1)",
                               "clReleaseProgram(program#1)", "clReleaseKernel(kernel#1)"}));

@@ -109,9 +109,9 @@ TEST_F(KernelStoreTest, KernelsComeBackInAnyOrder)
     startStore();
     std::mt19937 random(4); // any number: the orders only have to vary
     for (int round = 0; round < 30; ++round) {
-        std::vector<Kernel> kernels;
-        for (int i = 0; i < 9; ++i)
-            kernels.push_back(fromText(i % 2 ? "skin" : "wave", "", i % 3 ? "a" : "b"));
+        std::vector<Kernel> kernels(9);
+        for (std::size_t i = 0; i < kernels.size(); ++i)
+            kernels[i] = fromText(i % 2 ? "skin" : "wave", "", i % 3 ? "a" : "b");
         std::shuffle(kernels.begin(), kernels.end(), random);
         for (const Kernel& kernel : kernels)
             ASSERT_TRUE(fStore->freeKernel(kernel));

@@ -10,6 +10,8 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <barrier>
+#include <filesystem>
+#include <fstream>
 #include <functional>
 #include <thread>
 
@@ -56,15 +58,20 @@ TEST_F(ThreadTest, KernelRequestsTakeTurns)
 {
     startWith("1", "1");
     TopenCLKernelStore& store = TopenCLInfo::theOne().kernelStore();
-    onThreads([&store](int thread) {
-        const char* const names[] = {"a", "b", "c"};
+    const std::string file = testing::TempDir() + "vyra-threads.cl";
+    std::ofstream(file) << "skin";
+    onThreads([&](int thread) {
+        const char* const names[] = {"a", "b", file.c_str()};
         for (int round = 0; round < kRounds; ++round) {
             const char* name = names[(thread + round) % 3];
-            const auto kernel = store.getKernelFromString("skin", name, "", "skin", nullptr);
+            const auto kernel = name == file
+                                    ? store.getKernel(name, "", "skin", nullptr)
+                                    : store.getKernelFromString("skin", name, "", "skin", nullptr);
             EXPECT_NE(kernel.get(), nullptr);
             EXPECT_TRUE(store.freeKernel(kernel));
         }
     });
+    std::filesystem::remove(file);
 }
 
 TEST_F(ThreadTest, PoolBuffersAreHandedOutOnceAndTakenBackByAnyone)
@@ -120,7 +127,6 @@ TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
     onThreads([&](int thread) {
         const TopenCLSharedBuffer* own = alone[static_cast<std::size_t>(thread)];
         const cl_mem mem = own->fMem.get();
-        std::vector<AutoCLObject<cl_event>> kept(2 * kRounds);
         for (int round = 0; round < kRounds; ++round) {
             cl_event acquired = nullptr;
             manager().EnqueueAcquireSharedCLBuffer(queue(), batched, &acquired);

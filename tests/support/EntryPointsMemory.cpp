@@ -79,9 +79,10 @@ void* clEnqueueMapBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking, c
     Entry call("clEnqueueMapBuffer", queue, mem, blocking, flags, offset, size, list);
     Object* object = usableMem(call, mem);
     call.command(queue, list, event);
-    if (call.ok())
+    const bool mapped = object && call.ok();
+    if (mapped)
         object->mapped = true;
-    return call.result(call.ok() ? mappedAddress(mem) : nullptr, error);
+    return call.result(mapped ? mappedAddress(mem) : nullptr, error);
 }
 
 cl_int clEnqueueUnmapMemObject(cl_command_queue queue, cl_mem mem, void* mapping, cl_uint waitCount,
@@ -93,7 +94,7 @@ cl_int clEnqueueUnmapMemObject(cl_command_queue queue, cl_mem mem, void* mapping
     call.require(object && object->mapped && mapping == mappedAddress(mem), CL_INVALID_VALUE,
                  "not the mapping");
     call.command(queue, list, event);
-    if (call.ok())
+    if (object && call.ok())
         object->mapped = false;
     return call.status();
 }

@@ -21,7 +21,7 @@ cl_int clBuildProgram(cl_program program, cl_uint deviceCount, const cl_device_i
                       const char* options, void(CL_CALLBACK* notify)(cl_program, void*),
                       void* userData)
 {
-    Entry call("clBuildProgram", program, List{deviceCount, devices}, options);
+    Entry call("clBuildProgram", program, List<cl_device_id>{deviceCount, devices}, options);
     Object* object = call.object(Kind::kProgram, program);
     for (cl_uint i = 0; i < deviceCount; ++i)
         call.object(Kind::kDevice, devices[i]);

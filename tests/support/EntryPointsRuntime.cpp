@@ -80,7 +80,8 @@ cl_context clCreateContext(const cl_context_properties* properties, cl_uint devi
                            void(CL_CALLBACK* notify)(const char*, const void*, std::size_t, void*),
                            void* userData, cl_int* error)
 {
-    Entry call("clCreateContext", PropertyList{properties}, List{deviceCount, devices}, userData);
+    Entry call("clCreateContext", PropertyList{properties},
+               List<cl_device_id>{deviceCount, devices}, userData);
     for (cl_uint i = 0; i < deviceCount; ++i)
         call.object(Kind::kDevice, devices[i]);
     call.rememberNotify(notify);
