@@ -284,6 +284,19 @@ TEST_F(BufferTest, AGrowingUploadWaitsForTheWaitListFirst)
     EXPECT_EQ(calls().front(), "clWaitForEvents([event#1]) ! -5");
 }
 
+TEST_F(BufferTest, AssigningToACountedBufferTakesItsCountAwayOnce)
+{
+    TopenCLBuffer source;
+    source.ensureBufferCapacity(kSize);
+    {
+        TopenCLBuffer target;
+        target.ensureBufferCapacity(8);
+        target = source; // which shares memory that the target does not count
+        EXPECT_EQ(deviceMemory(), kSize);
+    }
+    EXPECT_EQ(deviceMemory(), kSize);
+}
+
 TEST_F(BufferTest, ConstructorsCreateWhatTheyAreAskedFor)
 {
     int error = 1;

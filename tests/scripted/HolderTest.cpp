@@ -71,8 +71,9 @@ TEST_F(HolderTest, EachOperationMakesExactlyItsCalls)
     EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#2)"});
 
     Mem moved(std::move(first));
-    EXPECT_EQ(first.get(), nullptr); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move):
-                                     // what a move leaves
+    EXPECT_EQ(first.get(),
+              nullptr); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move):
+                        // what a move leaves
     moved = std::move(second);
     EXPECT_EQ(runtime().name(moved.get()), "mem#2");
     EXPECT_EQ(runtime().name(second.get()),
