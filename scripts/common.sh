@@ -40,13 +40,14 @@ run_quietly() {
     fi
 }
 
-# Configures and builds a preset; its files are in build/PRESET.
+# Configures, with the further arguments given, and builds a preset; its files are in build/PRESET.
 build_preset() {
     local preset=$1 build_dir=$project_dir/build/$1
+    shift
     mkdir -p "$build_dir"
     printf 'Building (%s) ...\n' "$preset"
     cd "$project_dir"
-    run_quietly "$build_dir/configure.log" cmake --preset "$preset"
+    run_quietly "$build_dir/configure.log" cmake --preset "$preset" "$@"
     run_quietly "$build_dir/build.log" cmake --build --preset "$preset"
 }
 

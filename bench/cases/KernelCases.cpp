@@ -1,0 +1,227 @@
+// The kernel store: cache hits, and giving kernels back.
+#include "cases/Cases.h"
+#include "cases/Programs.h"
+#include "diagnostics/AutoCLObject.h"
+#include "harness/TwoThreads.h"
+#include "kernels/TopenCLKernelStore.h"
+#include "runtime/TopenCLInfo.h"
+
+#include <algorithm>
+#include <memory>
+#include <numeric>
+#include <random>
+#include <stdexcept>
+
+namespace {
+
+using Kernel = AutoCLObject<cl_kernel>;
+
+TopenCLKernelStore& store()
+{
+    return TopenCLInfo::theOne().kernelStore();
+}
+
+Kernel getKernel(const KernelRequest& request)
+{
+    return store().getKernel(request.path.c_str(), request.flags.c_str(),
+                             KernelRequest::kKernelName, &request.includeDirs);
+}
+
+cl_kernel createKernel(cl_program program)
+{
+    cl_int status = CL_SUCCESS;
+    return clCreateKernel(program, KernelRequest::kKernelName, &status);
+}
+
+// Programs that stay cached, since one kernel of each is never given back.
+struct CachedPrograms {
+    Programs programs;
+    std::vector<Kernel> held;
+    std::vector<cl_kernel> heldByHand;
+
+    CachedPrograms(std::size_t count, Programs::Texts texts) : programs(count, texts)
+    {
+        for (const KernelRequest& request : programs.requests()) {
+            held.push_back(getKernel(request));
+            if (!held.back().get())
+                throw std::runtime_error("the store gives no kernel of " + request.path);
+        }
+        for (cl_program program : programs.built())
+            heldByHand.push_back(createKernel(program));
+    }
+    ~CachedPrograms()
+    {
+        for (const Kernel& kernel : held)
+            store().freeKernel(kernel);
+        for (cl_kernel kernel : heldByHand)
+            clReleaseKernel(kernel);
+    }
+    CachedPrograms(const CachedPrograms&) = delete;
+    CachedPrograms& operator=(const CachedPrograms&) = delete;
+
+    // One kernel of each program in turn, asked for and given back.
+    void takeTurns(std::size_t count) const
+    {
+        const auto& requests = programs.requests();
+        for (std::size_t index = 0; index < count; ++index)
+            store().freeKernel(getKernel(requests[index % requests.size()]));
+    }
+    // The calls that this must make.
+    void takeTurnsByHand(std::size_t count) const
+    {
+        const auto& built = programs.built();
+        for (std::size_t index = 0; index < count; ++index) {
+            cl_kernel kernel = createKernel(built[index % built.size()]);
+            clRetainKernel(kernel);
+            clReleaseKernel(kernel);
+            clReleaseKernel(kernel);
+        }
+    }
+};
+
+Group hits(const std::string& name, std::size_t keys, Programs::Texts texts, double limit)
+{
+    const auto cached = std::make_shared<CachedPrograms>(keys, texts);
+    return {
+        name,
+        {{"create, retain, 2 releases",
+          [cached](std::size_t count) { return timed([&] { cached->takeTurnsByHand(count); }); }},
+         {"getKernel, freeKernel",
+          [cached](std::size_t count) { return timed([&] { cached->takeTurns(count); }); },
+          Goal::ratio(limit)}}};
+}
+
+// Per call of either thread.
+Group hitsOnTwoThreads(const std::string& name)
+{
+    constexpr double kLimit = 2;
+    const auto cached = std::make_shared<CachedPrograms>(1, Programs::Texts::kShort);
+    const auto threads = std::make_shared<TwoThreads>();
+    return {name,
+            {{"one thread",
+              [cached](std::size_t count) { return timed([&] { cached->takeTurns(count); }); }},
+             {"two threads",
+              [cached, threads](std::size_t count) {
+                  return threads->timedTogether([&](std::size_t) { cached->takeTurns(count); });
+              },
+              Goal::ratio(kLimit)},
+             {"bare calls, two threads",
+              [cached, threads](std::size_t count) {
+                  return threads->timedTogether(
+                      [&](std::size_t) { cached->takeTurnsByHand(count); });
+              }}},
+            true};
+}
+
+// A number of kernels outstanding, over programs that stay cached. Some are given back and replaced
+// by new ones, over and over, in an order that has nothing to do with that of their creation.
+class Outstanding {
+public:
+    static constexpr std::size_t kPrograms = 64;
+    static constexpr std::size_t kBatch = 8; // given back between two looks at the clock
+
+    explicit Outstanding(std::size_t count) : fCached(kPrograms, Programs::Texts::kShort)
+    {
+        for (std::size_t index = 0; index < count; ++index) {
+            fKernels.push_back(getKernel(request(index)));
+            fByHand.push_back(createByHand(index));
+        }
+        fOrder.resize(count);
+        std::iota(fOrder.begin(), fOrder.end(), 0);
+        std::shuffle(fOrder.begin(), fOrder.end(), std::mt19937(1));
+    }
+    ~Outstanding()
+    {
+        for (const Kernel& kernel : fKernels)
+            store().freeKernel(kernel);
+        for (cl_kernel kernel : fByHand) {
+            clReleaseKernel(kernel);
+            clReleaseKernel(kernel);
+        }
+    }
+    Outstanding(const Outstanding&) = delete;
+    Outstanding& operator=(const Outstanding&) = delete;
+
+    Nanoseconds replace()
+    {
+        const Nanoseconds time = timed([&] {
+            for (std::size_t step = 0; step < kBatch; ++step)
+                store().freeKernel(fKernels[at(step)]);
+        });
+        for (std::size_t step = 0; step < kBatch; ++step)
+            fKernels[at(step)] = getKernel(request(at(step)));
+        fNext += kBatch;
+        return time;
+    }
+
+    // The store's release is the first of two.
+    Nanoseconds replaceByHand()
+    {
+        const Nanoseconds time = timed([&] {
+            for (std::size_t step = 0; step < kBatch; ++step)
+                clReleaseKernel(fByHand[at(step)]);
+        });
+        for (std::size_t step = 0; step < kBatch; ++step) {
+            clReleaseKernel(fByHand[at(step)]);
+            fByHand[at(step)] = createByHand(at(step));
+        }
+        fNext += kBatch;
+        return time;
+    }
+
+private:
+    std::size_t at(std::size_t step) const { return fOrder[(fNext + step) % fOrder.size()]; }
+    const KernelRequest& request(std::size_t index) const
+    {
+        return fCached.programs.requests()[index % kPrograms];
+    }
+    cl_kernel createByHand(std::size_t index) const
+    {
+        cl_kernel kernel = createKernel(fCached.programs.built()[index % kPrograms]);
+        clRetainKernel(kernel);
+        return kernel;
+    }
+
+    CachedPrograms fCached;
+    std::vector<Kernel> fKernels;
+    std::vector<cl_kernel> fByHand;
+    std::vector<std::size_t> fOrder;
+    std::size_t fNext = 0;
+};
+
+Group givingBack(const std::string& name, std::size_t count, Goal goal)
+{
+    const auto outstanding = std::make_shared<Outstanding>(count);
+    const auto repeat = [outstanding](Nanoseconds (Outstanding::*replace)()) {
+        return [outstanding, replace](std::size_t iterations) {
+            Nanoseconds time{0};
+            for (std::size_t index = 0; index < iterations; ++index)
+                time += (*outstanding.*replace)();
+            return time;
+        };
+    };
+    return {name,
+            {{"release", repeat(&Outstanding::replaceByHand), {}, Outstanding::kBatch},
+             {"freeKernel", repeat(&Outstanding::replace), goal, Outstanding::kBatch}}};
+}
+
+} // namespace
+
+std::vector<GroupMaker> kernelGroups()
+{
+    constexpr double kOneKey = 1.2;
+    constexpr double kManyKeys = 1.35;
+    const auto maker = [](const std::string& name, auto make, auto... arguments) {
+        return GroupMaker{name, [=] { return make(name, arguments...); }};
+    };
+    std::vector<GroupMaker> groups{
+        maker("getKernel hit, 1 key", hits, 1u, Programs::Texts::kShort, kOneKey),
+        maker("getKernel hit, 32 keys, long texts", hits, 32u, Programs::Texts::kLong, kManyKeys),
+        maker("getKernel hit, two threads", hitsOnTwoThreads)};
+    for (const std::size_t count : {16u, 64u, 256u, 1024u}) {
+        const Goal goal = count == 256 ? Goal::extraNanoseconds(1000) : Goal();
+        groups.push_back(maker("freeKernel, " + std::to_string(count) + " outstanding", givingBack,
+                               count, goal));
+    }
+    return groups;
+}
