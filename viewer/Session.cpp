@@ -151,15 +151,16 @@ Status Session::renderFrame(double seconds)
     const auto end = std::chrono::steady_clock::now();
     fEvaluationMs.push_back(std::chrono::duration<double, std::milli>(end - begin).count());
 
-    {
-        const ProfileScope scope("Draw");
-        fRenderer->draw(*fScene, fCamera, *fCanvas);
-    }
+    // Before the drawing, which takes so long that it would hide a wait that is missing.
     if (fOptions.verify) {
         const ProfileScope scope("Verify");
         if (!fDeviation)
             fDeviation.emplace();
         fDeviation->include(verify(*fGL, *fScene));
+    }
+    {
+        const ProfileScope scope("Draw");
+        fRenderer->draw(*fScene, fCamera, *fCanvas);
     }
     if (fEvaluation)
         fEvaluation->renderingComplete();
