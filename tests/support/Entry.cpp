@@ -134,7 +134,7 @@ cl_int Entry::answer(cl_uint query, const void* data, std::size_t size, std::siz
     }
     if (!ok() || !require(!value || room >= size, CL_INVALID_VALUE, "no room for the answer"))
         return fStatus;
-    if (value)
+    if (value && size > 0)
         std::memcpy(value, data, size);
     if (sizeReturned)
         *sizeReturned = size;
