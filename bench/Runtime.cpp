@@ -1,21 +1,11 @@
 #include "Runtime.h"
 
 #include "runtime/TopenCLInfo.h"
+#include "standalone/NativeContext.h"
 
 #include <stdexcept>
 
-#include <QtGui/qopenglcontext_platform.h>
-
 namespace {
-
-void* nativeContext(const QOpenGLContext& context)
-{
-    if (auto* glx = context.nativeInterface<QNativeInterface::QGLXContext>())
-        return glx->nativeContext();
-    if (auto* egl = context.nativeInterface<QNativeInterface::QEGLContext>())
-        return egl->nativeContext();
-    return nullptr;
-}
 
 std::string platformText(cl_platform_id platform, cl_platform_info name)
 {

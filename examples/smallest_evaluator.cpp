@@ -3,6 +3,7 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 #include "standalone/GLHost.h"
+#include "standalone/NativeContext.h"
 
 #include <CL/cl.h>
 #include <QGuiApplication>
@@ -12,8 +13,6 @@
 #include <cstdio>
 #include <vector>
 
-#include <QtGui/qopenglcontext_platform.h>
-
 constexpr const char* kSource = R"(
 __kernel void raise(__global float* heights, float amount, uint count)
 {
@@ -21,15 +20,6 @@ __kernel void raise(__global float* heights, float amount, uint count)
     if (index < count) // the work-items beyond the count are padding
         heights[index] += amount;
 })";
-
-// The renderer's own handle of its OpenGL context.
-static void* nativeContext(const QOpenGLContext& context)
-{
-    if (auto* glx = context.nativeInterface<QNativeInterface::QGLXContext>())
-        return glx->nativeContext();
-    auto* egl = context.nativeInterface<QNativeInterface::QEGLContext>();
-    return egl ? egl->nativeContext() : nullptr;
-}
 
 int main(int argc, char** argv)
 {

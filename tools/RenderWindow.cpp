@@ -1,11 +1,11 @@
 #include "tools/RenderWindow.h"
 
+#include "standalone/NativeContext.h"
 #include "viewer/GraphicsVendor.h"
 
 #include <string_view>
 
 #include <QOpenGLFunctions>
-#include <qopenglcontext_platform.h>
 
 namespace info {
 namespace {
@@ -89,13 +89,7 @@ void RenderWindow::open()
 
 void* RenderWindow::nativeContext() const
 {
-    if (!fFacts.usable)
-        return nullptr;
-    if (auto* glx = fContext->nativeInterface<QNativeInterface::QGLXContext>())
-        return glx->nativeContext();
-    if (auto* egl = fContext->nativeInterface<QNativeInterface::QEGLContext>())
-        return egl->nativeContext();
-    return nullptr;
+    return fFacts.usable ? ::nativeContext(*fContext) : nullptr;
 }
 
 } // namespace info

@@ -2,6 +2,7 @@
 
 #include "host/Environment.h"
 #include "runtime/TopenCLInfo.h"
+#include "standalone/NativeContext.h"
 #include "viewer/GraphicsVendor.h"
 #include "viewer/OpenCLPlatforms.h"
 
@@ -11,31 +12,11 @@
 #include <QOpenGLContext>
 #include <QOpenGLFunctions>
 #include <QOpenGLWindow>
-#include <qopenglcontext_platform.h>
 
 namespace viewer {
 namespace {
 
 constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
-
-// The window system's own handle of the context, which OpenCL wants to hear.
-void* nativeContext(QOpenGLContext& context)
-{
-#if defined(Q_OS_WIN)
-    if (auto* wgl = context.nativeInterface<QNativeInterface::QWGLContext>())
-        return wgl->nativeContext();
-#else
-#if QT_CONFIG(xcb_glx_plugin)
-    if (auto* glx = context.nativeInterface<QNativeInterface::QGLXContext>())
-        return glx->nativeContext();
-#endif
-#if QT_CONFIG(egl)
-    if (auto* egl = context.nativeInterface<QNativeInterface::QEGLContext>())
-        return egl->nativeContext();
-#endif
-#endif
-    return nullptr;
-}
 
 std::string glText(QOpenGLContext& context, unsigned name)
 {

@@ -3,23 +3,9 @@
 #include "host/Tstring.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
+#include "standalone/NativeContext.h"
 
 #include <cstdlib>
-
-#include <QtGui/qopenglcontext_platform.h>
-
-namespace {
-
-void* nativeContext(const QOpenGLContext& context)
-{
-    if (auto* glx = context.nativeInterface<QNativeInterface::QGLXContext>())
-        return glx->nativeContext();
-    if (auto* egl = context.nativeInterface<QNativeInterface::QEGLContext>())
-        return egl->nativeContext();
-    return nullptr;
-}
-
-} // namespace
 
 void LibraryTest::start(std::initializer_list<Variable> environment)
 {
