@@ -76,17 +76,18 @@ Status Evaluation::evaluate(const em::Id& id, const std::function<Status()>& whi
     TopenCLInfo& info = TopenCLInfo::theOne();
     TopenCLSharedBufferMgr& manager = info.sharedBufferMgr();
 
+    // Opening takes every buffer of the batch from the renderer with one command.
     if (info.useGLFinish())
         fGL.glFinish();
     manager.PreEvaluate(id);
-    Status failure = whileOpen();
-    // A thread without an OpenGL context acquires a buffer outside the batch, and no mode orders
-    // that behind the renderer's commands.
-    if (!allBatched())
-        fGL.glFinish();
 
+    // The deformers only enqueue, and hand over the events of their last commands.
+    Status failure = whileOpen();
+    finishDrawingOfSingles();
     if (!failure)
         failure = deformMeshes();
+
+    // Closing gives every buffer back once those events are complete.
     if (Status unreleased = releaseSingles(); !failure)
         failure = unreleased;
     manager.PostEvaluate(id);
@@ -94,6 +95,14 @@ Status Evaluation::evaluate(const em::Id& id, const std::function<Status()>& whi
 
     countCommands();
     return failure;
+}
+
+// A buffer outside the batch is acquired on a thread without an OpenGL context, and no mode orders
+// that behind the renderer's commands.
+void Evaluation::finishDrawingOfSingles()
+{
+    if (!allBatched())
+        fGL.glFinish();
 }
 
 Status Evaluation::deformMeshes()

@@ -57,6 +57,7 @@ public:
     EvaluationCounts counts() const;
 
 private:
+    void finishDrawingOfSingles();
     Status deformMeshes();
     Status releaseSingles();
     bool allBatched() const;
