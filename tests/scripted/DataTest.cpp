@@ -74,6 +74,8 @@ TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
     }
 }
 
+// What a move leaves behind is what this test looks at.
+// NOLINTBEGIN(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 TEST_F(DataTest, MovesTakeOrExchangeHandles)
 {
     TopenCLDataBuffer first = makeData();  // mem#1
@@ -81,15 +83,14 @@ TEST_F(DataTest, MovesTakeOrExchangeHandles)
     calls();
     second = std::move(first);
     EXPECT_EQ(runtime().name(second.buffer().get()), "mem#1");
-    EXPECT_EQ(runtime().name(first.buffer().get()),
-              "mem#2"); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
+    EXPECT_EQ(runtime().name(first.buffer().get()), "mem#2");
     const TopenCLDataBuffer third(std::move(second));
-    EXPECT_EQ(second.buffer().get(),
-              nullptr); // NOLINT(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
+    EXPECT_EQ(second.buffer().get(), nullptr);
     first.setBuffer(first.buffer(), 77);
     EXPECT_EQ(calls(), Lines{});
     EXPECT_EQ(first.descriptor().capacityInBytes(), 77U);
 }
+// NOLINTEND(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 
 TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
 {

@@ -17,7 +17,7 @@ std::string bracketed(const Lines& names)
 
 std::string SharedBufferModel::newEvent()
 {
-    const std::string name = "event#" + std::to_string(++fCreated.events);
+    std::string name = "event#" + std::to_string(++fCreated.events);
     fReferences[name] = 1;
     return name;
 }

@@ -27,6 +27,7 @@ void onThreads(const std::function<void(int)>& body)
 {
     std::barrier start(kThreads);
     std::vector<std::jthread> threads;
+    threads.reserve(kThreads);
     for (int thread = 0; thread < kThreads; ++thread) {
         threads.emplace_back([&, thread] {
             start.arrive_and_wait();
@@ -88,7 +89,7 @@ TEST_F(ThreadTest, PoolBuffersAreHandedOutOnceAndTakenBackByAnyone)
     std::set<cl_mem> distinct;
     for (const auto& list : taken)
         distinct.insert(list.begin(), list.end());
-    EXPECT_EQ(distinct.size(), std::size_t{kThreads * kRounds});
+    EXPECT_EQ(distinct.size(), kThreads * std::size_t{kRounds});
 
     onThreads([&](int) {
         for (int round = 0; round < kRounds; ++round) {
@@ -139,7 +140,7 @@ TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
     calls();
     manager().PostEvaluate(em::Id(1));
     const Lines released = callsOf("clReleaseEvent(event#1)");
-    EXPECT_EQ(released.size(), std::size_t{kThreads * kRounds + 1});
+    EXPECT_EQ(released.size(), kThreads * std::size_t{kRounds} + 1);
     manager().DestroySharedCLBuffer(batched);
     for (const auto* buffer : alone)
         manager().DestroySharedCLBuffer(buffer);

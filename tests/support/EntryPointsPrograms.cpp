@@ -62,7 +62,7 @@ cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
     Entry call("clCreateKernel", program, name);
     const Object* object = call.object(Kind::kProgram, program);
     call.require(!object || object->built, CL_INVALID_PROGRAM_EXECUTABLE, "not built");
-    if (call.ok() && object->source.find(name) == std::string::npos)
+    if (call.ok() && object && object->source.find(name) == std::string::npos)
         call.answerWith(CL_INVALID_KERNEL_NAME);
     return call.result(call.create<cl_kernel>(Kind::kKernel), error);
 }
