@@ -42,6 +42,21 @@ void turnWheel(QWindow& window, int notches)
     QCoreApplication::sendEvent(&window, &event);
 }
 
+// Calls once from the event loop, if it lives long enough.
+class Later {
+public:
+    template <typename Action>
+    Later(int milliseconds, Action action)
+    {
+        fTimer.setSingleShot(true);
+        fTimer.callOnTimeout(action);
+        fTimer.start(milliseconds);
+    }
+
+private:
+    QTimer fTimer;
+};
+
 class WindowTest : public testing::Test {
 protected:
     void SetUp() override
@@ -80,10 +95,7 @@ protected:
             if (--left == 0)
                 press(*fWindow, Qt::Key_Escape);
         });
-        QTimer hang;
-        hang.setSingleShot(true);
-        QObject::connect(&hang, &QTimer::timeout, [] { QGuiApplication::exit(); });
-        hang.start(kHangMs);
+        const Later hang(kHangMs, [] { QGuiApplication::exit(); });
         fWindow->play(*fSession);
         QGuiApplication::exec();
         QObject::disconnect(counting);
@@ -110,7 +122,7 @@ TEST_F(WindowTest, PlaysUntilEscapeWithEveryFrameRight)
 
 TEST_F(WindowTest, OrbitsZoomsAndResizes)
 {
-    QTimer::singleShot(0, [&] {
+    const Later act(0, [&] {
         const QVector3D eye = fSession->camera().eye();
         moveMouse(*fWindow, QEvent::MouseButtonPress, {10, 10});
         moveMouse(*fWindow, QEvent::MouseMove, {60, 10});
@@ -135,7 +147,7 @@ TEST_F(WindowTest, TheDetailKeyReplacesTheVertexBuffers)
 {
     const std::string before = fSession->report();
     press(*fWindow, Qt::Key_D); // without effect: nothing plays yet
-    QTimer::singleShot(0, [&] { press(*fWindow, Qt::Key_D); });
+    const Later act(0, [&] { press(*fWindow, Qt::Key_D); });
     EXPECT_TRUE(playFor(4));
     EXPECT_TRUE(fSession->verified());
     EXPECT_NE(before.find("3205 vertices"), std::string::npos) << before;
