@@ -1,5 +1,7 @@
 #include "Schema.h"
 
+#include <algorithm>
+
 #include <QFile>
 #include <QJsonArray>
 #include <QJsonDocument>
@@ -7,37 +9,30 @@
 
 namespace {
 
-QString typeName(const QJsonValue& value)
+bool isOfType(const QJsonValue& value, const QString& type)
 {
-    switch (value.type()) {
-    case QJsonValue::Null:
-        return "null";
-    case QJsonValue::Bool:
-        return "boolean";
-    case QJsonValue::Double:
-        return value.toDouble() == static_cast<double>(value.toInteger()) ? "integer" : "number";
-    case QJsonValue::String:
-        return "string";
-    case QJsonValue::Array:
-        return "array";
-    case QJsonValue::Object:
-        return "object";
-    default:
-        return "undefined";
-    }
+    if (type == "integer")
+        return value.isDouble() && value == QJsonValue(value.toInteger());
+    // As they stand in QJsonValue::Type.
+    constexpr const char* kTypes[] = {"null", "boolean", "number", "string", "array", "object"};
+    return type == kTypes[value.type()];
 }
 
-class Checker {
-public:
-    explicit Checker(QJsonObject root) : fRoot(std::move(root)) {}
+struct Checker {
+    QJsonObject definitions;
+    std::vector<std::string> violations;
+
+    void expect(bool right, const QString& where, const char* wrong)
+    {
+        if (!right)
+            violations.push_back((where + wrong).toStdString());
+    }
 
     void check(const QString& where, QJsonObject schema, const QJsonValue& value)
     {
         if (schema.contains("$ref"))
-            schema =
-                fRoot["$defs"].toObject()[schema["$ref"].toString().section('/', -1)].toObject();
-        if (schema.isEmpty())
-            complain(where, "has an empty schema");
+            schema = definitions[schema["$ref"].toString().section('/', -1)].toObject();
+        expect(!schema.isEmpty(), where, " is not described");
         checkValue(where, schema, value);
         if (value.isObject())
             checkMembers(where, schema, value.toObject());
@@ -46,44 +41,31 @@ public:
             check(where + "/" + QString::number(index++), schema["items"].toObject(), item);
     }
 
-    std::vector<std::string> takeViolations() { return std::move(fViolations); }
-
-private:
     void checkValue(const QString& where, const QJsonObject& schema, const QJsonValue& value)
     {
-        const QString type = typeName(value);
-        const QJsonValue types = schema["type"];
-        const QJsonArray allowed = types.isString() ? QJsonArray{types} : types.toArray();
-        const bool isNumber = type == "integer" && allowed.contains("number");
-        if (!types.isUndefined() && !allowed.contains(type) && !isNumber)
-            complain(where, "is of type " + type);
-        if (schema.contains("enum") && !schema["enum"].toArray().contains(value))
-            complain(where, "is none of the values allowed");
-        if (schema.contains("const") && schema["const"] != value)
-            complain(where, "is not the one value allowed");
+        const auto fits = [&](const char* keyword, const auto& fitsOne) {
+            const QJsonValue allowed = schema[keyword];
+            const QJsonArray list = allowed.isArray() ? allowed.toArray() : QJsonArray{allowed};
+            return allowed.isUndefined() || std::any_of(list.begin(), list.end(), fitsOne);
+        };
+        const auto equals = [&](const QJsonValue& allowed) { return value == allowed; };
+        expect(fits("type", [&](auto type) { return isOfType(value, type.toString()); }), where,
+               " is of the wrong type");
+        expect(fits("enum", equals) && fits("const", equals), where, " has a wrong value");
     }
 
     void checkMembers(const QString& where, const QJsonObject& schema, const QJsonObject& object)
     {
-        for (const QJsonValue required : schema["required"].toArray()) {
-            if (!object.contains(required.toString()))
-                complain(where, "lacks " + required.toString());
-        }
+        for (const QJsonValue name : schema["required"].toArray())
+            expect(object.contains(name.toString()), where + "/" + name.toString(), " is missing");
         const QJsonObject properties = schema["properties"].toObject();
-        const QJsonObject others = schema["additionalProperties"].toObject();
         for (auto member = object.begin(); member != object.end(); ++member) {
-            const QJsonObject own = properties[member.key()].toObject();
-            check(where + "/" + member.key(), own.isEmpty() ? others : own, member.value());
+            const QJsonValue own = properties.value(member.key());
+            check(where + "/" + member.key(),
+                  (own.isUndefined() ? schema["additionalProperties"] : own).toObject(),
+                  member.value());
         }
     }
-
-    void complain(const QString& where, const QString& what)
-    {
-        fViolations.push_back((where + " " + what).toStdString());
-    }
-
-    QJsonObject fRoot;
-    std::vector<std::string> fViolations;
 };
 
 } // namespace
@@ -94,7 +76,7 @@ std::vector<std::string> schemaViolations(const char* schemaFile, const QJsonVal
     if (!file.open(QIODevice::ReadOnly))
         return {"the schema cannot be read"};
     const QJsonObject root = QJsonDocument::fromJson(file.readAll()).object();
-    Checker checker(root);
+    Checker checker{root["$defs"].toObject(), {}};
     checker.check("", root, value);
-    return checker.takeViolations();
+    return checker.violations;
 }

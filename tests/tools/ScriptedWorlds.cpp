@@ -3,20 +3,21 @@
 #include "FakeRuntime.h"
 
 #include <cstdlib>
+#include <map>
 #include <string_view>
 
 namespace {
 
 using scripted::World;
 
-struct NamedWorld {
-    std::string_view name;
-    void (*change)(World& world);
-    const char* failing = nullptr; // the function that fails, always
+struct Change {
+    void (*world)(World& world);
+    const char* failing = nullptr; // the function that fails
     cl_int status = CL_SUCCESS;
+    unsigned nth = 1; // the first call that fails, all later ones do, too
 };
 
-void changeNothing(World&) {}
+void nothing(World&) {}
 
 void makeNVIDIA(World& world, const char* driver)
 {
@@ -24,37 +25,39 @@ void makeNVIDIA(World& world, const char* driver)
     world.platforms[0].devices[0].driverVersion = driver;
 }
 
-constexpr NamedWorld kWorlds[] = {
-    {"ordinary", changeNothing},
-    {"no-platform", [](World& world) { world.platforms.clear(); }},
-    {"two-platforms", [](World& world) { world.platforms.resize(2); }},
-    {"cpu", [](World& world) { world.platforms[0].devices[0].type = CL_DEVICE_TYPE_CPU; }},
-    {"refused-driver", [](World& world) { makeNVIDIA(world, "365.10"); }},
-    {"old-driver", [](World& world) { makeNVIDIA(world, "384.00"); }},
-    {"no-acquire", [](World& world) { world.missing.insert("clEnqueueAcquireGLObjects"); }},
-    {"unavailable", [](World& world) { world.platforms[0].devices[0].available = false; }},
-    {"no-double", [](World& world) { world.platforms[0].devices[0].doublePrecision = 0; }},
-    {"no-gl-event", [](World& world) { world.platforms[0].extensions = "cl_khr_gl_sharing"; }},
-    {"context-unknown", changeNothing, "clGetGLContextInfoKHR", -1000},
-    {"no-context", changeNothing, "clCreateContext", -9999},
-    {"no-queue", changeNothing, "clCreateCommandQueue", CL_INVALID_QUEUE_PROPERTIES},
-    {"no-buffer", changeNothing, "clCreateFromGLBuffer", CL_INVALID_GL_OBJECT},
+const std::map<std::string_view, Change> kChanges = {
+    {"ordinary", {nothing}},
+    {"no-platform", {[](World& world) { world.platforms.clear(); }}},
+    {"two-platforms", {[](World& world) { world.platforms.resize(2); }}},
+    {"cpu", {[](World& world) { world.platforms[0].devices[0].type = CL_DEVICE_TYPE_CPU; }}},
+    {"refused-driver", {[](World& world) { makeNVIDIA(world, "365.10"); }}},
+    {"old-driver", {[](World& world) { makeNVIDIA(world, "384.00"); }}},
+    {"no-acquire", {[](World& world) { world.missing.insert("clEnqueueAcquireGLObjects"); }}},
+    {"unavailable", {[](World& world) { world.platforms[0].devices[0].available = false; }}},
+    {"no-double", {[](World& world) { world.platforms[0].devices[0].doublePrecision = 0; }}},
+    {"no-gl-event", {[](World& world) { world.platforms[0].extensions = "cl_khr_gl_sharing"; }}},
+    {"context-unknown", {nothing, "clGetGLContextInfoKHR", -1000}},
+    {"no-device-type", {nothing, "clGetDeviceInfo", CL_INVALID_VALUE, 3}},
+    {"no-float-config", {nothing, "clGetDeviceInfo", CL_INVALID_VALUE, 5}},
+    {"no-driver-version",
+     {[](World& world) { makeNVIDIA(world, "400.00"); }, "clGetDeviceInfo", CL_INVALID_VALUE, 2}},
+    {"no-context", {[](World& world) { makeNVIDIA(world, "400.00"); }, "clCreateContext", -9999}},
+    {"no-queue", {nothing, "clCreateCommandQueue", CL_INVALID_QUEUE_PROPERTIES}},
+    {"no-buffer", {nothing, "clCreateFromGLBuffer", CL_INVALID_GL_OBJECT}},
 };
 
 const bool kDescribed = [] {
-    const char* wanted = std::getenv("INFO_WORLD");
-    for (const NamedWorld& named : kWorlds) {
-        if (!wanted || named.name != wanted)
-            continue;
-        World world;
-        named.change(world);
-        scripted::runtime().describe(world);
-        if (named.failing)
-            scripted::runtime().plan(
-                {.function = named.failing, .status = named.status, .onwards = true});
-        return true;
-    }
-    std::abort(); // a test that names no world would test nothing
+    const char* name = std::getenv("INFO_WORLD");
+    const Change& change = kChanges.at(name ? name : ""); // throws: it would test nothing
+    World world;
+    change.world(world);
+    scripted::runtime().describe(world);
+    if (change.failing)
+        scripted::runtime().plan({.function = change.failing,
+                                  .status = change.status,
+                                  .nth = change.nth,
+                                  .onwards = true});
+    return true;
 }();
 
 } // namespace
