@@ -30,7 +30,7 @@ class Entry {
 public:
     template <typename... Arguments>
     explicit Entry(const char* function, const Arguments&... arguments)
-        : fGuard(fRuntime.fLock), fLine(function)
+        : fRuntime(runtime()), fGuard(fRuntime.fLock), fLine(function)
     {
         begin(function, {text(arguments)...});
     }
@@ -107,7 +107,7 @@ private:
     void* createHandle(Kind kind);
 
     InsideRuntime fInside;
-    FakeRuntime& fRuntime = runtime();
+    FakeRuntime& fRuntime;
     std::scoped_lock<QuietLock> fGuard;
     std::string fLine;
     std::string fFunction;
