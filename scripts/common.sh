@@ -7,10 +7,11 @@ fail() {
     exit "${2:-1}"
 }
 
-# Installs what scripts/packages.txt names and the machine lacks. Needs root only then.
+# Installs what scripts/packages.txt and the arguments name and the machine lacks. Needs root only then.
 install_packages() {
     local wanted missing=() package
     mapfile -t wanted < <(grep -vE '^[[:space:]]*(#|$)' "$project_dir/scripts/packages.txt")
+    wanted+=("$@")
     command -v dpkg-query >/dev/null ||
         fail "this machine has no Debian packages; install the counterparts of scripts/packages.txt by hand"
     for package in "${wanted[@]}"; do
