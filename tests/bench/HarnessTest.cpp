@@ -1,0 +1,187 @@
+// What the harness measures, concludes and writes. The bodies of cases tell times of their own, so
+// nothing is timed here.
+#include "harness/InstructionCount.h"
+#include "harness/Report.h"
+#include "harness/Table.h"
+
+#include <algorithm>
+#include <fstream>
+#include <sstream>
+
+#include <QTemporaryDir>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing::AllOf, testing::HasSubstr, testing::Not;
+
+constexpr Effort kEffort{5, std::chrono::microseconds(10)};
+
+TEST(Comparison, TimesArePerOperationOfFilledSamplesAndRatiosToTheBaseline)
+{
+    std::size_t longest = 0;
+    // Says that it takes so long per iteration.
+    const auto pretending = [&longest](double nanoseconds) -> Body {
+        return [=, &longest](std::size_t iterations) {
+            longest = std::max(longest, iterations);
+            return Nanoseconds(nanoseconds) * static_cast<double>(iterations);
+        };
+    };
+    std::mt19937 random;
+    const std::vector<Case> cases{{"bare", pretending(200), {}, 2},
+                                  {"twice", pretending(800), {}, 4},
+                                  {"half", pretending(50)}};
+    const GroupResult result = compare({"group", cases}, kEffort, random);
+    ASSERT_EQ(result.cases.size(), 3u);
+    EXPECT_DOUBLE_EQ(result.cases[0].measurement.nanoseconds.median, 100);
+    EXPECT_DOUBLE_EQ(result.cases[1].measurement.nanoseconds.median, 200);
+    EXPECT_DOUBLE_EQ(result.cases[1].measurement.ratio.median, 2);
+    EXPECT_DOUBLE_EQ(result.cases[1].measurement.extraNanoseconds.median, 100);
+    EXPECT_DOUBLE_EQ(result.cases[2].measurement.ratio.high, 0.5);
+    EXPECT_DOUBLE_EQ(result.control.median, 1);
+    EXPECT_GE(longest, 200u) << "10 us of 50 ns each";
+    EXPECT_LE(longest, 400u) << "no more than one doubling too far";
+}
+
+TEST(Comparison, EveryCaseRunsOnceARoundAndTheBaselineAgainAsTheControl)
+{
+    std::vector<int> order;
+    // Each call takes longer than the one before, so the control is not even.
+    const auto noting = [&order](int number) -> Body {
+        return [&order, number](std::size_t iterations) {
+            order.push_back(number);
+            return kEffort.sample * static_cast<double>(iterations + order.size());
+        };
+    };
+    std::mt19937 random(1);
+    const std::vector<Case> cases{{"0", noting(0)}, {"1", noting(1)}, {"2", noting(2)}};
+    const Spread control = compare({"group", cases}, kEffort, random).control;
+    EXPECT_NE(control.low, control.high);
+    order.erase(order.begin(), order.begin() + 3); // which filled a sample at once
+    // A round that lost the processor runs a case again, so these are least numbers.
+    EXPECT_GE(std::count(order.begin(), order.end(), 0), 2 * kEffort.rounds);
+    EXPECT_GE(std::count(order.begin(), order.end(), 1), kEffort.rounds);
+    EXPECT_GE(std::count(order.begin(), order.end(), 2), kEffort.rounds);
+    const auto backwards = [](int one, int next) { return next == one - 1; };
+    EXPECT_NE(std::adjacent_find(order.begin(), order.end(), backwards), order.end()) << "random";
+}
+
+TEST(Statistics, PercentilesLieBetweenTheSamplesWhateverTheirOrder)
+{
+    const std::vector<double> sorted{10, 20, 30, 40, 50};
+    EXPECT_DOUBLE_EQ(percentile(sorted, 0), 10);
+    EXPECT_DOUBLE_EQ(percentile(sorted, 1), 50);
+    EXPECT_DOUBLE_EQ(percentile({7}, 0.9), 7);
+    const auto [median, low, high] = spreadOf({50, 10, 40, 20, 30, 60});
+    EXPECT_THAT((std::vector{low, median, high}), testing::ElementsAre(15, 35, 55));
+    EXPECT_DOUBLE_EQ(spreadOf({}).median, 0);
+}
+
+TEST(Verdicts, FollowFromGoalAndMeasurement)
+{
+    const auto times = [](double median, double extra) {
+        return Measurement{{median, median, median}, {9, 9, 9}, {extra, extra, extra}, {}, {}};
+    };
+    const auto ratios = [](double low, double median, double high,
+                           std::optional<double> byCount = {}) {
+        return Measurement{{}, {median, low, high}, {}, {}, byCount};
+    };
+    const Goal ratio = Goal::ratio(1.2);
+    const struct {
+        const char* description;
+        Goal goal;
+        Measurement measurement;
+        Verdict verdict;
+    } rows[] = {
+        {"no goal", {}, ratios(5, 6, 7), Verdict::kReported},
+        {"at the limit", ratio, ratios(1.1, 1.2, 1.9), Verdict::kMet},
+        {"within, counts beyond", ratio, ratios(1.0, 1.1, 1.3, 1.5), Verdict::kMet},
+        {"beyond, counts within", ratio, ratios(1.3, 1.4, 1.5, 1.1), Verdict::kMissed},
+        {"undecided, no counts", ratio, ratios(1.1, 1.3, 1.5), Verdict::kWithinNoise},
+        {"undecided, counts within", ratio, ratios(1.1, 1.3, 1.5, 1.2), Verdict::kMetByCount},
+        {"undecided, counts beyond", ratio, ratios(1.1, 1.3, 1.5, 1.21), Verdict::kMissed},
+        {"extra time within", Goal::extraNanoseconds(5), times(100, 4), Verdict::kMet},
+        {"extra time beyond", Goal::extraNanoseconds(5), times(100, 6), Verdict::kMissed},
+        {"time within", Goal::nanoseconds(1000), times(900, 800), Verdict::kMet},
+        {"time beyond", Goal::nanoseconds(1000), times(1100, 800), Verdict::kMissed},
+    };
+    for (const auto& row : rows)
+        EXPECT_EQ(judge(row.goal, row.measurement), row.verdict) << row.description;
+}
+
+std::vector<GroupResult> someResults(double ratio)
+{
+    CaseResult ours{"ours", Goal::ratio(1.2), {}};
+    ours.measurement.ratio = {ratio, ratio - 0.05, ratio + 0.05};
+    return {{"group", {{"bare", {}, {}}, ours}, {1, 0.98, 1.03}}};
+}
+
+std::string tableOf(const std::vector<GroupResult>& results)
+{
+    std::ostringstream output;
+    writeTable(output, results);
+    return output.str();
+}
+
+TEST(Results, AMissedGoalStandsOut)
+{
+    EXPECT_THAT(tableOf(someResults(1.3)), HasSubstr("MISSED"));
+    EXPECT_THAT(tableOf(someResults(1.1)), AllOf(HasSubstr("met"), Not(HasSubstr("MISS"))));
+}
+
+TEST(Table, ColumnsAreAligned)
+{
+    Table table({"name", "n"});
+    table.add({"a", "1"});
+    table.add({"long name", "12345"});
+    std::ostringstream output;
+    table.write(output);
+    EXPECT_EQ(output.str(), "| name      |     n |\n"
+                            "| --------- | ----: |\n"
+                            "| a         |     1 |\n"
+                            "| long name | 12345 |\n");
+}
+
+TEST(ResultFiles, InstructionCountsArePerOperationAndByCase)
+{
+    const QTemporaryDir folder;
+    const std::pair<const char*, const char*> files[] = {
+        {"out.1", "desc: Trigger: Client Request: 64 group: bare\nsummary: 6400\n"},
+        {"out.2", "desc: Trigger: Client Request: 32 group: ours\nsummary: 4800 7\n"},
+        {"out.3", "desc: Trigger: Program termination\nsummary: 99\n"},
+        {"notes", "nothing of the kind\n"},
+    };
+    for (const auto& [name, text] : files)
+        std::ofstream(folder.filePath(name).toStdString()) << text;
+    const auto counts = readInstructionCounts(folder.path().toStdString());
+    EXPECT_EQ(counts, (std::map<std::string, double>{{"group: bare", 100}, {"group: ours", 150}}));
+
+    auto results = someResults(1.25);
+    addInstructionCounts(results, counts);
+    EXPECT_THAT(tableOf(results), HasSubstr("1.500")) << "the ratio by count";
+}
+
+TEST(ResultFiles, ARunComparesWithAnEarlierOneAndWithNothingElse)
+{
+    const QTemporaryDir folder;
+    const std::filesystem::path path = folder.filePath("run.json").toStdString();
+    EXPECT_THROW(readRatios(path), std::runtime_error) << "it does not exist";
+    std::ofstream(path) << "{\"groups\": 3}";
+    EXPECT_THROW(readRatios(path), std::runtime_error);
+
+    ASSERT_TRUE(writeJson(path, toJson(RunDescription{}, someResults(1.5))));
+    const auto earlier = readRatios(path);
+    EXPECT_DOUBLE_EQ(earlier.at("group: ours"), 1.5);
+    const auto changes = [&](double ratio) {
+        std::ostringstream output;
+        writeChanges(output, someResults(ratio), earlier);
+        return output.str();
+    };
+    EXPECT_THAT(changes(1.2), AllOf(HasSubstr("-20.0 %"), HasSubstr("faster")));
+    EXPECT_THAT(changes(1.8), AllOf(HasSubstr("20.0 %"), HasSubstr("SLOWER")));
+    EXPECT_THAT(changes(1.52), AllOf(Not(HasSubstr("SLOWER")), Not(HasSubstr("faster"))))
+        << "within the noise";
+}
+
+} // namespace
