@@ -7,6 +7,7 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
+#include <cstring>
 #include <memory>
 #include <numeric>
 #include <random>
@@ -33,13 +34,25 @@ cl_kernel createKernel(cl_program program)
     return clCreateKernel(program, KernelRequest::kKernelName, &status);
 }
 
+bool sameTexts(const KernelRequest& one, const KernelRequest& other)
+{
+    bool same = std::strlen(one.path.c_str()) == other.path.size() && one.path == other.path &&
+                std::strlen(one.flags.c_str()) == other.flags.size() && one.flags == other.flags &&
+                one.includeDirs.length() == other.includeDirs.length();
+    for (unsigned int index = 0; same && index < one.includeDirs.length(); ++index)
+        same = one.includeDirs[index] == other.includeDirs[index];
+    return same;
+}
+
 // Programs that stay cached, since one kernel of each is never given back.
 struct CachedPrograms {
     Programs programs;
     std::vector<Kernel> held;
     std::vector<cl_kernel> heldByHand;
+    std::vector<KernelRequest> copies; // of the requests
 
-    CachedPrograms(std::size_t count, Programs::Texts texts) : programs(count, texts)
+    CachedPrograms(std::size_t count, Programs::Texts texts)
+        : programs(count, texts), copies(programs.requests())
     {
         for (const KernelRequest& request : programs.requests()) {
             held.push_back(getKernel(request));
@@ -69,13 +82,28 @@ struct CachedPrograms {
     // The calls that this must make.
     void takeTurnsByHand(std::size_t count) const
     {
-        const auto& built = programs.built();
+        for (std::size_t index = 0; index < count; ++index)
+            takeTurnByHand(index % programs.built().size());
+    }
+    // The same, and a look at every byte of what tells one program from another: the least that a
+    // cache can do, if it knew the right program beforehand.
+    void takeTurnsAndCompare(std::size_t count) const
+    {
+        const auto& requests = programs.requests();
         for (std::size_t index = 0; index < count; ++index) {
-            cl_kernel kernel = createKernel(built[index % built.size()]);
-            clRetainKernel(kernel);
-            clReleaseKernel(kernel);
-            clReleaseKernel(kernel);
+            const std::size_t turn = index % requests.size();
+            keep(sameTexts(requests[turn], copies[turn]));
+            takeTurnByHand(turn);
         }
+    }
+
+private:
+    void takeTurnByHand(std::size_t turn) const
+    {
+        cl_kernel kernel = createKernel(programs.built()[turn]);
+        clRetainKernel(kernel);
+        clReleaseKernel(kernel);
+        clReleaseKernel(kernel);
     }
 };
 
@@ -86,6 +114,10 @@ Group hits(const std::string& name, std::size_t keys, Programs::Texts texts, dou
         name,
         {{"create, retain, 2 releases",
           [cached](std::size_t count) { return timed([&] { cached->takeTurnsByHand(count); }); }},
+         {"the same, texts compared",
+          [cached](std::size_t count) {
+              return timed([&] { cached->takeTurnsAndCompare(count); });
+          }},
          {"getKernel, freeKernel",
           [cached](std::size_t count) { return timed([&] { cached->takeTurns(count); }); },
           Goal::ratio(limit)}}};

@@ -14,8 +14,8 @@ constexpr const char* kSource = "__kernel void scale(__global float* data, float
                                 "{ data[get_global_id(0)] *= amount; }\n";
 
 // As deep as an installed host's resources lie.
-constexpr const char* kLongFolder = "applications/content-creation/2025.1/resources/deformers/"
-                                    "opencl/kernels/skinning/dual-quaternion-and-linear-blending";
+constexpr const char* kLongFolder =
+    "opt/applications/content-creation-2025/resources/opencl/deformers";
 
 constexpr const char* kLongFlags =
     "-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror "
@@ -26,7 +26,7 @@ TstringArray longIncludeDirs()
 {
     TstringArray dirs;
     for (const char* name : {"include", "shared include files", "generated"})
-        dirs.append((std::string("/usr/share/") + kLongFolder + '/' + name).c_str());
+        dirs.append((std::string("/") + kLongFolder + '/' + name).c_str());
     return dirs;
 }
 

@@ -2,6 +2,7 @@
 
 #include "diagnostics/CLInternalWarning.h"
 #include "diagnostics/CLStatusReport.h"
+#include "kernels/KernelStoreIndex.h"
 #include "loader/OpenCLLoader.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -21,7 +22,8 @@ std::size_t TopenCLKernelStore::ProgramKeyHash::operator()(const ProgramKey& key
     return key.first.hash() + key.second.hash();
 }
 
-TopenCLKernelStore::TopenCLKernelStore() : fPrograms(kInitialBuckets)
+TopenCLKernelStore::TopenCLKernelStore()
+    : fPrograms(kInitialBuckets), fIndex(std::make_unique<Index>())
 {
     fPrograms.max_load_factor(kMaximumLoadFactor);
 }
@@ -47,7 +49,10 @@ AutoCLObject<cl_kernel> TopenCLKernelStore::getKernel(const char* fileName, cons
                                                       const TstringArray* includeDirs)
 {
     const tbb::spin_mutex::scoped_lock lock(fLock);
-    ProgramInfo* program = getProgram(fileName, buildFlags, includeDirs);
+    const Index::Request request(fileName, buildFlags, includeDirs);
+    ProgramInfo* program = fIndex->find(request);
+    if (!program)
+        program = fIndex->remember(request, getProgram(fileName, buildFlags, includeDirs));
     return program ? createKernel(*program, kernelName) : AutoCLObject<cl_kernel>();
 }
 
@@ -58,7 +63,11 @@ AutoCLObject<cl_kernel> TopenCLKernelStore::getKernelFromString(const char* sour
                                                                 const TstringArray* includeDirs)
 {
     const tbb::spin_mutex::scoped_lock lock(fLock);
-    ProgramInfo* program = getProgramFromString(source, programName, buildFlags, includeDirs);
+    const Index::Request request(programName, buildFlags, includeDirs);
+    ProgramInfo* program = fIndex->find(request);
+    if (!program)
+        program = fIndex->remember(
+            request, getProgramFromString(source, programName, buildFlags, includeDirs));
     return program ? createKernel(*program, kernelName) : AutoCLObject<cl_kernel>();
 }
 
@@ -66,12 +75,17 @@ AutoCLObject<cl_kernel> TopenCLKernelStore::getKernelFromString(const char* sour
 AutoCLObject<cl_kernel> TopenCLKernelStore::createKernel(ProgramInfo& program,
                                                          const char* kernelName)
 {
+    // Memory for both lists first: without it nothing has been created yet.
+    makeRoomForOne(program.fKernels);
+    fIndex->makeRoomForKernel();
     AutoCLObject<cl_kernel> kernel;
     cl_int status = CL_SUCCESS;
     kernel.adopt(ocl.clCreateKernel(program.fProgram.get(), kernelName, &status));
     reportFailure(status);
-    if (kernel.get())
+    if (kernel.get()) {
         program.fKernels.push_back(kernel);
+        fIndex->add(kernel.get(), program);
+    }
     return kernel;
 }
 
@@ -80,19 +94,16 @@ bool TopenCLKernelStore::freeKernel(const AutoCLObject<cl_kernel>& kernel)
     if (!kernel.get())
         return true;
     const tbb::spin_mutex::scoped_lock lock(fLock);
-    for (auto program = fPrograms.begin(); program != fPrograms.end(); ++program) {
-        auto& kernels = program->second.fKernels;
-        const auto found = std::find_if(kernels.begin(), kernels.end(), [&](const auto& handedOut) {
-            return handedOut.get() == kernel.get();
-        });
-        if (found == kernels.end())
-            continue;
-        kernels.erase(found);
-        if (kernels.empty())
-            fPrograms.erase(program);
-        return true;
+    ProgramInfo* program = fIndex->take(kernel.get());
+    if (!program)
+        return false;
+    std::erase_if(program->fKernels,
+                  [&](const auto& handedOut) { return handedOut.get() == kernel.get(); });
+    if (program->fKernels.empty()) {
+        fIndex->forget(*program);
+        std::erase_if(fPrograms, [&](const auto& entry) { return &entry.second == program; });
     }
-    return false;
+    return true;
 }
 
 TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::getProgram(const char* fileName,

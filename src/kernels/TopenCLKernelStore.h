@@ -7,9 +7,10 @@
 #include "runtime/OpenCLProvider.h"
 
 #include <cstddef>
-#include <list>
+#include <memory>
 #include <unordered_map>
 #include <utility>
+#include <vector>
 
 #include <CL/cl.h>
 #include <tbb/spin_mutex.h>
@@ -57,8 +58,10 @@ public:
 private:
     struct ProgramInfo {
         AutoCLObject<cl_program> fProgram;
-        std::list<AutoCLObject<cl_kernel>> fKernels; // handed out and not yet given back
+        std::vector<AutoCLObject<cl_kernel>> fKernels; // handed out and not yet given back
     };
+
+    class Index; // short cuts to what fPrograms holds
 
     // The program's name and its option string, without the vendor's own flag.
     using ProgramKey = std::pair<Tstring, Tstring>;
@@ -79,6 +82,7 @@ private:
     cl_context fContext = nullptr;
     cl_device_id fDevice = nullptr;
     OpenCLProvider fProvider = kUnknownProvider;
-    tbb::spin_mutex fLock; // guards fPrograms and all in it
+    tbb::spin_mutex fLock; // guards fPrograms, all in it, and the index
     std::unordered_map<ProgramKey, ProgramInfo, ProgramKeyHash> fPrograms;
+    std::unique_ptr<Index> fIndex;
 };
