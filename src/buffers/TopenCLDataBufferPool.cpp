@@ -6,6 +6,18 @@
 
 #include <utility>
 
+namespace {
+
+// An entry without a buffer, not in any list yet.
+template <typename Map>
+typename Map::node_type newEntry()
+{
+    Map map;
+    return map.extract(map.emplace());
+}
+
+} // namespace
+
 TopenCLDataBufferPool::TopenCLDataBufferPool() = default;
 TopenCLDataBufferPool::~TopenCLDataBufferPool() = default;
 
@@ -14,15 +26,16 @@ TopenCLDataBuffer TopenCLDataBufferPool::createBuffer(const TopenCLDataBufferDes
     const std::scoped_lock lock(fMutex);
     const unsigned int requiredBytes = descriptor.elementSizeInBytes() * descriptor.elementCount();
     TopenCLDataBuffer result(descriptor);
-    // The list's room before the memory: when there is none, nothing has been taken yet.
-    fUsedBuffers.emplace_back();
-    if (!takeBestFit(requiredBytes, result))
+    // The lists' room before the memory: when there is none, nothing has been taken yet.
+    if (fUsedBuffers.size() == fUsedBuffers.capacity())
+        fUsedBuffers.reserve(2 * fUsedBuffers.size() + 1);
+    FreeBuffers::node_type place = takeBestFit(requiredBytes, result);
+    if (place.empty()) {
+        place = newEntry<FreeBuffers>();
         createMemory(requiredBytes, result);
-
-    if (requiredBytes > 0 && !result.buffer().get())
-        fUsedBuffers.pop_back();
-    else
-        fUsedBuffers.back() = result;
+    }
+    if (requiredBytes == 0 || result.buffer().get())
+        fUsedBuffers.push_back({result, std::move(place)});
     return result;
 }
 
@@ -31,29 +44,18 @@ TopenCLDataBuffer TopenCLDataBufferPool::createBuffer(const TopenCLDataBuffer& b
     return createBuffer(buffer.descriptor());
 }
 
-// Moves the handles of the tightest free buffer into `result`, the first of equals, and takes it
-// off the free list.
-bool TopenCLDataBufferPool::takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result)
+// Moves the handles of the tightest free buffer into `result`, the first of equals, and takes its
+// entry off the free list. No entry when no buffer is large enough.
+TopenCLDataBufferPool::FreeBuffers::node_type
+TopenCLDataBufferPool::takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result)
 {
-    auto best = fFreeBuffers.end();
-    unsigned int bestCapacity = 0;
-    for (auto entry = fFreeBuffers.begin(); entry != fFreeBuffers.end(); ++entry) {
-        const unsigned int capacity = entry->descriptor().capacityInBytes();
-        if (capacity < requiredBytes || (best != fFreeBuffers.end() && capacity >= bestCapacity))
-            continue;
-        best = entry;
-        bestCapacity = capacity;
-        if (capacity == requiredBytes)
-            break;
-    }
+    const auto best = fFreeBuffers.lower_bound(requiredBytes);
     if (best == fFreeBuffers.end())
-        return false;
-
-    result.buffer() = std::move(best->buffer());
-    result.bufferReadyEvent() = std::move(best->bufferReadyEvent());
-    result.descriptor().setCapacityInBytes(bestCapacity);
-    fFreeBuffers.erase(best);
-    return true;
+        return {};
+    result.buffer() = std::move(best->second.buffer());
+    result.bufferReadyEvent() = std::move(best->second.bufferReadyEvent());
+    result.descriptor().setCapacityInBytes(best->first);
+    return fFreeBuffers.extract(best);
 }
 
 // Leaves `result` without memory when that cannot be created.
@@ -77,13 +79,17 @@ TopenCLDataBuffer TopenCLDataBufferPool::createOutputBuffer(const TopenCLDataBuf
 void TopenCLDataBufferPool::releaseBuffers()
 {
     const std::scoped_lock lock(fMutex);
-    fFreeBuffers.insert(fFreeBuffers.end(), fUsedBuffers.begin(), fUsedBuffers.end());
+    for (auto& [buffer, place] : fUsedBuffers) {
+        place.key() = buffer.descriptor().capacityInBytes();
+        place.mapped() = buffer;
+        fFreeBuffers.insert(std::move(place));
+    }
     fUsedBuffers.clear();
 }
 
 void TopenCLDataBufferPool::collectDataForPlug(const Tplug& plug, TopenCLData& data) const
 {
-    for (const TopenCLDataBuffer& buffer : fUsedBuffers) {
+    for (const auto& [buffer, place] : fUsedBuffers) {
         if (buffer.descriptor().plug() == plug)
             data.setData(buffer.descriptor().name(), plug, buffer);
     }

@@ -4,6 +4,7 @@
 #include "VyraOpenCLExport.h"
 #include "buffers/TopenCLDataBuffer.h"
 
+#include <map>
 #include <mutex>
 #include <vector>
 
@@ -44,10 +45,17 @@ public:
     void collectDataForPlug(const Tplug& plug, TopenCLData& data) const;
 
 private:
-    bool takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result);
+    // By capacity in bytes; equal ones in the order of giving back.
+    using FreeBuffers = std::multimap<unsigned int, TopenCLDataBuffer>;
+    struct UsedBuffer {
+        TopenCLDataBuffer buffer;
+        FreeBuffers::node_type place; // the entry that it will have when it is free
+    };
+
+    FreeBuffers::node_type takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result);
     static void createMemory(unsigned int requiredBytes, TopenCLDataBuffer& result);
 
-    std::vector<TopenCLDataBuffer> fFreeBuffers; // in the order of giving back
-    std::vector<TopenCLDataBuffer> fUsedBuffers; // in the order of handing out
-    std::mutex fMutex;                           // guards both lists
+    FreeBuffers fFreeBuffers;
+    std::vector<UsedBuffer> fUsedBuffers; // in the order of handing out
+    std::mutex fMutex;                    // guards both lists
 };
