@@ -1,10 +1,13 @@
-// The CPU reference, against cases that are calculated in another way.
+// From the keys of an animation to matrices, and the CPU reference, against cases that are
+// calculated in another way.
 #include "viewer/Deformation.h"
+#include "viewer/Pose.h"
 #include "viewer/Verification.h"
 
 #include <cmath>
 #include <limits>
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 namespace {
@@ -19,14 +22,6 @@ void expectNear(const QVector3D& actual, const QVector3D& expected, float tolera
         << actual.x() << ' ' << actual.y() << ' ' << actual.z();
 }
 
-Mesh meshOf(const QVector3D& position, const QVector3D& normal)
-{
-    Mesh mesh;
-    mesh.positions = {position};
-    mesh.normals = {normal};
-    return mesh;
-}
-
 QMatrix4x4 moved(float x, float y, float z)
 {
     QMatrix4x4 matrix;
@@ -34,18 +29,78 @@ QMatrix4x4 moved(float x, float y, float z)
     return matrix;
 }
 
+QQuaternion turned(float degrees, const QVector3D& axis)
+{
+    return QQuaternion::fromAxisAndAngle(axis, degrees);
+}
+
+// A shoulder that is moved, with an arm of length 2 on it that turns around z.
+Model armModel()
+{
+    Model model;
+    model.nodes = {{"root", 0, {}}, {"shoulder", 0, {}}, {"arm", 1, moved(2, 0, 0)}};
+    const std::vector<Key<QQuaternion>> rotations{{0.0, {}}, {1.0, turned(90, {0, 0, 1})}};
+    model.animations = {{"wave", 2.0, {{1, {{0.0, {0, 1, 0}}}, rotations, {}}}}};
+    return model;
+}
+
+TEST(Pose, PositionsAreLinearBetweenKeysAndStandStillOutside)
+{
+    const std::vector<Key<QVector3D>> keys{{1.0, {0, 0, 0}}, {3.0, {4, 8, 0}}, {4.0, {4, 8, 6}}};
+    const std::pair<double, QVector3D> rows[] = {{0.0, {0, 0, 0}}, {1.0, {0, 0, 0}},
+                                                 {1.5, {1, 2, 0}}, {3.0, {4, 8, 0}},
+                                                 {3.5, {4, 8, 3}}, {9.0, {4, 8, 6}}};
+    for (const auto& [seconds, expected] : rows)
+        expectNear(sample(keys, seconds), expected);
+}
+
+TEST(Pose, RotationsTakeTheShorterWayAtAnEvenSpeed)
+{
+    // The same rotation with the opposite sign, which a careless mix goes the long way to.
+    const std::vector<Key<QQuaternion>> keys{{0.0, {}}, {3.0, -turned(90, {0, 1, 0})}};
+    expectNear(sample(keys, 1.0).rotatedVector({1, 0, 0}),
+               turned(30, {0, 1, 0}).rotatedVector({1, 0, 0}));
+}
+
+TEST(Pose, ChildrenFollowTheirParentsAndTimeWrapsAround)
+{
+    const Model model = armModel();
+    const std::pair<double, QVector3D> rows[] = {
+        {0.0, {2, 1, 0}}, {1.0, {0, 3, 0}}, {2.0, {2, 1, 0}}, {5.0, {0, 3, 0}}, {-1.0, {0, 3, 0}}};
+    for (const auto& [seconds, hand] : rows)
+        expectNear(poseAt(model, &model.animations[0], seconds)[2].map(QVector3D()), hand);
+    expectNear(poseAt(model, nullptr, 1.0)[2].map(QVector3D()), {2, 0, 0});
+}
+
+TEST(Pose, BoneMatricesLeadFromTheMeshAtRestToTheModel)
+{
+    const Model model = armModel();
+    Mesh mesh;
+    mesh.bones.push_back({2, moved(-2, 0, 0)}); // the arm's origin in the mesh at rest
+    // A quarter turn around the moved shoulder: (3, 0, 0) becomes (0, 1 + 3, 0).
+    const MatrixRows expected{0, -1, 0, 0, 1, 0, 0, 1, 0, 0, 1, 0};
+    EXPECT_THAT(boneMatrices(mesh, poseAt(model, &model.animations[0], 1.0))[0],
+                testing::Pointwise(testing::FloatNear(kTolerance), expected));
+}
+
+Mesh meshOf(const QVector3D& position, const QVector3D& normal, const BoneIndices& indices,
+            const BoneWeights& weights)
+{
+    Mesh mesh;
+    mesh.positions = {position};
+    mesh.normals = {normal};
+    mesh.boneIndices = {indices};
+    mesh.boneWeights = {weights};
+    mesh.bones.resize(1);
+    return mesh;
+}
+
 TEST(Skin, AVertexIsBlendedFromAllFourBones)
 {
-    Mesh mesh = meshOf({1, 2, 3}, {0, 0, 1});
-    mesh.bones.resize(5);
-    mesh.boneIndices = {{4, 0, 2, 1}};
-    mesh.boneWeights = {{0.5f, 0.25f, 0.125f, 0.125f}};
-    std::vector<MatrixRows> bones;
-    for (const QMatrix4x4& matrix :
-         {moved(8, 0, 0), moved(0, 8, 0), moved(0, 0, 8), moved(99, 99, 99), moved(-4, 4, 0)})
-        bones.push_back(rowsOf(matrix));
-
-    const Surface surface = skin(mesh, bones);
+    const Mesh mesh = meshOf({1, 2, 3}, {0, 0, 1}, {4, 0, 2, 1}, {0.5f, 0.25f, 0.125f, 0.125f});
+    const Surface surface =
+        skin(mesh, {rowsOf(moved(8, 0, 0)), rowsOf(moved(0, 8, 0)), rowsOf(moved(0, 0, 8)),
+                    rowsOf(moved(99, 99, 99)), rowsOf(moved(-4, 4, 0))});
     // Half of (-4, 4, 0), a quarter of (8, 0, 0), an eighth of (0, 0, 8) and of (0, 8, 0).
     expectNear(surface.positions[0], QVector3D(1, 2, 3) + QVector3D(0, 3, 1));
     expectNear(surface.normals[0], {0, 0, 1});
@@ -54,22 +109,15 @@ TEST(Skin, AVertexIsBlendedFromAllFourBones)
 TEST(Skin, NormalsStayPerpendicularUnderStretchingAndOutsideUnderMirroring)
 {
     const QVector3D normal = QVector3D(1, 1, 0).normalized();
-    const QVector3D tangent(1, -1, 0);
-    const struct {
-        const char* name;
-        QVector3D scale;
-    } rows[] = {{"stretched", {4, 1, 1}}, {"flat", {1, 0.1f, 2}}, {"mirrored", {-1, 1, 1}}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.name);
+    const Mesh mesh = meshOf({0, 0, 0}, normal, {0, 0, 0, 0}, {1, 0, 0, 0});
+    for (const QVector3D& scale :
+         {QVector3D(4, 1, 1), QVector3D(1, 0.1f, 2), QVector3D(-1, 1, 1)}) {
+        SCOPED_TRACE(testing::Message() << scale.x() << ' ' << scale.y());
         QMatrix4x4 scaling;
-        scaling.scale(row.scale);
-        Mesh mesh = meshOf({0, 0, 0}, normal);
-        mesh.bones.resize(1);
-        mesh.boneIndices = {{0, 0, 0, 0}};
-        mesh.boneWeights = {{1, 0, 0, 0}};
+        scaling.scale(scale);
         const QVector3D result = skin(mesh, {rowsOf(scaling)}).normals[0];
         EXPECT_NEAR(result.length(), 1, kTolerance);
-        EXPECT_NEAR(QVector3D::dotProduct(result, scaling.mapVector(tangent)), 0, kTolerance);
+        EXPECT_NEAR(QVector3D::dotProduct(result, scaling.mapVector({1, -1, 0})), 0, kTolerance);
         // A point above the surface is still above it.
         EXPECT_GT(QVector3D::dotProduct(result, scaling.mapVector(normal)), 0);
     }
@@ -103,7 +151,7 @@ TEST_F(Twist, TurnsAPointByItsHeight)
     const QVector3D result =
         fPose.geometryMatrix.map(twisted(fPose.inverseGeometryMatrix.map(inCharacter)));
     const float degrees = fPose.twist * inCharacter.y() * 180 / static_cast<float>(M_PI);
-    expectNear(result, QQuaternion::fromAxisAndAngle(0, 1, 0, degrees).rotatedVector(inCharacter));
+    expectNear(result, turned(degrees, {0, 1, 0}).rotatedVector(inCharacter));
 }
 
 TEST_F(Twist, NormalsArePerpendicularToTheTwistedSurface)
@@ -111,44 +159,36 @@ TEST_F(Twist, NormalsArePerpendicularToTheTwistedSurface)
     const QVector3D point(0.7f, 2.5f, -0.4f);
     const QVector3D along = QVector3D(1, 2, -1).normalized();
     const QVector3D across = QVector3D::crossProduct(along, {0, 1, 1}).normalized();
-    const QVector3D normal = QVector3D::crossProduct(along, across);
-    Surface surface{{point}, {normal}};
+    Surface surface{{point}, {QVector3D::crossProduct(along, across)}};
     twist(fPose, surface);
 
     // The twisted tangents by central differences.
-    constexpr float kStep = 0.02f;
-    const QVector3D alongTwisted = twisted(point + kStep * along) - twisted(point - kStep * along);
-    const QVector3D acrossTwisted =
-        twisted(point + kStep * across) - twisted(point - kStep * across);
-    const QVector3D expected = QVector3D::crossProduct(alongTwisted, acrossTwisted).normalized();
-    expectNear(surface.normals[0], expected, 1e-3f);
+    const auto tangent = [&](const QVector3D& direction) {
+        constexpr float kStep = 0.02f;
+        return twisted(point + kStep * direction) - twisted(point - kStep * direction);
+    };
+    const QVector3D expected = QVector3D::crossProduct(tangent(along), tangent(across));
+    expectNear(surface.normals[0], expected.normalized(), 1e-3f);
 }
 
 TEST(Verification, FindsTheWorstVertexAndValuesThatAreNoNumbers)
 {
     constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+    constexpr double kInfinity = std::numeric_limits<double>::infinity();
     const Surface expected{{{0, 0, 0}, {1, 0, 0}}, {{0, 1, 0}, {0, 1, 0}}};
-    const struct {
-        const char* name;
-        Surface actual;
-        double position;
-        bool passes;
-    } rows[] = {
-        {"equal", expected, 0, true},
-        {"off by one vertex", {{{0, 0, 0}, {1, 0, 0.5f}}, expected.normals}, 1.0, false},
-        {"turned normal", {expected.positions, {{0, 1, 0}, {1, 0, 0}}}, 0, false},
-        {"no number before a good vertex",
-         {{{kNan, 0, 0}, {1, 0, 0}}, expected.normals},
-         std::numeric_limits<double>::infinity(),
-         false},
-    };
+    const Surface oneOff{{{0, 0, 0}, {1, 0, 0.5f}}, expected.normals};
+    const Surface turnedNormal{expected.positions, {{0, 1, 0}, {1, 0, 0}}};
+    const Surface noNumber{{{kNan, 0, 0}, {1, 0, 0}}, expected.normals}; // before a good vertex
     QMatrix4x4 toCharacter;
     toCharacter.scale(2);
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.name);
-        const Deviation deviation = compare(row.actual, expected, toCharacter);
-        EXPECT_DOUBLE_EQ(deviation.position, row.position);
-        EXPECT_EQ(deviation.withinBound(), row.passes);
+    const std::tuple<Surface, double, bool> rows[] = {{expected, 0, true},
+                                                      {oneOff, 1, false},
+                                                      {turnedNormal, 0, false},
+                                                      {noNumber, kInfinity, false}};
+    for (const auto& [actual, position, passes] : rows) {
+        const Deviation deviation = compare(actual, expected, toCharacter);
+        EXPECT_DOUBLE_EQ(deviation.position, position);
+        EXPECT_EQ(deviation.withinBound(), passes);
     }
 }
 

@@ -1,24 +1,27 @@
-// The playing window, driven by the events that a user causes.
+// The playing window, driven by the events that a user causes: every frame is right, and Escape
+// ends it.
 #include "viewer/Session.h"
 #include "viewer/ViewerWindow.h"
 
 #include <filesystem>
+#include <functional>
 #include <memory>
 
 #include <QGuiApplication>
 #include <QKeyEvent>
 #include <QMouseEvent>
 #include <QSurfaceFormat>
-#include <QTimer>
 #include <QWheelEvent>
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 namespace {
 
 using namespace viewer;
 
-constexpr int kHangMs = 20000;
+constexpr int kUnitsPerNotch = 120; // of the wheel
+constexpr int kFramesAfterEscape = 60;
 const QSize kSize(160, 120);
 
 void press(QWindow& window, Qt::Key key)
@@ -33,29 +36,6 @@ void moveMouse(QWindow& window, QEvent::Type type, const QPointF& position)
                       Qt::NoModifier);
     QCoreApplication::sendEvent(&window, &event);
 }
-
-void turnWheel(QWindow& window, int notches)
-{
-    constexpr int kUnitsPerNotch = 120;
-    QWheelEvent event(QPointF(), QPointF(), QPoint(), QPoint(0, notches * kUnitsPerNotch),
-                      Qt::NoButton, Qt::NoModifier, Qt::NoScrollPhase, false);
-    QCoreApplication::sendEvent(&window, &event);
-}
-
-// Calls once from the event loop, if it lives long enough.
-class Later {
-public:
-    template <typename Action>
-    Later(int milliseconds, Action action)
-    {
-        fTimer.setSingleShot(true);
-        fTimer.callOnTimeout(action);
-        fTimer.start(milliseconds);
-    }
-
-private:
-    QTimer fTimer;
-};
 
 class WindowTest : public testing::Test {
 protected:
@@ -82,26 +62,28 @@ protected:
         ASSERT_FALSE(failure) << failure->text;
     }
 
-    void TearDown() override
-    {
-        fSession.reset(); // the context is current
-    }
-
-    // Plays until Escape, which comes after `frames` more frames. False when that never happens.
-    bool playFor(int frames)
+    // Plays until Escape, which comes after `frames` frames, and looks how that went. Calls
+    // `action` after the first.
+    void playFor(int frames, const std::function<void()>& action)
     {
         int left = frames;
         const auto counting = QObject::connect(fWindow.get(), &QOpenGLWindow::frameSwapped, [&] {
+            if (left == frames)
+                action();
             if (--left == 0)
                 press(*fWindow, Qt::Key_Escape);
+            else if (left == -kFramesAfterEscape)
+                QGuiApplication::exit();
         });
-        const Later hang(kHangMs, [] { QGuiApplication::exit(); });
         fWindow->play(*fSession);
         QGuiApplication::exec();
         QObject::disconnect(counting);
         fWindow->stop();
         fWindow->makeCurrent();
-        return left <= 0;
+        EXPECT_LE(left, 0) << "playing ended before";
+        EXPECT_GT(left, -kFramesAfterEscape) << "Escape did not end it";
+        EXPECT_FALSE(fWindow->failure());
+        EXPECT_TRUE(fSession->verified());
     }
 
     int fArguments = 1;
@@ -110,19 +92,14 @@ protected:
     std::unique_ptr<QGuiApplication> fApplication;
     Options fOptions;
     std::unique_ptr<ViewerWindow> fWindow;
-    std::unique_ptr<Session> fSession;
+    std::unique_ptr<Session> fSession; // goes first, while the context is current
 };
 
-TEST_F(WindowTest, PlaysUntilEscapeWithEveryFrameRight)
+TEST_F(WindowTest, OrbitsZoomsResizesAndChangesTheVertexBuffersDetail)
 {
-    EXPECT_TRUE(playFor(5));
-    EXPECT_FALSE(fWindow->failure());
-    EXPECT_TRUE(fSession->verified());
-}
-
-TEST_F(WindowTest, OrbitsZoomsAndResizes)
-{
-    const Later act(0, [&] {
+    const std::string before = fSession->report();
+    press(*fWindow, Qt::Key_D); // without effect: nothing plays yet
+    playFor(8, [&] {
         const QVector3D eye = fSession->camera().eye();
         moveMouse(*fWindow, QEvent::MouseButtonPress, {10, 10});
         moveMouse(*fWindow, QEvent::MouseMove, {60, 10});
@@ -134,24 +111,16 @@ TEST_F(WindowTest, OrbitsZoomsAndResizes)
         const QVector3D raised = fSession->camera().eye();
         EXPECT_GT(raised.y(), turned.y());
 
-        turnWheel(*fWindow, 3);
+        QWheelEvent wheel({}, {}, {}, QPoint(0, 3 * kUnitsPerNotch), Qt::NoButton, Qt::NoModifier,
+                          Qt::NoScrollPhase, false);
+        QCoreApplication::sendEvent(fWindow.get(), &wheel);
         EXPECT_LT(fSession->camera().eye().length(), raised.length());
         fWindow->resize(200, 100);
+        press(*fWindow, Qt::Key_D);
     });
-    EXPECT_TRUE(playFor(8));
     EXPECT_EQ(fSession->canvas().size(), QSize(200, 100) * fWindow->devicePixelRatio());
-    EXPECT_TRUE(fSession->verified());
-}
-
-TEST_F(WindowTest, TheDetailKeyReplacesTheVertexBuffers)
-{
-    const std::string before = fSession->report();
-    press(*fWindow, Qt::Key_D); // without effect: nothing plays yet
-    const Later act(0, [&] { press(*fWindow, Qt::Key_D); });
-    EXPECT_TRUE(playFor(4));
-    EXPECT_TRUE(fSession->verified());
-    EXPECT_NE(before.find("3205 vertices"), std::string::npos) << before;
-    EXPECT_EQ(fSession->report().find("3205 vertices"), std::string::npos);
+    EXPECT_THAT(before, testing::HasSubstr("3205 vertices"));
+    EXPECT_THAT(fSession->report(), testing::Not(testing::HasSubstr("3205 vertices")));
 }
 
 } // namespace
