@@ -1,0 +1,87 @@
+// Events that several threads report at once. Internal.
+#pragma once
+
+#include <algorithm>
+#include <atomic>
+#include <cstddef>
+#include <mutex>
+#include <new>
+#include <thread>
+#include <vector>
+
+#include <CL/cl.h>
+#include <tbb/concurrent_vector.h>
+
+// A list to which any number of threads append at the same time, with one atomic operation each; a
+// lock is taken only to make the list longer than it ever was. Borrows the events.
+//
+// append and copyTo may run at the same time; everything else needs the list to itself.
+class ConcurrentEventList {
+public:
+    ConcurrentEventList() { grow(0); }
+
+    // `event` is not null. Running out of memory raises std::bad_alloc and appends nothing.
+    void append(cl_event event)
+    {
+        std::size_t index = fSize.load(std::memory_order_relaxed);
+        do {
+            if (index >= fSlotCount.load(std::memory_order_acquire))
+                grow(index);
+        } while (!fSize.compare_exchange_weak(index, index + 1, std::memory_order_release,
+                                              std::memory_order_relaxed));
+        fSlots[index].store(event, std::memory_order_release);
+    }
+
+    auto begin() const { return fSlots.begin(); }
+    auto end() const { return fSlots.begin() + static_cast<std::ptrdiff_t>(fSize.load()); }
+
+    // Replaces the contents of `events` by the events appended so far, in order.
+    void copyTo(std::vector<cl_event>& events) const
+    {
+        events.resize(fSize.load(std::memory_order_acquire));
+        for (std::size_t index = 0; index < events.size(); ++index)
+            events[index] = written(index);
+    }
+
+    // Keeps the storage and releases nothing.
+    void clear()
+    {
+        const std::size_t size = fSize.exchange(0);
+        for (std::size_t index = 0; index < size; ++index)
+            fSlots[index].store(nullptr, std::memory_order_relaxed);
+    }
+
+private:
+    using Slot = std::atomic<cl_event>; // null until it is written
+
+    // More than the deformers of most scenes report in one evaluation; a longer list grows.
+    static constexpr std::size_t kReservedEvents = 100;
+
+    // Makes the slot at `index`, and as many again, unless another thread was faster.
+    void grow(std::size_t index)
+    {
+        const std::scoped_lock lock(fGrowth);
+        if (index < fSlotCount)
+            return;
+        // A growth that ran out of memory half way leaves a vector that cannot grow past that.
+        if (fSlots.size() != fSlotCount)
+            throw std::bad_alloc();
+        fSlots.grow_to_at_least(std::max(2 * index, kReservedEvents));
+        fSlotCount.store(fSlots.size(), std::memory_order_release);
+    }
+
+    // The event of a slot that is taken, once it is written.
+    cl_event written(std::size_t index) const
+    {
+        for (;;) {
+            if (const cl_event event = fSlots[index].load(std::memory_order_acquire))
+                return event;
+            std::this_thread::yield();
+        }
+    }
+
+    tbb::concurrent_vector<Slot> fSlots;
+    std::atomic<std::size_t> fSlotCount = 0; // of slots that are ready to be written
+    std::atomic<std::size_t> fSize = 0;      // of slots taken
+    std::mutex fGrowth;
+};

@@ -1,0 +1,85 @@
+// The list that several evaluators report their events to, while one more thread may read it.
+#include "interop/ConcurrentEventList.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <thread>
+
+#include <gtest/gtest.h>
+
+namespace {
+
+constexpr std::uintptr_t kThreads = 4;
+constexpr std::uintptr_t kEventsEach = 5000; // far beyond what is reserved
+
+// Never dereferenced.
+cl_event fakeEvent(std::uintptr_t thread, std::uintptr_t number)
+{
+    return reinterpret_cast<cl_event>(thread * kEventsEach + number + 1);
+}
+
+void appendFromAllThreads(ConcurrentEventList& list, std::uintptr_t eventsEach)
+{
+    std::vector<std::thread> threads;
+    for (std::uintptr_t thread = 0; thread < kThreads; ++thread) {
+        threads.emplace_back([&list, thread, eventsEach] {
+            for (std::uintptr_t number = 0; number < eventsEach; ++number)
+                list.append(fakeEvent(thread, number));
+        });
+    }
+    for (std::thread& thread : threads)
+        thread.join();
+}
+
+std::vector<cl_event> contentsOf(const ConcurrentEventList& list)
+{
+    std::vector<cl_event> events;
+    list.copyTo(events);
+    return events;
+}
+
+} // namespace
+
+TEST(ConcurrentEventList, HoldsWhatAllThreadsAppendedAndNothingAfterClear)
+{
+    ConcurrentEventList list;
+    for (int evaluation = 0; evaluation < 3; ++evaluation) {
+        appendFromAllThreads(list, kEventsEach);
+        const std::vector<cl_event> events = contentsOf(list);
+        EXPECT_EQ(std::vector<cl_event>(list.begin(), list.end()), events);
+        ASSERT_EQ(events.size(), kThreads * kEventsEach);
+        for (std::uintptr_t thread = 0; thread < kThreads; ++thread) {
+            // Each thread's events are all there, in the order in which it appended them.
+            auto position = events.begin();
+            for (std::uintptr_t number = 0; number < kEventsEach; ++number) {
+                position = std::find(position, events.end(), fakeEvent(thread, number));
+                ASSERT_NE(position, events.end()) << thread << ", " << number;
+            }
+        }
+        list.clear();
+        EXPECT_TRUE(contentsOf(list).empty());
+    }
+}
+
+TEST(ConcurrentEventList, ACopyBesideAppendsIsWholeAndABeginningOfWhatFollows)
+{
+    // Short lists, over and over: an event on its way is then soon met.
+    for (int evaluation = 0; evaluation < 200; ++evaluation) {
+        ConcurrentEventList list;
+        std::atomic<bool> done = false;
+        std::vector<std::vector<cl_event>> copies;
+        std::thread reader([&] {
+            while (!done)
+                copies.push_back(contentsOf(list));
+        });
+        appendFromAllThreads(list, 200);
+        done = true;
+        reader.join();
+
+        const std::vector<cl_event> all = contentsOf(list);
+        for (const std::vector<cl_event>& copy : copies) {
+            ASSERT_LE(copy.size(), all.size());
+            ASSERT_TRUE(std::equal(copy.begin(), copy.end(), all.begin()));
+        }
+    }
+}
