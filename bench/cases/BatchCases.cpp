@@ -50,8 +50,10 @@ public:
         const auto count = static_cast<cl_uint>(fMemory.size());
         cl_event acquired = nullptr;
         clEnqueueAcquireGLObjects(Runtime::queue(), count, fMemory.data(), 0, nullptr, &acquired);
+        clRetainEvent(acquired); // the manager keeps it for its readers and in the wait list
         cl_event released = nullptr;
         clEnqueueReleaseGLObjects(Runtime::queue(), count, fMemory.data(), 1, &acquired, &released);
+        clReleaseEvent(acquired);
         clReleaseEvent(acquired);
         clReleaseEvent(released);
         clFinish(Runtime::queue());

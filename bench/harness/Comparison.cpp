@@ -40,11 +40,11 @@ std::size_t iterationsFor(const Body& body, Nanoseconds sample)
     }
 }
 
-// How often the calling thread lost its processor to others.
+// How often a thread of the program lost its processor to others.
 long preemptions()
 {
     rusage usage{};
-    getrusage(RUSAGE_THREAD, &usage);
+    getrusage(RUSAGE_SELF, &usage);
     return usage.ru_nivcsw;
 }
 

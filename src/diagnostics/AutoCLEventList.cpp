@@ -31,13 +31,10 @@ AutoCLEventList& AutoCLEventList::operator=(const AutoCLEventList& other)
     return *this;
 }
 
-void AutoCLEventList::add(const AutoCLObject<cl_event>& event)
+// Makes room for one more event at least.
+void AutoCLEventList::grow()
 {
-    if (!event.get())
-        return;
-    if (fEvents.size() == fEvents.capacity())
-        fEvents.reserve(grownCapacity(fEvents, fEvents.size() + 1));
-    fEvents.push_back(event.get());
+    fEvents.reserve(grownCapacity(fEvents, fEvents.size() + 1));
 }
 
 void AutoCLEventList::add(TopenCLBuffer& buffer)

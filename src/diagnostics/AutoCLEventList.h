@@ -23,7 +23,14 @@ public:
     ~AutoCLEventList();
 
     // Appends the event; an empty holder is skipped.
-    void add(const AutoCLObject<cl_event>& event);
+    void add(const AutoCLObject<cl_event>& event)
+    {
+        if (!event.get())
+            return;
+        if (fEvents.size() == fEvents.capacity())
+            grow();
+        fEvents.push_back(event.get());
+    }
     // Appends the event of the buffer's last transfer, if it has one.
     void add(TopenCLBuffer& buffer);
 
@@ -33,5 +40,7 @@ public:
     unsigned int size() const;
 
 private:
+    void grow();
+
     std::vector<cl_event> fEvents;
 };
