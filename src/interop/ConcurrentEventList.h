@@ -20,7 +20,8 @@ class ConcurrentEventList {
 public:
     ConcurrentEventList() { grow(0); }
 
-    // `event` is not null. Running out of memory raises std::bad_alloc and appends nothing.
+    // A null event is an entry like any other. Running out of memory raises std::bad_alloc and
+    // appends nothing.
     void append(cl_event event)
     {
         std::size_t index = fSize.load(std::memory_order_relaxed);
@@ -29,18 +30,27 @@ public:
                 grow(index);
         } while (!fSize.compare_exchange_weak(index, index + 1, std::memory_order_release,
                                               std::memory_order_relaxed));
-        fSlots[index].store(event, std::memory_order_release);
+        fSlots[index].store(event ? event : nullEntry(), std::memory_order_release);
     }
 
+    // Of lists without null entries.
     auto begin() const { return fSlots.begin(); }
     auto end() const { return fSlots.begin() + static_cast<std::ptrdiff_t>(fSize.load()); }
+
+    // Hands each event to `use`, in order.
+    template <typename Use>
+    void forEach(const Use& use) const
+    {
+        const std::size_t size = fSize.load(std::memory_order_acquire);
+        for (std::size_t index = 0; index < size; ++index)
+            use(written(index));
+    }
 
     // Replaces the contents of `events` by the events appended so far, in order.
     void copyTo(std::vector<cl_event>& events) const
     {
-        events.resize(fSize.load(std::memory_order_acquire));
-        for (std::size_t index = 0; index < events.size(); ++index)
-            events[index] = written(index);
+        events.clear();
+        forEach([&](cl_event event) { events.push_back(event); });
     }
 
     // Keeps the storage and releases nothing.
@@ -48,14 +58,24 @@ public:
     {
         const std::size_t size = fSize.exchange(0);
         for (std::size_t index = 0; index < size; ++index)
-            fSlots[index].store(nullptr, std::memory_order_relaxed);
+            fSlots[index].isWritten.store(false, std::memory_order_relaxed);
     }
 
 private:
-    using Slot = std::atomic<cl_event>; // null until it is written
+    struct Slot {
+        cl_event event = nullptr;
+        std::atomic<bool> isWritten = false;
+    };
 
     // More than the deformers of most scenes report in one evaluation; a longer list grows.
     static constexpr std::size_t kReservedEvents = 100;
+
+    // What stands in a slot for a null event: an address that no event has.
+    static cl_event nullEntry()
+    {
+        static char address;
+        return reinterpret_cast<cl_event>(&address);
+    }
 
     // Makes the slot at `index`, and as many again, unless another thread was faster.
     void grow(std::size_t index)
@@ -73,11 +93,10 @@ private:
     // The event of a slot that is taken, once it is written.
     cl_event written(std::size_t index) const
     {
-        for (;;) {
-            if (const cl_event event = fSlots[index].load(std::memory_order_acquire))
-                return event;
+        const Slot& slot = fSlots[index];
+        while (!slot.isWritten.load(std::memory_order_acquire))
             std::this_thread::yield();
-        }
+        return slot.event;
     }
 
     tbb::concurrent_vector<Slot> fSlots;

@@ -111,6 +111,23 @@ TEST_F(SharedBufferTest, SingleCommandsPassTheirArgumentsOn)
     ocl.clReleaseEvent(event);
 }
 
+TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
+{
+    startWith("1", "1");
+    const auto* buffer = create();
+    manager().PreEvaluate(kId);
+    const cl_event none = nullptr;
+    manager().EnqueueReleaseBatchedSharedCLBuffer(1, &none);
+    calls();
+    manager().PostEvaluate(kId);
+    EXPECT_THAT(callsOf("clEnqueueReleaseGLObjects"),
+                testing::ElementsAre(testing::HasSubstr("[event#1, null]")));
+    EXPECT_THAT(warnings(), testing::Each(testing::StartsWith("OpenCL error: ")));
+    EXPECT_EQ(runtime().takeMisuse().size(), 3U) << "retain, wait list, release";
+    destroy(buffer);
+    expectLeft({"event#1 x1"}); // of the acquire: a strict runtime refuses such a release
+}
+
 TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
 {
     startWith("2", "1");
