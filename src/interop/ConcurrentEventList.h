@@ -30,12 +30,10 @@ public:
                 grow(index);
         } while (!fSize.compare_exchange_weak(index, index + 1, std::memory_order_release,
                                               std::memory_order_relaxed));
-        fSlots[index].store(event ? event : nullEntry(), std::memory_order_release);
+        Slot& slot = fSlots[index];
+        slot.event = event;
+        slot.isWritten.store(true, std::memory_order_release);
     }
-
-    // Of lists without null entries.
-    auto begin() const { return fSlots.begin(); }
-    auto end() const { return fSlots.begin() + static_cast<std::ptrdiff_t>(fSize.load()); }
 
     // Hands each event to `use`, in order.
     template <typename Use>
@@ -69,13 +67,6 @@ private:
 
     // More than the deformers of most scenes report in one evaluation; a longer list grows.
     static constexpr std::size_t kReservedEvents = 100;
-
-    // What stands in a slot for a null event: an address that no event has.
-    static cl_event nullEntry()
-    {
-        static char address;
-        return reinterpret_cast<cl_event>(&address);
-    }
 
     // Makes the slot at `index`, and as many again, unless another thread was faster.
     void grow(std::size_t index)

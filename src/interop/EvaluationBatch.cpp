@@ -123,8 +123,7 @@ void TopenCLSharedBufferMgr::PostEvaluate(const em::Id& /*id*/)
     if (graphicsWaitsForSyncObjects()) {
         if (fReleaseEvent.get())
             GraphicsWaitForCLEvent(fReleaseEvent.get());
-        for (const cl_event released : fImpl->fGraphicsWaitEvents)
-            GraphicsWaitForCLEvent(released);
+        fImpl->fGraphicsWaitEvents.forEach(GraphicsWaitForCLEvent);
     }
     fImpl->fGraphicsWaitEvents.clear();
     if (fBatchDirty)

@@ -42,8 +42,7 @@ TopenCLSharedBufferMgr& TopenCLSharedBufferMgr::operator=(const TopenCLSharedBuf
     if (this == &other)
         return *this;
     // The list owns its references; the copy begins with an empty one.
-    for (cl_event event : fImpl->fReleaseWaitEvents)
-        releaseCLObject(event);
+    fImpl->fReleaseWaitEvents.forEach([](cl_event event) { releaseCLObject(event); });
     fImpl->fReleaseWaitEvents.clear();
     fImpl->fGraphicsWaitEvents.clear();
 

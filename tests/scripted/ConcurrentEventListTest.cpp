@@ -46,7 +46,6 @@ TEST(ConcurrentEventList, HoldsWhatAllThreadsAppendedAndNothingAfterClear)
     for (int evaluation = 0; evaluation < 3; ++evaluation) {
         appendFromAllThreads(list, kEventsEach);
         const std::vector<cl_event> events = contentsOf(list);
-        EXPECT_EQ(std::vector<cl_event>(list.begin(), list.end()), events);
         ASSERT_EQ(events.size(), kThreads * kEventsEach);
         for (std::uintptr_t thread = 0; thread < kThreads; ++thread) {
             // Each thread's events are all there, in the order in which it appended them.
