@@ -140,6 +140,8 @@ void twist(const MeshPose& pose, Surface& surface)
 
 Surface deform(const Mesh& mesh, const MeshPose& pose)
 {
+    if (!pose.deforms)
+        return {mesh.positions, mesh.normals};
     Surface surface = skin(mesh, pose.bones);
     twist(pose, surface);
     return surface;

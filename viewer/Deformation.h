@@ -24,7 +24,8 @@ struct MeshPose {
     // its largest extent 1.
     QMatrix4x4 geometryMatrix;
     QMatrix4x4 inverseGeometryMatrix;
-    float twist = 0; // radians per unit of height
+    float twist = 0;     // radians per unit of height
+    bool deforms = true; // else both deformers leave the mesh at rest
 };
 
 struct Surface {

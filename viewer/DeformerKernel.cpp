@@ -3,26 +3,28 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <utility>
+
 namespace viewer {
 
 DeformerKernel::DeformerKernel(const OpenCLFunctions& cl, const char* file, const char* name,
-                               KernelCounts& counts)
-    : fCL(cl)
+                               KernelFiles& files)
+    : fCL(cl), fFile(file), fName(name), fKernel(files.kernel(file, name))
 {
-    TopenCLInfo& info = TopenCLInfo::theOne();
-    Tstring path = info.getAbsolutePathToResources();
-    path += "/kernels/";
-    path += file;
-    fKernel = info.kernelStore().getKernel(path.asChar(), nullptr, name, nullptr);
-    if (!valid())
-        return;
-    counts.served += 1;
-    counts.programs.insert(file);
 }
 
 DeformerKernel::~DeformerKernel()
 {
     TopenCLInfo::theOne().kernelStore().freeKernel(fKernel);
+}
+
+void DeformerKernel::renew(KernelFiles& files)
+{
+    AutoCLObject<cl_kernel> next = files.kernel(fFile, fName);
+    if (!next.get())
+        return;
+    TopenCLInfo::theOne().kernelStore().freeKernel(fKernel);
+    fKernel = std::move(next);
 }
 
 cl_int DeformerKernel::enqueue(cl_command_queue queue, std::size_t elements,

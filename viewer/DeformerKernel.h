@@ -3,36 +3,33 @@
 
 #include "diagnostics/AutoCLEventList.h"
 #include "diagnostics/AutoCLObject.h"
+#include "viewer/KernelFiles.h"
 #include "viewer/OpenCLFunctions.h"
 
 #include <cstddef>
-#include <set>
-#include <string>
 
 #include <CL/cl.h>
 
 namespace viewer {
-
-// What all kernels of a run were asked for.
-struct KernelCounts {
-    std::size_t served = 0;
-    std::set<std::string> programs; // each built once, since their kernels are kept
-};
 
 // Asks the store once and gives the kernel back at the end: a store whose last kernel goes drops
 // the program too, and would build it again for the next request. One thread at a time uses an
 // object; no two objects share a kernel.
 class DeformerKernel {
 public:
-    // `file` is a name in the folder "kernels" of the resource directory.
+    // `file` and `name`, which are borrowed, tell `files` what kernel it is.
     DeformerKernel(const OpenCLFunctions& cl, const char* file, const char* name,
-                   KernelCounts& counts);
+                   KernelFiles& files);
     ~DeformerKernel();
     DeformerKernel(const DeformerKernel&) = delete;
     DeformerKernel& operator=(const DeformerKernel&) = delete;
 
     // False when the file cannot be read or does not build.
     bool valid() const { return fKernel.get() != nullptr; }
+
+    // Takes a kernel of the text that the file now stands for; keeps the present one where there is
+    // none to be had. Commands enqueued before are not touched.
+    void renew(KernelFiles& files);
 
     // Enqueues one work-item per element with these arguments (memory objects and plain numbers,
     // in the kernel's order), after `waits`. `event` receives the command's event. A status of
@@ -58,6 +55,8 @@ private:
                    AutoCLObject<cl_event>& event);
 
     const OpenCLFunctions& fCL;
+    const char* fFile;
+    const char* fName;
     AutoCLObject<cl_kernel> fKernel;
 };
 

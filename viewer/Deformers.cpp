@@ -59,8 +59,8 @@ void publish(Flow& flow, const DeformerPlugs& plugs, const AutoCLObject<cl_event
 } // namespace
 
 SkinDeformer::SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs,
-                           KernelCounts& counts)
-    : fPlugs(plugs), fKernel(cl, "skin.cl", "skin", counts),
+                           KernelFiles& files)
+    : fPlugs(plugs), fKernel(cl, "skin.cl", "skin", files),
       fBoneIndices(TuniqueString("boneIndices"), plugs.input),
       fBoneWeights(TuniqueString("boneWeights"), plugs.input),
       fBones(TuniqueString("bones"), plugs.input)
@@ -101,8 +101,8 @@ cl_int SkinDeformer::evaluate(const std::vector<MatrixRows>& bones, WorkerQueue&
 }
 
 TwistDeformer::TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs,
-                             KernelCounts& counts)
-    : fPlugs(plugs), fKernel(cl, "twist.cl", "twist", counts),
+                             KernelFiles& files)
+    : fPlugs(plugs), fKernel(cl, "twist.cl", "twist", files),
       fGeometryMatrix(TopenCLData::sGeometryMatrixName(), plugs.input),
       fInverseGeometryMatrix(TopenCLData::sInverseGeometryMatrixName(), plugs.input)
 {

@@ -25,9 +25,10 @@ struct DeformerPlugs {
 
 class SkinDeformer {
 public:
-    SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs, KernelCounts& counts);
+    SkinDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs, KernelFiles& files);
 
     bool valid() const { return fKernel.valid(); }
+    void renewKernel(KernelFiles& files) { fKernel.renew(files); }
     // Uploads the weights of a mesh with bones, after `waits`.
     cl_int setMesh(const Mesh& mesh, cl_command_queue queue, const AutoCLEventList& waits);
     // The input is read-only and the output becomes memory of the worker's pool. `lastUse` are the
@@ -45,9 +46,10 @@ private:
 
 class TwistDeformer {
 public:
-    TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs, KernelCounts& counts);
+    TwistDeformer(const OpenCLFunctions& cl, const DeformerPlugs& plugs, KernelFiles& files);
 
     bool valid() const { return fKernel.valid(); }
+    void renewKernel(KernelFiles& files) { fKernel.renew(files); }
     // Changes a writable input in place; the output of a read-only one becomes memory of the
     // worker's pool.
     cl_int evaluate(const MeshPose& pose, WorkerQueue& worker, const AutoCLEventList& lastUse,

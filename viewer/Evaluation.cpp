@@ -34,7 +34,8 @@ void pollUntilComplete(cl_event event)
 Evaluation::Evaluation(QOpenGLFunctions_3_3_Core& gl, const OpenCLFunctions& cl, Scene& scene)
     : fGL(gl), fCL(cl), fScene(scene), fWorkers(cl),
       fBatchReleased(
-          TopenCLInfo::theOne().sharedBufferMgr().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr))
+          TopenCLInfo::theOne().sharedBufferMgr().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr)),
+      fKernels(cl)
 {
 }
 
@@ -53,14 +54,13 @@ Status Evaluation::adopt(CharacterMesh& mesh)
     if (!mesh.onOpenCL)
         return {};
     if (!mesh.evaluator) {
-        mesh.evaluator = std::make_unique<MeshEvaluator>(fCL, ++fMeshNumber, mesh.mesh().hasBones(),
-                                                         fKernelCounts);
+        mesh.evaluator =
+            std::make_unique<MeshEvaluator>(fCL, ++fMeshNumber, mesh.mesh().hasBones(), fKernels);
         if (!mesh.evaluator->valid())
             return Failure{ExitCode::kOpenCLError,
-                           std::string("the kernels in ") +
-                               TopenCLInfo::theOne().getAbsolutePathToResources().asChar() +
-                               "/kernels cannot be built; check that they are there and that the "
-                               "OpenCL driver can compile"};
+                           "the kernels in " + KernelFiles::folder() +
+                               " cannot be built; check that they are there and that the OpenCL "
+                               "driver can compile"};
     }
     cl_int status = mesh.evaluator->setMesh(mesh.mesh(), fWorkers.all().front()->queue());
     if (status == CL_SUCCESS)
@@ -68,6 +68,18 @@ Status Evaluation::adopt(CharacterMesh& mesh)
     if (status == CL_SUCCESS)
         status = mesh.normals.share();
     return statusOf(status, "take over a vertex buffer");
+}
+
+std::optional<std::string> Evaluation::replaceKernelFile(const std::string& file,
+                                                         const std::string& source)
+{
+    if (auto complaint = fKernels.replace(file, source))
+        return complaint;
+    for (CharacterMesh* mesh : fScene.meshes()) {
+        if (mesh->evaluator)
+            mesh->evaluator->renewKernels(fKernels);
+    }
+    return std::nullopt;
 }
 
 Status Evaluation::evaluate(const em::Id& id, const std::function<Status()>& whileOpen)
@@ -145,6 +157,17 @@ Status Evaluation::releaseSingles()
     return statusOf(status, "release vertex buffers");
 }
 
+std::size_t Evaluation::batchSize() const
+{
+    std::size_t buffers = 0;
+    for (const CharacterMesh* mesh : fScene.meshes()) {
+        if (mesh->onOpenCL)
+            buffers += std::size_t{mesh->positions.shared()->fInBatch} +
+                       std::size_t{mesh->normals.shared()->fInBatch};
+    }
+    return buffers;
+}
+
 bool Evaluation::allBatched() const
 {
     return std::all_of(fScene.meshes().begin(), fScene.meshes().end(), [](const auto* mesh) {
@@ -206,8 +229,8 @@ void Evaluation::waitForSingles()
 EvaluationCounts Evaluation::counts() const
 {
     EvaluationCounts counts = fCounts;
-    counts.programsBuilt = fKernelCounts.programs.size();
-    counts.kernelsServed = fKernelCounts.served;
+    counts.programsBuilt = fKernels.programsBuilt();
+    counts.kernelsServed = fKernels.kernelsServed();
     for (const auto& worker : fWorkers.all()) {
         counts.buffersCreated += worker->buffersCreated();
         counts.buffersReused += worker->buffersReused();

@@ -3,12 +3,15 @@
 
 #include "host/EvaluationId.h"
 #include "viewer/Failure.h"
+#include "viewer/KernelFiles.h"
 #include "viewer/MeshEvaluator.h"
 #include "viewer/OpenCLFunctions.h"
 #include "viewer/Scene.h"
 #include "viewer/WorkerQueues.h"
 
 #include <functional>
+#include <optional>
+#include <string>
 #include <vector>
 
 #include <QOpenGLFunctions_3_3_Core>
@@ -44,6 +47,11 @@ public:
     // Enqueues a frame. `whileOpen` is called when the evaluation is open and no deformer runs yet.
     Status evaluate(const em::Id& id, const std::function<Status()>& whileOpen);
 
+    // Deforms with this text of a kernel file from the next frame on, unless it cannot be used:
+    // then says why, and the last good one goes on. Between two frames.
+    std::optional<std::string> replaceKernelFile(const std::string& file,
+                                                 const std::string& source);
+
     // After this the renderer may draw what was evaluated: waits where the library leaves it to the
     // host.
     void waitUntilDrawable();
@@ -55,6 +63,8 @@ public:
     void waitForSingles();
 
     EvaluationCounts counts() const;
+    // Vertex buffers that are acquired and released together.
+    std::size_t batchSize() const;
 
 private:
     void finishDrawingOfSingles();
@@ -71,7 +81,7 @@ private:
     const cl_event* fBatchReleased; // where the library keeps the event of its last release
     AutoCLObject<cl_event> fSinglesReleased; // of the last evaluation that had any
     std::uint64_t fMeshNumber = 0;
-    KernelCounts fKernelCounts;
+    KernelFiles fKernels;
     EvaluationCounts fCounts;
 };
 

@@ -19,19 +19,26 @@ AutoCLEventList listOf(const std::array<AutoCLObject<cl_event>, 2>& events)
 } // namespace
 
 MeshEvaluator::MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones,
-                             KernelCounts& counts)
+                             KernelFiles& files)
     : fCL(cl), fRest(number, kRest), fSkinned(number, hasBones ? kSkinned : kRest),
       fTwisted(number, kTwisted), fRestPositions(TopenCLData::sPositionsName(), fRest),
       fRestNormals(TopenCLData::sNormalsName(), fRest),
-      fTwist(cl, DeformerPlugs{fSkinned, fTwisted}, counts)
+      fTwist(cl, DeformerPlugs{fSkinned, fTwisted}, files)
 {
     if (hasBones)
-        fSkin.emplace(cl, DeformerPlugs{fRest, fSkinned}, counts);
+        fSkin.emplace(cl, DeformerPlugs{fRest, fSkinned}, files);
 }
 
 bool MeshEvaluator::valid() const
 {
     return fTwist.valid() && (!fSkin || fSkin->valid());
+}
+
+void MeshEvaluator::renewKernels(KernelFiles& files)
+{
+    fTwist.renewKernel(files);
+    if (fSkin)
+        fSkin->renewKernel(files);
 }
 
 cl_int MeshEvaluator::setMesh(const Mesh& mesh, cl_command_queue queue)
@@ -69,6 +76,10 @@ cl_int MeshEvaluator::evaluate(const MeshPose& pose, WorkerQueue& worker,
 
 cl_int MeshEvaluator::enqueueDeformers(const MeshPose& pose, WorkerQueue& worker)
 {
+    if (!pose.deforms) {
+        passThrough();
+        return CL_SUCCESS;
+    }
     // The frame before may have been enqueued on another queue and may still read its matrices.
     const AutoCLEventList lastUse = listOf(fWritten);
     if (fSkin) {
@@ -77,6 +88,13 @@ cl_int MeshEvaluator::enqueueDeformers(const MeshPose& pose, WorkerQueue& worker
             return status;
     }
     return fTwist.evaluate(pose, worker, lastUse, fData);
+}
+
+// Deformers that are off: what goes into the chain comes out of it.
+void MeshEvaluator::passThrough()
+{
+    fData.setData(TopenCLData::sPositionsName(), fTwisted, fRestPositions.data());
+    fData.setData(TopenCLData::sNormalsName(), fTwisted, fRestNormals.data());
 }
 
 // Only this command needs the shared buffer: the deformers may be done before it is acquired.

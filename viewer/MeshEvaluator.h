@@ -32,10 +32,13 @@ class MeshEvaluator {
 public:
     // `number` tells the mesh from all others.
     MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones,
-                  KernelCounts& counts);
+                  KernelFiles& files);
 
     // False when a kernel is missing.
     bool valid() const;
+
+    // Takes kernels of the texts that the files now stand for.
+    void renewKernels(KernelFiles& files);
 
     // Uploads the mesh at rest. Again for another level of detail. A status of OpenCL.
     cl_int setMesh(const Mesh& mesh, cl_command_queue queue);
@@ -48,6 +51,7 @@ public:
 
 private:
     cl_int enqueueDeformers(const MeshPose& pose, WorkerQueue& worker);
+    void passThrough();
     cl_int enqueueWrite(const TuniqueString& name, const VertexBuffer& target, WorkerQueue& worker,
                         AutoCLObject<cl_event>& written, Handover& handover);
     static void handOver(const VertexBuffer& target, const AutoCLObject<cl_event>& written,

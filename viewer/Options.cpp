@@ -1,5 +1,7 @@
 #include "viewer/Options.h"
 
+#include "viewer/Controls.h"
+
 #include <QCommandLineParser>
 #include <QRegularExpression>
 
@@ -12,10 +14,8 @@ constexpr int kLargestCrowd = 10000;
 constexpr int kMostFrames = 1000000;
 constexpr int kMostVertices = 1000000000;
 
-constexpr char kAfterwords[] =
+constexpr char kExitCodes[] =
     R"(
-Keys in the window: drag to orbit, wheel to zoom, D for the other level of detail, Escape to quit.
-
 Exit codes:
   0  all is well
   1  --verify found a deviation above the bound
@@ -155,7 +155,8 @@ std::string helpText()
 {
     QCommandLineParser parser;
     describe(parser);
-    return parser.helpText().toStdString() + kAfterwords;
+    return parser.helpText().toStdString() +
+           "\nIn the window: drag to orbit, wheel to zoom, and the keys\n" + keyHelp() + kExitCodes;
 }
 
 } // namespace viewer

@@ -102,4 +102,12 @@ QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose)
     return mesh.hasBones() ? QMatrix4x4() : pose[mesh.node];
 }
 
+QMatrix4x4 restToModel(const Mesh& mesh, const Pose& pose)
+{
+    if (!mesh.hasBones())
+        return pose[mesh.node];
+    const Bone& bone = mesh.bones.front();
+    return pose[bone.node] * bone.offset;
+}
+
 } // namespace viewer

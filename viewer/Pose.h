@@ -37,4 +37,8 @@ std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
 // it there, else its node's) to the model's.
 QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose);
 
+// The transform from the space of the mesh at rest to the model's, by `pose`, which is at rest too:
+// all bones agree on it then.
+QMatrix4x4 restToModel(const Mesh& mesh, const Pose& pose);
+
 } // namespace viewer

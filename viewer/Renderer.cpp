@@ -61,7 +61,7 @@ Status Renderer::initialize()
                    "the OpenGL driver does not compile the shaders; update the graphics driver"};
 }
 
-void Renderer::draw(const Scene& scene, const Camera& camera, Canvas& canvas)
+void Renderer::draw(const Scene& scene, const Camera& camera, Canvas& canvas, const QRect& area)
 {
     fGL.glEnable(GL_DEPTH_TEST);
     fGL.glDisable(GL_BLEND);
@@ -70,11 +70,14 @@ void Renderer::draw(const Scene& scene, const Camera& camera, Canvas& canvas)
     fShadowMap.bindTexture(kShadowUnit);
 
     canvas.bind();
-    fGL.glViewport(0, 0, canvas.size().width(), canvas.size().height());
+    fGL.glViewport(area.x(), area.y(), area.width(), area.height());
+    fGL.glScissor(area.x(), area.y(), area.width(), area.height());
+    fGL.glEnable(GL_SCISSOR_TEST);
     fGL.glClear(GL_COLOR_BUFFER_BIT | GL_DEPTH_BUFFER_BIT);
     drawBackdrop(camera);
     drawGround(scene, camera);
     drawCharacters(scene, camera);
+    fGL.glDisable(GL_SCISSOR_TEST);
     fGL.glBindVertexArray(0);
 }
 

@@ -9,6 +9,7 @@
 
 #include <QOpenGLFunctions_3_3_Core>
 #include <QOpenGLShaderProgram>
+#include <QRect>
 
 namespace viewer {
 
@@ -22,7 +23,8 @@ public:
 
     // Compiles the shaders.
     Status initialize();
-    void draw(const Scene& scene, const Camera& camera, Canvas& canvas);
+    // Fills `area` of the canvas, in pixels; what is beside it stays.
+    void draw(const Scene& scene, const Camera& camera, Canvas& canvas, const QRect& area);
 
 private:
     void drawShadows(const Scene& scene);

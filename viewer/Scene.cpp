@@ -84,7 +84,8 @@ GLuint createIndexBuffer(QOpenGLFunctions_3_3_Core& gl, const Mesh& mesh)
 
 Scene::Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation,
              int crowd)
-    : fGL(gl), fModel(model), fAnimation(animation), fSpace(characterSpace(model, animation))
+    : fGL(gl), fModel(model), fAnimation(animation), fSpace(characterSpace(model, animation)),
+      fRest(poseAt(model, nullptr, 0))
 {
     for (const Mesh& mesh : fModel.meshes) {
         auto levels = std::make_unique<MeshLevels>();
@@ -178,7 +179,10 @@ void Scene::poseCharacter(Character& character, double seconds) const
     const float height = std::max(fSpace.size.y(), kGap);
     for (const auto& mesh : character.meshes) {
         mesh->pose.bones = boneMatrices(mesh->mesh(), pose);
-        mesh->pose.geometryMatrix = fSpace.fromModel * meshToModel(mesh->mesh(), pose);
+        mesh->pose.deforms = fDeforms;
+        mesh->pose.geometryMatrix =
+            fSpace.fromModel *
+            (fDeforms ? meshToModel(mesh->mesh(), pose) : restToModel(mesh->mesh(), fRest));
         mesh->pose.inverseGeometryMatrix = mesh->pose.geometryMatrix.inverted();
         mesh->pose.twist = static_cast<float>(twist) / height;
     }

@@ -5,6 +5,7 @@
 #include "viewer/Deformation.h"
 #include "viewer/MeshEvaluator.h"
 #include "viewer/Model.h"
+#include "viewer/Pose.h"
 #include "viewer/VertexBuffer.h"
 
 #include <cstdint>
@@ -56,6 +57,10 @@ public:
     Scene(const Scene&) = delete;
     Scene& operator=(const Scene&) = delete;
 
+    // Deformers that are off leave the meshes at rest from the next pose on.
+    void toggleDeformers() { fDeforms = !fDeforms; }
+    bool deforms() const { return fDeforms; }
+
     // Moves every character to its pose at this time, in parallel.
     void pose(double seconds);
 
@@ -79,7 +84,9 @@ private:
     const Model& fModel;
     const Animation* fAnimation;
     CharacterSpace fSpace;
+    Pose fRest;
     QVector3D fSize;
+    bool fDeforms = true;
     std::vector<std::unique_ptr<MeshLevels>> fLevels;
     std::vector<Character> fCharacters;
     std::vector<CharacterMesh*> fMeshes;

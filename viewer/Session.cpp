@@ -6,6 +6,7 @@
 #include "viewer/ModelImport.h"
 #include "viewer/OpenCLStart.h"
 #include "viewer/ProfileScope.h"
+#include "viewer/SyncModeNames.h"
 
 #include <algorithm>
 #include <chrono>
@@ -20,38 +21,12 @@ namespace {
 
 // Evaluations are numbered in 15 bits, which leaves out the one number that names none.
 constexpr int kEvaluationNumbers = 0x8000;
+// Frames over which the overlay's time is a median: steady, and still of the present.
+constexpr std::size_t kRecentFrames = 30;
 
 float aspectOf(const QSize& size)
 {
     return static_cast<float>(size.width()) / static_cast<float>(std::max(size.height(), 1));
-}
-
-const char* nameOf(TopenCLInfo::GraphicsToCLSyncMode mode)
-{
-    switch (mode) {
-    case TopenCLInfo::kGraphicsToCLImplicit:
-        return "1, implicit";
-    case TopenCLInfo::kGraphicsToCLExplicit:
-        return "2, explicit (fence)";
-    case TopenCLInfo::kGraphicsToCLFinish:
-        return "3, glFinish";
-    }
-    return "unknown";
-}
-
-const char* nameOf(TopenCLInfo::CLToGraphicsSyncMode mode)
-{
-    switch (mode) {
-    case TopenCLInfo::kCLToGraphicsImplicit:
-        return "1, implicit";
-    case TopenCLInfo::kCLToGraphicsEventQuery:
-        return "2, event query";
-    case TopenCLInfo::kCLToGraphicsSyncObject:
-        return "3, sync object";
-    case TopenCLInfo::kCLToGraphicsFinish:
-        return "4, clFinish";
-    }
-    return "unknown";
 }
 
 Result<const Animation*> chooseAnimation(const Model& model, const std::string& name)
@@ -103,7 +78,7 @@ Status Session::start(const QSize& pictureSize)
     if (Status failure = fRenderer->initialize())
         return failure;
     resize(pictureSize);
-    fCamera.frame(fScene->outline(), aspectOf(pictureSize));
+    frameScene();
     return {};
 }
 
@@ -144,6 +119,8 @@ Status Session::startOpenCLIfPossible()
 Status Session::renderFrame(double seconds)
 {
     fScene->pose(seconds);
+    if (fCpuTwin)
+        fCpuTwin->follow(*fScene);
 
     const auto begin = std::chrono::steady_clock::now();
     if (Status failure = evaluate())
@@ -158,15 +135,22 @@ Status Session::renderFrame(double seconds)
             fDeviation.emplace();
         fDeviation->include(verify(*fGL, *fScene));
     }
-    {
-        const ProfileScope scope("Draw");
-        fRenderer->draw(*fScene, fCamera, *fCanvas);
-    }
+    draw();
     if (fEvaluation)
         fEvaluation->renderingComplete();
     Status failure = writePicture();
     ++fFrame;
     return failure;
+}
+
+// The original, and its copy where there is one, on the left and the right.
+void Session::draw()
+{
+    const ProfileScope scope("Draw");
+    const QRect left(QPoint(), viewSize());
+    fRenderer->draw(*fScene, fCamera, *fCanvas, left);
+    if (fCpuTwin)
+        fRenderer->draw(fCpuTwin->scene(), fCamera, *fCanvas, left.translated(left.width(), 0));
 }
 
 // From here to the return is what the report calls the evaluation time.
@@ -227,7 +211,38 @@ Status Session::changeLevels(EvaluationState state)
 void Session::resize(const QSize& pictureSize)
 {
     fCanvas = std::make_unique<Canvas>(pictureSize);
-    fCamera.setAspect(aspectOf(pictureSize));
+    fCamera.setAspect(aspectOf(viewSize()));
+}
+
+QSize Session::viewSize() const
+{
+    const QSize size = fCanvas->size();
+    return fCpuTwin ? QSize(size.width() / 2, size.height()) : size;
+}
+
+void Session::frameScene()
+{
+    fCamera.frame(fScene->outline(), aspectOf(viewSize()));
+}
+
+void Session::toggleCpuTwin()
+{
+    if (fCpuTwin)
+        fCpuTwin.reset();
+    else
+        fCpuTwin = std::make_unique<CpuTwin>(*fGL, fModel, fAnimation, fOptions.crowd);
+    frameScene();
+}
+
+std::string Session::kernelFolder() const
+{
+    return fEvaluation ? KernelFiles::folder() : std::string();
+}
+
+std::optional<std::string> Session::replaceKernelFile(const std::string& file,
+                                                      const std::string& source)
+{
+    return fEvaluation ? fEvaluation->replaceKernelFile(file, source) : std::nullopt;
 }
 
 Status Session::writePicture() const
@@ -259,6 +274,22 @@ OpenCLFacts Session::openCLFacts() const
     facts.counts = fEvaluation->counts();
     facts.deviceBytes = memory.currentBytes;
     facts.peakDeviceBytes = memory.peakBytes;
+    return facts;
+}
+
+OverlayFacts Session::overlayFacts() const
+{
+    OverlayFacts facts;
+    if (fEvaluation) {
+        const OpenCLFacts cl = openCLFacts();
+        facts.openCL = {cl.device, cl.graphicsToCL, cl.clToGraphics, fEvaluation->batchSize()};
+    }
+    const std::size_t recent = std::min(fEvaluationMs.size(), kRecentFrames);
+    const auto end = fEvaluationMs.end();
+    facts.evaluationMs = percentile({end - static_cast<std::ptrdiff_t>(recent), end}, 0.5);
+    if (fCpuTwin)
+        facts.cpuTwinMs = fCpuTwin->milliseconds();
+    facts.deforms = fScene->deforms();
     return facts;
 }
 

@@ -3,11 +3,13 @@
 
 #include "viewer/Camera.h"
 #include "viewer/Canvas.h"
+#include "viewer/CpuTwin.h"
 #include "viewer/Evaluation.h"
 #include "viewer/Failure.h"
 #include "viewer/Model.h"
 #include "viewer/OpenCLFunctions.h"
 #include "viewer/Options.h"
+#include "viewer/OverlayText.h"
 #include "viewer/Renderer.h"
 #include "viewer/Report.h"
 #include "viewer/Scene.h"
@@ -17,6 +19,7 @@
 
 #include <memory>
 #include <optional>
+#include <string>
 #include <vector>
 
 #include <QOpenGLFunctions_3_3_Core>
@@ -41,17 +44,33 @@ public:
     void resize(const QSize& pictureSize);
     // Before the next frame every mesh changes its level of detail.
     void changeDetail() { fChangeAll = true; }
+    // From the next frame on the meshes stay at rest, or are deformed again.
+    void toggleDeformers() { fScene->toggleDeformers(); }
+    // Shows a copy that the CPU deforms on the right half of the picture, or no longer. The camera
+    // comes to where everything is seen.
+    void toggleCpuTwin();
+
+    // Where the kernel files are. Empty without OpenCL.
+    std::string kernelFolder() const;
+    // Evaluation::replaceKernelFile.
+    std::optional<std::string> replaceKernelFile(const std::string& file,
+                                                 const std::string& source);
 
     Camera& camera() { return fCamera; }
     Canvas& canvas() { return *fCanvas; }
     // False when a frame was beyond the bound of --verify.
     bool verified() const { return !fDeviation || fDeviation->withinBound(); }
     std::string report() const;
+    // Of the present, all but the pause.
+    OverlayFacts overlayFacts() const;
 
 private:
     Status loadModel();
     Status startOpenCLIfPossible();
     Status evaluate();
+    void draw();
+    void frameScene();
+    QSize viewSize() const; // of one scene in the picture
     Status changeLevels(EvaluationState state);
     bool levelChangeIsDue(EvaluationState state) const;
     Status writePicture() const;
@@ -65,6 +84,7 @@ private:
     Model fModel;
     const Animation* fAnimation = nullptr; // of fModel
     std::unique_ptr<Scene> fScene;
+    std::unique_ptr<CpuTwin> fCpuTwin;       // null: the scene fills the picture
     std::unique_ptr<Evaluation> fEvaluation; // null: without OpenCL
     std::unique_ptr<Renderer> fRenderer;
     std::unique_ptr<Canvas> fCanvas;

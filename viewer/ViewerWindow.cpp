@@ -1,7 +1,10 @@
 #include "viewer/ViewerWindow.h"
 
+#include "viewer/Controls.h"
+#include "viewer/Player.h"
 #include "viewer/Session.h"
 
+#include <QElapsedTimer>
 #include <QGuiApplication>
 #include <QKeyEvent>
 #include <QMouseEvent>
@@ -33,6 +36,9 @@ Status noOpenGL()
 
 } // namespace
 
+ViewerWindow::ViewerWindow() = default;
+ViewerWindow::~ViewerWindow() = default;
+
 Status ViewerWindow::open(const QSize& size)
 {
     if (!openGLIsUsable())
@@ -50,10 +56,16 @@ Status ViewerWindow::open(const QSize& size)
 
 void ViewerWindow::play(Session& session)
 {
-    fSession = &session;
-    fClock.start();
+    makeCurrent();
+    fPlayer = std::make_unique<Player>(session);
     connect(this, &QOpenGLWindow::frameSwapped, this, [this] { update(); });
     update();
+}
+
+void ViewerWindow::stop()
+{
+    makeCurrent();
+    fPlayer.reset();
 }
 
 void ViewerWindow::present(Session& session)
@@ -69,30 +81,33 @@ QSize ViewerWindow::pixelSize() const
 
 void ViewerWindow::resizeGL(int, int)
 {
-    if (fSession)
-        fSession->resize(pixelSize());
+    if (fPlayer)
+        fPlayer->session().resize(pixelSize());
 }
 
 void ViewerWindow::paintGL()
 {
-    if (!fSession)
+    if (!fPlayer)
         return;
-    constexpr double kMsPerSecond = 1000.0;
-    fFailure = fSession->renderFrame(static_cast<double>(fClock.elapsed()) / kMsPerSecond);
+    fFailure = fPlayer->renderFrame();
     if (fFailure) {
         stop();
         QGuiApplication::exit();
         return;
     }
-    fSession->canvas().showIn(defaultFramebufferObject(), pixelSize());
+    fPlayer->showIn(defaultFramebufferObject(), pixelSize(), devicePixelRatio());
 }
 
+// Events come with no context current, and a player wants one.
 void ViewerWindow::keyPressEvent(QKeyEvent* event)
 {
-    if (event->key() == Qt::Key_Escape)
+    const std::optional<Action> action = actionOf(event->key());
+    if (action == Action::kQuit) {
         close();
-    else if (event->key() == Qt::Key_D && fSession)
-        fSession->changeDetail();
+    } else if (action && fPlayer) {
+        makeCurrent();
+        fPlayer->act(*action);
+    }
 }
 
 void ViewerWindow::mousePressEvent(QMouseEvent* event)
@@ -104,15 +119,16 @@ void ViewerWindow::mouseMoveEvent(QMouseEvent* event)
 {
     const QPointF moved = event->position() - fLastPosition;
     fLastPosition = event->position();
-    if (fSession && event->buttons() != Qt::NoButton)
-        fSession->camera().orbit(-kDegreesPerPixel * static_cast<float>(moved.x()),
-                                 kDegreesPerPixel * static_cast<float>(moved.y()));
+    if (fPlayer && event->buttons() != Qt::NoButton)
+        fPlayer->session().camera().orbit(-kDegreesPerPixel * static_cast<float>(moved.x()),
+                                          kDegreesPerPixel * static_cast<float>(moved.y()));
 }
 
 void ViewerWindow::wheelEvent(QWheelEvent* event)
 {
-    if (fSession)
-        fSession->camera().zoom(static_cast<float>(event->angleDelta().y()) / kUnitsPerNotch);
+    if (fPlayer)
+        fPlayer->session().camera().zoom(static_cast<float>(event->angleDelta().y()) /
+                                         kUnitsPerNotch);
 }
 
 } // namespace viewer

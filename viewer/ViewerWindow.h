@@ -3,24 +3,29 @@
 
 #include "viewer/Failure.h"
 
-#include <QElapsedTimer>
+#include <memory>
+
 #include <QOpenGLWindow>
 #include <QPoint>
 
 namespace viewer {
 
+class Player;
 class Session;
 
 // Without a session it stays empty. With one it draws frame after frame; the mouse orbits, the
-// wheel zooms, D changes the level of detail, Escape quits.
+// wheel zooms, the keys do what Controls.h tells.
 class ViewerWindow : public QOpenGLWindow {
 public:
+    ViewerWindow();
+    ~ViewerWindow() override;
+
     // Shows the window and waits until its OpenGL context is there.
     Status open(const QSize& size);
 
-    // Starts to play. The session is borrowed until stop().
+    // Starts to play. The session is borrowed until stop(), which leaves the context current.
     void play(Session& session);
-    void stop() { fSession = nullptr; }
+    void stop();
     // Why playing ended by itself.
     const Status& failure() const { return fFailure; }
 
@@ -38,9 +43,8 @@ protected:
 private:
     QSize pixelSize() const;
 
-    Session* fSession = nullptr;
+    std::unique_ptr<Player> fPlayer; // null: nothing plays
     Status fFailure;
-    QElapsedTimer fClock;
     QPointF fLastPosition; // of the mouse
 };
 

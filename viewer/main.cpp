@@ -69,7 +69,6 @@ Status playInWindow(Session& session, ViewerWindow& window)
     window.play(session);
     QGuiApplication::exec();
     window.stop();
-    window.makeCurrent();
     return window.failure();
 }
 

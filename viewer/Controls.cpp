@@ -1,0 +1,57 @@
+#include "viewer/Controls.h"
+
+#include <algorithm>
+#include <iomanip>
+#include <iterator>
+#include <sstream>
+
+#include <Qt>
+
+namespace viewer {
+namespace {
+
+struct KeyBinding {
+    int key; // of Qt::Key
+    const char* name;
+    Action action;
+    const char* word;    // for the overlay, which has little room
+    const char* meaning; // for the help
+};
+
+constexpr KeyBinding kBindings[] = {
+    {Qt::Key_Space, "Space", Action::kPause, "pause", "Time stands still, and goes on."},
+    {Qt::Key_R, "R", Action::kDeformers, "rest", "Deformers off (the shape at rest), and on."},
+    {Qt::Key_C, "C", Action::kSideBySide, "CPU", "A copy that the CPU deforms, on the right."},
+    {Qt::Key_D, "D", Action::kDetail, "detail", "The other level of detail."},
+    {Qt::Key_O, "O", Action::kOverlay, "overlay", "The overlay off, and on."},
+    {Qt::Key_Escape, "Esc", Action::kQuit, "quit", "Quits."},
+};
+
+} // namespace
+
+std::optional<Action> actionOf(int key)
+{
+    const auto* found = std::find_if(std::begin(kBindings), std::end(kBindings),
+                                     [key](const KeyBinding& each) { return each.key == key; });
+    return found == std::end(kBindings) ? std::nullopt : std::optional(found->action);
+}
+
+std::string keyHelp()
+{
+    constexpr int kNameWidth = 8;
+    std::ostringstream text;
+    for (const KeyBinding& binding : kBindings)
+        text << "  " << std::left << std::setw(kNameWidth) << binding.name << binding.meaning
+             << '\n';
+    return text.str();
+}
+
+std::string keyReminder()
+{
+    std::string text;
+    for (const KeyBinding& binding : kBindings)
+        text += std::string(text.empty() ? "" : "  ") + binding.name + ' ' + binding.word;
+    return text;
+}
+
+} // namespace viewer
