@@ -1,14 +1,15 @@
-// Growable device buffers on a real runtime: the numbers that arrive, and the memory that is
+// Device buffers and their pool on a real runtime: the numbers that arrive, and the memory that is
 // counted.
 #include "LibraryTest.h"
 
 #include "buffers/TopenCLBuffer.h"
+#include "buffers/TopenCLData.h"
+#include "buffers/TopenCLDataBufferPool.h"
 #include "diagnostics/AutoCLEventList.h"
 #include "runtime/TopenCLInfo.h"
 #include "standalone/DeviceMemory.h"
 
 #include <cstring>
-#include <limits>
 #include <numeric>
 
 namespace {
@@ -50,8 +51,9 @@ protected:
 
 } // namespace
 
-TEST_F(Buffers, UploadGrowsWritesInPlaceAndReadsBack)
+TEST_F(Buffers, UploadsGrowWriteInPlaceAndAreCountedAndReadBack)
 {
+    const std::size_t counted = countedBytes();
     TopenCLBuffer buffer(context(), CL_MEM_READ_WRITE);
     std::vector<float> values = ramp(1000, 0);
     ASSERT_EQ(upload(buffer, 0, values), CL_SUCCESS);
@@ -73,81 +75,56 @@ TEST_F(Buffers, UploadGrowsWritesInPlaceAndReadsBack)
     EXPECT_EQ(buffer.capacityInBytes(), 6400u);
     std::vector<float> grown = readBack(buffer, 1600);
     EXPECT_EQ(std::vector<float>(grown.begin() + 1000, grown.end()), tail);
-}
-
-TEST_F(Buffers, DeviceMemoryIsCountedWhileItExists)
-{
-    const std::size_t before = countedBytes();
-    {
-        TopenCLBuffer buffer(context(), CL_MEM_READ_WRITE);
-        ASSERT_EQ(buffer.ensureBufferCapacity(1000), CL_SUCCESS);
-        EXPECT_EQ(countedBytes(), before + 1000);
-        ASSERT_EQ(buffer.ensureBufferCapacity(5000), CL_SUCCESS);
-        EXPECT_EQ(countedBytes(), before + 5000);
-
-        TopenCLBuffer copy(buffer);
-        copy.reset();
-        EXPECT_EQ(countedBytes(), before + 5000) << "only the original un-counts";
-        buffer.openCLDataBuffer().descriptor().setElementCount(10);
-        buffer.openCLDataBuffer().descriptor().setElementSizeInBytes(12);
-        TopenCLBuffer wrapping(context(), CL_MEM_READ_WRITE, buffer.openCLDataBuffer());
-        EXPECT_EQ(wrapping.capacityInBytes(), 120u);
-        EXPECT_EQ(countedBytes(), before + 5000);
-    }
-    EXPECT_EQ(countedBytes(), before);
-}
-
-TEST_F(Buffers, RefusesWhatCannotBeHeldAndKeepsWhatItHas)
-{
-    TopenCLBuffer buffer(context(), CL_MEM_READ_WRITE);
-    std::vector<float> values = ramp(16, 1);
-    ASSERT_EQ(upload(buffer, 0, values), CL_SUCCESS);
-    const std::size_t counted = countedBytes();
-    constexpr std::size_t kTooLarge = std::size_t{1} << 32;
-
-    EXPECT_EQ(buffer.ensureBufferCapacity(kTooLarge), CL_INVALID_BUFFER_SIZE);
-    for (const std::size_t offset : {kTooLarge - 4, std::numeric_limits<std::size_t>::max() - 3}) {
-        EXPECT_EQ(buffer.uploadDataToGPU(queue(), CL_TRUE, offset, 64, values.data(), 0, nullptr),
-                  CL_INVALID_BUFFER_SIZE)
-            << offset;
-    }
-    int error = CL_SUCCESS;
-    const TopenCLBuffer never(context(), CL_MEM_READ_WRITE, kTooLarge, nullptr, &error);
-    EXPECT_EQ(error, CL_INVALID_BUFFER_SIZE);
-
-    buffer.openCLDataBuffer().descriptor().setPermissions(TopenCLDataBufferDescriptor::kReadOnly);
-    EXPECT_EQ(upload(buffer, 0, values), CL_INVALID_OPERATION);
-    EXPECT_EQ(buffer.uploadDataToGPU(queue(), CL_TRUE, 0, 0, nullptr, 0, nullptr), CL_SUCCESS);
-
+    EXPECT_EQ(countedBytes(), counted + 6400);
+    buffer.reset();
     EXPECT_EQ(countedBytes(), counted);
-    EXPECT_EQ(readBack(buffer, 16), values);
 }
 
-TEST_F(Buffers, MappingFollowsTheAccessFlags)
+TEST_F(Buffers, MappedMemoryIsWrittenAndMappedAnewWhenItGrows)
 {
     constexpr std::size_t kBytes = 64;
     int error = CL_SUCCESS;
-    TopenCLBuffer writable(context(),
-                           CL_MEM_READ_WRITE | CL_MEM_ALLOC_HOST_PTR | CL_MEM_HOST_WRITE_ONLY,
-                           kBytes, nullptr, &error);
+    TopenCLBuffer buffer(context(),
+                         CL_MEM_READ_WRITE | CL_MEM_ALLOC_HOST_PTR | CL_MEM_HOST_WRITE_ONLY, kBytes,
+                         nullptr, &error);
     ASSERT_EQ(error, CL_SUCCESS);
-    ASSERT_NE(writable.mappedPointer(), nullptr);
-    std::memset(writable.mappedPointer(), 1, kBytes);
-    ASSERT_EQ(writable.ensureBufferCapacity(2 * kBytes), CL_SUCCESS)
-        << "growing unmaps and maps anew";
-    EXPECT_NE(writable.mappedPointer(), nullptr);
+    for (std::size_t size = kBytes; size <= 4 * kBytes; size *= 2) {
+        ASSERT_EQ(buffer.ensureBufferCapacity(size), CL_SUCCESS);
+        ASSERT_NE(buffer.mappedPointer(), nullptr);
+        std::memset(buffer.mappedPointer(), 1, size);
+    }
+}
 
-    TopenCLBuffer noAccess(context(),
-                           CL_MEM_READ_WRITE | CL_MEM_ALLOC_HOST_PTR | CL_MEM_HOST_NO_ACCESS);
-    ASSERT_EQ(noAccess.ensureBufferCapacity(kBytes), CL_SUCCESS);
-    EXPECT_EQ(noAccess.mappedPointer(), nullptr);
+TEST_F(Buffers, OfThePoolAreReusedAndRecordedAtTheirTrueSize)
+{
+    const auto describe = [](const Tplug& plug, unsigned elements, bool readOnly) {
+        return TopenCLDataBufferDescriptor(plug, TopenCLData::sPositionsName(),
+                                           readOnly ? TopenCLDataBufferDescriptor::kReadOnly
+                                                    : TopenCLDataBufferDescriptor::kReadWrite,
+                                           12, elements, 0);
+    };
+    const auto sizeOf = [](const TopenCLDataBuffer& buffer) {
+        std::size_t size = 0;
+        clGetMemObjectInfo(buffer.buffer().get(), CL_MEM_SIZE, sizeof size, &size, nullptr);
+        return size;
+    };
+    const Tplug plug(1, 2);
+    TopenCLDataBufferPool pool;
+    const std::size_t counted = countedBytes();
+    const TopenCLDataBuffer first = pool.createBuffer(describe(plug, 100, true));
+    ASSERT_EQ(sizeOf(first), 1200u);
+    EXPECT_EQ(countedBytes(), counted) << "pool memory is not counted";
 
-    std::vector<float> values = ramp(16, 0);
-    TopenCLBuffer fromHost(context(), CL_MEM_READ_WRITE | CL_MEM_ALLOC_HOST_PTR);
-    ASSERT_EQ(upload(fromHost, 0, values), CL_SUCCESS);
-    EXPECT_EQ(fromHost.mappedPointer(), nullptr) << "memory made from host data is not mapped";
+    pool.releaseBuffers();
+    TopenCLDataBuffer second = pool.createBuffer(describe(Tplug(3, 4), 50, false));
+    EXPECT_EQ(second.buffer().get(), first.buffer().get());
+    EXPECT_EQ(second.descriptor().capacityInBytes(), 1200u);
+    EXPECT_EQ(second.descriptor().elementCount(), 50u);
 
-    const TopenCLBuffer copy(writable);
-    EXPECT_EQ(TopenCLBuffer(copy).mappedPointer(), nullptr)
-        << "the mapping stays with the original";
+    second.descriptor().setPermissions(TopenCLDataBufferDescriptor::kReadOnly);
+    const TopenCLDataBuffer output = pool.createOutputBuffer(second, plug);
+    EXPECT_EQ(sizeOf(output), 600u) << "what its elements need, not what the input's memory has";
+    TopenCLData data;
+    pool.collectDataForPlug(plug, data);
+    EXPECT_EQ(data.getSinglePlug(), plug);
 }
