@@ -18,7 +18,7 @@ thread_local unsigned allocations = 0;
 
 bool nextFails()
 {
-    if (scripted::insideRuntime())
+    if (scripted::InsideRuntime::here())
         return false;
     ++allocations;
     return allocationsLeft != 0 && --allocationsLeft == 0;
@@ -45,15 +45,10 @@ void operator delete(void* memory, std::size_t) noexcept
 namespace scripted {
 namespace {
 
-struct Row {
-    const char* name;
+struct Row : Named {
     std::function<void(Bench&)> prepare;
     std::function<int(Bench&)> run;
 };
-void PrintTo(const Row& row, std::ostream* out)
-{
-    *out << row.name;
-}
 
 class OutOfMemory : public ScriptedTest, public ::testing::WithParamInterface<Row> {
 protected:

@@ -1,10 +1,10 @@
 // Data buffers, the evaluation data map, and the pool against a plain model.
+#include "Objects.h"
 #include "ScriptedTest.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
-#include "loader/OpenCLLoader.h"
-#include "runtime/TopenCLInfo.h"
 
+#include <algorithm>
 #include <random>
 #include <string>
 
@@ -30,8 +30,7 @@ protected:
     static TopenCLDataBuffer makeData(const Descriptor& descriptor = describe(4))
     {
         AutoCLObject<cl_mem> mem;
-        mem.adopt(
-            ocl.clCreateBuffer(TopenCLInfo::theOne().openCLContext(), 1, 4, nullptr, nullptr));
+        mem.adopt(makeMem());
         return {descriptor, mem, {}};
     }
 };
@@ -137,70 +136,47 @@ TEST_F(DataTest, TheKeyHashFollowsItsFormula)
     }
 }
 
-// What the pool should do, in a list of capacities.
-class PoolModel {
-public:
-    // The capacity that a request gets; its memory's place in the free list, or none.
-    std::pair<unsigned, bool> request(unsigned bytes)
-    {
-        auto best = fFree.end();
-        for (auto entry = fFree.begin(); entry != fFree.end(); ++entry) {
-            if (*entry >= bytes && (best == fFree.end() || *entry < *best))
-                best = entry;
-        }
-        const bool reused = best != fFree.end();
-        const unsigned capacity = reused ? *best : bytes;
-        if (reused)
-            fFree.erase(best);
-        fUsed.push_back(capacity);
-        return {capacity, reused};
-    }
-    void release()
-    {
-        fFree.insert(fFree.end(), fUsed.begin(), fUsed.end());
-        fUsed.clear();
-    }
-
-private:
-    std::vector<unsigned> fFree;
-    std::vector<unsigned> fUsed;
+struct PoolEntry {
+    unsigned capacity;
+    cl_mem mem;
 };
 
-TEST_F(DataTest, ThePoolHandsOutTheBestFit)
+TEST_F(DataTest, ThePoolHandsOutTheBestFitAndOfEqualsTheFirst)
 {
     std::mt19937 random(20); // any number: the sequences only have to vary
     for (int sequence = 0; sequence < 200; ++sequence) {
-        PoolModel model;
+        std::vector<PoolEntry> free;
+        std::vector<PoolEntry> used;
         TopenCLDataBufferPool pool;
         for (int step = 0; step < 60; ++step) {
             if (random() % 6 == 0) {
                 pool.releaseBuffers();
-                model.release();
+                free.insert(free.end(), used.begin(), used.end());
+                used.clear();
                 continue;
             }
             const auto bytes =
                 static_cast<unsigned>(random() % 9 * 50); // few sizes, so that many fit exactly
-            const auto [capacity, reused] = model.request(bytes);
+            const auto excess = [bytes](const PoolEntry& entry) {
+                return entry.capacity - bytes; // huge for what is too small
+            };
+            const auto best = std::ranges::min_element(free, {}, excess);
+            const bool reused = best != free.end() && best->capacity >= bytes;
+            const PoolEntry expected = reused ? *best : PoolEntry{bytes, nullptr};
             calls();
             const TopenCLDataBuffer buffer = pool.createBuffer(describe(bytes));
-            ASSERT_EQ(buffer.descriptor().capacityInBytes(), capacity);
-            ASSERT_EQ(runtime().memSize(buffer.buffer().get()), capacity);
+            const cl_mem mem = buffer.buffer().get();
+            ASSERT_EQ(buffer.descriptor().capacityInBytes(), expected.capacity);
+            ASSERT_EQ(runtime().memSize(mem), expected.capacity);
             ASSERT_EQ(callsOf("clCreateBuffer").empty(), reused || bytes == 0);
             ASSERT_EQ(deviceMemory(), 0U);
+            if (reused) {
+                ASSERT_EQ(mem, expected.mem);
+                free.erase(best);
+            }
+            used.push_back({expected.capacity, mem});
         }
     }
-}
-
-TEST_F(DataTest, ThePoolTakesTheFirstOfEqualsWithItsEvent)
-{
-    TopenCLDataBufferPool pool;
-    const cl_mem first = pool.createBuffer(describe(200)).buffer().get();
-    const cl_mem second = pool.createBuffer(describe(200)).buffer().get();
-    pool.createBuffer(describe(100));
-    pool.releaseBuffers();
-    EXPECT_EQ(pool.createBuffer(describe(150)).buffer().get(), first);
-    EXPECT_EQ(pool.createBuffer(describe(150)).buffer().get(), second);
-    EXPECT_EQ(runtime().memSize(pool.createBuffer(describe(150)).buffer().get()), 150U);
 }
 
 TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)

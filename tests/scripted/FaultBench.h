@@ -2,15 +2,14 @@
 // whose result is a number. Everything goes with the bench.
 #pragma once
 
+#include "Objects.h"
 #include "ScriptedTest.h"
 #include "buffers/TopenCLBuffer.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
 #include "host/EvaluationId.h"
 #include "interop/GraphicsSync.h"
-#include "interop/TopenCLSharedBufferMgr.h"
 #include "kernels/TopenCLKernelStore.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <array>
 #include <memory>
@@ -124,10 +123,8 @@ public:
     }
     int createShared()
     {
-        unsigned glBuffer = 7;
         int status = CL_SUCCESS;
-        const auto* record =
-            manager->CreateSharedCLBuffer(info().openCLContext(), 1, &glBuffer, &status);
+        const auto* record = makeShared(*manager, &status);
         if (record)
             shared.push_back(record);
         return int{record != nullptr};
@@ -182,12 +179,8 @@ private:
     static cl_command_queue queue() { return info().openCLCommandQueue(); }
     static TopenCLDataBufferDescriptor describe(unsigned bytes)
     {
-        return {Tplug(),
-                TopenCLData::sPositionsName(),
-                TopenCLDataBufferDescriptor::kReadWrite,
-                1,
-                bytes,
-                0};
+        using Descriptor = TopenCLDataBufferDescriptor;
+        return {Tplug(), TopenCLData::sPositionsName(), Descriptor::kReadWrite, 1, bytes, 0};
     }
     const TopenCLSharedBuffer* takeFirst()
     {

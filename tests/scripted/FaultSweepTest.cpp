@@ -12,8 +12,7 @@ namespace {
 
 constexpr int kTheStatus = 1000; // stands for the status of the failing call
 
-struct Row {
-    const char* name;
+struct Row : Named {
     std::function<void(Bench&)> prepare;
     std::function<int(Bench&)> run; // the operation's result as a number
     // Results other than that of a run without faults, by the function that fails.
@@ -25,10 +24,6 @@ struct Row {
     // The first attempt used its subject up: prepare it once more before trying again.
     bool fresh = false;
 };
-void PrintTo(const Row& row, std::ostream* out)
-{
-    *out << row.name;
-}
 
 std::string functionOf(const std::string& line)
 {
@@ -48,12 +43,7 @@ Lines functionsOf(const Lines& lines)
 
 class FaultSweep : public ScriptedTest, public ::testing::WithParamInterface<Row> {
 protected:
-    void SetUp() override
-    {
-        setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2");
-        setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", "3");
-        ASSERT_TRUE(start());
-    }
+    void SetUp() override { startInModes(2, 3); }
 
     // The functions that a run without faults calls, and its result.
     Lines runWithout()

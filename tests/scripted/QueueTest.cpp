@@ -1,50 +1,29 @@
 // Queues, events and work-group sizes.
+#include "Objects.h"
 #include "ScriptedTest.h"
-#include "loader/OpenCLLoader.h"
-#include "runtime/TopenCLInfo.h"
 
 using namespace scripted;
 
 namespace {
 
-// A kernel and an event of the runtime's own, outside the library.
-cl_event makeEvent()
-{
-    const TopenCLInfo& info = TopenCLInfo::theOne();
-    const cl_mem mem = ocl.clCreateBuffer(info.openCLContext(), 1, 4, nullptr, nullptr);
-    cl_event event = nullptr;
-    ocl.clEnqueueReadBuffer(info.openCLCommandQueue(), mem, CL_FALSE, 0, 4, &event, 0, nullptr,
-                            &event);
-    ocl.clReleaseMemObject(mem);
-    return event;
-}
-
 class QueueTest : public ScriptedTest {
 protected:
     cl_kernel makeKernel()
     {
-        const TopenCLInfo& info = TopenCLInfo::theOne();
-        const cl_device_id device = info.openCLDevice();
-        const char* source = "kernel void deform() {}";
-        fProgram =
-            ocl.clCreateProgramWithSource(info.openCLContext(), 1, &source, nullptr, nullptr);
-        ocl.clBuildProgram(fProgram, 1, &device, "", nullptr, nullptr);
-        fKernel = ocl.clCreateKernel(fProgram, "deform", nullptr);
-        calls();
-        return fKernel;
+        fProgram.adopt(makeProgram());
+        fKernel.adopt(ocl.clCreateKernel(fProgram.get(), "deform", nullptr));
+        return fKernel.get();
     }
     void TearDown() override
     {
-        if (fKernel) {
-            ocl.clReleaseKernel(fKernel);
-            ocl.clReleaseProgram(fProgram);
-        }
+        fKernel.reset();
+        fProgram.reset();
         ScriptedTest::TearDown();
     }
 
 private:
-    cl_kernel fKernel = nullptr;
-    cl_program fProgram = nullptr;
+    AutoCLObject<cl_kernel> fKernel;
+    AutoCLObject<cl_program> fProgram;
 };
 
 TEST_F(QueueTest, BothQueuesAreFinishedAndFlushedInTurn)
@@ -83,18 +62,13 @@ TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
     expectLeft({"queue#3 x1", "queue#4 x1"});
 }
 
-struct EventRow {
-    const char* name;
+struct EventRow : Named {
     bool amd;
     std::deque<cl_int> statuses;
     unsigned failing; // the query that fails, or 0
     bool complete;
     std::size_t queries;
 };
-void PrintTo(const EventRow& row, std::ostream* out)
-{
-    *out << row.name;
-}
 
 class EventQuery : public ScriptedTest, public ::testing::WithParamInterface<EventRow> {};
 
@@ -129,7 +103,7 @@ INSTANTIATE_TEST_SUITE_P(
                       EventRow{"SecondLookOnAMD", true, {CL_QUEUED, CL_COMPLETE}, 0, true, 2},
                       EventRow{"RunningOnAMD", true, {CL_RUNNING}, 0, false, 2},
                       EventRow{"SecondQueryFailsOnAMD", true, {CL_RUNNING}, 2, true, 2}),
-    [](const auto& row) { return std::string(row.param.name); });
+    ::testing::PrintToStringParamName());
 
 TEST_F(QueueTest, WorkGroupSizesRoundUpToMultiples)
 {

@@ -1,12 +1,12 @@
 // The rules of driver versions and synchronisation modes, row by row: pure functions.
-#include "ScriptedTest.h"
 #include "runtime/DriverVersion.h"
 #include "runtime/SyncModes.h"
 
 #include <climits>
 #include <stdexcept>
+#include <string>
 
-using namespace scripted;
+#include <gtest/gtest.h>
 
 namespace {
 
@@ -139,92 +139,5 @@ TEST(SyncModeRule, EachRow)
     for (const SyncRow& row : kCLToGraphicsRows)
         expectModes(chooseCLToGraphicsSyncMode, row);
 }
-
-// The way from the world to the rules, through start-up.
-struct WorldRow {
-    const char* name;
-    const char* extensions;
-    int functionTable; // -1: none, 0: without sync objects, 1: with them
-    const char* forceFinish;
-    const char* graphicsToCL;
-    const char* clToGraphics;
-    std::pair<int, int> modes;
-    std::pair<bool, bool> finishes; // useGLFinish, useCLFinish
-};
-void PrintTo(const WorldRow& row, std::ostream* out)
-{
-    *out << row.name;
-}
-
-const char* const kEvents = "cl_khr_gl_sharing cl_khr_gl_event";
-const char* const kNoEvents = "cl_khr_gl_sharing";
-
-class SyncModesInTheWorld : public ScriptedTest, public ::testing::WithParamInterface<WorldRow> {};
-
-TEST_P(SyncModesInTheWorld, StartUpChoosesThem)
-{
-    const WorldRow& row = GetParam();
-    world.platforms[0].extensions = row.extensions;
-    removeFunctionTable();
-    if (row.functionTable >= 0)
-        installFunctionTable(row.functionTable == 1, true);
-    setEnvironment("VYRA_OPENCL_FORCE_FINISH", row.forceFinish);
-    setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", row.graphicsToCL);
-    setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", row.clToGraphics);
-    ASSERT_TRUE(start());
-    const TopenCLInfo& info = TopenCLInfo::theOne();
-    EXPECT_EQ(info.graphicsToCLSyncMode(), row.modes.first);
-    EXPECT_EQ(info.clToGraphicsSyncMode(), row.modes.second);
-    EXPECT_EQ(info.useGLFinish(), row.finishes.first);
-    EXPECT_EQ(info.useCLFinish(), row.finishes.second);
-    EXPECT_EQ(printedError.find("SYNC_MODE"), std::string::npos) << printedError;
-}
-INSTANTIATE_TEST_SUITE_P(
-    Rules, SyncModesInTheWorld,
-    ::testing::Values(WorldRow{"Implicit", kEvents, 0, "0", "0", "0", {1, 1}, {false, false}},
-                      WorldRow{"Explicit", kNoEvents, 1, "0", "0", "0", {2, 2}, {false, false}},
-                      WorldRow{"NoSyncObjects", kNoEvents, 0, "0", "0", "0", {3, 2}, {true, false}},
-                      WorldRow{
-                          "NoFunctionTable", kNoEvents, -1, "0", "0", "0", {3, 2}, {true, false}},
-                      WorldRow{"Finish", kEvents, 1, "-2", "1", "1", {3, 4}, {true, true}},
-                      WorldRow{"NoNumber", kEvents, 1, "no", "2x", "", {1, 1}, {false, false}}),
-    [](const auto& row) { return std::string(row.param.name); });
-
-// One process for each row: the answer is remembered.
-struct ThreadingRow {
-    const char* name;
-    bool nvidia;
-    const char* force; // VYRA_OPENCL_FORCE_THREADING, or null
-    bool usingDX;
-    bool threaded;
-};
-void PrintTo(const ThreadingRow& row, std::ostream* out)
-{
-    *out << row.name;
-}
-
-class ThreadedSharing : public ScriptedTest, public ::testing::WithParamInterface<ThreadingRow> {};
-
-TEST_P(ThreadedSharing, IsRefusedOnNVIDIAWithOpenGLAlone)
-{
-    const ThreadingRow& row = GetParam();
-    if (row.nvidia) {
-        world.platforms[0].vendor = "NVIDIA Corporation";
-        world.platforms[0].devices[0].driverVersion = "400.00";
-        arguments.vendorId = 0x10DE;
-    }
-    world.platforms[0].extensions += " cl_nv_d3d11_sharing";
-    arguments.usingDX = row.usingDX;
-    if (row.force)
-        setEnvironment("VYRA_OPENCL_FORCE_THREADING", row.force);
-    ASSERT_TRUE(start());
-    EXPECT_EQ(TopenCLInfo::theOne().supportsThreadedSharing(), row.threaded);
-}
-INSTANTIATE_TEST_SUITE_P(Rules, ThreadedSharing,
-                         ::testing::Values(ThreadingRow{"NVIDIA", true, nullptr, false, false},
-                                           ThreadingRow{"Intel", false, nullptr, false, true},
-                                           ThreadingRow{"Forced", true, "0", false, true},
-                                           ThreadingRow{"Direct3D", true, nullptr, true, true}),
-                         [](const auto& row) { return std::string(row.param.name); });
 
 } // namespace

@@ -1,10 +1,9 @@
 // Random sequences of the shared-buffer manager's operations, against the model, in every pair of
 // synchronisation modes. A failing sequence is made as short as it goes before it is printed.
 #include "SharedBufferModel.h"
+#include "Objects.h"
 #include "host/EvaluationId.h"
 #include "interop/GraphicsSync.h"
-#include "loader/OpenCLLoader.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -72,14 +71,9 @@ public:
     {
         std::sort(fBase.begin(), fBase.end());
         // Three events of an evaluator's last commands.
-        const TopenCLInfo& info = TopenCLInfo::theOne();
-        const cl_mem mem = ocl.clCreateBuffer(info.openCLContext(), 1, 4, nullptr, nullptr);
-        for (cl_event& event : fEvaluatorEvents)
-            ocl.clEnqueueReadBuffer(info.openCLCommandQueue(), mem, CL_FALSE, 0, 4, &event, 0,
-                                    nullptr, &event);
-        ocl.clReleaseMemObject(mem);
-        ++created.mems;
-        for (cl_event event : fEvaluatorEvents) {
+        for (cl_event& event : fEvaluatorEvents) {
+            event = makeEvent();
+            ++created.mems;
             ++created.events;
             fEvaluatorNames.push_back(runtime().name(event));
         }
@@ -203,10 +197,8 @@ void SideBySide::performOnRecord(const Step& step, std::size_t index)
 
 void SideBySide::create()
 {
-    unsigned glBuffer = 7;
     int status = 1;
-    const TopenCLSharedBuffer* record = fManager->CreateSharedCLBuffer(
-        TopenCLInfo::theOne().openCLContext(), CL_MEM_READ_WRITE, &glBuffer, &status);
+    const TopenCLSharedBuffer* record = makeShared(*fManager, &status);
     expect(fModel.create());
     fModel.setHandle(reinterpret_cast<std::uintptr_t>(record->fMem.get()));
     fRecords[runtime().name(record->fMem.get())] = record;
@@ -334,14 +326,9 @@ class SharedBufferModelTest : public ScriptedTest, public ::testing::WithParamIn
 protected:
     void SetUp() override
     {
-        const Modes& modes = GetParam();
-        setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE",
-                       std::to_string(modes.graphicsToCL).c_str());
-        setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE",
-                       std::to_string(modes.clToGraphics).c_str());
-        if (!modes.batching)
+        if (!GetParam().batching)
             setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
-        ASSERT_TRUE(start());
+        startInModes(GetParam().graphicsToCL, GetParam().clToGraphics);
     }
 
     std::string play(const std::vector<Step>& steps)

@@ -1,11 +1,9 @@
 // What the shared-buffer manager does beside the rules of its model: creation's odd answers, the
 // host's window, timeouts, profiling, missing abilities, copies.
+#include "Objects.h"
 #include "ScriptedTest.h"
 #include "host/EvaluationId.h"
 #include "host/GLFunctionTable.h"
-#include "interop/TopenCLSharedBufferMgr.h"
-#include "loader/OpenCLLoader.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <memory>
 
@@ -20,18 +18,10 @@ const em::Id kId(1);
 
 class SharedBufferTest : public ScriptedTest {
 protected:
-    void startWith(const char* graphicsToCL, const char* clToGraphics)
-    {
-        setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", graphicsToCL);
-        setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", clToGraphics);
-        ASSERT_TRUE(start());
-    }
     const TopenCLSharedBuffer* create(int expectedStatus = CL_SUCCESS)
     {
-        unsigned glBuffer = 7;
         int status = 1;
-        const auto* buffer = manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
-                                                            CL_MEM_WRITE_ONLY, &glBuffer, &status);
+        const auto* buffer = makeShared(manager(), &status);
         EXPECT_EQ(status, expectedStatus);
         return buffer;
     }
@@ -44,10 +34,10 @@ protected:
 
 TEST_F(SharedBufferTest, AHandleWithAStatusIsReleasedOnce)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     runtime().plan({.function = "clCreateFromGLBuffer", .status = -60, .withHandle = true});
     EXPECT_EQ(create(-60), nullptr);
-    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 2, 7) = mem#1 ! -60",
+    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 1, 7) = mem#1 ! -60",
                               "clReleaseMemObject(mem#1)"}));
     manager().PreEvaluate(kId); // nothing became of it
     EXPECT_EQ(calls(), Lines{});
@@ -56,7 +46,7 @@ TEST_F(SharedBufferTest, AHandleWithAStatusIsReleasedOnce)
 
 TEST_F(SharedBufferTest, NoHandleWithSuccessIsNoBuffer)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     runtime().scriptNextSharedMem(nullptr);
     EXPECT_EQ(create(), nullptr);
     EXPECT_EQ(calls().size(), 1U);
@@ -64,7 +54,7 @@ TEST_F(SharedBufferTest, NoHandleWithSuccessIsNoBuffer)
 
 TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     const auto* first = create();
     manager().PreEvaluate(kId);
     manager().PostEvaluate(kId);
@@ -79,7 +69,7 @@ TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
 
 TEST_F(SharedBufferTest, BuffersWithoutMemoryAreRefused)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     const TopenCLSharedBuffer empty;
     cl_event event = nullptr;
     const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
@@ -90,7 +80,7 @@ TEST_F(SharedBufferTest, BuffersWithoutMemoryAreRefused)
 
 TEST_F(SharedBufferTest, SingleCommandsPassTheirArgumentsOn)
 {
-    startWith("1", "3");
+    startInModes(1, 3);
     const auto* buffer = create();
     const cl_mem mem = buffer->fMem.get();
     const cl_command_queue queue = TopenCLInfo::theOne().secondaryOpenCLCommandQueue();
@@ -113,7 +103,7 @@ TEST_F(SharedBufferTest, SingleCommandsPassTheirArgumentsOn)
 
 TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     const auto* buffer = create();
     manager().PreEvaluate(kId);
     const cl_event none = nullptr;
@@ -130,7 +120,7 @@ TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
 
 TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
 {
-    startWith("2", "1");
+    startInModes(2, 1);
     setEnvironment("QT_QPA_PLATFORM", "offscreen");
     int argc = 0;
     const QGuiApplication application(argc, nullptr);
@@ -158,23 +148,18 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
     host().resourceWindow = nullptr;
 }
 
-struct AbilityRow {
-    const char* name;
+struct AbilityRow : Named {
     int functionTable; // -1: none, 0: no sync objects, 1: sync objects, 2: from events, too
     std::size_t fences;
     std::size_t graphicsWaits;
 };
-void PrintTo(const AbilityRow& row, std::ostream* out)
-{
-    *out << row.name;
-}
 
 class GraphicsAbilities : public SharedBufferTest,
                           public ::testing::WithParamInterface<AbilityRow> {};
 
 TEST_P(GraphicsAbilities, OnlyUsableFunctionsAreCalled)
 {
-    startWith("2", "3"); // chosen while everything was usable
+    startInModes(2, 3); // chosen while everything was usable
     removeFunctionTable();
     if (GetParam().functionTable >= 0)
         installFunctionTable(GetParam().functionTable > 0, GetParam().functionTable != 1);
@@ -192,11 +177,11 @@ INSTANTIATE_TEST_SUITE_P(SharedBuffers, GraphicsAbilities,
                                            AbilityRow{"OnlySyncFromEvents", 0, 0, 0},
                                            AbilityRow{"OnlySyncObjects", 1, 1, 0},
                                            AbilityRow{"All", 2, 1, 1}),
-                         [](const auto& row) { return std::string(row.param.name); });
+                         ::testing::PrintToStringParamName());
 
 TEST_F(SharedBufferTest, ASyncObjectThatCannotBeMadeIsSkipped)
 {
-    startWith("1", "3");
+    startInModes(1, 3);
     const auto* buffer = create();
     manager().PreEvaluate(kId);
     runtime().plan({.function = "glCreateSyncFromCLeventARB"});
@@ -209,7 +194,7 @@ TEST_F(SharedBufferTest, ASyncObjectThatCannotBeMadeIsSkipped)
 
 TEST_F(SharedBufferTest, TheProfilerSeesEveryEvaluationEvenWithoutWork)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     host().sampling = true;
     manager().PreEvaluate(kId);
     manager().PreEvaluate(kId); // open already: the scope all the same
@@ -224,7 +209,7 @@ TEST_F(SharedBufferTest, TheProfilerSeesEveryEvaluationEvenWithoutWork)
 
 TEST_F(SharedBufferTest, ACopyHasReferencesOfItsOwnAndAnEmptyList)
 {
-    startWith("1", "1");
+    startInModes(1, 1);
     const auto* buffer = create();
     manager().PreEvaluate(kId);
     cl_event handed = nullptr;

@@ -32,6 +32,14 @@ void StartUp::onNVIDIA(const char* driver)
     firstDevice().driverVersion = driver;
     minimumBufferSize = 2000;
     asyncReadback = true;
+    threadedSharing = false;
+}
+
+void StartUp::onDirect3D(const char* extensions)
+{
+    arguments.usingDX = true;
+    platform().extensions = extensions;
+    threadedSharing = true;
 }
 
 // The last platform of the row is the one that is asked for, the first of its vendor the one taken.
@@ -82,13 +90,17 @@ void StartUp::fails(const std::string& function, unsigned nth)
     warnings = {kOutOfResources};
 }
 
-void StartUpTest::run(const StartUp& expected)
+TEST_P(StartUpRows, PrintsAnswersAndLeaves)
 {
+    StartUp expected;
+    GetParam().set(expected);
     world = expected.world;
     arguments = expected.arguments;
     for (const auto& [name, value] : expected.environment)
         setEnvironment(name, value);
     faults = expected.faults;
+    if (expected.prepareHost)
+        expected.prepareHost();
 
     EXPECT_EQ(startWatched(), expected.valid);
 
@@ -105,13 +117,9 @@ void StartUpTest::run(const StartUp& expected)
     EXPECT_EQ(runtime().name(info.openCLDevice()), expected.device);
     EXPECT_EQ(info.graphicsToCLSyncMode(), expected.modes.first);
     EXPECT_EQ(info.clToGraphicsSyncMode(), expected.modes.second);
-}
-
-TEST_P(StartUpRows, PrintsAnswersAndLeaves)
-{
-    StartUp expected;
-    GetParam().set(expected);
-    run(expected);
+    EXPECT_EQ(info.useGLFinish(), expected.modes.first == 3);
+    EXPECT_EQ(info.useCLFinish(), expected.modes.second == 4);
+    EXPECT_EQ(info.supportsThreadedSharing(), expected.threadedSharing);
 }
 
 } // namespace scripted

@@ -16,6 +16,7 @@ struct StartUp {
     StartArguments arguments;
     std::vector<std::pair<const char*, const char*>> environment;
     std::vector<Fault> faults;
+    std::function<void()> prepareHost; // may be empty
 
     std::optional<std::string> error; // on standard error; else that of a start-up without incident
     std::string output;               // on standard output
@@ -27,6 +28,7 @@ struct StartUp {
     bool doublePrecision = true;
     std::string device = "device#1";
     std::pair<int, int> modes{1, 1}; // graphics to OpenCL, OpenCL to graphics
+    bool threadedSharing = true;
     Lines left{"context#1 x1", "queue#1 x1", "queue#2 x1"};
 
     PlatformScript& platform() { return world.platforms[0]; }
@@ -34,6 +36,8 @@ struct StartUp {
     // The platform is another vendor's.
     void onVendor(const char* vendor, OpenCLProvider expectedProvider, unsigned id);
     void onNVIDIA(const char* driver);
+    // The renderer is Direct3D 11; the platform has these extensions.
+    void onDirect3D(const char* extensions);
 
     // What is printed as far as the platform, and all of it.
     std::string platformText() const;
@@ -48,22 +52,12 @@ struct StartUp {
     void fails(const std::string& function, unsigned nth = 1);
 };
 
-struct StartUpRow {
-    const char* name;
+struct StartUpRow : Named {
     std::function<void(StartUp&)> set;
-};
-inline void PrintTo(const StartUpRow& row, std::ostream* out)
-{
-    *out << row.name;
-}
-
-class StartUpTest : public ScriptedTest {
-protected:
-    void run(const StartUp& expected);
 };
 
 // A table of start-ups.
-class StartUpRows : public StartUpTest, public ::testing::WithParamInterface<StartUpRow> {};
+class StartUpRows : public ScriptedTest, public ::testing::WithParamInterface<StartUpRow> {};
 
 // The listing of all platforms, with the line of the one that is taken.
 std::string listing(const World& world, std::size_t taken);
@@ -75,9 +69,6 @@ inline const std::string kNamed = "Choosing OpenCL Device Scripted GPU.  ";
 inline const std::string kReported = kNamed + "Device Type: GPU  Device is available.\n";
 inline const std::string kOutOfResources = "OpenCL error: CL_OUT_OF_RESOURCES\n";
 
-inline std::string rowName(const ::testing::TestParamInfo<StartUpRow>& info)
-{
-    return info.param.name;
-}
+inline const auto kName = ::testing::PrintToStringParamName();
 
 } // namespace scripted

@@ -33,6 +33,29 @@ void primaryQueueFails(StartUp& c, cl_int status, unsigned attempts, const std::
     c.left = {"context#1 x1", "queue#1 x1"};
 }
 
+void demandModes(StartUp& c, const char* graphicsToCL, const char* clToGraphics)
+{
+    c.environment = {{"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", graphicsToCL},
+                     {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", clToGraphics}};
+}
+
+void withoutEvents(StartUp& c, std::pair<int, int> modes)
+{
+    c.platform().extensions = "cl_khr_gl_sharing";
+    c.modes = modes;
+}
+
+void unreadableDriver(StartUp& c)
+{
+    c.onNVIDIA("abc");
+    c.error = c.platformText() +
+              "Unable to detect NVidia driver version.  Disabling asynchronous read-back for "
+              "OpenCL.\n" +
+              kReported + "\n";
+    c.asyncReadback = false;
+    c.modes = {1, 2};
+}
+
 // A row is a sentence, not a column.
 // clang-format off
 const StartUpRow kDeviceRows[] = {
@@ -85,23 +108,32 @@ const StartUpRow kDeviceRows[] = {
          c.stopsBeforeDevice("\nOpenCL is not supported by NVidia drivers between version 361.91 and 368.86.  To enabled "
                              "OpenCL for this driver version set VYRA_OPENCL_IGNORE_DRIVER_VERSION=1.\n");
          c.device = "device#1"; }},
-    {"DriverUnreadable", [](StartUp& c) {
-         c.onNVIDIA("abc");
-         c.error = c.platformText() + "Unable to detect NVidia driver version.  Disabling asynchronous read-back for OpenCL.\n" + kReported + "\n";
-         c.asyncReadback = false;
-         c.modes = {1, 2}; }},
+    {"DriverUnreadable", unreadableDriver},
     {"UnreadableDriverIsNotTrustedByTheVariable", [](StartUp& c) {
-         c.onNVIDIA("abc");
-         c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}};
-         c.error = c.platformText() + "Unable to detect NVidia driver version.  Disabling asynchronous read-back for OpenCL.\n" + kReported + "\n";
-         c.asyncReadback = false;
-         c.modes = {1, 2}; }},
+         unreadableDriver(c);
+         c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"DriverVersionFails", [](StartUp& c) { c.onNVIDIA("400.00"); c.fails("clGetDeviceInfo", 2); c.stopsBeforeDevice(""); c.device = "device#1"; }},
     {"OlderDriverQueriesEvents", [](StartUp& c) { c.onNVIDIA("385.30"); c.modes = {1, 2}; }},
     {"IgnoredOlderDriverIsImplicit", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
-    {"ModesFromTheEnvironment", [](StartUp& c) {
-         c.environment = {{"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2"}, {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", "3"}};
-         c.modes = {2, 3}; }},
+    {"ModesFromTheEnvironment", [](StartUp& c) { demandModes(c, "2", "3"); c.modes = {2, 3}; }},
+    {"DemandsThatAreNoNumbers", [](StartUp& c) { demandModes(c, "2x", ""); }},
+    {"FinishGoesBeforeTheModes", [](StartUp& c) {
+         demandModes(c, "1", "1");
+         c.environment.emplace_back("VYRA_OPENCL_FORCE_FINISH", "-2");
+         c.modes = {3, 4}; }},
+    {"FinishThatIsNoNumber", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "no"}}; }},
+    {"FinishOfZero", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "0"}}; }},
+    {"ModesWithoutEvents", [](StartUp& c) { withoutEvents(c, {2, 2}); }},
+    {"ModesWithoutSyncObjects", [](StartUp& c) {
+         withoutEvents(c, {3, 2});
+         c.prepareHost = [] { installFunctionTable(false, true); }; }},
+    {"ModesWithoutFunctionTable", [](StartUp& c) { withoutEvents(c, {3, 2}); c.prepareHost = removeFunctionTable; }},
+    {"ImplicitModesNeedNoSyncObjects", [](StartUp& c) { c.prepareHost = [] { installFunctionTable(false, true); }; }},
+    {"ThreadedSharingForcedOnNVIDIA", [](StartUp& c) {
+         c.onNVIDIA("400.00");
+         c.environment = {{"VYRA_OPENCL_FORCE_THREADING", "0"}};
+         c.error = "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n" + c.wholeText();
+         c.threadedSharing = true; }},
     {"OneRetryOfTheQueue", [](StartUp& c) { c.faults = {{.function = "clCreateCommandQueue", .status = -35}}; }},
     {"RetryOfTheQueueFails", [](StartUp& c) { primaryQueueFails(c, -30, 2, "CL_INVALID_VALUE"); }},
     {"NoRetryForOtherStatuses", [](StartUp& c) { primaryQueueFails(c, -6, 1, "CL_OUT_OF_HOST_MEMORY"); }},
@@ -110,7 +142,7 @@ const StartUpRow kDeviceRows[] = {
     {"ComputeUnitsFail", [](StartUp& c) { c.fails("clGetDeviceInfo", 8); }},
 };
 // clang-format on
-INSTANTIATE_TEST_SUITE_P(Device, StartUpRows, ::testing::ValuesIn(kDeviceRows), rowName);
+INSTANTIATE_TEST_SUITE_P(Device, StartUpRows, ::testing::ValuesIn(kDeviceRows), kName);
 
 using DeviceStartUpOnce = ScriptedTest;
 

@@ -6,19 +6,6 @@ using namespace scripted;
 
 namespace {
 
-struct D3DRow {
-    const char* name;
-    const char* extensions;
-    const char* missing; // entry point left out, or ""
-    const char* error;   // printed last, on standard error, or ""
-    const char* output;  // on standard output
-    const char* suffix;  // of the functions in use, or ""
-};
-void PrintTo(const D3DRow& row, std::ostream* out)
-{
-    *out << row.name;
-}
-
 const char* const kNV = "cl_nv_d3d11_sharing";
 const char* const kKHR = "cl_khr_d3d11_sharing";
 const char* const kBoth = "cl_khr_d3d11_sharing cl_nv_d3d11_sharing";
@@ -27,45 +14,60 @@ const char* const kNVIncomplete =
 const char* const kKHRIncomplete =
     "Error: found cl_khr_d3d11_sharing extension but failed to get function pointers.";
 
-const D3DRow kRows[] = {
-    {"NV", kNV, "", "", "", "NV"},
-    {"KHR", kKHR, "", "", "", "KHR"},
-    {"BothMeansNV", kBoth, "", "", "", "NV"},
-    {"Neither", "cl_khr_gl_sharing", "",
-     "Error: using D3D11 but found no OpenCL/D3D11 interop extension.", "", ""},
-    {"NVWithoutDevices", kNV, "clGetDeviceIDsFromD3D11NV", "", kNVIncomplete, ""},
-    {"NVWithoutCreate", kNV, "clCreateFromD3D11BufferNV", "", kNVIncomplete, ""},
-    {"NVWithoutAcquire", kNV, "clEnqueueAcquireD3D11ObjectsNV", "", kNVIncomplete, ""},
-    {"NVWithoutRelease", kBoth, "clEnqueueReleaseD3D11ObjectsNV", "", kNVIncomplete, ""},
-    {"KHRWithoutDevices", kKHR, "clGetDeviceIDsFromD3D11KHR", "", kKHRIncomplete, ""},
-    {"KHRWithoutCreate", kKHR, "clCreateFromD3D11BufferKHR", "", kKHRIncomplete, ""},
-    {"KHRWithoutAcquire", kKHR, "clEnqueueAcquireD3D11ObjectsKHR", "", kKHRIncomplete, ""},
-    {"KHRWithoutRelease", kKHR, "clEnqueueReleaseD3D11ObjectsKHR", "", kKHRIncomplete, ""},
-    // What only OpenGL needs is not missed.
-    {"WithoutOpenGL", kNV, "clGetGLContextInfoKHR", "", "", "NV"},
-};
+// The device's type is not examined, and no variable changes the modes.
+StartUp onDirect3D(const char* extensions, const char* missing)
+{
+    StartUp c;
+    c.onDirect3D(extensions);
+    c.firstDevice().type = CL_DEVICE_TYPE_CPU;
+    c.world.missing = {missing};
+    c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "1"}, {"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2"}};
+    c.error = c.platformText() + kNamed + "Device Type: Non-GPU  Device is available.\n\n";
+    return c;
+}
 
-class Direct3DStartUp : public StartUpTest, public ::testing::WithParamInterface<D3DRow> {
-protected:
-    // The device's type is not examined, and no variable changes the modes.
-    static StartUp describe(const D3DRow& row)
-    {
-        StartUp c;
-        c.arguments.usingDX = true;
-        c.platform().extensions = row.extensions;
-        c.firstDevice().type = CL_DEVICE_TYPE_CPU;
-        c.world.missing = {row.missing};
-        c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "1"},
-                         {"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2"}};
-        c.error = c.platformText() + kNamed + "Device Type: Non-GPU  Device is available.\n\n";
-        return c;
-    }
-    void usesFunctionsOf(const std::string& suffix);
+// An entry point is missing: so says standard output.
+void incomplete(StartUp& c, const char* extensions, const char* missing, const char* output)
+{
+    c = onDirect3D(extensions, missing);
+    c.stopsBeforeDevice("");
+    c.output = output;
+}
+
+// A row is a sentence, not a column.
+// clang-format off
+const StartUpRow kDirect3DRows[] = {
+    {"NV", [](StartUp& c) { c = onDirect3D(kNV, ""); }},
+    {"KHR", [](StartUp& c) { c = onDirect3D(kKHR, ""); }},
+    {"WithoutOpenGL", [](StartUp& c) { c = onDirect3D(kNV, "clGetGLContextInfoKHR"); }}, // which only OpenGL needs
+    {"OnNVIDIA", [](StartUp& c) { c.onNVIDIA("400.00"); c.onDirect3D(kNV); }},
+    {"Neither", [](StartUp& c) {
+         c = onDirect3D("cl_khr_gl_sharing", "");
+         c.stopsBeforeDevice("Error: using D3D11 but found no OpenCL/D3D11 interop extension."); }},
+    {"NVWithoutDevices", [](StartUp& c) { incomplete(c, kNV, "clGetDeviceIDsFromD3D11NV", kNVIncomplete); }},
+    {"NVWithoutCreate", [](StartUp& c) { incomplete(c, kNV, "clCreateFromD3D11BufferNV", kNVIncomplete); }},
+    {"NVWithoutAcquire", [](StartUp& c) { incomplete(c, kNV, "clEnqueueAcquireD3D11ObjectsNV", kNVIncomplete); }},
+    {"NVWithoutRelease", [](StartUp& c) { incomplete(c, kBoth, "clEnqueueReleaseD3D11ObjectsNV", kNVIncomplete); }},
+    {"KHRWithoutDevices", [](StartUp& c) { incomplete(c, kKHR, "clGetDeviceIDsFromD3D11KHR", kKHRIncomplete); }},
+    {"KHRWithoutCreate", [](StartUp& c) { incomplete(c, kKHR, "clCreateFromD3D11BufferKHR", kKHRIncomplete); }},
+    {"KHRWithoutAcquire", [](StartUp& c) { incomplete(c, kKHR, "clEnqueueAcquireD3D11ObjectsKHR", kKHRIncomplete); }},
+    {"KHRWithoutRelease", [](StartUp& c) { incomplete(c, kKHR, "clEnqueueReleaseD3D11ObjectsKHR", kKHRIncomplete); }},
+    {"NoDevice", [](StartUp& c) { c.onDirect3D(kNV); c.world.d3dDevices.clear(); c.stopsBeforeDevice(""); }},
+    {"DeviceQueryFails", [](StartUp& c) { c.onDirect3D(kKHR); c.stopsBeforeDevice(""); c.fails("clGetDeviceIDsFromD3D11KHR"); }},
 };
+// clang-format on
+INSTANTIATE_TEST_SUITE_P(Direct3D, StartUpRows, ::testing::ValuesIn(kDirect3DRows), kName);
+
+using Extensions = std::pair<const char*, const char*>; // of the platform, and the suffix in use
+class Direct3DFunctions : public ScriptedTest, public ::testing::WithParamInterface<Extensions> {};
 
 // The device query, the property list and the functions behind a shared buffer's life.
-void Direct3DStartUp::usesFunctionsOf(const std::string& suffix)
+TEST_P(Direct3DFunctions, AreThoseOfTheExtension)
 {
+    world.platforms[0].extensions = GetParam().first;
+    const std::string suffix = GetParam().second;
+    arguments.usingDX = true;
+    ASSERT_TRUE(startWatched());
     Lines lines = calls();
     std::erase_if(lines, [](const std::string& line) {
         return !line.starts_with("clGetDeviceIDs") && !line.starts_with("clCreateContext");
@@ -93,41 +95,8 @@ void Direct3DStartUp::usesFunctionsOf(const std::string& suffix)
                      "clReleaseMemObject(mem#1)"}));
 }
 
-TEST_P(Direct3DStartUp, ChoosesTheExtensionOrStops)
-{
-    const D3DRow& row = GetParam();
-    StartUp expected = describe(row);
-    if (row.suffix[0] == '\0')
-        expected.stopsBeforeDevice(row.error);
-    expected.output = row.output;
-    run(expected);
-    EXPECT_FALSE(TopenCLInfo::theOne().useGLFinish());
-    if (row.suffix[0] != '\0')
-        usesFunctionsOf(row.suffix);
-}
-INSTANTIATE_TEST_SUITE_P(StartUp, Direct3DStartUp, ::testing::ValuesIn(kRows),
-                         [](const auto& row) { return std::string(row.param.name); });
-
-using Direct3DDevices = StartUpTest;
-
-TEST_F(Direct3DDevices, NoneStopsWithoutAWord)
-{
-    StartUp expected;
-    expected.arguments.usingDX = true;
-    expected.platform().extensions = kNV;
-    expected.world.d3dDevices.clear();
-    expected.stopsBeforeDevice("");
-    run(expected);
-}
-
-TEST_F(Direct3DDevices, AFailingQueryIsReportedAndStops)
-{
-    StartUp expected;
-    expected.arguments.usingDX = true;
-    expected.platform().extensions = kKHR;
-    expected.stopsBeforeDevice("");
-    expected.fails("clGetDeviceIDsFromD3D11KHR");
-    run(expected);
-}
+INSTANTIATE_TEST_SUITE_P(Direct3D, Direct3DFunctions,
+                         ::testing::Values(Extensions{kNV, "NV"}, Extensions{kKHR, "KHR"},
+                                           Extensions{kBoth, "NV"}));
 
 } // namespace

@@ -73,7 +73,7 @@ const StartUpRow kPlatformRows[] = {
          c.error = c.platformText() + "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 0.\n" + kReported + "\n"; }},
 };
 // clang-format on
-INSTANTIATE_TEST_SUITE_P(Platform, StartUpRows, ::testing::ValuesIn(kPlatformRows), rowName);
+INSTANTIATE_TEST_SUITE_P(Platform, StartUpRows, ::testing::ValuesIn(kPlatformRows), kName);
 
 using StartUpOnce = ScriptedTest;
 

@@ -24,7 +24,7 @@ void Entry::begin(const char* function, std::initializer_list<std::string> argum
     fLine += ')';
 
     ++fRuntime.fCallCount;
-    if (const Fault* fault = fRuntime.fFaults.meet(fFunction)) {
+    if (const Fault* fault = fRuntime.meetFault(fFunction)) {
         fStatus = fault->status;
         fWithHandle = fault->withHandle;
     }
@@ -115,10 +115,11 @@ std::string Entry::text(const PropertyList& list) const
     return '{' + pairs + '}';
 }
 
-std::optional<unsigned> Entry::nextClientWait()
+unsigned Entry::nextClientWait()
 {
+    constexpr unsigned kConditionSatisfied = 0x911C; // GL_CONDITION_SATISFIED
     if (fRuntime.fClientWaits.empty())
-        return {};
+        return kConditionSatisfied;
     const unsigned result = fRuntime.fClientWaits.front();
     fRuntime.fClientWaits.pop_front();
     return result;

@@ -77,7 +77,7 @@ public:
     // The result that a test has scripted for the next creation from a renderer's buffer, or for
     // the next wait of an OpenGL client.
     std::optional<cl_mem> nextSharedMem() { return std::exchange(fRuntime.fNextSharedMem, {}); }
-    std::optional<unsigned> nextClientWait();
+    unsigned nextClientWait();
     void rememberNotify(ContextNotify notify) { fRuntime.fNotify = notify; }
     // Ends a query.
     cl_int answer(cl_uint query, const void* data, std::size_t size, std::size_t room, void* value,

@@ -15,6 +15,16 @@ Object* usableMem(Entry& call, cl_mem mem)
     return object;
 }
 
+cl_int transfer(const char* function, cl_command_queue queue, cl_mem mem, cl_bool blocking,
+                std::size_t offset, std::size_t size, const void* data, const WaitList& list,
+                cl_event* event)
+{
+    Entry call(function, queue, mem, blocking, offset, size, data, list);
+    if (const Object* object = usableMem(call, mem))
+        call.require(offset + size <= object->size, CL_INVALID_VALUE, "beyond the end");
+    return call.command(queue, list, event);
+}
+
 // A mapping's address: a number of its own that nobody looks behind.
 void* mappedAddress(cl_mem mem)
 {
@@ -53,22 +63,16 @@ cl_int clEnqueueWriteBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking
                             std::size_t offset, std::size_t size, const void* data,
                             cl_uint waitCount, const cl_event* waitList, cl_event* event)
 {
-    const WaitList list{waitCount, waitList};
-    Entry call("clEnqueueWriteBuffer", queue, mem, blocking, offset, size, data, list);
-    if (const Object* object = usableMem(call, mem))
-        call.require(offset + size <= object->size, CL_INVALID_VALUE, "beyond the end");
-    return call.command(queue, list, event);
+    return transfer("clEnqueueWriteBuffer", queue, mem, blocking, offset, size, data,
+                    {waitCount, waitList}, event);
 }
 
 cl_int clEnqueueReadBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking, std::size_t offset,
                            std::size_t size, void* data, cl_uint waitCount,
                            const cl_event* waitList, cl_event* event)
 {
-    const WaitList list{waitCount, waitList};
-    Entry call("clEnqueueReadBuffer", queue, mem, blocking, offset, size, data, list);
-    if (const Object* object = usableMem(call, mem))
-        call.require(offset + size <= object->size, CL_INVALID_VALUE, "beyond the end");
-    return call.command(queue, list, event);
+    return transfer("clEnqueueReadBuffer", queue, mem, blocking, offset, size, data,
+                    {waitCount, waitList}, event);
 }
 
 void* clEnqueueMapBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking, cl_map_flags flags,

@@ -2,8 +2,19 @@
 #include "Entry.h"
 
 #include <algorithm>
+#include <map>
 
 using namespace scripted;
+
+namespace {
+
+const std::map<cl_platform_info, std::string PlatformScript::*> kPlatformTexts = {
+    {CL_PLATFORM_VENDOR, &PlatformScript::vendor},
+    {CL_PLATFORM_NAME, &PlatformScript::name},
+    {CL_PLATFORM_VERSION, &PlatformScript::version},
+    {CL_PLATFORM_EXTENSIONS, &PlatformScript::extensions}};
+
+} // namespace
 
 extern "C" {
 
@@ -27,20 +38,11 @@ cl_int clGetPlatformInfo(cl_platform_id platform, cl_platform_info query, std::s
     const Object* object = call.object(Kind::kPlatform, platform);
     if (!object)
         return call.status();
-    const PlatformScript& script = call.world().platforms[object->index];
-    switch (query) {
-    case CL_PLATFORM_VENDOR:
-        return call.answer(query, script.vendor, room, value, size);
-    case CL_PLATFORM_NAME:
-        return call.answer(query, script.name, room, value, size);
-    case CL_PLATFORM_VERSION:
-        return call.answer(query, script.version, room, value, size);
-    case CL_PLATFORM_EXTENSIONS:
-        return call.answer(query, script.extensions, room, value, size);
-    default:
-        call.require(false, CL_INVALID_VALUE, "unknown query");
+    const auto text = kPlatformTexts.find(query);
+    if (!call.require(text != kPlatformTexts.end(), CL_INVALID_VALUE, "unknown query"))
         return call.status();
-    }
+    const PlatformScript& script = call.world().platforms[object->index];
+    return call.answer(query, script.*text->second, room, value, size);
 }
 
 cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t room, void* value,
@@ -76,9 +78,8 @@ cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t ro
 }
 
 cl_context clCreateContext(const cl_context_properties* properties, cl_uint deviceCount,
-                           const cl_device_id* devices,
-                           void(CL_CALLBACK* notify)(const char*, const void*, std::size_t, void*),
-                           void* userData, cl_int* error)
+                           const cl_device_id* devices, ContextNotify notify, void* userData,
+                           cl_int* error)
 {
     Entry call("clCreateContext", PropertyList{properties},
                List<cl_device_id>{deviceCount, devices}, userData);
@@ -99,16 +100,12 @@ cl_command_queue clCreateCommandQueue(cl_context context, cl_device_id device,
 
 cl_int clFinish(cl_command_queue queue)
 {
-    Entry call("clFinish", queue);
-    call.object(Kind::kQueue, queue);
-    return call.status();
+    return Entry("clFinish", queue).command(queue, {}, nullptr);
 }
 
 cl_int clFlush(cl_command_queue queue)
 {
-    Entry call("clFlush", queue);
-    call.object(Kind::kQueue, queue);
-    return call.status();
+    return Entry("clFlush", queue).command(queue, {}, nullptr);
 }
 
 cl_int clReleaseContext(cl_context context)

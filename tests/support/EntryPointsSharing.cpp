@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <map>
 #include <stdexcept>
 
 #include <CL/cl_gl.h>
@@ -13,25 +14,21 @@ namespace {
 
 using MemList = List<cl_mem>;
 
-// The status of commands in the wrong order differs between OpenGL and Direct3D 11.
 struct SharingNames {
+    const char* devices;
     const char* create;
     const char* acquire;
     const char* release;
-    cl_int alreadyAcquired;
-    cl_int notAcquired;
 };
+constexpr SharingNames kGL = {"clGetGLContextInfoKHR", "clCreateFromGLBuffer",
+                              "clEnqueueAcquireGLObjects", "clEnqueueReleaseGLObjects"};
+constexpr SharingNames kNV = {"clGetDeviceIDsFromD3D11NV", "clCreateFromD3D11BufferNV",
+                              "clEnqueueAcquireD3D11ObjectsNV", "clEnqueueReleaseD3D11ObjectsNV"};
+constexpr SharingNames kKHR = {"clGetDeviceIDsFromD3D11KHR", "clCreateFromD3D11BufferKHR",
+                               "clEnqueueAcquireD3D11ObjectsKHR",
+                               "clEnqueueReleaseD3D11ObjectsKHR"};
 constexpr cl_int kD3DAlreadyAcquired = -1008;
 constexpr cl_int kD3DNotAcquired = -1009;
-constexpr SharingNames kGL = {"clCreateFromGLBuffer", "clEnqueueAcquireGLObjects",
-                              "clEnqueueReleaseGLObjects", CL_INVALID_GL_OBJECT,
-                              CL_INVALID_GL_OBJECT};
-constexpr SharingNames kNV = {"clCreateFromD3D11BufferNV", "clEnqueueAcquireD3D11ObjectsNV",
-                              "clEnqueueReleaseD3D11ObjectsNV", kD3DAlreadyAcquired,
-                              kD3DNotAcquired};
-constexpr SharingNames kKHR = {"clCreateFromD3D11BufferKHR", "clEnqueueAcquireD3D11ObjectsKHR",
-                               "clEnqueueReleaseD3D11ObjectsKHR", kD3DAlreadyAcquired,
-                               kD3DNotAcquired};
 
 template <typename Resource>
 cl_mem createShared(const SharingNames& names, cl_context context, cl_mem_flags flags,
@@ -51,42 +48,27 @@ cl_mem createShared(const SharingNames& names, cl_context context, cl_mem_flags 
 }
 
 // Acquire and release: every object has to be shared and on the other side.
-cl_int changeSide(Entry& call, bool acquire, cl_int wrongSide, cl_command_queue queue,
-                  const MemList& mems, const WaitList& list, cl_event* event)
+template <const SharingNames& kNames, bool kAcquire>
+cl_int changeSide(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_uint waitCount,
+                  const cl_event* waitList, cl_event* event)
 {
-    call.require((mems.count == 0) == (mems.items == nullptr), CL_INVALID_VALUE,
+    const WaitList list{waitCount, waitList};
+    Entry call(kAcquire ? kNames.acquire : kNames.release, queue, MemList{count, mems}, list);
+    call.require((count == 0) == (mems == nullptr), CL_INVALID_VALUE,
                  "count and pointer of the objects disagree");
+    constexpr cl_int kD3DStatus = kAcquire ? kD3DAlreadyAcquired : kD3DNotAcquired;
+    constexpr cl_int kWrongSide = &kNames == &kGL ? CL_INVALID_GL_OBJECT : kD3DStatus;
     std::vector<Object*> objects;
-    for (cl_uint i = 0; call.ok() && i < mems.count; ++i) {
-        Object* object = call.object(Kind::kMem, mems.items[i]);
-        if (object && call.require(object->shared && object->acquired != acquire, wrongSide,
-                                   acquire ? "already acquired" : "not acquired"))
+    for (cl_uint i = 0; call.ok() && i < count; ++i) {
+        Object* object = call.object(Kind::kMem, mems[i]);
+        if (object && call.require(object->shared && object->acquired != kAcquire, kWrongSide,
+                                   kAcquire ? "already acquired" : "not acquired"))
             objects.push_back(object);
     }
     call.command(queue, list, event);
     for (Object* object : objects)
-        object->acquired = call.ok() ? acquire : object->acquired;
+        object->acquired = call.ok() ? kAcquire : object->acquired;
     return call.status();
-}
-
-template <const SharingNames& kNames>
-cl_int enqueueAcquire(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_uint waitCount,
-                      const cl_event* waitList, cl_event* event)
-{
-    const MemList objects{count, mems};
-    const WaitList list{waitCount, waitList};
-    Entry call(kNames.acquire, queue, objects, list);
-    return changeSide(call, true, kNames.alreadyAcquired, queue, objects, list, event);
-}
-
-template <const SharingNames& kNames>
-cl_int enqueueRelease(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_uint waitCount,
-                      const cl_event* waitList, cl_event* event)
-{
-    const MemList objects{count, mems};
-    const WaitList list{waitCount, waitList};
-    Entry call(kNames.release, queue, objects, list);
-    return changeSide(call, false, kNames.notAcquired, queue, objects, list, event);
 }
 
 cl_mem createFromGLBuffer(cl_context context, cl_mem_flags flags, cl_GLuint buffer, cl_int* error)
@@ -120,9 +102,12 @@ cl_int getGLContextInfo(const cl_context_properties* properties, cl_gl_context_i
                        size);
 }
 
-cl_int deviceIDsFromD3D(Entry& call, cl_platform_id platform, cl_uint room, cl_device_id* devices,
-                        cl_uint* count)
+template <const SharingNames& kNames>
+cl_int getDeviceIDsFromD3D11(cl_platform_id platform, cl_uint source, void* object, cl_uint set,
+                             cl_uint room, cl_device_id* devices, cl_uint* count)
 {
+    Entry call(kNames.devices, platform, source, reinterpret_cast<std::uintptr_t>(object), set,
+               room);
     call.object(Kind::kPlatform, platform);
     if (!call.ok())
         return call.status();
@@ -134,37 +119,24 @@ cl_int deviceIDsFromD3D(Entry& call, cl_platform_id platform, cl_uint room, cl_d
     return CL_SUCCESS;
 }
 
-template <bool kIsKHR>
-cl_int getDeviceIDsFromD3D11(cl_platform_id platform, cl_uint source, void* object, cl_uint set,
-                             cl_uint room, cl_device_id* devices, cl_uint* count)
-{
-    Entry call(kIsKHR ? "clGetDeviceIDsFromD3D11KHR" : "clGetDeviceIDsFromD3D11NV", platform,
-               source, reinterpret_cast<std::uintptr_t>(object), set, room);
-    return deviceIDsFromD3D(call, platform, room, devices, count);
-}
-
-struct NamedFunction {
-    const char* name;
-    void* address;
-};
 template <typename Function>
 void* addressOf(Function* function)
 {
     return reinterpret_cast<void*>(function);
 }
-const NamedFunction kExtensionFunctions[] = {
-    {"clGetGLContextInfoKHR", addressOf(&getGLContextInfo)},
+const std::map<std::string, void*> kExtensionFunctions = {
+    {kGL.devices, addressOf(&getGLContextInfo)},
     {kGL.create, addressOf(&createFromGLBuffer)},
-    {kGL.acquire, addressOf(&enqueueAcquire<kGL>)},
-    {kGL.release, addressOf(&enqueueRelease<kGL>)},
-    {"clGetDeviceIDsFromD3D11NV", addressOf(&getDeviceIDsFromD3D11<false>)},
+    {kGL.acquire, addressOf(&changeSide<kGL, true>)},
+    {kGL.release, addressOf(&changeSide<kGL, false>)},
+    {kNV.devices, addressOf(&getDeviceIDsFromD3D11<kNV>)},
     {kNV.create, addressOf(&createFromD3DBuffer<kNV>)},
-    {kNV.acquire, addressOf(&enqueueAcquire<kNV>)},
-    {kNV.release, addressOf(&enqueueRelease<kNV>)},
-    {"clGetDeviceIDsFromD3D11KHR", addressOf(&getDeviceIDsFromD3D11<true>)},
+    {kNV.acquire, addressOf(&changeSide<kNV, true>)},
+    {kNV.release, addressOf(&changeSide<kNV, false>)},
+    {kKHR.devices, addressOf(&getDeviceIDsFromD3D11<kKHR>)},
     {kKHR.create, addressOf(&createFromD3DBuffer<kKHR>)},
-    {kKHR.acquire, addressOf(&enqueueAcquire<kKHR>)},
-    {kKHR.release, addressOf(&enqueueRelease<kKHR>)},
+    {kKHR.acquire, addressOf(&changeSide<kKHR, true>)},
+    {kKHR.release, addressOf(&changeSide<kKHR, false>)},
 };
 
 } // namespace
@@ -176,10 +148,7 @@ extern "C" void* clGetExtensionFunctionAddress(const char* name)
         throw std::runtime_error("scripted look-up");
     if (call.world().lookUp == LookUp::kThrowsNumber)
         throw 1;
-    const auto found = std::find_if(
-        std::begin(kExtensionFunctions), std::end(kExtensionFunctions),
-        [name](const NamedFunction& entry) { return std::string(name) == entry.name; });
-    const bool there =
-        found != std::end(kExtensionFunctions) && !call.world().missing.contains(name);
-    return there ? found->address : nullptr;
+    const auto found = kExtensionFunctions.find(name);
+    const bool there = found != kExtensionFunctions.end() && !call.world().missing.contains(name);
+    return there ? found->second : nullptr;
 }

@@ -8,8 +8,7 @@
 namespace scripted {
 namespace {
 
-constexpr unsigned kConditionSatisfied = 0x911C; // GL_CONDITION_SATISFIED
-constexpr unsigned kWaitFailed = 0x911D;         // GL_WAIT_FAILED
+constexpr unsigned kWaitFailed = 0x911D; // GL_WAIT_FAILED
 
 GLsync fenceSync(unsigned condition, unsigned flags)
 {
@@ -25,7 +24,7 @@ unsigned clientWaitSync(GLsync sync, unsigned flags, std::uint64_t timeout)
 {
     Entry call("glClientWaitSync", sync, flags, timeout);
     call.object(Kind::kSync, sync);
-    return call.ok() ? call.nextClientWait().value_or(kConditionSatisfied) : kWaitFailed;
+    return call.ok() ? call.nextClientWait() : kWaitFailed;
 }
 
 void waitSync(GLsync sync, unsigned flags, std::uint64_t timeout)

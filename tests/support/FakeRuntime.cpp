@@ -1,15 +1,22 @@
 #include "FakeRuntime.h"
 
 #include <mutex>
-#include <utility>
 
 namespace scripted {
+
+template <typename T>
+void FakeRuntime::add(Kind kind, std::vector<T>& list)
+{
+    void* handle = fLedger.create(kind);
+    fLedger.alive(kind, handle)->index = list.size();
+    list.push_back(static_cast<T>(handle));
+}
 
 void FakeRuntime::describe(const World& world)
 {
     fWorld = world;
     fLedger = {};
-    fFaults.clear();
+    fPlans.clear();
     fPlatforms.clear();
     fDevices.clear();
     fDeviceScripts.clear();
@@ -17,36 +24,31 @@ void FakeRuntime::describe(const World& world)
     fMisuse.clear();
     fCallCount = 0;
     for (const PlatformScript& platform : world.platforms) {
-        void* handle = fLedger.create(Kind::kPlatform);
-        fLedger.alive(Kind::kPlatform, handle)->index = fPlatforms.size();
-        fPlatforms.push_back(static_cast<cl_platform_id>(handle));
-        for (const DeviceScript& device : platform.devices)
-            addDevice(device);
+        add(Kind::kPlatform, fPlatforms);
+        for (const DeviceScript& device : platform.devices) {
+            add(Kind::kDevice, fDevices);
+            fDeviceScripts.push_back(device);
+        }
     }
 }
 
-void FakeRuntime::addDevice(const DeviceScript& script)
+const Fault* FakeRuntime::meetFault(const std::string& function)
 {
-    void* handle = fLedger.create(Kind::kDevice);
-    fLedger.alive(Kind::kDevice, handle)->index = fDevices.size();
-    fDevices.push_back(static_cast<cl_device_id>(handle));
-    fDeviceScripts.push_back(script);
-}
-
-std::vector<std::string> FakeRuntime::takeCalls()
-{
-    return std::exchange(fCalls, {});
+    const Fault* met = nullptr;
+    for (auto& [fault, calls] : fPlans) {
+        if (fault.function != "*" && fault.function != function)
+            continue;
+        ++calls;
+        if (calls == fault.nth || (fault.onwards && calls > fault.nth))
+            met = &fault;
+    }
+    return met;
 }
 
 void FakeRuntime::log(std::string line)
 {
     const std::scoped_lock guard(fLock);
     fCalls.push_back(std::move(line));
-}
-
-std::vector<std::string> FakeRuntime::takeMisuse()
-{
-    return std::exchange(fMisuse, {});
 }
 
 unsigned FakeRuntime::references(Kind kind, const void* handle)
@@ -67,21 +69,10 @@ FakeRuntime& runtime()
     return theRuntime;
 }
 
-namespace {
-thread_local int callsInside = 0;
-} // namespace
-
-bool insideRuntime()
+int& InsideRuntime::depth()
 {
-    return callsInside > 0;
-}
-InsideRuntime::InsideRuntime()
-{
-    ++callsInside;
-}
-InsideRuntime::~InsideRuntime()
-{
-    --callsInside;
+    thread_local int theDepth = 0;
+    return theDepth;
 }
 
 } // namespace scripted

@@ -9,13 +9,13 @@
 // nobody else calls.
 #pragma once
 
-#include "Faults.h"
 #include "Ledger.h"
 #include "World.h"
 
 #include <atomic>
 #include <deque>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace scripted {
@@ -46,17 +46,17 @@ public:
     //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, ptr, [event#1]) = event#3
     //     clCreateBuffer(context#1, 4, 64, null) ! -4
     // Lists are in brackets; the first form names what the call made, the second its status.
-    std::vector<std::string> takeCalls();
+    std::vector<std::string> takeCalls() { return std::exchange(fCalls, {}); }
     // Calls of OpenCL and OpenGL since describe.
     unsigned callCount() const { return fCallCount; }
     // A line of the host's in the same log.
     void log(std::string line);
 
-    void plan(const Fault& fault) { fFaults.plan(fault); }
-    void clearFaults() { fFaults.clear(); }
+    void plan(const Fault& fault) { fPlans.push_back({fault}); }
+    void clearFaults() { fPlans.clear(); }
 
     // Wrong use that a validating runtime would refuse: "clReleaseEvent: event#1 is dead".
-    std::vector<std::string> takeMisuse();
+    std::vector<std::string> takeMisuse() { return std::exchange(fMisuse, {}); }
 
     std::vector<std::string> balance() const { return fLedger.balance(); }
     std::string name(const void* handle) const { return fLedger.name(handle); }
@@ -80,12 +80,21 @@ public:
 private:
     friend class Entry;
 
-    void addDevice(const DeviceScript& script);
+    struct Plan {
+        Fault fault;
+        unsigned calls = 0; // of its function, so far
+    };
+
+    // Adds a platform or a device to its list.
+    template <typename T>
+    void add(Kind kind, std::vector<T>& list);
+    // Counts a call of `function`; the fault that it meets, or null.
+    const Fault* meetFault(const std::string& function);
 
     QuietLock fLock;
     World fWorld;
     Ledger fLedger;
-    Faults fFaults;
+    std::vector<Plan> fPlans;
     std::vector<cl_platform_id> fPlatforms; // in the world's order, as the devices
     std::vector<cl_device_id> fDevices;
     std::vector<DeviceScript> fDeviceScripts;
@@ -101,16 +110,19 @@ private:
 // The process's one.
 FakeRuntime& runtime();
 
-// The calling thread is inside the scripted runtime or host: its allocations are not the library's.
-bool insideRuntime();
-
-// Marks the calling thread so, while it lives.
+// While it lives, the calling thread is inside the scripted runtime or host: its allocations are
+// not the library's.
 class InsideRuntime {
 public:
-    InsideRuntime();
-    ~InsideRuntime();
+    InsideRuntime() { ++depth(); }
+    ~InsideRuntime() { --depth(); }
     InsideRuntime(const InsideRuntime&) = delete;
     InsideRuntime& operator=(const InsideRuntime&) = delete;
+
+    static bool here() { return depth() > 0; }
+
+private:
+    static int& depth();
 };
 
 } // namespace scripted

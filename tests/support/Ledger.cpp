@@ -1,7 +1,7 @@
 #include "Ledger.h"
 
-#include <algorithm>
 #include <cstdint>
+#include <utility>
 
 namespace scripted {
 namespace {
@@ -20,19 +20,15 @@ void* scatteredHandle(unsigned serial)
     return reinterpret_cast<void*>((serial * kScatter & kHandleMask) * kHandleSpacing);
 }
 
-std::string objectName(const Object& object)
-{
-    return std::string(kKindNames[static_cast<std::size_t>(object.kind)]) + '#' +
-           std::to_string(object.ordinal);
-}
-
 } // namespace
 
 void* Ledger::create(Kind kind)
 {
     void* handle = scatteredHandle(++fSerial);
-    const unsigned ordinal = ++fCreated[static_cast<std::size_t>(kind)];
-    fAlive.emplace(handle, Object{.kind = kind, .ordinal = ordinal});
+    const auto index = static_cast<std::size_t>(kind);
+    const unsigned ordinal = ++fCreated[index];
+    std::string name = std::string(kKindNames[index]) + '#' + std::to_string(ordinal);
+    fAlive.emplace(handle, Object{.kind = kind, .ordinal = ordinal, .name = std::move(name)});
     return handle;
 }
 
@@ -47,7 +43,7 @@ void Ledger::release(const void* handle)
     const auto found = fAlive.find(handle);
     if (--found->second.references > 0)
         return;
-    fDead.emplace(handle, objectName(found->second));
+    fDead.emplace(handle, found->second.name);
     fAlive.erase(found);
 }
 
@@ -56,25 +52,19 @@ std::string Ledger::name(const void* handle) const
     if (!handle)
         return "null";
     if (const auto found = fAlive.find(handle); found != fAlive.end())
-        return objectName(found->second);
+        return found->second.name;
     const auto dead = fDead.find(handle);
     return dead != fDead.end() ? dead->second : "ptr";
 }
 
 std::vector<std::string> Ledger::balance() const
 {
-    std::vector<const Object*> objects;
-    objects.reserve(fAlive.size());
+    std::map<std::pair<Kind, unsigned>, const Object*> sorted;
     for (const auto& [handle, object] : fAlive)
-        objects.push_back(&object);
-    std::sort(objects.begin(), objects.end(), [](const Object* a, const Object* b) {
-        return a->kind != b->kind ? a->kind < b->kind : a->ordinal < b->ordinal;
-    });
-
+        sorted[{object.kind, object.ordinal}] = &object;
     std::vector<std::string> lines;
-    lines.reserve(objects.size());
-    for (const Object* object : objects)
-        lines.push_back(objectName(*object) + " x" + std::to_string(object->references));
+    for (const auto& [place, object] : sorted)
+        lines.push_back(object->name + " x" + std::to_string(object->references));
     return lines;
 }
 

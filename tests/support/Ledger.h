@@ -20,6 +20,7 @@ inline constexpr std::size_t kKindCount = 9;
 struct Object {
     Kind kind;
     unsigned ordinal; // counts from 1 within the kind
+    std::string name; // "mem#2"
     unsigned references = 1;
 
     std::size_t index = 0;         // platforms and devices: place in the world

@@ -84,6 +84,13 @@ bool ScriptedTest::start()
     return valid;
 }
 
+void ScriptedTest::startInModes(int graphicsToCL, int clToGraphics)
+{
+    setEnvironment("VYRA_GRAPHICSTOOPENCL_SYNC_MODE", std::to_string(graphicsToCL).c_str());
+    setEnvironment("VYRA_OPENCLTOGRAPHICS_SYNC_MODE", std::to_string(clToGraphics).c_str());
+    ASSERT_TRUE(start());
+}
+
 Lines ScriptedTest::callsOf(const std::string& prefix)
 {
     Lines lines = calls();

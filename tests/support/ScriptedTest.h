@@ -7,6 +7,7 @@
 #include "FakeHost.h"
 #include "FakeRuntime.h"
 
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -28,6 +29,12 @@ struct StartArguments {
 
 void setEnvironment(const char* name, const char* value);
 
+// A row of a table of tests is derived from its name.
+struct Named {
+    const char* name;
+    friend std::ostream& operator<<(std::ostream& out, const Named& row) { return out << row.name; }
+};
+
 class ScriptedTest : public ::testing::Test {
 protected:
     ScriptedTest();
@@ -38,6 +45,9 @@ protected:
     bool start();
     // The same, keeping what start-up prints and logs for the test to read.
     bool startWatched();
+
+    // Starts in these synchronisation modes, which the environment demands.
+    void startInModes(int graphicsToCL, int clToGraphics);
 
     // Since the last reading: all calls, those whose text begins with `prefix`, and the warnings.
     Lines calls() { return runtime().takeCalls(); }

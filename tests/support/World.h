@@ -1,4 +1,5 @@
-// The world that a test describes to the scripted OpenCL runtime: plain data, no behaviour.
+// The world that a test describes to the scripted OpenCL runtime, and which calls fail in it: plain
+// data, no behaviour.
 #pragma once
 
 #include <cstddef>
@@ -44,6 +45,16 @@ struct World {
     std::set<cl_uint> emptyAnswers;                // queries answered with size 0, unwritten
     LookUp lookUp = LookUp::kAnswers;
     std::string buildLog = "line 1: 100%s wrong"; // of a program that does not build
+};
+
+// A plan for the calls of one function. Retains and releases that fail still count; everything else
+// that fails does nothing, save for a create function `withHandle`.
+struct Fault {
+    std::string function; // "*": every function, OpenGL's included
+    cl_int status = CL_OUT_OF_RESOURCES;
+    unsigned nth = 1;        // the call that fails, counted from the moment of planning
+    bool onwards = false;    // all later calls fail, too
+    bool withHandle = false; // hands out an object together with the status
 };
 
 } // namespace scripted
