@@ -148,36 +148,34 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
     host().resourceWindow = nullptr;
 }
 
-struct AbilityRow : Named {
-    int functionTable; // -1: none, 0: no sync objects, 1: sync objects, 2: from events, too
+struct AbilityRow {
+    bool functionTable;
+    bool syncObjects;
+    bool syncFromEvents;
     std::size_t fences;
     std::size_t graphicsWaits;
 };
 
-class GraphicsAbilities : public SharedBufferTest,
-                          public ::testing::WithParamInterface<AbilityRow> {};
-
-TEST_P(GraphicsAbilities, OnlyUsableFunctionsAreCalled)
+TEST_F(SharedBufferTest, OnlyUsableFunctionsAreCalled)
 {
     startInModes(2, 3); // chosen while everything was usable
-    removeFunctionTable();
-    if (GetParam().functionTable >= 0)
-        installFunctionTable(GetParam().functionTable > 0, GetParam().functionTable != 1);
-    const auto* buffer = create();
-    manager().RenderingComplete();
-    EXPECT_EQ(callsOf("glFenceSync").size(), GetParam().fences);
-    manager().PreEvaluate(kId);
-    manager().PostEvaluate(kId);
-    EXPECT_EQ(callsOf("glWaitSync").size(), GetParam().graphicsWaits);
-    destroy(buffer);
-    expectEventsLeft();
+    for (const AbilityRow& row : {AbilityRow{false, false, false, 0, 0},
+                                  {true, false, true, 0, 0},
+                                  {true, true, false, 1, 0},
+                                  {true, true, true, 1, 1}}) {
+        removeFunctionTable();
+        if (row.functionTable)
+            installFunctionTable(row.syncObjects, row.syncFromEvents);
+        const auto* buffer = create();
+        manager().RenderingComplete();
+        EXPECT_EQ(callsOf("glFenceSync").size(), row.fences);
+        manager().PreEvaluate(kId);
+        manager().PostEvaluate(kId);
+        EXPECT_EQ(callsOf("glWaitSync").size(), row.graphicsWaits);
+        destroy(buffer);
+    }
+    expectLeft({"event#7 x1", "event#8 x1"}); // of the last evaluation
 }
-INSTANTIATE_TEST_SUITE_P(SharedBuffers, GraphicsAbilities,
-                         ::testing::Values(AbilityRow{"NoTable", -1, 0, 0},
-                                           AbilityRow{"OnlySyncFromEvents", 0, 0, 0},
-                                           AbilityRow{"OnlySyncObjects", 1, 1, 0},
-                                           AbilityRow{"All", 2, 1, 1}),
-                         ::testing::PrintToStringParamName());
 
 TEST_F(SharedBufferTest, ASyncObjectThatCannotBeMadeIsSkipped)
 {
