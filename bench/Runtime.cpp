@@ -18,13 +18,21 @@ std::string platformText(cl_platform_id platform, cl_platform_info name)
 
 } // namespace
 
-Runtime::Runtime(int& argumentCount, char** arguments) : fApplication(argumentCount, arguments)
+Runtime::Runtime(int& argumentCount, char** arguments, const BeforeStart& beforeStart)
+    : fApplication(argumentCount, arguments)
 {
     fSurface.create();
     if (!fContext.create() || !fContext.makeCurrent(&fSurface))
         throw std::runtime_error("no OpenGL context can be made on this display");
     fHost = std::make_unique<GLHost>(fContext);
-    if (!TopenCLInfo::initialize(nullptr, nativeContext(fContext), nullptr, false, false, 0))
+    void* graphicsContext = nativeContext(fContext);
+    if (beforeStart)
+        beforeStart(graphicsContext);
+    bool started = false;
+    fStartTime = timed([&] {
+        started = TopenCLInfo::initialize(nullptr, graphicsContext, nullptr, false, false, 0);
+    });
+    if (!started)
         throw std::runtime_error("the library does not start on this machine's OpenCL");
 }
 
@@ -46,8 +54,8 @@ cl_command_queue Runtime::queue()
 std::string Runtime::platformName()
 {
     cl_platform_id platform = nullptr;
-    clGetDeviceInfo(TopenCLInfo::theOne().openCLDevice(), CL_DEVICE_PLATFORM, sizeof platform,
-                    &platform, nullptr);
+    clGetDeviceInfo(TopenCLInfo::theOne().openCLDevice(), CL_DEVICE_PLATFORM,
+                    sizeof(cl_platform_id), &platform, nullptr);
     return platformText(platform, CL_PLATFORM_NAME) + ", " +
            platformText(platform, CL_PLATFORM_VERSION);
 }

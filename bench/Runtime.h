@@ -2,8 +2,10 @@
 // stand-in host around it.
 #pragma once
 
+#include "harness/Timing.h"
 #include "standalone/GLHost.h"
 
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -15,8 +17,11 @@
 
 class Runtime {
 public:
+    // What happens before the library is initialised; given the native OpenGL context.
+    using BeforeStart = std::function<void(void* graphicsContext)>;
+
     // Throws std::runtime_error, with the reason, when a piece of the machine is missing.
-    Runtime(int& argumentCount, char** arguments);
+    Runtime(int& argumentCount, char** arguments, const BeforeStart& beforeStart = {});
     ~Runtime();
     Runtime(const Runtime&) = delete;
     Runtime& operator=(const Runtime&) = delete;
@@ -29,9 +34,13 @@ public:
     static std::string platformName(); // and version
     static std::string deviceName();
 
+    // That TopenCLInfo::initialize took.
+    Nanoseconds startTime() const { return fStartTime; }
+
 private:
     QGuiApplication fApplication;
     QOffscreenSurface fSurface;
     QOpenGLContext fContext;
     std::unique_ptr<GLHost> fHost;
+    Nanoseconds fStartTime{0};
 };

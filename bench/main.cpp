@@ -1,5 +1,6 @@
 // Measures the library beside the bare OpenCL calls that it must make.
 #include "Runtime.h"
+#include "Startup.h"
 #include "cases/Cases.h"
 #include "harness/InstructionCount.h"
 #include "harness/Report.h"
@@ -21,6 +22,8 @@ Measures the library beside the bare OpenCL calls that it must make, and prints 
   --json FILE          also writes the results as JSON
   --instructions DIR   also shows the instruction counts that callgrind wrote to DIR
   --against FILE       also compares with the JSON of an earlier run
+  --start WHICH        only the milliseconds that a start takes, which is once per process: of the
+                       library, or of the bare OpenCL calls that it makes (bare)
   --list               the names of the groups, and nothing else
   --help               this text
 
@@ -36,6 +39,7 @@ struct Options {
     std::filesystem::path json;
     std::filesystem::path instructions;
     std::filesystem::path against;
+    std::string start;
     bool list = false;
     bool help = false;
 };
@@ -60,6 +64,8 @@ Options parse(int count, char** arguments)
             options.instructions = value();
         else if (argument == "--against")
             options.against = value();
+        else if (argument == "--start")
+            options.start = value();
         else if (argument == "--list")
             options.list = true;
         else if (argument == "--help")
@@ -124,6 +130,20 @@ void run(const Options& options, int& argumentCount, char** arguments)
     }
 }
 
+void tellStart(const std::string& which, int& argumentCount, char** arguments)
+{
+    if (which != "library" && which != "bare")
+        throw std::runtime_error("--start takes library or bare");
+    Nanoseconds bare{0};
+    const Runtime::BeforeStart startBare = [&](void* graphicsContext) {
+        bare = startByHand(graphicsContext);
+    };
+    const bool isBare = which == "bare";
+    const Runtime runtime(argumentCount, arguments, isBare ? startBare : nullptr);
+    const std::chrono::duration<double, std::milli> time = isBare ? bare : runtime.startTime();
+    std::printf("%.3f\n", time.count());
+}
+
 } // namespace
 
 int main(int argumentCount, char** arguments)
@@ -135,6 +155,8 @@ int main(int argumentCount, char** arguments)
         } else if (options.list) {
             for (const GroupMaker& maker : chosenGroups(options.only, nullptr))
                 std::cout << maker.name << '\n';
+        } else if (!options.start.empty()) {
+            tellStart(options.start, argumentCount, arguments);
         } else {
             run(options, argumentCount, arguments);
         }
