@@ -1,157 +1,119 @@
 // What OpenCL and OpenGL see of each other's writes.
 #include "SharingTest.h"
 
-#include <CL/cl.h>
+#include "glshare.h"
 
 #include <array>
-#include <atomic>
 #include <thread>
 
 namespace {
 
-constexpr std::size_t kCount = 5000;
-constexpr std::size_t kBytes = kCount * sizeof(cl_int);
-
 class BufferContentsTest : public SharingTest {
 protected:
-    // Acquires, checks what OpenCL sees, writes something else, releases, checks what OpenGL sees.
+    // Rewrites through OpenCL and checks what OpenGL sees.
     void roundTrip(GLuint buffer, cl_mem memory, const Numbers& before, const Numbers& after)
     {
-        ASSERT_EQ(acquire(memory), CL_SUCCESS);
-        EXPECT_EQ(readCl(memory, before.size()), before);
-        writeCl(memory, after);
-        ASSERT_EQ(release(memory), CL_SUCCESS);
-        clFinish(queue_);
+        ASSERT_NO_FATAL_FAILURE(queue_.rewrite(memory, before, after));
         EXPECT_EQ(readGl(buffer, after.size()), after);
     }
 };
 
 TEST_F(BufferContentsTest, WritesCrossInBothDirections)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, kCount));
-    cl_mem memory = share(buffer);
-    roundTrip(buffer, memory, numbersFrom(1, kCount), numbersFrom(100, kCount));
-
-    const Numbers drawn = numbersFrom(-7, kCount);
-    glBufferSubData(GL_ARRAY_BUFFER, 0, kBytes, drawn.data());
+    roundTrip(buffer_, memory_, from(1), from(100));
+    redraw(buffer_, from(-7));
     glFinish();
-    roundTrip(buffer, memory, drawn, numbersFrom(3, kCount));
-    clReleaseMemObject(memory);
+    roundTrip(buffer_, memory_, from(-7), from(3));
 }
 
 TEST_F(BufferContentsTest, BytesAreCopiedOnlyWithoutZeroCopy)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, kCount));
-    cl_mem memory = share(buffer);
-    const glshare_counters before = counters();
-    roundTrip(buffer, memory, numbersFrom(1, kCount), numbersFrom(2, kCount));
-    const glshare_counters after = counters();
-    EXPECT_EQ(after.bytes_copied - before.bytes_copied, isZeroCopy() ? 0 : 2 * kBytes);
-    EXPECT_EQ(after.acquired_in_place - before.acquired_in_place, isZeroCopy() ? 1 : 0);
-    EXPECT_EQ(after.acquired_by_copy - before.acquired_by_copy, isZeroCopy() ? 0 : 1);
-    EXPECT_EQ(after.released_by_copy - before.released_by_copy, isZeroCopy() ? 0 : 1);
+    const auto getCounters = reinterpret_cast<glshare_get_counters_fn>(
+        clGetExtensionFunctionAddressForPlatform(platform_, GLSHARE_GET_COUNTERS_NAME));
+    ASSERT_NE(getCounters, nullptr);
+    glshare_counters before{};
+    glshare_counters after{};
+    getCounters(&before);
+    roundTrip(buffer_, memory_, from(1), from(2));
+    getCounters(&after);
+    const bool isZeroCopy = isOn("GLSHARE_ZERO_COPY");
+    EXPECT_EQ(after.bytes_copied - before.bytes_copied,
+              isZeroCopy ? 0 : 2 * count_ * sizeof(cl_int));
+    EXPECT_EQ(after.acquired_in_place - before.acquired_in_place, isZeroCopy ? 1 : 0);
+    EXPECT_EQ(after.acquired_by_copy - before.acquired_by_copy, isZeroCopy ? 0 : 1);
+    EXPECT_EQ(after.released_by_copy - before.released_by_copy, isZeroCopy ? 0 : 1);
     EXPECT_EQ(after.failed_copies, before.failed_copies);
-    clReleaseMemObject(memory);
 }
 
 // The storage moves away from under the memory object, which stays the same.
 TEST_F(BufferContentsTest, ReallocatedBuffersKeepSharing)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, kCount));
-    cl_mem memory = share(buffer);
-    roundTrip(buffer, memory, numbersFrom(1, kCount), numbersFrom(2, kCount));
-
-    for (const std::size_t factor : {3U, 200U, 1U}) {
+    roundTrip(buffer_, memory_, from(1), from(2));
+    for (const cl_int factor : {3, 200, 1}) {
         SCOPED_TRACE(factor);
-        const Numbers larger = numbersFrom(static_cast<cl_int>(factor), kCount * factor);
-        glBindBuffer(GL_ARRAY_BUFFER, buffer);
-        glBufferData(GL_ARRAY_BUFFER, static_cast<GLsizeiptr>(kBytes * factor), larger.data(),
-                     GL_STATIC_DRAW);
+        refill(buffer_, numbersFrom(factor, count_ * static_cast<std::size_t>(factor)));
         glFinish();
-        const Numbers seen(larger.begin(), larger.begin() + kCount);
-        roundTrip(buffer, memory, seen, numbersFrom(77, kCount));
+        roundTrip(buffer_, memory_, from(factor), from(77));
     }
-    clReleaseMemObject(memory);
 }
 
 // OpenCL still uses the old storage when OpenGL replaces it.
 TEST_F(BufferContentsTest, ReallocationWhileAcquiredIsHarmless)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, kCount));
-    cl_mem memory = share(buffer);
-    ASSERT_EQ(acquire(memory), CL_SUCCESS);
-    const Numbers larger = numbersFrom(9, kCount * 50);
-    glBindBuffer(GL_ARRAY_BUFFER, buffer);
-    glBufferData(GL_ARRAY_BUFFER, static_cast<GLsizeiptr>(kBytes * 50), larger.data(),
-                 GL_STATIC_DRAW);
-    writeCl(memory, numbersFrom(5, kCount));
-    EXPECT_EQ(readCl(memory, kCount), numbersFrom(5, kCount));
-    EXPECT_EQ(release(memory), CL_SUCCESS);
+    ASSERT_EQ(queue_.acquire(memory_), CL_SUCCESS);
+    refill(buffer_, numbersFrom(9, count_ * 50));
+    queue_.write(memory_, from(5));
+    EXPECT_EQ(queue_.read(memory_, count_), from(5));
+    EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
     clFinish(queue_);
 
-    const Numbers latest = numbersFrom(21, kCount);
-    glBufferSubData(GL_ARRAY_BUFFER, 0, kBytes, latest.data());
+    redraw(buffer_, from(21));
     glFinish();
-    roundTrip(buffer, memory, latest, numbersFrom(31, kCount));
-    clReleaseMemObject(memory);
+    roundTrip(buffer_, memory_, from(21), from(31));
 }
 
-TEST_F(BufferContentsTest, BuffersThatTheApplicationKeepsMappedAreShared)
+// Storage that the application keeps mapped, and storage that nobody may map.
+TEST_F(BufferContentsTest, ImmutableBuffersAreShared)
 {
-    GLuint buffer = 0;
-    glGenBuffers(1, &buffer);
-    glBindBuffer(GL_ARRAY_BUFFER, buffer);
-    constexpr GLbitfield access = GL_MAP_WRITE_BIT | GL_MAP_PERSISTENT_BIT | GL_MAP_COHERENT_BIT;
-    const Numbers first = numbersFrom(1, kCount);
-    glBufferStorage(GL_ARRAY_BUFFER, kBytes, first.data(), access);
-    ASSERT_NE(glMapBufferRange(GL_ARRAY_BUFFER, 0, kBytes, access), nullptr);
-    cl_mem memory = share(buffer);
-    roundTrip(buffer, memory, first, numbersFrom(50, kCount));
-    clReleaseMemObject(memory);
-}
-
-TEST_F(BufferContentsTest, ImmutableBuffersWithoutMapAccessAreShared)
-{
-    GLuint buffer = 0;
-    glGenBuffers(1, &buffer);
-    glBindBuffer(GL_ARRAY_BUFFER, buffer);
-    const Numbers first = numbersFrom(1, kCount);
-    glBufferStorage(GL_ARRAY_BUFFER, kBytes, first.data(), 0);
-    cl_mem memory = share(buffer);
-    roundTrip(buffer, memory, first, numbersFrom(50, kCount));
-    clReleaseMemObject(memory);
+    constexpr GLbitfield kMapped = GL_MAP_WRITE_BIT | GL_MAP_PERSISTENT_BIT | GL_MAP_COHERENT_BIT;
+    for (const GLbitfield access : {kMapped, GLbitfield{0}}) {
+        SCOPED_TRACE(access);
+        GLuint buffer = 0;
+        glGenBuffers(1, &buffer);
+        glBindBuffer(GL_ARRAY_BUFFER, buffer);
+        const auto size = static_cast<GLsizeiptr>(count_ * sizeof(cl_int));
+        glBufferStorage(GL_ARRAY_BUFFER, size, from(1).data(), access);
+        ASSERT_EQ(glMapBufferRange(GL_ARRAY_BUFFER, 0, size, access) != nullptr, access != 0);
+        EXPECT_EQ(glGetError() != GL_NO_ERROR, access == 0);
+        roundTrip(buffer, share(buffer), from(1), from(50));
+    }
 }
 
 // One list with buffers of every kind: in place, moved, and never in place.
 TEST_F(BufferContentsTest, OneCommandCarriesManyBuffers)
 {
-    constexpr std::size_t kBuffers = 64;
+    constexpr cl_int kBuffers = 64;
     std::vector<GLuint> buffers;
-    std::vector<cl_mem> memory;
-    for (std::size_t i = 0; i < kBuffers; ++i) {
-        buffers.push_back(makeGlBuffer(numbersFrom(static_cast<cl_int>(i), kCount)));
-        memory.push_back(share(buffers.back()));
-    }
-    for (std::size_t i = 0; i < kBuffers; i += 3) {
-        const Numbers moved = numbersFrom(static_cast<cl_int>(i), kCount * 2);
-        glBindBuffer(GL_ARRAY_BUFFER, buffers[i]);
-        glBufferData(GL_ARRAY_BUFFER, kBytes * 2, moved.data(), GL_STREAM_DRAW);
+    std::vector<Memory> owners;
+    for (cl_int i = 0; i < kBuffers; ++i) {
+        buffers.push_back(makeGlBuffer(from(i)));
+        owners.push_back(share(buffers.back()));
+        if (i % 3 == 0)
+            refill(buffers.back(), numbersFrom(i, count_ * 2));
     }
     glFinish();
+    const std::vector<cl_mem> memory(owners.begin(), owners.end());
     ASSERT_EQ(clEnqueueAcquireGLObjects(queue_, kBuffers, memory.data(), 0, nullptr, nullptr),
               CL_SUCCESS);
-    for (std::size_t i = 0; i < kBuffers; ++i) {
-        EXPECT_EQ(readCl(memory[i], kCount), numbersFrom(static_cast<cl_int>(i), kCount)) << i;
-        writeCl(memory[i], numbersFrom(static_cast<cl_int>(1000 + i), kCount));
+    for (cl_int i = 0; cl_mem each : memory) {
+        EXPECT_EQ(queue_.read(each, count_), from(i)) << i;
+        queue_.write(each, from(1000 + i++));
     }
     ASSERT_EQ(clEnqueueReleaseGLObjects(queue_, kBuffers, memory.data(), 0, nullptr, nullptr),
               CL_SUCCESS);
     clFinish(queue_);
-    for (std::size_t i = 0; i < kBuffers; ++i) {
-        EXPECT_EQ(readGl(buffers[i], kCount), numbersFrom(static_cast<cl_int>(1000 + i), kCount))
-            << i;
-        clReleaseMemObject(memory[i]);
-    }
+    for (cl_int i = 1000; const GLuint buffer : buffers)
+        EXPECT_EQ(readGl(buffer, count_), from(i++));
 }
 
 // Threads without an OpenGL context, each with a queue and a buffer of its own.
@@ -160,39 +122,27 @@ TEST_F(BufferContentsTest, ThreadsShareAtTheSameTime)
     constexpr std::size_t kThreads = 4;
     constexpr cl_int kRounds = 50;
     std::array<GLuint, kThreads> buffers{};
-    std::array<cl_mem, kThreads> memory{};
+    std::array<Memory, kThreads> memory;
     for (std::size_t i = 0; i < kThreads; ++i) {
-        buffers.at(i) = makeGlBuffer(Numbers(kCount, 0));
+        buffers.at(i) = makeGlBuffer(Numbers(count_, 0));
         memory.at(i) = share(buffers.at(i));
     }
     glFinish();
-    std::atomic<int> failures{0};
-    const auto work = [&](std::size_t i) {
-        cl_command_queue queue = clCreateCommandQueue(context_, device_, 0, nullptr);
-        for (cl_int round = 0; round < kRounds; ++round) {
-            const cl_int value = round + static_cast<cl_int>(i);
-            if (clEnqueueAcquireGLObjects(queue, 1, &memory.at(i), 0, nullptr, nullptr) !=
-                    CL_SUCCESS ||
-                clEnqueueFillBuffer(queue, memory.at(i), &value, sizeof value, 0, kBytes, 0,
-                                    nullptr, nullptr) != CL_SUCCESS ||
-                clEnqueueReleaseGLObjects(queue, 1, &memory.at(i), 0, nullptr, nullptr) !=
-                    CL_SUCCESS)
-                ++failures;
-        }
-        clFinish(queue);
-        clReleaseCommandQueue(queue);
-    };
-    std::vector<std::thread> threads;
+    std::vector<std::jthread> threads;
     for (std::size_t i = 0; i < kThreads; ++i)
-        threads.emplace_back(work, i);
-    for (std::thread& thread : threads)
-        thread.join();
-    EXPECT_EQ(failures, 0);
-    for (std::size_t i = 0; i < kThreads; ++i) {
-        EXPECT_EQ(readGl(buffers.at(i), kCount),
-                  Numbers(kCount, kRounds - 1 + static_cast<cl_int>(i)));
-        clReleaseMemObject(memory.at(i));
-    }
+        threads.emplace_back([this, i, each = cl_mem(memory.at(i))] {
+            const Queue queue(context_, device_);
+            for (cl_int round = 0; round < kRounds; ++round) {
+                EXPECT_EQ(queue.acquire(each), CL_SUCCESS);
+                queue.fill(each, round + static_cast<cl_int>(i));
+                EXPECT_EQ(queue.release(each), CL_SUCCESS);
+            }
+            clFinish(queue);
+        });
+    threads.clear();
+    for (std::size_t i = 0; i < kThreads; ++i)
+        EXPECT_EQ(readGl(buffers.at(i), count_),
+                  Numbers(count_, kRounds - 1 + static_cast<cl_int>(i)));
 }
 
 } // namespace

@@ -3,180 +3,116 @@
 
 #include <array>
 #include <chrono>
-#include <future>
 #include <thread>
 #include <utility>
 
 namespace {
 
-constexpr std::size_t kCount = 1000;
-
 // Far longer than any of the commands takes: a command that has not completed by then is waiting.
 constexpr std::chrono::milliseconds kSettled{100};
 
-class CommandOrderTest : public SharingTest {
-protected:
-    void SetUp() override
-    {
-        SharingTest::SetUp();
-        if (context_ == nullptr)
-            return;
-        buffer_ = makeGlBuffer(numbersFrom(1, kCount));
-        glFinish();
-        memory_ = share(buffer_);
-        gate_ = clCreateUserEvent(context_, nullptr);
-    }
+constexpr std::array<cl_command_queue_properties, 2> kQueueKinds{
+    0, CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE};
 
-    void TearDown() override
-    {
-        if (memory_ != nullptr)
-            clReleaseMemObject(memory_);
-        if (gate_ != nullptr)
-            clReleaseEvent(gate_);
-        SharingTest::TearDown();
-    }
-
-    // Writes `value` everywhere, without waiting.
-    void fill(cl_command_queue queue, cl_int value, const std::vector<cl_event>& waitList = {},
-              cl_event* event = nullptr)
-    {
-        EXPECT_EQ(clEnqueueFillBuffer(queue, memory_, &value, sizeof value, 0,
-                                      kCount * sizeof(cl_int),
-                                      static_cast<cl_uint>(waitList.size()),
-                                      waitList.empty() ? nullptr : waitList.data(), event),
-                  CL_SUCCESS);
-    }
-
-    GLuint buffer_ = 0;
-    cl_mem memory_ = nullptr;
-    cl_event gate_ = nullptr; // opened by the test
-};
+using CommandOrderTest = SharingTest;
 
 // What cl_khr_gl_event alone promises; runs only where it is switched on.
-using GlEventTest = CommandOrderTest;
+using GlEventTest = SharingTest;
 
 // Without an OpenGL context on the calling thread nothing waits: neither the caller, nor the
-// command for less than its wait list, nor what follows in the queue for less than the command.
-TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackTheQueue)
+// command for less than its wait list, nor what follows it for less than the command. In a queue
+// without order that is what follows it by events.
+TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackWhatFollows)
 {
-    std::array<cl_event, 3> events{};
-    onOtherThread([&] {
-        EXPECT_EQ(acquire(memory_, {gate_}, &events[0]), CL_SUCCESS);
-        fill(queue_, 5, {}, &events[1]);
-        EXPECT_EQ(release(memory_, {}, &events[2]), CL_SUCCESS);
-        clFlush(queue_);
-    });
-    std::this_thread::sleep_for(kSettled);
-    for (cl_event event : events)
-        EXPECT_GT(statusOf(event), CL_COMPLETE);
-    EXPECT_EQ(readGl(buffer_, kCount), numbersFrom(1, kCount));
+    for (cl_int value = 5; const cl_command_queue_properties kind : kQueueKinds) {
+        SCOPED_TRACE(kind);
+        const Queue queue(context_, device_, kind);
+        const Event gate = makeUserEvent();
+        std::array<Event, 3> events;
+        const auto after = [&](const Event& event) {
+            return kind == 0 ? WaitList{} : WaitList{event};
+        };
+        const Numbers before = readGl(buffer_, count_);
+        onOtherThread([&] {
+            EXPECT_EQ(queue.acquire(memory_, {gate}, &events[0]), CL_SUCCESS);
+            queue.fill(memory_, ++value, after(events[0]), &events[1]);
+            EXPECT_EQ(queue.release(memory_, after(events[1]), &events[2]), CL_SUCCESS);
+            clFlush(queue);
+        });
+        std::this_thread::sleep_for(kSettled);
+        for (const Event& event : events)
+            EXPECT_GT(statusOf(event), CL_COMPLETE);
+        EXPECT_EQ(readGl(buffer_, count_), before);
 
-    clSetUserEventStatus(gate_, CL_COMPLETE);
-    EXPECT_EQ(clWaitForEvents(1, &events[2]), CL_SUCCESS);
-    for (cl_event event : events) {
-        EXPECT_EQ(statusOf(event), CL_COMPLETE);
-        clReleaseEvent(event);
+        clSetUserEventStatus(gate, CL_COMPLETE);
+        EXPECT_EQ(clWaitForEvents(1, events[2].place()), CL_SUCCESS);
+        for (const Event& event : events)
+            EXPECT_EQ(statusOf(event), CL_COMPLETE);
+        EXPECT_EQ(readGl(buffer_, count_), Numbers(count_, value));
     }
-    EXPECT_EQ(readGl(buffer_, kCount), Numbers(kCount, 5));
-}
-
-TEST_F(CommandOrderTest, EventsAloneOrderAQueueWithoutOrder)
-{
-    cl_int error = CL_SUCCESS;
-    cl_command_queue queue =
-        clCreateCommandQueue(context_, device_, CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE, &error);
-    ASSERT_EQ(error, CL_SUCCESS);
-    std::array<cl_event, 3> events{};
-    onOtherThread([&] {
-        EXPECT_EQ(clEnqueueAcquireGLObjects(queue, 1, &memory_, 1, &gate_, &events[0]), CL_SUCCESS);
-        fill(queue, 8, {events[0]}, &events[1]);
-        EXPECT_EQ(clEnqueueReleaseGLObjects(queue, 1, &memory_, 1, &events[1], &events[2]),
-                  CL_SUCCESS);
-        clFlush(queue);
-    });
-    std::this_thread::sleep_for(kSettled);
-    for (cl_event event : events)
-        EXPECT_GT(statusOf(event), CL_COMPLETE);
-    clSetUserEventStatus(gate_, CL_COMPLETE);
-    EXPECT_EQ(clWaitForEvents(1, &events[2]), CL_SUCCESS);
-    EXPECT_EQ(readGl(buffer_, kCount), Numbers(kCount, 8));
-    for (cl_event event : events)
-        clReleaseEvent(event);
-    clReleaseCommandQueue(queue);
 }
 
 // cl_khr_gl_event: drawing after a release sees its result, which needs no OpenCL wait. Without the
 // extension the call returns at once.
 TEST_F(CommandOrderTest, ReleaseReturnsWhenDoneOnlyWithGlContextAndGlEvent)
 {
-    ASSERT_EQ(acquire(memory_), CL_SUCCESS);
-    fill(queue_, 6, {gate_});
-    std::promise<void> mayOpen;
-    std::thread opener([this, opens = mayOpen.get_future()]() mutable {
-        if (offersGlEvent())
+    const Event gate = makeUserEvent();
+    ASSERT_EQ(queue_.acquire(memory_), CL_SUCCESS);
+    queue_.fill(memory_, 6, {gate});
+    std::jthread opener;
+    if (offersGlEvent())
+        opener = std::jthread([&] {
             std::this_thread::sleep_for(kSettled);
-        else
-            opens.wait();
-        clSetUserEventStatus(gate_, CL_COMPLETE);
-    });
-    cl_event event = nullptr;
-    EXPECT_EQ(release(memory_, {}, &event), CL_SUCCESS);
+            clSetUserEventStatus(gate, CL_COMPLETE);
+        });
+    Event event;
+    EXPECT_EQ(queue_.release(memory_, {}, &event), CL_SUCCESS);
     if (offersGlEvent()) {
         EXPECT_EQ(statusOf(event), CL_COMPLETE);
     } else {
         EXPECT_GT(statusOf(event), CL_COMPLETE);
-        mayOpen.set_value();
-        clWaitForEvents(1, &event);
+        clSetUserEventStatus(gate, CL_COMPLETE);
+        clWaitForEvents(1, event.place());
     }
-    opener.join();
-    EXPECT_EQ(readGl(buffer_, kCount), Numbers(kCount, 6));
-    clReleaseEvent(event);
+    EXPECT_EQ(readGl(buffer_, count_), Numbers(count_, 6));
 }
 
 // The other OpenGL contexts of the process are none of the layer's business.
 TEST_F(CommandOrderTest, ContextsOfOtherShareGroupsAreNotWaitedFor)
 {
-    ASSERT_EQ(acquire(memory_), CL_SUCCESS);
+    const Event gate = makeUserEvent();
+    ASSERT_EQ(queue_.acquire(memory_), CL_SUCCESS);
     const EglTestContext stranger;
     ASSERT_TRUE(stranger.valid());
     onOtherThread([&] {
         stranger.makeCurrent();
-        fill(queue_, 6, {gate_});
-        cl_event event = nullptr;
-        EXPECT_EQ(release(memory_, {}, &event), CL_SUCCESS);
+        queue_.fill(memory_, 6, {gate});
+        Event event;
+        EXPECT_EQ(queue_.release(memory_, {}, &event), CL_SUCCESS);
         EXPECT_GT(statusOf(event), CL_COMPLETE);
-        clReleaseEvent(event);
         EglTestContext::releaseCurrent();
     });
-    clSetUserEventStatus(gate_, CL_COMPLETE);
+    clSetUserEventStatus(gate, CL_COMPLETE);
     clFinish(queue_);
 }
 
 TEST_F(CommandOrderTest, UserSynchronisationSwitchesTheImpliedOrderOff)
 {
-    std::vector<cl_context_properties> list = properties(*gl_);
-    list.insert(list.end() - 1, {CL_CONTEXT_INTEROP_USER_SYNC, CL_TRUE});
-    cl_int error = CL_SUCCESS;
-    cl_context context = clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error);
-    ASSERT_EQ(error, CL_SUCCESS);
-    cl_command_queue queue = clCreateCommandQueue(context, device_, 0, nullptr);
-    cl_mem memory = clCreateFromGLBuffer(context, CL_MEM_READ_WRITE, buffer_, &error);
-    cl_event gate = clCreateUserEvent(context, nullptr);
-    cl_event event = nullptr;
-    EXPECT_EQ(clEnqueueAcquireGLObjects(queue, 1, &memory, 1, &gate, nullptr), CL_SUCCESS);
-    EXPECT_EQ(clEnqueueReleaseGLObjects(queue, 1, &memory, 0, nullptr, &event), CL_SUCCESS);
+    glEntries_.insert(glEntries_.end(), {CL_CONTEXT_INTEROP_USER_SYNC, CL_TRUE});
+    const Context context = makeContext();
+    const Queue queue(context, device_);
+    const Memory memory = share(context, buffer_);
+    const Event gate = clCreateUserEvent(context, nullptr);
+    Event event;
+    EXPECT_EQ(queue.acquire(memory, {gate}), CL_SUCCESS);
+    EXPECT_EQ(queue.release(memory, {}, &event), CL_SUCCESS);
     EXPECT_GT(statusOf(event), CL_COMPLETE);
     clSetUserEventStatus(gate, CL_COMPLETE);
-    EXPECT_EQ(clWaitForEvents(1, &event), CL_SUCCESS);
-    clReleaseEvent(event);
-    clReleaseEvent(gate);
-    clReleaseMemObject(memory);
-    clReleaseCommandQueue(queue);
-    clReleaseContext(context);
+    EXPECT_EQ(clWaitForEvents(1, event.place()), CL_SUCCESS);
 }
 
-// Draws a triangle over the whole target, whose fragments write -1 to the buffer of binding 0, each
-// to its own place. Nothing waits for it, nor flushes.
+// Draws a triangle over a target of that many pixels a side, whose fragments write -1 to the buffer
+// of binding 0, each to its own place. Nothing waits for it, nor flushes.
 void drawIntoBuffer(GLsizei side)
 {
     const char* vertex =
@@ -207,50 +143,40 @@ TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
     constexpr GLsizei kSide = 1024;
     constexpr std::size_t kPixels = std::size_t{kSide} * kSide;
     const GLuint pixels = makeGlBuffer(Numbers(kPixels, 0));
-    cl_mem memory = share(pixels);
-    GLuint target = 0;
+    const Memory memory = share(pixels);
     GLuint frame = 0;
     GLuint vertices = 0;
-    glGenTextures(1, &target);
-    glBindTexture(GL_TEXTURE_2D, target);
-    glTexStorage2D(GL_TEXTURE_2D, 1, GL_RGBA8, kSide, kSide);
     glGenFramebuffers(1, &frame);
     glBindFramebuffer(GL_FRAMEBUFFER, frame);
-    glFramebufferTexture2D(GL_FRAMEBUFFER, GL_COLOR_ATTACHMENT0, GL_TEXTURE_2D, target, 0);
+    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, kSide);
+    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, kSide);
     glGenVertexArrays(1, &vertices);
     glBindVertexArray(vertices);
     glBindBufferBase(GL_SHADER_STORAGE_BUFFER, 0, pixels);
     glFinish();
     drawIntoBuffer(kSide);
 
-    EXPECT_EQ(acquire(memory), CL_SUCCESS);
-    EXPECT_TRUE(readCl(memory, kPixels) == Numbers(kPixels, -1));
-    EXPECT_EQ(release(memory), CL_SUCCESS);
-    clReleaseMemObject(memory);
+    EXPECT_EQ(queue_.acquire(memory), CL_SUCCESS);
+    EXPECT_TRUE(queue_.read(memory, kPixels) == Numbers(kPixels, -1));
+    EXPECT_EQ(queue_.release(memory), CL_SUCCESS);
 }
 
 // The failure of what it waits for is the command's own, in a queue of either kind.
 TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
 {
-    for (const cl_command_queue_properties kind :
-         {cl_command_queue_properties{0},
-          cl_command_queue_properties{CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE}}) {
+    for (const cl_command_queue_properties kind : kQueueKinds) {
         SCOPED_TRACE(kind);
-        cl_command_queue queue = clCreateCommandQueue(context_, device_, kind, nullptr);
-        cl_mem memory = share(buffer_);
-        cl_event gate = clCreateUserEvent(context_, nullptr);
-        cl_event event = nullptr;
+        const Queue queue(context_, device_, kind);
+        const Memory memory = share(buffer_);
+        const Event gate = makeUserEvent();
+        Event event;
         onOtherThread([&] {
-            EXPECT_EQ(clEnqueueAcquireGLObjects(queue, 1, &memory, 1, &gate, &event), CL_SUCCESS);
+            EXPECT_EQ(queue.acquire(memory, {gate}, &event), CL_SUCCESS);
             clFlush(queue);
         });
         clSetUserEventStatus(gate, -5);
-        clWaitForEvents(1, &event);
+        clWaitForEvents(1, event.place());
         EXPECT_LT(statusOf(event), CL_COMPLETE);
-        clReleaseEvent(event);
-        clReleaseEvent(gate);
-        clReleaseMemObject(memory);
-        clReleaseCommandQueue(queue);
     }
 }
 
@@ -259,24 +185,21 @@ TEST_F(GlEventTest, EventsFollowGlSyncObjects)
     const auto createEvent = reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
         clGetExtensionFunctionAddressForPlatform(platform_, "clCreateEventFromGLsyncKHR"));
     ASSERT_NE(createEvent, nullptr);
-    const Numbers drawn = numbersFrom(40, kCount);
-    glBufferSubData(GL_ARRAY_BUFFER, 0, kCount * sizeof(cl_int), drawn.data());
+    redraw(buffer_, from(40));
     GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
     glFlush();
     cl_int error = CL_INVALID_VALUE;
-    cl_event event = createEvent(context_, reinterpret_cast<cl_GLsync>(sync), &error);
+    const Event event = createEvent(context_, reinterpret_cast<cl_GLsync>(sync), &error);
     ASSERT_EQ(error, CL_SUCCESS);
-    cl_command_type type = 0;
-    clGetEventInfo(event, CL_EVENT_COMMAND_TYPE, sizeof type, &type, nullptr);
-    EXPECT_EQ(type, static_cast<cl_command_type>(CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR));
+    EXPECT_EQ(infoOf<cl_command_type>(clGetEventInfo, event, CL_EVENT_COMMAND_TYPE),
+              cl_command_type{CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR});
     EXPECT_EQ(clSetUserEventStatus(event, CL_COMPLETE), CL_INVALID_EVENT);
 
     onOtherThread([&] {
-        EXPECT_EQ(acquire(memory_, {event}), CL_SUCCESS);
-        EXPECT_EQ(readCl(memory_, kCount), drawn);
-        EXPECT_EQ(release(memory_), CL_SUCCESS);
+        EXPECT_EQ(queue_.acquire(memory_, {event}), CL_SUCCESS);
+        EXPECT_EQ(queue_.read(memory_, count_), from(40));
+        EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
     });
-    clReleaseEvent(event);
     glDeleteSync(sync);
     EXPECT_EQ(createEvent(context_, reinterpret_cast<cl_GLsync>(this), &error), nullptr);
     EXPECT_EQ(error, CL_INVALID_GL_OBJECT);

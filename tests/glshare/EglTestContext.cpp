@@ -1,5 +1,6 @@
 #include "EglTestContext.h"
 
+#include <CL/cl_gl.h>
 #include <EGL/eglext.h>
 
 #include <array>
@@ -36,6 +37,12 @@ EglTestContext::EglTestContext(const EglTestContext* share)
 EglTestContext::~EglTestContext()
 {
     destroy();
+}
+
+std::vector<cl_context_properties> EglTestContext::entries() const
+{
+    return {CL_GL_CONTEXT_KHR, reinterpret_cast<cl_context_properties>(context_),
+            CL_EGL_DISPLAY_KHR, reinterpret_cast<cl_context_properties>(display())};
 }
 
 void EglTestContext::makeCurrent() const

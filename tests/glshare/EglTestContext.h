@@ -1,7 +1,10 @@
 // An OpenGL context for tests, which needs no display.
 #pragma once
 
+#include <CL/cl.h>
 #include <EGL/egl.h>
+
+#include <vector>
 
 class EglTestContext {
 public:
@@ -17,7 +20,9 @@ public:
     EglTestContext& operator=(const EglTestContext&) = delete;
 
     [[nodiscard]] bool valid() const { return context_ != EGL_NO_CONTEXT; }
-    [[nodiscard]] EGLContext handle() const { return context_; }
+
+    // What the properties of an OpenCL context say of it.
+    [[nodiscard]] std::vector<cl_context_properties> entries() const;
 
     // On the calling thread.
     void makeCurrent() const;

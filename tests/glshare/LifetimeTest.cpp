@@ -1,52 +1,34 @@
 // What is kept, and for how long, when things go in any order.
 #include "SharingTest.h"
 
-#include <dirent.h>
 #include <unistd.h>
 
-#include <cstdio>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 
 namespace {
 
-constexpr std::size_t kCount = 100000;
-
-std::size_t threadsOfProcess()
+std::ptrdiff_t threadsOfProcess()
 {
-    std::size_t count = 0;
-    DIR* tasks = opendir("/proc/self/task");
-    while (const dirent* task = readdir(tasks))
-        count += task->d_name[0] != '.' ? 1 : 0;
-    closedir(tasks);
-    return count;
+    return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {});
 }
 
 class LifetimeTest : public SharingTest {
 protected:
-    void acquireWriteRelease(cl_mem memory, cl_int first)
-    {
-        EXPECT_EQ(acquire(memory), CL_SUCCESS);
-        writeCl(memory, numbersFrom(first, kCount));
-        EXPECT_EQ(release(memory), CL_SUCCESS);
-        clFinish(queue_);
-    }
+    LifetimeTest() : SharingTest(100000) {}
 };
 
 TEST_F(LifetimeTest, ContextsTakeTheirWorkerAlong)
 {
-    const std::size_t before = threadsOfProcess();
+    const std::ptrdiff_t before = threadsOfProcess();
     for (int i = 0; i < 20; ++i) {
-        cl_int error = CL_SUCCESS;
-        cl_context context =
-            clCreateContext(properties(*gl_).data(), 1, &device_, nullptr, nullptr, &error);
-        ASSERT_EQ(error, CL_SUCCESS);
+        const Context context = makeContext();
         clRetainContext(context);
         clReleaseContext(context);
         const GLuint buffer = makeGlBuffer(numbersFrom(0, 10));
-        cl_mem memory = clCreateFromGLBuffer(context, CL_MEM_READ_WRITE, buffer, &error);
-        EXPECT_EQ(error, CL_SUCCESS);
-        clReleaseMemObject(memory);
+        share(context, buffer);
         glDeleteBuffers(1, &buffer);
-        clReleaseContext(context);
     }
     // Threads of what was there before may have ended in the meantime.
     EXPECT_LE(threadsOfProcess(), before);
@@ -55,100 +37,69 @@ TEST_F(LifetimeTest, ContextsTakeTheirWorkerAlong)
 // The application's last reference to the context is not the last one.
 TEST_F(LifetimeTest, ObjectsOutliveTheReferenceToTheirContext)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(0, kCount));
-    cl_mem memory = share(buffer);
-    clReleaseContext(context_);
     context_ = nullptr;
-    acquireWriteRelease(memory, 4);
-    EXPECT_EQ(readGl(buffer, kCount), numbersFrom(4, kCount));
-    clReleaseMemObject(memory);
+    ASSERT_NO_FATAL_FAILURE(queue_.rewrite(memory_, from(1), from(4)));
+    EXPECT_EQ(readGl(buffer_, count_), from(4));
 }
 
 TEST_F(LifetimeTest, ReleasedObjectsFinishTheirCommandsFirst)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(0, kCount));
-    cl_mem memory = share(buffer);
-    cl_event gate = clCreateUserEvent(context_, nullptr);
+    const Event gate = makeUserEvent();
     onOtherThread([&] {
-        const cl_int value = 9;
-        EXPECT_EQ(acquire(memory, {gate}), CL_SUCCESS);
-        EXPECT_EQ(clEnqueueFillBuffer(queue_, memory, &value, sizeof value, 0,
-                                      kCount * sizeof(cl_int), 0, nullptr, nullptr),
-                  CL_SUCCESS);
-        EXPECT_EQ(release(memory), CL_SUCCESS);
-        clReleaseMemObject(memory);
+        EXPECT_EQ(queue_.acquire(memory_, {gate}), CL_SUCCESS);
+        queue_.fill(memory_, 9);
+        EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
+        memory_ = nullptr;
         clFlush(queue_);
     });
     clSetUserEventStatus(gate, CL_COMPLETE);
     clFinish(queue_);
-    clReleaseEvent(gate);
-    EXPECT_EQ(readGl(buffer, kCount), Numbers(kCount, 9));
+    EXPECT_EQ(readGl(buffer_, count_), Numbers(count_, 9));
 }
 
 // Storage is held as long as the object that lies over it, and no longer.
 TEST_F(LifetimeTest, StorageGoesWithTheObject)
 {
-    const auto residentPages = [] {
+    const auto residentBytes = [] {
         long total = 0;
         long resident = 0;
-        FILE* file = fopen("/proc/self/statm", "r");
-        EXPECT_EQ(fscanf(file, "%ld %ld", &total, &resident), 2);
-        fclose(file);
-        return resident;
+        std::ifstream("/proc/self/statm") >> total >> resident;
+        EXPECT_GT(resident, 0);
+        return resident * sysconf(_SC_PAGESIZE);
     };
     // Large enough that the C library gives each one back to the system at once.
     constexpr std::size_t kLarge = std::size_t{40} << 20;
     const Numbers content(kLarge / sizeof(cl_int), 1);
-    const auto once = [&] {
-        const GLuint buffer = makeGlBuffer(content);
-        cl_mem memory = share(buffer);
-        glDeleteBuffers(1, &buffer);
-        clReleaseMemObject(memory);
-    };
-    // Storage is given back on another thread; what is asked of it afterwards is answered later.
-    const auto settle = [&] {
-        cl_mem memory = share(makeGlBuffer(Numbers(1, 1)));
-        clReleaseMemObject(memory);
-    };
     const auto rounds = [&](int count) {
-        for (int i = 0; i < count; ++i)
-            once();
-        settle();
+        for (int i = 0; i < count; ++i) {
+            const GLuint buffer = makeGlBuffer(content);
+            const Memory memory = share(buffer);
+            glDeleteBuffers(1, &buffer);
+        }
+        // Storage is given back on another thread; what is asked of it afterwards is answered
+        // later.
+        share(makeGlBuffer(Numbers(1, 1)));
     };
     rounds(5); // until the allocators have what they keep
-    const long before = residentPages();
+    const long before = residentBytes();
     rounds(15);
-    EXPECT_LT((residentPages() - before) * sysconf(_SC_PAGESIZE), static_cast<long>(5 * kLarge));
+    EXPECT_LT(residentBytes() - before, static_cast<long>(5 * kLarge));
 }
 
 TEST_F(LifetimeTest, SharingGoesOnWithoutTheApplicationsGlContext)
 {
     const EglTestContext second(gl_.get());
     ASSERT_TRUE(second.valid());
-    const GLuint buffer = makeGlBuffer(numbersFrom(0, kCount));
-    cl_mem memory = share(buffer);
     gl_->destroy();
-    acquireWriteRelease(memory, 11);
+    queue_.rewrite(memory_, from(1), from(11));
     second.makeCurrent();
-    EXPECT_EQ(readGl(buffer, kCount), numbersFrom(11, kCount));
+    EXPECT_EQ(readGl(buffer_, count_), from(11));
     EglTestContext::releaseCurrent();
-    clReleaseMemObject(memory);
 }
 
 TEST_F(LifetimeTest, AContextCurrentElsewhereCanBeSharedWith)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(0, kCount)); // current on this thread
-    glFinish();
-    onOtherThread([&] {
-        cl_int error = CL_SUCCESS;
-        cl_context context =
-            clCreateContext(properties(*gl_).data(), 1, &device_, nullptr, nullptr, &error);
-        ASSERT_EQ(error, CL_SUCCESS);
-        cl_mem memory = clCreateFromGLBuffer(context, CL_MEM_READ_WRITE, buffer, &error);
-        EXPECT_EQ(error, CL_SUCCESS);
-        clReleaseMemObject(memory);
-        clReleaseContext(context);
-    });
+    onOtherThread([&] { share(makeContext(), buffer_); });
 }
 
 } // namespace

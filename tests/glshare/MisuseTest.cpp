@@ -2,120 +2,46 @@
 #include "SharingTest.h"
 
 #include <array>
-#include <functional>
 
 namespace {
 
-constexpr std::size_t kCount = 100;
-
-class MisuseTest : public SharingTest {
-protected:
-    void SetUp() override
-    {
-        SharingTest::SetUp();
-        if (context_ == nullptr)
-            return;
-        buffer_ = makeGlBuffer(numbersFrom(1, kCount));
-        glFinish();
-        memory_ = share(buffer_);
-        plain_ = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
-        otherContext_ = clCreateContext(nullptr, 1, &device_, nullptr, nullptr, nullptr);
-        otherQueue_ = clCreateCommandQueue(otherContext_, device_, 0, nullptr);
-    }
-
-    void TearDown() override
-    {
-        if (context_ != nullptr) {
-            clReleaseMemObject(memory_);
-            clReleaseMemObject(plain_);
-            clReleaseCommandQueue(otherQueue_);
-            clReleaseContext(otherContext_);
-        }
-        SharingTest::TearDown();
-    }
-
-    GLuint buffer_ = 0;
-    cl_mem memory_ = nullptr;
-    cl_mem plain_ = nullptr;            // of context_, but not from OpenGL
-    cl_context otherContext_ = nullptr; // one that does not share
-    cl_command_queue otherQueue_ = nullptr;
-};
+using MisuseTest = SharingTest;
 
 TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArguments)
 {
+    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
+    const Queue unshared(makeContext({0}), device_);
+    const Context other = makeContext();
+    const Queue elsewhere(other, device_);
+    const Event ended = makeUserEvent();
+    clSetUserEventStatus(ended, CL_COMPLETE);
+    const std::array<cl_mem, 2> withNull{memory_, nullptr};
+    const std::array<cl_mem, 2> withPlain{memory_, plain};
+    const std::array<cl_mem, 2> twice{memory_, memory_};
+    const cl_mem* const good = twice.data();
+    const std::array<cl_event, 2> events{ended, nullptr};
     struct Row {
         const char* what;
         cl_command_queue queue;
         cl_uint count;
-        std::array<cl_mem, 2> memory;
-        bool hasList;
+        const cl_mem* memory;
         cl_uint waitCount;
-        std::array<cl_event, 1> waitList;
-        bool hasWaitList;
+        const cl_event* waitList;
         cl_int error;
     };
-    cl_event good = clCreateUserEvent(context_, nullptr);
-    clSetUserEventStatus(good, CL_COMPLETE);
     const Row rows[] = {
-        {"nothing at all", queue_, 0, {}, false, 0, {}, false, CL_SUCCESS},
-        {"no queue", nullptr, 1, {memory_}, true, 0, {}, false, CL_INVALID_COMMAND_QUEUE},
-        {"a queue that does not share",
-         otherQueue_,
-         1,
-         {memory_},
-         true,
-         0,
-         {},
-         false,
-         CL_INVALID_CONTEXT},
-        {"a count without a list", queue_, 1, {}, false, 0, {}, false, CL_INVALID_VALUE},
-        {"a list without a count", queue_, 0, {memory_}, true, 0, {}, false, CL_INVALID_VALUE},
-        {"a null object", queue_, 2, {memory_, nullptr}, true, 0, {}, false, CL_INVALID_MEM_OBJECT},
-        {"an object not from OpenGL",
-         queue_,
-         2,
-         {memory_, plain_},
-         true,
-         0,
-         {},
-         false,
-         CL_INVALID_GL_OBJECT},
-        {"an object twice",
-         queue_,
-         2,
-         {memory_, memory_},
-         true,
-         0,
-         {},
-         false,
-         CL_INVALID_GL_OBJECT},
-        {"a wait count without a list",
-         queue_,
-         1,
-         {memory_},
-         true,
-         1,
-         {},
-         false,
-         CL_INVALID_EVENT_WAIT_LIST},
-        {"a wait list without a count",
-         queue_,
-         1,
-         {memory_},
-         true,
-         0,
-         {good},
-         true,
-         CL_INVALID_EVENT_WAIT_LIST},
-        {"a null event",
-         queue_,
-         1,
-         {memory_},
-         true,
-         1,
-         {nullptr},
-         true,
-         CL_INVALID_EVENT_WAIT_LIST},
+        {"nothing at all", queue_, 0, nullptr, 0, nullptr, CL_SUCCESS},
+        {"no queue", nullptr, 1, good, 0, nullptr, CL_INVALID_COMMAND_QUEUE},
+        {"a queue that does not share", unshared, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
+        {"a queue that shares elsewhere", elsewhere, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
+        {"a count without a list", queue_, 1, nullptr, 0, nullptr, CL_INVALID_VALUE},
+        {"a list without a count", queue_, 0, good, 0, nullptr, CL_INVALID_VALUE},
+        {"a null object", queue_, 2, withNull.data(), 0, nullptr, CL_INVALID_MEM_OBJECT},
+        {"one not from OpenGL", queue_, 2, withPlain.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"an object twice", queue_, 2, twice.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a wait count without a list", queue_, 1, good, 1, nullptr, CL_INVALID_EVENT_WAIT_LIST},
+        {"a wait list without a count", queue_, 1, good, 0, &events[0], CL_INVALID_EVENT_WAIT_LIST},
+        {"a null event", queue_, 1, good, 1, &events[1], CL_INVALID_EVENT_WAIT_LIST},
     };
     // For release the objects are acquired, so that nothing but the fault in the row can count.
     for (const bool isRelease : {false, true}) {
@@ -123,152 +49,108 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArguments)
         for (const Row& row : rows) {
             SCOPED_TRACE(std::string(isRelease ? "release: " : "acquire: ") + row.what);
             cl_event event = nullptr;
-            EXPECT_EQ(call(row.queue, row.count, row.hasList ? row.memory.data() : nullptr,
-                           row.waitCount, row.hasWaitList ? row.waitList.data() : nullptr, &event),
+            EXPECT_EQ(call(row.queue, row.count, row.memory, row.waitCount, row.waitList, &event),
                       row.error);
             EXPECT_EQ(event, nullptr);
         }
         // Still in the state it was in before all those calls.
-        EXPECT_EQ(isRelease ? release(memory_) : acquire(memory_), CL_SUCCESS);
+        EXPECT_EQ(isRelease ? queue_.release(memory_) : queue_.acquire(memory_), CL_SUCCESS);
     }
-    clReleaseEvent(good);
     clFinish(queue_);
 }
 
 TEST_F(MisuseTest, ObjectsAreAcquiredOnceAndReleasedOnce)
 {
-    EXPECT_EQ(release(memory_), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(acquire(memory_), CL_SUCCESS);
-    EXPECT_EQ(acquire(memory_), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(release(memory_), CL_SUCCESS);
-    EXPECT_EQ(release(memory_), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(queue_.release(memory_), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(queue_.acquire(memory_), CL_SUCCESS);
+    EXPECT_EQ(queue_.acquire(memory_), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
+    EXPECT_EQ(queue_.release(memory_), CL_INVALID_GL_OBJECT);
     clFinish(queue_);
-}
-
-TEST_F(MisuseTest, ObjectsOfAnotherSharingContextAreRefused)
-{
-    cl_context context =
-        clCreateContext(properties(*gl_).data(), 1, &device_, nullptr, nullptr, nullptr);
-    cl_command_queue queue = clCreateCommandQueue(context, device_, 0, nullptr);
-    EXPECT_EQ(clEnqueueAcquireGLObjects(queue, 1, &memory_, 0, nullptr, nullptr),
-              CL_INVALID_CONTEXT);
-    clReleaseCommandQueue(queue);
-    clReleaseContext(context);
 }
 
 TEST_F(MisuseTest, CreationNamesWhatIsWrong)
 {
-    GLuint empty = 0;
-    glGenBuffers(1, &empty);
-    GLuint withoutStorage = 0;
-    glGenBuffers(1, &withoutStorage);
+    const Context plain = makeContext({0});
+    constexpr GLuint kUnknown = 9999;
+    std::array<GLuint, 2> names{};
+    glGenBuffers(2, names.data());
+    const auto [empty, withoutStorage] = names;
     glBindBuffer(GL_ARRAY_BUFFER, withoutStorage);
-    GLuint texture = 0;
-    glGenTextures(1, &texture);
     struct Row {
         const char* what;
-        std::function<cl_mem(cl_int*)> create;
+        cl_context context;
+        cl_mem_flags flags;
+        GLuint name;
         cl_int error;
     };
     const Row rows[] = {
-        {"no context",
-         [&](cl_int* e) { return clCreateFromGLBuffer(nullptr, CL_MEM_READ_WRITE, buffer_, e); },
-         CL_INVALID_CONTEXT},
-        {"a context that does not share",
-         [&](cl_int* e) {
-             return clCreateFromGLBuffer(otherContext_, CL_MEM_READ_WRITE, buffer_, e);
-         },
-         CL_INVALID_CONTEXT},
-        {"flags that OpenGL sharing has no use for",
-         [&](cl_int* e) {
-             return clCreateFromGLBuffer(context_, CL_MEM_ALLOC_HOST_PTR, buffer_, e);
-         },
-         CL_INVALID_VALUE},
-        {"an unknown name",
-         [&](cl_int* e) { return clCreateFromGLBuffer(context_, CL_MEM_READ_WRITE, 9999, e); },
-         CL_INVALID_GL_OBJECT},
-        {"a name without a buffer",
-         [&](cl_int* e) { return clCreateFromGLBuffer(context_, CL_MEM_READ_WRITE, empty, e); },
-         CL_INVALID_GL_OBJECT},
-        {"a buffer without storage",
-         [&](cl_int* e) {
-             return clCreateFromGLBuffer(context_, CL_MEM_READ_WRITE, withoutStorage, e);
-         },
-         CL_INVALID_GL_OBJECT},
-        {"a texture",
-         [&](cl_int* e) {
-             return clCreateFromGLTexture(context_, CL_MEM_READ_WRITE, GL_TEXTURE_2D, 0, texture,
-                                          e);
-         },
-         CL_INVALID_GL_OBJECT},
-        {"a renderbuffer of a context that does not share",
-         [&](cl_int* e) {
-             return clCreateFromGLRenderbuffer(otherContext_, CL_MEM_READ_WRITE, 1, e);
-         },
-         CL_INVALID_CONTEXT},
+        {"no context", nullptr, CL_MEM_READ_WRITE, buffer_, CL_INVALID_CONTEXT},
+        {"a context that does not share", plain, CL_MEM_READ_WRITE, buffer_, CL_INVALID_CONTEXT},
+        {"flags without use", context_, CL_MEM_ALLOC_HOST_PTR, buffer_, CL_INVALID_VALUE},
+        {"an unknown name", context_, CL_MEM_READ_WRITE, kUnknown, CL_INVALID_GL_OBJECT},
+        {"a name without a buffer", context_, CL_MEM_READ_WRITE, empty, CL_INVALID_GL_OBJECT},
+        {"no storage", context_, CL_MEM_READ_WRITE, withoutStorage, CL_INVALID_GL_OBJECT},
     };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.what);
-        cl_int error = CL_SUCCESS;
-        EXPECT_EQ(row.create(&error), nullptr);
-        EXPECT_EQ(error, row.error);
-        EXPECT_EQ(row.create(nullptr), nullptr);
+    cl_int error = CL_SUCCESS;
+    for (const auto& [what, context, flags, name, expected] : rows) {
+        SCOPED_TRACE(what);
+        EXPECT_EQ(clCreateFromGLBuffer(context, flags, name, &error), nullptr);
+        EXPECT_EQ(error, expected);
+        EXPECT_EQ(clCreateFromGLBuffer(context, flags, name, nullptr), nullptr);
     }
-    EXPECT_EQ(glIsBuffer(9999), GL_FALSE);
+    EXPECT_EQ(glIsBuffer(kUnknown), GL_FALSE);
+
+    // Neither is offered.
+    EXPECT_EQ(clCreateFromGLTexture(context_, CL_MEM_READ_WRITE, GL_TEXTURE_2D, 0, 1, &error),
+              nullptr);
+    EXPECT_EQ(error, CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(clCreateFromGLRenderbuffer(plain, CL_MEM_READ_WRITE, 1, &error), nullptr);
+    EXPECT_EQ(error, CL_INVALID_CONTEXT);
 }
 
 TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
 {
-    const auto gl = reinterpret_cast<cl_context_properties>(gl_->handle());
-    const auto display = reinterpret_cast<cl_context_properties>(EglTestContext::display());
+    const cl_context_properties gl = glEntries_.at(1);
+    const cl_context_properties display = glEntries_.at(3);
+    constexpr cl_context_properties kEgl = CL_EGL_DISPLAY_KHR;
     constexpr cl_context_properties kNonsense = 0x5eed;
+    constexpr cl_int kNoShareGroup = CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
     struct Row {
         const char* what;
-        std::vector<cl_context_properties> list;
+        cl_context_properties context;
+        Properties displays;
         cl_int error;
     };
     const Row rows[] = {
-        {"no display", {CL_GL_CONTEXT_KHR, gl}, CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR},
-        {"an unknown context",
-         {CL_GL_CONTEXT_KHR, kNonsense, CL_EGL_DISPLAY_KHR, display},
-         CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR},
-        {"an unknown display",
-         {CL_GL_CONTEXT_KHR, gl, CL_EGL_DISPLAY_KHR, kNonsense},
-         CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR},
-        {"two window systems",
-         {CL_GL_CONTEXT_KHR, gl, CL_EGL_DISPLAY_KHR, display, CL_GLX_DISPLAY_KHR, display},
-         CL_INVALID_OPERATION},
-        {"a window system of elsewhere",
-         {CL_GL_CONTEXT_KHR, gl, CL_WGL_HDC_KHR, display},
-         CL_INVALID_OPERATION},
-        {"a property twice",
-         {CL_GL_CONTEXT_KHR, gl, CL_EGL_DISPLAY_KHR, display, CL_EGL_DISPLAY_KHR, display},
-         CL_INVALID_PROPERTY},
+        {"no display", gl, {}, kNoShareGroup},
+        {"an unknown context", kNonsense, {kEgl, display}, kNoShareGroup},
+        {"an unknown display", gl, {kEgl, kNonsense}, kNoShareGroup},
+        {"two systems", gl, {kEgl, display, CL_GLX_DISPLAY_KHR, display}, CL_INVALID_OPERATION},
+        {"a window system of elsewhere", gl, {CL_WGL_HDC_KHR, display}, CL_INVALID_OPERATION},
+        {"a property twice", gl, {kEgl, display, kEgl, display}, CL_INVALID_PROPERTY},
     };
-    const auto getInfo = reinterpret_cast<clGetGLContextInfoKHR_fn>(
-        clGetExtensionFunctionAddressForPlatform(platform_, "clGetGLContextInfoKHR"));
-    ASSERT_NE(getInfo, nullptr);
     for (const Row& row : rows) {
         SCOPED_TRACE(row.what);
-        std::vector<cl_context_properties> list{CL_CONTEXT_PLATFORM,
-                                                reinterpret_cast<cl_context_properties>(platform_)};
-        list.insert(list.end(), row.list.begin(), row.list.end());
-        list.push_back(0);
+        Properties entries{CL_GL_CONTEXT_KHR, row.context};
+        entries.insert(entries.end(), row.displays.begin(), row.displays.end());
+        const Properties list = properties(entries);
         cl_int error = CL_SUCCESS;
         EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
         EXPECT_EQ(error, row.error);
         cl_device_id device = nullptr;
-        EXPECT_EQ(getInfo(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, sizeof(cl_device_id),
-                          &device, nullptr),
+        EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
+                                        sizeof(cl_device_id), &device, nullptr),
                   row.error);
     }
 }
 
 TEST_F(MisuseTest, QueriesRefuseWhatIsNotShared)
 {
+    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
     cl_gl_object_type type = 0;
     EXPECT_EQ(clGetGLObjectInfo(nullptr, &type, nullptr), CL_INVALID_MEM_OBJECT);
-    EXPECT_EQ(clGetGLObjectInfo(plain_, &type, nullptr), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(clGetGLObjectInfo(plain, &type, nullptr), CL_INVALID_GL_OBJECT);
     EXPECT_EQ(clGetGLTextureInfo(nullptr, CL_GL_TEXTURE_TARGET, 0, nullptr, nullptr),
               CL_INVALID_MEM_OBJECT);
     EXPECT_EQ(clGetGLTextureInfo(memory_, CL_GL_TEXTURE_TARGET, 0, nullptr, nullptr),
@@ -278,25 +160,25 @@ TEST_F(MisuseTest, QueriesRefuseWhatIsNotShared)
 // Gone for OpenGL, or too small by now; OpenCL's object is still an object.
 TEST_F(MisuseTest, BuffersThatOpenGlTookAwayAreRefusedAndHarmless)
 {
-    const GLuint shrunk = makeGlBuffer(numbersFrom(1, kCount * 1000));
-    cl_mem small = share(shrunk);
-    glBindBuffer(GL_ARRAY_BUFFER, shrunk);
-    glBufferData(GL_ARRAY_BUFFER, 16, nullptr, GL_DYNAMIC_DRAW);
-    EXPECT_EQ(acquire(small), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(release(small), CL_INVALID_GL_OBJECT);
+    // Large enough to be unmapped when it is freed.
+    constexpr std::size_t kLarge = 100000;
+    const GLuint shrunk = makeGlBuffer(numbersFrom(1, kLarge));
+    const Memory small = share(shrunk);
+    refill(shrunk, numbersFrom(1, 4));
+    EXPECT_EQ(queue_.acquire(small), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(queue_.release(small), CL_INVALID_GL_OBJECT);
 
-    const GLuint deleted = makeGlBuffer(numbersFrom(1, kCount * 1000));
-    cl_mem orphan = share(deleted);
-    ASSERT_EQ(acquire(orphan), CL_SUCCESS);
+    const GLuint deleted = makeGlBuffer(numbersFrom(1, kLarge));
+    const Memory orphan = share(deleted);
+    ASSERT_EQ(queue_.acquire(orphan), CL_SUCCESS);
     glDeleteBuffers(1, &deleted);
-    EXPECT_EQ(release(orphan), CL_SUCCESS);
-    EXPECT_EQ(acquire(orphan), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(queue_.release(orphan), CL_SUCCESS);
+    EXPECT_EQ(queue_.acquire(orphan), CL_INVALID_GL_OBJECT);
     EXPECT_EQ(glIsBuffer(deleted), GL_FALSE);
 
-    for (cl_mem memory : {small, orphan}) {
-        writeCl(memory, numbersFrom(3, kCount * 1000));
-        EXPECT_EQ(readCl(memory, kCount * 1000), numbersFrom(3, kCount * 1000));
-        clReleaseMemObject(memory);
+    for (cl_mem memory : {cl_mem(small), cl_mem(orphan)}) {
+        queue_.write(memory, numbersFrom(3, kLarge));
+        EXPECT_EQ(queue_.read(memory, kLarge), numbersFrom(3, kLarge));
     }
 }
 

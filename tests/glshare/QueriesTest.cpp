@@ -1,8 +1,6 @@
 // What the application is told about devices, contexts, objects and commands.
 #include "SharingTest.h"
 
-#include <array>
-
 namespace {
 
 using QueriesTest = SharingTest;
@@ -32,12 +30,11 @@ TEST_F(QueriesTest, ExtensionsAreAddedToDeviceAndPlatform)
 
 TEST_F(QueriesTest, EveryFunctionIsFoundByName)
 {
-    const std::array names{"clCreateFromGLBuffer",       "clCreateFromGLTexture",
-                           "clCreateFromGLTexture2D",    "clCreateFromGLTexture3D",
-                           "clCreateFromGLRenderbuffer", "clGetGLObjectInfo",
-                           "clGetGLTextureInfo",         "clEnqueueAcquireGLObjects",
-                           "clEnqueueReleaseGLObjects",  "clGetGLContextInfoKHR"};
-    for (const char* name : names) {
+    for (const char* name :
+         {"clCreateFromGLBuffer", "clCreateFromGLTexture", "clCreateFromGLTexture2D",
+          "clCreateFromGLTexture3D", "clCreateFromGLRenderbuffer", "clGetGLObjectInfo",
+          "clGetGLTextureInfo", "clEnqueueAcquireGLObjects", "clEnqueueReleaseGLObjects",
+          "clGetGLContextInfoKHR"}) {
         EXPECT_NE(clGetExtensionFunctionAddressForPlatform(platform_, name), nullptr) << name;
         EXPECT_NE(clGetExtensionFunctionAddress(name), nullptr) << name;
     }
@@ -52,12 +49,8 @@ TEST_F(QueriesTest, CpuDevicesAreGpusUnlessSwitchedOff)
     const bool isDisguised = isOn("GLSHARE_CPU_AS_GPU");
     const cl_device_type shown = isDisguised ? CL_DEVICE_TYPE_GPU : CL_DEVICE_TYPE_CPU;
     const cl_device_type other = isDisguised ? CL_DEVICE_TYPE_CPU : CL_DEVICE_TYPE_GPU;
-    cl_device_type type = 0;
-    ASSERT_EQ(clGetDeviceInfo(device_, CL_DEVICE_TYPE, sizeof type, &type, nullptr), CL_SUCCESS);
-    if (isDisguised)
-        EXPECT_EQ(type, shown);
-    else
-        EXPECT_NE(type & shown, 0U);
+    const auto type = infoOf<cl_device_type>(clGetDeviceInfo, device_, CL_DEVICE_TYPE);
+    EXPECT_EQ(isDisguised ? type : type & shown, shown);
 
     cl_uint count = 0;
     cl_device_id found = nullptr;
@@ -68,16 +61,12 @@ TEST_F(QueriesTest, CpuDevicesAreGpusUnlessSwitchedOff)
     EXPECT_EQ(clGetDeviceIDs(platform_, CL_DEVICE_TYPE_DEFAULT, 1, &found, &count), CL_SUCCESS);
 
     cl_int error = CL_INVALID_VALUE;
-    cl_context context =
-        clCreateContextFromType(properties(*gl_).data(), shown, nullptr, nullptr, &error);
+    const Context context =
+        clCreateContextFromType(properties().data(), shown, nullptr, nullptr, &error);
     ASSERT_EQ(error, CL_SUCCESS);
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, 10));
-    cl_mem memory = clCreateFromGLBuffer(context, CL_MEM_READ_ONLY, buffer, &error);
-    EXPECT_EQ(error, CL_SUCCESS);
-    clReleaseMemObject(memory);
-    clReleaseContext(context);
+    share(context, buffer_);
     if (isDisguised) {
-        EXPECT_EQ(clCreateContextFromType(properties(*gl_).data(), other, nullptr, nullptr, &error),
+        EXPECT_EQ(clCreateContextFromType(properties().data(), other, nullptr, nullptr, &error),
                   nullptr);
         EXPECT_EQ(error, CL_DEVICE_NOT_FOUND);
     }
@@ -85,31 +74,27 @@ TEST_F(QueriesTest, CpuDevicesAreGpusUnlessSwitchedOff)
 
 TEST_F(QueriesTest, GlContextInfoNamesTheDevices)
 {
-    const auto list = properties(*gl_);
-    std::size_t size = 0;
-    cl_device_id device = nullptr;
-    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
-                                    sizeof(cl_device_id), &device, &size),
-              CL_SUCCESS);
-    EXPECT_EQ(device, device_);
-    EXPECT_EQ(size, sizeof(cl_device_id));
-    device = nullptr;
-    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR,
-                                    sizeof(cl_device_id), &device, &size),
-              CL_SUCCESS);
-    EXPECT_EQ(device, device_);
-    EXPECT_EQ(
-        clGetGLContextInfoKHR(list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR, 1, &device, nullptr),
-        CL_INVALID_VALUE);
-    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device,
-                                    nullptr),
-              CL_INVALID_VALUE);
+    const auto get = [list = properties()](cl_gl_context_info name, std::size_t room,
+                                           cl_device_id* device, std::size_t* size) {
+        return clGetGLContextInfoKHR(list.data(), name, room, device, size);
+    };
+    for (const cl_gl_context_info name : std::vector<cl_gl_context_info>{
+             CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, CL_DEVICES_FOR_GL_CONTEXT_KHR}) {
+        SCOPED_TRACE(name);
+        std::size_t size = 0;
+        cl_device_id device = nullptr;
+        EXPECT_EQ(get(name, sizeof(cl_device_id), &device, &size), CL_SUCCESS);
+        EXPECT_EQ(device, device_);
+        EXPECT_EQ(size, sizeof(cl_device_id));
+        EXPECT_EQ(get(name, 1, &device, nullptr), CL_INVALID_VALUE);
+        EXPECT_EQ(get(CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device, nullptr), CL_INVALID_VALUE);
+    }
 }
 
 TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
 {
-    const auto list = properties(*gl_);
-    std::vector<cl_context_properties> seen(list.size());
+    const Properties list = properties();
+    Properties seen(list.size());
     std::size_t size = 0;
     EXPECT_EQ(clGetContextInfo(context_, CL_CONTEXT_PROPERTIES,
                                seen.size() * sizeof(cl_context_properties), seen.data(), &size),
@@ -117,48 +102,34 @@ TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
     EXPECT_EQ(size, list.size() * sizeof(cl_context_properties));
     EXPECT_EQ(seen, list);
 
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, 10));
-    cl_mem memory = share(buffer, CL_MEM_READ_ONLY);
+    const Memory memory = share(context_, buffer_, CL_MEM_READ_ONLY);
     cl_gl_object_type type = 0;
     cl_GLuint name = 0;
     EXPECT_EQ(clGetGLObjectInfo(memory, &type, &name), CL_SUCCESS);
-    EXPECT_EQ(type, static_cast<cl_gl_object_type>(CL_GL_OBJECT_BUFFER));
-    EXPECT_EQ(name, buffer);
-    cl_mem_flags flags = 0;
-    void* host = &flags;
-    std::size_t bytes = 0;
-    clGetMemObjectInfo(memory, CL_MEM_FLAGS, sizeof flags, &flags, nullptr);
-    clGetMemObjectInfo(memory, CL_MEM_HOST_PTR, sizeof host, static_cast<void*>(&host), nullptr);
-    clGetMemObjectInfo(memory, CL_MEM_SIZE, sizeof bytes, &bytes, nullptr);
-    EXPECT_EQ(flags, static_cast<cl_mem_flags>(CL_MEM_READ_ONLY));
-    EXPECT_EQ(host, nullptr);
-    EXPECT_EQ(bytes, 10 * sizeof(cl_int));
-    clReleaseMemObject(memory);
+    EXPECT_EQ(type, cl_gl_object_type{CL_GL_OBJECT_BUFFER});
+    EXPECT_EQ(name, buffer_);
+    EXPECT_EQ(infoOf<cl_mem_flags>(clGetMemObjectInfo, memory, CL_MEM_FLAGS),
+              cl_mem_flags{CL_MEM_READ_ONLY});
+    EXPECT_EQ(infoOf<void*>(clGetMemObjectInfo, memory, CL_MEM_HOST_PTR), nullptr);
+    EXPECT_EQ(infoOf<std::size_t>(clGetMemObjectInfo, memory, CL_MEM_SIZE),
+              count_ * sizeof(cl_int));
 }
 
 TEST_F(QueriesTest, EventsNameTheirCommand)
 {
-    const GLuint buffer = makeGlBuffer(numbersFrom(1, 10));
-    cl_mem memory = share(buffer);
-    std::array<cl_event, 2> events{};
-    EXPECT_EQ(acquire(memory, {}, &events[0]), CL_SUCCESS);
-    EXPECT_EQ(release(memory, {}, &events[1]), CL_SUCCESS);
+    Event acquired;
+    Event released;
+    EXPECT_EQ(queue_.acquire(memory_, {}, &acquired), CL_SUCCESS);
+    EXPECT_EQ(queue_.release(memory_, {}, &released), CL_SUCCESS);
     clFinish(queue_);
-    const std::array<cl_command_type, 2> expected{CL_COMMAND_ACQUIRE_GL_OBJECTS,
-                                                  CL_COMMAND_RELEASE_GL_OBJECTS};
-    for (std::size_t i = 0; i < events.size(); ++i) {
-        clRetainEvent(events.at(i));
-        clReleaseEvent(events.at(i));
-        cl_command_type type = 0;
-        cl_command_queue queue = nullptr;
-        clGetEventInfo(events.at(i), CL_EVENT_COMMAND_TYPE, sizeof type, &type, nullptr);
-        clGetEventInfo(events.at(i), CL_EVENT_COMMAND_QUEUE, sizeof(cl_command_queue),
-                       static_cast<void*>(&queue), nullptr);
-        EXPECT_EQ(type, expected.at(i));
-        EXPECT_EQ(queue, queue_);
-        clReleaseEvent(events.at(i));
-    }
-    clReleaseMemObject(memory);
+    const auto expectCommand = [this](const Event& event, cl_command_type type) {
+        clRetainEvent(event);
+        clReleaseEvent(event);
+        EXPECT_EQ(infoOf<cl_command_type>(clGetEventInfo, event, CL_EVENT_COMMAND_TYPE), type);
+        EXPECT_EQ(infoOf<cl_command_queue>(clGetEventInfo, event, CL_EVENT_COMMAND_QUEUE), queue_);
+    };
+    expectCommand(acquired, CL_COMMAND_ACQUIRE_GL_OBJECTS);
+    expectCommand(released, CL_COMMAND_RELEASE_GL_OBJECTS);
 }
 
 } // namespace

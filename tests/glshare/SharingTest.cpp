@@ -12,32 +12,105 @@ Numbers numbersFrom(cl_int first, std::size_t count)
     return numbers;
 }
 
+cl_int statusOf(const Event& event)
+{
+    return infoOf<cl_int>(clGetEventInfo, event, CL_EVENT_COMMAND_EXECUTION_STATUS);
+}
+
+void onOtherThread(const std::function<void()>& work)
+{
+    std::thread(work).join();
+}
+
+namespace {
+
+// OpenCL wants no pointer to what is empty or not wanted.
+const cl_event* eventsOf(const WaitList& waitList)
+{
+    return waitList.empty() ? nullptr : waitList.data();
+}
+
+cl_event* placeOf(Event* event)
+{
+    return event == nullptr ? nullptr : event->place();
+}
+
+} // namespace
+
+Queue::Queue(cl_context context, cl_device_id device, cl_command_queue_properties kind)
+    : queue_(clCreateCommandQueue(context, device, kind, nullptr))
+{
+    EXPECT_NE(queue_, nullptr);
+}
+
+cl_int Queue::share(decltype(&clEnqueueAcquireGLObjects) call, cl_mem memory,
+                    const WaitList& waitList, Event* event) const
+{
+    return call(queue_, 1, &memory, static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
+                placeOf(event));
+}
+
+void Queue::fill(cl_mem memory, cl_int value, const WaitList& waitList, Event* event) const
+{
+    const auto size = infoOf<std::size_t>(clGetMemObjectInfo, memory, CL_MEM_SIZE);
+    EXPECT_EQ(clEnqueueFillBuffer(queue_, memory, &value, sizeof value, 0, size,
+                                  static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
+                                  placeOf(event)),
+              CL_SUCCESS);
+}
+
+Numbers Queue::read(cl_mem memory, std::size_t count) const
+{
+    Numbers numbers(count);
+    EXPECT_EQ(clEnqueueReadBuffer(queue_, memory, CL_TRUE, 0, count * sizeof(cl_int),
+                                  numbers.data(), 0, nullptr, nullptr),
+              CL_SUCCESS);
+    return numbers;
+}
+
+void Queue::write(cl_mem memory, const Numbers& numbers) const
+{
+    EXPECT_EQ(clEnqueueWriteBuffer(queue_, memory, CL_TRUE, 0, numbers.size() * sizeof(cl_int),
+                                   numbers.data(), 0, nullptr, nullptr),
+              CL_SUCCESS);
+}
+
+void Queue::rewrite(cl_mem memory, const Numbers& before, const Numbers& after) const
+{
+    ASSERT_EQ(acquire(memory), CL_SUCCESS);
+    EXPECT_EQ(read(memory, before.size()), before);
+    write(memory, after);
+    ASSERT_EQ(release(memory), CL_SUCCESS);
+    clFinish(queue_);
+}
+
 void SharingTest::SetUp()
+{
+    openGl();
+    if (IsSkipped() || HasFatalFailure())
+        return;
+    if (clGetPlatformIDs(1, &platform_, nullptr) != CL_SUCCESS)
+        GTEST_SKIP() << "no OpenCL runtime here";
+    ASSERT_NE(extensionsOf(platform_).find("cl_khr_gl_sharing"), std::string::npos)
+        << "the layer is not active";
+    ASSERT_EQ(clGetDeviceIDs(platform_, CL_DEVICE_TYPE_ALL, 1, &device_, nullptr), CL_SUCCESS);
+    context_ = makeContext();
+    ASSERT_NE(context_, nullptr);
+    queue_ = Queue(context_, device_);
+    buffer_ = makeGlBuffer(from(1));
+    glFinish();
+    memory_ = share(buffer_);
+}
+
+void SharingTest::openGl()
 {
     if (EglTestContext::display() == EGL_NO_DISPLAY)
         GTEST_SKIP() << "EGL has no display without a window system here";
     gl_ = std::make_unique<EglTestContext>();
     if (!gl_->valid())
         GTEST_SKIP() << "no OpenGL 4.5 here";
-    if (clGetPlatformIDs(1, &platform_, nullptr) != CL_SUCCESS)
-        GTEST_SKIP() << "no OpenCL runtime here";
-    ASSERT_NE(extensionsOf(platform_).find("cl_khr_gl_sharing"), std::string::npos)
-        << "the layer is not active";
-    ASSERT_EQ(clGetDeviceIDs(platform_, CL_DEVICE_TYPE_ALL, 1, &device_, nullptr), CL_SUCCESS);
     gl_->makeCurrent();
-    cl_int error = CL_SUCCESS;
-    context_ = clCreateContext(properties(*gl_).data(), 1, &device_, nullptr, nullptr, &error);
-    ASSERT_EQ(error, CL_SUCCESS);
-    queue_ = clCreateCommandQueue(context_, device_, 0, &error);
-    ASSERT_EQ(error, CL_SUCCESS);
-}
-
-void SharingTest::TearDown()
-{
-    if (queue_ != nullptr)
-        clReleaseCommandQueue(queue_);
-    if (context_ != nullptr)
-        clReleaseContext(context_);
+    glEntries_ = gl_->entries();
 }
 
 bool SharingTest::isOn(const char* variable)
@@ -55,39 +128,51 @@ std::string SharingTest::extensionsOf(cl_platform_id platform)
     return text.c_str();
 }
 
-glshare_counters SharingTest::counters()
+Properties SharingTest::properties(const Properties& entries) const
 {
-    cl_platform_id platform = nullptr;
-    clGetPlatformIDs(1, &platform, nullptr);
-    const auto getCounters = reinterpret_cast<glshare_get_counters_fn>(
-        clGetExtensionFunctionAddressForPlatform(platform, GLSHARE_GET_COUNTERS_NAME));
-    glshare_counters result{};
-    if (getCounters == nullptr)
-        ADD_FAILURE() << "the layer offers no counters";
-    else
-        getCounters(&result);
-    return result;
+    Properties list{CL_CONTEXT_PLATFORM, reinterpret_cast<cl_context_properties>(platform_)};
+    list.insert(list.end(), entries.begin(), entries.end());
+    list.push_back(0);
+    return list;
 }
 
-std::vector<cl_context_properties> SharingTest::properties(const EglTestContext& gl) const
+Context SharingTest::makeContext(const Properties& list) const
 {
-    return {CL_CONTEXT_PLATFORM,
-            reinterpret_cast<cl_context_properties>(platform_),
-            CL_GL_CONTEXT_KHR,
-            reinterpret_cast<cl_context_properties>(gl.handle()),
-            CL_EGL_DISPLAY_KHR,
-            reinterpret_cast<cl_context_properties>(EglTestContext::display()),
-            0};
+    cl_int error = CL_INVALID_VALUE;
+    Context context = clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error);
+    EXPECT_EQ(error, CL_SUCCESS);
+    return context;
 }
 
 GLuint SharingTest::makeGlBuffer(const Numbers& numbers)
 {
     GLuint buffer = 0;
     glGenBuffers(1, &buffer);
+    refill(buffer, numbers);
+    return buffer;
+}
+
+Memory SharingTest::share(cl_context context, GLuint buffer, cl_mem_flags flags)
+{
+    cl_int error = CL_INVALID_VALUE;
+    Memory memory = clCreateFromGLBuffer(context, flags, buffer, &error);
+    EXPECT_EQ(error, CL_SUCCESS);
+    EXPECT_NE(memory, nullptr);
+    return memory;
+}
+
+void SharingTest::refill(GLuint buffer, const Numbers& numbers)
+{
     glBindBuffer(GL_ARRAY_BUFFER, buffer);
     glBufferData(GL_ARRAY_BUFFER, static_cast<GLsizeiptr>(numbers.size() * sizeof(cl_int)),
                  numbers.data(), GL_DYNAMIC_DRAW);
-    return buffer;
+}
+
+void SharingTest::redraw(GLuint buffer, const Numbers& numbers)
+{
+    glBindBuffer(GL_ARRAY_BUFFER, buffer);
+    glBufferSubData(GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(numbers.size() * sizeof(cl_int)),
+                    numbers.data());
 }
 
 Numbers SharingTest::readGl(GLuint buffer, std::size_t count)
@@ -97,56 +182,4 @@ Numbers SharingTest::readGl(GLuint buffer, std::size_t count)
     glGetBufferSubData(GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(count * sizeof(cl_int)),
                        numbers.data());
     return numbers;
-}
-
-cl_mem SharingTest::share(GLuint buffer, cl_mem_flags flags)
-{
-    cl_int error = CL_SUCCESS;
-    cl_mem memory = clCreateFromGLBuffer(context_, flags, buffer, &error);
-    EXPECT_EQ(error, CL_SUCCESS);
-    EXPECT_NE(memory, nullptr);
-    return memory;
-}
-
-cl_int SharingTest::acquire(cl_mem memory, const std::vector<cl_event>& waitList, cl_event* event)
-{
-    return clEnqueueAcquireGLObjects(queue_, 1, &memory, static_cast<cl_uint>(waitList.size()),
-                                     waitList.empty() ? nullptr : waitList.data(), event);
-}
-
-cl_int SharingTest::release(cl_mem memory, const std::vector<cl_event>& waitList, cl_event* event)
-{
-    return clEnqueueReleaseGLObjects(queue_, 1, &memory, static_cast<cl_uint>(waitList.size()),
-                                     waitList.empty() ? nullptr : waitList.data(), event);
-}
-
-Numbers SharingTest::readCl(cl_mem memory, std::size_t count)
-{
-    Numbers numbers(count);
-    EXPECT_EQ(clEnqueueReadBuffer(queue_, memory, CL_TRUE, 0, count * sizeof(cl_int),
-                                  numbers.data(), 0, nullptr, nullptr),
-              CL_SUCCESS);
-    return numbers;
-}
-
-void SharingTest::writeCl(cl_mem memory, const Numbers& numbers)
-{
-    EXPECT_EQ(clEnqueueWriteBuffer(queue_, memory, CL_TRUE, 0, numbers.size() * sizeof(cl_int),
-                                   numbers.data(), 0, nullptr, nullptr),
-              CL_SUCCESS);
-}
-
-cl_int SharingTest::statusOf(cl_event event)
-{
-    cl_int status = CL_QUEUED;
-    EXPECT_EQ(
-        clGetEventInfo(event, CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status, &status, nullptr),
-        CL_SUCCESS);
-    return status;
-}
-
-void SharingTest::onOtherThread(const std::function<void()>& work)
-{
-    std::thread thread(work);
-    thread.join();
 }
