@@ -28,40 +28,30 @@ TEST(DeviceMemory, KeepsThePeakWhenMemoryIsGivenBack)
     EXPECT_EQ(deviceMemoryUse().offsetBytes, 100u);
 }
 
-// Two threads meet here again and again. They spin, since a lost peak takes both within
-// nanoseconds, and a thread that slept comes late.
-class SpinningMeeting {
-public:
-    void arriveAndWait()
-    {
-        const unsigned int everybody = (fArrived.fetch_add(1) / 2 + 1) * 2;
-        while (fArrived.load() < everybody) {
-            std::this_thread::yield();
-        }
-    }
-
-private:
-    std::atomic<unsigned int> fArrived = 0;
-};
-
 TEST(DeviceMemory, LosesNoByteAndNoPeakBetweenThreads)
 {
     constexpr unsigned int roundCount = 100'000;
     const std::size_t peakBefore = deviceMemoryUse().peakBytes;
     monitor().AddToDeviceMemory(peakBefore - deviceMemoryUse().currentBytes);
 
-    SpinningMeeting meeting;
+    // The threads meet again and again. They spin, since a lost peak takes both within nanoseconds,
+    // and a thread that slept comes late.
+    std::atomic<unsigned int> arrived = 0;
+    const auto meet = [&] {
+        const unsigned int everybody = (arrived.fetch_add(1) / 2 + 1) * 2;
+        while (arrived.load() < everybody) {
+            std::this_thread::yield();
+        }
+    };
     unsigned int lostPeaks = 0;
     const auto addTogether = [&](bool checks) {
         for (unsigned int round = 0; round < roundCount; ++round) {
-            meeting.arriveAndWait();
+            meet();
             monitor().AddToDeviceMemory(3);
-            meeting.arriveAndWait();
+            meet();
             // Both have added, so what is in use now is the peak, whoever noted it.
             const DeviceMemoryUse use = deviceMemoryUse();
-            if (checks && use.peakBytes != use.currentBytes) {
-                ++lostPeaks;
-            }
+            lostPeaks += checks && use.peakBytes != use.currentBytes ? 1 : 0;
         }
     };
     std::jthread other(addTogether, false);

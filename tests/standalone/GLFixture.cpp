@@ -1,11 +1,9 @@
 #include "GLFixture.h"
 
-#include <QDeadlineTimer>
+#include <QtCore/qtestsupport_core.h>
 
 #include <dlfcn.h>
 #include <link.h>
-
-#include <chrono>
 
 namespace {
 
@@ -14,26 +12,14 @@ int argumentCount = 1;
 char programName[] = "vyra-host-gl-tests";
 char* arguments[] = {programName, nullptr};
 
-constexpr auto windowTimeout = std::chrono::seconds(20);
-
-// Keeps what is loaded now until the process ends: what the static objects of a driver hold reads
-// as leaked once the driver is unloaded.
-void keepModulesLoaded()
-{
-    dl_iterate_phdr(
-        [](dl_phdr_info* module, std::size_t, void*) {
-            dlopen(module->dlpi_name, RTLD_NOLOAD | RTLD_NODELETE | RTLD_LAZY);
-            return 0;
-        },
-        nullptr);
-}
+constexpr int windowTimeoutMs = 20'000;
 
 } // namespace
 
 std::string nameOf(const testing::TestParamInfo<GLKind>& info)
 {
-    return std::string(info.param.isEGL() ? "Egl" : "Glx") +
-           (info.param.windowed ? "Window" : "Offscreen");
+    const auto& [integration, windowed] = info.param;
+    return integration + (windowed ? "_window" : "_offscreen");
 }
 
 void GLTest::SetUp()
@@ -41,24 +27,38 @@ void GLTest::SetUp()
     if (qEnvironmentVariableIsEmpty("DISPLAY")) {
         GTEST_SKIP() << "no display";
     }
+    const auto& [integration, windowed] = GetParam();
     qputenv("QT_QPA_PLATFORM", "xcb");
-    qputenv("QT_XCB_GL_INTEGRATION", GetParam().integration);
+    qputenv("QT_XCB_GL_INTEGRATION", integration.c_str());
     fApplication = std::make_unique<QGuiApplication>(argumentCount, arguments);
-    if (GetParam().windowed) {
-        openWindow();
+    if (windowed) {
+        fWindow = std::make_unique<QOpenGLWindow>();
+        fWindow->resize(64, 64);
+        fWindow->show();
+        if (!QTest::qWaitFor([this] { return fWindow->isValid(); }, windowTimeoutMs)) {
+            GTEST_SKIP() << "no OpenGL window on this display";
+        }
     } else {
-        createOffscreen();
+        fSurface = std::make_unique<QOffscreenSurface>();
+        fSurface->create();
+        fContext = std::make_unique<QOpenGLContext>();
+        if (!fSurface->isValid() || !fContext->create()) {
+            GTEST_SKIP() << "no OpenGL context on this display";
+        }
     }
-    if (!IsSkipped()) {
-        makeCurrent();
-    }
+    makeCurrent();
 }
 
-void GLTest::TearDown()
+// Keeps what is loaded now until the process ends: what the static objects of a driver hold reads
+// as leaked once the driver is unloaded.
+GLTest::~GLTest()
 {
-    keepModulesLoaded();
-    // A context goes before the surface that it is current on.
-    fContext.reset();
+    dl_iterate_phdr(
+        [](dl_phdr_info* module, std::size_t, void*) {
+            dlopen(module->dlpi_name, RTLD_NOLOAD | RTLD_NODELETE | RTLD_LAZY);
+            return 0;
+        },
+        nullptr);
 }
 
 QOpenGLContext& GLTest::context() const
@@ -72,29 +72,5 @@ void GLTest::makeCurrent() const
         fWindow->makeCurrent();
     } else {
         fContext->makeCurrent(fSurface.get());
-    }
-}
-
-void GLTest::openWindow()
-{
-    fWindow = std::make_unique<QOpenGLWindow>();
-    fWindow->resize(64, 64);
-    fWindow->show();
-    const QDeadlineTimer deadline(windowTimeout);
-    while (!fWindow->isValid() && !deadline.hasExpired()) {
-        QCoreApplication::processEvents(QEventLoop::WaitForMoreEvents, 100);
-    }
-    if (!fWindow->isValid()) {
-        GTEST_SKIP() << "no OpenGL window on this display";
-    }
-}
-
-void GLTest::createOffscreen()
-{
-    fSurface = std::make_unique<QOffscreenSurface>();
-    fSurface->create();
-    fContext = std::make_unique<QOpenGLContext>();
-    if (!fSurface->isValid() || !fContext->create()) {
-        GTEST_SKIP() << "no OpenGL context on this display";
     }
 }

@@ -9,30 +9,23 @@
 #include <gtest/gtest.h>
 
 #include <memory>
-#include <ostream>
 #include <string>
-#include <string_view>
+#include <tuple>
 
-struct GLKind {
-    // QT_XCB_GL_INTEGRATION: which window-system interface Qt uses on X.
-    const char* integration;
-    bool windowed;
+// QT_XCB_GL_INTEGRATION, which says what interface Qt uses on X, and whether there is a window.
+using GLKind = std::tuple<std::string, bool>;
 
-    bool isEGL() const { return std::string_view(integration) == "xcb_egl"; }
-    friend void PrintTo(const GLKind& kind, std::ostream* output) { *output << kind.integration; }
-};
-
+// Every kind, to instantiate a test with, and what it is called.
+inline const auto allGLKinds = testing::Combine(
+    testing::Values(std::string("xcb_glx"), std::string("xcb_egl")), testing::Bool());
 std::string nameOf(const testing::TestParamInfo<GLKind>& info);
-
-// Every kind, to instantiate a test with.
-inline constexpr GLKind allGLKinds[] = {
-    {"xcb_glx", true}, {"xcb_glx", false}, {"xcb_egl", true}, {"xcb_egl", false}};
 
 class GLTest : public testing::TestWithParam<GLKind> {
 protected:
+    ~GLTest() override;
+
     // Skips the test on a machine without display or OpenGL.
     void SetUp() override;
-    void TearDown() override;
 
     // The context that is current after SetUp; the window's when there is one.
     QOpenGLContext& context() const;
@@ -41,9 +34,7 @@ protected:
     void makeCurrent() const;
 
 private:
-    void openWindow();
-    void createOffscreen();
-
+    // A context goes before the surface that it is current on, the application last.
     std::unique_ptr<QGuiApplication> fApplication;
     std::unique_ptr<QOpenGLWindow> fWindow;
     std::unique_ptr<QOffscreenSurface> fSurface;

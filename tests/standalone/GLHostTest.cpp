@@ -5,11 +5,10 @@
 
 #include "standalone/GLHost.h"
 
+#include <CL/cl.h>
 #include <QOpenGLExtraFunctions>
 #include <QOpenGLShaderProgram>
 #include <QOpenGLVertexArrayObject>
-
-#include <dlfcn.h>
 
 #include <atomic>
 #include <chrono>
@@ -22,7 +21,6 @@ namespace {
 using namespace std::chrono_literals;
 using Clock = std::chrono::steady_clock;
 
-constexpr unsigned int gpuCommandsComplete = GL_SYNC_GPU_COMMANDS_COMPLETE;
 constexpr std::uint64_t aSecondNs = 1'000'000'000;
 
 // The result of `function`, run on a thread that has no OpenGL context.
@@ -55,21 +53,16 @@ protected:
         }
     }
 
-    void TearDown() override
-    {
-        fHost.reset();
-        GLTest::TearDown();
-    }
-
     static GLFunctionTable& table() { return *GLFunctionTable::fpGlobalFunctionTable; }
+    static GLsync makeFence() { return table().glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0); }
     QOpenGLExtraFunctions& gl() const { return *context().extraFunctions(); }
     bool isSync(GLsync sync) const { return gl().glIsSync(sync) == GL_TRUE; }
 
     std::optional<GLHost> fHost;
 };
 
-class GLHostAnyContext : public GLHostTest {};
-INSTANTIATE_TEST_SUITE_P(Contexts, GLHostAnyContext, testing::ValuesIn(allGLKinds), nameOf);
+using GLHostAnyContext = GLHostTest;
+INSTANTIATE_TEST_SUITE_P(Contexts, GLHostAnyContext, allGLKinds, nameOf);
 
 TEST_P(GLHostAnyContext, RegistersWhileItLivesAndOnItsThreadOnly)
 {
@@ -88,7 +81,7 @@ TEST_P(GLHostAnyContext, RegistersWhileItLivesAndOnItsThreadOnly)
 
 TEST_P(GLHostAnyContext, FencesPassBetweenTheRendererAndForeignThreads)
 {
-    const GLsync ours = table().glFenceSync(gpuCommandsComplete, 0);
+    const GLsync ours = makeFence();
     ASSERT_TRUE(isSync(ours));
     gl().glFlush();
     const unsigned int waited = onForeignThread([ours] {
@@ -100,8 +93,7 @@ TEST_P(GLHostAnyContext, FencesPassBetweenTheRendererAndForeignThreads)
     EXPECT_FALSE(isSync(ours)) << "not deleted";
 
     // The other way round, without a flush: a foreign thread has no context to flush.
-    const GLsync theirs =
-        onForeignThread([] { return table().glFenceSync(gpuCommandsComplete, 0); });
+    const GLsync theirs = onForeignThread(makeFence);
     ASSERT_TRUE(isSync(theirs));
     table().glWaitSync(theirs, 0, GL_TIMEOUT_IGNORED);
     EXPECT_TRUE(isSignalled(table().glClientWaitSync(theirs, 0, 10 * aSecondNs)));
@@ -111,32 +103,19 @@ TEST_P(GLHostAnyContext, FencesPassBetweenTheRendererAndForeignThreads)
 }
 
 // A machine's window system has no say in what follows.
-class GLHostOnce : public GLHostTest {
-protected:
-    // Draws for at least `duration`, as far as the GPU is concerned, behind all earlier commands.
-    void drawFor(std::chrono::milliseconds duration);
+using GLHostOnce = GLHostTest;
+INSTANTIATE_TEST_SUITE_P(Contexts, GLHostOnce, testing::Values(GLKind("xcb_glx", true)), nameOf);
 
-private:
-    void draw(float rounds);
-
-    QOpenGLShaderProgram fProgram;
-    QOpenGLVertexArrayObject fVertices;
-};
-INSTANTIATE_TEST_SUITE_P(Contexts, GLHostOnce, testing::Values(GLKind{"xcb_glx", true}), nameOf);
-
-void GLHostOnce::draw(float rounds)
+// Draws for at least `duration`, as far as the GPU is concerned, behind all earlier commands.
+void drawFor(QOpenGLExtraFunctions& gl, std::chrono::milliseconds duration)
 {
-    fProgram.setUniformValue("rounds", rounds);
-    gl().glDrawArrays(GL_TRIANGLES, 0, 3);
-}
-
-void GLHostOnce::drawFor(std::chrono::milliseconds duration)
-{
-    ASSERT_TRUE(fProgram.addShaderFromSourceCode(QOpenGLShader::Vertex, R"(#version 130
+    QOpenGLShaderProgram program;
+    QOpenGLVertexArrayObject vertices;
+    ASSERT_TRUE(program.addShaderFromSourceCode(QOpenGLShader::Vertex, R"(#version 130
         void main() {
             gl_Position = vec4(4 * (gl_VertexID & 1) - 1, 2 * (gl_VertexID & 2) - 1, 0, 1);
         })"));
-    ASSERT_TRUE(fProgram.addShaderFromSourceCode(QOpenGLShader::Fragment, R"(#version 130
+    ASSERT_TRUE(program.addShaderFromSourceCode(QOpenGLShader::Fragment, R"(#version 130
         uniform float rounds;
         out vec4 color;
         void main() {
@@ -144,24 +123,27 @@ void GLHostOnce::drawFor(std::chrono::milliseconds duration)
             for (float i = 0.0; i < rounds; i += 1.0) x = sin(x + i);
             color = vec4(x);
         })"));
-    ASSERT_TRUE(fProgram.link() && fProgram.bind() && fVertices.create());
-    fVertices.bind();
-
-    // How long a round takes depends on the machine: double until it is long enough.
+    ASSERT_TRUE(program.link() && program.bind() && vertices.create());
+    vertices.bind();
     float rounds = 100;
+    const auto draw = [&] {
+        program.setUniformValue("rounds", rounds);
+        gl.glDrawArrays(GL_TRIANGLES, 0, 3);
+    };
+    // How long a round takes depends on the machine: double until it is long enough.
     for (auto taken = Clock::duration::zero(); taken < duration; rounds *= 2) {
         const auto start = Clock::now();
-        draw(rounds);
-        gl().glFinish();
+        draw();
+        gl.glFinish();
         taken = Clock::now() - start;
     }
-    draw(rounds);
+    draw();
 }
 
 TEST_P(GLHostOnce, ForeignWaitsTimeOutAndShareTheHiddenContext)
 {
-    ASSERT_NO_FATAL_FAILURE(drawFor(500ms));
-    const GLsync fence = table().glFenceSync(gpuCommandsComplete, 0);
+    ASSERT_NO_FATAL_FAILURE(drawFor(gl(), 500ms));
+    const GLsync fence = makeFence();
     gl().glFlush();
     const auto begun = Clock::now();
     const auto timedOut = [fence](std::uint64_t timeoutNs) {
@@ -177,8 +159,7 @@ TEST_P(GLHostOnce, ForeignWaitsTimeOutAndShareTheHiddenContext)
         table().glWaitSync(fence, 0, GL_TIMEOUT_IGNORED);
         waiting = false;
     });
-    const GLsync other =
-        onForeignThread([] { return table().glFenceSync(gpuCommandsComplete, 0); });
+    const GLsync other = onForeignThread(makeFence);
     EXPECT_TRUE(waiting.load()) << "the fence came too late";
     waiter.join();
     EXPECT_FALSE(onForeignThread([&] { return timedOut(0); })) << "the wait ended too early";
@@ -192,107 +173,54 @@ TEST_P(GLHostOnce, ContextsOfOtherShareGroupsGoThroughTheHiddenOne)
     surface.create();
     QOpenGLContext stranger;
     ASSERT_TRUE(stranger.create() && stranger.makeCurrent(&surface));
-    const GLsync fence = table().glFenceSync(gpuCommandsComplete, 0);
+    const GLsync fence = makeFence();
     EXPECT_EQ(QOpenGLContext::currentContext(), &stranger);
     makeCurrent();
     EXPECT_TRUE(isSync(fence)) << "made in a context that the renderer cannot see";
     table().glDeleteSync(fence);
 }
 
-// An OpenCL context of any device, for the sake of its user events. The runtime is opened as the
-// library opens it, since the host must find the runtime that is there.
-class OpenCLEvents {
-public:
-    OpenCLEvents() : fLibrary(dlopen("libOpenCL.so.1", RTLD_NOW))
-    {
-        cl_platform_id platform = nullptr;
-        cl_device_id device = nullptr;
-        if (fLibrary == nullptr ||
-            entry<decltype(clGetPlatformIDs)>("clGetPlatformIDs")(1, &platform, nullptr) != 0 ||
-            entry<decltype(clGetDeviceIDs)>("clGetDeviceIDs")(platform, CL_DEVICE_TYPE_ALL, 1,
-                                                              &device, nullptr) != 0) {
-            return;
-        }
-        fContext = entry<decltype(clCreateContext)>("clCreateContext")(nullptr, 1, &device, nullptr,
-                                                                       nullptr, nullptr);
-    }
-
-    ~OpenCLEvents()
-    {
-        if (fContext != nullptr) {
-            entry<decltype(clReleaseContext)>("clReleaseContext")(fContext);
-        }
-    }
-
-    OpenCLEvents(const OpenCLEvents&) = delete;
-    OpenCLEvents& operator=(const OpenCLEvents&) = delete;
-
-    cl_context context() const { return fContext; }
-
-    cl_event create() const
-    {
-        return entry<decltype(clCreateUserEvent)>("clCreateUserEvent")(fContext, nullptr);
-    }
-
-    void end(cl_event event, cl_int status) const
-    {
-        entry<decltype(clSetUserEventStatus)>("clSetUserEventStatus")(event, status);
-    }
-
-    void release(cl_event event) const { entry<decltype(clReleaseEvent)>("clReleaseEvent")(event); }
-
-private:
-    template <class Function>
-    Function* entry(const char* name) const
-    {
-        return reinterpret_cast<Function*>(dlsym(fLibrary, name));
-    }
-
-    void* fLibrary;
-    cl_context fContext = nullptr;
-};
-
 TEST_P(GLHostOnce, SyncsFromCLEventsFollowTheEvent)
 {
-    const OpenCLEvents openCL;
-    if (openCL.context() == nullptr) {
+    cl_platform_id platform = nullptr;
+    cl_device_id device = nullptr;
+    if (clGetPlatformIDs(1, &platform, nullptr) != CL_SUCCESS ||
+        clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 1, &device, nullptr) != CL_SUCCESS) {
         GTEST_SKIP() << "no OpenCL device";
     }
-    const cl_event event = openCL.create();
+    const cl_context openCL = clCreateContext(nullptr, 1, &device, nullptr, nullptr, nullptr);
+    const cl_event event = clCreateUserEvent(openCL, nullptr);
     const auto createSync = [&](cl_event of) {
-        return table().glCreateSyncFromCLeventARB(openCL.context(), of, 0);
+        return table().glCreateSyncFromCLeventARB(openCL, of, 0);
     };
-    const auto signalled = [](GLsync sync) {
-        return isSignalled(table().glClientWaitSync(sync, 0, aSecondNs));
+    // Deletes it too.
+    const auto signals = [](GLsync sync) {
+        const bool isSignalledNow = isSignalled(table().glClientWaitSync(sync, 0, aSecondNs));
+        table().glDeleteSync(sync);
+        return isSignalledNow;
     };
 
     // Either the sync comes late, as the host's own does, or it comes early and unsignalled.
-    std::future<bool> early = std::async(std::launch::async, [&] {
-        const GLsync sync = createSync(event);
-        const bool isSignalledNow = signalled(sync);
-        table().glDeleteSync(sync);
-        return isSignalledNow;
-    });
+    auto early = std::async(std::launch::async, [&] { return signals(createSync(event)); });
     EXPECT_EQ(early.wait_for(300ms), std::future_status::timeout) << "signalled before the event";
-    openCL.end(event, CL_COMPLETE);
+    clSetUserEventStatus(event, CL_COMPLETE);
     EXPECT_TRUE(early.get());
-
     const GLsync here = createSync(event);
     EXPECT_TRUE(isSync(here));
-    EXPECT_TRUE(signalled(here));
-    table().glDeleteSync(here);
+    EXPECT_TRUE(signals(here));
 
     // A command that failed has ended too.
-    const cl_event failed = openCL.create();
-    openCL.end(failed, CL_OUT_OF_RESOURCES);
+    const cl_event failed = clCreateUserEvent(openCL, nullptr);
+    clSetUserEventStatus(failed, CL_OUT_OF_RESOURCES);
     const GLsync ofFailed = onForeignThread([&] { return createSync(failed); });
     EXPECT_TRUE(isSync(ofFailed));
     table().glDeleteSync(ofFailed);
 
     EXPECT_EQ(createSync(nullptr), nullptr);
-    EXPECT_EQ(table().glCreateSyncFromCLeventARB(openCL.context(), event, 1), nullptr);
-    openCL.release(failed);
-    openCL.release(event);
+    EXPECT_EQ(table().glCreateSyncFromCLeventARB(openCL, event, 1), nullptr);
+    clReleaseEvent(failed);
+    clReleaseEvent(event);
+    clReleaseContext(openCL);
 }
 
 } // namespace
