@@ -1,7 +1,8 @@
-// What the command line may hold, and small decisions: vendor, platform, figures.
+// What the command line may hold, and small decisions: vendor, platform, figures, texts.
 #include "viewer/GraphicsVendor.h"
 #include "viewer/OpenCLPlatforms.h"
 #include "viewer/Options.h"
+#include "viewer/OverlayText.h"
 #include "viewer/Report.h"
 
 #include <gmock/gmock.h>
@@ -10,7 +11,7 @@
 namespace {
 
 using namespace viewer;
-using testing::AllOf, testing::HasSubstr;
+using testing::AllOf, testing::HasSubstr, testing::Not;
 
 Result<Options> parse(const QString& line)
 {
@@ -130,6 +131,26 @@ TEST(Report, TellsWhetherTheBoundHeld)
     EXPECT_THAT(reportText(facts), HasSubstr("FAILED"));
     facts.deviation = Deviation{kPositionBound, kNormalBound};
     EXPECT_THAT(reportText(facts), HasSubstr("passed"));
+}
+
+TEST(OverlayText, TellsOnlyWhatIsShown)
+{
+    OverlayFacts facts{{{"a device", "2, fence", "4, finish", 128}}, 1.5, {}, true, false};
+    EXPECT_THAT(overlayText(facts),
+                AllOf(HasSubstr("1.50 ms"), HasSubstr("a device\n"), HasSubstr("2, fence\n"),
+                      HasSubstr("4, finish\n"), HasSubstr("128 vertex buffers\n"),
+                      HasSubstr("paused\n"), HasSubstr("off"), Not(HasSubstr("on the right"))));
+    facts = {{}, 1.5, 7.25, false, true};
+    EXPECT_THAT(overlayText(facts), AllOf(HasSubstr("7.25 ms"), HasSubstr("OpenCL is not used"),
+                                          Not(HasSubstr("Batch")), Not(HasSubstr("paused"))));
+}
+
+TEST(OverlayText, CutsALongBuildLog)
+{
+    EXPECT_EQ(beginningOf("one\ntwo"), "one\ntwo\n");
+    const std::string cut = beginningOf(std::string(1000, 'x') + std::string(99, '\n'));
+    EXPECT_LT(cut.size(), 200u);
+    EXPECT_THAT(cut, HasSubstr("\n... and 83 more lines\n"));
 }
 
 } // namespace

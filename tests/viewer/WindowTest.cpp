@@ -1,5 +1,8 @@
-// The playing window, driven by the events that a user causes: every frame is right, and Escape
-// ends it.
+// The playing window, driven by the events that a user causes and by kernels that change on the
+// disk meanwhile: every frame is right, and Escape ends it.
+#include "viewer/Player.h"
+
+#include "runtime/TopenCLInfo.h"
 #include "viewer/Session.h"
 #include "viewer/ViewerWindow.h"
 
@@ -7,10 +10,13 @@
 #include <functional>
 #include <memory>
 
+#include <QElapsedTimer>
+#include <QFile>
 #include <QGuiApplication>
 #include <QKeyEvent>
 #include <QMouseEvent>
 #include <QSurfaceFormat>
+#include <QTemporaryDir>
 #include <QWheelEvent>
 
 #include <gmock/gmock.h>
@@ -19,9 +25,12 @@
 namespace {
 
 using namespace viewer;
+using testing::AllOf, testing::HasSubstr, testing::Not;
 
 constexpr int kUnitsPerNotch = 120; // of the wheel
 constexpr int kFramesAfterEscape = 60;
+constexpr qint64 kNoticedMs = 500; // a changed kernel, by then
+constexpr qint64 kHangMs = 20000;
 const QSize kSize(160, 120);
 
 void press(QWindow& window, Qt::Key key)
@@ -86,6 +95,18 @@ protected:
         EXPECT_TRUE(fSession->verified());
     }
 
+    // Until a frame is not as the CPU would have it, or the time is over.
+    void playWhileRight(Player& player, qint64 milliseconds)
+    {
+        QElapsedTimer timer;
+        timer.start();
+        while (fSession->verified() && timer.elapsed() < milliseconds) {
+            ASSERT_FALSE(player.renderFrame());
+            QGuiApplication::processEvents();
+            fWindow->makeCurrent();
+        }
+    }
+
     int fArguments = 1;
     char fName[12] = "window-test";
     char* fNames[2] = {fName, nullptr};
@@ -119,8 +140,50 @@ TEST_F(WindowTest, OrbitsZoomsResizesAndChangesTheVertexBuffersDetail)
         press(*fWindow, Qt::Key_D);
     });
     EXPECT_EQ(fSession->canvas().size(), QSize(200, 100) * fWindow->devicePixelRatio());
-    EXPECT_THAT(before, testing::HasSubstr("3205 vertices"));
-    EXPECT_THAT(fSession->report(), testing::Not(testing::HasSubstr("3205 vertices")));
+    EXPECT_THAT(before, HasSubstr("3205 vertices"));
+    EXPECT_THAT(fSession->report(), Not(HasSubstr("3205 vertices")));
+}
+
+TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
+{
+    if (!TopenCLInfo::isValid())
+        GTEST_SKIP() << "OpenCL cannot be used here";
+    const QTemporaryDir resources;
+    std::filesystem::copy(KernelFiles::folder(), resources.filePath("kernels").toStdString());
+    TopenCLInfo::theOne().getAbsolutePathToResources() = resources.path().toUtf8().constData();
+    QFile file(resources.filePath("kernels/twist.cl"));
+    ASSERT_TRUE(file.open(QIODevice::ReadOnly));
+    const QByteArray original = file.readAll();
+    Player player(*fSession);
+    const auto playWith = [&](const char* from, const char* to, qint64 milliseconds) {
+        file.close();
+        ASSERT_TRUE(file.open(QIODevice::WriteOnly));
+        file.write(QByteArray(original).replace(from, to));
+        file.close();
+        playWhileRight(player, milliseconds);
+    };
+
+    testing::internal::CaptureStderr();
+    playWith("vload3", "vload33", kNoticedMs);
+    playWith("twistPerHeight,\n", "twistPerHeight, const int more,\n", kNoticedMs);
+    EXPECT_THAT(
+        testing::internal::GetCapturedStderr(),
+        AllOf(HasSubstr("does not build"), HasSubstr("'vload33'"), HasSubstr("takes 9 arguments")));
+    EXPECT_TRUE(fSession->verified());
+    playWith("const float angle = ", "const float angle = 2.0f * ", kHangMs);
+    EXPECT_FALSE(fSession->verified()) << "the mended kernel was not taken";
+}
+
+TEST_F(WindowTest, EveryFrameIsRightInEachStateOfTheKeys)
+{
+    Player player(*fSession);
+    for (const Action action : {Action::kPause, Action::kDeformers, Action::kSideBySide,
+                                Action::kDetail, Action::kDeformers, Action::kSideBySide}) {
+        player.act(action);
+        ASSERT_FALSE(player.renderFrame());
+        player.showIn(fWindow->defaultFramebufferObject(), fWindow->size(), 1);
+        EXPECT_TRUE(fSession->verified()) << static_cast<int>(action);
+    }
 }
 
 } // namespace
