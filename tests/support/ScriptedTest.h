@@ -29,8 +29,11 @@ struct StartArguments {
 
 void setEnvironment(const char* name, const char* value);
 
-// A row of a table of tests is derived from its name.
+// A row of a table of tests is derived from its name, which is its first initialiser.
 struct Named {
+    // Implicit: a row begins with the bare text.
+    Named(const char* text) : name(text) {}
+
     const char* name;
     friend std::ostream& operator<<(std::ostream& out, const Named& row) { return out << row.name; }
 };
