@@ -25,13 +25,17 @@ void PrintTo(const Modes& modes, std::ostream* stream)
     *stream << modes.description;
 }
 
+struct QueueRelease {
+    void operator()(cl_command_queue queue) const { clReleaseCommandQueue(queue); }
+};
+
 // One mesh: its vertex buffer at the renderer, its record, its kernels and its queue.
 struct Mesh {
     unsigned glBuffer = 0;
     const TopenCLSharedBuffer* shared = nullptr;
     AutoCLObject<cl_kernel> add;
     AutoCLObject<cl_kernel> scale;
-    cl_command_queue queue = nullptr;
+    std::unique_ptr<_cl_command_queue, QueueRelease> queue;
     AutoCLObject<cl_event> released; // of a release on its own
 };
 
@@ -56,7 +60,7 @@ protected:
         mesh.glBuffer = makeGLBuffer(std::vector<float>(kElements, 0.0F));
         mesh.add = deformKernel("add");
         mesh.scale = deformKernel("scale");
-        mesh.queue = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);
+        mesh.queue.reset(TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr));
         share(mesh);
         return mesh;
     }
@@ -81,24 +85,24 @@ protected:
     static void deform(Mesh& mesh)
     {
         AutoCLObject<cl_event> acquired;
-        ASSERT_EQ(
-            manager().EnqueueAcquireSharedCLBuffer(mesh.queue, mesh.shared, acquired.receive()),
-            CL_SUCCESS);
+        ASSERT_EQ(manager().EnqueueAcquireSharedCLBuffer(mesh.queue.get(), mesh.shared,
+                                                         acquired.receive()),
+                  CL_SUCCESS);
         ASSERT_NE(acquired.get(), nullptr);
         const cl_mem memory = mesh.shared->fMem.get();
-        const auto added =
-            enqueueDeform(mesh.queue, mesh.add.get(), memory, 1.0F, kElements, {acquired.get()});
-        const auto scaled =
-            enqueueDeform(mesh.queue, mesh.scale.get(), memory, 2.0F, kElements, {added.get()});
+        const auto added = enqueueDeform(mesh.queue.get(), mesh.add.get(), memory, 1.0F, kElements,
+                                         {acquired.get()});
+        const auto scaled = enqueueDeform(mesh.queue.get(), mesh.scale.get(), memory, 2.0F,
+                                          kElements, {added.get()});
         const cl_event last = scaled.get();
         if (mesh.shared->fInBatch) {
             manager().EnqueueReleaseBatchedSharedCLBuffer(1, &last);
         } else {
-            ASSERT_EQ(manager().EnqueueReleaseSharedCLBuffer(mesh.queue, 1, &memory, 1, &last,
+            ASSERT_EQ(manager().EnqueueReleaseSharedCLBuffer(mesh.queue.get(), 1, &memory, 1, &last,
                                                              mesh.released.receive()),
                       CL_SUCCESS);
         }
-        clFlush(mesh.queue);
+        clFlush(mesh.queue.get());
     }
 
     static void deformInParallel(std::vector<Mesh>& meshes)

@@ -4,6 +4,7 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 #include "standalone/NativeContext.h"
+#include "tests/support/KeepModulesLoaded.h"
 
 #include <cstdlib>
 
@@ -35,6 +36,7 @@ LibraryTest::~LibraryTest()
 {
     if (TopenCLInfo::isValid())
         TopenCLInfo::finish();
+    keepModulesLoaded();
 }
 
 unsigned LibraryTest::makeGLBuffer(const std::vector<float>& values)

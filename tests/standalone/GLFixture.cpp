@@ -1,9 +1,8 @@
 #include "GLFixture.h"
 
-#include <QtCore/qtestsupport_core.h>
+#include "tests/support/KeepModulesLoaded.h"
 
-#include <dlfcn.h>
-#include <link.h>
+#include <QtCore/qtestsupport_core.h>
 
 namespace {
 
@@ -49,16 +48,9 @@ void GLTest::SetUp()
     makeCurrent();
 }
 
-// Keeps what is loaded now until the process ends: what the static objects of a driver hold reads
-// as leaked once the driver is unloaded.
 GLTest::~GLTest()
 {
-    dl_iterate_phdr(
-        [](dl_phdr_info* module, std::size_t, void*) {
-            dlopen(module->dlpi_name, RTLD_NOLOAD | RTLD_NODELETE | RTLD_LAZY);
-            return 0;
-        },
-        nullptr);
+    keepModulesLoaded();
 }
 
 QOpenGLContext& GLTest::context() const

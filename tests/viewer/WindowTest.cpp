@@ -1,5 +1,6 @@
 // The playing window, driven by the events that a user causes and by kernels that change on the
 // disk meanwhile: every frame is right, and Escape ends it.
+#include "tests/support/KeepModulesLoaded.h"
 #include "viewer/Player.h"
 
 #include "runtime/TopenCLInfo.h"
@@ -70,6 +71,8 @@ protected:
         const Status failure = fSession->start(kSize);
         ASSERT_FALSE(failure) << failure->text;
     }
+
+    void TearDown() override { keepModulesLoaded(); }
 
     // Plays until Escape, which comes after `frames` frames, and looks how that went. Calls
     // `action` after the first.

@@ -1,0 +1,19 @@
+// For tests that load drivers, so that the leak check stays on.
+#pragma once
+
+#include <cstddef>
+
+#include <dlfcn.h>
+#include <link.h>
+
+// Keeps what is loaded now until the process ends: what the static objects of a driver hold reads
+// as leaked once the driver is unloaded.
+inline void keepModulesLoaded()
+{
+    dl_iterate_phdr(
+        [](dl_phdr_info* module, std::size_t, void*) {
+            dlopen(module->dlpi_name, RTLD_NOLOAD | RTLD_NODELETE | RTLD_LAZY);
+            return 0;
+        },
+        nullptr);
+}
