@@ -82,10 +82,17 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     for (const Kernel& kernel : kernels)
         EXPECT_NE(kernel.get(), nullptr);
 
-    // Without double precision the options differ, and so does the key.
+    // Include directories are options, too; without double precision these differ, and so does the key.
+    TstringArray folders;
+    folders.append("a");
+    fStore->getKernel(path, "-DA", "skin", &folders);
+    fStore->getKernel(path, "-DA", "wave", &folders);
+    folders.append("b");
+    fStore->getKernel(path, "-DA", "skin", &folders);
+    EXPECT_EQ(builds(), 2U);
     TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
     fStore->getKernel(path, "-DA", "skin", nullptr);
-    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#3, [device#1], \"-DA\")"});
+    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#5, [device#1], \"-DA\")"});
 }
 
 TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
