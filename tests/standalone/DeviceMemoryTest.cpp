@@ -51,7 +51,8 @@ TEST(DeviceMemory, LosesNoByteAndNoPeakBetweenThreads)
             meet();
             // Both have added, so what is in use now is the peak, whoever noted it.
             const DeviceMemoryUse use = deviceMemoryUse();
-            lostPeaks += checks && use.peakBytes != use.currentBytes ? 1 : 0;
+            if (checks && use.peakBytes != use.currentBytes)
+                ++lostPeaks;
         }
     };
     std::jthread other(addTogether, false);
