@@ -34,16 +34,15 @@ void addOnce(AutoCLEventList& waits, const AutoCLObject<cl_event>& event)
         waits.add(event);
 }
 
-// Everything that the commands of a deformer wait for. Memory from a pool brings the event of the
-// data that it held before.
-AutoCLEventList waitsOf(const Flow& flow)
+// Makes `waits` all that the commands of a deformer wait for. Memory from a pool brings the event
+// of the data that it held before.
+void collectWaits(const Flow& flow, AutoCLEventList& waits)
 {
-    AutoCLEventList waits;
+    waits = AutoCLEventList(); // keeps its storage
     addOnce(waits, flow.inPositions.bufferReadyEvent());
     addOnce(waits, flow.inNormals.bufferReadyEvent());
     addOnce(waits, flow.outPositions.bufferReadyEvent());
     addOnce(waits, flow.outNormals.bufferReadyEvent());
-    return waits;
 }
 
 // Tells the next deformer where the output is and when it is ready.
@@ -85,11 +84,11 @@ cl_int SkinDeformer::evaluate(const std::vector<MatrixRows>& bones, WorkerQueue&
     if (!flow.complete())
         return CL_MEM_OBJECT_ALLOCATION_FAILURE;
 
-    AutoCLEventList waits = waitsOf(flow);
-    waits.add(fBones.buffer());
+    collectWaits(flow, fWaits);
+    fWaits.add(fBones.buffer());
     AutoCLObject<cl_event> done;
     const cl_int status =
-        fKernel.enqueue(worker.queue(), flow.vertexCount(), waits, done, flow.vertexCount(),
+        fKernel.enqueue(worker.queue(), flow.vertexCount(), fWaits, done, flow.vertexCount(),
                         flow.inPositions.buffer().get(), flow.inNormals.buffer().get(),
                         fBoneIndices.memory(), fBoneWeights.memory(), fBones.memory(),
                         flow.outPositions.buffer().get(), flow.outNormals.buffer().get());
@@ -134,12 +133,12 @@ cl_int TwistDeformer::evaluate(const MeshPose& pose, WorkerQueue& worker,
     if (!flow.complete())
         return CL_MEM_OBJECT_ALLOCATION_FAILURE;
 
-    AutoCLEventList waits = waitsOf(flow);
-    waits.add(fGeometryMatrix.buffer());
-    waits.add(fInverseGeometryMatrix.buffer());
+    collectWaits(flow, fWaits);
+    fWaits.add(fGeometryMatrix.buffer());
+    fWaits.add(fInverseGeometryMatrix.buffer());
     AutoCLObject<cl_event> done;
     const cl_int status =
-        fKernel.enqueue(worker.queue(), flow.vertexCount(), waits, done, flow.vertexCount(),
+        fKernel.enqueue(worker.queue(), flow.vertexCount(), fWaits, done, flow.vertexCount(),
                         flow.inPositions.buffer().get(), flow.inNormals.buffer().get(),
                         fGeometryMatrix.memory(), fInverseGeometryMatrix.memory(), pose.twist,
                         flow.outPositions.buffer().get(), flow.outNormals.buffer().get());

@@ -42,6 +42,7 @@ private:
     InputBuffer fBoneIndices;
     InputBuffer fBoneWeights;
     InputBuffer fBones;
+    AutoCLEventList fWaits; // of the command being enqueued; its storage serves every frame
 };
 
 class TwistDeformer {
@@ -63,6 +64,7 @@ private:
     DeformerKernel fKernel;
     InputBuffer fGeometryMatrix;
     InputBuffer fInverseGeometryMatrix;
+    AutoCLEventList fWaits; // as above
 };
 
 } // namespace viewer

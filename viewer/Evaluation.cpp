@@ -178,11 +178,11 @@ bool Evaluation::allBatched() const
 
 void Evaluation::countCommands()
 {
-    std::vector<cl_event> events;
+    fAcquires.clear();
     for (const AutoCLObject<cl_event>& event : fHandover.acquired)
-        events.push_back(event.get());
-    std::sort(events.begin(), events.end());
-    const auto distinct = std::unique(events.begin(), events.end()) - events.begin();
+        fAcquires.push_back(event.get());
+    std::sort(fAcquires.begin(), fAcquires.end());
+    const auto distinct = std::unique(fAcquires.begin(), fAcquires.end()) - fAcquires.begin();
     fCounts.evaluations += 1;
     fCounts.acquires += static_cast<std::size_t>(distinct);
     fCounts.releases += *fBatchReleased ? 1 : 0;

@@ -83,6 +83,7 @@ private:
     std::uint64_t fMeshNumber = 0;
     KernelFiles fKernels;
     EvaluationCounts fCounts;
+    std::vector<cl_event> fAcquires; // scratch of countCommands
 };
 
 } // namespace viewer

@@ -3,62 +3,33 @@
 #include "runtime/TopenCLInfo.h"
 
 namespace viewer {
-namespace {
-
-// The attributes of a mesh's node in the host's graph.
-enum Attribute : std::uint64_t { kRest, kSkinned, kTwisted };
-
-AutoCLEventList listOf(const std::array<AutoCLObject<cl_event>, 2>& events)
-{
-    AutoCLEventList list;
-    for (const AutoCLObject<cl_event>& event : events)
-        list.add(event);
-    return list;
-}
-
-} // namespace
 
 MeshEvaluator::MeshEvaluator(const OpenCLFunctions& cl, std::uint64_t number, bool hasBones,
                              KernelFiles& files)
-    : fCL(cl), fRest(number, kRest), fSkinned(number, hasBones ? kSkinned : kRest),
-      fTwisted(number, kTwisted), fRestPositions(TopenCLData::sPositionsName(), fRest),
-      fRestNormals(TopenCLData::sNormalsName(), fRest),
-      fTwist(cl, DeformerPlugs{fSkinned, fTwisted}, files)
+    : fCL(cl), fChain(cl, number, hasBones, files)
 {
-    if (hasBones)
-        fSkin.emplace(cl, DeformerPlugs{fRest, fSkinned}, files);
-}
-
-bool MeshEvaluator::valid() const
-{
-    return fTwist.valid() && (!fSkin || fSkin->valid());
-}
-
-void MeshEvaluator::renewKernels(KernelFiles& files)
-{
-    fTwist.renewKernel(files);
-    if (fSkin)
-        fSkin->renewKernel(files);
 }
 
 cl_int MeshEvaluator::setMesh(const Mesh& mesh, cl_command_queue queue)
 {
-    const AutoCLEventList lastUse = listOf(fWritten);
-    cl_int status = fRestPositions.writeConstant(queue, mesh.positions, lastUse);
-    if (status == CL_SUCCESS)
-        status = fRestNormals.writeConstant(queue, mesh.normals, lastUse);
-    if (status == CL_SUCCESS && fSkin)
-        status = fSkin->setMesh(mesh, queue, lastUse);
-    fData.setData(TopenCLData::sPositionsName(), fRest, fRestPositions.data());
-    fData.setData(TopenCLData::sNormalsName(), fRest, fRestNormals.data());
-    return status;
+    collectLastUse();
+    return fChain.setMesh(mesh, queue, fLastUse);
+}
+
+void MeshEvaluator::collectLastUse()
+{
+    fLastUse = AutoCLEventList(); // keeps its storage
+    for (const AutoCLObject<cl_event>& event : fWritten)
+        fLastUse.add(event);
 }
 
 cl_int MeshEvaluator::evaluate(const MeshPose& pose, WorkerQueue& worker,
                                const VertexBuffer& positions, const VertexBuffer& normals,
                                Handover& handover)
 {
-    cl_int status = enqueueDeformers(pose, worker);
+    // The frame before may have been enqueued on another queue and may still read its matrices.
+    collectLastUse();
+    cl_int status = fChain.evaluate(pose, worker, fLastUse);
     if (status == CL_SUCCESS)
         status =
             enqueueWrite(TopenCLData::sPositionsName(), positions, worker, fWritten[0], handover);
@@ -74,29 +45,6 @@ cl_int MeshEvaluator::evaluate(const MeshPose& pose, WorkerQueue& worker,
     return CL_SUCCESS;
 }
 
-cl_int MeshEvaluator::enqueueDeformers(const MeshPose& pose, WorkerQueue& worker)
-{
-    if (!pose.deforms) {
-        passThrough();
-        return CL_SUCCESS;
-    }
-    // The frame before may have been enqueued on another queue and may still read its matrices.
-    const AutoCLEventList lastUse = listOf(fWritten);
-    if (fSkin) {
-        const cl_int status = fSkin->evaluate(pose.bones, worker, lastUse, fData);
-        if (status != CL_SUCCESS)
-            return status;
-    }
-    return fTwist.evaluate(pose, worker, lastUse, fData);
-}
-
-// Deformers that are off: what goes into the chain comes out of it.
-void MeshEvaluator::passThrough()
-{
-    fData.setData(TopenCLData::sPositionsName(), fTwisted, fRestPositions.data());
-    fData.setData(TopenCLData::sNormalsName(), fTwisted, fRestNormals.data());
-}
-
 // Only this command needs the shared buffer: the deformers may be done before it is acquired.
 cl_int MeshEvaluator::enqueueWrite(const TuniqueString& name, const VertexBuffer& target,
                                    WorkerQueue& worker, AutoCLObject<cl_event>& written,
@@ -109,15 +57,15 @@ cl_int MeshEvaluator::enqueueWrite(const TuniqueString& name, const VertexBuffer
         return status;
     handover.acquired.push_back(acquired);
 
-    const TopenCLDataBuffer& source = fData.getData(name, fTwisted);
-    AutoCLEventList waits;
-    waits.add(acquired);
-    waits.add(source.bufferReadyEvent());
+    const TopenCLDataBuffer& source = fChain.output(name);
+    fWaits = AutoCLEventList(); // keeps its storage
+    fWaits.add(acquired);
+    fWaits.add(source.bufferReadyEvent());
     const std::size_t bytes =
         std::size_t{source.descriptor().elementSizeInBytes()} * source.descriptor().elementCount();
     const cl_int copied =
         fCL.clEnqueueCopyBuffer(worker.queue(), source.buffer().get(), target.shared()->fMem.get(),
-                                0, 0, bytes, waits.size(), waits.array(), written.receive());
+                                0, 0, bytes, fWaits.size(), fWaits.array(), written.receive());
     worker.trace("Write vertices", written);
     return copied;
 }

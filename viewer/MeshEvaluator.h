@@ -1,14 +1,11 @@
 // One mesh of one character on OpenCL: from its shape at rest to the renderer's vertex buffers.
 #pragma once
 
-#include "buffers/TopenCLData.h"
-#include "viewer/Deformers.h"
-#include "viewer/InputBuffer.h"
+#include "viewer/DeformerChain.h"
 #include "viewer/VertexBuffer.h"
 #include "viewer/WorkerQueues.h"
 
 #include <array>
-#include <optional>
 
 #include <tbb/concurrent_vector.h>
 
@@ -35,10 +32,10 @@ public:
                   KernelFiles& files);
 
     // False when a kernel is missing.
-    bool valid() const;
+    bool valid() const { return fChain.valid(); }
 
     // Takes kernels of the texts that the files now stand for.
-    void renewKernels(KernelFiles& files);
+    void renewKernels(KernelFiles& files) { fChain.renewKernels(files); }
 
     // Uploads the mesh at rest. Again for another level of detail. A status of OpenCL.
     cl_int setMesh(const Mesh& mesh, cl_command_queue queue);
@@ -50,23 +47,17 @@ public:
                     const VertexBuffer& normals, Handover& handover);
 
 private:
-    cl_int enqueueDeformers(const MeshPose& pose, WorkerQueue& worker);
-    void passThrough();
+    void collectLastUse();
     cl_int enqueueWrite(const TuniqueString& name, const VertexBuffer& target, WorkerQueue& worker,
                         AutoCLObject<cl_event>& written, Handover& handover);
     static void handOver(const VertexBuffer& target, const AutoCLObject<cl_event>& written,
                          Handover& handover);
 
     const OpenCLFunctions& fCL;
-    Tplug fRest;    // the plugs along the chain
-    Tplug fSkinned; // without bones the same as fRest
-    Tplug fTwisted;
-    InputBuffer fRestPositions;
-    InputBuffer fRestNormals;
-    std::optional<SkinDeformer> fSkin;
-    TwistDeformer fTwist;
-    TopenCLData fData;
+    DeformerChain fChain;
     std::array<AutoCLObject<cl_event>, 2> fWritten; // the last commands of the last frame
+    AutoCLEventList fLastUse;                       // the same as a wait list
+    AutoCLEventList fWaits; // of the command being enqueued; its storage serves every frame
 };
 
 } // namespace viewer

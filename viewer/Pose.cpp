@@ -62,7 +62,14 @@ QQuaternion sample(const std::vector<Key<QQuaternion>>& keys, double seconds)
 
 Pose poseAt(const Model& model, const Animation* animation, double seconds)
 {
-    Pose pose(model.nodes.size());
+    Pose pose;
+    poseAt(model, animation, seconds, pose);
+    return pose;
+}
+
+void poseAt(const Model& model, const Animation* animation, double seconds, Pose& pose)
+{
+    pose.resize(model.nodes.size());
     std::transform(model.nodes.begin(), model.nodes.end(), pose.begin(),
                    [](const Node& node) { return node.local; });
     if (animation) {
@@ -74,7 +81,6 @@ Pose poseAt(const Model& model, const Animation* animation, double seconds)
         if (model.nodes[i].parent != i)
             pose[i] = pose[model.nodes[i].parent] * pose[i];
     }
-    return pose;
 }
 
 MatrixRows rowsOf(const QMatrix4x4& matrix)
@@ -91,10 +97,15 @@ MatrixRows rowsOf(const QMatrix4x4& matrix)
 std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose)
 {
     std::vector<MatrixRows> matrices;
-    matrices.reserve(mesh.bones.size());
-    for (const Bone& bone : mesh.bones)
-        matrices.push_back(rowsOf(pose[bone.node] * bone.offset));
+    boneMatrices(mesh, pose, matrices);
     return matrices;
+}
+
+void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<MatrixRows>& matrices)
+{
+    matrices.resize(mesh.bones.size());
+    std::transform(mesh.bones.begin(), mesh.bones.end(), matrices.begin(),
+                   [&pose](const Bone& bone) { return rowsOf(pose[bone.node] * bone.offset); });
 }
 
 QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose)

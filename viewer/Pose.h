@@ -18,8 +18,10 @@ QQuaternion sample(const std::vector<Key<QQuaternion>>& keys, double seconds);
 // For each node of a model the transform from its space to the model's.
 using Pose = std::vector<QMatrix4x4>;
 
-// The pose at `seconds`, which wraps around the animation's length. Null stands for rest.
+// The pose at `seconds`, which wraps around the animation's length. Null stands for rest. The
+// second form reuses the storage of `pose`.
 Pose poseAt(const Model& model, const Animation* animation, double seconds);
+void poseAt(const Model& model, const Animation* animation, double seconds, Pose& pose);
 
 // The upper three rows of a transform: what the kernels take. A point is transformed by the three
 // dot products of the rows with (x, y, z, 1).
@@ -30,8 +32,10 @@ Pose poseAt(const Model& model, const Animation* animation, double seconds);
 using MatrixRows = std::array<float, 12>;
 MatrixRows rowsOf(const QMatrix4x4& matrix);
 
-// For each bone of the mesh the transform from the mesh at rest to the model's space.
+// For each bone of the mesh the transform from the mesh at rest to the model's space. The second
+// form reuses the storage of `matrices`.
 std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
+void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<MatrixRows>& matrices);
 
 // The transform from the space in which the mesh's deformers leave it (the model's where bones took
 // it there, else its node's) to the model's.

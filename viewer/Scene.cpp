@@ -174,15 +174,15 @@ void Scene::pose(double seconds)
 
 void Scene::poseCharacter(Character& character, double seconds) const
 {
-    const Pose pose = poseAt(fModel, fAnimation, seconds);
+    poseAt(fModel, fAnimation, seconds, character.pose);
     const double twist = kLargestTwist * std::sin(kFullTurn * seconds / kTwistPeriod);
     const float height = std::max(fSpace.size.y(), kGap);
     for (const auto& mesh : character.meshes) {
-        mesh->pose.bones = boneMatrices(mesh->mesh(), pose);
+        boneMatrices(mesh->mesh(), character.pose, mesh->pose.bones);
         mesh->pose.deforms = fDeforms;
         mesh->pose.geometryMatrix =
-            fSpace.fromModel *
-            (fDeforms ? meshToModel(mesh->mesh(), pose) : restToModel(mesh->mesh(), fRest));
+            fSpace.fromModel * (fDeforms ? meshToModel(mesh->mesh(), character.pose)
+                                         : restToModel(mesh->mesh(), fRest));
         mesh->pose.inverseGeometryMatrix = mesh->pose.geometryMatrix.inverted();
         mesh->pose.twist = static_cast<float>(twist) / height;
     }

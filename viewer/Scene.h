@@ -44,6 +44,7 @@ struct Character {
     QMatrix4x4 placement; // from the character's space to the stage
     QVector3D tint;       // that tells it from its neighbours, near 1
     double phase = 0;     // seconds ahead of the others
+    Pose pose;
     std::vector<std::unique_ptr<CharacterMesh>> meshes;
 };
 

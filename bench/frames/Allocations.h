@@ -1,0 +1,28 @@
+// Counts what `new` allocates in the whole process: this program replaces the global operator.
+#pragma once
+
+#include <cstddef>
+
+// Calls of operator new so far.
+struct Allocations {
+    std::size_t library = 0; // from the library's own code
+    std::size_t program = 0; // from this program's: the viewer's parts, and what they inline
+    std::size_t others = 0;  // OpenCL, oneTBB, Qt, OpenGL
+
+    Allocations operator-(const Allocations& earlier) const
+    {
+        return {library - earlier.library, program - earlier.program, others - earlier.others};
+    }
+    Allocations& operator+=(const Allocations& more)
+    {
+        library += more.library;
+        program += more.program;
+        others += more.others;
+        return *this;
+    }
+};
+
+// Since startCounting(), from all threads.
+Allocations allocationsSoFar();
+// Finds out where the library and the program lie. Before that nothing is counted.
+void startCounting();

@@ -1,0 +1,40 @@
+#!/usr/bin/env python3
+"""Draws the times of whole frames: plot.py FRAMES.json PICTURE.png"""
+import json
+import sys
+
+import matplotlib
+
+matplotlib.use("Agg")
+from matplotlib import pyplot  # noqa: E402: the backend comes first
+
+WAYS = {
+    "shared": ("the library: OpenCL, in the vertex buffers", "#1f77b4", "o"),
+    "read back": ("OpenCL, read back, glBufferSubData", "#d62728", "s"),
+    "processor": ("TBB and vector instructions, glBufferSubData", "#7f7f7f", "^"),
+}
+
+
+def main():
+    if len(sys.argv) != 3:
+        sys.exit("usage: plot.py FRAMES.json PICTURE.png")
+    with open(sys.argv[1], encoding="utf-8") as file:
+        run = json.load(file)
+    figure, axes = pyplot.subplots(figsize=(7.2, 4.2), layout="constrained")
+    for way, (label, colour, marker) in WAYS.items():
+        rows = [row for row in run["rows"] if row["way"] == way]
+        vertices = [row["vertices"] for row in rows]
+        times = [row["milliseconds"] for row in rows]
+        axes.plot(vertices, [time["median"] for time in times], marker=marker, color=colour, label=label)
+        axes.fill_between(vertices, [time["low"] for time in times], [time["high"] for time in times],
+                          color=colour, alpha=0.15, linewidth=0)
+    axes.set(xscale="log", yscale="log", xlabel="vertices", ylabel="ms a frame, until OpenGL has finished",
+             title=f"{run['processor']}, {run['renderer']}")
+    axes.title.set_fontsize(9)
+    axes.grid(True, which="major", alpha=0.3)
+    axes.legend(fontsize=8)
+    figure.savefig(sys.argv[2], dpi=110)
+
+
+if __name__ == "__main__":
+    main()
