@@ -71,7 +71,8 @@ Options parse(int count, char** arguments)
         else if (argument == "--help")
             options.help = true;
         else
-            throw std::runtime_error("unknown argument " + std::string(argument));
+            throw std::runtime_error("unknown argument " + std::string(argument) +
+                                     "; --help tells all");
     }
     return options;
 }

@@ -96,7 +96,8 @@ Options parse(int count, char** arguments)
         else if (!argument.starts_with('-'))
             options.model = argument;
         else
-            throw std::runtime_error("unknown argument " + std::string(argument));
+            throw std::runtime_error("unknown argument " + std::string(argument) +
+                                     "; --help tells all");
     }
     if (options.frames <= kWarmUp)
         throw std::runtime_error("--frames must be above " + std::to_string(kWarmUp));
