@@ -46,6 +46,11 @@ cl_context Runtime::context()
     return TopenCLInfo::theOne().openCLContext();
 }
 
+cl_device_id Runtime::device()
+{
+    return TopenCLInfo::theOne().openCLDevice();
+}
+
 cl_command_queue Runtime::queue()
 {
     return TopenCLInfo::theOne().openCLCommandQueue();
@@ -54,8 +59,7 @@ cl_command_queue Runtime::queue()
 std::string Runtime::platformName()
 {
     cl_platform_id platform = nullptr;
-    clGetDeviceInfo(TopenCLInfo::theOne().openCLDevice(), CL_DEVICE_PLATFORM,
-                    sizeof(cl_platform_id), &platform, nullptr);
+    clGetDeviceInfo(device(), CL_DEVICE_PLATFORM, sizeof(cl_platform_id), &platform, nullptr);
     return platformText(platform, CL_PLATFORM_NAME) + ", " +
            platformText(platform, CL_PLATFORM_VERSION);
 }
@@ -63,7 +67,6 @@ std::string Runtime::platformName()
 std::string Runtime::deviceName()
 {
     char text[256] = "";
-    clGetDeviceInfo(TopenCLInfo::theOne().openCLDevice(), CL_DEVICE_NAME, sizeof text, text,
-                    nullptr);
+    clGetDeviceInfo(device(), CL_DEVICE_NAME, sizeof text, text, nullptr);
     return text;
 }

@@ -30,6 +30,7 @@ public:
     QOpenGLExtraFunctions& gl() { return *fContext.extraFunctions(); }
 
     static cl_context context();
+    static cl_device_id device();
     static cl_command_queue queue();
     static std::string platformName(); // and version
     static std::string deviceName();

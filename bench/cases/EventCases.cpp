@@ -2,6 +2,7 @@
 #include "Runtime.h"
 #include "cases/Cases.h"
 #include "diagnostics/AutoCLEventList.h"
+#include "peers/Peer.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
@@ -65,9 +66,15 @@ Group waitList(const std::string& name, std::size_t size)
     for (std::size_t index = 0; index < size; ++index)
         events->push_back(completeEvent());
     const auto perEvent = static_cast<double>(size);
-    return {name,
-            {{"array that grows by one half", filling<HandleArray>(events), {}, perEvent},
-             {"AutoCLEventList", filling<AutoCLEventList>(events), Goal::ratio(kLimit), perEvent}}};
+    Group group{
+        name,
+        {{"array that grows by one half", filling<HandleArray>(events), {}, perEvent},
+         {"AutoCLEventList", filling<AutoCLEventList>(events), Goal::ratio(kLimit), perEvent}}};
+    std::vector<cl_event> handles;
+    for (const Event& event : *events)
+        handles.push_back(event.get());
+    addPeers(group, [&](const Peer& peer) { return peer.waitList(handles); });
+    return group;
 }
 
 Group completion(const std::string& name)

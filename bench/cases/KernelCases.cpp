@@ -4,6 +4,7 @@
 #include "diagnostics/AutoCLObject.h"
 #include "harness/TwoThreads.h"
 #include "kernels/TopenCLKernelStore.h"
+#include "peers/Peer.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
@@ -110,7 +111,7 @@ private:
 Group hits(const std::string& name, std::size_t keys, Programs::Texts texts, double limit)
 {
     const auto cached = std::make_shared<CachedPrograms>(keys, texts);
-    return {
+    Group group{
         name,
         {{"create, retain, 2 releases",
           [cached](std::size_t count) { return timed([&] { cached->takeTurnsByHand(count); }); }},
@@ -121,6 +122,8 @@ Group hits(const std::string& name, std::size_t keys, Programs::Texts texts, dou
          {"getKernel, freeKernel",
           [cached](std::size_t count) { return timed([&] { cached->takeTurns(count); }); },
           Goal::ratio(limit)}}};
+    addPeers(group, [&](const Peer& peer) { return peer.kernelHits(cached->programs); });
+    return group;
 }
 
 // Per call of either thread.

@@ -3,6 +3,7 @@
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
 #include "cases/Cases.h"
+#include "peers/Peer.h"
 
 #include <algorithm>
 #include <array>
@@ -29,8 +30,6 @@ cl_mem createMemory(std::size_t bytes)
 // in an order that has nothing to do with that of giving back, then gives all back.
 class FreeEntries {
 public:
-    static constexpr std::size_t kTaken = 8; // buffers per evaluation
-
     explicit FreeEntries(std::size_t count)
     {
         constexpr unsigned int kSmallest = 1024; // bytes
@@ -47,7 +46,7 @@ public:
     void evaluate()
     {
         {
-            std::array<TopenCLDataBuffer, kTaken> taken;
+            std::array<TopenCLDataBuffer, kBuffersTaken> taken;
             for (TopenCLDataBuffer& buffer : taken)
                 buffer = fPool.createBuffer(next());
         }
@@ -56,16 +55,27 @@ public:
 
     void evaluateByHand()
     {
-        std::array<cl_mem, kTaken> taken;
-        for (cl_mem& memory : taken) {
-            const TopenCLDataBufferDescriptor& request = next();
-            memory = createMemory(std::size_t{request.elementCount()} * kElementBytes);
-        }
+        std::array<cl_mem, kBuffersTaken> taken;
+        for (cl_mem& memory : taken)
+            memory = createMemory(bytesOf(next()));
         for (cl_mem memory : taken)
             clReleaseMemObject(memory);
     }
 
+    // In the order in which evaluations take them.
+    std::vector<std::size_t> sizes() const
+    {
+        std::vector<std::size_t> all;
+        for (const TopenCLDataBufferDescriptor& request : fRequests)
+            all.push_back(bytesOf(request));
+        return all;
+    }
+
 private:
+    static std::size_t bytesOf(const TopenCLDataBufferDescriptor& request)
+    {
+        return std::size_t{request.elementCount()} * kElementBytes;
+    }
     const TopenCLDataBufferDescriptor& next() { return fRequests[fNext++ % fRequests.size()]; }
 
     TopenCLDataBufferPool fPool;
@@ -77,18 +87,20 @@ private:
 Group reuse(const std::string& name, std::size_t count, Goal goal)
 {
     const auto entries = std::make_shared<FreeEntries>(count);
-    return {name,
-            {{"create, release",
-              [entries](std::size_t evaluations) {
-                  return timedLoop(evaluations, [&] { entries->evaluateByHand(); });
-              },
-              {},
-              FreeEntries::kTaken},
-             {"createBuffer, releaseBuffers",
-              [entries](std::size_t evaluations) {
-                  return timedLoop(evaluations, [&] { entries->evaluate(); });
-              },
-              goal, FreeEntries::kTaken}}};
+    Group group{name,
+                {{"create, release",
+                  [entries](std::size_t evaluations) {
+                      return timedLoop(evaluations, [&] { entries->evaluateByHand(); });
+                  },
+                  {},
+                  kBuffersTaken},
+                 {"createBuffer, releaseBuffers",
+                  [entries](std::size_t evaluations) {
+                      return timedLoop(evaluations, [&] { entries->evaluate(); });
+                  },
+                  goal, kBuffersTaken}}};
+    addPeers(group, [&](const Peer& peer) { return peer.bufferReuse(entries->sizes()); });
+    return group;
 }
 
 // Fills the whole buffer, as the output of a kernel is, and waits.
@@ -137,16 +149,19 @@ struct WrittenBuffer {
 Group reuseWritten(const std::string& name, std::size_t bytes, double limit)
 {
     const auto buffer = std::make_shared<WrittenBuffer>(bytes);
-    return {name,
-            {{"create, write, release",
-              [buffer](std::size_t count) {
-                  return timedLoop(count, [&] { buffer->evaluateByHand(); });
-              }},
-             {"the write alone",
-              [buffer](std::size_t count) { return timedLoop(count, [&] { buffer->rewrite(); }); }},
-             {"createBuffer, write, releaseBuffers",
-              [buffer](std::size_t count) { return timedLoop(count, [&] { buffer->evaluate(); }); },
-              Goal::ratio(limit)}}};
+    Group group{
+        name,
+        {{"create, write, release",
+          [buffer](std::size_t count) {
+              return timedLoop(count, [&] { buffer->evaluateByHand(); });
+          }},
+         {"the write alone",
+          [buffer](std::size_t count) { return timedLoop(count, [&] { buffer->rewrite(); }); }},
+         {"createBuffer, write, releaseBuffers",
+          [buffer](std::size_t count) { return timedLoop(count, [&] { buffer->evaluate(); }); },
+          Goal::ratio(limit)}}};
+    addPeers(group, [&](const Peer& peer) { return peer.writtenReuse(bytes, write); });
+    return group;
 }
 
 } // namespace

@@ -1,7 +1,6 @@
 #include "cases/Programs.h"
 
 #include "Runtime.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <fstream>
 #include <stdexcept>
@@ -33,7 +32,7 @@ TstringArray longIncludeDirs()
 cl_program build(const KernelRequest& request)
 {
     const char* source = kSource;
-    const cl_device_id device = TopenCLInfo::theOne().openCLDevice();
+    const cl_device_id device = Runtime::device();
     cl_int status = CL_SUCCESS;
     cl_program program =
         clCreateProgramWithSource(Runtime::context(), 1, &source, nullptr, &status);
@@ -60,6 +59,19 @@ Programs::Programs(std::size_t count, Texts texts)
         fBuilt.push_back(build(request));
         fRequests.push_back(std::move(request));
     }
+}
+
+const char* Programs::source()
+{
+    return kSource;
+}
+
+std::string Programs::buildOptions(const KernelRequest& request)
+{
+    std::string options = request.flags;
+    for (unsigned int index = 0; index < request.includeDirs.length(); ++index)
+        options += std::string(" -I\"") + request.includeDirs[index].asChar() + '"';
+    return options;
 }
 
 Programs::~Programs()

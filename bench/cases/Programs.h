@@ -31,6 +31,11 @@ public:
     Programs(const Programs&) = delete;
     Programs& operator=(const Programs&) = delete;
 
+    // What every file holds.
+    static const char* source();
+    // The flags and include directories of a request, as OpenCL takes them.
+    static std::string buildOptions(const KernelRequest& request);
+
     const std::vector<KernelRequest>& requests() const { return fRequests; }
     // Owned by this object, one for each request.
     const std::vector<cl_program>& built() const { return fBuilt; }

@@ -2,6 +2,7 @@
 #include "Runtime.h"
 #include "buffers/TopenCLBuffer.h"
 #include "cases/Cases.h"
+#include "peers/Peer.h"
 
 #include <memory>
 
@@ -86,6 +87,8 @@ struct Pair {
     const char* name;
     Operation operation;
     double limit;
+    // What peers have beside it; null where they have nothing.
+    std::optional<Case> (Peer::*peerCase)(cl_mem, const std::vector<char>&) const = nullptr;
 };
 
 Group transfer(const std::string& name, const Pair& pair, std::size_t bytes)
@@ -96,17 +99,23 @@ Group transfer(const std::string& name, const Pair& pair, std::size_t bytes)
             return timedLoop(count, [&] { (*shared.*operation)(); });
         };
     };
-    return {name,
-            {{pair.bareName, repeat(pair.bare)},
-             {pair.name, repeat(pair.operation), Goal::ratio(pair.limit)}}};
+    Group group{name,
+                {{pair.bareName, repeat(pair.bare)},
+                 {pair.name, repeat(pair.operation), Goal::ratio(pair.limit)}}};
+    if (pair.peerCase)
+        addPeers(group, [&](const Peer& peer) {
+            return (peer.*pair.peerCase)(shared->buffer.buffer().get(), shared->contents);
+        });
+    return group;
 }
 
 } // namespace
 
 std::vector<GroupMaker> transferGroups()
 {
-    constexpr Pair kUpload{"enqueue write, wait", &Transfer::uploadByHand, "uploadDataToGPU",
-                           &Transfer::upload, 1.02};
+    constexpr Pair kUpload{
+        "enqueue write, wait", &Transfer::uploadByHand, "uploadDataToGPU", &Transfer::upload, 1.02,
+        &Peer::upload};
     constexpr Pair kReadBack{"enqueue read, wait", &Transfer::readBackByHand, "readBackDataFromGPU",
                              &Transfer::readBack, 1.02};
     constexpr Pair kGrowth{"create with host pointer", &Transfer::growByHand,

@@ -86,7 +86,7 @@ Spread pairwise(const Series& series, const Series& baseline, Operation operatio
 
 CaseResult resultOf(const Series& series, const Series& baseline)
 {
-    CaseResult result{series.subject->name, series.subject->goal, {}};
+    CaseResult result{series.subject->name, series.subject->goal, {}, series.subject->peer};
     result.measurement.nanoseconds = spreadOf(series.nanoseconds);
     result.measurement.ratio = pairwise(series, baseline, std::divides<>());
     result.measurement.extraNanoseconds = pairwise(series, baseline, std::minus<>());

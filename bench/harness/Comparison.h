@@ -17,6 +17,7 @@ struct CaseResult {
     std::string name;
     Goal goal;
     Measurement measurement;
+    std::string peer = {}; // as the case has it
 };
 
 struct GroupResult {

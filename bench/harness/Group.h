@@ -16,6 +16,7 @@ struct Case {
     Body body;
     Goal goal = {};
     double operationsPerIteration = 1;
+    std::string peer = {}; // the other library that this measures; empty for ours and bare calls
 };
 
 // The first case is the baseline, as a rule the bare OpenCL calls that the others must make. What

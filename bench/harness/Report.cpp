@@ -46,6 +46,12 @@ std::string text(const std::optional<double>& value, int decimals)
     return value ? number(*value, decimals) : "";
 }
 
+// Other libraries stand beside ours, whose goals are not theirs.
+std::string verdictText(const CaseResult& subject)
+{
+    return subject.peer.empty() ? textOf(judge(subject.goal, subject.measurement)) : "peer";
+}
+
 QJsonObject toJson(const Spread& spread)
 {
     return {{"median", spread.median}, {"p10", spread.low}, {"p90", spread.high}};
@@ -58,7 +64,9 @@ QJsonObject toJson(const CaseResult& subject)
                      {"nanoseconds", toJson(measured.nanoseconds)},
                      {"ratio", toJson(measured.ratio)},
                      {"goal", QString::fromStdString(textOf(subject.goal))},
-                     {"verdict", QString::fromStdString(textOf(judge(subject.goal, measured)))}};
+                     {"verdict", QString::fromStdString(verdictText(subject))}};
+    if (!subject.peer.empty())
+        json["peer"] = QString::fromStdString(subject.peer);
     if (measured.instructions)
         json["instructions"] = *measured.instructions;
     if (measured.instructionRatio)
@@ -110,8 +118,7 @@ void writeTable(std::ostream& output, const std::vector<GroupResult>& results)
                        isBaseline ? "" : number(measured.ratio.median, 3),
                        isBaseline ? "" : range(measured.ratio, 2), text(measured.instructions, 0),
                        isBaseline ? "" : text(measured.instructionRatio, 3),
-                       isBaseline ? "" : textOf(subject.goal),
-                       textOf(judge(subject.goal, measured))});
+                       isBaseline ? "" : textOf(subject.goal), verdictText(subject)});
         }
     }
     table.write(output);

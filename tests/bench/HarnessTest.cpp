@@ -31,7 +31,7 @@ TEST(Comparison, TimesArePerOperationOfFilledSamplesAndRatiosToTheBaseline)
     std::mt19937 random;
     const std::vector<Case> cases{{"bare", pretending(200), {}, 2},
                                   {"twice", pretending(800), {}, 4},
-                                  {"half", pretending(50)}};
+                                  {"half", pretending(50), {}, 1, "another"}};
     const GroupResult result = compare({"group", cases}, kEffort, random);
     ASSERT_EQ(result.cases.size(), 3u);
     EXPECT_DOUBLE_EQ(result.cases[0].measurement.nanoseconds.median, 100);
@@ -39,6 +39,7 @@ TEST(Comparison, TimesArePerOperationOfFilledSamplesAndRatiosToTheBaseline)
     EXPECT_DOUBLE_EQ(result.cases[1].measurement.ratio.median, 2);
     EXPECT_DOUBLE_EQ(result.cases[1].measurement.extraNanoseconds.median, 100);
     EXPECT_DOUBLE_EQ(result.cases[2].measurement.ratio.high, 0.5);
+    EXPECT_EQ(result.cases[2].peer, "another");
     EXPECT_DOUBLE_EQ(result.control.median, 1);
     EXPECT_GE(longest, 200u) << "10 us of 50 ns each";
     EXPECT_LE(longest, 400u) << "no more than one doubling too far";
@@ -128,6 +129,16 @@ TEST(Results, AMissedGoalStandsOut)
 {
     EXPECT_THAT(tableOf(someResults(1.3)), HasSubstr("MISSED"));
     EXPECT_THAT(tableOf(someResults(1.1)), AllOf(HasSubstr("met"), Not(HasSubstr("MISS"))));
+}
+
+TEST(Results, OtherLibrariesAreMarkedAndNotJudged)
+{
+    auto results = someResults(1.3);
+    results[0].cases[1].peer = "another";
+    EXPECT_THAT(tableOf(results), AllOf(HasSubstr("peer |"), Not(HasSubstr("MISS"))));
+    const QJsonValue json = toJson(RunDescription{}, results)["groups"][0]["cases"];
+    EXPECT_EQ(json[1]["peer"].toString(), "another");
+    EXPECT_TRUE(json[0]["peer"].isUndefined());
 }
 
 TEST(Table, ColumnsAreAligned)
