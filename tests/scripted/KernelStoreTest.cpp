@@ -82,7 +82,8 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     for (const Kernel& kernel : kernels)
         EXPECT_NE(kernel.get(), nullptr);
 
-    // Include directories are options, too; without double precision these differ, and so does the key.
+    // Include directories are options, too; without double precision these differ, and so does the
+    // key.
     TstringArray folders;
     folders.append("a");
     fStore->getKernel(path, "-DA", "skin", &folders);
