@@ -24,8 +24,26 @@ constexpr std::uint64_t kFenceWaitNanoseconds = 1'000'000'000;
 // The renderer's fence, or null while none is pending. Whoever exchanges it out deletes it.
 constinit std::atomic<GLsync> sfGraphicsFence = nullptr;
 
+// A mutex that is ready when the library loads: std::mutex needs a constructor on some systems.
+class FenceWaitMutex {
+public:
+    void lock()
+    {
+        while (fHeld.test_and_set(std::memory_order_acquire))
+            fHeld.wait(true, std::memory_order_relaxed);
+    }
+    void unlock()
+    {
+        fHeld.clear(std::memory_order_release);
+        fHeld.notify_one();
+    }
+
+private:
+    std::atomic_flag fHeld;
+};
+
 // Held from taking the fence out until it is deleted, so that nobody overtakes a wait.
-constinit std::mutex sfFenceWaitMutex;
+constinit FenceWaitMutex sfFenceWaitMutex;
 
 // The host's table when sync objects are usable, else null.
 GLFunctionTable* syncObjectFunctions()
