@@ -38,8 +38,6 @@ DeviceMemoryMonitor& monitor()
 
 } // namespace
 
-Zyl::Objects::AMemoryMonitor::~AMemoryMonitor() = default;
-
 // This host drives one adapter, so every index means that one.
 Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int /*adapter*/)
 {

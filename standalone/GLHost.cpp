@@ -79,8 +79,6 @@ std::unique_ptr<GLHostState> activate(QOpenGLContext& context, QOpenGLWindow* wi
 } // namespace
 } // namespace vyra::host
 
-GLFunctionTable* GLFunctionTable::fpGlobalFunctionTable = nullptr;
-
 QOpenGLWindow* Q3dPort::resourceWindow()
 {
     const vyra::host::GLHostState* const host = vyra::host::active.load();

@@ -9,8 +9,6 @@
 
 namespace {
 
-constinit const profiler::Category mainCategory{vyra::host::mainCategoryId};
-constinit const profiler::Categories allCategories{};
 constinit std::atomic<bool> sampling = false;
 
 // No event; what beginning one answers while nothing is recorded.
@@ -19,22 +17,6 @@ constexpr profiler::EventId noEvent = 0;
 } // namespace
 
 namespace profiler {
-
-const Category& Categories::main() const
-{
-    return mainCategory;
-}
-
-const Categories& categories()
-{
-    return allCategories;
-}
-
-EventType::EventType(const Category& category, Color color, const char* name,
-                     const char* description)
-    : fCategoryId(category.id()), fColor(color), fName(name), fDescription(description)
-{
-}
 
 bool samplingActive()
 {

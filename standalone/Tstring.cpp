@@ -2,9 +2,6 @@
 
 #include "standalone/FowlerNollVo.h"
 
-#include <QChar>
-#include <QString>
-
 #include <string_view>
 
 namespace {
@@ -14,6 +11,24 @@ int findFrom(const std::string& text, std::string_view wanted, int from)
     const std::size_t start = from > 0 ? static_cast<std::size_t>(from) : 0;
     const std::size_t found = text.find(wanted, start);
     return found == std::string::npos ? -1 : static_cast<int>(found);
+}
+
+// The UTF-8 sequence of a code point.
+std::string utf8(char32_t code)
+{
+    const auto lead = [code](char32_t mark, unsigned shift) {
+        return static_cast<char>(mark | code >> shift);
+    };
+    const auto next = [code](unsigned shift) {
+        return static_cast<char>(0x80 | (code >> shift & 0x3F));
+    };
+    if (code < 0x80)
+        return {static_cast<char>(code)};
+    if (code < 0x800)
+        return {lead(0xC0, 6), next(0)};
+    if (code < 0x10000)
+        return {lead(0xE0, 12), next(6), next(0)};
+    return {lead(0xF0, 18), next(12), next(6), next(0)};
 }
 
 } // namespace
@@ -53,16 +68,9 @@ int Tstring::findMB(const char* text, int from) const
 int Tstring::findMB(wchar_t character, int from) const
 {
     const auto code = static_cast<char32_t>(character);
-    if (code < 0x80) {
-        const char byte = static_cast<char>(code);
-        return findFrom(fText, std::string_view(&byte, 1), from);
-    }
     // Half of a surrogate pair is no character and has no bytes.
-    if (QChar::isSurrogate(code)) {
-        return -1;
-    }
-    const std::string utf8 = QString::fromUcs4(&code, 1).toStdString();
-    return findFrom(fText, utf8, from);
+    const bool isSurrogate = code >= 0xD800 && code < 0xE000;
+    return isSurrogate ? -1 : findFrom(fText, utf8(code), from);
 }
 
 void Tstring::removeInitialAndFinalSpaces()

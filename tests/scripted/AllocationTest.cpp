@@ -33,11 +33,12 @@ void* operator new(std::size_t size)
         throw std::bad_alloc();
     return memory;
 }
-void operator delete(void* memory) noexcept
+// Not inlined, or a compiler sees free where it expects the counterpart of new.
+[[gnu::noinline]] void operator delete(void* memory) noexcept
 {
     std::free(memory);
 }
-void operator delete(void* memory, std::size_t) noexcept
+[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
 {
     std::free(memory);
 }

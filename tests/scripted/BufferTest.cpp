@@ -239,8 +239,10 @@ TEST_P(BufferInState, ACopySharesTheMemoryAndNeitherMappingNorCount)
         copy = itself;
         copy = buffer();
     }
-    for (const std::string& line : calls())
-        EXPECT_THAT(line, ::testing::MatchesRegex("cl(Retain|Release)(MemObject|Event).*"));
+    using ::testing::StartsWith;
+    EXPECT_THAT(calls(), ::testing::Each(::testing::AnyOf(
+                             StartsWith("clRetainMemObject"), StartsWith("clReleaseMemObject"),
+                             StartsWith("clRetainEvent"), StartsWith("clReleaseEvent"))));
     buffer().reset(); // which alone unmaps and un-counts
     EXPECT_EQ(calls(), fSubject->dropping());
 }

@@ -7,9 +7,6 @@
 
 #include <memory>
 
-#include <QGuiApplication>
-#include <QOpenGLWindow>
-
 using namespace scripted;
 
 namespace {
@@ -121,11 +118,7 @@ TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
 TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
 {
     startInModes(2, 1);
-    setEnvironment("QT_QPA_PLATFORM", "offscreen");
-    int argc = 0;
-    const QGuiApplication application(argc, nullptr);
-    QOpenGLWindow window;
-    host().resourceWindow = &window;
+    const ResourceWindow window;
     const auto* buffer = create();
     const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
     for (const unsigned last : {0x911AU, 0x911CU, 0x911DU}) { // signalled, satisfied, failed
@@ -145,7 +138,6 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
     manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
     EXPECT_EQ(callsOf("gl"), Lines{}) << "each fence is waited for once";
     destroy(buffer);
-    host().resourceWindow = nullptr;
 }
 
 struct AbilityRow {

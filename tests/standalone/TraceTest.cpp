@@ -4,7 +4,6 @@
 
 #include <gmock/gmock.h>
 
-#include <iostream>
 #include <memory>
 #include <sstream>
 
@@ -19,7 +18,7 @@ TEST(TraceChannels, ListsTheChannelsThatExist)
     std::ostringstream output;
     auto first = std::make_unique<TdbTrace>(1, "first", output, "of two");
     const TdbTrace second(2, "second", TdebugOutput::sCerr(), "");
-    const auto isSecond = FieldsAre(2, StrEq("second"), StrEq(""), &std::cerr);
+    const auto isSecond = FieldsAre(2, StrEq("second"), StrEq(""), &TdebugOutput::sCerr());
     EXPECT_THAT(traceChannels(),
                 ElementsAre(FieldsAre(1, StrEq("first"), StrEq("of two"), &output), isSecond));
     first.reset();

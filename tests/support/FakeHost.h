@@ -10,6 +10,7 @@
 #include "host/GLDisplay.h"
 
 #include <cstddef>
+#include <memory>
 
 class QOpenGLWindow;
 
@@ -21,6 +22,17 @@ struct HostScript {
     QOpenGLWindow* resourceWindow = nullptr;
 };
 HostScript& host();
+
+// While it lives, there is a resource window.
+class ResourceWindow {
+public:
+    ResourceWindow();
+    ~ResourceWindow();
+
+private:
+    struct Window;
+    std::unique_ptr<Window> fWindow;
+};
 
 // What the memory monitor counts at present, in bytes.
 std::size_t deviceMemory();

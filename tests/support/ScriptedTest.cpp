@@ -3,7 +3,6 @@
 #include "diagnostics/CLWarningSink.h"
 #include "runtime/TopenCLInfo.h"
 
-#include <cstdlib>
 #include <mutex>
 #include <utility>
 
@@ -35,15 +34,6 @@ Lines livingObjects()
 }
 
 } // namespace
-
-void setEnvironment(const char* name, const char* value)
-{
-#if defined(_WIN32)
-    _putenv_s(name, value);
-#else
-    setenv(name, value, 1);
-#endif
-}
 
 ScriptedTest::ScriptedTest()
 {

@@ -6,6 +6,7 @@
 
 #include "FakeHost.h"
 #include "FakeRuntime.h"
+#include "Platform.h"
 
 #include <ostream>
 #include <string>
@@ -26,8 +27,6 @@ struct StartArguments {
     bool usingGLCoreProfile = true;
     unsigned vendorId = 0x8086;
 };
-
-void setEnvironment(const char* name, const char* value);
 
 // A row of a table of tests is derived from its name, which is its first initialiser.
 struct Named {

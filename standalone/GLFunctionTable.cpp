@@ -1,0 +1,3 @@
+#include "host/GLFunctionTable.h"
+
+GLFunctionTable* GLFunctionTable::fpGlobalFunctionTable = nullptr;

@@ -1,0 +1,3 @@
+#include "host/MemoryMonitor.h"
+
+Zyl::Objects::AMemoryMonitor::~AMemoryMonitor() = default;

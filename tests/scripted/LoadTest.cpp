@@ -1,0 +1,45 @@
+// The library itself, loaded and unloaded: in which order its static objects come and go.
+#include "FakeRuntime.h"
+#include "Platform.h"
+#include "buffers/TopenCLDataBuffer.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+template <typename T>
+T* find(void* library, const char* mangledName)
+{
+    return reinterpret_cast<T*>(symbolOf(library, mangledName));
+}
+
+} // namespace
+
+TEST(Load, BuildsTheStaticObjectsInOrderAndUnloadingDestroysThemInReverse)
+{
+    using Initialize = bool(void*, void*, void*, bool, bool, unsigned);
+    using Lines = std::vector<std::string>;
+    scripted::FakeRuntime& runtime = scripted::runtime();
+    runtime.describe({});
+
+    void* library = loadLibrary(VYRA_OPENCL_LIBRARY);
+    ASSERT_NE(library, nullptr);
+    EXPECT_EQ(
+        runtime.takeCalls(),
+        (Lines{"name \"positions\"", "name \"normals\"", "name \"geometryMatrix\"",
+               "name \"inverseGeometryMatrix\"", "name \"normalIdxToPositionIdx\"", "name \"\"",
+               "trace clKernel", "event type GPUOverrideAcquireQuorSharedBufferBatch",
+               "event type GPUOverrideReleaseQuorSharedBufferBatch"}));
+
+    // The null buffer goes without a trace, unless it has something to release.
+    auto* initialize = find<Initialize>(library, "_ZN11TopenCLInfo10initializeEPvS0_S0_bbj");
+    auto* null = find<TopenCLDataBuffer>(library, "_ZN17TopenCLDataBuffer6fsNULLE");
+    ASSERT_TRUE(initialize && null);
+    ASSERT_TRUE(initialize(nullptr, nullptr, nullptr, false, true, 0x8086));
+    const cl_context_properties none[] = {0};
+    const cl_context context = clCreateContext(none, 0, nullptr, nullptr, nullptr, nullptr);
+    *reinterpret_cast<cl_mem*>(null) = clCreateBuffer(context, 0, 64, nullptr, nullptr);
+    runtime.takeCalls();
+    unloadLibrary(library);
+    EXPECT_EQ(runtime.takeCalls(), (Lines{"trace gone: clKernel", "clReleaseMemObject(mem#1)"}));
+}
