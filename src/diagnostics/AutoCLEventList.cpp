@@ -6,35 +6,44 @@
 
 namespace {
 
-// Storage grows by one half, which wastes less than doubling; standard vectors here double.
-std::size_t grownCapacity(const std::vector<cl_event>& events, std::size_t needed)
+// Storage grows by one half, which wastes less than doubling.
+unsigned int grownCapacity(unsigned int capacity, unsigned int needed)
 {
-    return std::max(events.capacity() + events.capacity() / 2, needed);
+    return std::max(capacity + capacity / 2, needed);
 }
 
 } // namespace
 
 AutoCLEventList::AutoCLEventList() = default;
-AutoCLEventList::AutoCLEventList(const AutoCLEventList& other) = default;
 AutoCLEventList::~AutoCLEventList() = default;
+
+AutoCLEventList::AutoCLEventList(const AutoCLEventList& other)
+{
+    *this = other;
+}
 
 AutoCLEventList& AutoCLEventList::operator=(const AutoCLEventList& other)
 {
     if (this == &other)
         return *this;
-    if (other.fEvents.size() > fEvents.capacity()) {
-        std::vector<cl_event> grown;
-        grown.reserve(grownCapacity(fEvents, other.fEvents.size()));
-        fEvents.swap(grown);
+    if (other.fSize > fCapacity) {
+        const unsigned int capacity = grownCapacity(fCapacity, other.fSize);
+        fEvents = std::make_unique_for_overwrite<cl_event[]>(capacity);
+        fCapacity = capacity;
     }
-    fEvents.assign(other.fEvents.begin(), other.fEvents.end());
+    std::copy_n(other.fEvents.get(), other.fSize, fEvents.get());
+    fSize = other.fSize;
     return *this;
 }
 
 // Makes room for one more event at least.
 void AutoCLEventList::grow()
 {
-    fEvents.reserve(grownCapacity(fEvents, fEvents.size() + 1));
+    const unsigned int capacity = grownCapacity(fCapacity, fSize + 1);
+    auto grown = std::make_unique_for_overwrite<cl_event[]>(capacity);
+    std::copy_n(fEvents.get(), fSize, grown.get());
+    fEvents = std::move(grown);
+    fCapacity = capacity;
 }
 
 void AutoCLEventList::add(TopenCLBuffer& buffer)
@@ -44,10 +53,10 @@ void AutoCLEventList::add(TopenCLBuffer& buffer)
 
 const cl_event* AutoCLEventList::array() const
 {
-    return fEvents.empty() ? nullptr : fEvents.data();
+    return fSize ? fEvents.get() : nullptr;
 }
 
 unsigned int AutoCLEventList::size() const
 {
-    return static_cast<unsigned int>(fEvents.size());
+    return fSize;
 }

@@ -4,7 +4,7 @@
 #include "VyraOpenCLExport.h"
 #include "diagnostics/AutoCLObject.h"
 
-#include <vector>
+#include <memory>
 
 class TopenCLBuffer;
 
@@ -27,9 +27,9 @@ public:
     {
         if (!event.get())
             return;
-        if (fEvents.size() == fEvents.capacity())
+        if (fSize == fCapacity)
             grow();
-        fEvents.push_back(event.get());
+        fEvents[fSize++] = event.get();
     }
     // Appends the event of the buffer's last transfer, if it has one.
     void add(TopenCLBuffer& buffer);
@@ -42,5 +42,8 @@ public:
 private:
     void grow();
 
-    std::vector<cl_event> fEvents;
+    // Not a standard vector, which doubles and whose reserve costs more than the growth itself.
+    std::unique_ptr<cl_event[]> fEvents;
+    unsigned int fSize = 0;
+    unsigned int fCapacity = 0;
 };
