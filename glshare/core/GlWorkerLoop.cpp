@@ -69,14 +69,17 @@ void GlWorker::Loop::run()
             changed_.wait(lock);
         }
     }
-    if (hasGl_) {
-        hasGl_ = false;
-        context_->releaseCurrent();
-    }
+    // An exiting process waits for this, too.
+    isBusy_ = true;
     lock.unlock();
+    if (hasGl_.exchange(false))
+        context_->releaseCurrent();
     for (const Watch& watch : watches_)
         watch(nullptr);
     context_.reset();
+    lock.lock();
+    isBusy_ = false;
+    changed_.notify_all();
 }
 
 // The job is destroyed before the lock is taken again: it may be the last owner of its worker.
@@ -161,7 +164,7 @@ void GlWorker::Loop::leaveDisplay()
     Lock lock(mutex_);
     isDisplayClosing_ = true;
     changed_.notify_all();
-    changed_.wait(lock, [this] { return !hasGl_ || isExiting_; });
+    changed_.wait(lock, [this] { return (!hasGl_ && !isBusy_) || isExiting_; });
 }
 
 void GlWorker::Loop::park()
