@@ -24,26 +24,14 @@ constexpr std::uint64_t kFenceWaitNanoseconds = 1'000'000'000;
 // The renderer's fence, or null while none is pending. Whoever exchanges it out deletes it.
 constinit std::atomic<GLsync> sfGraphicsFence = nullptr;
 
-// A mutex that is ready when the library loads: std::mutex needs a constructor on some systems.
-class FenceWaitMutex {
-public:
-    void lock()
-    {
-        while (fHeld.test_and_set(std::memory_order_acquire))
-            fHeld.wait(true, std::memory_order_relaxed);
-    }
-    void unlock()
-    {
-        fHeld.clear(std::memory_order_release);
-        fHeld.notify_one();
-    }
-
-private:
-    std::atomic_flag fHeld;
-};
-
-// Held from taking the fence out until it is deleted, so that nobody overtakes a wait.
-constinit FenceWaitMutex sfFenceWaitMutex;
+// Held from taking the fence out until it is deleted, so that nobody overtakes a wait. Made with
+// the first wait: std::mutex needs a constructor on some systems, and no static object here may
+// have one.
+std::mutex& fenceWaitMutex()
+{
+    static std::mutex theMutex;
+    return theMutex;
+}
 
 // The host's table when sync objects are usable, else null.
 GLFunctionTable* syncObjectFunctions()
@@ -72,7 +60,7 @@ void WaitForGraphicsFence()
     if (!gl)
         return;
 
-    const std::scoped_lock lock(sfFenceWaitMutex);
+    const std::scoped_lock lock(fenceWaitMutex());
     GLsync fence = sfGraphicsFence.exchange(nullptr);
     if (!fence)
         return;

@@ -8,7 +8,7 @@
 #include "kernels/TopenCLKernelStore.h"
 
 #include <algorithm>
-#include <barrier>
+#include <atomic>
 #include <filesystem>
 #include <fstream>
 #include <functional>
@@ -25,12 +25,14 @@ constexpr int kRounds = 200;
 // Runs `body` on all threads, which begin together; the argument is the thread's number.
 void onThreads(const std::function<void(int)>& body)
 {
-    std::barrier start(kThreads);
+    std::atomic<int> arrived = 0;
     std::vector<std::jthread> threads;
     threads.reserve(kThreads);
     for (int thread = 0; thread < kThreads; ++thread) {
         threads.emplace_back([&, thread] {
-            start.arrive_and_wait();
+            ++arrived;
+            while (arrived < kThreads)
+                std::this_thread::yield();
             body(thread);
         });
     }
