@@ -1,8 +1,8 @@
 #include "core/ContextProperties.h"
 
 #include <algorithm>
-#include <array>
 #include <cstddef>
+#include <utility>
 
 namespace glshare {
 
@@ -42,20 +42,20 @@ void* pointerOf(cl_context_properties value)
 
 cl_int findBinding(const GlEntries& gl, std::optional<GlBinding>& binding)
 {
-    const std::array displays{gl.egl, gl.glx, gl.wgl, gl.cgl};
-    const auto given = std::ranges::count_if(displays, [](auto value) { return value != 0; });
-    if (given > 1 || gl.wgl != 0 || gl.cgl != 0)
+    std::vector<GlBinding> given;
+    for (const auto& [windowSystem, display] : {std::pair(WindowSystem::Glx, gl.glx),
+                                                {WindowSystem::Egl, gl.egl},
+                                                {WindowSystem::Wgl, gl.wgl}}) {
+        if (display != 0)
+            given.push_back({windowSystem, pointerOf(display), pointerOf(gl.context)});
+    }
+    if (given.size() > 1 || gl.cgl != 0 || (!given.empty() && !isSupported(given[0].windowSystem)))
         return CL_INVALID_OPERATION;
     if (gl.context == 0)
         return CL_SUCCESS;
-    if (given == 0)
+    if (given.empty() || !isShareable(given[0]))
         return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    const GlBinding wanted =
-        gl.glx != 0 ? GlBinding{WindowSystem::Glx, pointerOf(gl.glx), pointerOf(gl.context)}
-                    : GlBinding{WindowSystem::Egl, pointerOf(gl.egl), pointerOf(gl.context)};
-    if (!isShareable(wanted))
-        return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    binding = wanted;
+    binding = given[0];
     return CL_SUCCESS;
 }
 

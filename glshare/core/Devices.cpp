@@ -76,12 +76,25 @@ cl_platform_id platformOrFirst(cl_platform_id platform)
     return platform;
 }
 
+namespace {
+
+std::vector<std::string_view>& extensionsToAdd()
+{
+    static auto theExtensions = switches().glEvent ? std::vector<std::string_view>{kSharing, kEvent}
+                                                   : std::vector<std::string_view>{kSharing};
+    return theExtensions;
+}
+
+} // namespace
+
 const std::vector<std::string_view>& addedExtensions()
 {
-    static const auto theExtensions = switches().glEvent
-                                          ? std::vector<std::string_view>{kSharing, kEvent}
-                                          : std::vector<std::string_view>{kSharing};
-    return theExtensions;
+    return extensionsToAdd();
+}
+
+void addExtension(std::string_view name)
+{
+    extensionsToAdd().push_back(name);
 }
 
 bool containsExtension(std::string_view extensions, std::string_view name)

@@ -36,6 +36,9 @@ namespace glshare {
 // The extensions added here, in the order of the extension strings.
 [[nodiscard]] const std::vector<std::string_view>& addedExtensions();
 
+// For the shell, before the first question: one more, with what it offers itself. The text is kept.
+void addExtension(std::string_view name);
+
 // Whether `extensions`, a list separated by spaces, contains `name` as a word.
 [[nodiscard]] bool containsExtension(std::string_view extensions, std::string_view name);
 

@@ -2,6 +2,11 @@
 
 namespace glshare {
 
+bool isSupported(WindowSystem windowSystem)
+{
+    return windowSystem == WindowSystem::Glx || windowSystem == WindowSystem::Egl;
+}
+
 bool isShareable(const GlBinding& binding)
 {
     return binding.windowSystem == WindowSystem::Glx

@@ -9,12 +9,12 @@
 
 namespace glshare {
 
-enum class WindowSystem { Glx, Egl };
+enum class WindowSystem { Glx, Egl, Wgl };
 
 // The application's context, as it came in the properties of an OpenCL context.
 struct GlBinding {
     WindowSystem windowSystem;
-    void* display;
+    void* display; // with WGL, the device context of a window
     void* context;
 };
 
@@ -47,6 +47,10 @@ public:
     virtual void onDisplayClosing(std::function<void()> closing) = 0;
 };
 
+// Whether contexts of this window system are known on the system that this is built for. What
+// follows is for bindings of those.
+[[nodiscard]] bool isSupported(WindowSystem windowSystem);
+
 // Whether `binding` names a context that can be shared with, as far as the window system can tell
 // without a risk.
 [[nodiscard]] bool isShareable(const GlBinding& binding);
@@ -55,7 +59,7 @@ public:
 // while the application's context is current on another.
 [[nodiscard]] std::unique_ptr<GlContext> createSharingContext(const GlBinding& binding);
 
-// The parts of the two functions above for each window system.
+// The parts of the two functions above for each window system of Linux.
 [[nodiscard]] bool isShareableGlx(void* display, void* context);
 [[nodiscard]] bool isShareableEgl(void* display, void* context);
 [[nodiscard]] std::unique_ptr<GlContext> createGlxContext(void* display, void* shareContext);

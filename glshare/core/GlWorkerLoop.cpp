@@ -1,7 +1,8 @@
 #include "core/GlWorkerLoop.h"
 
+#include "core/LibraryFunctions.h"
+
 #include <chrono>
-#include <cstdlib>
 #include <iterator>
 #include <utility>
 
@@ -190,7 +191,7 @@ void GlWorker::Loop::listenForExit(const std::shared_ptr<Loop>& loop)
     std::erase_if(running.loops, [](const std::weak_ptr<Loop>& other) { return other.expired(); });
     running.loops.push_back(loop);
     if (!std::exchange(running.isRegistered, true))
-        std::atexit(parkAll);
+        callAtExit(parkAll);
 }
 
 void GlWorker::Loop::parkAll()

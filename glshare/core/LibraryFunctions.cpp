@@ -1,5 +1,7 @@
 #include "core/LibraryFunctions.h"
 
+#include <cstdlib>
+
 #include <dlfcn.h>
 
 namespace glshare {
@@ -9,6 +11,11 @@ LibraryFunctions::LibraryFunctions(const char* fileName) : library_(dlopen(fileN
 void* LibraryFunctions::address(const char* name) const
 {
     return library_ == nullptr ? nullptr : dlsym(library_, name);
+}
+
+void callAtExit(void (*call)())
+{
+    std::atexit(call);
 }
 
 } // namespace glshare

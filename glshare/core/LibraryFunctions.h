@@ -22,4 +22,8 @@ private:
     void* library_;
 };
 
+// Has `call` called when the process exits, while threads that use the libraries still run; never
+// where the system ends all threads first.
+void callAtExit(void (*call)());
+
 } // namespace glshare

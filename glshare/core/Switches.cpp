@@ -7,6 +7,8 @@ namespace glshare {
 
 namespace {
 
+bool isZeroCopyAllowed = true;
+
 bool isOn(const char* variable)
 {
     const char* value = std::getenv(variable);
@@ -15,10 +17,15 @@ bool isOn(const char* variable)
 
 } // namespace
 
+void forbidZeroCopy()
+{
+    isZeroCopyAllowed = false;
+}
+
 const Switches& switches()
 {
     static const Switches theSwitches{isOn("GLSHARE_GL_EVENT"), isOn("GLSHARE_CPU_AS_GPU"),
-                                      isOn("GLSHARE_ZERO_COPY")};
+                                      isZeroCopyAllowed && isOn("GLSHARE_ZERO_COPY")};
     return theSwitches;
 }
 

@@ -9,6 +9,10 @@ struct Switches {
     bool zeroCopy; // GLSHARE_ZERO_COPY: use a GL buffer's own storage where that is possible
 };
 
+// For the shell, before the first question: has every buffer copied, where a runtime does not tell
+// when it needs a memory object's storage no more.
+void forbidZeroCopy();
+
 // Each switch is on unless its variable is "0". Safe from any thread.
 const Switches& switches();
 

@@ -57,7 +57,7 @@ protected:
     Mesh makeMesh()
     {
         Mesh mesh;
-        mesh.glBuffer = makeGLBuffer(std::vector<float>(kElements, 0.0F));
+        mesh.glBuffer = renderer().makeBuffer(std::vector<float>(kElements, 0.0F));
         mesh.add = deformKernel("add");
         mesh.scale = deformKernel("scale");
         mesh.queue.reset(TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr));
@@ -76,9 +76,7 @@ protected:
     // What the renderer draws from before the evaluation.
     void writeThroughGL(const Mesh& mesh, float value)
     {
-        const std::vector<float> values(kElements, value);
-        gl().glBindBuffer(GL_ARRAY_BUFFER, mesh.glBuffer);
-        gl().glBufferSubData(GL_ARRAY_BUFFER, 0, kElements * sizeof(float), values.data());
+        renderer().writeBuffer(mesh.glBuffer, std::vector<float>(kElements, value));
     }
 
     // A deformer: x -> 2 (x + 1), with its input acquired and its last event handed over.
@@ -137,7 +135,7 @@ protected:
     void evaluate(std::vector<Mesh>& meshes, int frame)
     {
         if (TopenCLInfo::theOne().useGLFinish())
-            gl().glFinish();
+            renderer().finish();
         const em::Id id(static_cast<std::uint16_t>(frame));
         manager().PreEvaluate(id);
         deformInParallel(meshes);
@@ -147,14 +145,15 @@ protected:
 
     void expectEverywhere(const Mesh& mesh, float value, int frame)
     {
-        EXPECT_EQ(readGLBuffer(mesh.glBuffer, kElements), std::vector<float>(kElements, value))
+        EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements),
+                  std::vector<float>(kElements, value))
             << "frame " << frame;
     }
 
     void renderingComplete()
     {
         manager().RenderingComplete();
-        gl().glFlush();
+        renderer().flush();
     }
 };
 
@@ -193,14 +192,14 @@ TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
             writeThroughGL(mesh, 5.0F);
         renderingComplete();
         if (TopenCLInfo::theOne().useGLFinish())
-            gl().glFinish();
+            renderer().finish();
         const em::Id id(static_cast<std::uint16_t>(frame));
         manager().PreEvaluate(id);
         // The middle mesh changes its level of detail: its buffer goes and another comes.
         EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(meshes[1].shared), CL_SUCCESS);
-        gl().glDeleteBuffers(1, &meshes[1].glBuffer);
-        meshes[1].glBuffer = makeGLBuffer(std::vector<float>(kElements, 5.0F));
-        gl().glFinish();
+        renderer().deleteBuffer(meshes[1].glBuffer);
+        meshes[1].glBuffer = renderer().makeBuffer(std::vector<float>(kElements, 5.0F));
+        renderer().finish();
         share(meshes[1]);
         EXPECT_FALSE(meshes[1].shared->fInBatch);
         deformInParallel(meshes);

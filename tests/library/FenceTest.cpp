@@ -47,7 +47,7 @@ TEST_F(Fence, EachIsWaitedForOnceWhoeverAcquiresFirst)
     std::vector<const TopenCLSharedBuffer*> records(kBuffers);
     for (std::size_t index = 0; index < kBuffers; ++index) {
         int error = CL_SUCCESS;
-        names[index] = makeGLBuffer(std::vector<float>(64, 1.0F));
+        names[index] = renderer().makeBuffer(std::vector<float>(64, 1.0F));
         records[index] = manager.CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
                                                       CL_MEM_READ_WRITE, &names[index], &error);
         ASSERT_NE(records[index], nullptr);

@@ -1,18 +1,14 @@
-// A hidden OpenGL context, the stand-in host around it, and the library initialised on both.
+// A renderer, and the library initialised on it.
 #pragma once
 
+#include "Renderer.h"
 #include "diagnostics/AutoCLObject.h"
-#include "standalone/GLHost.h"
 
 #include <initializer_list>
 #include <memory>
 #include <string>
 #include <vector>
 
-#include <QGuiApplication>
-#include <QOffscreenSurface>
-#include <QOpenGLContext>
-#include <QOpenGLExtraFunctions>
 #include <gtest/gtest.h>
 
 struct Variable {
@@ -28,22 +24,14 @@ protected:
     void start(std::initializer_list<Variable> environment = {});
     ~LibraryTest() override;
 
-    QOpenGLExtraFunctions& gl() { return *fContext->extraFunctions(); }
-
-    // A buffer of the renderer that holds `values`, and what one holds.
-    unsigned makeGLBuffer(const std::vector<float>& values);
-    std::vector<float> readGLBuffer(unsigned name, std::size_t count);
+    Renderer& renderer() { return *fRenderer; }
 
     // The kernel `name` of kernels/deform.cl.
     static AutoCLObject<cl_kernel> deformKernel(const char* name);
     static std::string kernelPath(const char* fileName);
 
 private:
-    // The first members go last: the application outlives everything of Qt's.
-    std::unique_ptr<QGuiApplication> fApplication;
-    std::unique_ptr<QOffscreenSurface> fSurface;
-    std::unique_ptr<QOpenGLContext> fContext;
-    std::unique_ptr<GLHost> fHost;
+    std::unique_ptr<Renderer> fRenderer;
 };
 
 // Enqueues `kernel` over `count` floats of `memory` with the argument `amount`, sized with

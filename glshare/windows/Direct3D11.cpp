@@ -1,0 +1,237 @@
+#include "windows/Direct3D11.h"
+
+#include "core/Answer.h"
+#include "core/Devices.h"
+#include "entry/EntryPoints.h"
+#include "windows/Direct3D11Buffer.h"
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <span>
+#include <string>
+#include <vector>
+
+#include <CL/cl_d3d11.h>
+
+namespace glshare {
+
+namespace {
+
+struct SharedRecord {
+    Direct3D11Buffer buffer;
+    cl_context context;
+    bool isAcquired = false;
+};
+
+// Which handles mean something here. Never destroyed, as objects may be released at exit.
+struct Records {
+    std::mutex mutex;                            // guards the rest
+    std::map<cl_context, ID3D11Device*> devices; // the application's, which outlive their contexts
+    std::map<cl_mem, std::shared_ptr<SharedRecord>> buffers;
+
+    static Records& get()
+    {
+        static auto* const theRecords = new Records;
+        return *theRecords;
+    }
+};
+
+// The functions that were in front before.
+cl_icd_dispatch inFront{};
+
+cl_int CL_API_CALL getDeviceIds(cl_platform_id platform, cl_d3d11_device_source_khr source,
+                                void* object, cl_d3d11_device_set_khr set, cl_uint capacity,
+                                cl_device_id* devices, cl_uint* count)
+{
+    if (source != CL_D3D11_DEVICE_KHR || object == nullptr)
+        return CL_INVALID_VALUE;
+    if (set != CL_PREFERRED_DEVICES_FOR_D3D11_KHR && set != CL_ALL_DEVICES_FOR_D3D11_KHR)
+        return CL_INVALID_VALUE;
+    const std::vector<cl_device_id> all = devicesOf(platform, CL_DEVICE_TYPE_ALL);
+    if (all.empty())
+        return CL_DEVICE_NOT_FOUND;
+    if (devices != nullptr)
+        std::copy_n(all.begin(), std::min<std::size_t>(all.size(), capacity), devices);
+    if (count != nullptr)
+        *count = static_cast<cl_uint>(all.size());
+    return CL_SUCCESS;
+}
+
+void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
+{
+    Records& records = Records::get();
+    const std::scoped_lock lock(records.mutex);
+    records.buffers.erase(memory);
+}
+
+cl_mem CL_API_CALL createFromBuffer(cl_context context, cl_mem_flags flags, ID3D11Buffer* resource,
+                                    cl_int* error)
+{
+    Records& records = Records::get();
+    ID3D11Device* device = nullptr;
+    {
+        const std::scoped_lock lock(records.mutex);
+        if (const auto found = records.devices.find(context); found != records.devices.end())
+            device = found->second;
+    }
+    cl_int result = device == nullptr ? CL_INVALID_CONTEXT : CL_INVALID_D3D11_RESOURCE_KHR;
+    std::optional<Direct3D11Buffer> buffer =
+        device == nullptr ? std::nullopt : Direct3D11Buffer::create(device, resource);
+    cl_mem memory = nullptr;
+    if (buffer)
+        memory = runtime().clCreateBuffer(context, flags, buffer->size(), nullptr, &result);
+    if (memory != nullptr) {
+        const std::scoped_lock lock(records.mutex);
+        records.buffers[memory] =
+            std::make_shared<SharedRecord>(SharedRecord{std::move(*buffer), context});
+        runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
+    }
+    setError(error, result);
+    return memory;
+}
+
+// The records of all objects, marked as `acquired`; or why that cannot be, and nothing changed.
+cl_int mark(std::span<const cl_mem> memory, bool acquired,
+            std::vector<std::shared_ptr<SharedRecord>>& found)
+{
+    Records& records = Records::get();
+    const std::scoped_lock lock(records.mutex);
+    for (cl_mem object : memory) {
+        const auto record = records.buffers.find(object);
+        if (record == records.buffers.end())
+            return CL_INVALID_MEM_OBJECT;
+        if (record->second->isAcquired == acquired ||
+            std::ranges::find(found, record->second) != found.end())
+            return acquired ? CL_D3D11_RESOURCE_ALREADY_ACQUIRED_KHR
+                            : CL_D3D11_RESOURCE_NOT_ACQUIRED_KHR;
+        found.push_back(record->second);
+    }
+    for (const auto& record : found)
+        record->isAcquired = acquired;
+    return CL_SUCCESS;
+}
+
+cl_int copy(cl_command_queue queue, cl_mem memory, Direct3D11Buffer& buffer, bool toOpenCl)
+{
+    std::vector<std::byte> bytes(buffer.size());
+    if (toOpenCl) {
+        if (!buffer.read(bytes))
+            return CL_OUT_OF_RESOURCES;
+        return runtime().clEnqueueWriteBuffer(queue, memory, CL_TRUE, 0, bytes.size(), bytes.data(),
+                                              0, nullptr, nullptr);
+    }
+    const cl_int error = runtime().clEnqueueReadBuffer(queue, memory, CL_TRUE, 0, bytes.size(),
+                                                       bytes.data(), 0, nullptr, nullptr);
+    if (error != CL_SUCCESS)
+        return error;
+    return buffer.write(bytes) ? CL_SUCCESS : CL_OUT_OF_RESOURCES;
+}
+
+template <bool acquired>
+cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* memory,
+                           cl_uint waitCount, const cl_event* waitList, cl_event* event)
+{
+    if ((count == 0) != (memory == nullptr))
+        return CL_INVALID_VALUE;
+    const std::span objects(memory, count);
+    std::vector<std::shared_ptr<SharedRecord>> records;
+    if (const cl_int error = mark(objects, acquired, records); error != CL_SUCCESS)
+        return error;
+    if (waitCount > 0 && runtime().clWaitForEvents(waitCount, waitList) != CL_SUCCESS)
+        return CL_INVALID_EVENT_WAIT_LIST;
+    for (std::size_t i = 0; i < records.size(); ++i) {
+        if (const cl_int error = copy(queue, objects[i], records[i]->buffer, acquired);
+            error != CL_SUCCESS)
+            return error;
+    }
+    return runtime().clEnqueueMarkerWithWaitList(queue, 0, nullptr, event);
+}
+
+// The list without its Direct3D device, which goes to `device`.
+std::vector<cl_context_properties> withoutDevice(const cl_context_properties* list,
+                                                 ID3D11Device*& device)
+{
+    std::vector<cl_context_properties> others;
+    for (; list != nullptr && *list != 0; list += 2) {
+        if (list[0] == CL_CONTEXT_D3D11_DEVICE_KHR)
+            device = reinterpret_cast<ID3D11Device*>(list[1]); // NOLINT(performance-no-int-to-ptr)
+        else
+            others.insert(others.end(), {list[0], list[1]});
+    }
+    others.push_back(0);
+    return others;
+}
+
+cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl_uint count,
+                                     const cl_device_id* devices, entry::ContextNotify notify,
+                                     void* user, cl_int* error)
+{
+    ID3D11Device* device = nullptr;
+    const std::vector<cl_context_properties> others = withoutDevice(properties, device);
+    if (device == nullptr)
+        return inFront.clCreateContext(properties, count, devices, notify, user, error);
+    cl_context context =
+        inFront.clCreateContext(others.data(), count, devices, notify, user, error);
+    if (context != nullptr) {
+        Records& records = Records::get();
+        const std::scoped_lock lock(records.mutex);
+        records.devices[context] = device;
+    }
+    return context;
+}
+
+// What GLSHARE_D3D11 says, in the way in which the extension ends its functions' names.
+std::string suffix()
+{
+    const char* value = std::getenv("GLSHARE_D3D11");
+    const std::string_view wanted = value == nullptr ? "khr" : value;
+    if (wanted == "0")
+        return "";
+    return wanted == "nv" ? "NV" : "KHR";
+}
+
+void* CL_API_CALL findFunction(const char* name)
+{
+    void* own = name == nullptr ? nullptr : findDirect3D11Function(name);
+    return own != nullptr ? own : inFront.clGetExtensionFunctionAddress(name);
+}
+
+void* CL_API_CALL findFunctionForPlatform(cl_platform_id platform, const char* name)
+{
+    void* own = name == nullptr ? nullptr : findDirect3D11Function(name);
+    return own != nullptr ? own : inFront.clGetExtensionFunctionAddressForPlatform(platform, name);
+}
+
+} // namespace
+
+void installDirect3D11(cl_icd_dispatch& table)
+{
+    if (suffix().empty())
+        return;
+    addExtension(suffix() == "NV" ? "cl_nv_d3d11_sharing" : "cl_khr_d3d11_sharing");
+    inFront = table;
+    table.clCreateContext = createContext;
+    table.clGetExtensionFunctionAddress = findFunction;
+    table.clGetExtensionFunctionAddressForPlatform = findFunctionForPlatform;
+}
+
+void* findDirect3D11Function(std::string_view name)
+{
+    const std::array<std::pair<std::string, void*>, 4> functions{{
+        {"clGetDeviceIDsFromD3D11" + suffix(), reinterpret_cast<void*>(getDeviceIds)},
+        {"clCreateFromD3D11Buffer" + suffix(), reinterpret_cast<void*>(createFromBuffer)},
+        {"clEnqueueAcquireD3D11Objects" + suffix(), reinterpret_cast<void*>(enqueue<true>)},
+        {"clEnqueueReleaseD3D11Objects" + suffix(), reinterpret_cast<void*>(enqueue<false>)},
+    }};
+    for (const auto& [ownName, address] : functions) {
+        if (ownName == name)
+            return address;
+    }
+    return nullptr;
+}
+
+} // namespace glshare

@@ -1,0 +1,139 @@
+// Implements GlContext for WGL.
+//
+// The context is made on the application's device context, and used on a window of our own of the
+// same pixel format, which belongs to the worker's thread.
+#include "core/GlContext.h"
+#include "core/LibraryFunctions.h"
+
+#include <array>
+
+#include <windows.h>
+
+#include <GL/gl.h>
+#include <GL/wglext.h>
+
+namespace glshare {
+
+namespace {
+
+struct WglFunctions {
+    decltype(&::wglCreateContext) createContext = nullptr;
+    decltype(&::wglDeleteContext) deleteContext = nullptr;
+    decltype(&::wglGetCurrentContext) getCurrentContext = nullptr;
+    decltype(&::wglGetProcAddress) getProcAddress = nullptr;
+    decltype(&::wglMakeCurrent) makeCurrent = nullptr;
+    decltype(&::DescribePixelFormat) describePixelFormat = nullptr;
+    decltype(&::GetPixelFormat) getPixelFormat = nullptr;
+    decltype(&::SetPixelFormat) setPixelFormat = nullptr;
+    // Whether all of the above were found. Nothing may be called otherwise.
+    bool complete = false;
+};
+
+WglFunctions loadWgl()
+{
+    WglFunctions wgl;
+    const LibraryFunctions gl("opengl32.dll");
+    const LibraryFunctions gdi("gdi32.dll");
+    wgl.complete = gl.find(wgl.createContext, "wglCreateContext") &&
+                   gl.find(wgl.deleteContext, "wglDeleteContext") &&
+                   gl.find(wgl.getCurrentContext, "wglGetCurrentContext") &&
+                   gl.find(wgl.getProcAddress, "wglGetProcAddress") &&
+                   gl.find(wgl.makeCurrent, "wglMakeCurrent") &&
+                   gdi.find(wgl.describePixelFormat, "DescribePixelFormat") &&
+                   gdi.find(wgl.getPixelFormat, "GetPixelFormat") &&
+                   gdi.find(wgl.setPixelFormat, "SetPixelFormat");
+    return wgl;
+}
+
+const WglFunctions& wgl()
+{
+    static const WglFunctions theFunctions = loadWgl();
+    return theFunctions;
+}
+
+// wglGetProcAddress knows extensions and what came after OpenGL 1.1; the library itself the rest.
+void* resolveGl(const char* name)
+{
+    if (const PROC extension = wgl().getProcAddress(name))
+        return reinterpret_cast<void*>(extension);
+    static const LibraryFunctions gl("opengl32.dll");
+    void* function = nullptr;
+    return gl.find(function, name) ? function : nullptr;
+}
+
+class WglContext final : public GlContext {
+public:
+    WglContext(HGLRC context, int pixelFormat) : context_(context), pixelFormat_(pixelFormat) {}
+
+    ~WglContext() override { wgl().deleteContext(context_); }
+
+    bool makeCurrent() override
+    {
+        window_ = CreateWindowExW(0, L"STATIC", L"glshare", WS_POPUP, 0, 0, 1, 1, nullptr, nullptr,
+                                  nullptr, nullptr);
+        device_ = GetDC(window_);
+        PIXELFORMATDESCRIPTOR description{};
+        wgl().describePixelFormat(device_, pixelFormat_, sizeof description, &description);
+        return wgl().setPixelFormat(device_, pixelFormat_, &description) &&
+               wgl().makeCurrent(device_, context_);
+    }
+
+    // On the thread that has made the context current, whose the window is.
+    void releaseCurrent() override
+    {
+        wgl().makeCurrent(nullptr, nullptr);
+        ReleaseDC(window_, device_);
+        DestroyWindow(window_);
+    }
+
+    void abandon() override {}
+
+    bool callerHasContext() const override { return wgl().getCurrentContext() != nullptr; }
+
+    GlFunctions::Resolver resolver() const override { return resolveGl; }
+
+    void onDisplayClosing(std::function<void()>) override {}
+
+private:
+    HGLRC context_;
+    int pixelFormat_;
+    HWND window_ = nullptr;
+    HDC device_ = nullptr;
+};
+
+} // namespace
+
+bool isSupported(WindowSystem windowSystem)
+{
+    return windowSystem == WindowSystem::Wgl;
+}
+
+bool isShareable(const GlBinding& binding)
+{
+    return binding.context != nullptr && wgl().complete &&
+           wgl().getPixelFormat(static_cast<HDC>(binding.display)) != 0;
+}
+
+// A context of the application's must be current: only then does WGL tell of its extensions.
+std::unique_ptr<GlContext> createSharingContext(const GlBinding& binding)
+{
+    const auto device = static_cast<HDC>(binding.display);
+    const auto create = reinterpret_cast<PFNWGLCREATECONTEXTATTRIBSARBPROC>(
+        resolveGl("wglCreateContextAttribsARB"));
+    if (create == nullptr)
+        return nullptr;
+    // 3.3 is the oldest version that has all we call.
+    const std::array<int, 7> attributes{WGL_CONTEXT_MAJOR_VERSION_ARB,
+                                        3,
+                                        WGL_CONTEXT_MINOR_VERSION_ARB,
+                                        3,
+                                        WGL_CONTEXT_PROFILE_MASK_ARB,
+                                        WGL_CONTEXT_CORE_PROFILE_BIT_ARB,
+                                        0};
+    const HGLRC context = create(device, static_cast<HGLRC>(binding.context), attributes.data());
+    if (context == nullptr)
+        return nullptr;
+    return std::make_unique<WglContext>(context, wgl().getPixelFormat(device));
+}
+
+} // namespace glshare
