@@ -20,12 +20,6 @@ constexpr std::uint64_t glTimeoutIgnored = ~std::uint64_t{0};
 // which handing over a call (microseconds) is cheap.
 constexpr std::uint64_t turnNs = 1'000'000;
 
-#if defined(_WIN32)
-constexpr const char* openCLLibrary = "OpenCL.dll";
-#else
-constexpr const char* openCLLibrary = "libOpenCL.so.1";
-#endif
-
 template <class Function>
 void resolve(QOpenGLContext& context, const char* name, Function*& function)
 {
