@@ -23,7 +23,6 @@ namespace {
 
 struct SharedRecord {
     Direct3D11Buffer buffer;
-    cl_context context;
     bool isAcquired = false;
 };
 
@@ -86,8 +85,7 @@ cl_mem CL_API_CALL createFromBuffer(cl_context context, cl_mem_flags flags, ID3D
         memory = runtime().clCreateBuffer(context, flags, buffer->size(), nullptr, &result);
     if (memory != nullptr) {
         const std::scoped_lock lock(records.mutex);
-        records.buffers[memory] =
-            std::make_shared<SharedRecord>(SharedRecord{std::move(*buffer), context});
+        records.buffers[memory] = std::make_shared<SharedRecord>(SharedRecord{std::move(*buffer)});
         runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
     }
     setError(error, result);
@@ -131,6 +129,19 @@ cl_int copy(cl_command_queue queue, cl_mem memory, Direct3D11Buffer& buffer, boo
     return buffer.write(bytes) ? CL_SUCCESS : CL_OUT_OF_RESOURCES;
 }
 
+// Waits and copies; a failure leaves the rest undone.
+cl_int copyAll(cl_command_queue queue, std::span<const cl_mem> memory,
+               std::span<const std::shared_ptr<SharedRecord>> records,
+               std::span<const cl_event> waitList, bool toOpenCl)
+{
+    cl_int error = CL_SUCCESS;
+    if (!waitList.empty())
+        error = runtime().clWaitForEvents(static_cast<cl_uint>(waitList.size()), waitList.data());
+    for (std::size_t i = 0; error == CL_SUCCESS && i < records.size(); ++i)
+        error = copy(queue, memory[i], records[i]->buffer, toOpenCl);
+    return error;
+}
+
 template <bool acquired>
 cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* memory,
                            cl_uint waitCount, const cl_event* waitList, cl_event* event)
@@ -141,14 +152,15 @@ cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* 
     std::vector<std::shared_ptr<SharedRecord>> records;
     if (const cl_int error = mark(objects, acquired, records); error != CL_SUCCESS)
         return error;
-    if (waitCount > 0 && runtime().clWaitForEvents(waitCount, waitList) != CL_SUCCESS)
-        return CL_INVALID_EVENT_WAIT_LIST;
-    for (std::size_t i = 0; i < records.size(); ++i) {
-        if (const cl_int error = copy(queue, objects[i], records[i]->buffer, acquired);
-            error != CL_SUCCESS)
-            return error;
+    cl_int error = copyAll(queue, objects, records, {waitList, waitCount}, acquired);
+    if (error == CL_SUCCESS)
+        error = runtime().clEnqueueMarkerWithWaitList(queue, 0, nullptr, event);
+    if (error != CL_SUCCESS) {
+        const std::scoped_lock lock(Records::get().mutex);
+        for (const auto& record : records)
+            record->isAcquired = !acquired;
     }
-    return runtime().clEnqueueMarkerWithWaitList(queue, 0, nullptr, event);
+    return error;
 }
 
 // The list without its Direct3D device, which goes to `device`.
@@ -172,15 +184,14 @@ cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl
 {
     ID3D11Device* device = nullptr;
     const std::vector<cl_context_properties> others = withoutDevice(properties, device);
-    if (device == nullptr)
-        return inFront.clCreateContext(properties, count, devices, notify, user, error);
-    cl_context context =
-        inFront.clCreateContext(others.data(), count, devices, notify, user, error);
-    if (context != nullptr) {
-        Records& records = Records::get();
-        const std::scoped_lock lock(records.mutex);
+    cl_context context = inFront.clCreateContext(device == nullptr ? properties : others.data(),
+                                                 count, devices, notify, user, error);
+    // The handle may have been another context's before.
+    Records& records = Records::get();
+    const std::scoped_lock lock(records.mutex);
+    records.devices.erase(context);
+    if (context != nullptr && device != nullptr)
         records.devices[context] = device;
-    }
     return context;
 }
 

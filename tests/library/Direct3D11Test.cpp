@@ -7,8 +7,9 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
+#include <string>
 
-#include <d3d11.h>
+#include <CL/cl_d3d11.h>
 
 namespace {
 
@@ -25,6 +26,17 @@ class Direct3D11 : public LibraryTest, public testing::WithParamInterface<const 
 protected:
     void SetUp() override
     {
+        makeDevice();
+        setEnvironment("VYRA_OPENCL_PLATFORM", "The pocl project");
+        setEnvironment("GLSHARE_D3D11", GetParam());
+        ASSERT_TRUE(TopenCLInfo::initialize(nullptr, fDevice.get(), nullptr, true, false, 0));
+        ASSERT_TRUE(TopenCLInfo::theOne().usingDX());
+    }
+
+    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+
+    void makeDevice()
+    {
         ID3D11Device* device = nullptr;
         ID3D11DeviceContext* commands = nullptr;
         ASSERT_EQ(D3D11CreateDevice(nullptr, D3D_DRIVER_TYPE_HARDWARE, nullptr, 0, nullptr, 0,
@@ -32,13 +44,13 @@ protected:
                   S_OK);
         fDevice.reset(device);
         fCommands.reset(commands);
-        setEnvironment("VYRA_OPENCL_PLATFORM", "The pocl project");
-        setEnvironment("GLSHARE_D3D11", GetParam());
-        ASSERT_TRUE(TopenCLInfo::initialize(nullptr, device, nullptr, true, false, 0));
-        ASSERT_TRUE(TopenCLInfo::theOne().usingDX());
     }
 
-    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+    static const TopenCLSharedBuffer* share(ID3D11Buffer* buffer, int& error)
+    {
+        return manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
+                                              CL_MEM_READ_WRITE, buffer, &error);
+    }
 
     Pointer<ID3D11Buffer> makeBuffer(D3D11_USAGE usage, UINT bindFlags, UINT access)
     {
@@ -92,9 +104,7 @@ TEST_P(Direct3D11, NumbersArriveInTheBuffers)
     for (int index = 0; index < 3; ++index) {
         int error = CL_SUCCESS;
         buffers.push_back(makeBuffer(D3D11_USAGE_DEFAULT, D3D11_BIND_VERTEX_BUFFER, 0));
-        shared.push_back(manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
-                                                        CL_MEM_READ_WRITE, buffers.back().get(),
-                                                        &error));
+        shared.push_back(share(buffers.back().get(), error));
         ASSERT_NE(shared.back(), nullptr) << error;
     }
     const AutoCLObject<cl_kernel> add = deformKernel("add");
@@ -116,5 +126,35 @@ TEST_P(Direct3D11, NumbersArriveInTheBuffers)
     for (const TopenCLSharedBuffer* record : shared)
         EXPECT_EQ(manager().DestroySharedCLBuffer(record), CL_SUCCESS);
 }
+
+TEST_P(Direct3D11, WhatIsOnTheOtherSideOrOfAnotherDeviceIsRefused)
+{
+    const auto function = [](const std::string& name) {
+        const std::string suffix = std::string(GetParam()) == "nv" ? "NV" : "KHR";
+        return reinterpret_cast<clEnqueueAcquireD3D11ObjectsKHR_fn>(
+            clGetExtensionFunctionAddress((name + suffix).c_str()));
+    };
+    const auto acquire = function("clEnqueueAcquireD3D11Objects");
+    const auto release = function("clEnqueueReleaseD3D11Objects");
+    const auto buffer = makeBuffer(D3D11_USAGE_DEFAULT, D3D11_BIND_VERTEX_BUFFER, 0);
+    int error = CL_SUCCESS;
+    const TopenCLSharedBuffer* shared = share(buffer.get(), error);
+    ASSERT_NE(shared, nullptr);
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    const cl_mem memory = shared->fMem.get();
+    EXPECT_EQ(release(queue, 1, &memory, 0, nullptr, nullptr), CL_D3D11_RESOURCE_NOT_ACQUIRED_KHR);
+    EXPECT_EQ(acquire(queue, 1, &memory, 0, nullptr, nullptr), CL_SUCCESS);
+    EXPECT_EQ(acquire(queue, 1, &memory, 0, nullptr, nullptr),
+              CL_D3D11_RESOURCE_ALREADY_ACQUIRED_KHR);
+    EXPECT_EQ(release(queue, 1, &memory, 0, nullptr, nullptr), CL_SUCCESS);
+    manager().DestroySharedCLBuffer(shared);
+
+    const Pointer<ID3D11Device> first = std::move(fDevice);
+    makeDevice();
+    const auto other = makeBuffer(D3D11_USAGE_DEFAULT, D3D11_BIND_VERTEX_BUFFER, 0);
+    EXPECT_EQ(share(other.get(), error), nullptr);
+    EXPECT_EQ(error, CL_INVALID_D3D11_RESOURCE_KHR);
+}
+
 INSTANTIATE_TEST_SUITE_P(Extension, Direct3D11, testing::Values("khr", "nv"),
                          [](const auto& row) { return std::string(row.param); });
