@@ -6,6 +6,7 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <algorithm>
 #include <thread>
 
 namespace {
@@ -103,9 +104,17 @@ protected:
         clFlush(mesh.queue.get());
     }
 
+    std::vector<Mesh> makeMeshes()
+    {
+        std::vector<Mesh> meshes(3);
+        std::generate(meshes.begin(), meshes.end(), [this] { return makeMesh(); });
+        return meshes;
+    }
+
     static void deformInParallel(std::vector<Mesh>& meshes)
     {
         std::vector<std::thread> deformers;
+        deformers.reserve(meshes.size());
         for (Mesh& mesh : meshes)
             deformers.emplace_back([&mesh] { deform(mesh); });
         for (std::thread& deformer : deformers)
@@ -161,9 +170,7 @@ protected:
 
 TEST_P(Evaluation, NumbersArriveInGLMemory)
 {
-    std::vector<Mesh> meshes;
-    for (int index = 0; index < 3; ++index)
-        meshes.push_back(makeMesh());
+    std::vector<Mesh> meshes = makeMeshes();
     for (int frame = 0; frame < kFrames; ++frame) {
         for (std::size_t index = 0; index < meshes.size(); ++index)
             writeThroughGL(meshes[index],
@@ -184,9 +191,7 @@ TEST_P(Evaluation, NumbersArriveInGLMemory)
 
 TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
 {
-    std::vector<Mesh> meshes;
-    for (int index = 0; index < 3; ++index)
-        meshes.push_back(makeMesh());
+    std::vector<Mesh> meshes = makeMeshes();
     for (int frame = 0; frame < kFrames; ++frame) {
         for (const Mesh& mesh : meshes)
             writeThroughGL(mesh, 5.0F);
