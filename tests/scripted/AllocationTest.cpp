@@ -33,12 +33,25 @@ void* operator new(std::size_t size)
         throw std::bad_alloc();
     return memory;
 }
+// A sanitizer's own would not come by.
+void* operator new[](std::size_t size)
+{
+    return operator new(size);
+}
 // Not inlined, or a compiler sees free where it expects the counterpart of new.
 [[gnu::noinline]] void operator delete(void* memory) noexcept
 {
     std::free(memory);
 }
 [[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete[](void* memory) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete[](void* memory, std::size_t) noexcept
 {
     std::free(memory);
 }
