@@ -1,0 +1,49 @@
+#!/usr/bin/env python3
+"""Compares instruction counts with those on record: check-counts.py RESULTS.json RECORD.json [--record]
+
+What is compared is each operation's count over that of the bare OpenCL calls beside it, as vyra-opencl-bench
+counts them under valgrind. The same binary gives the same counts; compilers and runtimes differ a little, so that
+a tenth more passes. With --record the results become the record. The exit code is 1 where a ratio has grown.
+"""
+import json
+import sys
+
+ALLOWED_GROWTH = 1.10
+
+
+def ratios(results):
+    """By group and case; without the bare calls themselves, and other libraries."""
+    return {
+        f"{group['name']}: {case['name']}": round(case["instructionRatio"], 3)
+        for group in results["groups"]
+        for case in group["cases"][1:]
+        if "instructionRatio" in case and "peer" not in case
+    }
+
+
+def main():
+    arguments = [argument for argument in sys.argv[1:] if argument not in ("", "--record")]
+    if len(arguments) != 2:
+        sys.exit("usage: check-counts.py RESULTS.json RECORD.json [--record]")
+    results_file, record_file = arguments
+    with open(results_file, encoding="utf-8") as file:
+        counted = ratios(json.load(file))
+    if "--record" in sys.argv:
+        with open(record_file, "w", encoding="utf-8") as file:
+            json.dump(counted, file, indent=1, sort_keys=True)
+            file.write("\n")
+        return
+    with open(record_file, encoding="utf-8") as file:
+        record = json.load(file)
+    grown = {name: (ratio, record[name]) for name, ratio in counted.items()
+             if name in record and ratio > record[name] * ALLOWED_GROWTH}
+    for name, (ratio, before) in grown.items():
+        print(f"{name}: {ratio} times the bare calls' instructions, {before} on record")
+    compared = len(counted.keys() & record.keys())
+    if grown or not compared:
+        sys.exit(f"{len(grown)} of {compared} operations take more instructions than bench/counts.json allows")
+    print(f"{compared} operations take no more instructions than on record.")
+
+
+if __name__ == "__main__":
+    main()
