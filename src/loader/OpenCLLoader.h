@@ -74,8 +74,8 @@ inline constexpr cl_context_properties kCLContextD3D11Device =
     X(D3D11EnqueueObjects, clEnqueueReleaseD3D11ObjectsNV)
 
 struct OpenCLEntryPoints {
+// NOLINTNEXTLINE(bugprone-macro-parentheses): the name in a declaration takes none.
 #define VYRA_DECLARE(name) decltype(&::name) name = nullptr;
-// NOLINTNEXTLINE(bugprone-macro-parentheses): a type of a declaration takes none.
 #define VYRA_DECLARE_TYPED(type, name) type name = nullptr;
     VYRA_OPENCL_CORE_ENTRY_POINTS(VYRA_DECLARE)
     VYRA_OPENCL_GL_ENTRY_POINTS(VYRA_DECLARE)

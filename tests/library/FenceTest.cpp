@@ -59,6 +59,7 @@ TEST_F(Fence, EachIsWaitedForOnceWhoeverAcquiresFirst)
         manager.RenderingComplete();
         manager.RenderingComplete(); // replaces the fence that nobody waited for
         std::vector<std::thread> deformers;
+        deformers.reserve(records.size());
         for (const TopenCLSharedBuffer* record : records) {
             deformers.emplace_back([&manager, record] {
                 cl_command_queue queue = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);

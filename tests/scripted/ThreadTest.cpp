@@ -123,8 +123,8 @@ TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
         const TopenCLSharedBuffer* own = alone[static_cast<std::size_t>(thread)];
         const cl_mem mem = own->fMem.get();
         for (int round = 0; round < kRounds; ++round) {
-            AutoCLObject<cl_event>& event =
-                released[static_cast<std::size_t>(thread * kRounds + round)];
+            AutoCLObject<cl_event>& event = released[static_cast<std::size_t>(thread) * kRounds +
+                                                     static_cast<std::size_t>(round)];
             cl_event acquired = nullptr;
             manager().EnqueueAcquireSharedCLBuffer(queue(), batched, &acquired);
             manager().EnqueueReleaseBatchedSharedCLBuffer(1, &acquired);
