@@ -35,11 +35,14 @@ GlWorker::~GlWorker()
 
 void GlWorker::stop()
 {
-    const bool ends = loop_->requestStop();
-    if (!ends || thread_.get_id() == std::this_thread::get_id())
+    if (!loop_->requestStop()) {
         thread_.detach();
-    else
+    } else if (thread_.get_id() == std::this_thread::get_id()) {
+        Loop::adopt(loop_, std::move(thread_));
+    } else {
         thread_.join();
+        loop_->markGone();
+    }
 }
 
 void GlWorker::post(Job job)

@@ -2,6 +2,7 @@
 
 #include "core/LibraryFunctions.h"
 
+#include <algorithm>
 #include <chrono>
 #include <iterator>
 #include <utility>
@@ -20,8 +21,14 @@ constexpr std::chrono::seconds kExitPatience{1};
 
 // The loops that were started and may still run.
 struct GlWorker::Loop::Running {
+    struct Orphan {
+        std::shared_ptr<Loop> loop;
+        std::thread thread;
+    };
+
     std::mutex mutex; // guards the rest
     std::vector<std::weak_ptr<Loop>> loops;
+    std::vector<Orphan> orphans; // threads that nobody has joined
     bool isRegistered = false;
 
     // Never destroyed, as an exit handler uses it.
@@ -62,7 +69,7 @@ void GlWorker::Loop::run()
             letGoOfDisplay(lock);
         if (!jobs_.empty()) {
             runJob(lock);
-        } else if (isStopping_) {
+        } else if (isStopping_ && !isExiting_) {
             break;
         } else if (!watches_.empty()) {
             lookAtWatches(lock);
@@ -70,7 +77,7 @@ void GlWorker::Loop::run()
             changed_.wait(lock);
         }
     }
-    // An exiting process waits for this, too.
+    isEnding_ = true;
     isBusy_ = true;
     lock.unlock();
     if (hasGl_.exchange(false))
@@ -150,6 +157,28 @@ bool GlWorker::Loop::requestStop()
     return !isExiting_;
 }
 
+void GlWorker::Loop::markGone()
+{
+    const std::scoped_lock lock(mutex_);
+    isGone_ = true;
+    changed_.notify_all();
+}
+
+// Those adopted before have ended long since.
+void GlWorker::Loop::adopt(std::shared_ptr<Loop> loop, std::thread thread)
+{
+    Running& running = Running::get();
+    const std::scoped_lock lock(running.mutex);
+    std::erase_if(running.orphans, [](Running::Orphan& orphan) {
+        const std::scoped_lock loopLock(orphan.loop->mutex_);
+        const bool hasRun = orphan.loop->isEnding_ && !orphan.loop->isBusy_;
+        if (hasRun)
+            orphan.thread.join();
+        return hasRun;
+    });
+    running.orphans.push_back({std::move(loop), std::move(thread)});
+}
+
 bool GlWorker::Loop::callerSharesObjects() const
 {
     return hasGl_ && context_->callerHasContext() && device_->callerSharesObjects();
@@ -168,12 +197,18 @@ void GlWorker::Loop::leaveDisplay()
     changed_.wait(lock, [this] { return (!hasGl_ && !isBusy_) || isExiting_; });
 }
 
-void GlWorker::Loop::park()
+// A thread that is ending is waited for until it is gone; any other stays where it is.
+void GlWorker::Loop::park(std::thread* orphan)
 {
     Lock lock(mutex_);
     isExiting_ = true;
     changed_.notify_all();
-    changed_.wait_for(lock, kExitPatience, [this] { return !isBusy_; });
+    if (orphan != nullptr && isEnding_) {
+        lock.unlock();
+        orphan->join();
+        return;
+    }
+    changed_.wait_for(lock, kExitPatience, [this] { return !isBusy_ && (!isEnding_ || isGone_); });
 }
 
 void GlWorker::Loop::listenForDisplay(const std::shared_ptr<Loop>& loop)
@@ -198,9 +233,13 @@ void GlWorker::Loop::parkAll()
 {
     Running& running = Running::get();
     const std::scoped_lock lock(running.mutex);
+    for (Running::Orphan& orphan : running.orphans)
+        orphan.loop->park(&orphan.thread);
     for (const std::weak_ptr<Loop>& weak : running.loops) {
-        if (const std::shared_ptr<Loop> loop = weak.lock())
-            loop->park();
+        const std::shared_ptr<Loop> loop = weak.lock();
+        const auto isLoop = [&loop](const Running::Orphan& orphan) { return orphan.loop == loop; };
+        if (loop && std::ranges::none_of(running.orphans, isLoop))
+            loop->park(nullptr);
     }
 }
 

@@ -9,6 +9,7 @@
 #include <deque>
 #include <mutex>
 #include <optional>
+#include <thread>
 #include <vector>
 
 namespace glshare {
@@ -30,12 +31,17 @@ public:
 
     // False if the thread will not end any more, since the process is exiting.
     [[nodiscard]] bool requestStop();
+    // Says that the thread, asked to stop, has been joined.
+    void markGone();
+    // Takes over the thread of a loop that was asked to stop by itself: somebody has to join it.
+    static void adopt(std::shared_ptr<Loop> loop, std::thread thread);
 
     [[nodiscard]] bool callerSharesObjects() const;
     void finishCaller() const;
 
     // Lets go of the GL side when its display closes, and parks the thread when the process exits:
-    // the exit handlers of the drivers must not run beside a thread that uses them.
+    // the exit handlers of the drivers must not run beside a thread that uses them, nor beside one
+    // that ends, which gives back what the drivers keep for it.
     static void listenForDisplay(const std::shared_ptr<Loop>& loop);
     static void listenForExit(const std::shared_ptr<Loop>& loop);
 
@@ -44,7 +50,7 @@ private:
     using Lock = std::unique_lock<std::mutex>;
 
     void leaveDisplay();
-    void park();
+    void park(std::thread* orphan);
     static void parkAll();
 
     // With the lock held; the lock is given up while foreign code runs.
@@ -63,6 +69,8 @@ private:
     std::vector<Watch> watches_;
     bool isBusy_ = false;
     bool isStopping_ = false;
+    bool isEnding_ = false; // run is over, or nearly
+    bool isGone_ = false;   // and the thread with it
     bool isDisplayClosing_ = false;
     bool isExiting_ = false;
 };
