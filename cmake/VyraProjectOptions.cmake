@@ -20,7 +20,8 @@ if(VYRA_SANITIZE)
     add_link_options(-fsanitize=${VYRA_SANITIZE})
 endif()
 if(VYRA_COVERAGE)
-    add_compile_options(--coverage)
+    # Several threads count at once.
+    add_compile_options(--coverage -fprofile-update=atomic)
     add_link_options(--coverage)
 endif()
 
