@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <atomic>
 #include <cstddef>
+#include <memory>
 #include <mutex>
 #include <new>
 #include <thread>
@@ -90,7 +91,8 @@ private:
         return slot.event;
     }
 
-    tbb::concurrent_vector<Slot> fSlots;
+    // Neighbours are written by several threads anyway: slots need no cache line of their own.
+    tbb::concurrent_vector<Slot, std::allocator<Slot>> fSlots;
     std::atomic<std::size_t> fSlotCount = 0; // of slots that are ready to be written
     std::atomic<std::size_t> fSize = 0;      // of slots taken
     std::mutex fGrowth;

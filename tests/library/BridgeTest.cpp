@@ -2,6 +2,7 @@
 #include "host/EvaluationId.h"
 
 #include <memory>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -36,6 +37,12 @@ TEST(Bridge, PublishesOneBorrowedEvaluator)
     IDeformerEvaluatorBridge::setAPI(&second);
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second);
     EXPECT_FALSE(destroyed) << "the bridge deleted what it only borrowed";
+
+    IDeformerEvaluatorBridge bridge;
+    IDeformerEvaluatorBridge other;
+    EXPECT_EQ(&(other = bridge), &other);
+    EXPECT_EQ(&(bridge = std::move(other)), &bridge);
+    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second) << "a bridge has nothing of its own";
 
     IDeformerEvaluatorBridge::setAPI(nullptr);
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);

@@ -5,6 +5,8 @@
 // makes each of them fail in turn; the scripted runtime's own are left out.
 #include "FaultBench.h"
 #include "diagnostics/AutoCLEventList.h"
+#include "diagnostics/CLInternalWarning.h"
+#include "interop/ConcurrentEventList.h"
 
 #include <cstdlib>
 #include <functional>
@@ -145,6 +147,70 @@ TEST_F(ScriptedTest, AnEventListThatCannotGrowIsUnchanged)
     EXPECT_THROW(target = list, std::bad_alloc);
     allocationsLeft = 0;
     EXPECT_EQ(target.size(), 1U);
+}
+
+TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
+{
+    ASSERT_TRUE(start());
+    Bench bench;
+    bench.makeStore();
+    const Lines before = runtime().balance();
+    unsigned nth = 0;
+    for (bool ranOut = true; ranOut;) {
+        allocationsLeft = ++nth;
+        try {
+            bench.store->getKernelFromString("#error", "program", "", "skin", nullptr);
+        } catch (const std::bad_alloc&) {
+            // As may be: what counts is what is left.
+        }
+        ranOut = allocationsLeft == 0;
+        allocationsLeft = 0;
+        EXPECT_EQ(runtime().balance(), before) << nth;
+        warnings();
+    }
+    EXPECT_GT(nth, 1U);
+}
+
+TEST_F(ScriptedTest, AWarningWithoutMemoryIsEmpty)
+{
+    allocationsLeft = 1;
+    CLInternalWarning("%s", "lost");
+    EXPECT_EQ(warnings(), Lines{""});
+}
+
+TEST_F(ScriptedTest, ABatchThatCannotBeRebuiltIsEmpty)
+{
+    ASSERT_TRUE(start());
+    Bench bench;
+    bench.makeManager(2);
+    bench.evaluate();
+    bench.createShared();
+    calls();
+    allocationsLeft = 1;
+    EXPECT_THROW(bench.open(), std::bad_alloc);
+    allocationsLeft = 0;
+    EXPECT_EQ(bench.leaveBatch(), CL_SUCCESS); // its record says so, but it is in no batch
+    EXPECT_EQ(callsOf("clEnqueueRelease"), Lines{});
+    bench.open();
+    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "tried again";
+}
+
+TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
+{
+    ConcurrentEventList list;
+    std::vector<cl_event> events;
+    events.reserve(1000);
+    allocationsLeft = 1;
+    EXPECT_THROW(for (;;) list.append(nullptr), std::bad_alloc);
+    list.copyTo(events);
+    const std::size_t listed = events.size();
+    EXPECT_GE(listed, 100U);
+    EXPECT_THROW(list.append(nullptr), std::bad_alloc) << "a list that could not grow stays so";
+    list.clear();
+    for (std::size_t index = 0; index < listed; ++index)
+        list.append(nullptr);
+    list.copyTo(events);
+    EXPECT_EQ(events.size(), listed);
 }
 
 } // namespace

@@ -310,9 +310,14 @@ TEST_F(BufferTest, ConstructorsCreateWhatTheyAreAskedFor)
     EXPECT_EQ(calls(),
               (Lines{"AddToDeviceMemory(8)", "clCreateBuffer(context#1, 33, 8, ptr) = mem#1",
                      "AddToDeviceMemory(9)", "clCreateBuffer(context#1, 1, 9, null) = mem#2"}));
-    runtime().plan({.function = "clCreateBuffer", .status = -4});
+    runtime().plan({.function = "clCreateBuffer", .status = -6});
     const TopenCLBuffer failed(context, CL_MEM_READ_WRITE, 7, nullptr, &error);
-    EXPECT_EQ(error, -4);
+    EXPECT_EQ(error, -6);
+    // Neither a handle nor a reason is a failure all the same.
+    runtime().clearFaults();
+    runtime().plan({.function = "clCreateBuffer", .status = CL_SUCCESS});
+    const TopenCLBuffer silent(context, CL_MEM_READ_WRITE, 7, nullptr, &error);
+    EXPECT_EQ(error, CL_MEM_OBJECT_ALLOCATION_FAILURE);
     EXPECT_EQ(deviceMemory(), 17U);
 }
 

@@ -107,6 +107,7 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     data.setData(normals, kPlug, makeData());
     EXPECT_TRUE(data.getSinglePlug() == kPlug);
     const TopenCLData copy(data);
+    EXPECT_EQ(std::distance(copy.begin(), copy.end()), 2);
     EXPECT_EQ(runtime().references(Kind::kMem, data.getData(normals, kPlug).buffer().get()), 2U);
     data.setData(kName, kOtherPlug, makeData());
     EXPECT_TRUE(data.getSinglePlug() == Tplug::fsNULL);
@@ -117,6 +118,17 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     EXPECT_EQ(std::distance(data.cbegin(), data.cend()), 3);
     data = copy;
     EXPECT_EQ(&data.getData(kName, kOtherPlug), &TopenCLDataBuffer::fsNULL);
+}
+
+TEST_F(DataTest, TheNamesOfTheDeformedDataAreAgreedOn)
+{
+    EXPECT_TRUE(TopenCLData::sPositionsName() == TuniqueString("positions"));
+    EXPECT_TRUE(TopenCLData::sNormalsName() == TuniqueString("normals"));
+    EXPECT_TRUE(TopenCLData::sGeometryMatrixName() == TuniqueString("geometryMatrix"));
+    EXPECT_TRUE(TopenCLData::sInverseGeometryMatrixName() ==
+                TuniqueString("inverseGeometryMatrix"));
+    EXPECT_TRUE(TopenCLData::sNormalIdxToPositionIdxName() ==
+                TuniqueString("normalIdxToPositionIdx"));
 }
 
 // The hash, written out apart from the library's own.

@@ -88,12 +88,18 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     folders.append("a");
     fStore->getKernel(path, "-DA", "skin", &folders);
     fStore->getKernel(path, "-DA", "wave", &folders);
+    TstringArray others;
+    others.append("b");
+    fStore->getKernel(path, "-DA", "skin", &others);
+    EXPECT_EQ(builds(), 2U);
+    fStore->getKernel(path, "-DA -I a", "skin", nullptr); // the same options in other words
+    EXPECT_EQ(builds(), 0U);
     folders.append("b");
     fStore->getKernel(path, "-DA", "skin", &folders);
-    EXPECT_EQ(builds(), 2U);
+    EXPECT_EQ(builds(), 1U);
     TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
     fStore->getKernel(path, "-DA", "skin", nullptr);
-    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#5, [device#1], \"-DA\")"});
+    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#6, [device#1], \"-DA\")"});
 }
 
 TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
@@ -159,6 +165,36 @@ TEST_F(KernelStoreTest, AFailedBuildIsReportedWithItsLogAndForgotten)
     }
 }
 
+TEST_F(KernelStoreTest, ALogThatCannotBeReadIsNotQuoted)
+{
+    for (const unsigned query : {2U, 3U}) { // its size, its text
+        runtime().clearFaults();
+        runtime().plan({.function = "clGetProgramBuildInfo", .nth = query});
+        fStore->getKernelFromString("#error", "bad", "", "skin", nullptr);
+        EXPECT_EQ(warnings(), (Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE",
+                                     "OpenCL error: CL_OUT_OF_RESOURCES"}));
+    }
+}
+
+// Some runtimes answer with an empty text, some with no text at all.
+class SilentCompilerTest : public KernelStoreTest, public ::testing::WithParamInterface<bool> {
+protected:
+    void SetUp() override
+    {
+        world.buildLog = "";
+        if (GetParam())
+            world.emptyAnswers = {CL_PROGRAM_BUILD_LOG};
+        KernelStoreTest::SetUp();
+    }
+};
+
+TEST_P(SilentCompilerTest, IsNotQuoted)
+{
+    fStore->getKernelFromString("#error", "bad", "", "skin", nullptr);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE"});
+}
+INSTANTIATE_TEST_SUITE_P(KernelStore, SilentCompilerTest, ::testing::Bool());
+
 TEST_F(KernelStoreTest, ABuildThatOnlyReportsFailureCounts)
 {
     // The build says no, the status says yes: the status decides.
@@ -181,7 +217,8 @@ TEST_F(KernelStoreTest, UnreadableFilesGiveNoKernelAndNoWord)
 {
     const std::string directory = testing::TempDir();
     const std::string empty = file("");
-    for (const char* path : {"no/such/file.cl", empty.c_str(), directory.c_str()})
+    const char* withoutEnd = "/proc/self/mem"; // it opens, where there is one, but tells no size
+    for (const char* path : {"no/such/file.cl", empty.c_str(), directory.c_str(), withoutEnd})
         EXPECT_EQ(fStore->getKernel(path, "", "skin", nullptr).get(), nullptr) << path;
     EXPECT_EQ(calls(), Lines{});
     file(kSource); // it is there now, and read again

@@ -120,9 +120,13 @@ TEST_F(QueueTest, WorkGroupSizesRoundUpToMultiples)
     }
 }
 
-TEST_F(QueueTest, AnEmptyWorkGroupAnswerMeans256)
+class NoWorkGroupSize : public QueueTest, public ::testing::WithParamInterface<bool> {};
+
+TEST_P(NoWorkGroupSize, Means256)
 {
-    world.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
+    if (GetParam())
+        world.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
+    world.platforms[0].devices[0].workGroupSize = 0;
     ASSERT_TRUE(start());
     std::size_t global = 1;
     std::size_t local = 1;
@@ -130,6 +134,7 @@ TEST_F(QueueTest, AnEmptyWorkGroupAnswerMeans256)
     EXPECT_EQ(global, 512U);
     EXPECT_EQ(local, 256U);
 }
+INSTANTIATE_TEST_SUITE_P(Queue, NoWorkGroupSize, ::testing::Bool());
 
 TEST_F(QueueTest, FailingWorkGroupQueriesWriteNothing)
 {
@@ -144,6 +149,29 @@ TEST_F(QueueTest, FailingWorkGroupQueriesWriteNothing)
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL\n"});
     EXPECT_EQ(global, 3U);
     EXPECT_EQ(local, 4U);
+}
+
+// The destructor is the library's own, so the copy stays, in memory that stays too.
+TEST_F(QueueTest, ACopyOfTheRuntimeObjectBorrowsTheSameHandles)
+{
+    ASSERT_TRUE(start());
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    info.getAbsolutePathToResources();
+    calls();
+    alignas(TopenCLInfo) static std::byte memory[sizeof(TopenCLInfo)];
+    auto* copy = new (memory) TopenCLInfo(info);
+    EXPECT_EQ(calls(), Lines{});
+    EXPECT_EQ(copy->openCLContext(), info.openCLContext());
+    EXPECT_EQ(copy->secondaryOpenCLCommandQueue(), info.secondaryOpenCLCommandQueue());
+    EXPECT_EQ(&copy->kernelStore(), &info.kernelStore());
+    EXPECT_STREQ(copy->getAbsolutePathToResources().asChar(), "scripted/resources");
+    EXPECT_EQ(&TopenCLInfo::theOne(), &info);
+
+    EXPECT_TRUE(copy->setUseMinimumBufferSize(!info.useMinimumBufferSize()));
+    EXPECT_NE(copy->useMinimumBufferSize(), info.useMinimumBufferSize());
+    *copy = info;
+    EXPECT_EQ(copy->useMinimumBufferSize(), info.useMinimumBufferSize());
+    EXPECT_EQ(calls(), Lines{});
 }
 
 } // namespace

@@ -182,6 +182,39 @@ TEST_F(SharedBufferTest, ASyncObjectThatCannotBeMadeIsSkipped)
     expectEventsLeft();
 }
 
+TEST_F(SharedBufferTest, AnotherEvaluationAcquiresOnceMore)
+{
+    startInModes(1, 1);
+    const auto* buffer = create();
+    manager().PreEvaluate(kId);
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U);
+    manager().PreEvaluate(em::Id(8));
+    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U);
+    expectMisuse("clEnqueueAcquireGLObjects: already acquired");
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_GL_OBJECT"});
+    manager().PostEvaluate(kId);
+    destroy(buffer);
+    expectLeft({"event#2 x1"}); // of the release: the last acquire gave none
+}
+
+TEST_F(SharedBufferTest, AReleaseWithoutAnEventIsNotWaitedFor)
+{
+    startInModes(1, 3);
+    const auto* buffer = create();
+    const cl_mem mem = buffer->fMem.get();
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+    runtime().plan({.function = "clEnqueueReleaseGLObjects", .status = CL_SUCCESS});
+    cl_event none = nullptr;
+    EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, &none), 0);
+    EXPECT_EQ(none, nullptr);
+    calls();
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("gl"), Lines{});
+    destroy(buffer);
+}
+
 TEST_F(SharedBufferTest, TheProfilerSeesEveryEvaluationEvenWithoutWork)
 {
     startInModes(1, 1);

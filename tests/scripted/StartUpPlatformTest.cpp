@@ -47,6 +47,8 @@ const StartUpRow kPlatformRows[] = {
          c.world.platforms.insert(c.world.platforms.begin(), kSomebody);
          c.fails("clGetPlatformInfo", 1);
          c.stopsBeforePlatform("Detected 2 OpenCL Platforms: \n" + kNotFound); }},
+    {"PlatformNameFails", [](StartUp& c) { c.fails("clGetPlatformInfo", 3); c.stopsBeforePlatform("Detected 1 OpenCL Platforms: \n" + kNotFound); }},
+    {"PlatformVersionFails", [](StartUp& c) { c.fails("clGetPlatformInfo", 6); c.stopsBeforePlatform("Detected 1 OpenCL Platforms: \n" + kNotFound); }},
     {"ExtensionsFailBeforeTheMatch", [](StartUp& c) {
          c.fails("clGetPlatformInfo", 8); // the value of the fourth text
          c.stopsBeforePlatform("Detected 1 OpenCL Platforms: \n" + kIntelLine + kNotFound); }},

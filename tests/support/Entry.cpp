@@ -27,6 +27,7 @@ void Entry::begin(const char* function, std::initializer_list<std::string> argum
     if (const Fault* fault = fRuntime.meetFault(fFunction)) {
         fStatus = fault->status;
         fWithHandle = fault->withHandle;
+        fEmptyHanded = fault->status == CL_SUCCESS;
     }
 }
 
@@ -83,7 +84,7 @@ cl_int Entry::release(Kind kind, const void* handle)
 
 void* Entry::createHandle(Kind kind)
 {
-    if (!ok() && !fWithHandle)
+    if (fEmptyHanded || (!ok() && !fWithHandle))
         return nullptr;
     void* handle = fRuntime.fLedger.create(kind);
     fCreated = fRuntime.name(handle);
@@ -96,7 +97,8 @@ cl_int Entry::command(cl_command_queue queue, const WaitList& list, cl_event* ev
     requireWaitList(list);
     if (ok() && event) {
         *event = create<cl_event>(Kind::kEvent);
-        fRuntime.fLedger.alive(Kind::kEvent, *event)->statuses = fRuntime.fEventStatuses;
+        if (*event)
+            fRuntime.fLedger.alive(Kind::kEvent, *event)->statuses = fRuntime.fEventStatuses;
     }
     return fStatus;
 }

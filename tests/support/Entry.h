@@ -114,6 +114,7 @@ private:
     std::string fCreated;
     cl_int fStatus = CL_SUCCESS;
     bool fWithHandle = false;
+    bool fEmptyHanded = false;
 };
 
 } // namespace scripted

@@ -14,6 +14,7 @@ Lines pendingWarnings;
 
 void keepWarning(const char* text)
 {
+    const InsideRuntime notTheLibrarys;
     const std::scoped_lock guard(warningsLock);
     pendingWarnings.emplace_back(text);
 }

@@ -1,0 +1,119 @@
+// Names of status codes, and the warnings that quote them.
+#include "ScriptedTest.h"
+#include "diagnostics/CLErrorCodes.h"
+#include "diagnostics/CLInternalWarning.h"
+
+#include <cwchar>
+
+#include <CL/cl_gl.h>
+
+using namespace scripted;
+
+namespace {
+
+struct NamedStatus {
+    int code;
+    const char* name;
+};
+
+// The codes are the OpenCL headers'.
+#define STATUS(name)                                                                               \
+    {                                                                                              \
+        name, #name                                                                                \
+    }
+const NamedStatus kStatuses[] = {
+    STATUS(CL_SUCCESS),
+    STATUS(CL_DEVICE_NOT_FOUND),
+    STATUS(CL_DEVICE_NOT_AVAILABLE),
+    STATUS(CL_COMPILER_NOT_AVAILABLE),
+    STATUS(CL_MEM_OBJECT_ALLOCATION_FAILURE),
+    STATUS(CL_OUT_OF_RESOURCES),
+    STATUS(CL_OUT_OF_HOST_MEMORY),
+    STATUS(CL_PROFILING_INFO_NOT_AVAILABLE),
+    STATUS(CL_MEM_COPY_OVERLAP),
+    STATUS(CL_IMAGE_FORMAT_MISMATCH),
+    STATUS(CL_IMAGE_FORMAT_NOT_SUPPORTED),
+    STATUS(CL_BUILD_PROGRAM_FAILURE),
+    STATUS(CL_MAP_FAILURE),
+    STATUS(CL_MISALIGNED_SUB_BUFFER_OFFSET),
+    STATUS(CL_EXEC_STATUS_ERROR_FOR_EVENTS_IN_WAIT_LIST),
+    STATUS(CL_INVALID_VALUE),
+    STATUS(CL_INVALID_DEVICE_TYPE),
+    STATUS(CL_INVALID_PLATFORM),
+    STATUS(CL_INVALID_DEVICE),
+    STATUS(CL_INVALID_CONTEXT),
+    STATUS(CL_INVALID_QUEUE_PROPERTIES),
+    STATUS(CL_INVALID_COMMAND_QUEUE),
+    STATUS(CL_INVALID_HOST_PTR),
+    STATUS(CL_INVALID_MEM_OBJECT),
+    STATUS(CL_INVALID_IMAGE_FORMAT_DESCRIPTOR),
+    STATUS(CL_INVALID_IMAGE_SIZE),
+    STATUS(CL_INVALID_SAMPLER),
+    STATUS(CL_INVALID_BINARY),
+    STATUS(CL_INVALID_BUILD_OPTIONS),
+    STATUS(CL_INVALID_PROGRAM),
+    STATUS(CL_INVALID_PROGRAM_EXECUTABLE),
+    STATUS(CL_INVALID_KERNEL_NAME),
+    STATUS(CL_INVALID_KERNEL_DEFINITION),
+    STATUS(CL_INVALID_KERNEL),
+    STATUS(CL_INVALID_ARG_INDEX),
+    STATUS(CL_INVALID_ARG_VALUE),
+    STATUS(CL_INVALID_ARG_SIZE),
+    STATUS(CL_INVALID_KERNEL_ARGS),
+    STATUS(CL_INVALID_WORK_DIMENSION),
+    STATUS(CL_INVALID_WORK_GROUP_SIZE),
+    STATUS(CL_INVALID_WORK_ITEM_SIZE),
+    STATUS(CL_INVALID_GLOBAL_OFFSET),
+    STATUS(CL_INVALID_EVENT_WAIT_LIST),
+    STATUS(CL_INVALID_EVENT),
+    STATUS(CL_INVALID_OPERATION),
+    STATUS(CL_INVALID_GL_OBJECT),
+    STATUS(CL_INVALID_BUFFER_SIZE),
+    STATUS(CL_INVALID_MIP_LEVEL),
+    STATUS(CL_INVALID_GLOBAL_WORK_SIZE),
+    STATUS(CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR),
+    // The header is Windows' own, and its names end in _KHR.
+    {-1006, "CL_INVALID_D3D11_DEVICE"},
+    {-1007, "CL_INVALID_D3D11_RESOURCE"},
+    {-1008, "CL_D3D11_RESOURCE_ALREADY_ACQUIRED"},
+    {-1009, "CL_D3D11_RESOURCE_NOT_ACQUIRED"},
+    // Without a name, on every side of those that have one.
+    {-15, "-15"},
+    {-29, "-29"},
+    {-64, "-64"},
+    {-1001, "-1001"},
+    {-1010, "-1010"},
+    {-2147483647 - 1, "-2147483648"},
+    {1, "1"},
+};
+#undef STATUS
+
+TEST(ErrorNames, AreThoseOfTheHeadersAndElseTheNumber)
+{
+    for (const NamedStatus& status : kStatuses)
+        EXPECT_STREQ(CLErrorCodeStr(status.code), status.name);
+    EXPECT_EQ(CLErrorCodeStr(-15), CLErrorCodeStr(-16)) << "one text, the latest code's";
+    EXPECT_STREQ(CLErrorCodeStr(-15), "-15");
+}
+
+using WarningTest = ScriptedTest;
+
+TEST_F(WarningTest, AMessageIsWholeWhateverItsLength)
+{
+    testing::internal::CaptureStderr();
+    testing::internal::CaptureStdout();
+    const std::string part(5000, 'x');
+    CLInternalWarning("%s %d %s", part.c_str(), 7, part.c_str());
+    CLInternalWarning("OpenCL error: %s", CLErrorCodeStr(CL_OUT_OF_RESOURCES));
+    EXPECT_EQ(warnings(), (Lines{part + " 7 " + part, "OpenCL error: CL_OUT_OF_RESOURCES"}));
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+}
+
+TEST_F(WarningTest, AMessageThatCannotBeFormattedIsEmpty)
+{
+    CLInternalWarning("%lc", static_cast<wint_t>(0xD800)); // half of a surrogate pair
+    EXPECT_EQ(warnings(), Lines{""});
+}
+
+} // namespace
