@@ -44,6 +44,10 @@ TEST(Bridge, PublishesOneBorrowedEvaluator)
     EXPECT_EQ(&(bridge = std::move(other)), &bridge);
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second) << "a bridge has nothing of its own";
 
+    Evaluator copy(second);
+    IDeformerEvaluatorBridgeAPI& interface = copy;
+    EXPECT_EQ(&(interface = second), &interface);
+
     IDeformerEvaluatorBridge::setAPI(nullptr);
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);
     std::unique_ptr<IDeformerEvaluatorBridgeAPI> base = std::move(first);

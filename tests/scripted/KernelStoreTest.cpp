@@ -102,6 +102,18 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#6, [device#1], \"-DA\")"});
 }
 
+TEST_F(KernelStoreTest, LongNamesAndOptionsThatEndAlikeAreToldApart)
+{
+    const Kernel kernels[] = {fromText("skin", "-DA -D THE_SAME_ENDING", "a/the-same-ending.cl"),
+                              fromText("skin", "-DB -D THE_SAME_ENDING", "a/the-same-ending.cl"),
+                              fromText("skin", "-DA -D THE_SAME_ENDING", "b/the-same-ending.cl"),
+                              fromText("skin", "", "name"), fromText("skin", nullptr, "name")};
+    EXPECT_EQ(builds(), 5U);
+    TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
+    const Kernel single = fromText("skin", "", "name");
+    EXPECT_EQ(builds(), 1U);
+}
+
 TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
 {
     Kernel first = fromText("skin");
@@ -217,7 +229,7 @@ TEST_F(KernelStoreTest, UnreadableFilesGiveNoKernelAndNoWord)
 {
     const std::string directory = testing::TempDir();
     const std::string empty = file("");
-    const char* withoutEnd = "/proc/self/mem"; // it opens, where there is one, but tells no size
+    const char* withoutEnd = "/dev/ptmx"; // where there is one, it opens but tells no size
     for (const char* path : {"no/such/file.cl", empty.c_str(), directory.c_str(), withoutEnd})
         EXPECT_EQ(fStore->getKernel(path, "", "skin", nullptr).get(), nullptr) << path;
     EXPECT_EQ(calls(), Lines{});
