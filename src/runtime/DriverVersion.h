@@ -9,6 +9,7 @@ struct DriverVersion {
     int major = 0;
     int minor = 0;
 
+    // NOLINTNEXTLINE(modernize-use-nullptr): meant is the zero that the compiler compares with.
     auto operator<=>(const DriverVersion&) const = default;
 };
 

@@ -284,6 +284,75 @@ TEST_F(BufferTest, AGrowingUploadWaitsForTheWaitListFirst)
     runtime().plan({.function = "clWaitForEvents"}); // neither reported nor returned
     EXPECT_EQ(buffer.uploadDataToGPU(queue(), CL_FALSE, 0, 65, fBytes.data(), 1, &handle), 0);
     EXPECT_EQ(calls().front(), "clWaitForEvents([event#1]) ! -5");
+
+    buffer.uploadDataToGPU(queue(), CL_TRUE, 65, 4, fBytes.data(), 1, &handle);
+    const Lines elsewhere = calls();
+    EXPECT_EQ(elsewhere.front(), "clWaitForEvents([event#1])");
+    EXPECT_EQ(elsewhere.back(),
+              "clEnqueueWriteBuffer(queue#1, mem#3, 1, 65, 4, ptr, [event#1]) = event#2");
+}
+
+TEST_F(BufferTest, AReadBackChecksNeitherPermissionsNorCapacity)
+{
+    TopenCLBuffer buffer;
+    buffer.ensureBufferCapacity(8);
+    buffer.openCLDataBuffer().descriptor().setPermissions(TopenCLDataBufferDescriptor::kReadOnly);
+    EXPECT_EQ(buffer.readBackDataFromGPU(queue(), CL_TRUE, 0, 8, fBytes.data(), 0, nullptr), 0);
+    buffer.readBackDataFromGPU(queue(), CL_TRUE, 4, 8, fBytes.data(), 0, nullptr);
+    expectMisuse("clEnqueueReadBuffer: beyond the end"); // the runtime's own check
+}
+
+TEST_F(BufferTest, AFailedWaitDropsTheEventAllTheSame)
+{
+    TopenCLBuffer buffer;
+    buffer.ensureBufferCapacity(kSize);
+    upload(buffer, 0, 1);
+    runtime().plan({.function = "clWaitForEvents"});
+    EXPECT_EQ(buffer.ensureBufferCapacity(kSize), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(buffer.bufferReadyEvent().get(), nullptr);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
+}
+
+TEST_F(BufferTest, CreatingMemoryDropsAnEventThatAnEmptyBufferHolds)
+{
+    TopenCLBuffer buffer;
+    buffer.ensureBufferCapacity(kSize);
+    upload(buffer, 0, 1);
+    TopenCLBuffer empty;
+    empty.bufferReadyEvent() = buffer.bufferReadyEvent();
+    EXPECT_EQ(empty.ensureBufferCapacity(kSize), 0);
+    EXPECT_EQ(empty.bufferReadyEvent().get(), nullptr);
+}
+
+TEST_F(BufferTest, OnlyMemoryThatIsHeldIsTakenOutOfTheCount)
+{
+    TopenCLBuffer buffer;
+    buffer.ensureBufferCapacity(kSize);
+    buffer.openCLDataBuffer().buffer().reset();
+    buffer.reset();
+    EXPECT_EQ(callsOf("Reduce"), Lines{});
+}
+
+TEST_F(BufferTest, AWrappedBufferKeepsItsDescription)
+{
+    const TopenCLDataBuffer data(Tplug(1, 2), TuniqueString("positions"),
+                                 TopenCLDataBufferDescriptor::kReadOnly, 12, 10, 7);
+    TopenCLBuffer wrapped(TopenCLInfo::theOne().openCLContext(), CL_MEM_READ_WRITE, data);
+    EXPECT_TRUE(wrapped.openCLDataBuffer() == data); // name and plug
+    EXPECT_EQ(wrapped.capacityInBytes(), 120U);
+    EXPECT_EQ(upload(wrapped, 0, 1), CL_INVALID_OPERATION);
+}
+
+TEST_F(BufferTest, CopiesCreateMemoryAsTheirOriginalWould)
+{
+    const TopenCLBuffer original(TopenCLInfo::theOne().openCLContext(), CL_MEM_WRITE_ONLY);
+    TopenCLBuffer copy(original);
+    TopenCLBuffer assigned(nullptr, CL_MEM_READ_WRITE);
+    assigned = original;
+    copy.ensureBufferCapacity(8);
+    assigned.ensureBufferCapacity(9);
+    EXPECT_EQ(callsOf("clCreate"), (Lines{"clCreateBuffer(context#1, 2, 8, null) = mem#1",
+                                          "clCreateBuffer(context#1, 2, 9, null) = mem#2"}));
 }
 
 TEST_F(BufferTest, AssigningToACountedBufferTakesItsCountAwayOnce)
@@ -306,19 +375,23 @@ TEST_F(BufferTest, ConstructorsCreateWhatTheyAreAskedFor)
     TopenCLBuffer filled(context, CL_MEM_READ_WRITE, 8, fBytes.data(), &error);
     TopenCLBuffer plain(context, CL_MEM_READ_WRITE, 9, nullptr, &error);
     const TopenCLBuffer none(context, CL_MEM_READ_WRITE);
+    TopenCLBuffer byDefault;
+    byDefault.ensureBufferCapacity(10);
     EXPECT_EQ(error, 0);
     EXPECT_EQ(calls(),
               (Lines{"AddToDeviceMemory(8)", "clCreateBuffer(context#1, 33, 8, ptr) = mem#1",
-                     "AddToDeviceMemory(9)", "clCreateBuffer(context#1, 1, 9, null) = mem#2"}));
+                     "AddToDeviceMemory(9)", "clCreateBuffer(context#1, 1, 9, null) = mem#2",
+                     "AddToDeviceMemory(10)", "clCreateBuffer(context#1, 4, 10, null) = mem#3"}));
     runtime().plan({.function = "clCreateBuffer", .status = -6});
     const TopenCLBuffer failed(context, CL_MEM_READ_WRITE, 7, nullptr, &error);
     EXPECT_EQ(error, -6);
+    EXPECT_EQ(failed.openCLDataBuffer().descriptor().capacityInBytes(), 0U);
     // Neither a handle nor a reason is a failure all the same.
     runtime().clearFaults();
     runtime().plan({.function = "clCreateBuffer", .status = CL_SUCCESS});
     const TopenCLBuffer silent(context, CL_MEM_READ_WRITE, 7, nullptr, &error);
     EXPECT_EQ(error, CL_MEM_OBJECT_ALLOCATION_FAILURE);
-    EXPECT_EQ(deviceMemory(), 17U);
+    EXPECT_EQ(deviceMemory(), 27U);
 }
 
 } // namespace

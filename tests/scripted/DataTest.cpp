@@ -5,6 +5,7 @@
 #include "buffers/TopenCLDataBufferPool.h"
 
 #include <algorithm>
+#include <array>
 #include <random>
 #include <string>
 
@@ -73,7 +74,27 @@ TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
     }
 }
 
-// What a move leaves behind is what this test looks at.
+TEST_F(DataTest, DescriptorsKeepWhatTheyAreGiven)
+{
+    TopenCLDataBuffer data(kPlug, kName, Descriptor::kReadOnly, 12, 10, 7);
+    Descriptor& descriptor = data.descriptor();
+    const auto numbers = [&descriptor] {
+        return std::array{descriptor.elementSizeInBytes(), descriptor.elementCount(),
+                          descriptor.capacityInBytes()};
+    };
+    EXPECT_TRUE(descriptor.plug() == kPlug && descriptor.name() == kName);
+    EXPECT_TRUE(descriptor.isReadOnly());
+    EXPECT_FALSE(descriptor.hasEmptyName());
+    EXPECT_EQ(numbers(), (std::array{12U, 10U, 7U}));
+    descriptor.setPlug(kOtherPlug);
+    descriptor.setElementSizeInBytes(1);
+    descriptor.setElementCount(2);
+    descriptor.setCapacityInBytes(3);
+    EXPECT_TRUE(descriptor.plug() == kOtherPlug);
+    EXPECT_EQ(numbers(), (std::array{1U, 2U, 3U}));
+}
+
+// What a move leaves behind is what these tests look at.
 // NOLINTBEGIN(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 TEST_F(DataTest, MovesTakeOrExchangeHandles)
 {
@@ -89,6 +110,49 @@ TEST_F(DataTest, MovesTakeOrExchangeHandles)
     EXPECT_EQ(calls(), Lines{});
     EXPECT_EQ(first.descriptor().capacityInBytes(), 77U);
 }
+
+TEST_F(DataTest, EventAndDescriptorGoWithTheMemory)
+{
+    AutoCLObject<cl_mem> mem;
+    AutoCLObject<cl_event> event; // event#1
+    AutoCLObject<cl_event> other;
+    event.adopt(makeEvent());
+    other.adopt(makeEvent());
+    mem.adopt(makeMem()); // mem#3, after those of the events
+    const TopenCLDataBuffer source({kPlug, kName, Descriptor::kReadOnly, 12, 10, 120}, mem, event);
+    const auto expectSource = [&](const TopenCLDataBuffer& data) {
+        const Descriptor& descriptor = data.descriptor();
+        EXPECT_EQ(data.buffer().get(), mem.get());
+        EXPECT_EQ(data.bufferReadyEvent().get(), event.get());
+        EXPECT_TRUE(data == source && descriptor.isReadOnly());
+        EXPECT_EQ(descriptor.elementSizeInBytes(), 12U);
+        EXPECT_EQ(descriptor.elementCount(), 10U);
+        EXPECT_EQ(descriptor.capacityInBytes(), 120U);
+    };
+    expectSource(source);
+    calls();
+    static_cast<void>(TopenCLDataBuffer(source));
+    EXPECT_EQ(calls(), (Lines{"clRetainMemObject(mem#3)", "clRetainEvent(event#1)",
+                              "clReleaseEvent(event#1)", "clReleaseMemObject(mem#3)"}));
+
+    TopenCLDataBuffer assigned;
+    assigned = source;
+    assigned.setBuffer(mem, 120);
+    expectSource(assigned);
+    TopenCLDataBuffer moved(std::move(assigned));
+    expectSource(moved);
+    EXPECT_EQ(assigned.bufferReadyEvent().get(), nullptr);
+    TopenCLDataBuffer target;
+    target.setBufferReadyEvent(other);
+    target = std::move(moved);
+    expectSource(target);
+    EXPECT_EQ(moved.bufferReadyEvent().get(), other.get());
+
+    TopenCLData data;
+    data.setData(kName, kPlug, TopenCLDataBuffer(describe(4), {}, other));
+    data.setData(kName, kPlug, source);
+    expectSource(data.getData(kName, kPlug));
+}
 // NOLINTEND(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 
 TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
@@ -98,6 +162,7 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     EXPECT_TRUE(data.getSinglePlug() == Tplug::fsNULL);
     EXPECT_EQ(&data.getData(kName, kPlug), &TopenCLDataBuffer::fsNULL);
     data.setData(kName, kPlug, makeData()); // mem#1
+    EXPECT_FALSE(data.empty());
     data.setData(kName, kPlug, makeData()); // mem#2 replaces it
     EXPECT_EQ(std::distance(data.begin(), data.end()), 1);
     EXPECT_EQ(runtime().name(data.getData(kName, kPlug).buffer().get()), "mem#2");
@@ -191,11 +256,37 @@ TEST_F(DataTest, ThePoolHandsOutTheBestFitAndOfEqualsTheFirst)
     }
 }
 
+TEST_F(DataTest, APoolBufferIsDescribedAsItIsAskedForWhereverItsMemoryIsFrom)
+{
+    TopenCLDataBufferPool pool;
+    const Descriptor wanted[] = {
+        {kPlug, kName, Descriptor::kReadOnly, 12, 10, 7},
+        {kOtherPlug, TuniqueString("normals"), Descriptor::kReadWrite, 6, 20, 0},
+        {kPlug, kName, Descriptor::kReadOnly, 65536, 65537, 0}, // a 32-bit product
+    };
+    for (const Descriptor& descriptor : wanted) {
+        const TopenCLDataBuffer made = pool.createBuffer(descriptor);
+        EXPECT_TRUE(made == TopenCLDataBuffer(descriptor)); // name and plug
+        EXPECT_EQ(made.descriptor().isReadOnly(), descriptor.isReadOnly());
+        EXPECT_EQ(made.descriptor().elementSizeInBytes(), descriptor.elementSizeInBytes());
+        EXPECT_EQ(made.descriptor().elementCount(), descriptor.elementCount());
+        TopenCLData data;
+        pool.collectDataForPlug(descriptor.plug(), data);
+        EXPECT_EQ(data.getData(descriptor.name(), descriptor.plug()).buffer().get(),
+                  made.buffer().get());
+        pool.releaseBuffers();
+    }
+    EXPECT_EQ(callsOf("clCreate"), (Lines{"clCreateBuffer(context#1, 1, 120, null) = mem#1",
+                                          "clCreateBuffer(context#1, 1, 65536, null) = mem#2"}));
+}
+
 TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
 {
     TopenCLDataBufferPool pool;
     TopenCLDataBuffer input = makeData();
+    input.bufferReadyEvent().adopt(makeEvent());
     const TopenCLDataBuffer inPlace = pool.createOutputBuffer(input, kOtherPlug);
+    EXPECT_EQ(inPlace.bufferReadyEvent().get(), input.bufferReadyEvent().get());
     EXPECT_EQ(inPlace.buffer().get(), input.buffer().get());
     EXPECT_TRUE(inPlace.descriptor().plug() == kOtherPlug);
 

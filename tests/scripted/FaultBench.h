@@ -47,6 +47,11 @@ public:
     {
         return buffer->readBackDataFromGPU(queue(), CL_FALSE, 0, 8, fBytes.data(), 0, nullptr);
     }
+    int reset()
+    {
+        buffer->reset();
+        return static_cast<int>(buffer->capacityInBytes());
+    }
     int wrap() // a buffer around the buffer's data, and copies of it
     {
         TopenCLBuffer wrapped(info().openCLContext(), 1, buffer->openCLDataBuffer());

@@ -160,7 +160,7 @@ const Row kBufferRows[] = {
     {"UploadGrowsElsewhere", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.upload(8, 64); },
      {{kCreate, CL_INVALID_MEM_OBJECT}, {kWrite, kTheStatus}}, {{kCreate, 2}}, {kNoMemory}, true},
     {"ReadBack", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.readBack(); }, {{kRead, kTheStatus}}, {{kRead, 0}}},
-    {"Reset", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { b.buffer->reset(); return 0; }, {}, {}, {}, true},
+    {"Reset", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.reset(); }, {}, {}, {}, true},
     {"WrapAndCopy", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.wrap(); }},
     {"PoolCreates", [](B& b) { b.makePool(0); }, [](B& b) { return b.fromPool(64); }, {{kCreate, 0}}, {{kCreate, 0}}},
     {"PoolReuses", [](B& b) { b.makePool(64); }, [](B& b) { return b.fromPool(64); }, {}, {}, {}, true},

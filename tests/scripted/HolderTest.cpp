@@ -72,6 +72,11 @@ TEST_F(HolderTest, EachOperationMakesExactlyItsCalls)
     EXPECT_EQ(second.get(), nullptr);
     EXPECT_EQ(*moved.receive(), nullptr);
     EXPECT_EQ(calls(), (Lines{"clReleaseMemObject(mem#1)", "clReleaseMemObject(mem#3)"}));
+
+    Mem emptied = adopted(makeMem()); // mem#4
+    emptied.adopt(nullptr);
+    EXPECT_EQ(emptied.get(), nullptr);
+    EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#4)"});
 }
 // NOLINTEND(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 
@@ -99,6 +104,9 @@ TEST_F(HolderTest, EventsKernelsAndProgramsUseTheirOwnCalls)
     EXPECT_EQ(calls(), (Lines{"clRetainEvent(event#1)", "clReleaseEvent(event#1)",
                               "clRetainKernel(kernel#1)", "clReleaseKernel(kernel#1)",
                               "clRetainProgram(program#1)", "clReleaseProgram(program#1)"}));
+    runtime().plan({.function = "clRetainProgram"}); // the library itself copies none
+    static_cast<void>(AutoCLObject<cl_program>(program));
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
 }
 
 TEST_F(HolderTest, EventListsBorrowInOrder)
@@ -127,6 +135,24 @@ TEST_F(HolderTest, EventListsBorrowInOrder)
     assigned = AutoCLEventList();
     EXPECT_EQ(assigned.array(), nullptr);
     EXPECT_EQ(calls(), Lines{}) << "lists count no references";
+}
+
+TEST_F(HolderTest, AnAssignedListGrowsByHalfAndKeepsRoomThatSuffices)
+{
+    const auto event = adopted(makeEvent());
+    AutoCLEventList four;
+    AutoCLEventList five;
+    for (int i = 0; i < 4; ++i)
+        four.add(event);
+    for (int i = 0; i < 5; ++i)
+        five.add(event);
+    four = five; // room for six
+    const cl_event* array = four.array();
+    four.add(event);
+    EXPECT_EQ(four.array(), array);
+    four = five;
+    EXPECT_EQ(four.array(), array);
+    EXPECT_EQ(four.size(), 5U);
 }
 
 TEST_F(HolderTest, EventListsTakeTheReadyEventsOfBuffers)

@@ -28,7 +28,8 @@ TEST(Load, BuildsTheStaticObjectsInOrderAndUnloadingDestroysThemInReverse)
         runtime.takeCalls(),
         (Lines{"name \"positions\"", "name \"normals\"", "name \"geometryMatrix\"",
                "name \"inverseGeometryMatrix\"", "name \"normalIdxToPositionIdx\"", "name \"\"",
-               "trace clKernel", "event type GPUOverrideAcquireQuorSharedBufferBatch",
+               "trace 1 clKernel: Errors and warnings from the OpenCL Kernel Store",
+               "event type GPUOverrideAcquireQuorSharedBufferBatch",
                "event type GPUOverrideReleaseQuorSharedBufferBatch"}));
 
     // The null buffer goes without a trace, unless it has something to release.

@@ -35,7 +35,8 @@ std::uint64_t TuniqueString::hash() const
 TdbTrace::TdbTrace(int level, const char* name, std::ostream& output, const char* description)
     : fLevel(level), fName(name), fOutput(&output), fDescription(description)
 {
-    scripted::runtime().log(std::string("trace ") + name);
+    scripted::runtime().log("trace " + std::to_string(level) + ' ' + name + ": " + description +
+                            (&output == &std::cerr ? "" : ", elsewhere"));
 }
 
 TdbTrace::~TdbTrace()

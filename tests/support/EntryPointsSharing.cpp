@@ -59,7 +59,7 @@ cl_int changeSide(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_
     constexpr cl_int kD3DStatus = kAcquire ? kD3DAlreadyAcquired : kD3DNotAcquired;
     constexpr cl_int kWrongSide = &kNames == &kGL ? CL_INVALID_GL_OBJECT : kD3DStatus;
     std::vector<Object*> objects;
-    for (cl_uint i = 0; call.ok() && i < count; ++i) {
+    for (cl_uint i = 0; call.ok() && mems && i < count; ++i) {
         Object* object = call.object(Kind::kMem, mems[i]);
         if (object && call.require(object->shared && object->acquired != kAcquire, kWrongSide,
                                    kAcquire ? "already acquired" : "not acquired"))

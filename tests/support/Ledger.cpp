@@ -63,6 +63,7 @@ std::vector<std::string> Ledger::balance() const
     for (const auto& [handle, object] : fAlive)
         sorted[{object.kind, object.ordinal}] = &object;
     std::vector<std::string> lines;
+    lines.reserve(sorted.size());
     for (const auto& [place, object] : sorted)
         lines.push_back(object->name + " x" + std::to_string(object->references));
     return lines;
