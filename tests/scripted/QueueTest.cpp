@@ -42,9 +42,12 @@ TEST_F(QueueTest, ANullSecondaryQueueIsHarmless)
     ASSERT_TRUE(start());
     EXPECT_EQ(warnings().size(), 1U);
     TopenCLInfo::finish();
-    EXPECT_EQ(calls(), (Lines{"clFinish(queue#1)", "clFinish(null) ! -36"}));
+    TopenCLInfo::flush();
+    EXPECT_EQ(calls(), (Lines{"clFinish(queue#1)", "clFinish(null) ! -36", "clFlush(queue#1)",
+                              "clFlush(null) ! -36"}));
     EXPECT_EQ(warnings(), Lines{});
     expectMisuse("clFinish: null");
+    expectMisuse("clFlush: null");
 }
 
 TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
@@ -62,23 +65,41 @@ TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
     expectLeft({"queue#3 x1", "queue#4 x1"});
 }
 
+TEST_F(QueueTest, AQueueThatComesWithAFailureIsNone)
+{
+    ASSERT_TRUE(start());
+    runtime().plan({.function = "clCreateCommandQueue", .withHandle = true});
+    EXPECT_EQ(TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr), nullptr);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES\n"});
+    expectLeft({"queue#3 x1"});
+}
+
+TEST_F(QueueTest, AnEventOfWhichNothingIsSaidIsNotComplete)
+{
+    world.emptyAnswers = {CL_EVENT_COMMAND_EXECUTION_STATUS};
+    ASSERT_TRUE(start());
+    AutoCLObject<cl_event> event;
+    event.adopt(makeEvent());
+    EXPECT_FALSE(TopenCLInfo::IsEventComplete(event.get()));
+}
+
 struct EventRow : Named {
-    bool amd;
+    const char* vendor;
     std::deque<cl_int> statuses;
     unsigned failing; // the query that fails, or 0
     bool complete;
     std::size_t queries;
 };
 
+const char* const kAMD = "Advanced Micro Devices, Inc.";
+const char* const kNVIDIA = "NVIDIA Corporation";
 class EventQuery : public ScriptedTest, public ::testing::WithParamInterface<EventRow> {};
 
 TEST_P(EventQuery, AnswersAfterAsManyLooksAsNeeded)
 {
     const EventRow& row = GetParam();
-    if (row.amd) {
-        world.platforms[0].vendor = "Advanced Micro Devices, Inc.";
-        arguments.vendorId = 0x1002;
-    }
+    world.platforms[0].vendor = row.vendor;
+    setEnvironment("VYRA_OPENCL_PLATFORM", row.vendor);
     ASSERT_TRUE(start());
     runtime().scriptEventStatuses(row.statuses);
     const cl_event event = makeEvent();
@@ -95,14 +116,15 @@ TEST_P(EventQuery, AnswersAfterAsManyLooksAsNeeded)
 }
 INSTANTIATE_TEST_SUITE_P(
     Queue, EventQuery,
-    ::testing::Values(EventRow{"Done", false, {CL_COMPLETE}, 0, true, 1},
-                      EventRow{"Running", false, {CL_RUNNING, CL_COMPLETE}, 0, false, 1},
-                      EventRow{"Failed", false, {-5}, 0, false, 1},
-                      EventRow{"QueryFails", false, {CL_RUNNING}, 1, true, 1},
-                      EventRow{"DoneOnAMD", true, {CL_COMPLETE}, 0, true, 1},
-                      EventRow{"SecondLookOnAMD", true, {CL_QUEUED, CL_COMPLETE}, 0, true, 2},
-                      EventRow{"RunningOnAMD", true, {CL_RUNNING}, 0, false, 2},
-                      EventRow{"SecondQueryFailsOnAMD", true, {CL_RUNNING}, 2, true, 2}),
+    ::testing::Values(EventRow{"Done", kNVIDIA, {CL_COMPLETE}, 0, true, 1},
+                      EventRow{"Running", kNVIDIA, {CL_RUNNING, CL_COMPLETE}, 0, false, 1},
+                      EventRow{"Failed", kNVIDIA, {-5}, 0, false, 1},
+                      EventRow{"QueryFails", kNVIDIA, {CL_RUNNING}, 1, true, 1},
+                      EventRow{"DoneOnAMD", kAMD, {CL_COMPLETE}, 0, true, 1},
+                      EventRow{"SecondLookOnAMD", kAMD, {CL_QUEUED, CL_COMPLETE}, 0, true, 2},
+                      EventRow{"RunningOnAMD", kAMD, {CL_RUNNING}, 0, false, 2},
+                      EventRow{"FailedOnAMD", kAMD, {-5}, 0, false, 2},
+                      EventRow{"SecondQueryFailsOnAMD", kAMD, {CL_RUNNING}, 2, true, 2}),
     ::testing::PrintToStringParamName());
 
 TEST_F(QueueTest, WorkGroupSizesRoundUpToMultiples)

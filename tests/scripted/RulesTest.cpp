@@ -2,6 +2,7 @@
 #include "runtime/DriverVersion.h"
 #include "runtime/SyncModes.h"
 
+#include <array>
 #include <climits>
 #include <stdexcept>
 #include <string>
@@ -41,6 +42,8 @@ const DriverRow kDriverRows[] = {
     {"400.99", -1, true, true, true},
     // Only the first three characters and the two behind the fourth count.
     {"385x31.9", kUnset, true, true, true},
+    {"365910", kUnset, false, false, true},
+    {"361.910", kUnset, true, false, true},
     {" 99.99", kUnset, true, false, false},
     {"385. 9", kUnset, true, false, true},
 
@@ -68,6 +71,13 @@ TEST(DriverVersionRule, UnreadableVersionsRaise)
         SCOPED_TRACE(text);
         EXPECT_THROW(parseDriverVersion(text), std::exception);
     }
+}
+
+TEST(ProviderRule, EachHasItsNumber)
+{
+    EXPECT_EQ((std::array<int, 5>{kNVIDIAProvider, kAMDProvider, kIntelProvider, kAppleProvider,
+                                  kUnknownProvider}),
+              (std::array<int, 5>{0, 1, 2, 3, 4}));
 }
 
 enum Message { kSilent, kUnstable, kUsesGLFinish, kUsesEventInfo };
@@ -116,9 +126,9 @@ const SyncRow kCLToGraphicsRows[] = {
     {5, {false, true, true}, 2, kSilent},
     {1, {true, false, false}, 1, kSilent},
     {1, {false, true, true}, 2, kUsesEventInfo},
-    {2, kAll, 2, kSilent},
+    {2, kNone, 2, kSilent},
     {3, kNone, 3, kSilent},
-    {4, kAll, 4, kSilent},
+    {4, kNone, 4, kSilent},
 };
 
 template <typename Choose>

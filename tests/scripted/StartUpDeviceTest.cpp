@@ -1,6 +1,8 @@
 // Start-up from the device to the kernel store: devices that share, context, report, precision,
 // queues, compute units.
 #include "StartUpCase.h"
+#include "kernels/TopenCLKernelStore.h"
+#include "runtime/SyncModes.h"
 
 #include <sstream>
 
@@ -73,6 +75,11 @@ const StartUpRow kDeviceRows[] = {
     {"TypeOfCurrentDeviceFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
     {"TypeOfListedDeviceFails", [](StartUp& c) { c.world.currentGLDevice.reset(); c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
     {"ContextFails", [](StartUp& c) { c.fails("clCreateContext"); c.stopsWithContext(""); c.modes = {3, 4}; c.left = {}; }},
+    {"ContextOfNothing", [](StartUp& c) {
+         c.faults = {{.function = "clCreateContext", .status = CL_SUCCESS}};
+         c.stopsWithContext(kReported);
+         c.doublePrecision = true;
+         c.left = {}; }},
     {"CreateFromGLMissing", [](StartUp& c) { c.world.missing = {"clCreateFromGLBuffer"}; c.stopsWithContext(kNoGL); }},
     {"AcquireGLMissing", [](StartUp& c) { c.world.missing = {"clEnqueueAcquireGLObjects"}; c.stopsWithContext(kNoGL); }},
     {"ReleaseGLMissing", [](StartUp& c) { c.world.missing = {"clEnqueueReleaseGLObjects"}; c.stopsWithContext(kNoGL); }},
@@ -85,10 +92,10 @@ const StartUpRow kDeviceRows[] = {
     {"PlatformVersionFails", [](StartUp& c) { c.fails("clGetPlatformInfo", 9); c.stopsWithContext(kReported); }},
     {"DoublePrecisionFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 5); c.stopsWithContext(kReported); }},
     {"DoubleByExtensionOn11", [](StartUp& c) {
-         c.platform().version = "OpenCL 1.1 scripted";
-         c.platform().extensions += " cl_khr_fp64";
+         c.platform().version = "OpenCL 1.10 scripted";
+         c.platform().extensions += " xcl_khr_fp64x";
          c.firstDevice().doublePrecision = 0; }},
-    {"NoDoubleByExtensionOn10", [](StartUp& c) { c.platform().version = "OpenCL 1.0"; c.doublePrecision = false; }},
+    {"NoDoubleByExtensionOn10", [](StartUp& c) { c.platform().version = "OpenCL 1.0 scripted"; c.doublePrecision = false; }},
     {"FailingExtensionsOn10CountAsNone", [](StartUp& c) {
          c.platform().version = "OpenCL 1.0";
          c.platform().extensions += " cl_khr_fp64";
@@ -114,16 +121,24 @@ const StartUpRow kDeviceRows[] = {
          c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"DriverVersionFails", [](StartUp& c) { c.onNVIDIA("400.00"); c.fails("clGetDeviceInfo", 2); c.stopsBeforeDevice(""); c.device = "device#1"; }},
     {"OlderDriverQueriesEvents", [](StartUp& c) { c.onNVIDIA("385.30"); c.modes = {1, 2}; }},
+    {"OldDriverReadsBackSynchronously", [](StartUp& c) { c.onNVIDIA("359.90"); c.asyncReadback = false; c.modes = {1, 2}; }},
+    {"IgnoredByAWord", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "yes"}}; c.modes = {1, 2}; }},
     {"IgnoredOlderDriverIsImplicit", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"ModesFromTheEnvironment", [](StartUp& c) { demandModes(c, "2", "3"); c.modes = {2, 3}; }},
     {"DemandsThatAreNoNumbers", [](StartUp& c) { demandModes(c, "2x", ""); }},
     {"FinishGoesBeforeTheModes", [](StartUp& c) {
+         withoutEvents(c, {3, 4});
          demandModes(c, "1", "1");
-         c.environment.emplace_back("VYRA_OPENCL_FORCE_FINISH", "-2");
-         c.modes = {3, 4}; }},
+         c.environment.emplace_back("VYRA_OPENCL_FORCE_FINISH", "-2"); }},
     {"FinishThatIsNoNumber", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "no"}}; }},
     {"FinishOfZero", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "0"}}; }},
     {"ModesWithoutEvents", [](StartUp& c) { withoutEvents(c, {2, 2}); }},
+    {"ExtensionsAreFoundAnywhereInTheText", [](StartUp& c) { c.platform().extensions = "xcl_khr_gl_eventx"; }},
+    {"ImpossibleDemandsAreTold", [](StartUp& c) {
+         withoutEvents(c, {1, 2});
+         demandModes(c, "1", "1");
+         c.error = c.platformText() + chooseGraphicsToCLSyncMode(1, {}).message +
+                   chooseCLToGraphicsSyncMode(1, {}).message + kReported + "\n"; }},
     {"ModesWithoutSyncObjects", [](StartUp& c) {
          withoutEvents(c, {3, 2});
          c.prepareHost = [] { installFunctionTable(false, true); }; }},
@@ -162,6 +177,58 @@ TEST_F(DeviceStartUpOnce, TheHostIsNotToldWhenComputeUnitsFail)
     EXPECT_EQ(warnings(), Lines{kOutOfResources});
 }
 
+TEST_F(DeviceStartUpOnce, WithoutAQueueTheRestIsDoneAllTheSame)
+{
+    setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
+    world.platforms[0].vendor = "NVIDIA Corporation";
+    faults = {{.function = "clCreateCommandQueue"}};
+    EXPECT_FALSE(startWatched());
+    EXPECT_EQ(warnings(), Lines{kOutOfResources});
+    EXPECT_EQ(calls().back(), "initializeOffset()");
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    EXPECT_EQ(info.computeUnitCount(), 8U);
+    EXPECT_TRUE(info.kernelStore().getKernelFromString("skin", "p", "", "skin", nullptr).get());
+    EXPECT_THAT(callsOf("clBuildProgram"),
+                ::testing::ElementsAre(::testing::HasSubstr("-cl-nv-verbose")));
+    expectLeft({"program#1 x1", "kernel#1 x1"});
+}
+
+TEST_F(DeviceStartUpOnce, WithoutAContextThereIsNoQueue)
+{
+    faults = {{.function = "clCreateContext"}};
+    EXPECT_FALSE(start());
+    EXPECT_EQ(warnings(), Lines{kOutOfResources});
+    bool outOfOrder = true;
+    EXPECT_EQ(TopenCLInfo::theOne().createOpenCLCommandQueue(&outOfOrder), nullptr);
+    EXPECT_FALSE(outOfOrder);
+    EXPECT_EQ(calls(), Lines{});
+}
+
+TEST_F(DeviceStartUpOnce, ThereIsRoomForADeviceNameOf127Characters)
+{
+    world.platforms[0].devices[0].name = std::string(127, 'n');
+    EXPECT_TRUE(startWatched());
+    EXPECT_THAT(printedError, ::testing::HasSubstr("Device " + std::string(127, 'n') + ".  "));
+}
+
+TEST_F(DeviceStartUpOnce, ALongerDeviceNameStops)
+{
+    world.platforms[0].devices[0].name = std::string(128, 'n');
+    EXPECT_FALSE(startWatched());
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_VALUE\n"});
+    expectMisuse("clGetDeviceInfo: no room for the answer");
+}
+
+TEST_F(DeviceStartUpOnce, ForcedThreadingIsAskedForOnce)
+{
+    setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
+    world.platforms[0].vendor = "NVIDIA Corporation";
+    ASSERT_TRUE(start());
+    EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
+}
+
 // The display entry of each window system, by its number.
 class DisplayStartUp : public ScriptedTest,
                        public ::testing::WithParamInterface<GLDisplayProperty> {};
@@ -177,10 +244,10 @@ TEST_P(DisplayStartUp, DeviceQueryAndContextGetTheSamePropertyList)
     });
     std::ostringstream list;
     list << "{0x2008: 5, 0x" << std::hex << GetParam().name << ": 77, 0x1084: platform#1}";
-    EXPECT_EQ(lines, (Lines{"glDisplayProperty(ptr)",
-                            "clGetGLContextInfoKHR(" + list.str() + ", 8199, 512)",
-                            "clGetGLContextInfoKHR(" + list.str() + ", 8198, 8)",
-                            "clCreateContext(" + list.str() + ", [device#1], null) = context#1"}));
+    EXPECT_EQ(lines,
+              (Lines{"glDisplayProperty(3)", "clGetGLContextInfoKHR(" + list.str() + ", 8199, 512)",
+                     "clGetGLContextInfoKHR(" + list.str() + ", 8198, 8)",
+                     "clCreateContext(" + list.str() + ", [device#1], null) = context#1"}));
 }
 INSTANTIATE_TEST_SUITE_P(WGL_GLX_EGL, DisplayStartUp,
                          ::testing::Values(GLDisplayProperty{0x200B, 77},

@@ -25,6 +25,18 @@ const StartUpRow kPlatformRows[] = {
     {"DisabledByTheUser", [](StartUp& c) {
          c.environment = {{"VYRA_DISABLE_OPENCL", "0"}};
          c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
+#if !defined(_WIN32) // where a variable cannot be empty
+    {"DisabledByAnEmptyVariable", [](StartUp& c) {
+         c.environment = {{"VYRA_DISABLE_OPENCL", ""}};
+         c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
+    {"EmptyVendorName", [](StartUp& c) {
+         c.environment = {{"VYRA_OPENCL_PLATFORM", ""}};
+         c.stopsBeforePlatform(listing(c.world, kNoPlatform) + "OpenCL evaluator failed to find OpenCL device with vendor .\n"); }},
+    {"DriverIgnoredByAnEmptyVariable", [](StartUp& c) {
+         c.onNVIDIA("365.10");
+         c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", ""}};
+         c.modes = {1, 2}; }},
+#endif
     {"ForcedThreadingIsAnnouncedFirst", [](StartUp& c) {
          c.environment = {{"VYRA_OPENCL_FORCE_THREADING", "0"}};
          c.error = "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n" + c.wholeText(); }},
@@ -33,6 +45,7 @@ const StartUpRow kPlatformRows[] = {
          c.stopsBeforePlatform("CLEW failed to initialize: scripted look-up  Vyra running without OpenCL support.\n"); }},
     {"LoadingThrowsSomethingElse", [](StartUp& c) {
          c.world.lookUp = LookUp::kThrowsNumber;
+         c.arguments.vendorId = 1; // looked at only later
          c.stopsBeforePlatform("CLEW failed to initialize.  Vyra running without OpenCL support.\n"); }},
     {"UnknownVendorId", [](StartUp& c) {
          c.arguments.vendorId = 0x1AB8;
@@ -42,6 +55,10 @@ const StartUpRow kPlatformRows[] = {
     {"ReadingPlatformIdsFails", [](StartUp& c) { c.fails("clGetPlatformIDs", 2); c.stopsBeforePlatform(kNotFound); }},
     {"NoPlatformOfTheVendor", [](StartUp& c) {
          c.platform().vendor = "intel(r) corporation";
+         c.stopsBeforePlatform(listing(c.world, kNoPlatform) + kNotFound); }},
+    {"VendorsAreWholeNames", [](StartUp& c) {
+         c.platform().vendor = "Intel(R) Corporation and others";
+         c.world.platforms.push_back({.vendor = "Intel(R)"});
          c.stopsBeforePlatform(listing(c.world, kNoPlatform) + kNotFound); }},
     {"QueryFailsBeforeTheMatch", [](StartUp& c) {
          c.world.platforms.insert(c.world.platforms.begin(), kSomebody);
@@ -69,6 +86,11 @@ const StartUpRow kPlatformRows[] = {
     {"AnyOtherByName", [](StartUp& c) {
          c.environment = {{"VYRA_OPENCL_PLATFORM", "apple"}};
          c.onVendor("apple", kUnknownProvider, 1); }},
+    {"MinimumFromTheEnvironmentOnNVIDIA", [](StartUp& c) {
+         c.onNVIDIA("385.31");
+         c.environment = {{"VYRA_OPENCL_DEFORMER_MIN_VERTS", "12x"}};
+         c.minimumBufferSize = 12;
+         c.error = c.platformText() + "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 12.\n" + kReported + "\n"; }},
     {"MinimumFromTheEnvironment", [](StartUp& c) {
          c.environment = {{"VYRA_OPENCL_DEFORMER_MIN_VERTS", "-5"}};
          c.minimumBufferSize = 0;
@@ -87,6 +109,27 @@ TEST_F(StartUpOnce, ASecondInitializeChangesAndPrintsNothing)
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
     EXPECT_EQ(calls(), Lines{});
     EXPECT_FALSE(TopenCLInfo::theOne().usingDX());
+}
+
+TEST_F(StartUpOnce, AFailedStartUpIsNotTriedAgain)
+{
+    setEnvironment("VYRA_DISABLE_OPENCL", "0");
+    EXPECT_FALSE(startWatched());
+    EXPECT_EQ(calls(), Lines{});
+    removeEnvironment("VYRA_DISABLE_OPENCL");
+    EXPECT_FALSE(startWatched());
+    EXPECT_EQ(printedError, "");
+    EXPECT_EQ(calls(), Lines{});
+}
+
+TEST_F(StartUpOnce, PlatformTextsAreAskedForInTheirOrder)
+{
+    ASSERT_TRUE(startWatched());
+    Lines expected; // vendor, name, version, extensions: size and value; the version again
+    for (const char* query :
+         {"2307", "2307", "2306", "2306", "2305", "2305", "2308", "2308", "2305"})
+        expected.push_back(std::string("clGetPlatformInfo(platform#1, ") + query + ')');
+    EXPECT_EQ(callsOf("clGetPlatformInfo"), expected);
 }
 
 TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
@@ -110,6 +153,9 @@ TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
         "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 0.\n";
     EXPECT_EQ(testing::internal::GetCapturedStderr(), line + line);
 
+    EXPECT_TRUE(info.usingGPU());
+    EXPECT_TRUE(info.usingGLCoreProfile());
+    EXPECT_FALSE(info.usingOutOfOrderExecution());
     EXPECT_TRUE(info.setAllowDoublePrecisionSupport(true)); // becomes false: no double precision
     EXPECT_FALSE(info.allowDoublePrecisionSupport());
     EXPECT_FALSE(info.setAllowDoublePrecisionSupport(true));

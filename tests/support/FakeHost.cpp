@@ -6,6 +6,7 @@
 #include "host/Profiler.h"
 #include "host/ResourceWindow.h"
 
+#include <cstdint>
 #include <sstream>
 #include <string>
 
@@ -87,7 +88,7 @@ void TresourceGuard::initializeOffset()
 
 GLDisplayProperty glDisplayProperty(void* window)
 {
-    log("glDisplayProperty(", runtime().name(window), ")");
+    log("glDisplayProperty(", reinterpret_cast<std::uintptr_t>(window), ")");
     return host().display;
 }
 
