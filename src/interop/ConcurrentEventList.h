@@ -4,7 +4,6 @@
 #include <algorithm>
 #include <atomic>
 #include <cstddef>
-#include <memory>
 #include <mutex>
 #include <new>
 #include <thread>
@@ -91,8 +90,7 @@ private:
         return slot.event;
     }
 
-    // Neighbours are written by several threads anyway: slots need no cache line of their own.
-    tbb::concurrent_vector<Slot, std::allocator<Slot>> fSlots;
+    tbb::concurrent_vector<Slot> fSlots;
     std::atomic<std::size_t> fSlotCount = 0; // of slots that are ready to be written
     std::atomic<std::size_t> fSize = 0;      // of slots taken
     std::mutex fGrowth;

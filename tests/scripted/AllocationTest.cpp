@@ -30,14 +30,22 @@ bool nextFails()
 
 } // namespace
 
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept
+{
+    return nextFails() ? nullptr : std::malloc(size ? size : 1);
+}
 void* operator new(std::size_t size)
 {
-    void* memory = nextFails() ? nullptr : std::malloc(size ? size : 1);
+    void* memory = operator new(size, std::nothrow);
     if (!memory)
         throw std::bad_alloc();
     return memory;
 }
 // A sanitizer's own would not come by.
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
+{
+    return operator new(size, std::nothrow);
+}
 void* operator new[](std::size_t size)
 {
     return operator new(size);
@@ -61,8 +69,8 @@ void* operator new[](std::size_t size)
 }
 
 #ifndef _WIN32
-// The data map's allocator. What a program defines goes before what TBB's library does; on Windows
-// that is not so, and there the map's test is left out.
+// What the allocators of TBB's containers call. A program's own goes before TBB's; on Windows that
+// is not so, and there the tests of such containers are left out.
 namespace tbb::detail::r1 {
 
 void* allocate_memory(std::size_t size)
@@ -72,6 +80,19 @@ void* allocate_memory(std::size_t size)
 void deallocate_memory(void* memory)
 {
     operator delete(memory);
+}
+void* cache_aligned_allocate(std::size_t size)
+{
+    constexpr std::size_t kLine = 128;
+    void* memory =
+        nextFails() ? nullptr : std::aligned_alloc(kLine, (size + kLine - 1) / kLine * kLine);
+    if (!memory)
+        throw std::bad_alloc();
+    return memory;
+}
+void cache_aligned_deallocate(void* memory)
+{
+    std::free(memory);
 }
 
 } // namespace tbb::detail::r1
@@ -221,6 +242,24 @@ TEST(Allocation, AMapKeepsItsEntriesWhereAnInsertionFailsAndNoneWhereACopyDoes)
     EXPECT_EQ(sizesAfterFailures([&source](TopenCLData& map) { map = source; }),
               std::set<std::ptrdiff_t>{0});
 }
+
+TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
+{
+    ConcurrentEventList list;
+    std::vector<cl_event> events;
+    events.reserve(1000);
+    allocationsLeft = 1;
+    EXPECT_THROW(for (;;) list.append(nullptr), std::bad_alloc);
+    list.copyTo(events);
+    const std::size_t listed = events.size();
+    EXPECT_GE(listed, 100U);
+    EXPECT_THROW(list.append(nullptr), std::bad_alloc) << "a list that could not grow stays so";
+    list.clear();
+    for (std::size_t index = 0; index < listed; ++index)
+        list.append(nullptr);
+    list.copyTo(events);
+    EXPECT_EQ(events.size(), listed);
+}
 #endif
 
 TEST_F(ScriptedTest, AWarningWithoutMemoryIsEmpty)
@@ -245,24 +284,6 @@ TEST_F(ScriptedTest, ABatchThatCannotBeRebuiltIsEmpty)
     EXPECT_EQ(callsOf("clEnqueueRelease"), Lines{});
     bench.open();
     EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "tried again";
-}
-
-TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
-{
-    ConcurrentEventList list;
-    std::vector<cl_event> events;
-    events.reserve(1000);
-    allocationsLeft = 1;
-    EXPECT_THROW(for (;;) list.append(nullptr), std::bad_alloc);
-    list.copyTo(events);
-    const std::size_t listed = events.size();
-    EXPECT_GE(listed, 100U);
-    EXPECT_THROW(list.append(nullptr), std::bad_alloc) << "a list that could not grow stays so";
-    list.clear();
-    for (std::size_t index = 0; index < listed; ++index)
-        list.append(nullptr);
-    list.copyTo(events);
-    EXPECT_EQ(events.size(), listed);
 }
 
 } // namespace
