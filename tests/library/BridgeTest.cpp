@@ -2,9 +2,14 @@
 #include "host/EvaluationId.h"
 
 #include <memory>
+#include <type_traits>
 #include <utility>
 
 #include <gtest/gtest.h>
+
+// Neither has data of its own.
+static_assert(sizeof(IDeformerEvaluatorBridgeAPI) == sizeof(void*));
+static_assert(std::is_empty_v<IDeformerEvaluatorBridge>);
 
 namespace {
 

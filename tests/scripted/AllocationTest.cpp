@@ -236,6 +236,19 @@ TEST(Allocation, AMapKeepsItsEntriesWhereAnInsertionFailsAndNoneWhereACopyDoes)
     EXPECT_GT(nth, 5U);
 }
 
+TEST_F(ScriptedTest, AProfilersEventEndsWhereMemoryRunsOut)
+{
+    ASSERT_TRUE(start());
+    Bench bench;
+    bench.makeManager(1);
+    host().sampling = true;
+    calls();
+    allocationsLeft = 1;
+    EXPECT_THROW(bench.open(), std::bad_alloc);
+    allocationsLeft = 0;
+    EXPECT_EQ(calls().back(), "eventEnd(5)");
+}
+
 TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
 {
     ConcurrentEventList list;

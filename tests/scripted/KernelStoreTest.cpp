@@ -94,12 +94,20 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     EXPECT_EQ(builds(), 2U);
     fStore->getKernel(path, "-DA -I a", "skin", nullptr); // the same options in other words
     EXPECT_EQ(builds(), 0U);
+    // Where the name has a program already, no file is looked for.
+    fromText("skin", " -I a", "no/such/file.cl");
+    EXPECT_EQ(builds(), 1U);
+    for (const char* flags : {" -I a", ""}) {
+        const TstringArray* directories = *flags ? nullptr : &folders;
+        EXPECT_NE(fStore->getKernel("no/such/file.cl", flags, "wave", directories).get(), nullptr);
+    }
+    EXPECT_EQ(builds(), 0U);
     folders.append("b");
     fStore->getKernel(path, "-DA", "skin", &folders);
     EXPECT_EQ(builds(), 1U);
     TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
     fStore->getKernel(path, "-DA", "skin", nullptr);
-    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#6, [device#1], \"-DA\")"});
+    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#7, [device#1], \"-DA\")"});
 }
 
 TEST_F(KernelStoreTest, LongNamesAndOptionsThatEndAlikeAreToldApart)
@@ -153,9 +161,11 @@ TEST_F(KernelStoreTest, AStoreThatGoesLeavesHandedOutKernels)
     fromText("wave");
     calls();
     fStore.reset();
-    EXPECT_THAT(calls(), ::testing::UnorderedElementsAre("clReleaseKernel(kernel#1)",
-                                                         "clReleaseKernel(kernel#2)",
-                                                         "clReleaseProgram(program#1)"));
+    const Lines lines = calls();
+    EXPECT_THAT(lines, ::testing::UnorderedElementsAre("clReleaseKernel(kernel#1)",
+                                                       "clReleaseKernel(kernel#2)",
+                                                       "clReleaseProgram(program#1)"));
+    EXPECT_EQ(lines.back(), "clReleaseProgram(program#1)");
     EXPECT_EQ(runtime().references(Kind::kKernel, kernel.get()), 1U);
 }
 
@@ -163,13 +173,31 @@ TEST_F(KernelStoreTest, AWrongKernelNameKeepsTheBuild)
 {
     EXPECT_EQ(fromText("missing").get(), nullptr);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL_NAME"});
+    EXPECT_TRUE(fStore->freeKernel(fromText("skin", "", "other"))); // takes its own program alone
     const Kernel kernel = fromText("skin");
     EXPECT_NE(kernel.get(), nullptr);
-    EXPECT_EQ(builds(), 1U);
+    EXPECT_EQ(builds(), 2U) << "this and the other";
+    EXPECT_TRUE(fStore->freeKernel(kernel));
+    EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#2)", "clReleaseProgram(program#1)"}))
+        << "the wrong name left no kernel in the list";
+}
+
+TEST_F(KernelStoreTest, AHandleCountsWhateverTheStatus)
+{
+    for (const char* function : {"clCreateProgramWithSource", "clCreateKernel"}) {
+        SCOPED_TRACE(function);
+        runtime().plan({.function = function, .withHandle = true});
+        EXPECT_NE(fromText("skin", "", function).get(), nullptr);
+        EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
+        runtime().clearFaults();
+        runtime().plan({.function = function, .status = CL_SUCCESS}); // and no handle
+        EXPECT_EQ(fromText("skin", "", "nothing").get(), nullptr);
+    }
 }
 
 TEST_F(KernelStoreTest, AFailedBuildIsReportedWithItsLogAndForgotten)
 {
+    runtime().plan({.function = "clReleaseProgram"}); // of which nobody hears
     for (int attempt = 0; attempt < 2; ++attempt) {
         EXPECT_EQ(fStore->getKernelFromString("#error", "bad", "", "skin", nullptr).get(), nullptr);
         EXPECT_EQ(warnings(), (Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE", world.buildLog}));
@@ -209,11 +237,13 @@ INSTANTIATE_TEST_SUITE_P(KernelStore, SilentCompilerTest, ::testing::Bool());
 
 TEST_F(KernelStoreTest, ABuildThatOnlyReportsFailureCounts)
 {
-    // The build says no, the status says yes: the status decides.
     runtime().plan({.function = "clGetProgramBuildInfo", .status = CL_INVALID_DEVICE});
     EXPECT_EQ(fromText().get(), nullptr);
     EXPECT_EQ(warnings().front(), "OpenCL error: CL_INVALID_DEVICE");
+    // The build says no, the status says yes: the status decides.
+    runtime().plan({.function = "clBuildProgram", .withHandle = true});
     EXPECT_NE(fromText().get(), nullptr);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
 }
 
 TEST_F(KernelStoreTest, BeforeInitializeThereIsNoKernel)
@@ -223,6 +253,25 @@ TEST_F(KernelStoreTest, BeforeInitializeThereIsNoKernel)
     EXPECT_EQ(fromText().get(), nullptr);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_CONTEXT"});
     expectMisuse("clCreateProgramWithSource: null");
+}
+
+TEST_F(KernelStoreTest, InitializingWithoutAContextChangesNothing)
+{
+    fStore->initialize(nullptr, nullptr, kNVIDIAProvider);
+    const Kernel kernel = fromText("skin", "-DA");
+    EXPECT_EQ(callsOf("clBuildProgram"),
+              Lines{"clBuildProgram(program#1, [device#1], \"-DA -D SupportsDoublePrecision\")"});
+}
+
+TEST_F(KernelStoreTest, TheVendorsOwnFlagIsNoPartOfTheKey)
+{
+    const TopenCLInfo& info = TopenCLInfo::theOne();
+    TstringArray folders;
+    folders.append("a");
+    const Kernel kernel = fromText("skin", " -I a");
+    fStore->initialize(info.openCLContext(), info.openCLDevice(), kNVIDIAProvider);
+    fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // in other words
+    EXPECT_EQ(builds(), 1U);
 }
 
 TEST_F(KernelStoreTest, UnreadableFilesGiveNoKernelAndNoWord)
@@ -244,6 +293,22 @@ TEST_F(KernelStoreTest, SourcesAreReadUnchangedBehindThePreamble)
     EXPECT_EQ(std::string(source.asChar(), source.length()), "#a\r\nb\n\x1A");
     EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, "no/such/file.cl", "#"));
     EXPECT_EQ(source.length(), 0U);
+    fStore->getKernel(file("skin"), "", "skin", nullptr);
+    EXPECT_EQ(callsOf("clCreateProgram"),
+              Lines{"clCreateProgramWithSource(context#1, 1, \"skin\", null) = program#1"});
+}
+
+TEST_F(KernelStoreTest, NoSourceFileStaysOpen)
+{
+    const std::filesystem::path open = "/proc/self/fd";
+    if (!std::filesystem::exists(open))
+        GTEST_SKIP() << "open files cannot be counted here";
+    const auto count = [&] { return std::distance(std::filesystem::directory_iterator(open), {}); };
+    const auto before = count();
+    Tstring source;
+    EXPECT_TRUE(TopenCLInfo::oclLoadProgSource(source, file(kSource), ""));
+    EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, file(""), ""));
+    EXPECT_EQ(count(), before);
 }
 
 TEST_F(KernelStoreTest, TheResourceDirectoryIsAskedForOnce)
@@ -270,7 +335,12 @@ TEST_F(KernelStoreTest, BuildOptionsReachTheCompilerToTheCharacter)
         {"", {}, false, kIntelProvider, ""},
         {"-DFOO", {"inc"}, false, kIntelProvider, "-DFOO -I inc"},
         {"", {" ab ", " a b "}, false, kIntelProvider, " -I ab -I \"a b\""},
-        {"", {"\ta\tb"}, false, kIntelProvider, " -I \ta\tb"},
+        {"", {"\ta\tb\t"}, false, kIntelProvider, " -I \ta\tb\t"},
+        {"", {"a \"b\"", "\"", "", "  "}, false, kIntelProvider, " -I \"a \"b\"\" -I \" -I  -I "},
+        {"", {}, false, kNVIDIAProvider, " -cl-nv-verbose"},
+        {"", {}, false, kAMDProvider, ""},
+        {"", {}, false, kAppleProvider, ""},
+        {"", {}, false, kUnknownProvider, ""},
         {nullptr,
          {"C:/res", " C:/My Res "},
          true,

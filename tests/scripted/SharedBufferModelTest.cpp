@@ -110,7 +110,10 @@ private:
         const auto isEvent = [](const std::string& line) {
             return line.starts_with("clReleaseEvent");
         };
-        same("events first", std::is_partitioned(actual.begin(), actual.end(), isEvent), true);
+        const auto events = std::find_if_not(expected.begin(), expected.end(), isEvent);
+        actual.resize(std::max(actual.size(), expected.size()));
+        same("events first", Lines(actual.begin(), actual.begin() + (events - expected.begin())),
+             Lines(expected.begin(), events));
         std::sort(actual.begin(), actual.end());
         std::sort(expected.begin(), expected.end());
         same("the last calls", actual, expected);
@@ -330,7 +333,7 @@ protected:
     void SetUp() override
     {
         if (!GetParam().batching)
-            setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+            setEnvironment("VYRA_OPENCL_FORCE_THREADING", "0");
         startInModes(GetParam().graphicsToCL, GetParam().clToGraphics);
     }
 

@@ -4,12 +4,17 @@
 #include "ScriptedTest.h"
 #include "host/EvaluationId.h"
 #include "host/GLFunctionTable.h"
+#include "interop/ProfilerScope.h"
 
+#include <cstddef>
 #include <memory>
 
 using namespace scripted;
 
 namespace {
+
+// A record's address serves as a list of one memory object.
+static_assert(offsetof(TopenCLSharedBuffer, fMem) == 0);
 
 const em::Id kId(1);
 
@@ -60,7 +65,225 @@ TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
     EXPECT_EQ(create(), first);
     EXPECT_TRUE(first->fInBatch);
     EXPECT_EQ(runtime().references(Kind::kMem, first->fMem.get()), 2U) << "record and batch";
+    calls();
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(callsOf("clRetainMemObject").size(), 1U) << "the batch is made anew";
+    manager().PostEvaluate(kId);
     destroy(first);
+    expectLeft({"event#3 x1", "event#4 x1"});
+}
+
+TEST_F(SharedBufferTest, AFailedCreationLeavesTheBatchAsItIs)
+{
+    startInModes(1, 1);
+    const auto* buffer = create();
+    manager().PreEvaluate(kId);
+    manager().PostEvaluate(kId);
+    runtime().plan({.function = "clCreateFromGLBuffer"});
+    EXPECT_EQ(create(CL_OUT_OF_RESOURCES), nullptr);
+    calls();
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(callsOf("clRetainMemObject"), Lines{});
+    manager().PostEvaluate(kId);
+    destroy(buffer);
+    expectLeft({"event#3 x1", "event#4 x1"});
+}
+
+TEST_F(SharedBufferTest, CreationPassesItsArgumentsOn)
+{
+    startInModes(1, 1);
+    unsigned glBuffer = 70000;
+    int status = CL_SUCCESS;
+    const cl_mem_flags flags = CL_MEM_WRITE_ONLY | cl_mem_flags{1} << 40;
+    EXPECT_EQ(manager().CreateSharedCLBuffer(nullptr, flags, &glBuffer, &status), nullptr);
+    EXPECT_EQ(status, CL_INVALID_CONTEXT);
+    EXPECT_EQ(calls(), Lines{"clCreateFromGLBuffer(null, 1099511627778, 70000) ! -34"});
+    expectMisuse("clCreateFromGLBuffer: null");
+}
+
+// The first manager of the process alone says that nothing is batched.
+class FirstManagerTest : public SharedBufferTest, public ::testing::WithParamInterface<bool> {};
+
+TEST_P(FirstManagerTest, IsTheOnlyOneThatSaysSo)
+{
+    if (GetParam())
+        setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startInModes(1, 1);
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    testing::internal::CaptureStderr();
+    {
+        const TopenCLSharedBufferMgr second;
+    }
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+}
+INSTANTIATE_TEST_SUITE_P(SharedBuffers, FirstManagerTest, ::testing::Bool());
+
+TEST_F(SharedBufferTest, WithoutBatchingNothingIsProfiled)
+{
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startInModes(2, 3);
+    host().sampling = true;
+    manager().PreEvaluate(kId);
+    EXPECT_NE(manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr), nullptr);
+    manager().PostEvaluate(kId);
+    manager().RenderingComplete();
+    EXPECT_EQ(calls(), Lines{});
+}
+
+TEST_F(SharedBufferTest, ABufferOfAHandleThatTheBatchStillHoldsIsAlone)
+{
+    startInModes(1, 1);
+    const auto* former = create();
+    const cl_mem mem = former->fMem.get();
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(manager().DestroySharedCLBuffer(former), CL_INVALID_VALUE);
+    runtime().scriptNextSharedMem(mem);
+    const auto* again = create();
+    EXPECT_FALSE(again->fInBatch);
+    calls();
+    EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(again), CL_SUCCESS);
+    EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#1)"});
+    manager().PostEvaluate(kId);
+    expectEventsLeft();
+}
+
+TEST_F(SharedBufferTest, AFailedWaitDissolvesTheBatchAllTheSame)
+{
+    startInModes(1, 1);
+    const auto* first = create();
+    const auto* second = create();
+    manager().PreEvaluate(kId);
+    manager().PostEvaluate(kId);
+    calls();
+    runtime().plan({.function = "clWaitForEvents"});
+    EXPECT_EQ(manager().DestroySharedCLBuffer(first), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
+    EXPECT_FALSE(second->fInBatch);
+    EXPECT_EQ(callsOf("clReleaseMemObject").size(), 3U) << "the batch's two and the record's";
+    destroy(second);
+    expectEventsLeft();
+}
+
+TEST_F(SharedBufferTest, ABufferWhoseOwnReleaseFailsLeavesTheBatchAllTheSame)
+{
+    startInModes(1, 1);
+    const auto* first = create();
+    const auto* second = create();
+    manager().PreEvaluate(kId);
+    runtime().plan({.function = "clEnqueueReleaseGLObjects"});
+    EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(first), CL_SUCCESS);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
+    calls();
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects"),
+              Lines{"clEnqueueReleaseGLObjects(queue#1, [mem#2], [event#1]) = event#2"});
+    destroy(second);
+    expectEventsLeft();
+}
+
+TEST_F(SharedBufferTest, ABatchWhoseAcquireFailedIsReleasedAllTheSame)
+{
+    startInModes(1, 1);
+    const auto* buffer = create();
+    runtime().plan({.function = "clEnqueueAcquireGLObjects"});
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
+    const cl_event other = makeEvent();
+    cl_event event = other;
+    calls();
+    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, &event), CL_SUCCESS);
+    EXPECT_EQ(event, nullptr);
+    EXPECT_EQ(calls(), Lines{});
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects").size(), 1U);
+    expectMisuse("clEnqueueReleaseGLObjects: not acquired");
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_GL_OBJECT"});
+    destroy(buffer);
+    ocl.clReleaseEvent(other);
+}
+
+TEST_F(SharedBufferTest, AnEvaluationWhoseReleaseFailedIsClosedAllTheSame)
+{
+    startInModes(1, 3);
+    const auto* batched = create();
+    manager().PreEvaluate(kId);
+    const auto* alone = create();
+    const cl_mem mem = alone->fMem.get();
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    manager().EnqueueAcquireSharedCLBuffer(queue, alone, nullptr);
+    AutoCLObject<cl_event> released;
+    manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, released.receive());
+    runtime().plan({.function = "clEnqueueReleaseGLObjects"});
+    calls();
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
+    EXPECT_EQ(callsOf("glWaitSync").size(), 1U) << "for the single release";
+    EXPECT_TRUE(alone->fInBatch);
+    EXPECT_EQ(*manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr), nullptr);
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(calls(), Lines{}) << "released but once";
+    destroy(batched);
+    destroy(alone);
+    expectLeft({"event#1 x1"});
+}
+
+TEST_F(SharedBufferTest, EveryIdOpensAnEvaluation)
+{
+    startInModes(1, 1);
+    const auto* buffer = create();
+    for (const unsigned value : {0U, 0xFFFDU, 0xFFFEU, 0xFFFFU}) {
+        const em::Id id(static_cast<std::uint16_t>(value));
+        calls();
+        manager().PreEvaluate(id);
+        if (value != 0xFFFE) // stands for none
+            manager().PreEvaluate(id);
+        EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << value;
+        manager().PostEvaluate(id);
+    }
+    destroy(buffer);
+    expectLeft({"event#7 x1", "event#8 x1"});
+}
+
+TEST_F(SharedBufferTest, SingleCommandsPassWholeListsOn)
+{
+    startInModes(1, 1);
+    const TopenCLSharedBuffer* buffers[] = {create(), create()};
+    const cl_mem mems[] = {buffers[0]->fMem.get(), buffers[1]->fMem.get()};
+    const cl_command_queue queue = TopenCLInfo::theOne().secondaryOpenCLCommandQueue();
+    cl_event events[2] = {};
+    calls();
+    for (int i = 0; i < 2; ++i)
+        EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue, buffers[i], &events[i]), 0);
+    EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 2, mems, 2, events, nullptr), 0);
+    EXPECT_EQ(calls(),
+              (Lines{"clEnqueueAcquireGLObjects(queue#2, [mem#1], []) = event#1",
+                     "clEnqueueAcquireGLObjects(queue#2, [mem#2], []) = event#2",
+                     "clEnqueueReleaseGLObjects(queue#2, [mem#1, mem#2], [event#1, event#2])"}));
+    for (int i = 0; i < 2; ++i) {
+        destroy(buffers[i]);
+        ocl.clReleaseEvent(events[i]);
+    }
+}
+
+TEST_F(SharedBufferTest, TheProfilersScopesEncloseTheCommands)
+{
+    startInModes(1, 1);
+    const auto* buffer = create();
+    host().sampling = true;
+    for (const auto operation :
+         {&TopenCLSharedBufferMgr::PreEvaluate, &TopenCLSharedBufferMgr::PostEvaluate}) {
+        calls();
+        (manager().*operation)(kId);
+        const Lines lines = calls();
+        EXPECT_GT(lines.size(), 2U);
+        EXPECT_THAT(lines.front(), testing::StartsWith("eventBegin("));
+        EXPECT_EQ(lines.back(), "eventEnd(5)");
+    }
+    EXPECT_STREQ(sfAcquireBatchEventType.description(),
+                 "Acquiring the quorview shared buffer from the OpenCl buffer manager");
+    EXPECT_STREQ(sfReleaseBatchEventType.description(),
+                 "Releasing the quorview shared buffer from the OpenCl buffer manager");
+    destroy(buffer);
     expectEventsLeft();
 }
 
@@ -140,6 +363,25 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
     destroy(buffer);
 }
 
+TEST_F(SharedBufferTest, AFenceOutlastsATimeInWhichSyncObjectsCannotBeUsed)
+{
+    startInModes(2, 1);
+    const auto* buffer = create();
+    const cl_mem mem = buffer->fMem.get();
+    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
+    manager().RenderingComplete();
+    for (const bool usable : {false, true}) {
+        installFunctionTable(usable, false);
+        if (!usable)
+            manager().RenderingComplete();
+        calls();
+        manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+        EXPECT_EQ(callsOf("gl").size(), usable ? 2U : 0U) << "wait and delete";
+        manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, nullptr);
+    }
+    destroy(buffer);
+}
+
 struct AbilityRow {
     bool functionTable;
     bool syncObjects;
@@ -162,6 +404,7 @@ TEST_F(SharedBufferTest, OnlyUsableFunctionsAreCalled)
         manager().RenderingComplete();
         EXPECT_EQ(callsOf("glFenceSync").size(), row.fences);
         manager().PreEvaluate(kId);
+        EXPECT_EQ(callsOf("resourceWindow").size(), 1U);
         manager().PostEvaluate(kId);
         EXPECT_EQ(callsOf("glWaitSync").size(), row.graphicsWaits);
         destroy(buffer);

@@ -47,6 +47,7 @@ public:
     }
     bool ok() const { return fStatus == CL_SUCCESS; }
     cl_int status() const { return fStatus; }
+    bool withHandle() const { return fWithHandle; } // does its work although it fails
 
     // Sets the status that a runtime gives to right use, such as a program that does not build.
     cl_int answerWith(cl_int status) { return fStatus = status; }

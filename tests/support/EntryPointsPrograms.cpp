@@ -26,10 +26,10 @@ cl_int clBuildProgram(cl_program program, cl_uint deviceCount, const cl_device_i
     for (cl_uint i = 0; i < deviceCount; ++i)
         call.object(Kind::kDevice, devices[i]);
     call.require(!notify && !userData, CL_INVALID_VALUE, "not synchronous");
-    if (!call.ok())
+    if (!object || (!call.ok() && !call.withHandle()))
         return call.status();
     object->built = object->source.find("#error") == std::string::npos;
-    return object->built ? CL_SUCCESS : call.answerWith(CL_BUILD_PROGRAM_FAILURE);
+    return object->built ? call.status() : call.answerWith(CL_BUILD_PROGRAM_FAILURE);
 }
 
 cl_int clGetProgramBuildInfo(cl_program program, cl_device_id device, cl_program_build_info query,
