@@ -48,7 +48,6 @@ private:
     template <typename Argument>
     cl_int setArgument(cl_uint index, const Argument& argument)
     {
-        // NOLINTNEXTLINE(bugprone-sizeof-expression): the value of an argument may be a handle
         return fCL.clSetKernelArg(fKernel.get(), index, sizeof(Argument), &argument);
     }
     cl_int enqueue(cl_command_queue queue, std::size_t elements, const AutoCLEventList& waits,

@@ -95,7 +95,6 @@ template <typename Value, typename Get, typename Handle>
 Value infoOf(Get get, const Handle& handle, cl_uint name)
 {
     Value value{};
-    // NOLINTNEXTLINE(bugprone-sizeof-expression): a handle's own size is what is asked for
     EXPECT_EQ(get(handle, name, sizeof(Value), static_cast<void*>(&value), nullptr), CL_SUCCESS);
     return value;
 }

@@ -15,14 +15,6 @@ protected:
     void SetUp() override { start(); }
 
     static TopenCLKernelStore& store() { return TopenCLInfo::theOne().kernelStore(); }
-
-    static cl_program programOf(const AutoCLObject<cl_kernel>& kernel)
-    {
-        cl_program program = nullptr;
-        // NOLINTNEXTLINE(bugprone-sizeof-expression): the answer is a handle
-        clGetKernelInfo(kernel.get(), CL_KERNEL_PROGRAM, sizeof program, &program, nullptr);
-        return program;
-    }
 };
 
 } // namespace
@@ -64,30 +56,4 @@ TEST_F(KernelStore, FlagsIncludeDirectoriesAndPrecisionReachTheCompiler)
     ASSERT_TRUE(TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false));
     EXPECT_NE(request("inSingle").get(), nullptr) << "other options are another program";
     EXPECT_EQ(request("inDouble").get(), nullptr);
-}
-
-TEST_F(KernelStore, OptionsInOtherWordsAreTheSameProgram)
-{
-    constexpr const char* kSource = "#include \"deform.cl\"\n";
-    TstringArray directories;
-    directories.append("  " VYRA_TEST_KERNELS " ");
-    const auto inFlags = [&] {
-        return store().getKernelFromString(kSource, "words", "-DUNUSED -I " VYRA_TEST_KERNELS,
-                                           "add", nullptr);
-    };
-    const auto inDirectories = [&] {
-        return store().getKernelFromString(kSource, "words", "-DUNUSED", "add", &directories);
-    };
-    std::vector<AutoCLObject<cl_kernel>> kernels{inFlags(), inDirectories(), inDirectories(),
-                                                 inFlags()};
-    const cl_program program = programOf(kernels[0]);
-    ASSERT_NE(program, nullptr);
-    for (const auto& kernel : kernels) {
-        EXPECT_EQ(programOf(kernel), program);
-        EXPECT_TRUE(store().freeKernel(kernel));
-    }
-    // The first holders keep the program's handle from being used again.
-    const AutoCLObject<cl_kernel> later = inDirectories();
-    EXPECT_NE(programOf(later), program) << "the program went with its last kernel, in all words";
-    EXPECT_EQ(programOf(inFlags()), programOf(later));
 }

@@ -47,7 +47,6 @@ AutoCLObject<cl_event> enqueueDeform(cl_command_queue queue, cl_kernel kernel, c
                                      const std::vector<cl_event>& waitList)
 {
     const auto elements = static_cast<cl_uint>(count);
-    // NOLINTNEXTLINE(bugprone-sizeof-expression): the value of the argument is the handle
     EXPECT_EQ(clSetKernelArg(kernel, 0, sizeof memory, &memory), CL_SUCCESS);
     EXPECT_EQ(clSetKernelArg(kernel, 1, sizeof amount, &amount), CL_SUCCESS);
     EXPECT_EQ(clSetKernelArg(kernel, 2, sizeof elements, &elements), CL_SUCCESS);

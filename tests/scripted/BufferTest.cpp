@@ -324,15 +324,6 @@ TEST_F(BufferTest, CreatingMemoryDropsAnEventThatAnEmptyBufferHolds)
     EXPECT_EQ(empty.bufferReadyEvent().get(), nullptr);
 }
 
-TEST_F(BufferTest, OnlyMemoryThatIsHeldIsTakenOutOfTheCount)
-{
-    TopenCLBuffer buffer;
-    buffer.ensureBufferCapacity(kSize);
-    buffer.openCLDataBuffer().buffer().reset();
-    buffer.reset();
-    EXPECT_EQ(callsOf("Reduce"), Lines{});
-}
-
 TEST_F(BufferTest, AWrappedBufferKeepsItsDescription)
 {
     const TopenCLDataBuffer data(Tplug(1, 2), TuniqueString("positions"),

