@@ -3,64 +3,47 @@
 #include "runtime/SyncModes.h"
 
 #include <array>
-#include <climits>
 #include <stdexcept>
 #include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 
 namespace {
 
-constexpr int kUnset = INT_MIN; // VYRA_OPENCL_IGNORE_DRIVER_VERSION is not set
-
 struct DriverRow {
-    const char* version;
-    int ignore;
+    std::optional<int> ignore; // VYRA_OPENCL_IGNORE_DRIVER_VERSION, where it is set
     bool usable;
     bool implicitSync;
     bool asyncReadback;
+    std::vector<const char*> versions;
 };
 
 const DriverRow kDriverRows[] = {
-    {"359.90", kUnset, true, false, false},
-    {"359.91", kUnset, true, false, true},
-    {"360.00", kUnset, true, false, true},
-    {"361.91", kUnset, true, false, true},
-    {"361.92", kUnset, false, false, true},
-    {"362.00", kUnset, false, false, true},
-    {"368.85", kUnset, false, false, true},
-    {"368.86", kUnset, true, false, true},
-    {"369.00", kUnset, true, false, true},
-    {"385.30", kUnset, true, false, true},
-    {"385.31", kUnset, true, true, true},
-    {"386.00", kUnset, true, true, true},
-    {"365.10", -1, false, false, true},
-    {"365.10", 0, true, false, true},
-    {"365.10", 1, true, true, true},
-    {"300.00", 2, true, true, false},
-    {"385.31", 0, true, true, true},
-    {"400.99", -1, true, true, true},
     // Only the first three characters and the two behind the fourth count.
-    {"385x31.9", kUnset, true, true, true},
-    {"365910", kUnset, false, false, true},
-    {"361.910", kUnset, true, false, true},
-    {" 99.99", kUnset, true, false, false},
-    {"385. 9", kUnset, true, false, true},
-
-    {"385.3", kUnset, true, false, true},
-    {"999.99", kUnset, true, true, true},
+    {{}, true, false, false, {"359.90", " 99.99"}},
+    {{}, true, false, true, {"359.91", "360.00", "361.91", "361.910"}},
+    {{}, false, false, true, {"361.92", "362.00", "365910", "368.85"}},
+    {{}, true, false, true, {"368.86", "369.00", "385.3", "385.30", "385. 9"}},
+    {{}, true, true, true, {"385.31", "385x31.9", "386.00", "999.99"}},
+    {-1, false, false, true, {"365.10"}},
+    {-1, true, true, true, {"400.99"}},
+    {0, true, false, true, {"365.10"}},
+    {0, true, true, true, {"385.31"}},
+    {1, true, true, true, {"365.10"}},
+    {2, true, true, false, {"300.00"}},
 };
 
 TEST(DriverVersionRule, EachRow)
 {
     for (const DriverRow& row : kDriverRows) {
-        SCOPED_TRACE(std::string(row.version) + " with " + std::to_string(row.ignore));
-        const std::optional<int> ignore =
-            row.ignore == kUnset ? std::nullopt : std::optional(row.ignore);
-        const DriverVerdict verdict = judgeDriver(parseDriverVersion(row.version), ignore);
-        EXPECT_EQ(verdict.usable, row.usable);
-        EXPECT_EQ(verdict.implicitSync, row.implicitSync);
-        EXPECT_EQ(verdict.asyncReadback, row.asyncReadback);
+        for (const char* version : row.versions) {
+            SCOPED_TRACE(testing::Message() << version << ' ' << row.ignore.value_or(-99));
+            const DriverVerdict verdict = judgeDriver(parseDriverVersion(version), row.ignore);
+            EXPECT_EQ(verdict.usable, row.usable);
+            EXPECT_EQ(verdict.implicitSync, row.implicitSync);
+            EXPECT_EQ(verdict.asyncReadback, row.asyncReadback);
+        }
     }
 }
 

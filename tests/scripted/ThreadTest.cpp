@@ -1,10 +1,8 @@
 // What several threads may do at once. ThreadSanitizer sees the library, not the runtime below it
 // (see QuietLock), so a lock that is missing shows as a race here; the counts show it elsewhere.
-#include "Objects.h"
-#include "ScriptedTest.h"
+#include "ManagerTest.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
-#include "host/EvaluationId.h"
 #include "kernels/TopenCLKernelStore.h"
 
 #include <algorithm>
@@ -38,16 +36,7 @@ void onThreads(const std::function<void(int)>& body)
     }
 }
 
-class ThreadTest : public ScriptedTest {
-protected:
-    static const TopenCLSharedBuffer* create()
-    {
-        int status = 0;
-        return makeShared(manager(), &status);
-    }
-    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
-    static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
-};
+using ThreadTest = ManagerTest;
 
 TEST_F(ThreadTest, KernelRequestsTakeTurns)
 {
@@ -112,44 +101,38 @@ TEST_F(ThreadTest, TheDataMapIsFilledAndReadAtOnce)
 
 TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
 {
-    startInModes(1, 3);
-    const auto* batched = create();
-    manager().PreEvaluate(em::Id(1));
+    const auto* batched = startWithBuffer(1, 3);
+    manager().PreEvaluate(kId);
     std::vector<const TopenCLSharedBuffer*> alone(kThreads);
     for (auto& buffer : alone)
         buffer = create();
     std::vector<AutoCLObject<cl_event>> released(kThreads * std::size_t{kRounds});
     onThreads([&](int thread) {
         const TopenCLSharedBuffer* own = alone[static_cast<std::size_t>(thread)];
-        const cl_mem mem = own->fMem.get();
         for (int round = 0; round < kRounds; ++round) {
             AutoCLObject<cl_event>& event = released[static_cast<std::size_t>(thread) * kRounds +
                                                      static_cast<std::size_t>(round)];
             cl_event acquired = nullptr;
-            manager().EnqueueAcquireSharedCLBuffer(queue(), batched, &acquired);
+            acquire(batched, &acquired);
             manager().EnqueueReleaseBatchedSharedCLBuffer(1, &acquired);
             ocl.clReleaseEvent(acquired);
-            manager().EnqueueAcquireSharedCLBuffer(queue(), own, nullptr);
-            manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, event.receive());
+            acquire(own);
+            release(own, event.receive());
         }
     });
     calls();
-    manager().PostEvaluate(em::Id(1));
+    manager().PostEvaluate(kId);
     const Lines lines = calls();
     // The batch's own acquire is waited for, too, and the renderer waits for the batch's release.
     EXPECT_EQ(std::ranges::count(lines, "clReleaseEvent(event#1)"), kThreads * kRounds + 1);
     const auto isWait = [](const std::string& line) { return line.starts_with("glWaitSync"); };
     EXPECT_EQ(std::ranges::count_if(lines, isWait), kThreads * kRounds + 1);
-    manager().DestroySharedCLBuffer(batched);
-    for (const auto* buffer : alone)
-        manager().DestroySharedCLBuffer(buffer);
-    expectLeft({"event#1 x1", "event#" + std::to_string(2 + kThreads * kRounds) + " x1"});
 }
 
 TEST_F(ThreadTest, SharedBuffersComeAndGoAtOnce)
 {
-    startInModes(1, 1);
-    onThreads([](int thread) {
+    startIn(1, 1);
+    onThreads([this](int thread) {
         for (int round = 0; round < kRounds; ++round) {
             const auto* buffer = create();
             ASSERT_NE(buffer, nullptr);
@@ -163,7 +146,7 @@ TEST_F(ThreadTest, SharedBuffersComeAndGoAtOnce)
 
 TEST_F(ThreadTest, OneThreadWaitsForTheFenceAndNobodyOvertakesIt)
 {
-    startInModes(2, 1);
+    startIn(2, 1);
     std::vector<const TopenCLSharedBuffer*> buffers(kThreads);
     for (auto& buffer : buffers)
         buffer = create();
@@ -171,23 +154,16 @@ TEST_F(ThreadTest, OneThreadWaitsForTheFenceAndNobodyOvertakesIt)
         manager().RenderingComplete();
         runtime().scriptClientWaits(std::deque<unsigned>(20, 0x911B)); // a long wait
         calls();
-        onThreads([&](int thread) {
-            manager().EnqueueAcquireSharedCLBuffer(
-                queue(), buffers[static_cast<std::size_t>(thread)], nullptr);
-        });
+        onThreads([&](int thread) { acquire(buffers[static_cast<std::size_t>(thread)]); });
         Lines lines = calls();
         std::erase(lines, "resourceWindow()");
         // 21 waits, one deletion, and only then the acquires.
         ASSERT_EQ(lines.size(), std::size_t{22 + kThreads});
         EXPECT_THAT(lines[20], ::testing::StartsWith("glClientWaitSync"));
         EXPECT_THAT(lines[21], ::testing::StartsWith("glDeleteSync"));
-        for (const auto* buffer : buffers) {
-            const cl_mem mem = buffer->fMem.get();
-            manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, nullptr);
-        }
+        for (const auto* buffer : buffers)
+            release(buffer);
     }
-    for (const auto* buffer : buffers)
-        manager().DestroySharedCLBuffer(buffer);
 }
 
 } // namespace

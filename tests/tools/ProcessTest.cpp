@@ -1,6 +1,4 @@
 // The program in worlds of all kinds: what it answers, and that its JSON keeps to its description.
-#include "Schema.h"
-
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
@@ -56,6 +54,18 @@ InfoRun runInfo(const Settings& settings)
     return run;
 }
 
+// What is wrong with a program's output by the description of it.
+QByteArray schemaViolations(const QByteArray& json)
+{
+    QProcess checker;
+    checker.setProcessChannelMode(QProcess::MergedChannels);
+    checker.start("python3", {INFO_SCHEMA_CHECKER, INFO_SCHEMA});
+    checker.write(json);
+    checker.closeWriteChannel();
+    EXPECT_TRUE(checker.waitForFinished(kTimeoutMs)) << checker.errorString().toStdString();
+    return checker.readAll();
+}
+
 // The value at a path such as "platforms.0.vendor"; "null", and "undefined" where there is none.
 std::string textAt(QJsonValue value, const std::string& path)
 {
@@ -109,7 +119,7 @@ TEST_P(InfoIn, IsExplained)
     EXPECT_EQ(run.exitCode, row.exitCode) << run.output.constData();
     EXPECT_EQ(run.json["exitCode"], row.exitCode);
     EXPECT_EQ(run.errors, QByteArray());
-    EXPECT_THAT(schemaViolations(INFO_SCHEMA, run.json), testing::IsEmpty());
+    EXPECT_EQ(schemaViolations(run.output), QByteArray());
     for (const QJsonValue time : run.json["selfTest"]["milliseconds"].toObject())
         EXPECT_GT(time.toDouble(), 0.0);
     for (const std::string& expected : row.expected) {

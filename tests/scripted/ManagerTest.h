@@ -1,0 +1,60 @@
+// The fixture of tests on a shared-buffer manager.
+#pragma once
+
+#include "Objects.h"
+#include "ScriptedTest.h"
+#include "host/EvaluationId.h"
+
+#include <memory>
+
+namespace scripted {
+
+inline const em::Id kId(1); // of an evaluation
+
+// A manager of the test's own: when it goes, nothing of its making may be left alive.
+class ManagerTest : public ScriptedTest {
+protected:
+    void startIn(int graphicsToCL, int clToGraphics)
+    {
+        startInModes(graphicsToCL, clToGraphics);
+        fManager = std::make_unique<TopenCLSharedBufferMgr>();
+    }
+    const TopenCLSharedBuffer* startWithBuffer(int graphicsToCL, int clToGraphics)
+    {
+        startIn(graphicsToCL, clToGraphics);
+        return create();
+    }
+    void TearDown() override
+    {
+        fManager.reset();
+        ScriptedTest::TearDown();
+    }
+    const TopenCLSharedBuffer* create(int expectedStatus = CL_SUCCESS)
+    {
+        int status = 1;
+        const auto* buffer = makeShared(manager(), &status);
+        EXPECT_EQ(status, expectedStatus);
+        return buffer;
+    }
+    void evaluate()
+    {
+        manager().PreEvaluate(kId);
+        manager().PostEvaluate(kId);
+    }
+    int acquire(const TopenCLSharedBuffer* buffer, cl_event* event = nullptr)
+    {
+        return manager().EnqueueAcquireSharedCLBuffer(queue(), buffer, event);
+    }
+    int release(const TopenCLSharedBuffer* buffer, cl_event* event = nullptr)
+    {
+        const cl_mem mem = buffer->fMem.get();
+        return manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, event);
+    }
+    static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
+    TopenCLSharedBufferMgr& manager() { return *fManager; }
+
+private:
+    std::unique_ptr<TopenCLSharedBufferMgr> fManager;
+};
+
+} // namespace scripted
