@@ -19,6 +19,13 @@ const Tplug kPlug(1, 2);
 const Tplug kOtherPlug(3, 4);
 const TuniqueString kName("positions");
 
+// Element size, element count and capacity.
+std::array<unsigned, 3> numbersOf(const Descriptor& descriptor)
+{
+    return {descriptor.elementSizeInBytes(), descriptor.elementCount(),
+            descriptor.capacityInBytes()};
+}
+
 Descriptor describe(unsigned bytes, const Tplug& plug = kPlug)
 {
     return {plug, kName, Descriptor::kReadWrite, 1, bytes, 0};
@@ -54,9 +61,7 @@ TEST_F(DataTest, TheNullBufferIsEmptyAndWritable)
     EXPECT_TRUE(null.descriptor().hasEmptyName());
     EXPECT_TRUE(null.descriptor().plug() == Tplug::fsNULL);
     EXPECT_FALSE(null.descriptor().isReadOnly());
-    EXPECT_EQ(null.descriptor().elementCount() + null.descriptor().elementSizeInBytes() +
-                  null.descriptor().capacityInBytes(),
-              0U);
+    EXPECT_EQ(numbersOf(null.descriptor()), (std::array{0U, 0U, 0U}));
 }
 
 TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
@@ -69,8 +74,7 @@ TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
         EXPECT_EQ(input.isReadOnly(), value == 0);
         EXPECT_EQ(output.isReadOnly(), value == 0);
         EXPECT_TRUE(output.plug() == kOtherPlug && output.name() == kName);
-        EXPECT_EQ(output.capacityInBytes(), 99U);
-        EXPECT_EQ(output.elementCount(), 12U);
+        EXPECT_EQ(numbersOf(output), (std::array{1U, 12U, 99U}));
     }
 }
 
@@ -78,20 +82,16 @@ TEST_F(DataTest, DescriptorsKeepWhatTheyAreGiven)
 {
     TopenCLDataBuffer data(kPlug, kName, Descriptor::kReadOnly, 12, 10, 7);
     Descriptor& descriptor = data.descriptor();
-    const auto numbers = [&descriptor] {
-        return std::array{descriptor.elementSizeInBytes(), descriptor.elementCount(),
-                          descriptor.capacityInBytes()};
-    };
     EXPECT_TRUE(descriptor.plug() == kPlug && descriptor.name() == kName);
     EXPECT_TRUE(descriptor.isReadOnly());
     EXPECT_FALSE(descriptor.hasEmptyName());
-    EXPECT_EQ(numbers(), (std::array{12U, 10U, 7U}));
+    EXPECT_EQ(numbersOf(descriptor), (std::array{12U, 10U, 7U}));
     descriptor.setPlug(kOtherPlug);
     descriptor.setElementSizeInBytes(1);
     descriptor.setElementCount(2);
     descriptor.setCapacityInBytes(3);
     EXPECT_TRUE(descriptor.plug() == kOtherPlug);
-    EXPECT_EQ(numbers(), (std::array{1U, 2U, 3U}));
+    EXPECT_EQ(numbersOf(descriptor), (std::array{1U, 2U, 3U}));
 }
 
 // What a move leaves behind is what these tests look at.
@@ -121,13 +121,10 @@ TEST_F(DataTest, EventAndDescriptorGoWithTheMemory)
     mem.adopt(makeMem()); // mem#3, after those of the events
     const TopenCLDataBuffer source({kPlug, kName, Descriptor::kReadOnly, 12, 10, 120}, mem, event);
     const auto expectSource = [&](const TopenCLDataBuffer& data) {
-        const Descriptor& descriptor = data.descriptor();
         EXPECT_EQ(data.buffer().get(), mem.get());
         EXPECT_EQ(data.bufferReadyEvent().get(), event.get());
-        EXPECT_TRUE(data == source && descriptor.isReadOnly());
-        EXPECT_EQ(descriptor.elementSizeInBytes(), 12U);
-        EXPECT_EQ(descriptor.elementCount(), 10U);
-        EXPECT_EQ(descriptor.capacityInBytes(), 120U);
+        EXPECT_TRUE(data == source && data.descriptor().isReadOnly());
+        EXPECT_EQ(numbersOf(data.descriptor()), (std::array{12U, 10U, 120U}));
     };
     expectSource(source);
     calls();

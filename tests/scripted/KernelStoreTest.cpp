@@ -18,6 +18,14 @@ using Kernel = AutoCLObject<cl_kernel>;
 
 const char* const kSource = "kernel void skin() {} kernel void wave() {}";
 
+TstringArray arrayOf(const std::vector<const char*>& texts)
+{
+    TstringArray array;
+    for (const char* text : texts)
+        array.append(text);
+    return array;
+}
+
 class KernelStoreTest : public ScriptedTest {
 protected:
     void SetUp() override
@@ -74,58 +82,43 @@ TEST_F(KernelStoreTest, AHitCreatesAnotherKernelOfTheSameProgram)
 
 TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
 {
-    const char* path = file(kSource);
-    const Kernel kernels[] = {fStore->getKernel(path, "-DA", "skin", nullptr),
-                              fStore->getKernelFromString("other", path, "-DA", "wave", nullptr),
-                              fStore->getKernel(path, "-DB", "skin", nullptr)};
-    EXPECT_EQ(builds(), 2U);
-    for (const Kernel& kernel : kernels)
-        EXPECT_NE(kernel.get(), nullptr);
-
-    // Include directories are options, too; without double precision these differ, and so does the
-    // key.
-    TstringArray folders;
-    folders.append("a");
-    fStore->getKernel(path, "-DA", "skin", &folders);
-    fStore->getKernel(path, "-DA", "wave", &folders);
-    TstringArray others;
-    others.append("b");
-    fStore->getKernel(path, "-DA", "skin", &others);
-    EXPECT_EQ(builds(), 2U);
-    fStore->getKernel(path, "-DA -I a", "skin", nullptr); // the same options in other words
-    EXPECT_EQ(builds(), 0U);
+    constexpr const char* kLong = "-DA -D THE_SAME_ENDING";
+    const struct {
+        const char* name;
+        const char* flags;
+        std::vector<const char*> directories; // options, too
+        std::size_t builds;
+    } rows[] = {{"name", "-DA", {}, 1},
+                {"name", "-DB", {}, 1},
+                {"name", "-DA", {"a"}, 1},
+                {"name", "-DA", {"b"}, 1},
+                {"name", "-DA", {"a", "b"}, 1},
+                {"name", "-DA -I a", {}, 0}, // in other words
+                {"name", "", {}, 1},
+                {"name", nullptr, {}, 1},
+                {"a/the-same-ending.cl", kLong, {}, 1},
+                {"a/the-same-ending.cl", "-DB -D THE_SAME_ENDING", {}, 1},
+                {"b/the-same-ending.cl", kLong, {}, 1}};
+    for (const auto& [name, flags, list, expected] : rows) {
+        const TstringArray directories = arrayOf(list);
+        fStore->getKernelFromString(kSource, name, flags, "skin", &directories);
+        EXPECT_EQ(builds(), expected) << name << flags;
+    }
     // Where the name has a program already, no file is looked for.
-    fromText("skin", " -I a", "no/such/file.cl");
-    EXPECT_EQ(builds(), 1U);
-    for (const char* flags : {" -I a", ""}) {
-        const TstringArray* directories = *flags ? nullptr : &folders;
-        EXPECT_NE(fStore->getKernel("no/such/file.cl", flags, "wave", directories).get(), nullptr);
+    for (const auto& [name, flags, list, expected] : rows) {
+        const TstringArray directories = arrayOf(list);
+        EXPECT_NE(fStore->getKernel(name, flags, "wave", &directories).get(), nullptr) << name;
     }
     EXPECT_EQ(builds(), 0U);
-    folders.append("b");
-    fStore->getKernel(path, "-DA", "skin", &folders);
-    EXPECT_EQ(builds(), 1U);
+    // Without double precision the options differ, and so does the key.
     TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
-    fStore->getKernel(path, "-DA", "skin", nullptr);
-    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#7, [device#1], \"-DA\")"});
-}
-
-TEST_F(KernelStoreTest, LongNamesAndOptionsThatEndAlikeAreToldApart)
-{
-    const Kernel kernels[] = {fromText("skin", "-DA -D THE_SAME_ENDING", "a/the-same-ending.cl"),
-                              fromText("skin", "-DB -D THE_SAME_ENDING", "a/the-same-ending.cl"),
-                              fromText("skin", "-DA -D THE_SAME_ENDING", "b/the-same-ending.cl"),
-                              fromText("skin", "", "name"), fromText("skin", nullptr, "name")};
-    EXPECT_EQ(builds(), 5U);
-    TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
-    const Kernel single = fromText("skin", "", "name");
-    EXPECT_EQ(builds(), 1U);
+    fromText("skin", "-DA", "name");
+    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#11, [device#1], \"-DA\")"});
 }
 
 TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
 {
-    TstringArray folders;
-    folders.append("a");
+    const TstringArray folders = arrayOf({"a"});
     const auto inOtherWords = [&](const char* kernel) {
         return fStore->getKernelFromString(kSource, "text", "", kernel, &folders);
     };
@@ -276,8 +269,7 @@ TEST_F(KernelStoreTest, InitializingWithoutAContextChangesNothing)
 TEST_F(KernelStoreTest, TheVendorsOwnFlagIsNoPartOfTheKey)
 {
     const TopenCLInfo& info = TopenCLInfo::theOne();
-    TstringArray folders;
-    folders.append("a");
+    const TstringArray folders = arrayOf({"a"});
     const Kernel kernel = fromText("skin", " -I a");
     fStore->initialize(info.openCLContext(), info.openCLDevice(), kNVIDIAProvider);
     fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // in other words
@@ -346,9 +338,7 @@ TEST_F(KernelStoreTest, BuildOptionsReachTheCompilerToTheCharacter)
     for (const OptionsRow& row : rows) {
         TopenCLInfo::theOne().setAllowDoublePrecisionSupport(row.doublePrecision);
         makeStore(row.provider);
-        TstringArray directories;
-        for (const char* directory : row.directories)
-            directories.append(directory);
+        const TstringArray directories = arrayOf(row.directories);
         fStore->getKernelFromString(kSource, "name", row.flags, "skin", &directories);
         EXPECT_THAT(callsOf("clBuildProgram"),
                     ::testing::ElementsAre(::testing::EndsWith(", \"" + row.options + "\")")));

@@ -17,8 +17,9 @@ protected:
     void startIn(int graphicsToCL, int clToGraphics)
     {
         startInModes(graphicsToCL, clToGraphics);
-        fManager = std::make_unique<TopenCLSharedBufferMgr>();
+        makeManager();
     }
+    void makeManager() { fManager = std::make_unique<TopenCLSharedBufferMgr>(); }
     const TopenCLSharedBuffer* startWithBuffer(int graphicsToCL, int clToGraphics)
     {
         startIn(graphicsToCL, clToGraphics);
@@ -50,6 +51,7 @@ protected:
         const cl_mem mem = buffer->fMem.get();
         return manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, event);
     }
+    static cl_context context() { return TopenCLInfo::theOne().openCLContext(); }
     static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
     TopenCLSharedBufferMgr& manager() { return *fManager; }
 

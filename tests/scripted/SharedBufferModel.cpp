@@ -46,9 +46,7 @@ Lines SharedBufferModel::create()
 
 void SharedBufferModel::setHandle(std::uintptr_t handle)
 {
-    const auto place =
-        std::find_if(fRecords.begin(), fRecords.end(),
-                     [handle](const Record& record) { return record.handle > handle; });
+    const auto place = std::ranges::upper_bound(fRecords, handle, {}, &Record::handle);
     fRecords.insert(place, {.mem = fNewest, .handle = handle});
 }
 
@@ -252,8 +250,7 @@ Lines SharedBufferModel::end()
 
 bool SharedBufferModel::anyAcquiredAlone() const
 {
-    return std::any_of(fRecords.begin(), fRecords.end(),
-                       [](const Record& record) { return record.acquired; });
+    return std::ranges::any_of(fRecords, &Record::acquired);
 }
 
 } // namespace scripted

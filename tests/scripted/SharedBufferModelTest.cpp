@@ -20,37 +20,10 @@ namespace {
 constexpr unsigned kSequences = 300;
 constexpr unsigned kSteps = 80;
 
-enum class Op {
-    kCreate,
-    kDestroy,
-    kDestroyBatched,
-    kPreEvaluate,
-    kAcquire,
-    kHandOver,
-    kReleaseAlone,
-    kPostEvaluate,
-    kRenderingComplete
-};
-constexpr const char* kOpNames[] = {"Create",       "Destroy",      "DestroyBatched",
-                                    "PreEvaluate",  "Acquire",      "HandOver",
-                                    "ReleaseAlone", "PostEvaluate", "RenderingComplete"};
-// How often each occurs, so that batches are large enough to be interesting.
-constexpr unsigned kWeights[] = {4, 1, 2, 4, 5, 3, 4, 4, 2};
-
 struct Step {
-    Op op;
-    unsigned choice; // of a buffer, an id or a number of events
+    std::size_t operation; // of kOperations
+    unsigned choice;       // of a buffer, an id or a number of events
 };
-
-std::vector<Step> randomSteps(unsigned seed)
-{
-    std::mt19937 random(seed);
-    std::discrete_distribution<int> op(std::begin(kWeights), std::end(kWeights));
-    std::vector<Step> steps;
-    for (unsigned i = 0; i < kSteps; ++i)
-        steps.push_back({static_cast<Op>(op(random)), static_cast<unsigned>(random() % 1000)});
-    return steps;
-}
 
 struct Modes {
     int graphicsToCL;
@@ -65,6 +38,14 @@ void PrintTo(const Modes& modes, std::ostream* out)
 // One run of a sequence: manager and model side by side.
 class SideBySide {
 public:
+    struct Operation {
+        const char* name;
+        double weight; // how often it occurs, so that batches are large enough to be interesting
+        void (SideBySide::*perform)(unsigned choice);
+        std::size_t choices; // 0: a buffer
+    };
+    static const Operation kOperations[9];
+
     explicit SideBySide(const Modes& modes)
         : fModel(modes.graphicsToCL, modes.clToGraphics, modes.batching, fCreated), fModes(modes),
           fBase(runtime().balance()), fManager(std::make_unique<TopenCLSharedBufferMgr>())
@@ -132,13 +113,15 @@ private:
     }
 
     void perform(const Step& step);
-    void performOnRecord(const Step& step, std::size_t index);
-    void create();
-    void acquire(std::size_t index);
-    void releaseAlone(std::size_t index);
+    void create(unsigned);
+    template <bool kBatched>
+    void destroy(unsigned index);
+    void acquire(unsigned index);
+    void releaseAlone(unsigned index);
     void handOver(unsigned count);
     void preEvaluate(unsigned id);
-    void postEvaluate();
+    void postEvaluate(unsigned);
+    void renderingComplete(unsigned);
     void compareState();
     void settle();
     void finish();
@@ -157,51 +140,52 @@ private:
     std::string fDifference;
 };
 
+const SideBySide::Operation SideBySide::kOperations[] = {
+    {"Create", 4, &SideBySide::create, 1},
+    {"Destroy", 1, &SideBySide::destroy<false>, 0},
+    {"DestroyBatched", 2, &SideBySide::destroy<true>, 0},
+    {"PreEvaluate", 4, &SideBySide::preEvaluate, 2},
+    {"Acquire", 5, &SideBySide::acquire, 0},
+    {"HandOver", 3, &SideBySide::handOver, 4},
+    {"ReleaseAlone", 4, &SideBySide::releaseAlone, 0},
+    {"PostEvaluate", 4, &SideBySide::postEvaluate, 1},
+    {"RenderingComplete", 2, &SideBySide::renderingComplete, 1},
+};
+
+std::vector<Step> randomSteps(unsigned seed)
+{
+    std::vector<double> weights;
+    std::ranges::transform(SideBySide::kOperations, std::back_inserter(weights),
+                           &SideBySide::Operation::weight);
+    std::mt19937 random(seed);
+    std::discrete_distribution<std::size_t> operation(weights.begin(), weights.end());
+    std::vector<Step> steps;
+    for (unsigned i = 0; i < kSteps; ++i)
+        steps.push_back({operation(random), static_cast<unsigned>(random() % 1000)});
+    return steps;
+}
+
 void SideBySide::perform(const Step& step)
 {
-    switch (step.op) {
-    case Op::kCreate:
-        return create();
-    case Op::kPreEvaluate:
-        return preEvaluate(step.choice % 2);
-    case Op::kPostEvaluate:
-        return postEvaluate();
-    case Op::kHandOver:
-        return handOver(step.choice % 4);
-    case Op::kRenderingComplete:
-        fManager->RenderingComplete();
-        return expect(fModel.renderingComplete());
-    default:
-        if (!fModel.records().empty())
-            performOnRecord(step, step.choice % fModel.records().size());
-    }
+    const Operation& operation = kOperations[step.operation];
+    const std::size_t choices = operation.choices ? operation.choices : fModel.records().size();
+    if (choices > 0)
+        (this->*operation.perform)(static_cast<unsigned>(step.choice % choices));
 }
 
-void SideBySide::performOnRecord(const Step& step, std::size_t index)
+template <bool kBatched>
+void SideBySide::destroy(unsigned index)
 {
-    const SharedBufferModel::Record record = fModel.records()[index];
-    const TopenCLSharedBuffer* buffer = fRecords.at(record.mem);
-    switch (step.op) {
-    case Op::kAcquire:
-        if (!record.acquired)
-            acquire(index);
-        return;
-    case Op::kReleaseAlone:
-        if (record.acquired)
-            releaseAlone(index);
-        return;
-    default:
-        break;
-    }
-    const bool batched = step.op == Op::kDestroyBatched;
-    const int status = batched ? fManager->DestroyBatchedSharedCLBuffer(buffer)
-                               : fManager->DestroySharedCLBuffer(buffer);
-    expect(batched ? fModel.destroyBatched(index) : fModel.destroy(index));
+    const std::string mem = fModel.records()[index].mem;
+    const TopenCLSharedBuffer* buffer = fRecords.at(mem);
+    const int status = kBatched ? fManager->DestroyBatchedSharedCLBuffer(buffer)
+                                : fManager->DestroySharedCLBuffer(buffer);
+    expect(kBatched ? fModel.destroyBatched(index) : fModel.destroy(index));
     same("status", status, fModel.status());
-    fRecords.erase(record.mem);
+    fRecords.erase(mem);
 }
 
-void SideBySide::create()
+void SideBySide::create(unsigned)
 {
     int status = 1;
     const TopenCLSharedBuffer* record = makeShared(*fManager, &status);
@@ -210,8 +194,10 @@ void SideBySide::create()
     fRecords[runtime().name(record->fMem.get())] = record;
 }
 
-void SideBySide::acquire(std::size_t index)
+void SideBySide::acquire(unsigned index)
 {
+    if (fModel.records()[index].acquired)
+        return;
     cl_event event = nullptr;
     const auto* buffer = fRecords.at(fModel.records()[index].mem);
     const int status = fManager->EnqueueAcquireSharedCLBuffer(
@@ -226,8 +212,10 @@ void SideBySide::acquire(std::size_t index)
     runtime().takeCalls();
 }
 
-void SideBySide::releaseAlone(std::size_t index)
+void SideBySide::releaseAlone(unsigned index)
 {
+    if (!fModel.records()[index].acquired)
+        return;
     const auto* buffer = fRecords.at(fModel.records()[index].mem);
     const cl_mem mem = buffer->fMem.get();
     cl_event event = nullptr;
@@ -258,13 +246,19 @@ void SideBySide::preEvaluate(unsigned id)
     expect(fModel.preEvaluate(open));
 }
 
-void SideBySide::postEvaluate()
+void SideBySide::postEvaluate(unsigned)
 {
     if (fModel.anyAcquiredAlone())
         return;
     fManager->PostEvaluate(em::Id(0));
     expect(fModel.postEvaluate());
     dropKept();
+}
+
+void SideBySide::renderingComplete(unsigned)
+{
+    fManager->RenderingComplete();
+    expect(fModel.renderingComplete());
 }
 
 void SideBySide::dropKept()
@@ -300,14 +294,12 @@ void SideBySide::compareState()
 // One evaluation more, with a buffer in the batch: its release takes all listed events along.
 void SideBySide::settle()
 {
-    for (std::size_t i = 0; i < fModel.records().size(); ++i) {
-        if (fModel.records()[i].acquired)
-            releaseAlone(i);
-    }
-    postEvaluate();
-    create();
+    for (unsigned index = 0; index < fModel.records().size(); ++index)
+        releaseAlone(index);
+    postEvaluate(0);
+    create(0);
     preEvaluate(0);
-    postEvaluate();
+    postEvaluate(0);
 }
 
 void SideBySide::finish()
@@ -361,7 +353,8 @@ TEST_P(SharedBufferModelTest, RandomSequencesFollowTheRules)
         shrink(steps);
         std::ostringstream sequence;
         for (const Step& step : steps)
-            sequence << "\n  " << kOpNames[static_cast<int>(step.op)] << ' ' << step.choice;
+            sequence << "\n  " << SideBySide::kOperations[step.operation].name << ' '
+                     << step.choice;
         FAIL() << "seed " << seed << " fails at " << play(steps) << "\nin" << sequence.str();
     }
 }

@@ -1,6 +1,6 @@
 // Start-up with a Direct3D 11 renderer: the two extensions and their entry points.
+#include "ManagerTest.h"
 #include "StartUpCase.h"
-#include "runtime/TopenCLInfo.h"
 
 using namespace scripted;
 
@@ -61,7 +61,7 @@ const StartUpRow kDirect3DRows[] = {
 INSTANTIATE_TEST_SUITE_P(Direct3D, StartUpRows, ::testing::ValuesIn(kDirect3DRows), kName);
 
 using Extensions = std::pair<const char*, const char*>; // of the platform, and the suffix in use
-class Direct3DFunctions : public ScriptedTest, public ::testing::WithParamInterface<Extensions> {};
+class Direct3DFunctions : public ManagerTest, public ::testing::WithParamInterface<Extensions> {};
 
 // The device query, the property list and the functions behind a shared buffer's life.
 TEST_P(Direct3DFunctions, AreThoseOfTheExtension)
@@ -80,22 +80,18 @@ TEST_P(Direct3DFunctions, AreThoseOfTheExtension)
                      "clCreateContext({0x401d: 5, 0x1084: platform#1}, [device#1], null) = "
                      "context#1"}));
 
-    TopenCLInfo& info = TopenCLInfo::theOne();
-    TopenCLSharedBufferMgr& manager = info.sharedBufferMgr();
+    makeManager();
     int status = 1;
     // NOLINTNEXTLINE(performance-no-int-to-ptr): an ID3D11Buffer, which nobody looks behind.
-    const auto* buffer = manager.CreateSharedCLBuffer(info.openCLContext(), CL_MEM_READ_WRITE,
-                                                      reinterpret_cast<void*>(9), &status);
+    const auto* buffer = manager().CreateSharedCLBuffer(context(), CL_MEM_READ_WRITE,
+                                                        reinterpret_cast<void*>(9), &status);
     ASSERT_TRUE(buffer);
-    const cl_mem mem = buffer->fMem.get();
-    manager.EnqueueAcquireSharedCLBuffer(info.openCLCommandQueue(), buffer, nullptr);
-    manager.EnqueueReleaseSharedCLBuffer(info.openCLCommandQueue(), 1, &mem, 0, nullptr, nullptr);
-    manager.DestroySharedCLBuffer(buffer);
+    acquire(buffer);
+    release(buffer);
     EXPECT_EQ(callsOf("cl"),
               (Lines{"clCreateFromD3D11Buffer" + suffix + "(context#1, 1, 9) = mem#1",
                      "clEnqueueAcquireD3D11Objects" + suffix + "(queue#1, [mem#1], [])",
-                     "clEnqueueReleaseD3D11Objects" + suffix + "(queue#1, [mem#1], [])",
-                     "clReleaseMemObject(mem#1)"}));
+                     "clEnqueueReleaseD3D11Objects" + suffix + "(queue#1, [mem#1], [])"}));
 }
 
 INSTANTIATE_TEST_SUITE_P(Direct3D, Direct3DFunctions,
