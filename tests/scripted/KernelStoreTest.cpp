@@ -109,6 +109,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
         const TstringArray directories = arrayOf(list);
         EXPECT_NE(fStore->getKernel(name, flags, "wave", &directories).get(), nullptr) << name;
     }
+    EXPECT_NE(fStore->getKernel("name", "-DA -I b", "wave", nullptr).get(), nullptr);
     EXPECT_EQ(builds(), 0U);
     // Without double precision the options differ, and so does the key.
     TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
