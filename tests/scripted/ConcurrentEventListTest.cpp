@@ -65,6 +65,8 @@ TEST(ConcurrentEventList, ACopyBesideAppendsIsWholeAndABeginningOfWhatFollows)
     // Short lists, over and over: an event on its way is then soon met.
     for (int evaluation = 0; evaluation < 200; ++evaluation) {
         ConcurrentEventList list;
+        appendFromAllThreads(list, 50); // of which nothing may show up again
+        list.clear();
         std::atomic<bool> done = false;
         std::vector<std::vector<cl_event>> copies;
         std::thread reader([&] {
