@@ -33,8 +33,6 @@ protected:
         ASSERT_TRUE(TopenCLInfo::theOne().usingDX());
     }
 
-    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
-
     void makeDevice()
     {
         ID3D11Device* device = nullptr;

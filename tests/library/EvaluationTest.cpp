@@ -7,6 +7,7 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
+#include <functional>
 #include <thread>
 
 namespace {
@@ -53,12 +54,15 @@ protected:
                {"GLSHARE_GL_EVENT", implicit ? nullptr : "0"}});
     }
 
-    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+    static std::vector<float> everywhere(float value)
+    {
+        return std::vector<float>(kElements, value);
+    }
 
     Mesh makeMesh()
     {
         Mesh mesh;
-        mesh.glBuffer = renderer().makeBuffer(std::vector<float>(kElements, 0.0F));
+        mesh.glBuffer = renderer().makeBuffer(everywhere(0.0F));
         mesh.add = deformKernel("add");
         mesh.scale = deformKernel("scale");
         mesh.queue.reset(TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr));
@@ -72,12 +76,6 @@ protected:
         mesh.shared = manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
                                                      CL_MEM_READ_WRITE, &mesh.glBuffer, &error);
         ASSERT_NE(mesh.shared, nullptr) << error;
-    }
-
-    // What the renderer draws from before the evaluation.
-    void writeThroughGL(const Mesh& mesh, float value)
-    {
-        renderer().writeBuffer(mesh.glBuffer, std::vector<float>(kElements, value));
     }
 
     // A deformer: x -> 2 (x + 1), with its input acquired and its last event handed over.
@@ -113,12 +111,10 @@ protected:
 
     static void deformInParallel(std::vector<Mesh>& meshes)
     {
-        std::vector<std::thread> deformers;
+        std::vector<std::jthread> deformers;
         deformers.reserve(meshes.size());
         for (Mesh& mesh : meshes)
             deformers.emplace_back([&mesh] { deform(mesh); });
-        for (std::thread& deformer : deformers)
-            deformer.join();
     }
 
     // What the modes leave to the host before it draws.
@@ -141,28 +137,21 @@ protected:
         }
     }
 
-    void evaluate(std::vector<Mesh>& meshes, int frame)
+    // One evaluation, after the renderer has drawn; `atItsBeginning` is what else happens in it.
+    void evaluate(std::vector<Mesh>& meshes, int frame,
+                  const std::function<void()>& atItsBeginning = nullptr)
     {
+        manager().RenderingComplete();
+        renderer().flush();
         if (TopenCLInfo::theOne().useGLFinish())
             renderer().finish();
         const em::Id id(static_cast<std::uint16_t>(frame));
         manager().PreEvaluate(id);
+        if (atItsBeginning)
+            atItsBeginning();
         deformInParallel(meshes);
         manager().PostEvaluate(id);
         waitAsTheHostDoes(meshes);
-    }
-
-    void expectEverywhere(const Mesh& mesh, float value, int frame)
-    {
-        EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements),
-                  std::vector<float>(kElements, value))
-            << "frame " << frame;
-    }
-
-    void renderingComplete()
-    {
-        manager().RenderingComplete();
-        renderer().flush();
     }
 };
 
@@ -172,15 +161,14 @@ TEST_P(Evaluation, NumbersArriveInGLMemory)
 {
     std::vector<Mesh> meshes = makeMeshes();
     for (int frame = 0; frame < kFrames; ++frame) {
-        for (std::size_t index = 0; index < meshes.size(); ++index)
-            writeThroughGL(meshes[index],
-                           static_cast<float>(frame * 10) + static_cast<float>(index));
-        renderingComplete();
+        SCOPED_TRACE(frame);
+        const auto first = static_cast<float>(frame * 10);
+        for (float input = first; const Mesh& mesh : meshes)
+            renderer().writeBuffer(mesh.glBuffer, everywhere(input++));
         evaluate(meshes, frame);
-        for (std::size_t index = 0; index < meshes.size(); ++index) {
-            const float input = static_cast<float>(frame * 10) + static_cast<float>(index);
-            expectEverywhere(meshes[index], 2.0F * (input + 1.0F), frame);
-        }
+        for (float input = first; const Mesh& mesh : meshes)
+            EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements),
+                      everywhere(2.0F * (input++ + 1.0F)));
         if (frame == kFrames / 3)
             meshes.push_back(makeMesh()); // on its own until it joins the batch
     }
@@ -193,25 +181,20 @@ TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
 {
     std::vector<Mesh> meshes = makeMeshes();
     for (int frame = 0; frame < kFrames; ++frame) {
+        SCOPED_TRACE(frame);
         for (const Mesh& mesh : meshes)
-            writeThroughGL(mesh, 5.0F);
-        renderingComplete();
-        if (TopenCLInfo::theOne().useGLFinish())
+            renderer().writeBuffer(mesh.glBuffer, everywhere(5.0F));
+        evaluate(meshes, frame, [&] {
+            // The middle mesh changes its level of detail: its buffer goes and another comes.
+            EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(meshes[1].shared), CL_SUCCESS);
+            renderer().deleteBuffer(meshes[1].glBuffer);
+            meshes[1].glBuffer = renderer().makeBuffer(everywhere(5.0F));
             renderer().finish();
-        const em::Id id(static_cast<std::uint16_t>(frame));
-        manager().PreEvaluate(id);
-        // The middle mesh changes its level of detail: its buffer goes and another comes.
-        EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(meshes[1].shared), CL_SUCCESS);
-        renderer().deleteBuffer(meshes[1].glBuffer);
-        meshes[1].glBuffer = renderer().makeBuffer(std::vector<float>(kElements, 5.0F));
-        renderer().finish();
-        share(meshes[1]);
-        EXPECT_FALSE(meshes[1].shared->fInBatch);
-        deformInParallel(meshes);
-        manager().PostEvaluate(id);
-        waitAsTheHostDoes(meshes);
+            share(meshes[1]);
+            EXPECT_FALSE(meshes[1].shared->fInBatch);
+        });
         for (const Mesh& mesh : meshes)
-            expectEverywhere(mesh, 12.0F, frame);
+            EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements), everywhere(12.0F));
     }
 }
 

@@ -1,41 +1,11 @@
-// Kernels from real source files on a real compiler.
+// Kernels on a real compiler.
 #include "LibraryTest.h"
 
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
-#include <filesystem>
-#include <fstream>
-
-namespace {
-
-class KernelStore : public LibraryTest {
-protected:
-    void SetUp() override { start(); }
-
-    static TopenCLKernelStore& store() { return TopenCLInfo::theOne().kernelStore(); }
-};
-
-} // namespace
-
-TEST_F(KernelStore, AProgramGoesWithItsLastKernelAndIsReadAnew)
-{
-    const std::filesystem::path path =
-        std::filesystem::temp_directory_path() / "vyra-kernel-store-test.cl";
-    std::ofstream(path) << "__kernel void before(__global int* data) { data[0] = 1; }\n";
-    const auto request = [&](const char* name) {
-        return store().getKernel(path.string().c_str(), nullptr, name, nullptr);
-    };
-    AutoCLObject<cl_kernel> kernel = request("before");
-    ASSERT_NE(kernel.get(), nullptr);
-    std::ofstream(path) << "__kernel void after(__global int* data) { data[0] = 2; }\n";
-    EXPECT_EQ(request("after").get(), nullptr)
-        << "the cached program serves while its kernel is out";
-    EXPECT_TRUE(store().freeKernel(kernel));
-    EXPECT_NE(request("after").get(), nullptr);
-    std::filesystem::remove(path);
-}
+using KernelStore = LibraryTest;
 
 TEST_F(KernelStore, FlagsIncludeDirectoriesAndPrecisionReachTheCompiler)
 {
@@ -48,7 +18,8 @@ TEST_F(KernelStore, FlagsIncludeDirectoriesAndPrecisionReachTheCompiler)
     TstringArray directories;
     directories.append("  " VYRA_TEST_KERNELS " ");
     const auto request = [&](const char* name) {
-        return store().getKernelFromString(kSource, "precision", "-DAMOUNT=3", name, &directories);
+        return TopenCLInfo::theOne().kernelStore().getKernelFromString(
+            kSource, "precision", "-DAMOUNT=3", name, &directories);
     };
     ASSERT_TRUE(TopenCLInfo::theOne().supportsDoublePrecision());
     EXPECT_NE(request("inDouble").get(), nullptr);

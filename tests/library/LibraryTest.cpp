@@ -31,14 +31,14 @@ LibraryTest::~LibraryTest()
         TopenCLInfo::finish();
 }
 
-std::string LibraryTest::kernelPath(const char* fileName)
+TopenCLSharedBufferMgr& LibraryTest::manager()
 {
-    return std::string(VYRA_TEST_KERNELS "/") + fileName;
+    return TopenCLInfo::theOne().sharedBufferMgr();
 }
 
 AutoCLObject<cl_kernel> LibraryTest::deformKernel(const char* name)
 {
-    return TopenCLInfo::theOne().kernelStore().getKernel(kernelPath("deform.cl").c_str(), nullptr,
+    return TopenCLInfo::theOne().kernelStore().getKernel(VYRA_TEST_KERNELS "/deform.cl", nullptr,
                                                          name, nullptr);
 }
 

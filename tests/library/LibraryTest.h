@@ -3,10 +3,10 @@
 
 #include "Renderer.h"
 #include "diagnostics/AutoCLObject.h"
+#include "interop/TopenCLSharedBufferMgr.h"
 
 #include <initializer_list>
 #include <memory>
-#include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -19,16 +19,17 @@ struct Variable {
 // The runtime object lives once per process, so each test is a process of its own.
 class LibraryTest : public testing::Test {
 protected:
+    void SetUp() override { start(); }
     // Sets the variables and initialises the library; a null value removes the variable. Skips the
     // test when the machine has no OpenGL; a runtime that cannot be initialised fails it.
     void start(std::initializer_list<Variable> environment = {});
     ~LibraryTest() override;
 
     Renderer& renderer() { return *fRenderer; }
+    static TopenCLSharedBufferMgr& manager();
 
     // The kernel `name` of kernels/deform.cl.
     static AutoCLObject<cl_kernel> deformKernel(const char* name);
-    static std::string kernelPath(const char* fileName);
 
 private:
     std::unique_ptr<Renderer> fRenderer;

@@ -20,13 +20,12 @@ fs::path fileOf(const char* module)
                              : fs::path();
 }
 
-class Windows : public LibraryTest {};
+using Windows = LibraryTest;
 
 } // namespace
 
 TEST_F(Windows, OpenCLIsTheOneBesideTheProgram)
 {
-    start();
     EXPECT_EQ(fileOf("OpenCL.dll"), fileOf(nullptr).parent_path() / "OpenCL.dll");
     EXPECT_EQ(fileOf("vyra-opencl.dll").filename(), "vyra-opencl.dll");
     EXPECT_EQ(GetModuleHandleA("Qt6Gui.dll"), nullptr);

@@ -1,4 +1,0 @@
-__kernel void broken(__global float* data)
-{
-    data[get_global_id(0)] = undeclared_amount;
-}
