@@ -39,9 +39,8 @@ TEST(DeviceMemory, LosesNoByteAndNoPeakBetweenThreads)
     std::atomic<unsigned int> arrived = 0;
     const auto meet = [&] {
         const unsigned int everybody = (arrived.fetch_add(1) / 2 + 1) * 2;
-        while (arrived.load() < everybody) {
+        while (arrived.load() < everybody)
             std::this_thread::yield();
-        }
     };
     unsigned int lostPeaks = 0;
     const auto addTogether = [&](bool checks) {

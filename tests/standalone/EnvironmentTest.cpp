@@ -24,14 +24,12 @@ TEST(Environment, ReadsWholeIntegersAndNothingElse)
     EXPECT_EQ(read("-42"), -42);
     EXPECT_EQ(read("2147483647"), INT32_MAX);
     EXPECT_EQ(read("-2147483648"), INT32_MIN);
-    for (const char* text : {"42", "+42", "0042", " 42 ", "\t42\r\n"}) {
+    for (const char* text : {"42", "+42", "0042", " 42 ", "\t42\r\n"})
         EXPECT_EQ(read(text), 42) << text;
-    }
     for (const char* text :
          {"", "  ", "4 2", "42x", "x42", "4.0", "0x10", "+", "-", "+-1", "--1", "++1", "- 1",
-          "true", "2147483648", "-2147483649", "99999999999999999999"}) {
+          "true", "2147483648", "-2147483649", "99999999999999999999"})
         EXPECT_EQ(read(text), defaultValue) << text;
-    }
 }
 
 TEST(Environment, AnswersTheDefaultForAMissingVariable)

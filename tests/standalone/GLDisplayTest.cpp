@@ -15,15 +15,10 @@ TEST_P(GLDisplayTest, IsThatOfTheCallersContext)
     using namespace QNativeInterface;
     const bool isEGL = std::get<std::string>(GetParam()) == "xcb_egl";
     const auto* const egl = context().nativeInterface<QEGLContext>();
-    if (isEGL && egl == nullptr) {
+    if (isEGL && !egl)
         GTEST_SKIP() << "this Qt makes no EGL contexts on X";
-    }
-    const void* display = nullptr;
-    if (egl != nullptr) {
-        display = egl->display();
-    } else {
-        display = qGuiApp->nativeInterface<QX11Application>()->display();
-    }
+    const void* display =
+        egl ? egl->display() : qGuiApp->nativeInterface<QX11Application>()->display();
     const GLDisplayProperty property = glDisplayProperty(nullptr);
     EXPECT_EQ(property.name, isEGL ? CL_EGL_DISPLAY_KHR : CL_GLX_DISPLAY_KHR);
     EXPECT_EQ(property.value, reinterpret_cast<cl_context_properties>(display));

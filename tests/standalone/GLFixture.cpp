@@ -23,9 +23,8 @@ std::string nameOf(const testing::TestParamInfo<GLKind>& info)
 
 void GLTest::SetUp()
 {
-    if (qEnvironmentVariableIsEmpty("DISPLAY")) {
+    if (qEnvironmentVariableIsEmpty("DISPLAY"))
         GTEST_SKIP() << "no display";
-    }
     const auto& [integration, windowed] = GetParam();
     qputenv("QT_QPA_PLATFORM", "xcb");
     qputenv("QT_XCB_GL_INTEGRATION", integration.c_str());
@@ -34,16 +33,14 @@ void GLTest::SetUp()
         fWindow = std::make_unique<QOpenGLWindow>();
         fWindow->resize(64, 64);
         fWindow->show();
-        if (!QTest::qWaitFor([this] { return fWindow->isValid(); }, windowTimeoutMs)) {
+        if (!QTest::qWaitFor([this] { return fWindow->isValid(); }, windowTimeoutMs))
             GTEST_SKIP() << "no OpenGL window on this display";
-        }
     } else {
         fSurface = std::make_unique<QOffscreenSurface>();
         fSurface->create();
         fContext = std::make_unique<QOpenGLContext>();
-        if (!fSurface->isValid() || !fContext->create()) {
+        if (!fSurface->isValid() || !fContext->create())
             GTEST_SKIP() << "no OpenGL context on this display";
-        }
     }
     makeCurrent();
 }
@@ -60,9 +57,8 @@ QOpenGLContext& GLTest::context() const
 
 void GLTest::makeCurrent() const
 {
-    if (fWindow != nullptr) {
+    if (fWindow != nullptr)
         fWindow->makeCurrent();
-    } else {
+    else
         fContext->makeCurrent(fSurface.get());
-    }
 }

@@ -40,17 +40,14 @@ protected:
     void SetUp() override
     {
         GLTest::SetUp();
-        if (IsSkipped()) {
+        if (IsSkipped())
             return;
-        }
-        if (window() != nullptr) {
+        if (window() != nullptr)
             fHost.emplace(*window());
-        } else {
+        else
             fHost.emplace(context());
-        }
-        if (!fHost->syncObjectsUsable()) {
+        if (!fHost->syncObjectsUsable())
             GTEST_SKIP() << "this OpenGL has no sync objects";
-        }
     }
 
     static GLFunctionTable& table() { return *GLFunctionTable::fpGlobalFunctionTable; }
@@ -185,9 +182,8 @@ TEST_P(GLHostOnce, SyncsFromCLEventsFollowTheEvent)
     cl_platform_id platform = nullptr;
     cl_device_id device = nullptr;
     if (clGetPlatformIDs(1, &platform, nullptr) != CL_SUCCESS ||
-        clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 1, &device, nullptr) != CL_SUCCESS) {
+        clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 1, &device, nullptr) != CL_SUCCESS)
         GTEST_SKIP() << "no OpenCL device";
-    }
     const cl_context openCL = clCreateContext(nullptr, 1, &device, nullptr, nullptr, nullptr);
     const cl_event event = clCreateUserEvent(openCL, nullptr);
     const auto createSync = [&](cl_event of) {

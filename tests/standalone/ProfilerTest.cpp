@@ -94,14 +94,12 @@ TEST(Profiler, KeepsEveryEventOfEveryThreadInARowOfItsOwn)
     ProfileRecorder::start();
     std::vector<std::jthread> threads;
     threads.reserve(threadCount);
-    for (int i = 0; i < threadCount; ++i) {
+    for (int i = 0; i < threadCount; ++i)
         threads.emplace_back([name = "work" + std::to_string(i)] {
             ProfileRecorder::nameThread("row of " + name);
-            for (std::size_t event = 0; event < eventsPerThread; ++event) {
+            for (std::size_t event = 0; event < eventsPerThread; ++event)
                 profiler::eventEnd(begin(name.c_str()));
-            }
         });
-    }
     threads.clear();
     ProfileRecorder::stop();
 
@@ -144,9 +142,8 @@ TEST(Profiler, EndsTheRightEventOrNone)
     ProfileRecorder::start();
     const profiler::EventId open = begin("open");
     const profiler::EventId crossing = begin("crossing");
-    for (const profiler::EventId none : {stale, profiler::EventId{0}, ~profiler::EventId{0}}) {
+    for (const profiler::EventId none : {stale, profiler::EventId{0}, ~profiler::EventId{0}})
         profiler::eventEnd(none);
-    }
     std::jthread([crossing] { profiler::eventEnd(crossing); }).join();
     ProfileRecorder::stop();
 

@@ -28,9 +28,8 @@ TEST(Hashes, OfPlugsTakeBothHalves)
 {
     constexpr std::uint64_t side = 100;
     std::set<std::uint64_t> hashes;
-    for (std::uint64_t plug = 0; plug < side * side; ++plug) {
+    for (std::uint64_t plug = 0; plug < side * side; ++plug)
         hashes.insert(Tplug(plug / side, plug % side).hash());
-    }
     EXPECT_EQ(hashes.size(), side * side);
     EXPECT_EQ(Tplug(3, 4).hash(), Tplug(3, 4).hash());
     EXPECT_EQ(Tplug::fsNULL, Tplug());
@@ -61,22 +60,16 @@ TEST(String, CutsExtendsWithNulBytesAndAppends)
 TEST(String, FindsTextsAndCharacters)
 {
     const Tstring text("one two one \xc3\xa9 \xe2\x82\xac");
-    for (const auto& [from, found] :
-         {std::pair(0, 0), {1, 8}, {8, 8}, {9, -1}, {-5, 0}, {99, -1}}) {
+    for (const auto& [from, found] : {std::pair(0, 0), {1, 8}, {8, 8}, {9, -1}, {-5, 0}, {99, -1}})
         EXPECT_EQ(text.findMB("one", from), found) << from;
-    }
     EXPECT_EQ(text.findMB("three"), -1);
     EXPECT_EQ(text.findMB(static_cast<const char*>(nullptr)), -1);
 
     EXPECT_EQ(text.findMB(L' ', 4), 7);
     // The last is half of a surrogate pair.
-    for (const auto& [code, found] : {std::pair(L' ', 3),
-                                      {L'\t', -1},
-                                      {L'\u00e9', 12},
-                                      {L'\u20ac', 15},
-                                      {wchar_t{0xd83d}, -1}}) {
+    for (const auto& [code, found] :
+         {std::pair(L' ', 3), {L'\t', -1}, {L'\u00e9', 12}, {L'\u20ac', 15}, {wchar_t{0xd83d}, -1}})
         EXPECT_EQ(text.findMB(code), found) << int{code};
-    }
 }
 
 TEST(String, TrimsSpacesOnlyAndOnlyOutside)
@@ -94,13 +87,12 @@ TEST(UniqueString, GivesAllThreadsOneHandleForOneText)
     constexpr std::size_t threadCount = 8;
     // More than the table has buckets, so that some texts meet in one.
     std::vector<std::string> texts(40'000);
-    for (std::size_t i = 0; i < texts.size(); ++i) {
+    for (std::size_t i = 0; i < texts.size(); ++i)
         texts[i] = "node" + std::to_string(i) + ".attribute";
-    }
 
     std::vector handles(threadCount, std::vector<TuniqueString>(texts.size()));
     std::vector<std::jthread> threads;
-    for (std::size_t thread = 0; thread < threadCount; ++thread) {
+    for (std::size_t thread = 0; thread < threadCount; ++thread)
         threads.emplace_back([&, thread] {
             for (std::size_t i = 0; i < texts.size(); ++i) {
                 // Pairs of threads walk the same way and meet at each text.
@@ -108,11 +100,9 @@ TEST(UniqueString, GivesAllThreadsOneHandleForOneText)
                 handles[thread][at] = TuniqueString(texts[at].c_str());
             }
         });
-    }
     threads.clear();
-    for (std::size_t text = 0; text < texts.size(); ++text) {
+    for (std::size_t text = 0; text < texts.size(); ++text)
         ASSERT_EQ(handles[0][text].asChar(), texts[text]);
-    }
     EXPECT_EQ(handles, std::vector(threadCount, handles[0]));
 }
 
