@@ -122,27 +122,24 @@ TEST_F(BufferContentsTest, ThreadsShareAtTheSameTime)
     constexpr std::size_t kThreads = 4;
     constexpr cl_int kRounds = 50;
     std::array<GLuint, kThreads> buffers{};
-    std::array<Memory, kThreads> memory;
-    for (std::size_t i = 0; i < kThreads; ++i) {
-        buffers.at(i) = makeGlBuffer(Numbers(count_, 0));
-        memory.at(i) = share(buffers.at(i));
-    }
-    glFinish();
     std::vector<std::jthread> threads;
-    for (std::size_t i = 0; i < kThreads; ++i)
-        threads.emplace_back([this, i, each = cl_mem(memory.at(i))] {
+    for (cl_int first = 0; GLuint & buffer : buffers) {
+        buffer = makeGlBuffer(Numbers(count_, 0));
+        glFinish();
+        threads.emplace_back([this, first, memory = share(buffer)] {
             const Queue queue(context_, device_);
-            for (cl_int round = 0; round < kRounds; ++round) {
-                EXPECT_EQ(queue.acquire(each), CL_SUCCESS);
-                queue.fill(each, round + static_cast<cl_int>(i));
-                EXPECT_EQ(queue.release(each), CL_SUCCESS);
+            for (cl_int value = first; value < first + kRounds; ++value) {
+                EXPECT_EQ(queue.acquire(memory), CL_SUCCESS);
+                queue.fill(memory, value);
+                EXPECT_EQ(queue.release(memory), CL_SUCCESS);
             }
             clFinish(queue);
         });
+        ++first;
+    }
     threads.clear();
-    for (std::size_t i = 0; i < kThreads; ++i)
-        EXPECT_EQ(readGl(buffers.at(i), count_),
-                  Numbers(count_, kRounds - 1 + static_cast<cl_int>(i)));
+    for (cl_int last = kRounds - 1; const GLuint buffer : buffers)
+        EXPECT_EQ(readGl(buffer, count_), Numbers(count_, last++));
 }
 
 } // namespace

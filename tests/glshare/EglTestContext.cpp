@@ -8,12 +8,8 @@
 EGLDisplay EglTestContext::display()
 {
     static EGLDisplay const theDisplay = [] {
-        const auto getPlatformDisplay = reinterpret_cast<PFNEGLGETPLATFORMDISPLAYEXTPROC>(
-            eglGetProcAddress("eglGetPlatformDisplayEXT"));
         EGLDisplay display =
-            getPlatformDisplay == nullptr
-                ? EGL_NO_DISPLAY
-                : getPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr);
+            eglGetPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr);
         return eglInitialize(display, nullptr, nullptr) == EGL_TRUE ? display : EGL_NO_DISPLAY;
     }();
     return theDisplay;

@@ -83,18 +83,11 @@ TEST_F(ExitOrder, StaticOwner)
     theOwner.reset(&theRest());
 }
 
-class ExitOrderHandlers : public ExitOrder {
-protected:
-    void SetUp() override
-    {
-        std::atexit([] { theRest().closeCl(); });
-        ExitOrder::SetUp();
-    }
-};
-
-TEST_F(ExitOrderHandlers, BeforeAndAfterTheLayers)
+// What the layer has registered itself runs between the two.
+TEST_F(ExitOrder, GlInAHandlerAndStaticOwner)
 {
     std::atexit([] { theRest().closeGl(); });
+    theOwner.reset(&theRest());
 }
 
 TEST_F(ExitOrder, PendingCommands)

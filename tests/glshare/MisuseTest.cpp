@@ -2,12 +2,13 @@
 #include "SharingTest.h"
 
 #include <array>
+#include <tuple>
 
 namespace {
 
 using MisuseTest = SharingTest;
 
-TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArguments)
+TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
 {
     const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
     const Queue unshared(makeContext({0}), device_);
@@ -43,8 +44,12 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArguments)
         {"a wait list without a count", queue_, 1, good, 0, &events[0], CL_INVALID_EVENT_WAIT_LIST},
         {"a null event", queue_, 1, good, 1, &events[1], CL_INVALID_EVENT_WAIT_LIST},
     };
+    const auto enqueue = [&](bool isRelease) {
+        return isRelease ? queue_.release(memory_) : queue_.acquire(memory_);
+    };
     // For release the objects are acquired, so that nothing but the fault in the row can count.
     for (const bool isRelease : {false, true}) {
+        EXPECT_EQ(enqueue(!isRelease), CL_INVALID_GL_OBJECT) << "it is on that side already";
         const auto call = isRelease ? clEnqueueReleaseGLObjects : clEnqueueAcquireGLObjects;
         for (const Row& row : rows) {
             SCOPED_TRACE(std::string(isRelease ? "release: " : "acquire: ") + row.what);
@@ -54,18 +59,9 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArguments)
             EXPECT_EQ(event, nullptr);
         }
         // Still in the state it was in before all those calls.
-        EXPECT_EQ(isRelease ? queue_.release(memory_) : queue_.acquire(memory_), CL_SUCCESS);
+        EXPECT_EQ(enqueue(isRelease), CL_SUCCESS);
     }
-    clFinish(queue_);
-}
-
-TEST_F(MisuseTest, ObjectsAreAcquiredOnceAndReleasedOnce)
-{
-    EXPECT_EQ(queue_.release(memory_), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(queue_.acquire(memory_), CL_SUCCESS);
-    EXPECT_EQ(queue_.acquire(memory_), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
-    EXPECT_EQ(queue_.release(memory_), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(enqueue(true), CL_INVALID_GL_OBJECT) << "it is released";
     clFinish(queue_);
 }
 
@@ -77,14 +73,7 @@ TEST_F(MisuseTest, CreationNamesWhatIsWrong)
     glGenBuffers(2, names.data());
     const auto [empty, withoutStorage] = names;
     glBindBuffer(GL_ARRAY_BUFFER, withoutStorage);
-    struct Row {
-        const char* what;
-        cl_context context;
-        cl_mem_flags flags;
-        GLuint name;
-        cl_int error;
-    };
-    const Row rows[] = {
+    const std::tuple<const char*, cl_context, cl_mem_flags, GLuint, cl_int> rows[] = {
         {"no context", nullptr, CL_MEM_READ_WRITE, buffer_, CL_INVALID_CONTEXT},
         {"a context that does not share", plain, CL_MEM_READ_WRITE, buffer_, CL_INVALID_CONTEXT},
         {"flags without use", context_, CL_MEM_ALLOC_HOST_PTR, buffer_, CL_INVALID_VALUE},
@@ -116,13 +105,7 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
     constexpr cl_context_properties kEgl = CL_EGL_DISPLAY_KHR;
     constexpr cl_context_properties kNonsense = 0x5eed;
     constexpr cl_int kNoShareGroup = CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    struct Row {
-        const char* what;
-        cl_context_properties context;
-        Properties displays;
-        cl_int error;
-    };
-    const Row rows[] = {
+    const std::tuple<const char*, cl_context_properties, Properties, cl_int> rows[] = {
         {"no display", gl, {}, kNoShareGroup},
         {"an unknown context", kNonsense, {kEgl, display}, kNoShareGroup},
         {"an unknown display", gl, {kEgl, kNonsense}, kNoShareGroup},
@@ -130,18 +113,18 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
         {"a window system of elsewhere", gl, {CL_WGL_HDC_KHR, display}, CL_INVALID_OPERATION},
         {"a property twice", gl, {kEgl, display, kEgl, display}, CL_INVALID_PROPERTY},
     };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.what);
-        Properties entries{CL_GL_CONTEXT_KHR, row.context};
-        entries.insert(entries.end(), row.displays.begin(), row.displays.end());
+    for (const auto& [what, context, displays, expected] : rows) {
+        SCOPED_TRACE(what);
+        Properties entries{CL_GL_CONTEXT_KHR, context};
+        entries.insert(entries.end(), displays.begin(), displays.end());
         const Properties list = properties(entries);
         cl_int error = CL_SUCCESS;
         EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
-        EXPECT_EQ(error, row.error);
+        EXPECT_EQ(error, expected);
         cl_device_id device = nullptr;
         EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
                                         sizeof(cl_device_id), &device, nullptr),
-                  row.error);
+                  expected);
     }
 }
 
