@@ -1,7 +1,9 @@
-// Device buffers on a real runtime: the numbers that arrive, and memory of the right size.
+// Device buffers and their pool on a real runtime: the numbers that arrive, and memory of the right
+// size.
 #include "LibraryTest.h"
 
 #include "buffers/TopenCLBuffer.h"
+#include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
 #include "diagnostics/AutoCLEventList.h"
 #include "runtime/TopenCLInfo.h"
@@ -76,14 +78,28 @@ TEST_F(Buffers, MappedMemoryIsWrittenAndMappedAnewWhenItGrows)
     }
 }
 
-TEST_F(Buffers, AnOutputHasTheRoomThatItsElementsNeedNotThatOfTheInput)
+TEST_F(Buffers, OfThePoolAreReusedAndOutputsHaveTheRoomOfTheirElements)
 {
-    const TopenCLDataBuffer input(
-        TopenCLDataBufferDescriptor(Tplug(1, 2), TuniqueString("positions"),
-                                    TopenCLDataBufferDescriptor::kReadOnly, 12, 50, 1200));
+    const Tplug plug(1, 2);
+    const TopenCLDataBufferDescriptor hundred(plug, TopenCLData::sPositionsName(),
+                                              TopenCLDataBufferDescriptor::kReadOnly, 12, 100, 0);
+    TopenCLDataBufferDescriptor fifty = hundred;
+    fifty.setElementCount(50);
     TopenCLDataBufferPool pool;
-    const TopenCLDataBuffer output = pool.createOutputBuffer(input, Tplug(3, 4));
-    std::size_t bytes = 0;
-    clGetMemObjectInfo(output.buffer().get(), CL_MEM_SIZE, sizeof bytes, &bytes, nullptr);
-    EXPECT_EQ(bytes, 600U);
+    const TopenCLDataBuffer first = pool.createBuffer(hundred);
+    pool.releaseBuffers();
+    const TopenCLDataBuffer second = pool.createBuffer(fifty);
+    EXPECT_EQ(second.buffer().get(), first.buffer().get());
+    const TopenCLDataBuffer output = pool.createOutputBuffer(second, Tplug(3, 4));
+    for (const auto& [buffer, expected] : {std::pair(second, 1200U), {output, 600U}}) {
+        std::size_t bytes = 0;
+        clGetMemObjectInfo(buffer.buffer().get(), CL_MEM_SIZE, sizeof bytes, &bytes, nullptr);
+        EXPECT_EQ(bytes, expected);
+        EXPECT_EQ(buffer.descriptor().capacityInBytes(), expected);
+    }
+    TopenCLData data;
+    pool.collectDataForPlug(plug, data);
+    EXPECT_EQ(data.getSinglePlug(), plug);
+    EXPECT_EQ(data.getData(TopenCLData::sPositionsName(), plug).buffer().get(),
+              first.buffer().get());
 }
