@@ -44,6 +44,7 @@ TEST_F(Fence, IsWaitedForOnceWhoeverAcquiresFirst)
     for (int round = 0; round < kRounds; ++round) {
         manager().RenderingComplete();
         std::vector<std::jthread> deformers;
+        deformers.reserve(buffers.size());
         for (const TopenCLSharedBuffer* buffer : buffers) {
             deformers.emplace_back([buffer, queue = TopenCLInfo::theOne().openCLCommandQueue()] {
                 const cl_mem mem = buffer->fMem.get();

@@ -8,6 +8,7 @@
 #include "diagnostics/CLInternalWarning.h"
 #include "interop/ConcurrentEventList.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <functional>
 #include <iterator>
@@ -209,7 +210,7 @@ TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
         bench.store->getKernelFromString("#error", "program", "", "skin", nullptr);
     };
     EXPECT_GT(untilMemorySuffices(build, [&] { EXPECT_EQ(runtime().balance(), before); }), 1U);
-    EXPECT_THAT(warnings(), testing::Contains(""));
+    EXPECT_GT(std::ranges::count(warnings(), ""), 0);
 }
 
 #ifndef _WIN32
