@@ -7,7 +7,6 @@
 #include <algorithm>
 #include <array>
 #include <random>
-#include <string>
 
 using namespace scripted;
 

@@ -14,6 +14,7 @@ inline const em::Id kId(1); // of an evaluation
 // A manager of the test's own: when it goes, nothing of its making may be left alive.
 class ManagerTest : public ScriptedTest {
 protected:
+    // Starts in these modes, and makes the manager; with a buffer, which is returned.
     void startIn(int graphicsToCL, int clToGraphics)
     {
         startInModes(graphicsToCL, clToGraphics);
