@@ -25,6 +25,13 @@ if(VYRA_COVERAGE)
     add_link_options(--coverage)
 endif()
 
+# Debug information that names files relative to the project: equal in every clone, so that ccache can
+# share the objects between them. A debugger that starts in the project's directory finds the files.
+option(VYRA_RELATIVE_DEBUG_PATHS "Name source files in debug information relative to the project" OFF)
+if(VYRA_RELATIVE_DEBUG_PATHS)
+    add_compile_options(-fdebug-prefix-map=${PROJECT_SOURCE_DIR}=.)
+endif()
+
 find_program(VYRA_CCACHE ccache)
 if(VYRA_CCACHE AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
     set(CMAKE_C_COMPILER_LAUNCHER ${VYRA_CCACHE})

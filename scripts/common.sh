@@ -1,6 +1,9 @@
 # What the project's commands have in common. Sourced, not run; expects `set -euo pipefail`.
 
 project_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
+# ccache compares names of files relative to the project, so that clones in different directories share
+# its results. The debug information is relative, too (VYRA_RELATIVE_DEBUG_PATHS).
+export CCACHE_BASEDIR=$project_dir
 
 fail() {
     printf '%s: %s\n' "${0##*/}" "$1" >&2
