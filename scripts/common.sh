@@ -50,9 +50,54 @@ build_preset() {
     shift
     mkdir -p "$build_dir"
     printf 'Building (%s) ...\n' "$preset"
-    cd "$project_dir"
-    run_quietly "$build_dir/configure.log" cmake --preset "$preset" "$@"
-    run_quietly "$build_dir/build.log" cmake --build --preset "$preset"
+    # Presets are looked up in the current folder; the caller's paths refer to the caller's folder.
+    (
+        cd "$project_dir"
+        run_quietly "$build_dir/configure.log" cmake --preset "$preset" "$@"
+        run_quietly "$build_dir/build.log" cmake --build --preset "$preset"
+    )
+}
+
+# Checks arguments for ctest, which ignores unknown ones and would run every test. Stores them in
+# `ctest_arguments`, with absolute paths: ctest runs in the project's folder.
+read_ctest_arguments() {
+    local known argument option='' values paths='^(-O|--output-log|--output-junit|--resource-spec-file)$'
+    command -v ctest >/dev/null || install_packages
+    known=$(ctest --help)
+    values=$(grep -oE -- '(^|[ ,])-[A-Za-z-]+ [<[]' <<<"$known" | tr -d ' ,<[')
+    ctest_arguments=()
+    for argument in "$@"; do
+        if [[ $option =~ $paths ]]; then
+            argument=$(realpath -m -- "$argument") option=''
+        elif [[ -n $option ]] && grep -qxFe "$option" <<<"$values"; then
+            option=''
+        elif [[ $argument =~ ^-j[0-9]+$ || $argument == -* ]] &&
+            grep -qE -- "(^|[ ,])(${argument%%=*}|${argument/%[0-9]*/})([][ ,=]|$)" <<<"$known"; then
+            option=$argument
+        else
+            fail "unknown argument $argument; --help lists all, ctest --help those that are passed on" 2
+        fi
+        if [[ $argument == *=* && ${argument%%=*} =~ $paths ]]; then
+            argument=${argument%%=*}=$(realpath -m -- "${argument#*=}")
+        fi
+        ctest_arguments+=("$argument")
+    done
+}
+
+# Runs the tests of a preset with `ctest_arguments`, in an environment that the arguments make. Tests
+# that pass are not listed.
+run_tests() {
+    local preset=$1 status=0
+    shift
+    echo "Testing ..."
+    (
+        cd "$project_dir"
+        # One virtual display for all tests if there is no real one.
+        "$project_dir/tests/support/with-display" "$@" \
+            ctest --preset "$preset" --parallel "$(nproc)" "${ctest_arguments[@]}" |
+            { grep -vE '^ *Start +[0-9]+:|^ *[0-9]+/[0-9]+ Test .*   Passed +[0-9.]+ sec' || true; }
+    ) || status=$?
+    return $status
 }
 
 # A display, a GPU to draw with, and an OpenCL runtime that is not the CPU's.

@@ -1,0 +1,87 @@
+"""The project's commands, run in a copy of the project whose tools are stand-ins that only log their calls.
+
+    scripts_test.py SOURCE_DIRECTORY CTEST
+"""
+import os
+import pathlib
+import shutil
+import subprocess
+import sys
+import tempfile
+import unittest
+
+SOURCE = pathlib.Path(sys.argv.pop(1))
+CTEST = sys.argv.pop(1)
+STAND_IN = '#!/bin/sh\necho "$(basename "$0") $*" >>"$TEST_LOG"\n'
+# Answers --help itself; else logs the folder, too.
+STAND_IN_CTEST = f'#!/bin/sh\n[ "$1" = --help ] && exec {CTEST} --help\necho "ctest in $PWD: $*" >>"$TEST_LOG"\n'
+STAND_IN_VIEWER = '#!/bin/sh\necho "viewer in $PWD: $*" >>"$TEST_LOG"\n'
+TOOLS = ["apt-get", "clang-format", "cmake", "dpkg-query", "doxygen", "ninja", "run-clang-tidy", "sudo"]
+
+# Each is refused before anything is installed or built.
+WRONG_USE = [
+    ("bench", "--bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
+    ("docs", "one", "two"), ("format", "--bogus"), ("gpu-check", "--bogus"), ("package", "--bogus"),
+    ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "KernelStore"),
+    ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"), ("trace-picture", "--bogus", "a", "b"),
+]
+
+
+class Scripts(unittest.TestCase):
+    def setUp(self):
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.root = pathlib.Path(folder.name).resolve()
+        self.log = self.root / "log"
+        self.elsewhere = self.root / "elsewhere"
+        self.elsewhere.mkdir()
+        project = self.root / "project"
+        shutil.copytree(SOURCE / "scripts", project / "scripts")
+        for file in ("viewer/Options.cpp", "tests/support/with-display"):
+            (project / file).parent.mkdir(parents=True)
+            shutil.copy(SOURCE / file, project / file)
+        self.stand_in(project / "build/release/bin/vyra-viewer", STAND_IN_VIEWER)
+        self.stand_in(self.root / "tools/ctest", STAND_IN_CTEST)
+        for tool in TOOLS:
+            self.stand_in(self.root / "tools" / tool, STAND_IN)
+
+    def stand_in(self, path, text):
+        path.parent.mkdir(parents=True, exist_ok=True)
+        path.write_text(text)
+        path.chmod(0o755)
+
+    def run_script(self, name, *arguments, installed=True):
+        if installed:
+            (self.root / "project/scripts/packages.txt").write_text("")
+            self.stand_in(self.root / "tools/dpkg-query", "#!/bin/sh\nprintf installed\n")
+        environment = os.environ | {
+            "PATH": f"{self.root / 'tools'}:{os.environ['PATH']}", "TEST_LOG": str(self.log), "DISPLAY": ":0"}
+        run = subprocess.run(["../project/scripts/" + name, *arguments], cwd=self.elsewhere, env=environment,
+                             capture_output=True, text=True, timeout=60, check=False)
+        return run, self.log.read_text() if self.log.exists() else ""
+
+    def test_an_unknown_argument_is_refused_at_once(self):
+        for name, *arguments in WRONG_USE:
+            with self.subTest(name, arguments=arguments):
+                run, calls = self.run_script(name, *arguments)
+                self.assertEqual((2, ""), (run.returncode, calls), run.stderr)
+                self.assertRegex(run.stderr, f"{name}: .*({'|'.join(arguments)})")
+
+    def test_relative_paths_are_the_callers(self):
+        for name, arguments, expected in [
+                ("demo", ["--output=out", "w8.gltf"],
+                 f"viewer in {self.elsewhere}: --frames 60 --output=out w8.gltf"),
+                ("test", ["-R", "A", "--output-junit", "a.xml", "-j2", "--output-log=b"],
+                 f"-R A --output-junit {self.elsewhere}/a.xml -j2 --output-log={self.elsewhere}/b")]:
+            with self.subTest(name):
+                run, calls = self.run_script(name, *arguments)
+                self.assertEqual(run.returncode, 0, run.stderr)
+                self.assertIn(expected + "\n", calls)
+
+    def test_package_installs_the_tools_that_it_uses(self):
+        _, calls = self.run_script("package", "--check", installed=False)
+        self.assertRegex(calls, r"apt-get install .*\bdpkg-dev .*\bhelp2man lintian\n")
+
+
+if __name__ == "__main__":
+    unittest.main()
