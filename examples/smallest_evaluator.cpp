@@ -1,4 +1,5 @@
 // The smallest evaluator: one vertex buffer, one kernel, one evaluation, drawn from by OpenGL.
+#include "diagnostics/CLWarningSink.h"
 #include "host/EvaluationId.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
@@ -31,6 +32,9 @@ int main(int argc, char** argv)
     if (!context.create() || !context.makeCurrent(&surface))
         return std::fprintf(stderr, "No OpenGL: start this where there is a display.\n"), 1;
     const GLHost host(context);
+
+    // Without a sink, failed OpenCL calls and the logs of kernels that do not compile are dropped.
+    setCLWarningSink([](const char* text) { std::fprintf(stderr, "%s\n", text); });
 
     // Once per process. The vendor id is the PCI id of the renderer's adapter, here NVIDIA's; set
     // VYRA_OPENCL_PLATFORM to the name of a platform's vendor to run on another.

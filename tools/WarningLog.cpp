@@ -1,7 +1,5 @@
 #include "tools/WarningLog.h"
 
-#include "diagnostics/CLWarningSink.h"
-
 #include <utility>
 
 namespace info {
@@ -11,12 +9,12 @@ constinit WarningLog* WarningLog::sfReceiver = nullptr;
 WarningLog::WarningLog()
 {
     sfReceiver = this;
-    setCLWarningSink(keep);
+    fSinkBefore = setCLWarningSink(keep);
 }
 
 WarningLog::~WarningLog()
 {
-    setCLWarningSink(nullptr);
+    setCLWarningSink(fSinkBefore);
     sfReceiver = nullptr;
 }
 

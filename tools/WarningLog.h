@@ -1,5 +1,7 @@
-// The library's warnings, kept instead of dropped.
+// Log of the library's warnings.
 #pragma once
+
+#include "diagnostics/CLWarningSink.h"
 
 #include <mutex>
 #include <string>
@@ -7,7 +9,8 @@
 
 namespace info {
 
-// While an object lives it is the receiver of the library's warnings, on any thread. One at a time.
+// Replaces the library's warning sink while an object lives, and keeps the texts of all threads.
+// One object at a time.
 class WarningLog {
 public:
     WarningLog();
@@ -23,6 +26,7 @@ private:
 
     static WarningLog* sfReceiver;
 
+    CLWarningSink fSinkBefore;
     std::mutex fMutex;
     std::vector<std::string> fTexts; // guarded by fMutex
 };

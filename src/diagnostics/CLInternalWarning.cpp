@@ -10,9 +10,8 @@
 
 namespace {
 
-void discardWarning(const char*) {}
-
-constinit std::atomic<CLWarningSink> currentSink = discardWarning;
+// Null stands for the built-in sink, which writes nothing.
+constinit std::atomic<CLWarningSink> currentSink = nullptr;
 
 // The whole message, or null when it cannot be formatted or there is no memory for it.
 std::unique_ptr<char[]> formatMessage(const char* format, va_list arguments)
@@ -33,9 +32,9 @@ std::unique_ptr<char[]> formatMessage(const char* format, va_list arguments)
 
 } // namespace
 
-void setCLWarningSink(CLWarningSink sink)
+CLWarningSink setCLWarningSink(CLWarningSink sink)
 {
-    currentSink = sink ? sink : discardWarning;
+    return currentSink.exchange(sink);
 }
 
 void CLInternalWarning(const char* format, ...)
@@ -44,6 +43,6 @@ void CLInternalWarning(const char* format, ...)
     va_start(arguments, format);
     const std::unique_ptr<char[]> text = formatMessage(format, arguments);
     va_end(arguments);
-    const CLWarningSink sink = currentSink;
-    sink(text ? text.get() : "");
+    if (const CLWarningSink sink = currentSink)
+        sink(text ? text.get() : "");
 }

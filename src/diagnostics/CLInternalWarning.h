@@ -3,7 +3,7 @@
 
 #include "VyraOpenCLExport.h"
 
-// Formats a printf-style message, whole and of any length, and hands it to the warning sink. The
-// built-in sink writes nothing. Never fails towards its caller: a message that cannot be formatted
-// is handed on empty. Safe from any thread.
+// Formats a printf-style message of any length without truncation and passes it to the warning
+// sink (CLWarningSink.h); the built-in sink writes nothing. Never fails: a message that cannot be
+// formatted is passed on empty. Safe from any thread.
 [[gnu::format(printf, 1, 2)]] VYRA_OPENCL_API void CLInternalWarning(const char* format, ...);

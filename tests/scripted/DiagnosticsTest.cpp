@@ -2,8 +2,12 @@
 #include "ScriptedTest.h"
 #include "diagnostics/CLErrorCodes.h"
 #include "diagnostics/CLInternalWarning.h"
+#include "diagnostics/CLWarningSink.h"
 
+#include <algorithm>
+#include <array>
 #include <cwchar>
+#include <thread>
 
 #include <CL/cl_gl.h>
 
@@ -82,6 +86,54 @@ TEST_F(WarningTest, AMessageThatCannotBeFormattedIsEmpty)
 {
     CLInternalWarning("%lc", static_cast<wint_t>(0xD800)); // half of a surrogate pair
     EXPECT_EQ(warnings(), Lines{""});
+}
+
+std::string lastText;
+
+void keepText(const char* text)
+{
+    lastText = text;
+}
+
+void dropText(const char*) {}
+
+// Without the fixture, which replaces the built-in sink.
+TEST(WarningSink, TheBuiltInOneWritesNothingAndIsRestoredByNull)
+{
+    testing::internal::CaptureStderr();
+    testing::internal::CaptureStdout();
+    CLInternalWarning("before");
+    EXPECT_EQ(setCLWarningSink(keepText), nullptr) << "the built-in sink";
+    CLInternalWarning("kept %d", 1);
+    EXPECT_EQ(lastText, "kept 1");
+    EXPECT_EQ(setCLWarningSink(dropText), keepText);
+    EXPECT_EQ(setCLWarningSink(nullptr), dropText);
+    CLInternalWarning("after");
+    EXPECT_EQ(setCLWarningSink(nullptr), nullptr);
+    EXPECT_EQ(lastText, "kept 1");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+}
+
+// A sink that two replacements both return, or neither, is one that its owner cannot restore.
+TEST(WarningSink, ConcurrentReplacementsReturnEachSinkOnce)
+{
+    constexpr int kReplacements = 20000;
+    const std::array<CLWarningSink, 2> sinks = {dropText, [](const char*) {}};
+    std::array<std::vector<CLWarningSink>, 2> before;
+    const auto replace = [&](std::size_t thread) {
+        for (int i = 0; i < kReplacements; ++i) {
+            before[thread].push_back(setCLWarningSink(sinks[thread]));
+            CLInternalWarning("warning");
+        }
+    };
+    std::thread other(replace, 1);
+    replace(0);
+    other.join();
+    before[0].push_back(setCLWarningSink(nullptr));
+    for (const CLWarningSink sink : sinks)
+        EXPECT_EQ(std::ranges::count(before[0], sink) + std::ranges::count(before[1], sink),
+                  kReplacements);
 }
 
 } // namespace
