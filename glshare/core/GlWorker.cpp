@@ -2,6 +2,7 @@
 
 #include "core/GlWorkerLoop.h"
 
+#include <exception>
 #include <future>
 #include <utility>
 
@@ -14,8 +15,13 @@ std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
     std::future<bool> isRunning = started.get_future();
     std::unique_ptr<GlWorker> worker(new GlWorker(loop));
     worker->thread_ = std::thread([loop = std::move(loop), promise = std::move(started)]() mutable {
-        const bool isUsable = loop->begin();
-        promise.set_value(isUsable);
+        bool isUsable = false;
+        try {
+            isUsable = loop->begin();
+            promise.set_value(isUsable);
+        } catch (...) {
+            promise.set_exception(std::current_exception());
+        }
         if (isUsable)
             loop->run();
     });
@@ -35,6 +41,8 @@ GlWorker::~GlWorker()
 
 void GlWorker::stop()
 {
+    if (!thread_.joinable())
+        return;
     if (!loop_->requestStop()) {
         thread_.detach();
     } else if (thread_.get_id() == std::this_thread::get_id()) {
@@ -47,20 +55,38 @@ void GlWorker::stop()
 
 void GlWorker::post(Job job)
 {
+    PreparedJob prepared;
+    prepared.push_back(std::move(job));
+    loop_->post(std::move(prepared));
+}
+
+void GlWorker::post(PreparedJob job) noexcept
+{
     loop_->post(std::move(job));
 }
 
 void GlWorker::call(const Job& job)
 {
     std::promise<void> done;
-    loop_->post([&](GlDevice* device) {
-        job(device);
-        done.set_value();
+    post([&](GlDevice* device) {
+        try {
+            job(device);
+            done.set_value();
+        } catch (...) {
+            done.set_exception(std::current_exception());
+        }
     });
-    done.get_future().wait();
+    done.get_future().get();
 }
 
 void GlWorker::watch(Watch watch)
+{
+    PreparedWatch prepared;
+    prepared.push_back(std::move(watch));
+    loop_->watch(std::move(prepared));
+}
+
+void GlWorker::watch(PreparedWatch watch) noexcept
 {
     loop_->watch(std::move(watch));
 }

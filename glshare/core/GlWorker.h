@@ -6,6 +6,7 @@
 #include "core/GlDevice.h"
 
 #include <functional>
+#include <list>
 #include <memory>
 #include <thread>
 
@@ -20,7 +21,12 @@ public:
     // A job that is asked again and again, at short intervals, until it answers true.
     using Watch = std::function<bool(GlDevice* device)>;
 
-    // Starts the thread on `context`; null if the context cannot be used.
+    // One job or watch that was made in advance: passing it to the worker allocates nothing.
+    using PreparedJob = std::list<Job>;
+    using PreparedWatch = std::list<Watch>;
+
+    // Starts the thread on `context`; null if the context cannot be used. Throws std::system_error
+    // if the system creates no thread.
     [[nodiscard]] static std::unique_ptr<GlWorker> start(std::unique_ptr<GlContext> context);
 
     // Stops. Any thread, the worker's own included, where the last owner may be a job.
@@ -29,13 +35,17 @@ public:
     GlWorker(const GlWorker&) = delete;
     GlWorker& operator=(const GlWorker&) = delete;
 
-    // Jobs run in the order given. Any thread.
+    // Jobs run in the order given. Any thread. A job must not throw.
     void post(Job job);
+    void post(PreparedJob job) noexcept;
 
-    // The same, and returns when the job has run. Not on the worker's thread.
+    // The same, and returns when the job has run; throws what the job throws. Not on the worker's
+    // thread.
     void call(const Job& job);
 
+    // A watch must not throw.
     void watch(Watch watch);
+    void watch(PreparedWatch watch) noexcept;
 
     // Whether the calling thread has a current context of this share group. Any thread.
     [[nodiscard]] bool callerSharesObjects() const;

@@ -2,9 +2,7 @@
 
 #include "core/LibraryFunctions.h"
 
-#include <algorithm>
 #include <chrono>
-#include <iterator>
 #include <utility>
 
 namespace glshare {
@@ -21,14 +19,18 @@ constexpr std::chrono::seconds kExitPatience{1};
 
 // The loops that were started and may still run.
 struct GlWorker::Loop::Running {
-    struct Orphan {
-        std::shared_ptr<Loop> loop;
+    struct Entry {
+        std::weak_ptr<Loop> loop;
+        // Of a loop that stopped itself: nobody has joined the thread.
+        std::shared_ptr<Loop> orphan;
         std::thread thread;
     };
 
+    // Joins the threads that have ended, and drops entries without a loop. With `mutex` held.
+    void tidy();
+
     std::mutex mutex; // guards the rest
-    std::vector<std::weak_ptr<Loop>> loops;
-    std::vector<Orphan> orphans; // threads that nobody has joined
+    std::list<Entry> entries;
     bool isRegistered = false;
 
     // Never destroyed, as an exit handler uses it.
@@ -43,15 +45,18 @@ GlWorker::Loop::Loop(std::unique_ptr<GlContext> context) : context_(std::move(co
 
 bool GlWorker::Loop::begin()
 {
-    if (context_->makeCurrent()) {
+    if (!context_->makeCurrent())
+        return false;
+    try {
         device_ = GlDevice::create(context_->resolver());
-        hasGl_ = device_.has_value();
-        if (hasGl_)
-            return true;
+    } catch (...) {
         context_->releaseCurrent();
+        throw;
     }
-    context_.reset();
-    return false;
+    hasGl_ = device_.has_value();
+    if (!hasGl_)
+        context_->releaseCurrent();
+    return hasGl_;
 }
 
 GlDevice* GlWorker::Loop::device()
@@ -106,15 +111,14 @@ void GlWorker::Loop::runJob(Lock& lock)
 
 void GlWorker::Loop::lookAtWatches(Lock& lock)
 {
-    std::vector<Watch> watches = std::exchange(watches_, {});
+    std::list<Watch> watches = std::exchange(watches_, {});
     isBusy_ = true;
     lock.unlock();
     std::erase_if(watches, [this](const Watch& watch) { return watch(device()); });
     lock.lock();
     isBusy_ = false;
     changed_.notify_all();
-    watches_.insert(watches_.end(), std::make_move_iterator(watches.begin()),
-                    std::make_move_iterator(watches.end()));
+    watches_.splice(watches_.begin(), watches);
     if (!watches_.empty() && jobs_.empty() && !isStopping_ && !isExiting_)
         changed_.wait_for(lock, kWatchInterval);
 }
@@ -129,23 +133,23 @@ void GlWorker::Loop::letGoOfDisplay(Lock& lock)
     changed_.notify_all();
 }
 
-void GlWorker::Loop::post(Job job)
+void GlWorker::Loop::post(PreparedJob job) noexcept
 {
     {
         const std::scoped_lock lock(mutex_);
         if (!isExiting_) {
-            jobs_.push_back(std::move(job));
+            jobs_.splice(jobs_.end(), job);
             changed_.notify_all();
             return;
         }
     }
-    job(nullptr);
+    job.front()(nullptr);
 }
 
-void GlWorker::Loop::watch(Watch watch)
+void GlWorker::Loop::watch(PreparedWatch watch) noexcept
 {
     const std::scoped_lock lock(mutex_);
-    watches_.push_back(std::move(watch));
+    watches_.splice(watches_.end(), watch);
     changed_.notify_all();
 }
 
@@ -164,19 +168,31 @@ void GlWorker::Loop::markGone()
     changed_.notify_all();
 }
 
-// Those adopted before have ended long since.
-void GlWorker::Loop::adopt(std::shared_ptr<Loop> loop, std::thread thread)
+void GlWorker::Loop::Running::tidy()
+{
+    std::erase_if(entries, [](Entry& entry) {
+        if (entry.orphan == nullptr)
+            return entry.loop.expired();
+        const std::scoped_lock lock(entry.orphan->mutex_);
+        const bool hasRun = entry.orphan->isEnding_ && !entry.orphan->isBusy_;
+        if (hasRun)
+            entry.thread.join();
+        return hasRun;
+    });
+}
+
+void GlWorker::Loop::adopt(std::shared_ptr<Loop> loop, std::thread thread) noexcept
 {
     Running& running = Running::get();
     const std::scoped_lock lock(running.mutex);
-    std::erase_if(running.orphans, [](Running::Orphan& orphan) {
-        const std::scoped_lock loopLock(orphan.loop->mutex_);
-        const bool hasRun = orphan.loop->isEnding_ && !orphan.loop->isBusy_;
-        if (hasRun)
-            orphan.thread.join();
-        return hasRun;
-    });
-    running.orphans.push_back({std::move(loop), std::move(thread)});
+    running.tidy();
+    for (Running::Entry& entry : running.entries) {
+        if (entry.loop.lock() != loop)
+            continue;
+        entry.orphan = std::move(loop);
+        entry.thread = std::move(thread);
+        return;
+    }
 }
 
 bool GlWorker::Loop::callerSharesObjects() const
@@ -223,8 +239,8 @@ void GlWorker::Loop::listenForExit(const std::shared_ptr<Loop>& loop)
 {
     Running& running = Running::get();
     const std::scoped_lock lock(running.mutex);
-    std::erase_if(running.loops, [](const std::weak_ptr<Loop>& other) { return other.expired(); });
-    running.loops.push_back(loop);
+    running.tidy();
+    running.entries.push_back({loop, nullptr, {}});
     if (!std::exchange(running.isRegistered, true))
         callAtExit(parkAll);
 }
@@ -233,12 +249,10 @@ void GlWorker::Loop::parkAll()
 {
     Running& running = Running::get();
     const std::scoped_lock lock(running.mutex);
-    for (Running::Orphan& orphan : running.orphans)
-        orphan.loop->park(&orphan.thread);
-    for (const std::weak_ptr<Loop>& weak : running.loops) {
-        const std::shared_ptr<Loop> loop = weak.lock();
-        const auto isLoop = [&loop](const Running::Orphan& orphan) { return orphan.loop == loop; };
-        if (loop && std::ranges::none_of(running.orphans, isLoop))
+    for (Running::Entry& entry : running.entries) {
+        if (entry.orphan != nullptr)
+            entry.orphan->park(&entry.thread);
+        else if (const std::shared_ptr<Loop> loop = entry.loop.lock())
             loop->park(nullptr);
     }
 }

@@ -6,11 +6,10 @@
 
 #include <atomic>
 #include <condition_variable>
-#include <deque>
+#include <list>
 #include <mutex>
 #include <optional>
 #include <thread>
-#include <vector>
 
 namespace glshare {
 
@@ -26,15 +25,16 @@ public:
 
     // The following on any thread.
 
-    void post(Job job);
-    void watch(Watch watch);
+    void post(PreparedJob job) noexcept;
+    void watch(PreparedWatch watch) noexcept;
 
     // False if the thread will not end any more, since the process is exiting.
     [[nodiscard]] bool requestStop();
     // Says that the thread, asked to stop, has been joined.
     void markGone();
     // Takes over the thread of a loop that was asked to stop by itself: somebody has to join it.
-    static void adopt(std::shared_ptr<Loop> loop, std::thread thread);
+    // listenForExit has been called for the loop.
+    static void adopt(std::shared_ptr<Loop> loop, std::thread thread) noexcept;
 
     [[nodiscard]] bool callerSharesObjects() const;
     void finishCaller() const;
@@ -65,8 +65,8 @@ private:
 
     std::mutex mutex_; // guards everything below
     std::condition_variable changed_;
-    std::deque<Job> jobs_;
-    std::vector<Watch> watches_;
+    std::list<Job> jobs_;
+    std::list<Watch> watches_;
     bool isBusy_ = false;
     bool isStopping_ = false;
     bool isEnding_ = false; // run is over, or nearly

@@ -12,24 +12,24 @@ StorageHold::StorageHold(std::shared_ptr<SharingContext> context, const GlDevice
 {
     if (device.address(name, size) == nullptr)
         return;
+    release_.emplace_back();
     context_ = std::move(context);
-    pin_ = device.pin(name);
+    release_.front() = [pin = device.pin(name)](GlDevice* worker) {
+        if (worker != nullptr)
+            worker->unpin(pin);
+    };
     address_ = device.address(name, size);
 }
 
 StorageHold::~StorageHold()
 {
-    if (pin_ == 0)
-        return;
-    context_->worker().post([pin = pin_](GlDevice* device) {
-        if (device != nullptr)
-            device->unpin(pin);
-    });
+    if (!release_.empty())
+        context_->worker().post(std::move(release_));
 }
 
 StorageHold::StorageHold(StorageHold&& other) noexcept
     : context_(std::move(other.context_)), address_(std::exchange(other.address_, nullptr)),
-      pin_(std::exchange(other.pin_, 0))
+      release_(std::move(other.release_))
 {
 }
 
@@ -38,7 +38,7 @@ StorageHold& StorageHold::operator=(StorageHold&& other) noexcept
     StorageHold taken(std::move(other));
     std::swap(context_, taken.context_);
     std::swap(address_, taken.address_);
-    std::swap(pin_, taken.pin_);
+    std::swap(release_, taken.release_);
     return *this;
 }
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "core/GlDevice.h"
+#include "core/GlWorker.h"
 
 #include <cstddef>
 #include <memory>
@@ -35,7 +36,9 @@ public:
 private:
     std::shared_ptr<SharingContext> context_;
     void* address_ = nullptr;
-    GLuint pin_ = 0;
+    // Unpins the storage; empty if nothing is held. Made in advance, since a destructor that found
+    // no memory could not report it.
+    GlWorker::PreparedJob release_;
 };
 
 } // namespace glshare
