@@ -56,11 +56,14 @@ Status Evaluation::adopt(CharacterMesh& mesh)
     if (!mesh.evaluator) {
         mesh.evaluator =
             std::make_unique<MeshEvaluator>(fCL, ++fMeshNumber, mesh.mesh().hasBones(), fKernels);
-        if (!mesh.evaluator->valid())
+        if (!mesh.evaluator->valid()) {
+            const std::string& warnings = fKernels.warnings();
             return Failure{ExitCode::kOpenCLError,
                            "the kernels in " + KernelFiles::folder() +
                                " cannot be built; check that they are there and that the OpenCL "
-                               "driver can compile"};
+                               "driver can compile" +
+                               (warnings.empty() ? "" : ":\n" + warnings)};
+        }
     }
     cl_int status = mesh.evaluator->setMesh(mesh.mesh(), fWorkers.all().front()->queue());
     if (status == CL_SUCCESS)

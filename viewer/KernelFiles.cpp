@@ -2,7 +2,7 @@
 
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
-#include "viewer/BuildLog.h"
+#include "viewer/WarningCapture.h"
 
 namespace viewer {
 namespace {
@@ -38,13 +38,15 @@ std::string KernelFiles::folder()
 AutoCLObject<cl_kernel> KernelFiles::kernel(const std::string& file, const std::string& name)
 {
     const auto [known, isNew] = fFiles.try_emplace(file, File{name, {}, {}, 0, {}});
-    AutoCLObject<cl_kernel> kernel = create(file, known->second);
-    if (!kernel.get())
-        return kernel;
-    known->second.arguments = argumentCount(kernel.get());
+    const NewKernel created = create(file, known->second);
+    if (!created.kernel.get()) {
+        fWarnings += created.warnings;
+        return created.kernel;
+    }
+    known->second.arguments = argumentCount(created.kernel.get());
     fProgramsBuilt += isNew ? 1 : 0;
     fKernelsServed += 1;
-    return kernel;
+    return created.kernel;
 }
 
 std::optional<std::string> KernelFiles::replace(const std::string& file, const std::string& source)
@@ -55,35 +57,38 @@ std::optional<std::string> KernelFiles::replace(const std::string& file, const s
     File next = known->second;
     next.programName = file + ", change " + std::to_string(++fReplacements);
     next.source = source;
-    AutoCLObject<cl_kernel> kernel = create(file, next);
-    if (auto text = complaint(file, next, kernel.get())) {
-        giveBack(kernel);
+    NewKernel created = create(file, next);
+    if (auto text = error(file, next, created)) {
+        giveBack(created.kernel);
         return text;
     }
     giveBack(next.keeper);
-    next.keeper = std::move(kernel);
+    next.keeper = std::move(created.kernel);
     known->second = std::move(next);
     fProgramsBuilt += 1;
     return std::nullopt;
 }
 
-AutoCLObject<cl_kernel> KernelFiles::create(const std::string& name, const File& file)
+KernelFiles::NewKernel KernelFiles::create(const std::string& name, const File& file)
 {
-    if (file.programName.empty())
-        return kernelOfFile(name.c_str(), file.kernelName.c_str());
-    return TopenCLInfo::theOne().kernelStore().getKernelFromString(
-        file.source.c_str(), file.programName.c_str(), nullptr, file.kernelName.c_str(), nullptr);
+    const WarningCapture warnings;
+    NewKernel created;
+    created.kernel = file.programName.empty()
+                         ? kernelOfFile(name.c_str(), file.kernelName.c_str())
+                         : TopenCLInfo::theOne().kernelStore().getKernelFromString(
+                               file.source.c_str(), file.programName.c_str(), nullptr,
+                               file.kernelName.c_str(), nullptr);
+    created.warnings = warnings.text();
+    return created;
 }
 
-std::optional<std::string> KernelFiles::complaint(const std::string& name, const File& file,
-                                                  cl_kernel kernel) const
+std::optional<std::string> KernelFiles::error(const std::string& name, const File& file,
+                                              const NewKernel& created) const
 {
-    if (!kernel) {
-        if (const auto log = buildLog(fCL, file.source))
-            return name + " does not build:\n" + *log;
-        return name + " has no kernel '" + file.kernelName + "'";
-    }
-    const cl_uint arguments = argumentCount(kernel);
+    if (!created.kernel.get())
+        return name + ": the kernel '" + file.kernelName + "' cannot be built:\n" +
+               created.warnings;
+    const cl_uint arguments = argumentCount(created.kernel.get());
     if (arguments != file.arguments)
         return name + ": the kernel '" + file.kernelName + "' takes " + std::to_string(arguments) +
                " arguments, and the viewer passes " + std::to_string(file.arguments);

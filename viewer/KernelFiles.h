@@ -27,13 +27,15 @@ public:
     // The folder with the kernel files.
     static std::string folder();
 
-    // A new kernel `name` of the file `file` in that folder; empty when the file cannot be read or
+    // A new kernel `name` of the file `file` in that folder; empty if the file cannot be read or
     // does not build. The caller gives it back to the kernel store.
     AutoCLObject<cl_kernel> kernel(const std::string& file, const std::string& name);
+    // Warnings of all requests that returned an empty kernel, with the build logs.
+    const std::string& warnings() const { return fWarnings; }
 
-    // From now on the file stands for this text, unless the text does not build, or its kernel
-    // takes another number of arguments: then says so, with the build log. Kernels handed out stay
-    // what they are. Takes no notice of a file that nobody asked for.
+    // From now on the file stands for this text, unless the text does not build or its kernel
+    // takes another number of arguments: then returns the error, with the build log. Kernels
+    // handed out stay what they are. Ignores a file that was never requested.
     std::optional<std::string> replace(const std::string& file, const std::string& source);
 
     std::size_t programsBuilt() const { return fProgramsBuilt; }
@@ -49,13 +51,19 @@ private:
         AutoCLObject<cl_kernel> keeper;
     };
 
-    static AutoCLObject<cl_kernel> create(const std::string& name, const File& file);
-    std::optional<std::string> complaint(const std::string& name, const File& file,
-                                         cl_kernel kernel) const;
+    struct NewKernel {
+        AutoCLObject<cl_kernel> kernel;
+        std::string warnings; // of its request
+    };
+
+    static NewKernel create(const std::string& name, const File& file);
+    std::optional<std::string> error(const std::string& name, const File& file,
+                                     const NewKernel& created) const;
     cl_uint argumentCount(cl_kernel kernel) const;
 
     const OpenCLFunctions& fCL;
     std::map<std::string, File> fFiles;
+    std::string fWarnings;
     int fReplacements = 0; // tried
     std::size_t fProgramsBuilt = 0;
     std::size_t fKernelsServed = 0;

@@ -20,9 +20,6 @@ bool resolveAll(QLibrary& library, OpenCLFunctions& cl)
     return resolve(library, "clGetPlatformIDs", cl.clGetPlatformIDs) &&
            resolve(library, "clGetPlatformInfo", cl.clGetPlatformInfo) &&
            resolve(library, "clGetDeviceInfo", cl.clGetDeviceInfo) &&
-           resolve(library, "clCreateProgramWithSource", cl.clCreateProgramWithSource) &&
-           resolve(library, "clBuildProgram", cl.clBuildProgram) &&
-           resolve(library, "clGetProgramBuildInfo", cl.clGetProgramBuildInfo) &&
            resolve(library, "clGetKernelInfo", cl.clGetKernelInfo) &&
            resolve(library, "clCreateCommandQueue", cl.clCreateCommandQueue) &&
            resolve(library, "clReleaseCommandQueue", cl.clReleaseCommandQueue) &&

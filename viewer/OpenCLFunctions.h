@@ -14,9 +14,6 @@ struct OpenCLFunctions {
     decltype(&::clGetPlatformIDs) clGetPlatformIDs = nullptr;
     decltype(&::clGetPlatformInfo) clGetPlatformInfo = nullptr;
     decltype(&::clGetDeviceInfo) clGetDeviceInfo = nullptr;
-    decltype(&::clCreateProgramWithSource) clCreateProgramWithSource = nullptr;
-    decltype(&::clBuildProgram) clBuildProgram = nullptr;
-    decltype(&::clGetProgramBuildInfo) clGetProgramBuildInfo = nullptr;
     decltype(&::clGetKernelInfo) clGetKernelInfo = nullptr;
     decltype(&::clCreateCommandQueue) clCreateCommandQueue = nullptr;
     decltype(&::clReleaseCommandQueue) clReleaseCommandQueue = nullptr;

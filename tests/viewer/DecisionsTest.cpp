@@ -1,9 +1,17 @@
-// What the command line may hold, and small decisions: vendor, platform, figures, texts.
+// Command line, and small decisions: vendor, platform, figures, texts, whose warnings are
+// collected.
 #include "viewer/GraphicsVendor.h"
 #include "viewer/OpenCLPlatforms.h"
 #include "viewer/Options.h"
 #include "viewer/OverlayText.h"
 #include "viewer/Report.h"
+#include "viewer/WarningCapture.h"
+
+#include "diagnostics/CLInternalWarning.h"
+#include "diagnostics/CLWarningSink.h"
+
+#include <optional>
+#include <thread>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -151,6 +159,37 @@ TEST(OverlayText, CutsALongBuildLog)
     const std::string cut = beginningOf(std::string(1000, 'x') + std::string(99, '\n'));
     EXPECT_LT(cut.size(), 200u);
     EXPECT_THAT(cut, HasSubstr("\n... and 83 more lines\n"));
+}
+
+std::string hostText;
+
+void hostSink(const char* text)
+{
+    hostText += text;
+}
+
+TEST(WarningCapture, CollectsOwnThreadAndForwardsAllToTheHost)
+{
+    setCLWarningSink(hostSink);
+    {
+        std::optional<WarningCapture> outer(std::in_place);
+        CLInternalWarning("one,");
+        std::thread([&] {
+            const WarningCapture inner;
+            CLInternalWarning("two,");
+            EXPECT_EQ(inner.text(), "two,");
+        }).join();
+        CLInternalWarning("three,");
+        EXPECT_EQ(outer->text(), "one,\nthree,");
+        outer.reset();
+        CLInternalWarning("four");
+        EXPECT_EQ(hostText, "one,two,three,four");
+    }
+    {
+        const WarningCapture capture;
+        setCLWarningSink(nullptr); // the host replaces its sink meanwhile
+    }
+    EXPECT_EQ(setCLWarningSink(nullptr), nullptr);
 }
 
 } // namespace
