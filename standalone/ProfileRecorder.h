@@ -29,7 +29,8 @@ public:
                        std::int64_t endNs);
 
     // Writes what was recorded as Chrome trace-event JSON, one row for each thread and track, times
-    // in microseconds. An event that has not ended is written as begun. False when the file can't
-    // be written.
-    static bool writeChromeTrace(const std::string& path);
+    // in microseconds. An event that has not ended is written as begun. Returns false if the file
+    // cannot be written; then there is no part of it, and `reason`, if it is not null, becomes the
+    // system's reason.
+    static bool writeChromeTrace(const std::string& path, std::string* reason = nullptr);
 };

@@ -3,6 +3,7 @@
 #include "standalone/ProfileRecorder.h"
 
 #include <QFile>
+#include <QFileInfo>
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QString>
@@ -76,19 +77,27 @@ public:
         write(QJsonDocument(object).toJson(QJsonDocument::Compact));
     }
 
-    // True when all of it reached the file.
+    // Returns whether all of it reached the file. If not, removes the file, unless it is a device.
     bool finish()
     {
         write("\n]}\n");
         fGood = fGood && fFile.flush();
+        fReason = fFile.errorString().toStdString();
         fFile.close();
+        if (!fGood && QFileInfo(fFile).isFile()) {
+            fFile.remove();
+        }
         return fGood;
     }
+
+    // Why finish returned false.
+    const std::string& reason() const { return fReason; }
 
 private:
     void write(const QByteArray& bytes) { fGood = fGood && fFile.write(bytes) == bytes.size(); }
 
     QFile fFile;
+    std::string fReason;
     const char* fSeparator = "\n";
     bool fGood = false;
 };
@@ -124,7 +133,7 @@ private:
 
 } // namespace
 
-bool ProfileRecorder::writeChromeTrace(const std::string& path)
+bool ProfileRecorder::writeChromeTrace(const std::string& path, std::string* reason)
 {
     TraceFile file(path);
     RowTable rows(file);
@@ -135,5 +144,9 @@ bool ProfileRecorder::writeChromeTrace(const std::string& path)
             file.add(eventObject(event, rows.row(event, thread.threadName, threadRow)));
         }
     }
-    return file.finish();
+    const bool written = file.finish();
+    if (!written && reason) {
+        *reason = file.reason();
+    }
+    return written;
 }
