@@ -18,6 +18,8 @@ enum class ExitCode {
     kNoOpenCL = 5,    // no OpenCL that shares buffers with OpenGL
     kOutput = 6,      // a picture or the trace cannot be written
     kOpenCLError = 7, // OpenCL failed while the viewer was running
+    kOutOfMemory = 8,
+    kInterrupted = 130, // by Ctrl-C, as shells number it
 };
 
 // One sentence for the user that says what to do, and the exit code that goes with it.

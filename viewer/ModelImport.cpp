@@ -1,9 +1,13 @@
 #include "viewer/ModelImport.h"
 
+#include "viewer/MeshNormals.h"
+#include "viewer/ModelFile.h"
+#include "viewer/SceneRepair.h"
+
 #include <algorithm>
-#include <cmath>
-#include <filesystem>
+#include <cctype>
 #include <map>
+#include <new>
 #include <numeric>
 #include <optional>
 
@@ -15,8 +19,6 @@
 namespace viewer {
 namespace {
 
-// Where Debian's package of sample models installs them.
-constexpr char kSampleModels[] = "/usr/share/assimp/models";
 // For files that do not say how long a tick of their animation is; Assimp's documentation names it.
 constexpr double kDefaultTicksPerSecond = 25.0;
 // A light clay, for materials without a colour of their own.
@@ -26,7 +28,7 @@ constexpr float kLeastColour = 0.05f;
 
 constexpr unsigned kPostProcessing = aiProcess_JoinIdenticalVertices | aiProcess_Triangulate |
                                      aiProcess_GenSmoothNormals | aiProcess_LimitBoneWeights |
-                                     aiProcess_SortByPType | aiProcess_ValidateDataStructure;
+                                     aiProcess_SortByPType;
 
 using NodeIndex = std::map<std::string, std::size_t>;
 
@@ -73,32 +75,13 @@ void copyVertices(const aiMesh& source, Mesh& mesh)
 {
     for (unsigned i = 0; i < source.mNumVertices; ++i) {
         mesh.positions.push_back(toQt(source.mVertices[i]));
-        const QVector3D normal = toQt(source.mNormals[i]).normalized();
-        // Degenerate triangles have normals that are not a number or zero.
-        const bool usable = std::isfinite(normal.lengthSquared()) && !normal.isNull();
-        mesh.normals.push_back(usable ? normal : QVector3D(0, 1, 0));
+        mesh.normals.push_back(toQt(source.mNormals[i]));
     }
     for (unsigned i = 0; i < source.mNumFaces; ++i) {
         const aiFace& face = source.mFaces[i];
         mesh.triangles.insert(mesh.triangles.end(), face.mIndices,
                               face.mIndices + face.mNumIndices);
     }
-}
-
-// Files with normals that look inside exist: those of a closed mesh look away from its middle.
-void turnNormalsOutside(Mesh& mesh)
-{
-    QVector3D middle;
-    for (const QVector3D& position : mesh.positions)
-        middle += position / static_cast<float>(mesh.vertexCount());
-    float outside = 0;
-    for (std::size_t i = 0; i < mesh.vertexCount(); ++i)
-        outside +=
-            QVector3D::dotProduct(mesh.normals[i], (mesh.positions[i] - middle).normalized());
-    if (outside >= 0)
-        return;
-    for (QVector3D& normal : mesh.normals)
-        normal = -normal;
 }
 
 // Puts a weight into the first free place of its vertex.
@@ -153,6 +136,7 @@ Mesh copyMesh(const aiScene& scene, const aiMesh& source, std::size_t node, cons
     mesh.node = node;
     mesh.colour = materialColour(scene, source.mMaterialIndex);
     copyVertices(source, mesh);
+    completeNormals(mesh);
     turnNormalsOutside(mesh);
     if (source.HasBones())
         copyBones(source, nodes, mesh);
@@ -190,7 +174,8 @@ Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes)
     Animation animation{source.mName.C_Str(), source.mDuration / ticks, {}};
     const auto vector = [](const aiVector3D& value) { return toQt(value); };
     const auto rotation = [](const aiQuaternion& value) {
-        return QQuaternion(value.w, value.x, value.y, value.z).normalized();
+        const QQuaternion quaternion(value.w, value.x, value.y, value.z);
+        return quaternion.isNull() ? QQuaternion() : quaternion.normalized();
     };
     for (unsigned i = 0; i < source.mNumChannels; ++i) {
         const aiNodeAnim& channel = *source.mChannels[i];
@@ -205,27 +190,117 @@ Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes)
     return animation;
 }
 
-std::optional<std::string> findModelFile(const std::string& name)
+// The rotation that makes the y axis point up.
+QMatrix4x4 upright(UpAxis up, bool downwards)
 {
-    const std::filesystem::path sample = std::filesystem::path(kSampleModels) / name;
-    std::error_code ignored;
-    if (std::filesystem::is_regular_file(name, ignored))
-        return name;
-    if (std::filesystem::is_regular_file(sample, ignored))
-        return sample.string();
-    return std::nullopt;
+    QMatrix4x4 rotation;
+    if (up == UpAxis::kX)
+        rotation.rotate(downwards ? -90 : 90, 0, 0, 1);
+    else if (up == UpAxis::kZ)
+        rotation.rotate(downwards ? 90 : -90, 1, 0, 0);
+    else
+        rotation.rotate(downwards ? 180 : 0, 1, 0, 0);
+    return rotation;
 }
 
-Model copyScene(const aiScene& scene)
+QMatrix4x4 upright(const aiScene& scene, const ImportSettings& settings)
+{
+    if (settings.up)
+        return upright(*settings.up, false);
+    int axis = static_cast<int>(UpAxis::kY);
+    int sign = 1;
+    if (!scene.mMetaData || !scene.mMetaData->Get("UpAxis", axis) || axis < 0 || axis > 2)
+        return {};
+    scene.mMetaData->Get("UpAxisSign", sign);
+    return upright(static_cast<UpAxis>(axis), sign < 0);
+}
+
+// The root of the nodes stands the model upright; the file's nodes are below it.
+Model copyScene(const aiScene& scene, const ImportSettings& settings)
 {
     Model model;
+    model.nodes.push_back({"vyra-viewer upright", 0, upright(scene, settings)});
     addNodes(*scene.mRootNode, 0, model);
     const NodeIndex nodes = indexByName(model);
-    std::size_t first = 0;
+    std::size_t first = 1;
     addMeshes(scene, *scene.mRootNode, nodes, first, model);
     for (unsigned i = 0; i < scene.mNumAnimations; ++i)
         model.animations.push_back(copyAnimation(*scene.mAnimations[i], nodes));
     return model;
+}
+
+bool hasArea(const Mesh& mesh)
+{
+    for (std::size_t i = 0; i + 2 < mesh.triangles.size(); i += 3) {
+        const QVector3D& a = mesh.positions[mesh.triangles[i]];
+        const QVector3D& b = mesh.positions[mesh.triangles[i + 1]];
+        const QVector3D& c = mesh.positions[mesh.triangles[i + 2]];
+        if (!QVector3D::crossProduct(b - a, c - a).isNull())
+            return true;
+    }
+    return false;
+}
+
+Failure failure(const std::string& file, const std::string& text)
+{
+    return {ExitCode::kModel, "the model '" + file + "' " + text};
+}
+
+// Assimp's reason on one line.
+std::string reasonOf(const Assimp::Importer& importer)
+{
+    std::string reason = importer.GetErrorString();
+    std::replace_if(
+        reason.begin(), reason.end(), [](unsigned char letter) { return std::iscntrl(letter); },
+        ' ');
+    while (!reason.empty() && (reason.back() == ' ' || reason.back() == '.'))
+        reason.pop_back();
+    return reason.empty() ? "Assimp names no reason" : reason;
+}
+
+// Memory that ran out is not the file's fault, or cannot be told from it.
+void throwIfMemoryRanOut(const Assimp::Importer& importer)
+{
+    if (!importer.GetException())
+        return;
+    try {
+        std::rethrow_exception(importer.GetException());
+    } catch (const std::bad_alloc&) {
+        throw;
+    } catch (...) { // NOLINT(bugprone-empty-catch): the error string has its text
+    }
+}
+
+Failure unreadable(const std::string& file, const Assimp::Importer& importer)
+{
+    throwIfMemoryRanOut(importer);
+    return failure(file, "cannot be read (" + reasonOf(importer) +
+                             "); it may be truncated or damaged, or in a format that Assimp does "
+                             "not support: export it again, best as glTF");
+}
+
+Result<Model> readModel(Assimp::Importer& importer, const std::string& file,
+                        const ImportSettings& settings)
+{
+    importer.SetPropertyInteger(AI_CONFIG_PP_LBW_MAX_WEIGHTS, static_cast<int>(kBonesPerVertex));
+    importer.SetPropertyFloat(AI_CONFIG_PP_GSN_MAX_SMOOTHING_ANGLE,
+                              static_cast<float>(settings.creaseAngle));
+    importer.SetPropertyBool(AI_CONFIG_IMPORT_COLLADA_IGNORE_UP_DIRECTION, settings.up.has_value());
+    const aiScene* scene = importer.ReadFile(file, aiProcess_ValidateDataStructure);
+    if (!scene || !scene->mRootNode)
+        return unreadable(file, importer);
+    if (const auto found = findNonFiniteNumber(*scene))
+        return failure(file, "has a number that is infinite or not a number: " + *found +
+                                 "; correct it in the program that made the file");
+    // The importer owns the scene and lends it unchangeable; post-processing changes it all the
+    // same.
+    auto& changeable = const_cast<aiScene&>(*scene);
+    rescaleExtremeScene(changeable);
+    removeUselessNormals(changeable);
+    scene = importer.ApplyPostProcessing(kPostProcessing);
+    if (!scene)
+        return unreadable(file, importer);
+    return copyScene(*scene, settings);
 }
 
 } // namespace
@@ -241,27 +316,22 @@ BoneWeights normalised(const BoneWeights& weights)
     return result;
 }
 
-Result<Model> importModel(const std::string& name)
+Result<Model> importModel(const std::string& name, const ImportSettings& settings)
 {
-    const std::optional<std::string> file = findModelFile(name);
+    const Result<std::string> file = findModelFile(name);
     if (!file)
-        return Failure{ExitCode::kModel,
-                       "there is no model file '" + name +
-                           "'; give the path of a model, or the name of a sample model of the "
-                           "package assimp-testmodels such as X/Testwuson.X"};
-
+        return file.failure();
     Assimp::Importer importer;
-    importer.SetPropertyInteger(AI_CONFIG_PP_LBW_MAX_WEIGHTS, static_cast<int>(kBonesPerVertex));
-    const aiScene* scene = importer.ReadFile(*file, kPostProcessing);
-    if (!scene || !scene->mRootNode)
-        return Failure{ExitCode::kModel, "the model '" + *file + "' cannot be read (" +
-                                             importer.GetErrorString() +
-                                             "); give a file in a format that Assimp knows"};
-    Model model = copyScene(*scene);
-    if (model.meshes.empty())
-        return Failure{ExitCode::kModel, "the model '" + *file +
-                                             "' has no meshes with triangles; give one that has "
-                                             "something to draw"};
+    Result<Model> model = readModel(importer, file.value(), settings);
+    if (!model)
+        return model;
+    const std::vector<Mesh>& meshes = model.value().meshes;
+    if (meshes.empty())
+        return failure(file.value(), "has no meshes with triangles; give one that has something to "
+                                     "draw");
+    if (std::none_of(meshes.begin(), meshes.end(), hasArea))
+        return failure(file.value(), "has no triangle with an area: all corners of each are on one "
+                                     "point or line; give one that has something to draw");
     return model;
 }
 

@@ -2,6 +2,8 @@
 
 #include "viewer/Controls.h"
 
+#include <algorithm>
+
 #include <QCommandLineParser>
 #include <QRegularExpression>
 
@@ -13,6 +15,9 @@ constexpr int kLargestPicture = 8192;
 constexpr int kLargestCrowd = 10000;
 constexpr int kMostFrames = 1000000;
 constexpr int kMostVertices = 1000000000;
+// What a picture needs to show anything.
+constexpr int kSmallestPicture = 16;
+constexpr int kLongestLoad = 86400; // a day
 
 constexpr char kExitCodes[] =
     R"(
@@ -25,6 +30,8 @@ Exit codes:
   5  no OpenCL that shares buffers with OpenGL
   6  a picture or the trace cannot be written
   7  OpenCL failed while the viewer was running
+  8  there is not enough memory
+  130  interrupted with Ctrl-C; the report and the trace are written
 )";
 
 void describe(QCommandLineParser& parser)
@@ -34,6 +41,7 @@ void describe(QCommandLineParser& parser)
         "draws from.");
     parser.addOptions({
         {{"h", "help"}, "Shows this text."},
+        {"version", "Shows the version."},
         {"frames", "Renders <n> frames and ends; without it a window plays.", "n"},
         {"crowd", "Shows <n> characters, each with buffers of its own.", "n"},
         {"size", "Size of the picture in pixels (1280x720).", "WxH"},
@@ -46,6 +54,10 @@ void describe(QCommandLineParser& parser)
         {"platform", "Uses the OpenCL platform of this <vendor>.", "vendor"},
         {"allow-cpu", "Deforms on the CPU where OpenCL cannot be used."},
         {"resize-every", "Changes the level of detail every <n> frames.", "n"},
+        {"up", "Axis of the file that points up: x, y or z (as the file says, else y).", "axis"},
+        {"crease", "Edges sharper than <degrees> stay sharp in a model without normals (60).",
+         "degrees"},
+        {"load-limit", "Gives up a model that takes longer than <s> seconds to load (60).", "s"},
     });
     parser.addPositionalArgument("MODEL", "A model file, or a sample such as X/Testwuson.X.");
 }
@@ -60,7 +72,24 @@ class Reader {
 public:
     explicit Reader(const QCommandLineParser& parser) : fParser(parser) {}
 
-    std::string text(const QString& name) const { return fParser.value(name).toStdString(); }
+    std::string text(const QString& name)
+    {
+        const QString value = fParser.value(name);
+        if (fParser.isSet(name) && value.isEmpty())
+            complain(QString("--%1 takes a value that is not empty").arg(name));
+        return value.toStdString();
+    }
+
+    std::optional<UpAxis> axis(const QString& name)
+    {
+        static const QStringList names{"x", "y", "z"};
+        if (!fParser.isSet(name))
+            return std::nullopt;
+        const auto index = names.indexOf(fParser.value(name));
+        if (index < 0)
+            complain(QString("--%1 takes x, y or z, not '%2'").arg(name, fParser.value(name)));
+        return static_cast<UpAxis>(index);
+    }
 
     std::optional<int> number(const QString& name, int lowest, int highest)
     {
@@ -85,8 +114,10 @@ public:
         static const QRegularExpression pattern("^([0-9]{1,5})x([0-9]{1,5})$");
         const auto match = pattern.match(fParser.value("size"));
         const QSize size(match.captured(1).toInt(), match.captured(2).toInt());
-        if (size.isEmpty() || size.width() > kLargestPicture || size.height() > kLargestPicture)
-            complain(QString("--size takes WIDTHxHEIGHT, each from 1 to %1, not '%2'")
+        if (std::min(size.width(), size.height()) < kSmallestPicture ||
+            std::max(size.width(), size.height()) > kLargestPicture)
+            complain(QString("--size takes WIDTHxHEIGHT, each from %1 to %2, not '%3'")
+                         .arg(kSmallestPicture)
                          .arg(kLargestPicture)
                          .arg(fParser.value("size")));
         return size;
@@ -120,12 +151,17 @@ Options read(const QCommandLineParser& parser, Reader& reader)
     options.platform = reader.text("platform");
     options.allowCpu = parser.isSet("allow-cpu");
     options.resizeEvery = reader.number("resize-every", 1, kMostFrames).value_or(0);
+    options.import.up = reader.axis("up");
+    options.import.creaseAngle =
+        reader.number("crease", 0, 180).value_or(static_cast<int>(options.import.creaseAngle));
+    options.loadLimit = reader.number("load-limit", 1, kLongestLoad).value_or(options.loadLimit);
 
     const QStringList models = parser.positionalArguments();
-    if (models.size() == 1)
+    if (models.size() == 1 && !models.front().isEmpty())
         options.model = models.front().toStdString();
     else
-        reader.complain(models.empty() ? "the model is missing" : "more than one model is given");
+        reader.complain(models.size() > 1 ? "more than one model is given"
+                                          : "the model is missing");
     if (!options.output.empty() && !parser.isSet("frames"))
         reader.complain("--output needs --frames, so that it is known how many pictures to write");
     return options;
@@ -139,9 +175,10 @@ Result<Options> parseOptions(const QStringList& arguments)
     describe(parser);
     if (!parser.parse(arguments))
         return wrongUse(parser.errorText().remove('.'));
-    if (parser.isSet("help")) {
+    if (parser.isSet("help") || parser.isSet("version")) {
         Options options;
-        options.help = true;
+        options.help = parser.isSet("help");
+        options.version = !options.help;
         return options;
     }
     Reader reader(parser);

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "viewer/Failure.h"
+#include "viewer/ModelImport.h"
 
 #include <optional>
 #include <string>
@@ -13,6 +14,9 @@ namespace viewer {
 
 struct Options {
     std::string model;
+    ImportSettings import;
+    int loadLimit = 60;                 // seconds that a model may take to load
+    std::string importProgram;          // imports models; empty: this process does
     std::string animation;              // empty: the model's first
     std::optional<int> frames;          // render so many and end; unset: play in a window
     int crowd = 1;                      // number of characters
@@ -26,9 +30,10 @@ struct Options {
     bool allowCpu = false;              // go on without OpenCL
     int resizeEvery = 0;                // each so many frames another level of detail; 0: never
     bool help = false;
+    bool version = false;
 };
 
-// `arguments` begins with the program's name. With --help nothing else is checked.
+// `arguments` begins with the program's name. With --help or --version nothing else is checked.
 Result<Options> parseOptions(const QStringList& arguments);
 
 // The text of --help. Needs an application object.

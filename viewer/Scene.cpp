@@ -113,6 +113,12 @@ Scene::~Scene()
         fGL.glDeleteBuffers(MeshLevels::kCount, levels->indexBuffers);
 }
 
+bool Scene::hasExtent() const
+{
+    const float extent = fSpace.size.length();
+    return std::isfinite(extent) && extent > 0;
+}
+
 std::vector<QVector3D> Scene::outline() const
 {
     std::vector<QVector3D> points;

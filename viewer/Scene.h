@@ -73,6 +73,9 @@ public:
     const std::vector<CharacterMesh*>& meshes() const { return fMeshes; }
     std::size_t meshesPerCharacter() const { return fLevels.size(); }
     QVector3D size() const { return fSize; } // of the stage, centred at the origin, feet at y = 0
+    // Whether the model's extent over the animation is finite and not 0. Without it nothing is
+    // seen.
+    bool hasExtent() const;
     // The outermost points of all characters over the animation.
     std::vector<QVector3D> outline() const;
 

@@ -3,7 +3,9 @@
 #include "runtime/TopenCLInfo.h"
 #include "standalone/DeviceMemory.h"
 #include "viewer/CpuDeformation.h"
-#include "viewer/ModelImport.h"
+#include "viewer/FileOutput.h"
+#include "viewer/ImportProcess.h"
+#include "viewer/LoadProgress.h"
 #include "viewer/OpenCLStart.h"
 #include "viewer/ProfileScope.h"
 #include "viewer/SyncModeNames.h"
@@ -13,6 +15,8 @@
 #include <cstdio>
 #include <filesystem>
 
+#include <QBuffer>
+#include <QByteArray>
 #include <QOpenGLContext>
 #include <QOpenGLVersionFunctionsFactory>
 
@@ -72,6 +76,10 @@ Status Session::start(const QSize& pictureSize)
         return failure;
     fHost = std::make_unique<GLHost>(fWindow);
     fScene = std::make_unique<Scene>(*fGL, fModel, fAnimation, fOptions.crowd);
+    if (!fScene->hasExtent())
+        return Failure{ExitCode::kModel, "the model '" + fOptions.model +
+                                             "' has no extent, or one that is not finite, so it "
+                                             "cannot be shown; check its transforms"};
     if (Status failure = startOpenCLIfPossible())
         return failure;
     fRenderer = std::make_unique<Renderer>(*fGL);
@@ -84,7 +92,7 @@ Status Session::start(const QSize& pictureSize)
 
 Status Session::loadModel()
 {
-    Result<Model> model = importModel(fOptions.model);
+    Result<Model> model = importChosenModel();
     if (!model)
         return model.failure();
     fModel = std::move(model.value());
@@ -93,6 +101,18 @@ Status Session::loadModel()
         return animation.failure();
     fAnimation = animation.value();
     return {};
+}
+
+Result<Model> Session::importChosenModel()
+{
+    if (fOptions.importProgram.empty())
+        return importModel(fOptions.model, fOptions.import);
+    LoadProgress progress(fWindow, fOptions.model);
+    const ImportChild child{fOptions.importProgram, fOptions.loadLimit,
+                            [&progress](int seconds) { return progress.show(seconds); }};
+    Result<Model> model = importInChild(child, fOptions.model, fOptions.import);
+    fWindow.makeCurrent(); // events were handled meanwhile
+    return model;
 }
 
 Status Session::startOpenCLIfPossible()
@@ -251,14 +271,18 @@ Status Session::writePicture() const
         return {};
     std::error_code error;
     std::filesystem::create_directories(fOptions.output, error);
-    const QString file = QString("%1/frame-%2.png")
-                             .arg(QString::fromStdString(fOptions.output))
-                             .arg(fFrame, 4, 10, QChar('0'));
-    if (fCanvas->image().save(file))
+    const std::string file = QString("%1/frame-%2.png")
+                                 .arg(QString::fromStdString(fOptions.output))
+                                 .arg(fFrame, 4, 10, QChar('0'))
+                                 .toStdString();
+    QByteArray bytes;
+    QBuffer buffer(&bytes);
+    fCanvas->image().save(&buffer, "PNG");
+    const std::optional<std::string> reason = writeFile(file, bytes);
+    if (!reason)
         return {};
-    return Failure{ExitCode::kOutput, "the picture '" + file.toStdString() +
-                                          "' cannot be written; choose another folder with "
-                                          "--output"};
+    return Failure{ExitCode::kOutput, "the picture '" + file + "' cannot be written: " + *reason +
+                                          "; choose another folder with --output"};
 }
 
 OpenCLFacts Session::openCLFacts() const

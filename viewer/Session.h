@@ -66,6 +66,7 @@ public:
 
 private:
     Status loadModel();
+    Result<Model> importChosenModel();
     Status startOpenCLIfPossible();
     Status evaluate();
     void draw();

@@ -1,6 +1,9 @@
 // vyra-viewer: an animated character, deformed by OpenCL straight into the vertex buffers that
 // OpenGL draws from.
+#include "viewer/ImportProcess.h"
+#include "viewer/Interrupt.h"
 #include "viewer/Options.h"
+#include "viewer/Process.h"
 #include "viewer/Session.h"
 #include "viewer/ViewerWindow.h"
 
@@ -8,11 +11,14 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <exception>
 #include <memory>
+#include <new>
 
 #include <QCoreApplication>
 #include <QGuiApplication>
 #include <QSurfaceFormat>
+#include <QTimer>
 
 namespace {
 
@@ -25,6 +31,11 @@ using viewer::ViewerWindow;
 
 // Time between two frames that are rendered without a clock.
 constexpr double kSecondsPerFrame = 1.0 / 30.0;
+// Milliseconds between two looks for Ctrl-C in a window that may be hidden and draw nothing.
+constexpr int kInterruptPeriod = 100;
+
+constexpr char kOutOfMemory[] = "vyra-viewer: there is not enough memory; use a smaller crowd or "
+                                "model, or allow the process more\n";
 
 int tell(const Failure& failure)
 {
@@ -43,6 +54,23 @@ void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QS
     std::_Exit(code);
 }
 
+// Memory may run out on any thread and in any callback, where nobody catches the exception.
+[[noreturn]] void endWithoutMemory()
+{
+    try {
+        if (const std::exception_ptr exception = std::current_exception())
+            std::rethrow_exception(exception);
+    } catch (const std::bad_alloc&) {
+        std::fputs(kOutOfMemory, stderr);
+        std::_Exit(static_cast<int>(ExitCode::kOutOfMemory));
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "vyra-viewer: ended by an error: %s\n", error.what());
+    } catch (...) {
+        std::fputs("vyra-viewer: ended by an unknown error\n", stderr);
+    }
+    std::abort();
+}
+
 QSurfaceFormat surfaceFormat(bool waitForDisplay)
 {
     QSurfaceFormat format;
@@ -54,7 +82,7 @@ QSurfaceFormat surfaceFormat(bool waitForDisplay)
 
 Status renderFrames(Session& session, ViewerWindow& window, int frames)
 {
-    for (int i = 0; i < frames; ++i) {
+    for (int i = 0; i < frames && !viewer::interrupted(); ++i) {
         if (Status failure = session.renderFrame(i * kSecondsPerFrame))
             return failure;
         window.present(session);
@@ -67,6 +95,12 @@ Status renderFrames(Session& session, ViewerWindow& window, int frames)
 Status playInWindow(Session& session, ViewerWindow& window)
 {
     window.play(session);
+    QTimer timer;
+    QObject::connect(&timer, &QTimer::timeout, [] {
+        if (viewer::interrupted())
+            QGuiApplication::exit();
+    });
+    timer.start(kInterruptPeriod);
     QGuiApplication::exec();
     window.stop();
     return window.failure();
@@ -97,10 +131,10 @@ Status runTraced(const Options& options, bool& verified)
     ProfileRecorder::start();
     Status failure = run(options, verified);
     ProfileRecorder::stop();
-    if (!failure && !ProfileRecorder::writeChromeTrace(options.trace))
-        return Failure{ExitCode::kOutput, "the trace '" + options.trace +
-                                              "' cannot be written; choose another file with "
-                                              "--trace"};
+    std::string reason;
+    if (!failure && !ProfileRecorder::writeChromeTrace(options.trace, &reason))
+        return Failure{ExitCode::kOutput, "the trace '" + options.trace + "' cannot be written: " +
+                                              reason + "; choose another file with --trace"};
     return failure;
 }
 
@@ -116,9 +150,17 @@ QStringList argumentsOf(int argc, char* argv[])
 
 int main(int argc, char* argv[])
 {
-    const viewer::Result<Options> options = viewer::parseOptions(argumentsOf(argc, argv));
+    if (viewer::isImportChild(argc, argv))
+        return viewer::runImportChild(argv);
+    std::set_terminate(endWithoutMemory);
+    viewer::reportCrashWithoutMemory(kOutOfMemory, static_cast<int>(ExitCode::kOutOfMemory));
+    viewer::Result<Options> options = viewer::parseOptions(argumentsOf(argc, argv));
     if (!options)
         return tell(options.failure());
+    if (options.value().version) {
+        std::puts("vyra-viewer " VYRA_VERSION);
+        return static_cast<int>(ExitCode::kSuccess);
+    }
     if (options.value().help) {
         const QCoreApplication application(argc, argv);
         std::fputs(viewer::helpText().c_str(), stdout);
@@ -132,6 +174,8 @@ int main(int argc, char* argv[])
     int ownArguments = 1;
     const QGuiApplication application(ownArguments, argv);
     qInstallMessageHandler(nullptr);
+    options.value().importProgram = QGuiApplication::applicationFilePath().toStdString();
+    viewer::catchInterrupt();
 
     bool verified = true;
     if (const Status failure = runTraced(options.value(), verified))
@@ -139,5 +183,7 @@ int main(int argc, char* argv[])
     if (!verified)
         return tell({ExitCode::kDeviation, "a frame deviates from the CPU reference by more than "
                                            "the bound; see the report"});
+    if (viewer::interrupted())
+        return tell({ExitCode::kInterrupted, "interrupted"});
     return static_cast<int>(ExitCode::kSuccess);
 }

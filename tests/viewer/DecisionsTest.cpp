@@ -30,7 +30,8 @@ TEST(Options, AreReadAsTheyAreGiven)
 {
     const Result<Options> result = parse(
         "--frames 60 --crowd 64 --size 640x360 --output out --every 5 --verify --trace t.json "
-        "--animation run --min-verts 0 --platform PoCL --allow-cpu --resize-every 7 a.fbx");
+        "--animation run --min-verts 0 --platform PoCL --allow-cpu --resize-every 7 --up z "
+        "--crease 30 --load-limit 5 a.fbx");
     ASSERT_TRUE(result) << result.failure().text;
     const Options& options = result.value();
     EXPECT_EQ(options.model, "a.fbx");
@@ -44,6 +45,9 @@ TEST(Options, AreReadAsTheyAreGiven)
     EXPECT_EQ(options.minimumVertices, 0);
     EXPECT_EQ(options.platform, "PoCL");
     EXPECT_EQ(options.resizeEvery, 7);
+    EXPECT_EQ(options.import.up, UpAxis::kZ);
+    EXPECT_EQ(options.import.creaseAngle, 30);
+    EXPECT_EQ(options.loadLimit, 5);
     EXPECT_TRUE(options.verify && options.allowCpu);
 }
 
@@ -56,6 +60,8 @@ TEST(Options, AModelOrHelpAloneIsEnough)
     EXPECT_FALSE(result.value().verify || result.value().allowCpu || result.value().help);
     const Result<Options> help = parse("--help");
     EXPECT_TRUE(help && help.value().help);
+    const Result<Options> version = parse("--version");
+    EXPECT_TRUE(version && version.value().version);
 }
 
 TEST(Options, EachMistakeIsNamed)
@@ -72,7 +78,12 @@ TEST(Options, EachMistakeIsNamed)
         {"--min-verts takes a whole number", {"--min-verts -1 a"}},
         {"--resize-every takes a whole number", {"--resize-every 0 a"}},
         {"--size takes WIDTHxHEIGHT",
-         {"--size 640 a", "--size 640x a", "--size 0x480 a", "--size 99999x480 a"}},
+         {"--size 640 a", "--size 640x a", "--size 15x480 a", "--size 99999x480 a"}},
+        {"--up takes x, y or z", {"--up w a", "--up= a"}},
+        {"--crease takes a whole number", {"--crease 181 a"}},
+        {"--load-limit takes a whole number", {"--load-limit 0 a"}},
+        {"takes a value that is not empty",
+         {"--animation= a", "--output= --frames 1 a", "--trace= a", "--platform= a"}},
         {"--output needs --frames", {"--output out a"}},
     };
     for (const auto& [says, lines] : rows) {

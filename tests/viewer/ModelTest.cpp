@@ -2,7 +2,9 @@
 #include "viewer/Camera.h"
 #include "viewer/CharacterSpace.h"
 #include "viewer/DetailLevel.h"
+#include "viewer/ImportProcess.h"
 #include "viewer/ModelImport.h"
+#include "viewer/ModelStream.h"
 
 #include <algorithm>
 #include <cmath>
@@ -108,6 +110,149 @@ INSTANTIATE_TEST_SUITE_P(All, SampleModel,
                                          Sample{"OBJ/WusonOBJ.obj", 1, 2117, 0, 0}),
                          [](const auto& sample) { return "Model" + std::to_string(sample.index); });
 
+// A temporary folder with model files.
+class ModelFolder {
+public:
+    std::string path(const char* name) const { return fFolder.filePath(name).toStdString(); }
+
+    std::string write(const char* name, const std::string& content) const
+    {
+        std::ofstream(path(name)) << content;
+        return path(name);
+    }
+
+private:
+    QTemporaryDir fFolder;
+};
+
+// A cube without normals, with its corners at 0 and `size`.
+std::string cube(const char* size)
+{
+    std::string text;
+    for (const char* line :
+         {"v 0 0 0", "v S 0 0", "v S S 0", "v 0 S 0", "v 0 0 S", "v S 0 S", "v S S S", "v 0 S S",
+          "f 4 3 2 1", "f 5 6 7 8", "f 1 2 6 5", "f 3 4 8 7", "f 2 3 7 6", "f 1 5 8 4"})
+        text += line + std::string("\n");
+    return QString::fromStdString(text).replace("S", size).toStdString();
+}
+
+TEST(ModelImport, UselessFileIsRefusedWithItsReason)
+{
+    const ModelFolder folder;
+    std::filesystem::create_symlink("loop.obj", folder.path("loop.obj"));
+    const std::tuple<const char*, const char*, const char*> rows[] = {
+        {"comment.obj", "# nothing\n", "cannot be read (OBJ"},
+        {"points.obj", "v 0 0 0\nv 1 0 0\np 1\np 2\n", "no meshes"},
+        {"text.txt", "not a model\n", "(No suitable reader"},
+        {"cut.obj", "v 0 0 0\nv 1 0 0\nv 0 1 0\nf 1 2 9\n", "truncated or damaged"},
+        {"nan.obj", "v 0 0 0\nv 1 nan 0\nv 0 1 0\nf 1 2 3\n",
+         "vertex 1 of the mesh 'defaultobject' is at (1, nan, 0)"},
+        {"point.obj", "v 1 1 1\nv 1 1 1\nv 1 1 1\nf 1 2 3\n", "no triangle with an area"},
+        {"empty.obj", "", "is empty"},
+        {"missing.obj", nullptr, "there is no model file"},
+        {"", nullptr, "is a directory"},
+        {"loop.obj", nullptr, "cannot be opened: Too many levels of symbolic links"},
+    };
+    for (const auto& [name, content, reason] : rows) {
+        const Result<Model> model =
+            importModel(content ? folder.write(name, content) : folder.path(name));
+        ASSERT_FALSE(model) << name;
+        EXPECT_EQ(model.failure().code, ExitCode::kModel);
+        EXPECT_THAT(model.failure().text, testing::HasSubstr(reason));
+    }
+    EXPECT_THAT(importModel("").failure().text, testing::HasSubstr("there is no model file"));
+    EXPECT_THAT(importModel("/dev/null").failure().text, testing::HasSubstr("not a regular file"));
+}
+
+// The vertices of a cube: 24 with sharp edges, 8 with smooth ones.
+TEST(ModelImport, MissingNormalsFollowTheTrianglesUpToTheCreaseAngle)
+{
+    const ModelFolder folder;
+    const std::tuple<const char*, double, std::size_t> rows[] = {
+        {"1", 60, 24}, {"1", 120, 8}, {"0.000001", 60, 24}, {"1e20", 60, 24}};
+    for (const auto& [size, creaseAngle, vertices] : rows) {
+        const Result<Model> model =
+            importModel(folder.write("cube.obj", cube(size)), {std::nullopt, creaseAngle});
+        ASSERT_TRUE(model) << model.failure().text;
+        const Mesh& mesh = model.value().meshes.front();
+        EXPECT_EQ(mesh.vertexCount(), vertices) << size << ' ' << creaseAngle;
+        const auto [low, high] = boundsOf(mesh.normals);
+        const float expected = vertices == 24 ? 1 : std::sqrt(1.0f / 3);
+        EXPECT_NEAR(high.x() - low.x(), 2 * expected, 1e-5);
+    }
+}
+
+TEST(ModelImport, ZeroNormalsAreComputedFromTheTriangles)
+{
+    const ModelFolder folder;
+    const std::string triangle = "v 0 0 0\nv 1 0 0\nv 0 0 -1\nv 0 1 0\nvn 0 0 0\nvn -1 0 0\n";
+    for (const char* faces : {"f 1//1 2//1 3//1\n", "f 1//1 2//1 3//1\nf 1//2 3//2 4//2\n"}) {
+        const Result<Model> model = importModel(folder.write("zero.obj", triangle + faces));
+        ASSERT_TRUE(model) << model.failure().text;
+        EXPECT_LT((model.value().meshes[0].normals[1] - QVector3D(0, 1, 0)).length(), 1e-5f);
+    }
+}
+
+TEST(ModelImport, ModelStandsUprightAlongItsUpAxis)
+{
+    const ModelFolder folder;
+    const std::string file =
+        folder.write("up.obj", "v 0 0 0\nv 3 0 0\nv 3 0 2\nv 0 1 0\nf 1 2 3\nf 1 2 4\n");
+    const std::pair<std::optional<UpAxis>, QVector3D> rows[] = {{std::nullopt, {3, 1, 2}},
+                                                                {UpAxis::kX, {1, 3, 2}},
+                                                                {UpAxis::kY, {3, 1, 2}},
+                                                                {UpAxis::kZ, {3, 2, 1}}};
+    for (const auto& [up, size] : rows) {
+        ImportSettings settings;
+        settings.up = up;
+        const Result<Model> model = importModel(file, settings);
+        ASSERT_TRUE(model) << model.failure().text;
+        EXPECT_LT((characterSpace(model.value(), nullptr).size - size / 3).length(), 1e-5f);
+    }
+}
+
+// The bytes of a model tell whether all of it is the same.
+TEST(ImportProcess, ChildDeliversTheSameModel)
+{
+    if (!std::filesystem::exists("/usr/share/assimp/models"))
+        GTEST_SKIP() << "the sample models (package assimp-testmodels) are not installed";
+    const ImportChild child{VIEWER_PROGRAM, 60, [](int) { return true; }};
+    const char* name = "X/BCN_Epileptic.X";
+    const QByteArray expected = toBytes(importModel(name));
+    EXPECT_EQ(toBytes(importInChild(child, name, {})), expected);
+    ASSERT_GT(expected.size(), 100000);
+    EXPECT_TRUE(fromBytes(expected));
+    EXPECT_FALSE(fromBytes(expected.chopped(1)));
+    const auto wrong = importInChild(child, "/dev/null", {});
+    EXPECT_THAT(wrong.failure().text, testing::HasSubstr("not a regular file"));
+}
+
+TEST(ImportProcess, ChildThatFailsGivesOneSentence)
+{
+    const ModelFolder folder;
+    const std::string file = folder.write("cube.obj", cube("1"));
+    const std::string program = folder.path("program");
+    const std::tuple<const char*, int, bool, const char*> rows[] = {
+        {"kill -SEGV $$", 60, true, "makes Assimp crash (signal 11)"},
+        {"echo surprise", 60, true, "makes Assimp crash (exit code 0)"},
+        {"exit 3", 60, true, "makes Assimp crash (exit code 3)"},
+        {"exec sleep 1000", -5, true, "takes longer than -5 s"}, // with the 5 s to end itself
+        {"exit 124", 60, true, "takes longer than 60 s"},
+        {"exec sleep 1000", 60, false, "interrupted"},
+    };
+    for (const auto& [command, timeLimit, goesOn, sentence] : rows) {
+        folder.write("program", std::string("#!/bin/sh\n") + command + '\n');
+        std::filesystem::permissions(program, std::filesystem::perms::owner_all);
+        const bool answer = goesOn;
+        const auto model =
+            importInChild({program, timeLimit, [answer](int) { return answer; }}, file, {});
+        ASSERT_FALSE(model) << command;
+        EXPECT_THAT(model.failure().text, testing::HasSubstr(sentence));
+    }
+    const auto model = importInChild({folder.path("none"), 60, {}}, file, {});
+    EXPECT_THAT(model.failure().text, testing::HasSubstr("the process for it does not start"));
+}
+
 TEST(ModelImport, WeightsAreScaledToAddUpToOne)
 {
     const std::pair<BoneWeights, BoneWeights> rows[] = {
@@ -117,27 +262,6 @@ TEST(ModelImport, WeightsAreScaledToAddUpToOne)
         {{0, 0, 0, 0}, {0, 0, 0, 0}}};
     for (const auto& [weights, expected] : rows)
         EXPECT_EQ(normalised(weights), expected);
-}
-
-TEST(ModelImport, SaysWhyAFileIsNoModel)
-{
-    const QTemporaryDir folder;
-    const std::tuple<const char*, const char*, const char*> rows[] = {
-        {"empty.obj", "# nothing\n", "cannot be read"},
-        {"points.obj", "v 0 0 0\nv 1 0 0\np 1\np 2\n", "no meshes"},
-        {"text.txt", "not a model\n", "cannot be read"},
-        {"missing.obj", nullptr, "there is no model file"},
-        {"", nullptr, "there is no model file"},
-    };
-    for (const auto& [name, content, says] : rows) {
-        const std::string file = folder.filePath(name).toStdString();
-        if (content)
-            std::ofstream(file) << content;
-        const Result<Model> model = importModel(file);
-        ASSERT_FALSE(model) << name;
-        EXPECT_EQ(model.failure().code, ExitCode::kModel);
-        EXPECT_THAT(model.failure().text, testing::HasSubstr(says));
-    }
 }
 
 TEST(Camera, FramesAllPointsAsLargeAsThePictureAllows)
