@@ -35,6 +35,16 @@ cl_int answerWith(const T& value, const Query& query)
     return answer(std::as_bytes(std::span<const T, 1>(&value, 1)), query);
 }
 
+// The most elements that a list given by the application can have. A larger count is a mistake,
+// such as -1 as a cl_uint, and nothing is read.
+inline constexpr cl_uint kLongestList = cl_uint{1} << 24;
+
+// Whether `list` has `count` elements: none and a null pointer, or some and a pointer.
+inline bool isList(cl_uint count, const void* list)
+{
+    return (count == 0) == (list == nullptr) && count <= kLongestList;
+}
+
 // Fills in an error code that a caller may not want.
 inline void setError(cl_int* result, cl_int error)
 {

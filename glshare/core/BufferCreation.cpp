@@ -1,5 +1,6 @@
 #include "core/BufferCreation.h"
 
+#include "core/Fork.h"
 #include "core/Registry.h"
 #include "core/Switches.h"
 
@@ -24,7 +25,8 @@ bool describe(SharedBuffer& buffer, const GlDevice& device, bool inPlace)
 // The runtime calls this when nothing uses the memory object any more, on any thread.
 void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
 {
-    Registry::get().remove(memory);
+    if (!isForkedChild())
+        Registry::get().remove(memory);
 }
 
 cl_mem createMemory(cl_context handle, const SharedBuffer& buffer, cl_int& error)
@@ -35,24 +37,26 @@ cl_mem createMemory(cl_context handle, const SharedBuffer& buffer, cl_int& error
                                     buffer.storage.address(), &error);
 }
 
-bool areValidFlags(cl_mem_flags flags)
-{
-    return flags == CL_MEM_READ_WRITE || flags == CL_MEM_READ_ONLY || flags == CL_MEM_WRITE_ONLY;
-}
-
 } // namespace
+
+// None of them is the same as CL_MEM_READ_WRITE.
+bool areSharingFlags(cl_mem_flags flags)
+{
+    return flags == 0 || flags == CL_MEM_READ_WRITE || flags == CL_MEM_READ_ONLY ||
+           flags == CL_MEM_WRITE_ONLY;
+}
 
 cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContext>& context,
                           cl_mem_flags flags, cl_GLuint name, cl_int& error)
 {
+    if (!areSharingFlags(flags)) {
+        error = CL_INVALID_VALUE;
+        return nullptr;
+    }
     auto buffer = std::make_shared<SharedBuffer>();
     buffer->context = context;
     buffer->name = name;
     buffer->flags = flags == 0 ? cl_mem_flags{CL_MEM_READ_WRITE} : flags;
-    if (!areValidFlags(buffer->flags)) {
-        error = CL_INVALID_VALUE;
-        return nullptr;
-    }
 
     const bool inPlace = switches().zeroCopy && context->canUseHostMemory();
     bool isBuffer = false;
@@ -68,12 +72,17 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
     if (buffer->memory == nullptr)
         return nullptr;
     cl_mem memory = buffer->memory;
-    Registry::get().add(handle, std::move(buffer));
+    try {
+        Registry::get().add(handle, std::move(buffer));
+    } catch (...) {
+        runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
+        throw;
+    }
     error = runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
     if (error == CL_SUCCESS)
         return memory;
     onDestroyed(memory, nullptr);
-    runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
+    runtime().clReleaseMemObject(memory); // likewise
     return nullptr;
 }
 

@@ -7,6 +7,9 @@
 
 namespace glshare {
 
+// Whether `flags` may be given for an object made from one of OpenGL's.
+[[nodiscard]] bool areSharingFlags(cl_mem_flags flags);
+
 // clCreateFromGLBuffer, for a context that shares. The memory object lies over the buffer's own
 // storage where devices and renderer allow it, and has storage of its own elsewhere. The caller
 // owns the one reference; null, and the reason in `error`, on failure.

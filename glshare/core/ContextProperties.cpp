@@ -65,22 +65,25 @@ ContextProperties parseProperties(const cl_context_properties* list)
 {
     ContextProperties result;
     GlEntries gl;
-    std::vector<cl_context_properties> glNames;
+    std::vector<cl_context_properties> names;
     for (; list != nullptr && *list != 0; list += 2) {
         const cl_context_properties name = list[0];
         const cl_context_properties value = list[1];
         result.original.insert(result.original.end(), {name, value});
+        if (std::ranges::find(names, name) != names.end())
+            result.error = CL_INVALID_PROPERTY;
+        names.push_back(name);
         if (cl_context_properties* entry = gl.find(name)) {
-            if (std::ranges::find(glNames, name) != glNames.end())
-                result.error = CL_INVALID_PROPERTY;
-            glNames.push_back(name);
             *entry = value;
             continue;
         }
         if (name == CL_CONTEXT_PLATFORM)
             result.platform = static_cast<cl_platform_id>(pointerOf(value));
-        if (name == CL_CONTEXT_INTEROP_USER_SYNC)
+        if (name == CL_CONTEXT_INTEROP_USER_SYNC) {
             result.userSynchronises = value == CL_TRUE;
+            if (value != CL_TRUE && value != CL_FALSE)
+                result.error = CL_INVALID_PROPERTY;
+        }
         result.forRuntime.insert(result.forRuntime.end(), {name, value});
     }
     result.original.push_back(0);

@@ -1,5 +1,6 @@
 #include "core/Copies.h"
 
+#include <exception>
 #include <utility>
 #include <vector>
 
@@ -93,12 +94,17 @@ cl_int enqueueCopies(cl_command_queue queue, std::vector<CopyItem> items, CopyDi
     const auto batch = std::make_shared<CopyBatch>();
     batch->items = std::move(items);
     batch->direction = direction;
+    batch->events->unmaps.reserve(batch->items.size()); // so that what is mapped can be unmapped
     cl_int error = createUserEvent(queue, batch->events->copied);
     if (error != CL_SUCCESS)
         return error;
-    error = mapAll(queue, *batch, waitList);
-    if (error == CL_SUCCESS)
-        error = enqueueRest(queue, batch);
+    try {
+        error = mapAll(queue, *batch, waitList);
+        if (error == CL_SUCCESS)
+            error = enqueueRest(queue, batch);
+    } catch (const std::exception&) {
+        error = CL_OUT_OF_HOST_MEMORY;
+    }
     if (error == CL_SUCCESS) {
         *done = batch->events->done.back();
         return runtime().clRetainEvent(*done); // the caller's reference

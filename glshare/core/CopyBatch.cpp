@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <cstring>
+#include <exception>
 #include <map>
 #include <mutex>
 #include <utility>
@@ -85,7 +86,7 @@ void settle(CopyBatch& batch, cl_int status, GlDevice* device)
     if (status == CL_COMPLETE)
         copyAll(batch, device);
     else
-        contextOf(batch).keep(batch.events);
+        contextOf(batch).keep(std::move(batch.keptIfFailed));
     runtime().clSetUserEventStatus(batch.events->copied.back(), CL_COMPLETE);
 }
 
@@ -97,7 +98,12 @@ void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* number)
     if (batch == nullptr)
         return;
     const std::shared_ptr<SharingContext> context = batch->items.front().buffer->context;
-    context->worker().post([batch, status](GlDevice* device) { settle(*batch, status, device); });
+    try {
+        context->worker().post(
+            [batch, status](GlDevice* device) { settle(*batch, status, device); });
+    } catch (const std::exception&) {
+        // The watch sees the status instead.
+    }
 }
 
 // Not every runtime calls back when a command fails, so that the worker has a look at times.
@@ -107,7 +113,7 @@ bool hasEnded(CopyBatch& batch, GlDevice* device)
     if (!batch.isSettled)
         runtime().clGetEventInfo(batch.events->mapped.back(), CL_EVENT_COMMAND_EXECUTION_STATUS,
                                  sizeof status, &status, nullptr);
-    if (status < 0)
+    if (status <= CL_COMPLETE)
         settle(batch, status, device);
     return batch.isSettled;
 }
@@ -116,14 +122,15 @@ bool hasEnded(CopyBatch& batch, GlDevice* device)
 
 cl_int copyWhenMapped(const std::shared_ptr<CopyBatch>& batch)
 {
+    // The watch is what keeps the batch.
+    GlWorker::PreparedWatch watch;
+    watch.emplace_back([batch](GlDevice* device) { return hasEnded(*batch, device); });
     const std::uintptr_t number = OutstandingBatches::get().add(batch);
     void* const user = reinterpret_cast<void*>(number); // NOLINT(performance-no-int-to-ptr)
     const cl_int error =
         runtime().clSetEventCallback(batch->events->mapped.back(), CL_COMPLETE, onMapped, user);
-    // The watch is what keeps the batch.
     if (error == CL_SUCCESS)
-        contextOf(*batch).worker().watch(
-            [batch](GlDevice* device) { return hasEnded(*batch, device); });
+        contextOf(*batch).worker().watch(std::move(watch));
     return error;
 }
 

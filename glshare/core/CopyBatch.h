@@ -34,6 +34,7 @@ struct CopyBatch {
     std::vector<CopyItem> items; // not empty, and of one context
     CopyDirection direction = CopyDirection::FromGl;
     std::shared_ptr<CopyEvents> events = std::make_shared<CopyEvents>();
+    SharingContext::Kept keptIfFailed{events};
     bool isSettled = false; // `copied` has its status; touched by the worker alone
 };
 

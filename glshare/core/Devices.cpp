@@ -9,6 +9,18 @@ namespace {
 constexpr std::string_view kSharing = "cl_khr_gl_sharing";
 constexpr std::string_view kEvent = "cl_khr_gl_event";
 
+// Empty if `context` is not a context.
+std::vector<cl_device_id> devicesOf(cl_context context)
+{
+    std::size_t size = 0;
+    if (context == nullptr ||
+        runtime().clGetContextInfo(context, CL_CONTEXT_DEVICES, 0, nullptr, &size) != CL_SUCCESS)
+        return {};
+    std::vector<cl_device_id> devices(size / sizeof(cl_device_id));
+    runtime().clGetContextInfo(context, CL_CONTEXT_DEVICES, size, devices.data(), nullptr);
+    return devices;
+}
+
 } // namespace
 
 bool sharesByItself(cl_device_id device)
@@ -23,13 +35,21 @@ bool sharesByItself(cl_device_id device)
 
 bool runtimeShares(cl_context context)
 {
-    std::size_t size = 0;
-    if (context == nullptr ||
-        runtime().clGetContextInfo(context, CL_CONTEXT_DEVICES, 0, nullptr, &size) != CL_SUCCESS)
-        return false;
-    std::vector<cl_device_id> devices(size / sizeof(cl_device_id));
-    runtime().clGetContextInfo(context, CL_CONTEXT_DEVICES, size, devices.data(), nullptr);
+    const std::vector<cl_device_id> devices = devicesOf(context);
     return !devices.empty() && sharesByItself(devices.front());
+}
+
+bool offersVersion3(cl_context context)
+{
+    const std::vector<cl_device_id> devices = devicesOf(context);
+    cl_platform_id platform = nullptr;
+    cl_version version = 0; // a query that OpenCL 3.0 has introduced
+    return !devices.empty() &&
+           runtime().clGetDeviceInfo(devices.front(), CL_DEVICE_PLATFORM, sizeof platform,
+                                     static_cast<void*>(&platform), nullptr) == CL_SUCCESS &&
+           runtime().clGetPlatformInfo(platform, CL_PLATFORM_NUMERIC_VERSION, sizeof version,
+                                       &version, nullptr) == CL_SUCCESS &&
+           CL_VERSION_MAJOR(version) >= 3;
 }
 
 cl_device_type ownType(cl_device_id device)

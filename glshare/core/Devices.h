@@ -17,6 +17,9 @@ namespace glshare {
 // that offers no sharing may do anything when it is asked for it, ending the process included.
 [[nodiscard]] bool runtimeShares(cl_context context);
 
+// Whether the runtime of a context has the functions of OpenCL 3.0.
+[[nodiscard]] bool offersVersion3(cl_context context);
+
 // The device's own type, not what the application is told.
 [[nodiscard]] cl_device_type ownType(cl_device_id device);
 

@@ -3,6 +3,7 @@
 
 #include "core/OpenCl.h"
 
+#include <cstddef>
 #include <vector>
 
 namespace glshare {
@@ -20,15 +21,18 @@ public:
     EventList(const EventList&) = delete;
     EventList& operator=(const EventList&) = delete;
 
+    // Makes space for `count` events: adding them allocates nothing.
+    void reserve(std::size_t count) { events_.reserve(count); }
+
     // Makes a call that returns an event: `call` gets where to store it, and answers its status.
-    // The event becomes the last of the list if the call succeeds.
+    // The event becomes the last of the list if the call succeeds. Throws before the call only.
     template <typename Call>
     cl_int add(Call call)
     {
-        cl_event event = nullptr;
-        const cl_int error = call(&event);
-        if (error == CL_SUCCESS)
-            events_.push_back(event);
+        events_.push_back(nullptr);
+        const cl_int error = call(&events_.back());
+        if (error != CL_SUCCESS)
+            events_.pop_back();
         return error;
     }
 

@@ -1,5 +1,7 @@
 #include "core/EventTypes.h"
 
+#include <utility>
+
 namespace glshare {
 
 EventTypes& EventTypes::get()
@@ -8,10 +10,20 @@ EventTypes& EventTypes::get()
     return *theTypes;
 }
 
-void EventTypes::add(cl_event event, cl_command_type type)
+EventTypes::Prepared EventTypes::prepare(cl_command_type type)
 {
+    Entries entries;
+    entries.emplace(nullptr, Entry{type});
+    return entries.extract(entries.begin());
+}
+
+// The handle may have been another event's, whose end was not seen here.
+void EventTypes::add(cl_event event, Prepared prepared) noexcept
+{
+    prepared.key() = event;
     const std::scoped_lock lock(mutex_);
-    entries_.insert_or_assign(event, Entry{type});
+    entries_.erase(event);
+    entries_.insert(std::move(prepared));
     count_ = entries_.size();
 }
 

@@ -6,9 +6,9 @@
 
 #include <atomic>
 #include <cstddef>
+#include <map>
 #include <mutex>
 #include <optional>
-#include <unordered_map>
 
 namespace glshare {
 
@@ -19,19 +19,26 @@ public:
     // Never destroyed: events may be released in exit handlers.
     static EventTypes& get();
 
-    void add(cl_event event, cl_command_type type);
-    void retain(cl_event event);
-    void release(cl_event event);
-    [[nodiscard]] std::optional<cl_command_type> find(cl_event event);
-
 private:
     struct Entry {
         cl_command_type type;
         std::size_t references = 1; // the application's
     };
+    using Entries = std::map<cl_event, Entry>;
 
+public:
+    // An entry without its event, made in advance: adding it allocates nothing.
+    using Prepared = Entries::node_type;
+
+    [[nodiscard]] static Prepared prepare(cl_command_type type);
+    void add(cl_event event, Prepared prepared) noexcept;
+    void retain(cl_event event);
+    void release(cl_event event);
+    [[nodiscard]] std::optional<cl_command_type> find(cl_event event);
+
+private:
     std::mutex mutex_; // guards entries_
-    std::unordered_map<cl_event, Entry> entries_;
+    Entries entries_;
     std::atomic<std::size_t> count_{0}; // lets the events of others pass without the lock
 };
 

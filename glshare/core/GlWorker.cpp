@@ -1,5 +1,6 @@
 #include "core/GlWorker.h"
 
+#include "core/Fork.h"
 #include "core/GlWorkerLoop.h"
 
 #include <exception>
@@ -10,6 +11,7 @@ namespace glshare {
 
 std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
 {
+    detectForks();
     auto loop = std::make_shared<Loop>(std::move(context));
     std::promise<bool> started;
     std::future<bool> isRunning = started.get_future();

@@ -1,5 +1,6 @@
 #include "core/GlWorkerLoop.h"
 
+#include "core/Fork.h"
 #include "core/LibraryFunctions.h"
 
 #include <chrono>
@@ -245,8 +246,11 @@ void GlWorker::Loop::listenForExit(const std::shared_ptr<Loop>& loop)
         callAtExit(parkAll);
 }
 
+// In a forked child there are no threads to park.
 void GlWorker::Loop::parkAll()
 {
+    if (isForkedChild())
+        return;
     Running& running = Running::get();
     const std::scoped_lock lock(running.mutex);
     for (Running::Entry& entry : running.entries) {

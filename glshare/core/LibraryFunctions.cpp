@@ -3,6 +3,7 @@
 #include <cstdlib>
 
 #include <dlfcn.h>
+#include <pthread.h>
 
 namespace glshare {
 
@@ -16,6 +17,11 @@ void* LibraryFunctions::address(const char* name) const
 void callAtExit(void (*call)())
 {
     std::atexit(call);
+}
+
+bool callInForkedChild(void (*call)())
+{
+    return pthread_atfork(nullptr, nullptr, call) == 0;
 }
 
 } // namespace glshare

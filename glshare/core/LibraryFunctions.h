@@ -26,4 +26,8 @@ private:
 // where the system ends all threads first.
 void callAtExit(void (*call)());
 
+// Has `call` called in each child that this process forks, before anything else runs there; never
+// where processes are not forked. False if the system has no memory for it.
+[[nodiscard]] bool callInForkedChild(void (*call)());
+
 } // namespace glshare

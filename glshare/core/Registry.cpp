@@ -1,5 +1,9 @@
 #include "core/Registry.h"
 
+#include "core/Devices.h"
+#include "core/Fork.h"
+
+#include <algorithm>
 #include <utility>
 
 namespace glshare {
@@ -10,10 +14,33 @@ Registry& Registry::get()
     return *theRegistry;
 }
 
+// A table of functions may have something else where an older runtime has none, so that the version
+// counts.
 void Registry::add(cl_context handle, std::shared_ptr<SharingContext> context)
 {
+    const bool canReportEnd =
+        runtime().clSetContextDestructorCallback != nullptr && offersVersion3(handle);
+    {
+        const std::scoped_lock lock(mutex_);
+        contexts_.insert_or_assign(handle, ContextEntry{std::move(context)});
+    }
+    const auto onDestroyed = [](cl_context destroyed, void* /*user*/) {
+        if (!isForkedChild())
+            get().remove(destroyed);
+    };
+    if (!canReportEnd ||
+        runtime().clSetContextDestructorCallback(handle, onDestroyed, nullptr) != CL_SUCCESS)
+        return;
     const std::scoped_lock lock(mutex_);
-    contexts_.insert_or_assign(handle, ContextEntry{std::move(context)});
+    contexts_.at(handle).isEndReported = true;
+}
+
+void Registry::remove(cl_context handle)
+{
+    std::shared_ptr<SharingContext> unused;
+    const std::scoped_lock lock(mutex_);
+    if (auto entry = contexts_.extract(handle))
+        unused = std::move(entry.mapped().context);
 }
 
 void Registry::retain(cl_context handle)
@@ -61,8 +88,8 @@ std::shared_ptr<SharedBuffer> Registry::find(cl_mem handle)
 SharedBuffers Registry::find(const cl_mem* handles, std::size_t count)
 {
     SharedBuffers result;
-    result.reserve(count);
     const std::scoped_lock lock(mutex_);
+    result.reserve(std::min(count, buffers_.size()));
     for (std::size_t i = 0; i < count; ++i) {
         const auto found = buffers_.find(handles[i]);
         if (found == buffers_.end())
@@ -93,7 +120,8 @@ void Registry::remove(cl_mem handle)
 std::shared_ptr<SharingContext> Registry::takeUnused(cl_context handle)
 {
     const auto found = contexts_.find(handle);
-    if (found == contexts_.end() || found->second.references > 0 || found->second.buffers > 0)
+    if (found == contexts_.end() || found->second.isEndReported || found->second.references > 0 ||
+        found->second.buffers > 0)
         return nullptr;
     std::shared_ptr<SharingContext> context = std::move(found->second.context);
     contexts_.erase(found);

@@ -17,10 +17,12 @@ public:
     // Never destroyed: objects may be released in exit handlers.
     static Registry& get();
 
-    // A context lives here as long as the application holds references to it or to shared buffers
-    // in it. The application's references are counted here, as the runtime's own count has other
-    // owners too.
+    // A context lives here until the runtime destroys it, which is after every object in it. A
+    // runtime before OpenCL 3.0 does not report that: then the context lives as long as the
+    // application holds references to it or to shared buffers in it. Those references are counted
+    // here, as the runtime's own count has other owners too.
     void add(cl_context handle, std::shared_ptr<SharingContext> context);
+    void remove(cl_context handle);
     void retain(cl_context handle);
     void release(cl_context handle);
     [[nodiscard]] std::shared_ptr<SharingContext> find(cl_context handle);
@@ -28,7 +30,7 @@ public:
     void add(cl_context handle, std::shared_ptr<SharedBuffer> buffer);
     [[nodiscard]] std::shared_ptr<SharedBuffer> find(cl_mem handle);
 
-    // The records of `count` handles in their order, up to the first that is unknown.
+    // Returns the records of `count` handles in their order, up to the first that is unknown.
     [[nodiscard]] SharedBuffers find(const cl_mem* handles, std::size_t count);
 
     // When the runtime destroys the memory object. Does nothing if it is unknown.
@@ -37,6 +39,7 @@ public:
 private:
     struct ContextEntry {
         std::shared_ptr<SharingContext> context;
+        bool isEndReported = false; // if so, nothing is counted
         std::size_t references = 1; // the application's
         std::size_t buffers = 0;
     };

@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <exception>
 #include <memory>
 #include <utility>
 #include <vector>
@@ -108,15 +109,20 @@ cl_int enqueue(SharingCommand command, const SharingRequest& request, std::vecto
     return enqueueCopies(request.queue, std::move(copies), direction, request.waitList, done);
 }
 
+cl_command_type typeOf(SharingCommand command)
+{
+    return command == SharingCommand::Acquire ? CL_COMMAND_ACQUIRE_GL_OBJECTS
+                                              : CL_COMMAND_RELEASE_GL_OBJECTS;
+}
+
 // Hands the event to the application, or gives it back if it is not wanted.
-void handOver(cl_event done, SharingCommand command, cl_event* wanted)
+void handOver(cl_event done, EventTypes::Prepared type, cl_event* wanted)
 {
     if (wanted == nullptr) {
         runtime().clReleaseEvent(done);
         return;
     }
-    EventTypes::get().add(done, command == SharingCommand::Acquire ? CL_COMMAND_ACQUIRE_GL_OBJECTS
-                                                                   : CL_COMMAND_RELEASE_GL_OBJECTS);
+    EventTypes::get().add(done, std::move(type));
     *wanted = done;
 }
 
@@ -124,6 +130,10 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
                         const SharingContext& context, const SharedBuffers& buffers)
 {
     const bool isOrdered = context.isOrderedWithCaller();
+    // Allocated before the command is in the queue, which nothing takes back.
+    EventTypes::Prepared type;
+    if (request.event != nullptr)
+        type = EventTypes::prepare(typeOf(command));
     std::vector<CopyItem> copies;
     if (command == SharingCommand::Acquire) {
         if (isOrdered)
@@ -142,7 +152,7 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
     // A wait that fails tells of a command before this one, and so will the event.
     if (command == SharingCommand::Release && isOrdered)
         static_cast<void>(runtime().clWaitForEvents(1, &done));
-    handOver(done, command, request.event);
+    handOver(done, std::move(type), request.event);
     return CL_SUCCESS;
 }
 
@@ -158,7 +168,12 @@ cl_int enqueueSharing(SharingCommand command, const std::shared_ptr<SharingConte
     const bool acquired = command == SharingCommand::Acquire;
     if (!context->setAcquired(buffers, acquired))
         return CL_INVALID_GL_OBJECT;
-    const cl_int error = acquireOrRelease(command, request, *context, buffers);
+    cl_int error = CL_OUT_OF_HOST_MEMORY;
+    try {
+        error = acquireOrRelease(command, request, *context, buffers);
+    } catch (const std::exception&) {
+        // As any other failure of the command.
+    }
     if (error != CL_SUCCESS)
         static_cast<void>(context->setAcquired(buffers, !acquired));
     return error;

@@ -32,10 +32,10 @@ bool SharingContext::setAcquired(const SharedBuffers& buffers, bool acquired)
     return true;
 }
 
-void SharingContext::keep(std::shared_ptr<const void> thing)
+void SharingContext::keep(Kept things) noexcept
 {
     const std::scoped_lock lock(mutex_);
-    kept_.push_back(std::move(thing));
+    kept_.splice(kept_.end(), things);
 }
 
 } // namespace glshare

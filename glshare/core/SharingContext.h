@@ -6,6 +6,7 @@
 #include "core/GlWorker.h"
 #include "core/SharedBuffer.h"
 
+#include <list>
 #include <memory>
 #include <mutex>
 #include <span>
@@ -33,15 +34,16 @@ public:
     // them is so already, or stands in the list twice.
     [[nodiscard]] bool setAcquired(const SharedBuffers& buffers, bool acquired);
 
-    // Keeps something as long as the context.
-    void keep(std::shared_ptr<const void> thing);
+    // Keeps things as long as the context; allocates nothing.
+    using Kept = std::list<std::shared_ptr<const void>>;
+    void keep(Kept things) noexcept;
 
 private:
     std::unique_ptr<GlWorker> worker_;
     ContextProperties properties_;
     bool canUseHostMemory_;
     std::mutex mutex_; // guards SharedBuffer::isAcquired and the following
-    std::vector<std::shared_ptr<const void>> kept_;
+    Kept kept_;
 };
 
 } // namespace glshare

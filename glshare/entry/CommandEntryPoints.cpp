@@ -27,9 +27,8 @@ struct RawRequest {
 
 bool isWaitList(cl_uint count, const cl_event* list)
 {
-    if ((count == 0) != (list == nullptr))
-        return false;
-    return std::ranges::none_of(std::span(list, count),
+    return isList(count, list) &&
+           std::ranges::none_of(std::span(list, count),
                                 [](const cl_event event) { return event == nullptr; });
 }
 
@@ -44,7 +43,7 @@ cl_int share(SharingCommand command, const RawRequest& raw, PassDown passDown)
     const auto context = Registry::get().find(handle);
     if (context == nullptr)
         return runtimeShares(handle) ? passDown() : CL_INVALID_CONTEXT;
-    if ((raw.count == 0) != (raw.memory == nullptr))
+    if (!isList(raw.count, raw.memory))
         return CL_INVALID_VALUE;
     if (!isWaitList(raw.waitCount, raw.waitList))
         return CL_INVALID_EVENT_WAIT_LIST;

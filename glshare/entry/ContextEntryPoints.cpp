@@ -25,6 +25,20 @@ bool workInHostMemory(std::span<const cl_device_id> devices)
         devices, [](cl_device_id device) { return (ownType(device) & CL_DEVICE_TYPE_CPU) != 0; });
 }
 
+// Null, and the reason in `error`, if there is nothing to share with.
+std::shared_ptr<SharingContext> makeSharing(ContextProperties properties, bool canUseHostMemory,
+                                            cl_int* error)
+{
+    std::unique_ptr<GlContext> gl = createSharingContext(*properties.binding);
+    std::unique_ptr<GlWorker> worker = gl == nullptr ? nullptr : GlWorker::start(std::move(gl));
+    if (worker == nullptr) {
+        setError(error, CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR);
+        return nullptr;
+    }
+    return std::make_shared<SharingContext>(std::move(worker), std::move(properties),
+                                            canUseHostMemory);
+}
+
 // Makes a context on `devices`. `create` asks the runtime for it, with the properties it gets.
 template <typename Create>
 cl_context createSharing(const cl_context_properties* properties,
@@ -37,20 +51,23 @@ cl_context createSharing(const cl_context_properties* properties,
         setError(error, parsed.error);
         return nullptr;
     }
+    const std::vector<cl_context_properties> forRuntime = parsed.forRuntime;
     if (!parsed.binding)
-        return create(parsed.forRuntime.data(), error);
+        return create(forRuntime.data(), error);
 
-    std::unique_ptr<GlContext> gl = createSharingContext(*parsed.binding);
-    std::unique_ptr<GlWorker> worker = gl == nullptr ? nullptr : GlWorker::start(std::move(gl));
-    if (worker == nullptr) {
-        setError(error, CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR);
+    std::shared_ptr<SharingContext> sharing =
+        makeSharing(std::move(parsed), workInHostMemory(devices), error);
+    if (sharing == nullptr)
         return nullptr;
+    cl_context context = create(forRuntime.data(), error);
+    if (context == nullptr)
+        return nullptr;
+    try {
+        Registry::get().add(context, std::move(sharing));
+    } catch (...) {
+        runtime().clReleaseContext(context); // the one reference, which nobody has seen
+        throw;
     }
-    cl_context context = create(parsed.forRuntime.data(), error);
-    if (context != nullptr)
-        Registry::get().add(context,
-                            std::make_shared<SharingContext>(std::move(worker), std::move(parsed),
-                                                             workInHostMemory(devices)));
     return context;
 }
 
@@ -60,11 +77,15 @@ cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl
                                      const cl_device_id* devices, ContextNotify notify, void* user,
                                      cl_int* error)
 {
-    const std::span<const cl_device_id> list(devices, devices == nullptr ? 0 : count);
-    return createSharing(
-        properties, list, error, [&](const cl_context_properties* forRuntime, cl_int* result) {
-            return runtime().clCreateContext(forRuntime, count, devices, notify, user, result);
-        });
+    if (!isList(count, devices)) {
+        setError(error, CL_INVALID_VALUE);
+        return nullptr;
+    }
+    return createSharing(properties, {devices, count}, error,
+                         [&](const cl_context_properties* forRuntime, cl_int* result) {
+                             return runtime().clCreateContext(forRuntime, count, devices, notify,
+                                                              user, result);
+                         });
 }
 
 cl_context CL_API_CALL createContextFromType(const cl_context_properties* properties,
@@ -72,15 +93,15 @@ cl_context CL_API_CALL createContextFromType(const cl_context_properties* proper
                                              cl_int* error)
 {
     const auto asked = typeToAskFor(type);
-    if (!asked) {
-        setError(error, CL_DEVICE_NOT_FOUND);
-        return nullptr;
-    }
-    const ContextProperties parsed = parseProperties(properties);
-    const std::vector<cl_device_id> devices = devicesOf(platformOrFirst(parsed.platform), type);
+    const cl_platform_id platform = platformOrFirst(parseProperties(properties).platform);
     return createSharing(
-        properties, devices, error, [&](const cl_context_properties* forRuntime, cl_int* result) {
-            return runtime().clCreateContextFromType(forRuntime, *asked, notify, user, result);
+        properties, devicesOf(platform, type), error,
+        [&](const cl_context_properties* forRuntime, cl_int* result) -> cl_context {
+            if (asked)
+                return runtime().clCreateContextFromType(forRuntime, *asked, notify, user, result);
+            const bool isUserLost = notify == nullptr && user != nullptr;
+            setError(result, isUserLost ? CL_INVALID_VALUE : CL_DEVICE_NOT_FOUND);
+            return nullptr;
         });
 }
 
@@ -110,6 +131,22 @@ cl_int CL_API_CALL getContextInfo(cl_context context, cl_context_info name, std:
     return runtime().clGetContextInfo(context, name, size, value, sizeNeeded);
 }
 
+namespace {
+
+// The error of a context with these properties, found by making one. The extension has a code of
+// its own here for an attribute that only the runtime can know to be none.
+cl_int tryContext(const cl_context_properties* properties, const ContextProperties& parsed,
+                  cl_device_id device)
+{
+    cl_int error = CL_SUCCESS;
+    cl_context context = createContext(properties, 1, &device, nullptr, nullptr, &error);
+    if (context != nullptr)
+        return releaseContext(context);
+    return error == CL_INVALID_PROPERTY && parsed.error == CL_SUCCESS ? CL_INVALID_VALUE : error;
+}
+
+} // namespace
+
 cl_int CL_API_CALL getGlContextInfo(const cl_context_properties* properties,
                                     cl_gl_context_info name, std::size_t size, void* value,
                                     std::size_t* sizeNeeded)
@@ -121,10 +158,10 @@ cl_int CL_API_CALL getGlContextInfo(const cl_context_properties* properties,
         return CL_INVALID_PLATFORM;
     if (shareByThemselves(devices))
         return runtime().clGetGLContextInfoKHR(properties, name, size, value, sizeNeeded);
-    if (parsed.error != CL_SUCCESS)
-        return parsed.error;
-    if (!parsed.binding)
+    if (parsed.error == CL_SUCCESS && !parsed.binding)
         return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
+    if (const cl_int error = tryContext(properties, parsed, devices.front()); error != CL_SUCCESS)
+        return error;
     switch (name) {
     case CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR:
         return answerWith(devices.front(), {size, value, sizeNeeded});

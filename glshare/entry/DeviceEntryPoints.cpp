@@ -76,9 +76,15 @@ cl_int CL_API_CALL getDeviceIds(cl_platform_id platform, cl_device_type type, cl
 {
     if (const auto asked = typeToAskFor(type))
         return runtime().clGetDeviceIDs(platform, *asked, capacity, devices, count);
-    if (count != nullptr)
+    // No device can match, which counts only if the runtime accepts the other arguments.
+    cl_device_id unusedDevice = nullptr;
+    cl_uint unusedCount = 0;
+    const cl_int error = runtime().clGetDeviceIDs(
+        platform, CL_DEVICE_TYPE_ALL, std::min(capacity, cl_uint{1}),
+        devices == nullptr ? nullptr : &unusedDevice, count == nullptr ? nullptr : &unusedCount);
+    if (error == CL_SUCCESS && count != nullptr)
         *count = 0;
-    return CL_DEVICE_NOT_FOUND;
+    return error == CL_SUCCESS ? CL_DEVICE_NOT_FOUND : error;
 }
 
 cl_int CL_API_CALL getDeviceInfo(cl_device_id device, cl_device_info name, std::size_t size,

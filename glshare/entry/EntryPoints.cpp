@@ -2,6 +2,7 @@
 
 #include "core/Counters.h"
 #include "core/Switches.h"
+#include "entry/EntryPoint.h"
 #include "glshare.h"
 
 #include <array>
@@ -11,32 +12,34 @@ namespace glshare {
 
 void installEntryPoints(cl_icd_dispatch& table)
 {
-    table.clGetPlatformInfo = entry::getPlatformInfo;
-    table.clGetDeviceIDs = entry::getDeviceIds;
-    table.clGetDeviceInfo = entry::getDeviceInfo;
-    table.clCreateContext = entry::createContext;
-    table.clCreateContextFromType = entry::createContextFromType;
-    table.clRetainContext = entry::retainContext;
-    table.clReleaseContext = entry::releaseContext;
-    table.clGetContextInfo = entry::getContextInfo;
-    table.clGetGLContextInfoKHR = entry::getGlContextInfo;
-    table.clCreateFromGLBuffer = entry::createFromGlBuffer;
-    table.clCreateFromGLTexture = entry::createFromGlTexture;
-    table.clCreateFromGLTexture2D = entry::createFromGlTexture2D;
-    table.clCreateFromGLTexture3D = entry::createFromGlTexture3D;
-    table.clCreateFromGLRenderbuffer = entry::createFromGlRenderbuffer;
-    table.clGetGLObjectInfo = entry::getGlObjectInfo;
-    table.clGetGLTextureInfo = entry::getGlTextureInfo;
-    table.clGetMemObjectInfo = entry::getMemObjectInfo;
-    table.clEnqueueAcquireGLObjects = entry::enqueueAcquireGlObjects;
-    table.clEnqueueReleaseGLObjects = entry::enqueueReleaseGlObjects;
-    table.clCreateEventFromGLsyncKHR = entry::createEventFromGlSync;
-    table.clGetEventInfo = entry::getEventInfo;
-    table.clRetainEvent = entry::retainEvent;
-    table.clReleaseEvent = entry::releaseEvent;
-    table.clSetUserEventStatus = entry::setUserEventStatus;
-    table.clGetExtensionFunctionAddress = entry::getExtensionFunctionAddress;
-    table.clGetExtensionFunctionAddressForPlatform = entry::getExtensionFunctionAddressForPlatform;
+    table.clGetPlatformInfo = entryPointOfDescription<entry::getPlatformInfo>;
+    table.clGetDeviceIDs = entryPointOfDescription<entry::getDeviceIds>;
+    table.clGetDeviceInfo = entryPointOfDescription<entry::getDeviceInfo>;
+    table.clCreateContext = entryPoint<entry::createContext>;
+    table.clCreateContextFromType = entryPoint<entry::createContextFromType>;
+    table.clRetainContext = entryPoint<entry::retainContext>;
+    table.clReleaseContext = entryPoint<entry::releaseContext>;
+    table.clGetContextInfo = entryPoint<entry::getContextInfo>;
+    table.clGetGLContextInfoKHR = entryPoint<entry::getGlContextInfo>;
+    table.clCreateFromGLBuffer = entryPoint<entry::createFromGlBuffer>;
+    table.clCreateFromGLTexture = entryPoint<entry::createFromGlTexture>;
+    table.clCreateFromGLTexture2D = entryPoint<entry::createFromGlTexture2D>;
+    table.clCreateFromGLTexture3D = entryPoint<entry::createFromGlTexture3D>;
+    table.clCreateFromGLRenderbuffer = entryPoint<entry::createFromGlRenderbuffer>;
+    table.clGetGLObjectInfo = entryPoint<entry::getGlObjectInfo>;
+    table.clGetGLTextureInfo = entryPoint<entry::getGlTextureInfo>;
+    table.clGetMemObjectInfo = entryPoint<entry::getMemObjectInfo>;
+    table.clEnqueueAcquireGLObjects = entryPoint<entry::enqueueAcquireGlObjects>;
+    table.clEnqueueReleaseGLObjects = entryPoint<entry::enqueueReleaseGlObjects>;
+    table.clCreateEventFromGLsyncKHR = entryPoint<entry::createEventFromGlSync>;
+    table.clGetEventInfo = entryPoint<entry::getEventInfo>;
+    table.clRetainEvent = entryPoint<entry::retainEvent>;
+    table.clReleaseEvent = entryPoint<entry::releaseEvent>;
+    table.clSetUserEventStatus = entryPoint<entry::setUserEventStatus>;
+    table.clGetExtensionFunctionAddress =
+        entryPointOfDescription<entry::getExtensionFunctionAddress>;
+    table.clGetExtensionFunctionAddressForPlatform =
+        entryPointOfDescription<entry::getExtensionFunctionAddressForPlatform>;
 }
 
 namespace {
@@ -57,17 +60,17 @@ NamedFunction named(std::string_view name, Function* function)
 void* findFunction(std::string_view name)
 {
     static const std::array theFunctions{
-        named("clGetGLContextInfoKHR", entry::getGlContextInfo),
-        named("clCreateFromGLBuffer", entry::createFromGlBuffer),
-        named("clCreateFromGLTexture", entry::createFromGlTexture),
-        named("clCreateFromGLTexture2D", entry::createFromGlTexture2D),
-        named("clCreateFromGLTexture3D", entry::createFromGlTexture3D),
-        named("clCreateFromGLRenderbuffer", entry::createFromGlRenderbuffer),
-        named("clGetGLObjectInfo", entry::getGlObjectInfo),
-        named("clGetGLTextureInfo", entry::getGlTextureInfo),
-        named("clEnqueueAcquireGLObjects", entry::enqueueAcquireGlObjects),
-        named("clEnqueueReleaseGLObjects", entry::enqueueReleaseGlObjects),
-        named(kCreateEventFromGlSync, entry::createEventFromGlSync),
+        named("clGetGLContextInfoKHR", entryPoint<entry::getGlContextInfo>),
+        named("clCreateFromGLBuffer", entryPoint<entry::createFromGlBuffer>),
+        named("clCreateFromGLTexture", entryPoint<entry::createFromGlTexture>),
+        named("clCreateFromGLTexture2D", entryPoint<entry::createFromGlTexture2D>),
+        named("clCreateFromGLTexture3D", entryPoint<entry::createFromGlTexture3D>),
+        named("clCreateFromGLRenderbuffer", entryPoint<entry::createFromGlRenderbuffer>),
+        named("clGetGLObjectInfo", entryPoint<entry::getGlObjectInfo>),
+        named("clGetGLTextureInfo", entryPoint<entry::getGlTextureInfo>),
+        named("clEnqueueAcquireGLObjects", entryPoint<entry::enqueueAcquireGlObjects>),
+        named("clEnqueueReleaseGLObjects", entryPoint<entry::enqueueReleaseGlObjects>),
+        named(kCreateEventFromGlSync, entryPoint<entry::createEventFromGlSync>),
         named(GLSHARE_GET_COUNTERS_NAME, getCounters),
     };
     for (const NamedFunction& function : theFunctions) {

@@ -5,21 +5,63 @@
 #include "core/Registry.h"
 #include "entry/EntryPoints.h"
 
+#include <GL/gl.h>
+#include <GL/glext.h>
+
+#include <memory>
+
 namespace glshare::entry {
 
 namespace {
 
-// Textures and renderbuffers are not offered: to this program none of them is an object to share.
-template <typename PassDown>
-cl_mem refuse(cl_context context, cl_int* error, PassDown passDown)
+constexpr bool isCubeFace(cl_GLenum target)
 {
-    if (Registry::get().find(context) != nullptr) {
-        setError(error, CL_INVALID_GL_OBJECT);
-        return nullptr;
-    }
-    if (runtimeShares(context))
+    return target >= GL_TEXTURE_CUBE_MAP_POSITIVE_X && target <= GL_TEXTURE_CUBE_MAP_NEGATIVE_Z;
+}
+
+constexpr bool is2D(cl_GLenum target)
+{
+    return target == GL_TEXTURE_2D || target == GL_TEXTURE_RECTANGLE || isCubeFace(target);
+}
+
+constexpr bool is3D(cl_GLenum target)
+{
+    return target == GL_TEXTURE_3D;
+}
+
+constexpr bool isAnyDimension(cl_GLenum target)
+{
+    return target == GL_TEXTURE_1D || target == GL_TEXTURE_1D_ARRAY ||
+           target == GL_TEXTURE_BUFFER || is2D(target) || target == GL_TEXTURE_2D_ARRAY ||
+           is3D(target);
+}
+
+// The arguments of the functions that make images.
+struct ImageRequest {
+    cl_context context;
+    cl_mem_flags flags;
+    bool isTarget = true;
+    cl_GLint level = 0;
+};
+
+// Textures and renderbuffers are not offered, so that no name is that of an object to share. The
+// other arguments are checked first.
+cl_int errorOf(const ImageRequest& request)
+{
+    if (Registry::get().find(request.context) == nullptr)
+        return CL_INVALID_CONTEXT;
+    if (!areSharingFlags(request.flags) || !request.isTarget)
+        return CL_INVALID_VALUE;
+    return request.level < 0 ? CL_INVALID_MIP_LEVEL : CL_INVALID_GL_OBJECT;
+}
+
+template <typename PassDown>
+cl_mem refuse(const ImageRequest& request, cl_int* error, PassDown passDown)
+{
+    const cl_int reason = errorOf(request);
+    if (reason == CL_INVALID_CONTEXT && runtimeShares(request.context))
         return passDown();
-    setError(error, CL_INVALID_CONTEXT);
+    setError(error, reason);
     return nullptr;
 }
 
@@ -56,7 +98,7 @@ cl_mem CL_API_CALL createFromGlBuffer(cl_context context, cl_mem_flags flags, cl
 cl_mem CL_API_CALL createFromGlTexture(cl_context context, cl_mem_flags flags, cl_GLenum target,
                                        cl_GLint level, cl_GLuint texture, cl_int* error)
 {
-    return refuse(context, error, [&] {
+    return refuse({context, flags, isAnyDimension(target), level}, error, [&] {
         return runtime().clCreateFromGLTexture(context, flags, target, level, texture, error);
     });
 }
@@ -64,7 +106,7 @@ cl_mem CL_API_CALL createFromGlTexture(cl_context context, cl_mem_flags flags, c
 cl_mem CL_API_CALL createFromGlTexture2D(cl_context context, cl_mem_flags flags, cl_GLenum target,
                                          cl_GLint level, cl_GLuint texture, cl_int* error)
 {
-    return refuse(context, error, [&] {
+    return refuse({context, flags, is2D(target), level}, error, [&] {
         return runtime().clCreateFromGLTexture2D(context, flags, target, level, texture, error);
     });
 }
@@ -72,7 +114,7 @@ cl_mem CL_API_CALL createFromGlTexture2D(cl_context context, cl_mem_flags flags,
 cl_mem CL_API_CALL createFromGlTexture3D(cl_context context, cl_mem_flags flags, cl_GLenum target,
                                          cl_GLint level, cl_GLuint texture, cl_int* error)
 {
-    return refuse(context, error, [&] {
+    return refuse({context, flags, is3D(target), level}, error, [&] {
         return runtime().clCreateFromGLTexture3D(context, flags, target, level, texture, error);
     });
 }
@@ -80,7 +122,7 @@ cl_mem CL_API_CALL createFromGlTexture3D(cl_context context, cl_mem_flags flags,
 cl_mem CL_API_CALL createFromGlRenderbuffer(cl_context context, cl_mem_flags flags,
                                             cl_GLuint renderbuffer, cl_int* error)
 {
-    return refuse(context, error, [&] {
+    return refuse({context, flags}, error, [&] {
         return runtime().clCreateFromGLRenderbuffer(context, flags, renderbuffer, error);
     });
 }
@@ -107,14 +149,41 @@ cl_int CL_API_CALL getGlTextureInfo(cl_mem memory, cl_gl_texture_info name, std:
     });
 }
 
-// How the memory is provided is nobody's business: the application sees the flags it gave.
+namespace {
+
+// The shared buffer that a memory object is, or was made from as a part or an image; null if it has
+// nothing to do with one.
+std::shared_ptr<SharedBuffer> findWhole(cl_mem memory)
+{
+    std::shared_ptr<SharedBuffer> buffer;
+    while (memory != nullptr && (buffer = Registry::get().find(memory)) == nullptr) {
+        cl_mem whole = nullptr;
+        runtime().clGetMemObjectInfo(memory, CL_MEM_ASSOCIATED_MEMOBJECT, sizeof(cl_mem),
+                                     static_cast<void*>(&whole), nullptr);
+        memory = whole;
+    }
+    return buffer;
+}
+
+// What the application gave, which says nothing about where a shared buffer has its memory.
+cl_mem_flags shownFlags(cl_mem memory, const SharedBuffer& whole)
+{
+    if (memory == whole.memory)
+        return whole.flags;
+    cl_mem_flags flags = 0;
+    runtime().clGetMemObjectInfo(memory, CL_MEM_FLAGS, sizeof flags, &flags, nullptr);
+    return flags & ~cl_mem_flags{CL_MEM_USE_HOST_PTR | CL_MEM_ALLOC_HOST_PTR};
+}
+
+} // namespace
+
 cl_int CL_API_CALL getMemObjectInfo(cl_mem memory, cl_mem_info name, std::size_t size, void* value,
                                     std::size_t* sizeNeeded)
 {
     if (name == CL_MEM_FLAGS || name == CL_MEM_HOST_PTR) {
-        if (const auto buffer = Registry::get().find(memory)) {
+        if (const auto whole = findWhole(memory)) {
             const Query query{size, value, sizeNeeded};
-            return name == CL_MEM_FLAGS ? answerWith(buffer->flags, query)
+            return name == CL_MEM_FLAGS ? answerWith(shownFlags(memory, *whole), query)
                                         : answerWith<void*>(nullptr, query);
         }
     }

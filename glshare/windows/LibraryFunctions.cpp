@@ -16,4 +16,9 @@ void* LibraryFunctions::address(const char* name) const
 
 void callAtExit(void (* /*call*/)()) {}
 
+bool callInForkedChild(void (* /*call*/)())
+{
+    return true;
+}
+
 } // namespace glshare

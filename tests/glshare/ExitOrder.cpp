@@ -5,6 +5,10 @@
 #include <chrono>
 #include <cstdlib>
 #include <thread>
+#include <utility>
+
+#include <sys/wait.h>
+#include <unistd.h>
 
 namespace {
 
@@ -99,10 +103,9 @@ TEST_F(ExitOrder, PendingCommands)
     clFlush(theRest().queue);
 }
 
-// The process ends while another thread is in the middle of its work.
-TEST_F(ExitOrder, BusyThread)
+// Acquires and releases without end, on a thread without an OpenGL context.
+void keepBusy()
 {
-    EglTestContext::releaseCurrent();
     std::thread([] {
         for (;;) {
             theRest().queue.acquire(theRest().memory);
@@ -110,7 +113,57 @@ TEST_F(ExitOrder, BusyThread)
             clFinish(theRest().queue);
         }
     }).detach();
+}
+
+// The process ends while another thread is in the middle of its work.
+TEST_F(ExitOrder, BusyThread)
+{
+    EglTestContext::releaseCurrent();
+    keepBusy();
     std::this_thread::sleep_for(std::chrono::milliseconds(50));
+}
+
+// Each function that needs what a forked child lacks reports that, and does not wait for it.
+void useInChild(cl_device_id device, const Properties& list)
+{
+    const Everything& parent = theRest();
+    cl_mem memory = parent.memory;
+    cl_event event = nullptr;
+    cl_mem_flags flags = 0;
+    cl_int error = CL_SUCCESS;
+    EXPECT_EQ(parent.queue.acquire(memory), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(parent.queue.release(memory), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clGetMemObjectInfo(memory, CL_MEM_FLAGS, sizeof flags, &flags, nullptr),
+              CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clCreateFromGLBuffer(parent.context, CL_MEM_READ_WRITE, 1, &error), nullptr);
+    EXPECT_EQ(std::exchange(error, CL_SUCCESS), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clCreateContext(list.data(), 1, &device, nullptr, nullptr, &error), nullptr);
+    EXPECT_EQ(std::exchange(error, CL_SUCCESS), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clRetainEvent(event), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clRetainContext(parent.context), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clReleaseContext(parent.context), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(clGetDeviceInfo(device, CL_DEVICE_TYPE, sizeof flags, &flags, nullptr), CL_SUCCESS);
+}
+
+// Children that are forked in the middle of other threads' work.
+TEST_F(ExitOrder, ForkedChildren)
+{
+    constexpr int kChildren = 50;
+    constexpr unsigned kPatience = 10; // seconds, after which the system ends a child
+    EglTestContext::releaseCurrent();
+    keepBusy();
+    for (int i = 0; i < kChildren; ++i) {
+        const pid_t child = fork();
+        if (child == 0) {
+            alarm(kPatience);
+            if (i % 2 != 0)
+                useInChild(device_, properties());
+            std::exit(HasFailure() ? 1 : 0);
+        }
+        int status = 0;
+        ASSERT_EQ(waitpid(child, &status, 0), child);
+        ASSERT_EQ(status, 0) << "child " << i;
+    }
 }
 
 TEST_F(ExitOrder, ExitOnOtherThread)

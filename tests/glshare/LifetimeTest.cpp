@@ -3,16 +3,9 @@
 
 #include <unistd.h>
 
-#include <filesystem>
 #include <fstream>
-#include <iterator>
 
 namespace {
-
-std::ptrdiff_t threadsOfProcess()
-{
-    return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {});
-}
 
 class LifetimeTest : public SharingTest {
 protected:

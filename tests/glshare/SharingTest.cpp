@@ -1,6 +1,8 @@
 #include "SharingTest.h"
 
 #include <cstdlib>
+#include <filesystem>
+#include <iterator>
 #include <numeric>
 #include <string_view>
 #include <thread>
@@ -15,6 +17,11 @@ Numbers numbersFrom(cl_int first, std::size_t count)
 cl_int statusOf(const Event& event)
 {
     return infoOf<cl_int>(clGetEventInfo, event, CL_EVENT_COMMAND_EXECUTION_STATUS);
+}
+
+std::ptrdiff_t threadsOfProcess()
+{
+    return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {});
 }
 
 void onOtherThread(const std::function<void()>& work)

@@ -101,6 +101,8 @@ Value infoOf(Get get, const Handle& handle, cl_uint name)
 
 cl_int statusOf(const Event& event);
 
+std::ptrdiff_t threadsOfProcess();
+
 // Runs on a thread of its own, which has no OpenGL context, and waits for it.
 void onOtherThread(const std::function<void()>& work);
 

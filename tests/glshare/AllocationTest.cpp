@@ -1,0 +1,299 @@
+// The layer without memory or threads: each call reports it, changes nothing and works afterwards.
+//
+// This file replaces the program's operator new, which the layer's allocations resolve to as well.
+// Those of OpenCL and OpenGL themselves are left alone.
+// Before the headers of the tests, as it includes those of the newest OpenCL.
+#include "core/OpenCl.h"
+
+#include "SharingTest.h"
+
+#include <algorithm>
+#include <array>
+#include <atomic>
+#include <chrono>
+#include <cstdlib>
+#include <functional>
+#include <new>
+#include <span>
+#include <string_view>
+#include <thread>
+
+#include <dlfcn.h>
+#include <execinfo.h>
+#include <pthread.h>
+
+namespace {
+
+// Allocations of the layer until one fails, on any thread; 0 or less: none fails.
+std::atomic<int> allocationsLeft{0};
+
+// Whether the innermost caller outside of this program and of the standard library is the layer.
+bool isCalledByLayer()
+{
+    std::array<void*, 24> frames{};
+    const auto count = static_cast<std::size_t>(backtrace(frames.data(), frames.size()));
+    Dl_info own{};
+    Dl_info caller{};
+    for (const void* frame : std::span(frames).first(count)) {
+        if (dladdr(frame, &caller) == 0)
+            return false;
+        own = own.dli_fbase == nullptr ? caller : own;
+        const std::string_view file = caller.dli_fname;
+        if (caller.dli_fbase != own.dli_fbase && file.find("libstdc++") == std::string_view::npos)
+            return file.find("libglshare") != std::string_view::npos;
+    }
+    return false;
+}
+
+bool nextFails()
+{
+    return allocationsLeft > 0 && isCalledByLayer() && --allocationsLeft == 0;
+}
+
+} // namespace
+
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept
+{
+    return nextFails() ? nullptr : std::malloc(size ? size : 1);
+}
+void* operator new(std::size_t size)
+{
+    void* memory = operator new(size, std::nothrow);
+    if (memory == nullptr)
+        throw std::bad_alloc();
+    return memory;
+}
+// A sanitizer's own would not come by.
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
+{
+    return operator new(size, std::nothrow);
+}
+void* operator new[](std::size_t size)
+{
+    return operator new(size);
+}
+// Not inlined, or a compiler sees free where it expects the counterpart of new.
+[[gnu::noinline]] void operator delete(void* memory) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete[](void* memory) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete[](void* memory, std::size_t) noexcept
+{
+    std::free(memory);
+}
+
+namespace {
+
+// Far longer than other threads take to give back what a call has used.
+constexpr std::chrono::milliseconds kSettled{20};
+
+// References to a context, a queue and a memory object, and the threads of the process.
+using InUse = std::array<std::ptrdiff_t, 4>;
+
+class AllocationTest : public SharingTest {
+protected:
+    // Makes one call while memory is short, waits for what it has started, checks and undoes it.
+    // Returns its status.
+    using Call = std::function<cl_int()>;
+
+    void TearDown() override { endShortage(); }
+
+    // Around the call itself.
+    void beginShortage() const { allocationsLeft = failing_; }
+    cl_int endShortage(cl_int status = CL_SUCCESS)
+    {
+        hasFailed_ = failing_ > 0 && allocationsLeft <= 0;
+        allocationsLeft = 0;
+        return status;
+    }
+
+    [[nodiscard]] InUse inUse() const
+    {
+        return {infoOf<cl_uint>(clGetContextInfo, context_, CL_CONTEXT_REFERENCE_COUNT),
+                infoOf<cl_uint>(clGetCommandQueueInfo, queue_, CL_QUEUE_REFERENCE_COUNT),
+                infoOf<cl_uint>(clGetMemObjectInfo, memory_, CL_MEM_REFERENCE_COUNT),
+                threadsOfProcess()};
+    }
+
+    // Other threads may still have to give back what they use.
+    void expectNothingLost(const InUse& before) const
+    {
+        const auto isMore = [&] { return !std::ranges::equal(inUse(), before, std::less_equal()); };
+        for (int i = 0; i < 10000 && isMore(); ++i)
+            std::this_thread::sleep_for(std::chrono::microseconds(500));
+        EXPECT_FALSE(isMore()) << testing::PrintToString(inUse());
+    }
+
+    // Fails each allocation of a call in turn, and makes the call with all memory after that.
+    // A call that `maySucceed` has callbacks, whose failures it does not see.
+    void failEachAllocation(const char* name, const Call& call, cl_int expected = CL_SUCCESS,
+                            bool maySucceed = false)
+    {
+        SCOPED_TRACE(name);
+        EXPECT_EQ(call(), expected);
+        std::this_thread::sleep_for(kSettled);
+        const InUse before = inUse();
+        int failures = 0;
+        for (failing_ = 1;; failing_ = ++failures + 1) {
+            const cl_int status = call();
+            const bool hasFailed = hasFailed_;
+            if (!maySucceed || status != expected) {
+                EXPECT_EQ(status, hasFailed ? CL_OUT_OF_HOST_MEMORY : expected) << failing_;
+            }
+            expectNothingLost(before);
+            if (!hasFailed)
+                break;
+            failing_ = 0;
+            EXPECT_EQ(call(), expected);
+        }
+        EXPECT_GT(failures, 0) << "nothing was allocated";
+        failing_ = 0;
+    }
+
+    // A query whose answer is a Value at most.
+    template <typename Value, typename Get, typename Handle>
+    Call query(Get get, Handle handle, cl_uint name)
+    {
+        return [=, this] {
+            Value value{};
+            beginShortage();
+            return endShortage(
+                get(handle, name, sizeof value, static_cast<void*>(&value), nullptr));
+        };
+    }
+
+    // A call that makes an object and fills in an error.
+    template <typename Object, typename Make>
+    Call creation(Make make)
+    {
+        return [=, this] {
+            cl_int error = CL_INVALID_VALUE;
+            beginShortage();
+            const Object object = make(&error);
+            endShortage();
+            EXPECT_EQ(object != nullptr, error == CL_SUCCESS);
+            return error;
+        };
+    }
+
+    int failing_ = 0; // the allocation that fails, from 1 on; 0: none
+    bool hasFailed_ = false;
+};
+
+TEST_F(AllocationTest, QueriesReportThatMemoryIsShort)
+{
+    using Text = std::array<char, 16384>;
+    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
+    const Properties list = properties();
+    for (const cl_uint name :
+         {cl_uint{CL_DEVICE_EXTENSIONS}, cl_uint{CL_DEVICE_EXTENSIONS_WITH_VERSION}})
+        failEachAllocation("device", query<Text>(clGetDeviceInfo, device_, name));
+    for (const cl_uint name :
+         {cl_uint{CL_PLATFORM_EXTENSIONS}, cl_uint{CL_PLATFORM_EXTENSIONS_WITH_VERSION}})
+        failEachAllocation("platform", query<Text>(clGetPlatformInfo, platform_, name));
+    failEachAllocation("OpenGL context", query<cl_device_id>(clGetGLContextInfoKHR, list.data(),
+                                                             CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR));
+    failEachAllocation("texture",
+                       query<cl_int>(clGetGLTextureInfo, cl_mem(plain), CL_GL_TEXTURE_TARGET),
+                       CL_INVALID_GL_OBJECT);
+}
+
+TEST_F(AllocationTest, CreationsReportThatMemoryIsShort)
+{
+    const Context plain = makeContext({0});
+    const Properties list = properties();
+    failEachAllocation("context", creation<Context>([&](cl_int* error) {
+                           return clCreateContext(list.data(), 1, &device_, nullptr, nullptr,
+                                                  error);
+                       }));
+    failEachAllocation("context from type", creation<Context>([&](cl_int* error) {
+                           return clCreateContextFromType(list.data(), CL_DEVICE_TYPE_ALL, nullptr,
+                                                          nullptr, error);
+                       }));
+    failEachAllocation("buffer", creation<Memory>([&](cl_int* error) {
+                           return clCreateFromGLBuffer(context_, CL_MEM_READ_WRITE, buffer_, error);
+                       }));
+    failEachAllocation("renderbuffer", creation<Memory>([&](cl_int* error) {
+                           return clCreateFromGLRenderbuffer(plain, CL_MEM_READ_WRITE, 1, error);
+                       }),
+                       CL_INVALID_CONTEXT);
+}
+
+// An acquire or a release of two buffers. One that has failed can be repeated.
+TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
+{
+    const Memory second = share(makeGlBuffer(from(1)));
+    const std::array<cl_mem, 2> both{memory_, second};
+    cl_int value = 1;
+    const auto enqueue = [&](bool isRelease, cl_event* event) {
+        const auto call = isRelease ? clEnqueueReleaseGLObjects : clEnqueueAcquireGLObjects;
+        const cl_int error = call(queue_, 2, both.data(), 0, nullptr, event);
+        return error != CL_SUCCESS || event == nullptr ? error : clWaitForEvents(1, event);
+    };
+    for (const bool isRelease : {false, true}) {
+        const auto call = [&] {
+            if (isRelease) {
+                EXPECT_EQ(enqueue(false, nullptr), CL_SUCCESS);
+            }
+            Event event;
+            beginShortage();
+            const cl_int error = endShortage(enqueue(isRelease, event.place()));
+            EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
+            if (isRelease != (error == CL_SUCCESS)) // acquired
+            {
+                EXPECT_EQ(queue_.read(memory_, count_), from(value));
+                queue_.write(memory_, from(++value));
+                EXPECT_EQ(enqueue(true, nullptr), CL_SUCCESS);
+            }
+            clFinish(queue_);
+            EXPECT_EQ(readGl(buffer_, count_), from(value));
+            return error;
+        };
+        failEachAllocation(isRelease ? "release" : "acquire", call, CL_SUCCESS, true);
+    }
+}
+
+TEST_F(AllocationTest, EventsOfSyncObjectsReportThatMemoryIsShort)
+{
+    const auto create = reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
+        clGetExtensionFunctionAddressForPlatform(platform_, "clCreateEventFromGLsyncKHR"));
+    if (create == nullptr)
+        GTEST_SKIP() << "switched off";
+    failEachAllocation("event", [&] {
+        GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
+        cl_int error = CL_INVALID_VALUE;
+        beginShortage();
+        Event event = create(context_, reinterpret_cast<cl_GLsync>(sync), &error);
+        endShortage(error == CL_SUCCESS ? clWaitForEvents(1, event.place()) : error);
+        glDeleteSync(sync);
+        EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
+        return error;
+    });
+}
+
+// No stack of that size fits into the address space.
+TEST_F(AllocationTest, ThreadsThatCannotBeCreatedAreReported)
+{
+    const Properties list = properties();
+    pthread_attr_t usual;
+    pthread_attr_t impossible;
+    ASSERT_EQ(pthread_getattr_default_np(&usual), 0);
+    ASSERT_EQ(pthread_getattr_default_np(&impossible), 0);
+    ASSERT_EQ(pthread_attr_setstacksize(&impossible, std::size_t{1} << 48), 0);
+    ASSERT_EQ(pthread_setattr_default_np(&impossible), 0);
+    cl_int error = CL_SUCCESS;
+    EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
+    EXPECT_EQ(error, CL_OUT_OF_HOST_MEMORY);
+    pthread_setattr_default_np(&usual);
+    share(makeContext(), buffer_);
+}
+
+} // namespace
