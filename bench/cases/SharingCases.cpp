@@ -68,7 +68,7 @@ private:
         const std::uint64_t copiedBefore = countersOfLayer().bytes_copied;
         acquireAndRelease();
         if (countersOfLayer().bytes_copied != copiedBefore)
-            throw std::runtime_error("sharing copied bytes; it is to use the renderer's storage");
+            throw std::runtime_error("sharing copied bytes; set GLSHARE_ZERO_COPY=1");
     }
 
     GLBuffers fBuffers; // outlives the memory objects made from it

@@ -10,15 +10,15 @@ namespace glshare {
 
 namespace {
 
-// Fills in the size and, if it can be used in place, the storage. False if there is no such buffer,
-// or one without storage.
-bool describe(SharedBuffer& buffer, const GlDevice& device, bool inPlace)
+// Fills in the size and, if it is to be used in place and can be, the storage. False if there is no
+// such buffer, or one without storage.
+bool describe(SharedBuffer& buffer, GlDevice& device, bool inPlace)
 {
     buffer.size = device.bufferSize(buffer.name).value_or(0);
     if (buffer.size == 0)
         return false;
     if (inPlace)
-        buffer.storage = StorageHold(buffer.context, device, buffer.name, buffer.size);
+        buffer.storage = PinnedStorage(buffer.context, device, buffer.name, buffer.size);
     return true;
 }
 
@@ -29,12 +29,17 @@ void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
         Registry::get().remove(memory);
 }
 
-cl_mem createMemory(cl_context handle, const SharedBuffer& buffer, cl_int& error)
+// Over the OpenGL storage, over memory of our own where the devices work in it, or else wherever
+// the runtime puts it.
+cl_mem createMemory(cl_context handle, SharedBuffer& buffer, bool inHostMemory, cl_int& error)
 {
-    const cl_mem_flags where =
-        buffer.storage.address() != nullptr ? CL_MEM_USE_HOST_PTR : CL_MEM_ALLOC_HOST_PTR;
-    return runtime().clCreateBuffer(handle, buffer.flags | where, buffer.size,
-                                    buffer.storage.address(), &error);
+    void* address = buffer.storage.address();
+    if (address == nullptr && inHostMemory) {
+        buffer.ownMemory = allocateHostMemory(buffer.size);
+        address = buffer.ownMemory.get();
+    }
+    const cl_mem_flags where = address != nullptr ? CL_MEM_USE_HOST_PTR : CL_MEM_ALLOC_HOST_PTR;
+    return runtime().clCreateBuffer(handle, buffer.flags | where, buffer.size, address, &error);
 }
 
 } // namespace
@@ -58,7 +63,8 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
     buffer->name = name;
     buffer->flags = flags == 0 ? cl_mem_flags{CL_MEM_READ_WRITE} : flags;
 
-    const bool inPlace = switches().zeroCopy && context->canUseHostMemory();
+    const bool inHostMemory = context->canUseHostMemory() && isHostMemoryAllowed();
+    const bool inPlace = inHostMemory && switches().zeroCopy;
     bool isBuffer = false;
     context->worker().call([&](GlDevice* device) {
         isBuffer = device != nullptr && describe(*buffer, *device, inPlace);
@@ -68,7 +74,7 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
         return nullptr;
     }
 
-    buffer->memory = createMemory(handle, *buffer, error);
+    buffer->memory = createMemory(handle, *buffer, inHostMemory, error);
     if (buffer->memory == nullptr)
         return nullptr;
     cl_mem memory = buffer->memory;

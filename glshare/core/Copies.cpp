@@ -22,22 +22,36 @@ cl_int createUserEvent(cl_command_queue queue, EventList& events)
     });
 }
 
-cl_int mapAll(cl_command_queue queue, CopyBatch& batch, std::span<const cl_event> waitList)
+cl_int enqueueMarker(cl_command_queue queue, std::span<const cl_event> waitList, EventList& events)
 {
+    return events.add([&](cl_event* event) {
+        return runtime().clEnqueueMarkerWithWaitList(queue, static_cast<cl_uint>(waitList.size()),
+                                                     waitList.data(), event);
+    });
+}
+
+// Maps the memory objects that lie in memory of the runtime's. They wait for the one marker, since
+// some runtimes need time for each pair of a command and an event that it waits for.
+cl_int mapAll(cl_command_queue queue, CopyBatch& batch)
+{
+    CopyEvents& events = *batch.events;
     const cl_map_flags access =
         batch.direction == CopyDirection::FromGl ? CL_MAP_WRITE : CL_MAP_READ;
     for (CopyItem& item : batch.items) {
-        const cl_int error = batch.events->maps.add([&](cl_event* event) {
+        if (item.pointer != nullptr)
+            continue;
+        const cl_int error = events.maps.add([&](cl_event* event) {
             cl_int status = CL_SUCCESS;
-            item.pointer = runtime().clEnqueueMapBuffer(
-                queue, item.buffer->memory, CL_FALSE, access, 0, item.buffer->size,
-                static_cast<cl_uint>(waitList.size()), waitList.data(), event, &status);
+            item.pointer = runtime().clEnqueueMapBuffer(queue, item.buffer->memory, CL_FALSE,
+                                                        access, 0, item.buffer->size, 1,
+                                                        events.started.data(), event, &status);
+            item.isMapped = status == CL_SUCCESS;
             return status;
         });
         if (error != CL_SUCCESS)
             return error;
     }
-    return CL_SUCCESS;
+    return events.maps.empty() ? CL_SUCCESS : enqueueMarker(queue, events.maps, events.mapped);
 }
 
 // Unmaps what was mapped, all of it even if one cannot be.
@@ -45,7 +59,7 @@ cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
 {
     cl_int result = CL_SUCCESS;
     for (const CopyItem& item : batch.items) {
-        if (item.pointer == nullptr)
+        if (!item.isMapped)
             continue;
         const cl_int error = batch.events->unmaps.add([&](cl_event* event) {
             return runtime().clEnqueueUnmapMemObject(queue, item.buffer->memory, item.pointer, 1,
@@ -57,32 +71,27 @@ cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
     return result;
 }
 
-// The marker waits for the maps too, so that it fails if they do.
-cl_int enqueueDone(cl_command_queue queue, CopyEvents& events)
+// The last marker waits for what comes before the copies too, so that it fails if that does.
+cl_int enqueueDone(cl_command_queue queue, const CopyBatch& batch)
 {
-    std::vector<cl_event> all(events.unmaps.data(), events.unmaps.data() + events.unmaps.size());
-    all.push_back(events.mapped.back());
-    return events.done.add([&](cl_event* event) {
-        return runtime().clEnqueueMarkerWithWaitList(queue, static_cast<cl_uint>(all.size()),
-                                                     all.data(), event);
-    });
+    CopyEvents& events = *batch.events;
+    std::vector<cl_event> all(events.unmaps.begin(), events.unmaps.end());
+    all.push_back(events.copied.back());
+    all.push_back(batch.ready());
+    return enqueueMarker(queue, all, events.done);
 }
 
-// The commands after the maps. The copies are asked for at the end: until then the caller alone
+// The commands after the first. The copies are requested at the end: until then the caller alone
 // decides about the user event.
 cl_int enqueueRest(cl_command_queue queue, const std::shared_ptr<CopyBatch>& batch)
 {
-    CopyEvents& events = *batch->events;
-    cl_int error = events.mapped.add([&](cl_event* event) {
-        return runtime().clEnqueueMarkerWithWaitList(queue, events.maps.size(), events.maps.data(),
-                                                     event);
-    });
+    cl_int error = mapAll(queue, *batch);
     if (error == CL_SUCCESS)
         error = unmapAll(queue, *batch);
     if (error == CL_SUCCESS)
-        error = enqueueDone(queue, events);
+        error = enqueueDone(queue, *batch);
     if (error == CL_SUCCESS)
-        error = copyWhenMapped(batch);
+        error = copyWhenReady(batch);
     return error;
 }
 
@@ -99,7 +108,7 @@ cl_int enqueueCopies(cl_command_queue queue, std::vector<CopyItem> items, CopyDi
     if (error != CL_SUCCESS)
         return error;
     try {
-        error = mapAll(queue, *batch, waitList);
+        error = enqueueMarker(queue, waitList, batch->events->started);
         if (error == CL_SUCCESS)
             error = enqueueRest(queue, batch);
     } catch (const std::exception&) {

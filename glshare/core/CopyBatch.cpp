@@ -3,7 +3,6 @@
 #include "core/Counters.h"
 
 #include <cstdint>
-#include <cstring>
 #include <exception>
 #include <map>
 #include <mutex>
@@ -46,30 +45,22 @@ private:
     std::uintptr_t last_ = 0;
 };
 
-bool copy(const CopyItem& item, CopyDirection direction, GlDevice* device)
-{
-    const bool fromGl = direction == CopyDirection::FromGl;
-    const SharedBuffer& buffer = *item.buffer;
-    if (void* storage = item.storage.address(); storage != nullptr) {
-        std::memcpy(fromGl ? item.pointer : storage, fromGl ? storage : item.pointer, buffer.size);
-        return true;
-    }
-    if (device == nullptr)
-        return false;
-    return fromGl ? device->read(buffer.name, item.pointer, buffer.size)
-                  : device->write(buffer.name, item.pointer, buffer.size);
-}
-
 // A buffer that is gone by now keeps what it holds: the application broke the rules after the
 // command was given, and all that is left is to end well.
-void copyAll(const CopyBatch& batch, GlDevice* device)
+void copyAll(const CopyBatch& batch, GlDevice& device)
 {
     for (const CopyItem& item : batch.items) {
-        if (copy(item, batch.direction, device))
-            counters().bytesCopied += item.buffer->size;
+        const SharedBuffer& buffer = *item.buffer;
+        const bool isCopied = batch.direction == CopyDirection::FromGl
+                                  ? device.read(buffer.name, item.pointer, buffer.size)
+                                  : device.write(buffer.name, item.pointer, buffer.size);
+        if (isCopied)
+            counters().bytesCopied += buffer.size;
         else
             ++counters().failedCopies;
     }
+    if (batch.direction == CopyDirection::ToGl)
+        device.finish();
 }
 
 SharingContext& contextOf(const CopyBatch& batch)
@@ -77,21 +68,23 @@ SharingContext& contextOf(const CopyBatch& batch)
     return *batch.items.front().buffer->context;
 }
 
-// On the worker, once the maps have ended with `status`. Runtimes still touch the events of
+// On the worker, once the batch is ready with `status`. Runtimes still touch the events of
 // commands that failed after they show it, so that those are kept for longer.
 void settle(CopyBatch& batch, cl_int status, GlDevice* device)
 {
     if (std::exchange(batch.isSettled, true))
         return;
-    if (status == CL_COMPLETE)
-        copyAll(batch, device);
+    if (status == CL_COMPLETE && device != nullptr)
+        copyAll(batch, *device);
+    else if (status == CL_COMPLETE)
+        counters().failedCopies += batch.items.size();
     else
         contextOf(batch).keep(std::move(batch.keptIfFailed));
     runtime().clSetUserEventStatus(batch.events->copied.back(), CL_COMPLETE);
 }
 
 // Comes on a thread of the runtime's, which must not be kept, nor enter the runtime again.
-void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* number)
+void CL_CALLBACK onReady(cl_event /*event*/, cl_int status, void* number)
 {
     const std::shared_ptr<CopyBatch> batch =
         OutstandingBatches::get().take(reinterpret_cast<std::uintptr_t>(number));
@@ -106,13 +99,14 @@ void CL_CALLBACK onMapped(cl_event /*event*/, cl_int status, void* number)
     }
 }
 
-// Not every runtime calls back when a command fails, so that the worker has a look at times.
+// Runtimes call back late, or not at all when a command fails, so that the worker has a look at
+// times.
 bool hasEnded(CopyBatch& batch, GlDevice* device)
 {
     cl_int status = CL_QUEUED;
     if (!batch.isSettled)
-        runtime().clGetEventInfo(batch.events->mapped.back(), CL_EVENT_COMMAND_EXECUTION_STATUS,
-                                 sizeof status, &status, nullptr);
+        runtime().clGetEventInfo(batch.ready(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status,
+                                 &status, nullptr);
     if (status <= CL_COMPLETE)
         settle(batch, status, device);
     return batch.isSettled;
@@ -120,15 +114,14 @@ bool hasEnded(CopyBatch& batch, GlDevice* device)
 
 } // namespace
 
-cl_int copyWhenMapped(const std::shared_ptr<CopyBatch>& batch)
+cl_int copyWhenReady(const std::shared_ptr<CopyBatch>& batch)
 {
     // The watch is what keeps the batch.
     GlWorker::PreparedWatch watch;
     watch.emplace_back([batch](GlDevice* device) { return hasEnded(*batch, device); });
     const std::uintptr_t number = OutstandingBatches::get().add(batch);
     void* const user = reinterpret_cast<void*>(number); // NOLINT(performance-no-int-to-ptr)
-    const cl_int error =
-        runtime().clSetEventCallback(batch->events->mapped.back(), CL_COMPLETE, onMapped, user);
+    const cl_int error = runtime().clSetEventCallback(batch->ready(), CL_COMPLETE, onReady, user);
     if (error == CL_SUCCESS)
         contextOf(*batch).worker().watch(std::move(watch));
     return error;

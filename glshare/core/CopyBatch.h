@@ -14,9 +14,10 @@ enum class CopyDirection { FromGl, ToGl };
 
 // The events of the commands around the copies.
 struct CopyEvents {
+    EventList started; // a marker after the wait list
     EventList maps;
-    EventList mapped; // one marker, after all maps
-    EventList copied; // one user event, completed by the worker
+    EventList mapped; // a marker after all maps, if there are any
+    EventList copied; // a user event, completed by the worker
     EventList unmaps;
     EventList done; // the marker whose event the application gets
 };
@@ -24,10 +25,9 @@ struct CopyEvents {
 // One buffer to copy.
 struct CopyItem {
     std::shared_ptr<SharedBuffer> buffer;
-    // The buffer's storage at the time of the command, which the copy then needs no OpenGL for; if
-    // nothing is held, the copy goes by the buffer's name.
-    StorageHold storage;
-    void* pointer = nullptr; // where the memory object lies while it is mapped
+    // Where the memory object lies in the host's memory; null until it is mapped, if it has to be.
+    void* pointer = nullptr;
+    bool isMapped = false;
 };
 
 struct CopyBatch {
@@ -36,10 +36,16 @@ struct CopyBatch {
     std::shared_ptr<CopyEvents> events = std::make_shared<CopyEvents>();
     SharingContext::Kept keptIfFailed{events};
     bool isSettled = false; // `copied` has its status; touched by the worker alone
+
+    // The event after which each item has its pointer.
+    [[nodiscard]] cl_event ready() const
+    {
+        return events->mapped.empty() ? events->started.back() : events->mapped.back();
+    }
 };
 
-// Has the worker copy when `mapped` is complete, and complete `copied` then. If `mapped` fails,
+// Has the worker copy when the batch is ready, and complete `copied` then. If `ready` fails,
 // `copied` completes without copies. On failure nothing will be done, and `copied` is the caller's.
-[[nodiscard]] cl_int copyWhenMapped(const std::shared_ptr<CopyBatch>& batch);
+[[nodiscard]] cl_int copyWhenReady(const std::shared_ptr<CopyBatch>& batch);
 
 } // namespace glshare

@@ -39,6 +39,8 @@ public:
     [[nodiscard]] bool empty() const { return events_.empty(); }
     [[nodiscard]] cl_uint size() const { return static_cast<cl_uint>(events_.size()); }
     [[nodiscard]] const cl_event* data() const { return events_.data(); }
+    [[nodiscard]] auto begin() const { return events_.begin(); }
+    [[nodiscard]] auto end() const { return events_.end(); }
     [[nodiscard]] cl_event back() const { return events_.back(); }
 
 private:

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstring>
+#include <mutex>
 #include <string_view>
 
 namespace glshare {
@@ -33,41 +34,23 @@ std::optional<GlDevice> GlDevice::create(GlFunctions::Resolver resolve)
     GlDevice device;
     if (!device.gl_.load(resolve))
         return std::nullopt;
-    device.lastingAddresses_ =
-        keepsBuffersInMemory(textOf(device.gl_.getString(GL_RENDERER))) && device.buildPinProgram();
-    device.gl_.genBuffers(1, &device.staging_);
+    device.isEs_ = textOf(device.gl_.getString(GL_VERSION)).starts_with("OpenGL ES");
+    if (device.isEs_)
+        device.gl_.getBufferSubData = nullptr; // whatever stands under that name
+    device.keepsBuffersInMemory_ = keepsBuffersInMemory(textOf(device.gl_.getString(GL_RENDERER)));
     device.mark_ = device.gl_.fenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
     if (device.mark_ == nullptr)
         return std::nullopt;
+    device.gl_.genBuffers(1, &device.staging_);
     return device;
 }
 
-// Pinning needs a program in use that could be captured from; nothing is ever drawn with it.
-bool GlDevice::buildPinProgram()
+void GlDevice::destroy()
 {
-    const bool isEs = textOf(gl_.getString(GL_VERSION)).starts_with("OpenGL ES");
-    const std::array<const char*, 2> source{
-        isEs ? "#version 300 es\n" : "#version 150\n",
-        "out float captured; void main() { captured = 0.0; gl_Position = vec4(0.0); }"};
-    const std::array<const char*, 2> fragment{source[0], "void main() {}"};
-    const GLuint program = gl_.createProgram();
-    const auto attach = [&](GLenum stage, const std::array<const char*, 2>& text) {
-        const GLuint shader = gl_.createShader(stage);
-        gl_.shaderSource(shader, static_cast<GLsizei>(text.size()), text.data(), nullptr);
-        gl_.compileShader(shader);
-        gl_.attachShader(program, shader);
-    };
-    attach(GL_VERTEX_SHADER, source);
-    attach(GL_FRAGMENT_SHADER, fragment); // OpenGL ES links no program without one
-    const char* captured = "captured";
-    gl_.transformFeedbackVaryings(program, 1, &captured, GL_INTERLEAVED_ATTRIBS);
-    gl_.linkProgram(program);
-    GLint linked = GL_FALSE;
-    gl_.getProgramiv(program, GL_LINK_STATUS, &linked);
-    if (linked != GL_TRUE)
-        return false;
-    gl_.useProgram(program);
-    return true;
+    gl_.useProgram(0);
+    gl_.deleteProgram(pinProgram_); // 0 is ignored
+    gl_.deleteBuffers(1, &staging_);
+    gl_.deleteSync(mark_);
 }
 
 // glIsBuffer comes first everywhere: binding a name that is no buffer would create one in some
@@ -83,12 +66,78 @@ std::optional<std::size_t> GlDevice::bufferSize(GLuint name) const
     return static_cast<std::size_t>(size);
 }
 
+bool GlDevice::prepareCopy(GLuint name, std::size_t size) const
+{
+    if (bufferSize(name).value_or(0) < size)
+        return false;
+    while (gl_.getError() != GL_NO_ERROR) {
+    }
+    return true;
+}
+
+void GlDevice::bindStaging(GLenum target, std::size_t size)
+{
+    gl_.bindBuffer(target, staging_);
+    if (stagingSize_ < size) {
+        gl_.bufferData(target, static_cast<GLsizeiptr>(size), nullptr, GL_STREAM_COPY);
+        stagingSize_ = size;
+    }
+}
+
+// OpenGL ES reads buffers only through a mapping, which has to be of a buffer of our own.
+bool GlDevice::read(GLuint name, void* to, std::size_t size)
+{
+    if (!prepareCopy(name, size))
+        return false;
+    const auto bytes = static_cast<GLsizeiptr>(size);
+    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
+    if (gl_.getBufferSubData != nullptr) {
+        gl_.getBufferSubData(GL_COPY_READ_BUFFER, 0, bytes, to);
+        gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+        return succeeded();
+    }
+    bindStaging(GL_COPY_WRITE_BUFFER, size);
+    gl_.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
+    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    if (!succeeded())
+        return false;
+    const void* mapped = gl_.mapBufferRange(GL_COPY_WRITE_BUFFER, 0, bytes, GL_MAP_READ_BIT);
+    if (mapped == nullptr)
+        return false;
+    std::memcpy(to, mapped, size);
+    gl_.unmapBuffer(GL_COPY_WRITE_BUFFER);
+    return true;
+}
+
+// Storage that the application has made immutable may refuse to be written from the host; OpenGL's
+// own copies it takes.
+bool GlDevice::write(GLuint name, const void* from, std::size_t size)
+{
+    if (!prepareCopy(name, size))
+        return false;
+    const auto bytes = static_cast<GLsizeiptr>(size);
+    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, name);
+    gl_.bufferSubData(GL_COPY_WRITE_BUFFER, 0, bytes, from);
+    bool isWritten = succeeded();
+    if (!isWritten) {
+        bindStaging(GL_COPY_READ_BUFFER, size);
+        gl_.bufferSubData(GL_COPY_READ_BUFFER, 0, bytes, from);
+        gl_.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
+        isWritten = succeeded();
+    }
+    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, 0);
+    return isWritten;
+}
+
 // The mapping is not waited for: it is only looked at. Asking for writing has a use of its own, as
 // the driver then forgets what it has cached of the contents.
 void* GlDevice::address(GLuint name, std::size_t size) const
 {
-    if (!lastingAddresses_ || gl_.isBuffer(name) != GL_TRUE)
+    if (!keepsBuffersInMemory_ || gl_.isBuffer(name) != GL_TRUE)
         return nullptr;
+    // Contexts that share one buffer look at it in turn.
+    static std::mutex theMutex;
+    const std::scoped_lock lock(theMutex);
     gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
     void* mapped = gl_.mapBufferRange(GL_COPY_READ_BUFFER, 0, static_cast<GLsizeiptr>(size),
                                       GL_MAP_WRITE_BIT | GL_MAP_UNSYNCHRONIZED_BIT);
@@ -98,11 +147,41 @@ void* GlDevice::address(GLuint name, std::size_t size) const
     return mapped;
 }
 
+// Pinning needs a program in use that could be captured from; nothing is ever drawn with it.
+bool GlDevice::buildPinProgram()
+{
+    const std::array<const char*, 2> source{
+        isEs_ ? "#version 300 es\n" : "#version 150\n",
+        "out float captured; void main() { captured = 0.0; gl_Position = vec4(0.0); }"};
+    const std::array<const char*, 2> fragment{source[0], "void main() {}"};
+    pinProgram_ = gl_.createProgram();
+    const auto attach = [&](GLenum stage, const std::array<const char*, 2>& text) {
+        const GLuint shader = gl_.createShader(stage);
+        gl_.shaderSource(shader, static_cast<GLsizei>(text.size()), text.data(), nullptr);
+        gl_.compileShader(shader);
+        gl_.attachShader(pinProgram_, shader);
+        gl_.deleteShader(shader); // goes with the program
+    };
+    attach(GL_VERTEX_SHADER, source);
+    attach(GL_FRAGMENT_SHADER, fragment); // OpenGL ES links no program without one
+    const char* captured = "captured";
+    gl_.transformFeedbackVaryings(pinProgram_, 1, &captured, GL_INTERLEAVED_ATTRIBS);
+    gl_.linkProgram(pinProgram_);
+    GLint linked = GL_FALSE;
+    gl_.getProgramiv(pinProgram_, GL_LINK_STATUS, &linked);
+    gl_.useProgram(linked == GL_TRUE ? pinProgram_ : 0);
+    return linked == GL_TRUE;
+}
+
 // A capture that was begun makes its transform-feedback object hold the storage, not the buffer; so
 // glDeleteBuffers and glBufferData leave it alone. The object stays out of sight of every other
 // context.
-GLuint GlDevice::pin(GLuint name) const
+GLuint GlDevice::pin(GLuint name)
 {
+    if (keepsBuffersInMemory_ && pinProgram_ == 0)
+        keepsBuffersInMemory_ = buildPinProgram();
+    if (!keepsBuffersInMemory_)
+        return 0;
     GLuint feedback = 0;
     gl_.genTransformFeedbacks(1, &feedback);
     gl_.bindTransformFeedback(GL_TRANSFORM_FEEDBACK, feedback);
@@ -116,61 +195,6 @@ GLuint GlDevice::pin(GLuint name) const
 void GlDevice::unpin(GLuint pinned) const
 {
     gl_.deleteTransformFeedbacks(1, &pinned);
-}
-
-// Copies go through a buffer of our own: the application's may have storage that refuses to be
-// mapped, or be mapped already.
-bool GlDevice::prepareCopy(GLuint name, std::size_t size)
-{
-    if (bufferSize(name).value_or(0) < size)
-        return false;
-    if (stagingSize_ < size) {
-        gl_.bindBuffer(GL_COPY_WRITE_BUFFER, staging_);
-        gl_.bufferData(GL_COPY_WRITE_BUFFER, static_cast<GLsizeiptr>(size), nullptr,
-                       GL_STREAM_COPY);
-        stagingSize_ = size;
-    }
-    while (gl_.getError() != GL_NO_ERROR) {
-    }
-    return true;
-}
-
-bool GlDevice::read(GLuint name, void* to, std::size_t size)
-{
-    if (!prepareCopy(name, size))
-        return false;
-    const auto bytes = static_cast<GLsizeiptr>(size);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
-    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, staging_);
-    gl_.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
-    const bool copied = gl_.getError() == GL_NO_ERROR;
-    const void* mapped = gl_.mapBufferRange(GL_COPY_WRITE_BUFFER, 0, bytes, GL_MAP_READ_BIT);
-    if (mapped != nullptr) {
-        std::memcpy(to, mapped, size);
-        gl_.unmapBuffer(GL_COPY_WRITE_BUFFER);
-    }
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
-    return copied && mapped != nullptr;
-}
-
-bool GlDevice::write(GLuint name, const void* from, std::size_t size)
-{
-    if (!prepareCopy(name, size))
-        return false;
-    const auto bytes = static_cast<GLsizeiptr>(size);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, staging_);
-    void* mapped = gl_.mapBufferRange(GL_COPY_READ_BUFFER, 0, bytes,
-                                      GL_MAP_WRITE_BIT | GL_MAP_INVALIDATE_BUFFER_BIT);
-    if (mapped == nullptr)
-        return false;
-    std::memcpy(mapped, from, size);
-    gl_.unmapBuffer(GL_COPY_READ_BUFFER);
-    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, name);
-    gl_.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
-    const bool copied = gl_.getError() == GL_NO_ERROR;
-    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, 0);
-    gl_.finish();
-    return copied;
 }
 
 bool GlDevice::isSync(GLsync sync) const

@@ -14,23 +14,29 @@ public:
     // With the context current that `resolve` belongs to; empty if its OpenGL is too old.
     [[nodiscard]] static std::optional<GlDevice> create(GlFunctions::Resolver resolve);
 
+    // Deletes what this object has made in the share group, which outlives its context. Nothing
+    // else may be called afterwards.
+    void destroy();
+
     // Bytes of a buffer's storage; empty if `name` is no buffer (now).
     [[nodiscard]] std::optional<std::size_t> bufferSize(GLuint name) const;
 
+    // Copies `size` bytes out of, or into, a buffer, without mapping it. False, and nothing done,
+    // if the buffer is gone, smaller, or mapped by the application. What was written is visible to
+    // the other contexts of the share group after finish().
+    [[nodiscard]] bool read(GLuint name, void* to, std::size_t size);
+    [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
+    void finish() const { gl_.finish(); }
+
     // The host address of a buffer's storage, null if it has none that lasts, or if the buffer is
-    // gone, smaller than `size` bytes, or mapped by the application. Costs well under a
-    // microsecond.
+    // gone, smaller than `size` bytes, or mapped by the application. Maps the buffer for well under
+    // a microsecond: no other thread may use it in OpenGL at that time.
     [[nodiscard]] void* address(GLuint name, std::size_t size) const;
 
     // Keeps a buffer's present storage alive, whatever the application does to the buffer, until
-    // unpin. Never 0.
-    [[nodiscard]] GLuint pin(GLuint name) const;
+    // unpin; 0 if that is not possible. The same holds for other threads.
+    [[nodiscard]] GLuint pin(GLuint name);
     void unpin(GLuint pinned) const;
-
-    // Copies `size` bytes out of, or into, a buffer. False, and nothing done, if the buffer is gone
-    // or smaller. A write is visible to the other contexts of the share group on return.
-    [[nodiscard]] bool read(GLuint name, void* to, std::size_t size);
-    [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
 
     [[nodiscard]] bool isSync(GLsync sync) const;
 
@@ -48,12 +54,17 @@ private:
     GlDevice() = default;
 
     [[nodiscard]] bool buildPinProgram();
-    [[nodiscard]] bool prepareCopy(GLuint name, std::size_t size);
+    [[nodiscard]] bool prepareCopy(GLuint name, std::size_t size) const;
+    // Makes the staging buffer that large, and binds it.
+    void bindStaging(GLenum target, std::size_t size);
+    [[nodiscard]] bool succeeded() const { return gl_.getError() == GL_NO_ERROR; }
 
     GlFunctions gl_;
-    bool lastingAddresses_ = false;
-    GLuint staging_ = 0;          // a buffer of our own, which copies go through
-    std::size_t stagingSize_ = 0; // bytes
+    bool isEs_ = false;
+    bool keepsBuffersInMemory_ = false; // where they can be pinned
+    GLuint pinProgram_ = 0;             // made with the first pin
+    GLuint staging_ = 0;                // a buffer of our own, for copies that OpenGL has to make
+    std::size_t stagingSize_ = 0;       // bytes
     // A sync object known to this share group alone, which tells its contexts from others.
     GLsync mark_ = nullptr;
 };

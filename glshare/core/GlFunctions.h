@@ -10,8 +10,8 @@ namespace glshare {
 struct GlFunctions {
     using Resolver = void* (*)(const char* name);
 
-    // Fills the table; false if a function is missing. The functions act on the context that is
-    // current on the calling thread.
+    // Fills the table; false if a function is missing that OpenGL 3.3 and OpenGL ES 3.0 have. The
+    // functions act on the context that is current on the calling thread.
     [[nodiscard]] bool load(Resolver resolve);
 
     const GLubyte*(APIENTRYP getString)(GLenum) = nullptr;
@@ -20,22 +20,28 @@ struct GlFunctions {
 
     PFNGLISBUFFERPROC isBuffer = nullptr;
     PFNGLGENBUFFERSPROC genBuffers = nullptr;
+    PFNGLDELETEBUFFERSPROC deleteBuffers = nullptr;
     PFNGLBINDBUFFERPROC bindBuffer = nullptr;
     PFNGLBINDBUFFERBASEPROC bindBufferBase = nullptr;
     PFNGLBUFFERDATAPROC bufferData = nullptr;
+    PFNGLBUFFERSUBDATAPROC bufferSubData = nullptr;
+    PFNGLGETBUFFERSUBDATAPROC getBufferSubData = nullptr; // null where there is none
     PFNGLCOPYBUFFERSUBDATAPROC copyBufferSubData = nullptr;
     PFNGLGETBUFFERPARAMETERI64VPROC getBufferParameteri64v = nullptr;
     PFNGLMAPBUFFERRANGEPROC mapBufferRange = nullptr;
     PFNGLUNMAPBUFFERPROC unmapBuffer = nullptr;
 
     PFNGLFENCESYNCPROC fenceSync = nullptr;
+    PFNGLDELETESYNCPROC deleteSync = nullptr;
     PFNGLISSYNCPROC isSync = nullptr;
     PFNGLCLIENTWAITSYNCPROC clientWaitSync = nullptr;
 
     PFNGLCREATESHADERPROC createShader = nullptr;
+    PFNGLDELETESHADERPROC deleteShader = nullptr;
     PFNGLSHADERSOURCEPROC shaderSource = nullptr;
     PFNGLCOMPILESHADERPROC compileShader = nullptr;
     PFNGLCREATEPROGRAMPROC createProgram = nullptr;
+    PFNGLDELETEPROGRAMPROC deleteProgram = nullptr;
     PFNGLATTACHSHADERPROC attachShader = nullptr;
     PFNGLTRANSFORMFEEDBACKVARYINGSPROC transformFeedbackVaryings = nullptr;
     PFNGLLINKPROGRAMPROC linkProgram = nullptr;

@@ -86,8 +86,10 @@ void GlWorker::Loop::run()
     isEnding_ = true;
     isBusy_ = true;
     lock.unlock();
-    if (hasGl_.exchange(false))
+    if (hasGl_.exchange(false)) {
+        device_->destroy();
         context_->releaseCurrent();
+    }
     for (const Watch& watch : watches_)
         watch(nullptr);
     context_.reset();
@@ -127,6 +129,7 @@ void GlWorker::Loop::lookAtWatches(Lock& lock)
 void GlWorker::Loop::letGoOfDisplay(Lock& lock)
 {
     lock.unlock();
+    device_->destroy();
     context_->releaseCurrent();
     context_->abandon();
     lock.lock();

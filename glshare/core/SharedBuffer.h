@@ -1,8 +1,9 @@
 // An OpenCL memory object made from an OpenGL buffer.
 #pragma once
 
+#include "core/HostMemory.h"
 #include "core/OpenCl.h"
-#include "core/StorageHold.h"
+#include "core/PinnedStorage.h"
 
 #include <cstddef>
 #include <memory>
@@ -19,8 +20,16 @@ struct SharedBuffer {
     cl_GLuint name = 0;
     std::size_t size = 0; // bytes
     cl_mem_flags flags = 0;
-    // The GL storage that `memory` lies over; nothing if it has storage of its own.
-    StorageHold storage;
+    // What `memory` lies over: the GL storage, memory of our own, or, with neither, memory of the
+    // runtime's.
+    PinnedStorage storage;
+    HostMemory ownMemory;
+
+    // Where `memory` lies in the host's memory; null if it is the runtime's.
+    [[nodiscard]] void* hostAddress() const
+    {
+        return storage.address() != nullptr ? storage.address() : ownMemory.get();
+    }
 
     bool isAcquired = false;
     bool isCopied = false; // how it was acquired; the release goes the same way

@@ -37,9 +37,8 @@ cl_int findAll(const SharingRequest& request, const std::shared_ptr<SharingConte
     return areAllHere ? CL_SUCCESS : CL_INVALID_CONTEXT;
 }
 
-// Decides for each buffer whether it must be copied, and lists those. What the GL side looks like
-// counts as it is now, when the command is given: OpenGL's earlier calls have been made, its later
-// ones must wait for the release. CL_INVALID_GL_OBJECT if a buffer is gone or has become too small.
+// Decides for each buffer whether it must be copied, and lists those. CL_INVALID_GL_OBJECT if a
+// buffer is gone or has become too small now, when the command is given.
 cl_int inspect(const SharedBuffers& buffers, const GlDevice& device, std::vector<CopyItem>& copies)
 {
     for (const auto& buffer : buffers) {
@@ -50,8 +49,7 @@ cl_int inspect(const SharedBuffers& buffers, const GlDevice& device, std::vector
             continue;
         if (device.bufferSize(buffer->name).value_or(0) < buffer->size)
             return CL_INVALID_GL_OBJECT;
-        copies.push_back(
-            {buffer, StorageHold(buffer->context, device, buffer->name, buffer->size)});
+        copies.push_back({buffer, buffer->hostAddress()});
     }
     return CL_SUCCESS;
 }
@@ -67,23 +65,15 @@ cl_int prepareAcquire(const SharingContext& context, const SharedBuffers& buffer
     return result;
 }
 
-// What was copied on the way in is copied on the way out. In place there is nothing to ask OpenGL.
-void prepareRelease(const SharingContext& context, const SharedBuffers& buffers,
-                    std::vector<CopyItem>& copies)
+// What was copied on the way in is copied on the way out.
+std::vector<CopyItem> prepareRelease(const SharedBuffers& buffers)
 {
+    std::vector<CopyItem> copies;
     for (const auto& buffer : buffers) {
         if (buffer->isCopied)
-            copies.push_back({buffer, {}});
+            copies.push_back({buffer, buffer->hostAddress()});
     }
-    if (copies.empty())
-        return;
-    context.worker().call([&](GlDevice* device) {
-        if (device == nullptr)
-            return;
-        for (CopyItem& item : copies)
-            item.storage =
-                StorageHold(item.buffer->context, *device, item.buffer->name, item.buffer->size);
-    });
+    return copies;
 }
 
 void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
@@ -141,7 +131,7 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
         if (const cl_int error = prepareAcquire(context, buffers, copies); error != CL_SUCCESS)
             return error;
     } else {
-        prepareRelease(context, buffers, copies);
+        copies = prepareRelease(buffers);
     }
     const std::size_t copied = copies.size();
     cl_event done = nullptr;

@@ -7,25 +7,31 @@ namespace glshare {
 
 namespace {
 
-bool isZeroCopyAllowed = true;
+bool isHostMemoryForbidden = false;
 
-bool isOn(const char* variable)
+// Whether the variable is set to `value`.
+bool is(const char* variable, std::string_view value)
 {
-    const char* value = std::getenv(variable);
-    return value == nullptr || std::string_view(value) != "0";
+    const char* text = std::getenv(variable);
+    return text != nullptr && text == value;
 }
 
 } // namespace
 
-void forbidZeroCopy()
+void forbidHostMemory()
 {
-    isZeroCopyAllowed = false;
+    isHostMemoryForbidden = true;
+}
+
+bool isHostMemoryAllowed()
+{
+    return !isHostMemoryForbidden;
 }
 
 const Switches& switches()
 {
-    static const Switches theSwitches{isOn("GLSHARE_GL_EVENT"), isOn("GLSHARE_CPU_AS_GPU"),
-                                      isZeroCopyAllowed && isOn("GLSHARE_ZERO_COPY")};
+    static const Switches theSwitches{!is("GLSHARE_GL_EVENT", "0"), !is("GLSHARE_CPU_AS_GPU", "0"),
+                                      is("GLSHARE_ZERO_COPY", "1")};
     return theSwitches;
 }
 

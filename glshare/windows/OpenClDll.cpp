@@ -15,7 +15,7 @@ cl_icd_dispatch makeTable()
 {
     cl_icd_dispatch table = loadSystemOpenCl();
     setRuntime(table);
-    forbidZeroCopy();
+    forbidHostMemory();
     installEntryPoints(table);
     installDirect3D11(table);
     return table;

@@ -36,12 +36,11 @@ TEST_F(BufferContentsTest, BytesAreCopiedOnlyWithoutZeroCopy)
     getCounters(&before);
     roundTrip(buffer_, memory_, from(1), from(2));
     getCounters(&after);
-    const bool isZeroCopy = isOn("GLSHARE_ZERO_COPY");
     EXPECT_EQ(after.bytes_copied - before.bytes_copied,
-              isZeroCopy ? 0 : 2 * count_ * sizeof(cl_int));
-    EXPECT_EQ(after.acquired_in_place - before.acquired_in_place, isZeroCopy ? 1 : 0);
-    EXPECT_EQ(after.acquired_by_copy - before.acquired_by_copy, isZeroCopy ? 0 : 1);
-    EXPECT_EQ(after.released_by_copy - before.released_by_copy, isZeroCopy ? 0 : 1);
+              isZeroCopy() ? 0 : 2 * count_ * sizeof(cl_int));
+    EXPECT_EQ(after.acquired_in_place - before.acquired_in_place, isZeroCopy() ? 1 : 0);
+    EXPECT_EQ(after.acquired_by_copy - before.acquired_by_copy, isZeroCopy() ? 0 : 1);
+    EXPECT_EQ(after.released_by_copy - before.released_by_copy, isZeroCopy() ? 0 : 1);
     EXPECT_EQ(after.failed_copies, before.failed_copies);
 }
 

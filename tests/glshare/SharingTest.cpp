@@ -126,6 +126,12 @@ bool SharingTest::isOn(const char* variable)
     return value == nullptr || std::string_view(value) != "0";
 }
 
+bool SharingTest::isZeroCopy()
+{
+    const char* value = std::getenv("GLSHARE_ZERO_COPY");
+    return value != nullptr && std::string_view(value) == "1";
+}
+
 std::string SharingTest::extensionsOf(cl_platform_id platform)
 {
     std::size_t size = 0;

@@ -116,9 +116,10 @@ protected:
     // Makes an OpenGL context current and fills in `glEntries_`.
     virtual void openGl();
 
-    // Whether a switch of the layer is on.
+    // Whether a switch of the layer is on, which is so unless it is 0.
     static bool isOn(const char* variable);
     static bool offersGlEvent() { return isOn("GLSHARE_GL_EVENT"); }
+    static bool isZeroCopy();
 
     static std::string extensionsOf(cl_platform_id platform);
 

@@ -13,22 +13,23 @@ namespace glshare {
 class SharingContext;
 
 // Owned by one thread at a time; may be let go on any.
-class StorageHold {
+class PinnedStorage {
 public:
     // Holds nothing.
-    StorageHold() = default;
+    PinnedStorage() = default;
 
     // On the worker of `context`, whose device it is. Holds nothing if the buffer is gone, smaller
-    // than `size` bytes, or without host memory to look at.
-    StorageHold(std::shared_ptr<SharingContext> context, const GlDevice& device, GLuint name,
-                std::size_t size);
+    // than `size` bytes, or without host memory to look at. No other thread may use the buffer in
+    // OpenGL at that time.
+    PinnedStorage(std::shared_ptr<SharingContext> context, GlDevice& device, GLuint name,
+                  std::size_t size);
 
-    ~StorageHold();
+    ~PinnedStorage();
 
-    StorageHold(StorageHold&& other) noexcept;
-    StorageHold& operator=(StorageHold&& other) noexcept;
-    StorageHold(const StorageHold&) = delete;
-    StorageHold& operator=(const StorageHold&) = delete;
+    PinnedStorage(PinnedStorage&& other) noexcept;
+    PinnedStorage& operator=(PinnedStorage&& other) noexcept;
+    PinnedStorage(const PinnedStorage&) = delete;
+    PinnedStorage& operator=(const PinnedStorage&) = delete;
 
     // Null if nothing is held.
     [[nodiscard]] void* address() const { return address_; }

@@ -1,0 +1,145 @@
+// A buffer that several threads and contexts use at the same time. The faults that these tests find
+// are a crash, a hang, an OpenGL error that the program has not caused, and a wrong number. The
+// environment variable GLSHARE_STRESS_ROUNDS sets how often each test repeats what it does.
+#include "SharingTest.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cstdlib>
+#include <shared_mutex>
+#include <thread>
+#include <utility>
+
+namespace {
+
+int rounds()
+{
+    const char* value = std::getenv("GLSHARE_STRESS_ROUNDS");
+    return value == nullptr ? 1 : std::max(1, std::atoi(value));
+}
+
+class StressTest : public SharingTest {
+protected:
+    StressTest() : SharingTest(1000) {}
+
+    void SetUp() override
+    {
+        ASSERT_NO_FATAL_FAILURE(SharingTest::SetUp());
+        if (!IsSkipped())
+            prepareDrawing();
+    }
+
+    // Draws the first vertex attribute, which comes from the buffer, without pixels.
+    void prepareDrawing() const
+    {
+        const char* text = "#version 450\nlayout(location = 0) in int number;"
+                           "void main() { gl_Position = vec4(number, 0, 0, 1); }";
+        glUseProgram(glCreateShaderProgramv(GL_VERTEX_SHADER, 1, &text));
+        GLuint frame = 0;
+        glGenFramebuffers(1, &frame);
+        glBindFramebuffer(GL_FRAMEBUFFER, frame);
+        glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, 1);
+        glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, 1);
+        GLuint vertices = 0;
+        glGenVertexArrays(1, &vertices);
+        glBindVertexArray(vertices);
+        glBindBuffer(GL_ARRAY_BUFFER, buffer_);
+        glVertexAttribIPointer(0, 1, GL_INT, 0, nullptr);
+        glEnableVertexAttribArray(0);
+        glEnable(GL_RASTERIZER_DISCARD);
+        ASSERT_EQ(glGetError(), GLenum{GL_NO_ERROR});
+    }
+
+    // Creates and releases objects of the buffer, and uses every tenth.
+    void createObjects(cl_context context)
+    {
+        const Queue queue(context, device_);
+        for (int i = 0; i < 100; ++i) {
+            std::shared_lock promised(turn_, std::defer_lock);
+            if (isZeroCopy())
+                promised.lock(); // that OpenGL leaves the buffer alone meanwhile
+            const Memory memory = share(context, buffer_);
+            if (promised)
+                promised.unlock();
+            if (i % 10 == 0)
+                useObject(queue, memory);
+        }
+    }
+
+    // From the acquire to the release nobody else uses the buffer.
+    void useObject(const Queue& queue, cl_mem memory)
+    {
+        const std::scoped_lock turn(turn_);
+        ASSERT_EQ(queue.acquire(memory), CL_SUCCESS);
+        EXPECT_EQ(queue.read(memory, count_), from(first_));
+        queue.write(memory, from(++first_));
+        ASSERT_EQ(queue.release(memory), CL_SUCCESS);
+        clFinish(queue);
+    }
+
+    // Maps, writes and draws the buffer. Objects may be created from it meanwhile.
+    void useGl()
+    {
+        const std::scoped_lock turn(turn_);
+        glBindBuffer(GL_ARRAY_BUFFER, buffer_);
+        auto* const numbers = static_cast<cl_int*>(glMapBuffer(GL_ARRAY_BUFFER, GL_READ_WRITE));
+        ASSERT_NE(numbers, nullptr);
+        EXPECT_EQ(Numbers(numbers, numbers + count_), from(first_));
+        std::ranges::copy(from(++first_), numbers);
+        ASSERT_EQ(glUnmapBuffer(GL_ARRAY_BUFFER), GL_TRUE);
+        glDrawArrays(GL_POINTS, 0, static_cast<GLsizei>(count_));
+        redraw(buffer_, from(++first_));
+        glFinish();
+        ASSERT_EQ(glGetError(), GLenum{GL_NO_ERROR});
+    }
+
+    // Runs `create` on as many threads, each with an OpenCL context of its own, while `meanwhile`
+    // repeats on this thread. With `haveGl` each thread has a current OpenGL context, too.
+    void onThreads(std::size_t threads, bool haveGl, const std::function<void(cl_context)>& create,
+                   const std::function<void()>& meanwhile)
+    {
+        std::atomic<std::size_t> running = threads;
+        std::vector<std::jthread> creators;
+        for (std::size_t i = 0; i < threads; ++i) {
+            creators.emplace_back([&, this] {
+                const EglTestContext own(haveGl ? gl_.get() : nullptr);
+                if (haveGl)
+                    own.makeCurrent();
+                create(makeContext(properties(haveGl ? own.entries() : glEntries_)));
+                EglTestContext::releaseCurrent();
+                --running;
+            });
+        }
+        while (running > 0 && !HasFatalFailure())
+            meanwhile();
+    }
+
+    std::shared_mutex turn_; // guards the buffer's contents, and:
+    cl_int first_ = 1;       // its first number
+};
+
+TEST_F(StressTest, ContextsCreateObjectsOfOneBufferAtTheSameTime)
+{
+    const auto create = [this](cl_context context) {
+        for (int i = 0; i < 300; ++i)
+            share(context, buffer_);
+    };
+    for (int round = 0; round < rounds() && !HasFailure(); ++round) {
+        for (const std::size_t threads : {2, 4})
+            onThreads(threads, round % 2 != 0, create, std::this_thread::yield);
+    }
+}
+
+TEST_F(StressTest, ContextsCreateObjectsOfABufferThatOpenGlMapsAndDraws)
+{
+    for (int round = 0; round < rounds() && !HasFailure(); ++round) {
+        for (const std::size_t threads : {1, 2, 4}) {
+            for (const bool haveGl : {false, true})
+                onThreads(
+                    threads, haveGl, [this](cl_context context) { createObjects(context); },
+                    [this] { useGl(); });
+        }
+    }
+}
+
+} // namespace
