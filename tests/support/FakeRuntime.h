@@ -60,6 +60,7 @@ public:
 
     std::vector<std::string> balance() const { return fLedger.balance(); }
     std::string name(const void* handle) const { return fLedger.name(handle); }
+    void forgetDead() { fLedger.forgetDead(); }
     unsigned created(Kind kind) const { return fLedger.created(kind); }
     // References of a living object, else 0.
     unsigned references(Kind kind, const void* handle);

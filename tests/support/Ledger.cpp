@@ -25,6 +25,8 @@ void* scatteredHandle(unsigned serial)
 void* Ledger::create(Kind kind)
 {
     void* handle = scatteredHandle(++fSerial);
+    while (!handle || fAlive.contains(handle)) // after kHandleMask objects
+        handle = scatteredHandle(++fSerial);
     const auto index = static_cast<std::size_t>(kind);
     const unsigned ordinal = ++fCreated[index];
     std::string name = std::string(kKindNames[index]) + '#' + std::to_string(ordinal);

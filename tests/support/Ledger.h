@@ -46,6 +46,8 @@ public:
 
     // "mem#2" for anything that was ever handed out (dead or alive), "null", or "ptr".
     std::string name(const void* handle) const;
+    // Frees what is kept of dead objects, whose handles have no name from now on.
+    void forgetDead() { fDead.clear(); }
     // How many of that kind there ever were.
     unsigned created(Kind kind) const { return fCreated[static_cast<std::size_t>(kind)]; }
     // One line per living object, in order of kind and creation: "mem#2 x1".
