@@ -28,8 +28,9 @@ struct Started {
 
 void askPlatform(cl_platform_id platform)
 {
-    for (const cl_platform_info name :
-         {CL_PLATFORM_NAME, CL_PLATFORM_VENDOR, CL_PLATFORM_VERSION, CL_PLATFORM_EXTENSIONS}) {
+    constexpr cl_platform_info kQueries[] = {CL_PLATFORM_NAME, CL_PLATFORM_VENDOR,
+                                             CL_PLATFORM_VERSION, CL_PLATFORM_EXTENSIONS};
+    for (const cl_platform_info name : kQueries) {
         std::size_t size = 0;
         clGetPlatformInfo(platform, name, 0, nullptr, &size);
         std::vector<char> text(size);
