@@ -16,11 +16,11 @@ STAND_IN = '#!/bin/sh\necho "$(basename "$0") $*" >>"$TEST_LOG"\n'
 # Answers --help itself; else logs the folder, too.
 STAND_IN_CTEST = f'#!/bin/sh\n[ "$1" = --help ] && exec {CTEST} --help\necho "ctest in $PWD: $*" >>"$TEST_LOG"\n'
 STAND_IN_VIEWER = '#!/bin/sh\necho "viewer in $PWD: $*" >>"$TEST_LOG"\n'
-TOOLS = ["apt-get", "clang-format", "cmake", "dpkg-query", "doxygen", "ninja", "run-clang-tidy", "sudo"]
+TOOLS = ["apt-get", "clang-format", "cmake", "dpkg-query", "doxygen", "ninja", "clang-tidy", "sudo"]
 
 # Each is refused before anything is installed or built.
 WRONG_USE = [
-    ("bench", "--bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
+    ("abi", "--bogus"), ("bench", "--bogus"), ("check", "--bogus"), ("check", "tests", "bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
     ("docs", "one", "two"), ("format", "--bogus"), ("gpu-check", "--bogus"), ("package", "--bogus"),
     ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "KernelStore"),
     ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"), ("trace-picture", "--bogus", "a", "b"),
@@ -81,6 +81,31 @@ class Scripts(unittest.TestCase):
     def test_package_installs_the_tools_that_it_uses(self):
         _, calls = self.run_script("package", "--check", installed=False)
         self.assertRegex(calls, r"apt-get install .*\bdpkg-dev .*\bhelp2man lintian\n")
+
+    def test_check_runs_and_reports_every_check_whatever_fails(self):
+        def ctest(percent, failed, total, what, test):
+            return (f"cat <<'END'\n{percent}% tests passed, {failed} tests failed out of {total}\n\n"
+                    f"The following tests {what}:\n\t  3 - library.{test}\n\nErrors while running CTest\nEND\n")
+
+        scripts = {
+            "test": "case $1 in --asan)\n" + ctest(75, 1, 4, "FAILED", "Fence (Failed)") + "exit 8 ;;\n"
+                    "--tsan) echo broken build; exit 1 ;; --fuzz) ;; *)\n"
+                    + ctest(100, 0, 7, "did not run", "Direct3D (Skipped)") + "esac",
+            "abi": "echo changed; exit 1", "bench": "", "test-windows": "", "format": ""}
+        for name, text in scripts.items():
+            self.stand_in(self.root / "project/scripts" / name, f"#!/bin/sh\n{text}\n")
+        run, _ = self.run_script("check", "--ci")
+        self.assertEqual(run.returncode, 1, run.stderr)
+        self.assertEqual(
+            [tuple(line.split()[:2]) for line in run.stdout.splitlines() if " processor " in line],
+            [("passed", "tests"), ("passed", "counts"), ("passed", "windows"), ("passed", "format"),
+             ("FAILED", "asan"), ("FAILED", "tsan"), ("passed", "clang"), ("passed", "fuzz"), ("FAILED", "abi")])
+        self.assertRegex(run.stdout, "(?s)broken build.*FAILED  tsan.*changed.*FAILED  abi")
+        # 7 in tests and in clang, 4 in asan; one for each of the six other checks.
+        self.assertIn("\n87% tests passed, 3 tests failed out of 24\n", run.stdout)
+        self.assertRegex(run.stdout, r"did not run:\n\ttests: library.Direct3D \(Skipped\)\n\tclang: ")
+        self.assertTrue(run.stdout.endswith(
+            "FAILED:\n\tasan: library.Fence (Failed)\n\ttsan (exit code 1)\n\tabi (exit code 1)\n"), run.stdout)
 
 
 if __name__ == "__main__":
