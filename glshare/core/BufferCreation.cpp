@@ -4,8 +4,6 @@
 #include "core/Registry.h"
 #include "core/Switches.h"
 
-#include <utility>
-
 namespace glshare {
 
 namespace {
@@ -79,7 +77,7 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
         return nullptr;
     cl_mem memory = buffer->memory;
     try {
-        Registry::get().add(handle, std::move(buffer));
+        Registry::get().add(handle, buffer);
     } catch (...) {
         runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
         throw;

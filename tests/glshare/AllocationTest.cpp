@@ -63,6 +63,15 @@ void* operator new(std::size_t size)
         throw std::bad_alloc();
     return memory;
 }
+void* operator new(std::size_t size, std::align_val_t alignment)
+{
+    const auto step = static_cast<std::size_t>(alignment);
+    void* memory =
+        nextFails() ? nullptr : std::aligned_alloc(step, (size + step - 1) / step * step);
+    if (memory == nullptr)
+        throw std::bad_alloc();
+    return memory;
+}
 // A sanitizer's own would not come by.
 void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
 {
@@ -78,6 +87,14 @@ void* operator new[](std::size_t size)
     std::free(memory);
 }
 [[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete(void* memory, std::align_val_t) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete(void* memory, std::size_t, std::align_val_t) noexcept
 {
     std::free(memory);
 }
@@ -126,10 +143,10 @@ protected:
     // Other threads may still have to give back what they use.
     void expectNothingLost(const InUse& before) const
     {
-        const auto isMore = [&] { return !std::ranges::equal(inUse(), before, std::less_equal()); };
-        for (int i = 0; i < 10000 && isMore(); ++i)
-            std::this_thread::sleep_for(std::chrono::microseconds(500));
-        EXPECT_FALSE(isMore()) << testing::PrintToString(inUse());
+        const auto isNoMore = [&] {
+            return std::ranges::equal(inUse(), before, std::less_equal());
+        };
+        EXPECT_TRUE(isSoon(isNoMore)) << testing::PrintToString(inUse());
     }
 
     // Fails each allocation of a call in turn, and makes the call with all memory after that.

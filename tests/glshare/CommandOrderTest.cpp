@@ -111,10 +111,24 @@ TEST_F(CommandOrderTest, UserSynchronisationSwitchesTheImpliedOrderOff)
     EXPECT_EQ(clWaitForEvents(1, event.place()), CL_SUCCESS);
 }
 
-// Draws a triangle over a target of that many pixels a side, whose fragments write -1 to the buffer
-// of binding 0, each to its own place. Nothing waits for it, nor flushes.
-void drawIntoBuffer(GLsizei side)
+// A target of kSide times kSide pixels.
+constexpr GLsizei kSide = 1024;
+constexpr std::size_t kPixels = std::size_t{kSide} * kSide;
+
+// Draws so many times over the target. Each pixel's fragment writes -1 to its own place in the
+// buffer. Nothing waits for it, nor flushes.
+void drawIntoBuffer(GLuint pixels, int times)
 {
+    GLuint frame = 0;
+    GLuint vertices = 0;
+    glGenFramebuffers(1, &frame);
+    glBindFramebuffer(GL_FRAMEBUFFER, frame);
+    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, kSide);
+    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, kSide);
+    glGenVertexArrays(1, &vertices);
+    glBindVertexArray(vertices);
+    glBindBufferBase(GL_SHADER_STORAGE_BUFFER, 0, pixels);
+    glFinish();
     const char* vertex =
         "#version 450\nvoid main() { gl_Position = vec4(gl_VertexID == 1 ? 3 : -1, "
         "gl_VertexID == 2 ? 3 : -1, 0, 1); }";
@@ -132,29 +146,18 @@ void drawIntoBuffer(GLsizei side)
     }
     glLinkProgram(program);
     glUseProgram(program);
-    glUniform1i(0, side);
-    glViewport(0, 0, side, side);
-    glDrawArrays(GL_TRIANGLES, 0, 3);
+    glUniform1i(0, kSide);
+    glViewport(0, 0, kSide, kSide);
+    for (int i = 0; i < times; ++i)
+        glDrawArrays(GL_TRIANGLES, 0, 3);
 }
 
 // Results of drawing that nobody has waited for, but the implied order.
 TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
 {
-    constexpr GLsizei kSide = 1024;
-    constexpr std::size_t kPixels = std::size_t{kSide} * kSide;
     const GLuint pixels = makeGlBuffer(Numbers(kPixels, 0));
     const Memory memory = share(pixels);
-    GLuint frame = 0;
-    GLuint vertices = 0;
-    glGenFramebuffers(1, &frame);
-    glBindFramebuffer(GL_FRAMEBUFFER, frame);
-    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, kSide);
-    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, kSide);
-    glGenVertexArrays(1, &vertices);
-    glBindVertexArray(vertices);
-    glBindBufferBase(GL_SHADER_STORAGE_BUFFER, 0, pixels);
-    glFinish();
-    drawIntoBuffer(kSide);
+    drawIntoBuffer(pixels, 1);
 
     EXPECT_EQ(queue_.acquire(memory), CL_SUCCESS);
     EXPECT_TRUE(queue_.read(memory, kPixels) == Numbers(kPixels, -1));
@@ -180,10 +183,29 @@ TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
     }
 }
 
+decltype(&clCreateEventFromGLsyncKHR) findCreateEvent(cl_platform_id platform)
+{
+    return reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
+        clGetExtensionFunctionAddressForPlatform(platform, "clCreateEventFromGLsyncKHR"));
+}
+
+// The event is all that is left of its context when the drawing ends.
+TEST_F(GlEventTest, EventsOfGlSyncObjectsKeepTheirContext)
+{
+    Context context = makeContext();
+    drawIntoBuffer(makeGlBuffer(Numbers(kPixels, 0)), 20);
+    GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
+    glFlush();
+    Event event = findCreateEvent(platform_)(context, reinterpret_cast<cl_GLsync>(sync), nullptr);
+    context = nullptr;
+    EXPECT_EQ(clWaitForEvents(1, event.place()), CL_SUCCESS);
+    EXPECT_EQ(statusOf(event), CL_COMPLETE);
+    glDeleteSync(sync);
+}
+
 TEST_F(GlEventTest, EventsFollowGlSyncObjects)
 {
-    const auto createEvent = reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
-        clGetExtensionFunctionAddressForPlatform(platform_, "clCreateEventFromGLsyncKHR"));
+    const auto createEvent = findCreateEvent(platform_);
     ASSERT_NE(createEvent, nullptr);
     redraw(buffer_, from(40));
     GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);

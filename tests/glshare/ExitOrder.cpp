@@ -148,7 +148,7 @@ void useInChild(cl_device_id device, const Properties& list)
 // Children that are forked in the middle of other threads' work.
 TEST_F(ExitOrder, ForkedChildren)
 {
-    constexpr int kChildren = 50;
+    constexpr int kChildren = 20;
     constexpr unsigned kPatience = 10; // seconds, after which the system ends a child
     EglTestContext::releaseCurrent();
     keepBusy();

@@ -2,6 +2,7 @@
 #include "SharingTest.h"
 
 #include <array>
+#include <functional>
 #include <tuple>
 
 namespace {
@@ -19,8 +20,12 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
     const std::array<cl_mem, 2> withNull{memory_, nullptr};
     const std::array<cl_mem, 2> withPlain{memory_, plain};
     const std::array<cl_mem, 2> twice{memory_, memory_};
+    const cl_buffer_region region{0, 64};
+    Memory part = clCreateSubBuffer(memory_, CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION,
+                                    &region, nullptr);
     const cl_mem* const good = twice.data();
     const std::array<cl_event, 2> events{ended, nullptr};
+    Event foreign = clCreateUserEvent(other, nullptr);
     struct Row {
         const char* what;
         cl_command_queue queue;
@@ -39,10 +44,15 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
         {"a list without a count", queue_, 0, good, 0, nullptr, CL_INVALID_VALUE},
         {"a null object", queue_, 2, withNull.data(), 0, nullptr, CL_INVALID_MEM_OBJECT},
         {"one not from OpenGL", queue_, 2, withPlain.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a part of one", queue_, 1, part.place(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a count that no list has", queue_, ~0U, good, 0, nullptr, CL_INVALID_VALUE},
         {"an object twice", queue_, 2, twice.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
         {"a wait count without a list", queue_, 1, good, 1, nullptr, CL_INVALID_EVENT_WAIT_LIST},
         {"a wait list without a count", queue_, 1, good, 0, &events[0], CL_INVALID_EVENT_WAIT_LIST},
         {"a null event", queue_, 1, good, 1, &events[1], CL_INVALID_EVENT_WAIT_LIST},
+        {"a wait count that no list has", queue_, 1, good, ~0U, &events[0],
+         CL_INVALID_EVENT_WAIT_LIST},
+        {"an event of elsewhere", queue_, 1, good, 1, foreign.place(), CL_INVALID_CONTEXT},
     };
     const auto enqueue = [&](bool isRelease) {
         return isRelease ? queue_.release(memory_) : queue_.acquire(memory_);
@@ -65,7 +75,8 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
     clFinish(queue_);
 }
 
-TEST_F(MisuseTest, CreationNamesWhatIsWrong)
+// Calls that make an object, each with one fault.
+TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
 {
     const Context plain = makeContext({0});
     constexpr GLuint kUnknown = 9999;
@@ -73,29 +84,59 @@ TEST_F(MisuseTest, CreationNamesWhatIsWrong)
     glGenBuffers(2, names.data());
     const auto [empty, withoutStorage] = names;
     glBindBuffer(GL_ARRAY_BUFFER, withoutStorage);
-    const std::tuple<const char*, cl_context, cl_mem_flags, GLuint, cl_int> rows[] = {
-        {"no context", nullptr, CL_MEM_READ_WRITE, buffer_, CL_INVALID_CONTEXT},
-        {"a context that does not share", plain, CL_MEM_READ_WRITE, buffer_, CL_INVALID_CONTEXT},
-        {"flags without use", context_, CL_MEM_ALLOC_HOST_PTR, buffer_, CL_INVALID_VALUE},
-        {"an unknown name", context_, CL_MEM_READ_WRITE, kUnknown, CL_INVALID_GL_OBJECT},
-        {"a name without a buffer", context_, CL_MEM_READ_WRITE, empty, CL_INVALID_GL_OBJECT},
-        {"no storage", context_, CL_MEM_READ_WRITE, withoutStorage, CL_INVALID_GL_OBJECT},
+    constexpr cl_mem_flags kUse = CL_MEM_READ_WRITE;
+    const auto buffer = [](cl_context context, cl_mem_flags flags, GLuint name) {
+        return [=](cl_int* error) { return clCreateFromGLBuffer(context, flags, name, error); };
     };
-    cl_int error = CL_SUCCESS;
-    for (const auto& [what, context, flags, name, expected] : rows) {
+    const auto renderbuffer = [](cl_context context, cl_mem_flags flags) {
+        return [=](cl_int* error) { return clCreateFromGLRenderbuffer(context, flags, 1, error); };
+    };
+    using CreateTexture = decltype(&clCreateFromGLTexture);
+    const auto texture = [](CreateTexture create, cl_context context, cl_mem_flags flags,
+                            cl_GLenum target, cl_GLint level) {
+        return [=](cl_int* error) { return create(context, flags, target, level, 1, error); };
+    };
+    const auto find = [&](const char* name) {
+        return reinterpret_cast<CreateTexture>(
+            clGetExtensionFunctionAddressForPlatform(platform_, name));
+    };
+    const CreateTexture any = find("clCreateFromGLTexture");
+    const CreateTexture flat = find("clCreateFromGLTexture2D");
+    const CreateTexture solid = find("clCreateFromGLTexture3D");
+    const std::tuple<const char*, cl_int, std::function<cl_mem(cl_int*)>> rows[] = {
+        {"no context", CL_INVALID_CONTEXT, buffer(nullptr, kUse, buffer_)},
+        {"a context that does not share", CL_INVALID_CONTEXT, buffer(plain, kUse, buffer_)},
+        {"flags without use", CL_INVALID_VALUE, buffer(context_, CL_MEM_ALLOC_HOST_PTR, buffer_)},
+        {"two uses", CL_INVALID_VALUE,
+         buffer(context_, CL_MEM_READ_ONLY | CL_MEM_WRITE_ONLY, buffer_)},
+        {"an unknown name", CL_INVALID_GL_OBJECT, buffer(context_, kUse, kUnknown)},
+        {"a name without a buffer", CL_INVALID_GL_OBJECT, buffer(context_, kUse, empty)},
+        {"no storage", CL_INVALID_GL_OBJECT, buffer(context_, kUse, withoutStorage)},
+        {"a renderbuffer", CL_INVALID_GL_OBJECT, renderbuffer(context_, kUse)},
+        {"its flags", CL_INVALID_VALUE, renderbuffer(context_, CL_MEM_USE_HOST_PTR)},
+        {"its context", CL_INVALID_CONTEXT, renderbuffer(plain, CL_MEM_USE_HOST_PTR)},
+        {"a texture", CL_INVALID_GL_OBJECT, texture(any, context_, 0, GL_TEXTURE_2D_ARRAY, 0)},
+        {"a part of a cube", CL_INVALID_GL_OBJECT,
+         texture(any, context_, kUse, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z, 0)},
+        {"its context", CL_INVALID_CONTEXT, texture(any, plain, kUse, GL_TEXTURE_CUBE_MAP, -1)},
+        {"its flags", CL_INVALID_VALUE,
+         texture(any, context_, CL_MEM_COPY_HOST_PTR, GL_TEXTURE_2D, 0)},
+        {"a whole cube", CL_INVALID_VALUE, texture(any, context_, kUse, GL_TEXTURE_CUBE_MAP, 0)},
+        {"no target", CL_INVALID_VALUE, texture(any, context_, kUse, GL_ARRAY_BUFFER, 0)},
+        {"its level", CL_INVALID_MIP_LEVEL, texture(any, context_, kUse, GL_TEXTURE_1D, -1)},
+        {"2D", CL_INVALID_GL_OBJECT, texture(flat, context_, kUse, GL_TEXTURE_RECTANGLE, 0)},
+        {"2D of three", CL_INVALID_VALUE, texture(flat, context_, kUse, GL_TEXTURE_3D, 0)},
+        {"3D", CL_INVALID_GL_OBJECT, texture(solid, context_, kUse, GL_TEXTURE_3D, 0)},
+        {"3D of two", CL_INVALID_VALUE, texture(solid, context_, kUse, GL_TEXTURE_2D, 0)},
+    };
+    for (const auto& [what, expected, create] : rows) {
         SCOPED_TRACE(what);
-        EXPECT_EQ(clCreateFromGLBuffer(context, flags, name, &error), nullptr);
+        cl_int error = CL_SUCCESS;
+        EXPECT_EQ(create(&error), nullptr);
         EXPECT_EQ(error, expected);
-        EXPECT_EQ(clCreateFromGLBuffer(context, flags, name, nullptr), nullptr);
+        EXPECT_EQ(create(nullptr), nullptr);
     }
     EXPECT_EQ(glIsBuffer(kUnknown), GL_FALSE);
-
-    // Neither is offered.
-    EXPECT_EQ(clCreateFromGLTexture(context_, CL_MEM_READ_WRITE, GL_TEXTURE_2D, 0, 1, &error),
-              nullptr);
-    EXPECT_EQ(error, CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(clCreateFromGLRenderbuffer(plain, CL_MEM_READ_WRITE, 1, &error), nullptr);
-    EXPECT_EQ(error, CL_INVALID_CONTEXT);
 }
 
 TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
@@ -105,39 +146,138 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
     constexpr cl_context_properties kEgl = CL_EGL_DISPLAY_KHR;
     constexpr cl_context_properties kNonsense = 0x5eed;
     constexpr cl_int kNoShareGroup = CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    const std::tuple<const char*, cl_context_properties, Properties, cl_int> rows[] = {
+    struct Row {
+        const char* what;
+        cl_context_properties context;
+        Properties others;
+        cl_int error;
+        cl_int errorOfQuery = error;
+    };
+    const Row rows[] = {
         {"no display", gl, {}, kNoShareGroup},
         {"an unknown context", kNonsense, {kEgl, display}, kNoShareGroup},
         {"an unknown display", gl, {kEgl, kNonsense}, kNoShareGroup},
         {"two systems", gl, {kEgl, display, CL_GLX_DISPLAY_KHR, display}, CL_INVALID_OPERATION},
         {"a window system of elsewhere", gl, {CL_WGL_HDC_KHR, display}, CL_INVALID_OPERATION},
+        {"a share group of elsewhere", gl, {CL_CGL_SHAREGROUP_KHR, gl}, CL_INVALID_OPERATION},
         {"a property twice", gl, {kEgl, display, kEgl, display}, CL_INVALID_PROPERTY},
+        {"a platform twice",
+         gl,
+         {kEgl, display, CL_CONTEXT_PLATFORM, reinterpret_cast<cl_context_properties>(platform_)},
+         CL_INVALID_PROPERTY},
+        {"neither true nor false",
+         gl,
+         {kEgl, display, CL_CONTEXT_INTEROP_USER_SYNC, 2},
+         CL_INVALID_PROPERTY},
+        {"an unknown name",
+         gl,
+         {kEgl, display, kNonsense, 1},
+         CL_INVALID_PROPERTY,
+         CL_INVALID_VALUE},
     };
-    for (const auto& [what, context, displays, expected] : rows) {
-        SCOPED_TRACE(what);
-        Properties entries{CL_GL_CONTEXT_KHR, context};
-        entries.insert(entries.end(), displays.begin(), displays.end());
+    const std::ptrdiff_t threads = threadsOfProcess();
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.what);
+        Properties entries{CL_GL_CONTEXT_KHR, row.context};
+        entries.insert(entries.end(), row.others.begin(), row.others.end());
         const Properties list = properties(entries);
         cl_int error = CL_SUCCESS;
         EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
-        EXPECT_EQ(error, expected);
+        EXPECT_EQ(error, row.error);
+        EXPECT_EQ(
+            clCreateContextFromType(list.data(), CL_DEVICE_TYPE_ALL, nullptr, nullptr, &error),
+            nullptr);
+        EXPECT_EQ(error, row.error);
         cl_device_id device = nullptr;
         EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
                                         sizeof(cl_device_id), &device, nullptr),
-                  expected);
+                  row.errorOfQuery);
+    }
+    EXPECT_LE(threadsOfProcess(), threads);
+}
+
+TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
+{
+    const Properties list = properties();
+    const std::array<cl_device_id, 2> devices{device_, nullptr};
+    int user = 0;
+    const std::tuple<const char*, cl_uint, const cl_device_id*, void*, cl_int> rows[] = {
+        {"no devices", 0, nullptr, nullptr, CL_INVALID_VALUE},
+        {"a count without a list", 1, nullptr, nullptr, CL_INVALID_VALUE},
+        {"a list without a count", 0, devices.data(), nullptr, CL_INVALID_VALUE},
+        {"a count that no list has", ~0U, devices.data(), nullptr, CL_INVALID_VALUE},
+        {"a null device", 2, devices.data(), nullptr, CL_INVALID_DEVICE},
+        {"data for no callback", 1, devices.data(), &user, CL_INVALID_VALUE},
+    };
+    for (const auto& [what, count, first, data, expected] : rows) {
+        SCOPED_TRACE(what);
+        cl_int error = CL_SUCCESS;
+        EXPECT_EQ(clCreateContext(list.data(), count, first, nullptr, data, &error), nullptr);
+        EXPECT_EQ(error, expected);
     }
 }
 
-TEST_F(MisuseTest, QueriesRefuseWhatIsNotShared)
+// The arguments of clGetDeviceIDs count whether or not a device of the type can exist.
+TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
+{
+    cl_device_id device = nullptr;
+    cl_uint count = 7;
+    const cl_int ofNullPlatform = clGetDeviceIDs(nullptr, CL_DEVICE_TYPE_ALL, 1, &device, nullptr);
+    const std::tuple<const char*, cl_platform_id, cl_uint, cl_device_id*, cl_uint*, cl_int> rows[] =
+        {
+            {"nothing wrong", platform_, 1, &device, &count, CL_SUCCESS},
+            {"count alone", platform_, 0, nullptr, &count, CL_SUCCESS},
+            {"null platform", nullptr, 1, &device, nullptr, ofNullPlatform},
+            {"no entries", platform_, 0, &device, &count, CL_INVALID_VALUE},
+            {"nowhere to answer", platform_, 1, nullptr, nullptr, CL_INVALID_VALUE},
+        };
+    for (const cl_device_type type :
+         {cl_device_type{CL_DEVICE_TYPE_CPU}, cl_device_type{CL_DEVICE_TYPE_GPU}}) {
+        const cl_int found = clGetDeviceIDs(platform_, type, 1, &device, nullptr);
+        for (const auto& [what, platform, capacity, devices, number, expected] : rows) {
+            SCOPED_TRACE(what);
+            EXPECT_EQ(clGetDeviceIDs(platform, type, capacity, devices, number),
+                      expected == CL_SUCCESS ? found : expected);
+        }
+    }
+    EXPECT_LE(count, 1U);
+}
+
+TEST_F(MisuseTest, FunctionsRefuseObjectsThatAreNotTheirs)
 {
     const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
+    Event acquired;
+    ASSERT_EQ(queue_.acquire(memory_, {}, &acquired), CL_SUCCESS);
+    ASSERT_EQ(queue_.release(memory_), CL_SUCCESS);
+    clFinish(queue_);
     cl_gl_object_type type = 0;
-    EXPECT_EQ(clGetGLObjectInfo(nullptr, &type, nullptr), CL_INVALID_MEM_OBJECT);
-    EXPECT_EQ(clGetGLObjectInfo(plain, &type, nullptr), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(clGetGLTextureInfo(nullptr, CL_GL_TEXTURE_TARGET, 0, nullptr, nullptr),
-              CL_INVALID_MEM_OBJECT);
-    EXPECT_EQ(clGetGLTextureInfo(memory_, CL_GL_TEXTURE_TARGET, 0, nullptr, nullptr),
-              CL_INVALID_GL_OBJECT);
+    std::array<char, 64> value{};
+    const auto info = [&](auto get, auto handle, cl_uint name) {
+        return get(handle, name, value.size(), static_cast<void*>(value.data()), nullptr);
+    };
+    const std::tuple<const char*, cl_int, cl_int> rows[] = {
+        {"object: null", clGetGLObjectInfo(nullptr, &type, nullptr), CL_INVALID_MEM_OBJECT},
+        {"object: not shared", clGetGLObjectInfo(plain, &type, nullptr), CL_INVALID_GL_OBJECT},
+        {"texture: null", info(clGetGLTextureInfo, cl_mem(), CL_GL_TEXTURE_TARGET),
+         CL_INVALID_MEM_OBJECT},
+        {"texture: not shared", info(clGetGLTextureInfo, cl_mem(plain), CL_GL_TEXTURE_TARGET),
+         CL_INVALID_GL_OBJECT},
+        {"texture: a buffer", info(clGetGLTextureInfo, cl_mem(memory_), CL_GL_TEXTURE_TARGET),
+         CL_INVALID_GL_OBJECT},
+        {"memory: null", info(clGetMemObjectInfo, cl_mem(), CL_MEM_FLAGS), CL_INVALID_MEM_OBJECT},
+        {"context: null", info(clGetContextInfo, cl_context(), CL_CONTEXT_PROPERTIES),
+         CL_INVALID_CONTEXT},
+        {"context: retain", clRetainContext(nullptr), CL_INVALID_CONTEXT},
+        {"context: release", clReleaseContext(nullptr), CL_INVALID_CONTEXT},
+        {"event: null", info(clGetEventInfo, cl_event(), CL_EVENT_COMMAND_TYPE), CL_INVALID_EVENT},
+        {"event: retain", clRetainEvent(nullptr), CL_INVALID_EVENT},
+        {"event: release", clReleaseEvent(nullptr), CL_INVALID_EVENT},
+        {"event: set", clSetUserEventStatus(nullptr, CL_COMPLETE), CL_INVALID_EVENT},
+        {"event: set a command's", clSetUserEventStatus(acquired, CL_COMPLETE), CL_INVALID_EVENT},
+        {"device: null", info(clGetDeviceInfo, cl_device_id(), CL_DEVICE_TYPE), CL_INVALID_DEVICE},
+    };
+    for (const auto& [what, error, expected] : rows)
+        EXPECT_EQ(error, expected) << what;
 }
 
 // Gone for OpenGL, or too small by now; OpenCL's object is still an object.

@@ -1,6 +1,10 @@
 // What the application is told about devices, contexts, objects and commands.
 #include "SharingTest.h"
 
+#include <array>
+#include <functional>
+#include <utility>
+
 namespace {
 
 using QueriesTest = SharingTest;
@@ -113,6 +117,67 @@ TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
     EXPECT_EQ(infoOf<void*>(clGetMemObjectInfo, memory, CL_MEM_HOST_PTR), nullptr);
     EXPECT_EQ(infoOf<std::size_t>(clGetMemObjectInfo, memory, CL_MEM_SIZE),
               count_ * sizeof(cl_int));
+}
+
+// Where a shared buffer has its memory is not shown, neither by what is made from it; where another
+// buffer has it is.
+TEST_F(QueriesTest, PartsAndImagesShowTheHostPointerOfOtherBuffersOnly)
+{
+    alignas(128) std::array<char, 4096> storage{};
+    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE | CL_MEM_USE_HOST_PTR,
+                                        storage.size(), storage.data(), nullptr);
+    const cl_image_format format{CL_R, CL_SIGNED_INT32};
+    cl_image_desc description{};
+    description.image_type = CL_MEM_OBJECT_IMAGE1D_BUFFER;
+    description.image_width = 16;
+    for (const bool isShared : {false, true}) {
+        SCOPED_TRACE(isShared);
+        description.buffer = isShared ? memory_ : plain;
+        const cl_buffer_region region{128, 1024};
+        const Memory part = clCreateSubBuffer(description.buffer, CL_MEM_READ_ONLY,
+                                              CL_BUFFER_CREATE_TYPE_REGION, &region, nullptr);
+        const Memory image =
+            clCreateImage(context_, CL_MEM_READ_ONLY, &format, &description, nullptr, nullptr);
+        for (const auto& [object, offset] : {std::pair(cl_mem(part), 128), {image, 0}}) {
+            EXPECT_EQ(infoOf<void*>(clGetMemObjectInfo, object, CL_MEM_HOST_PTR),
+                      isShared ? nullptr : storage.data() + offset);
+            const cl_mem_flags hidden = isShared ? 0 : CL_MEM_USE_HOST_PTR;
+            EXPECT_EQ(infoOf<cl_mem_flags>(clGetMemObjectInfo, object, CL_MEM_FLAGS),
+                      CL_MEM_READ_ONLY | hidden);
+        }
+    }
+}
+
+// Each query that is answered here gives its size, and refuses a place that is smaller.
+TEST_F(QueriesTest, SizesAreAnsweredAndChecked)
+{
+    Event event;
+    ASSERT_EQ(queue_.acquire(memory_, {}, &event), CL_SUCCESS);
+    const Properties list = properties();
+    const auto query = [](auto get, auto handle, cl_uint name) {
+        return [=](std::size_t size, void* value, std::size_t* needed) {
+            return get(handle, name, size, value, needed);
+        };
+    };
+    const std::pair<std::function<cl_int(std::size_t, void*, std::size_t*)>, std::size_t> rows[] = {
+        {query(clGetDeviceInfo, device_, CL_DEVICE_TYPE), sizeof(cl_device_type)},
+        {query(clGetContextInfo, cl_context(context_), CL_CONTEXT_PROPERTIES),
+         list.size() * sizeof list[0]},
+        {query(clGetGLContextInfoKHR, list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR),
+         sizeof(cl_device_id)},
+        {query(clGetMemObjectInfo, cl_mem(memory_), CL_MEM_FLAGS), sizeof(cl_mem_flags)},
+        {query(clGetMemObjectInfo, cl_mem(memory_), CL_MEM_HOST_PTR), sizeof(void*)},
+        {query(clGetEventInfo, cl_event(event), CL_EVENT_COMMAND_TYPE), sizeof(cl_command_type)},
+    };
+    for (const auto& [ask, expected] : rows) {
+        std::array<char, 256> value{};
+        std::size_t size = 0;
+        EXPECT_EQ(ask(0, nullptr, &size), CL_SUCCESS);
+        EXPECT_EQ(size, expected);
+        EXPECT_EQ(ask(size - 1, value.data(), nullptr), CL_INVALID_VALUE);
+        EXPECT_EQ(ask(size, value.data(), nullptr), CL_SUCCESS);
+    }
+    EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
 }
 
 TEST_F(QueriesTest, EventsNameTheirCommand)

@@ -1,5 +1,6 @@
 #include "SharingTest.h"
 
+#include <chrono>
 #include <cstdlib>
 #include <filesystem>
 #include <iterator>
@@ -22,6 +23,16 @@ cl_int statusOf(const Event& event)
 std::ptrdiff_t threadsOfProcess()
 {
     return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {});
+}
+
+bool isSoon(const std::function<bool()>& isSo)
+{
+    for (int i = 0; i < 10000; ++i) {
+        if (isSo())
+            return true;
+        std::this_thread::sleep_for(std::chrono::microseconds(500));
+    }
+    return false;
 }
 
 void onOtherThread(const std::function<void()>& work)

@@ -103,6 +103,9 @@ cl_int statusOf(const Event& event);
 
 std::ptrdiff_t threadsOfProcess();
 
+// Whether `isSo` holds within some seconds, which is the time that other threads may take.
+bool isSoon(const std::function<bool()>& isSo);
+
 // Runs on a thread of its own, which has no OpenGL context, and waits for it.
 void onOtherThread(const std::function<void()>& work);
 
