@@ -77,8 +77,12 @@ cl_int Entry::retain(Kind kind, const void* handle)
 
 cl_int Entry::release(Kind kind, const void* handle)
 {
-    if (object(kind, handle))
+    if (const Object* found = object(kind, handle)) {
+        if (kind == Kind::kMem && found->references == 1)
+            require(!fRuntime.fCommands.isInUse(handle), CL_INVALID_OPERATION,
+                    found->name + " dies while a command uses it");
         fRuntime.fLedger.release(handle);
+    }
     return fStatus;
 }
 
@@ -91,14 +95,84 @@ void* Entry::createHandle(Kind kind)
     return handle;
 }
 
-cl_int Entry::command(cl_command_queue queue, const WaitList& list, cl_event* event)
+Object* Entry::usableMem(cl_mem mem)
+{
+    Object* found = object(Kind::kMem, mem);
+    if (found)
+        require(!found->shared || found->acquired, CL_INVALID_GL_OBJECT, "used without acquire");
+    return found;
+}
+
+CommandOrder::Command Entry::nextCommand(cl_command_queue queue, const WaitList& list)
 {
     object(Kind::kQueue, queue);
     requireWaitList(list);
-    if (ok() && event) {
+    std::vector<unsigned> waits;
+    for (cl_uint i = 0; ok() && i < list.count; ++i)
+        waits.push_back(fRuntime.fLedger.alive(Kind::kEvent, list.items[i])->command);
+    return fRuntime.fCommands.next(queue, waits);
+}
+
+unsigned Entry::addCommand(CommandOrder::Command command, cl_event* event)
+{
+    const bool profiled = fRuntime.fLedger.alive(Kind::kQueue, command.queue)->profiled;
+    const unsigned number = fRuntime.fCommands.add(std::move(command));
+    if (event)
         *event = create<cl_event>(Kind::kEvent);
-        if (*event)
-            fRuntime.fLedger.alive(Kind::kEvent, *event)->statuses = fRuntime.fEventStatuses;
+    if (event && *event) {
+        Object& created = *fRuntime.fLedger.alive(Kind::kEvent, *event);
+        created.statuses = fRuntime.fEventStatuses;
+        created.command = number;
+        created.profiled = profiled;
+    }
+    return number;
+}
+
+cl_int Entry::command(cl_command_queue queue, const WaitList& list, cl_event* event,
+                      const Mems& mems, bool blocking)
+{
+    CommandOrder::Command next = nextCommand(queue, list);
+    std::vector<Object*> shared;
+    for (cl_mem mem : mems) {
+        Object* used = usableMem(mem);
+        if (!used || !used->shared)
+            continue;
+        require(fRuntime.fCommands.precedes(used->acquire, next), CL_INVALID_OPERATION,
+                used->name + " is used before its acquire is complete");
+        shared.push_back(used);
+    }
+    if (!ok())
+        return fStatus;
+    next.mems.assign(mems.begin(), mems.end());
+    const unsigned number = addCommand(std::move(next), event);
+    for (Object* used : shared)
+        used->uses.push_back(number);
+    if (blocking)
+        fRuntime.fCommands.observe(number);
+    return fStatus;
+}
+
+cl_int Entry::changeSide(cl_command_queue queue, const WaitList& list, cl_event* event,
+                         const std::vector<Object*>& objects, bool acquire)
+{
+    CommandOrder::Command next = nextCommand(queue, list);
+    const auto requireAfter = [&](unsigned earlier, const Object& object, const char* what) {
+        require(fRuntime.fCommands.precedes(earlier, next), CL_INVALID_OPERATION,
+                object.name + what);
+    };
+    for (const Object* object : objects) {
+        requireAfter(object->acquire, *object, " changes sides before its acquire is complete");
+        requireAfter(object->release, *object, " changes sides before its release is complete");
+        for (const unsigned use : object->uses)
+            requireAfter(use, *object, " is released before a command that uses it is complete");
+    }
+    if (!ok())
+        return fStatus;
+    const unsigned number = addCommand(std::move(next), event);
+    for (Object* object : objects) {
+        object->acquired = acquire;
+        (acquire ? object->acquire : object->release) = number;
+        object->uses.clear();
     }
     return fStatus;
 }

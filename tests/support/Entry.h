@@ -19,6 +19,7 @@ struct List {
     const T* items;
 };
 using WaitList = List<cl_event>;
+using Mems = std::vector<cl_mem>;
 // A property list that ends with 0.
 struct PropertyList {
     const cl_context_properties* items;
@@ -59,6 +60,12 @@ public:
 
     cl_int retain(Kind kind, const void* handle);
     cl_int release(Kind kind, const void* handle);
+    // Adds what the arguments do not show to the call's line.
+    template <typename T>
+    void describe(const char* what, const List<T>& list)
+    {
+        fLine += what + text(list);
+    }
     // Makes the call's result, unless the call has a status.
     template <typename T>
     T create(Kind kind)
@@ -73,8 +80,22 @@ public:
             *error = fStatus;
         return handle;
     }
-    // Ends an enqueued command: checks its queue and wait list, and makes its event where asked.
-    cl_int command(cl_command_queue queue, const WaitList& list, cl_event* event);
+    // The living memory object that a command may use, or null: a renderer's only if acquired.
+    Object* usableMem(cl_mem mem);
+    // Ends an enqueued command: checks its queue, its wait list and the memory that it uses, and
+    // makes its event if `event` is not null.
+    cl_int command(cl_command_queue queue, const WaitList& list, cl_event* event,
+                   const Mems& mems = {}, bool blocking = false);
+    // Ends an enqueued acquire or release of these objects.
+    cl_int changeSide(cl_command_queue queue, const WaitList& list, cl_event* event,
+                      const std::vector<Object*>& objects, bool acquire);
+    // The host waits for an event, or for all commands of a queue.
+    void waitFor(const Object& event) { fRuntime.fCommands.observe(event.command); }
+    void waitForQueue(cl_command_queue queue) { fRuntime.fCommands.observeQueue(queue); }
+    bool isPending(const Object& event) const
+    {
+        return fRuntime.fCommands.isPending(event.command);
+    }
     // The result that a test has scripted for the next creation from a renderer's buffer, or for
     // the next wait of an OpenGL client.
     std::optional<cl_mem> nextSharedMem() { return std::exchange(fRuntime.fNextSharedMem, {}); }
@@ -106,6 +127,8 @@ private:
     }
     void begin(const char* function, std::initializer_list<std::string> arguments);
     void* createHandle(Kind kind);
+    CommandOrder::Command nextCommand(cl_command_queue queue, const WaitList& list);
+    unsigned addCommand(CommandOrder::Command command, cl_event* event);
 
     InsideRuntime fInside;
     FakeRuntime& fRuntime;

@@ -5,14 +5,10 @@ using namespace scripted;
 
 namespace {
 
-// What a command may do with a memory object: a renderer's buffer only while it is acquired.
-Object* usableMem(Entry& call, cl_mem mem)
+void requireRange(Entry& call, cl_mem mem, std::size_t offset, std::size_t size)
 {
-    Object* object = call.object(Kind::kMem, mem);
-    if (object)
-        call.require(!object->shared || object->acquired, CL_INVALID_GL_OBJECT,
-                     "used without acquire");
-    return object;
+    if (const Object* object = call.usableMem(mem))
+        call.require(offset + size <= object->size, CL_INVALID_VALUE, "beyond the end");
 }
 
 cl_int transfer(const char* function, cl_command_queue queue, cl_mem mem, cl_bool blocking,
@@ -20,9 +16,14 @@ cl_int transfer(const char* function, cl_command_queue queue, cl_mem mem, cl_boo
                 cl_event* event)
 {
     Entry call(function, queue, mem, blocking, offset, size, data, list);
-    if (const Object* object = usableMem(call, mem))
-        call.require(offset + size <= object->size, CL_INVALID_VALUE, "beyond the end");
-    return call.command(queue, list, event);
+    requireRange(call, mem, offset, size);
+    return call.command(queue, list, event, call.ok() ? Mems{mem} : Mems{}, blocking != CL_FALSE);
+}
+
+void complete(Entry& call, Object& event)
+{
+    event.statuses = {CL_COMPLETE};
+    call.waitFor(event);
 }
 
 // A mapping's address: a number of its own that nobody looks behind.
@@ -81,8 +82,8 @@ void* clEnqueueMapBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking, c
 {
     const WaitList list{waitCount, waitList};
     Entry call("clEnqueueMapBuffer", queue, mem, blocking, flags, offset, size, list);
-    Object* object = usableMem(call, mem);
-    call.command(queue, list, event);
+    Object* object = call.usableMem(mem);
+    call.command(queue, list, event, {}, blocking != CL_FALSE);
     const bool mapped = object && call.ok();
     if (mapped)
         object->mapped = true;
@@ -103,6 +104,35 @@ cl_int clEnqueueUnmapMemObject(cl_command_queue queue, cl_mem mem, void* mapping
     return call.status();
 }
 
+cl_int clEnqueueCopyBuffer(cl_command_queue queue, cl_mem source, cl_mem target,
+                           std::size_t sourceOffset, std::size_t targetOffset, std::size_t size,
+                           cl_uint waitCount, const cl_event* waitList, cl_event* event)
+{
+    const WaitList list{waitCount, waitList};
+    Entry call("clEnqueueCopyBuffer", queue, source, target, sourceOffset, targetOffset, size,
+               list);
+    requireRange(call, source, sourceOffset, size);
+    requireRange(call, target, targetOffset, size);
+    return call.command(queue, list, event, call.ok() ? Mems{source, target} : Mems{});
+}
+
+cl_int clEnqueueMarkerWithWaitList(cl_command_queue queue, cl_uint waitCount,
+                                   const cl_event* waitList, cl_event* event)
+{
+    const WaitList list{waitCount, waitList};
+    return Entry("clEnqueueMarkerWithWaitList", queue, list).command(queue, list, event);
+}
+
+cl_int clGetMemObjectInfo(cl_mem mem, cl_mem_info query, std::size_t room, void* value,
+                          std::size_t* size)
+{
+    Entry call("clGetMemObjectInfo", mem, query);
+    const Object* object = call.object(Kind::kMem, mem);
+    call.require(query == CL_MEM_SIZE, CL_INVALID_VALUE, "unknown query");
+    const std::size_t bytes = object ? object->size : 0;
+    return call.answer(query, &bytes, sizeof bytes, room, value, size);
+}
+
 cl_int clRetainEvent(cl_event event)
 {
     return Entry("clRetainEvent", event).retain(Kind::kEvent, event);
@@ -120,7 +150,7 @@ cl_int clWaitForEvents(cl_uint count, const cl_event* events)
     call.require(count > 0, CL_INVALID_VALUE, "for no event");
     call.requireWaitList(list);
     for (cl_uint i = 0; call.ok() && i < count; ++i)
-        call.object(Kind::kEvent, events[i])->statuses = {CL_COMPLETE};
+        complete(call, *call.object(Kind::kEvent, events[i]));
     return call.status();
 }
 
@@ -132,10 +162,27 @@ cl_int clGetEventInfo(cl_event event, cl_event_info query, std::size_t room, voi
     call.require(query == CL_EVENT_COMMAND_EXECUTION_STATUS, CL_INVALID_VALUE, "unknown query");
     if (!call.ok())
         return call.status();
-    const cl_int status = object->statuses.front();
-    if (object->statuses.size() > 1)
+    const bool pending = call.isPending(*object);
+    const cl_int status = pending ? CL_RUNNING : object->statuses.front();
+    if (!pending && object->statuses.size() > 1)
         object->statuses.pop_front();
+    if (status == CL_COMPLETE)
+        call.waitFor(*object);
     return call.answer(query, &status, sizeof status, room, value, size);
+}
+
+cl_int clGetEventProfilingInfo(cl_event event, cl_profiling_info query, std::size_t room,
+                               void* value, std::size_t* size)
+{
+    Entry call("clGetEventProfilingInfo", event, query);
+    const Object* object = call.object(Kind::kEvent, event);
+    if (object)
+        call.require(object->profiled && !call.isPending(*object), CL_PROFILING_INFO_NOT_AVAILABLE,
+                     "not profiled, or not complete");
+    // A microsecond a command, which runs from its start to its end.
+    const cl_ulong nanoseconds =
+        object ? 1000 * cl_ulong{object->command} + (query - CL_PROFILING_COMMAND_QUEUED) : 0;
+    return call.answer(query, &nanoseconds, sizeof nanoseconds, room, value, size);
 }
 
 } // extern "C"

@@ -2,7 +2,27 @@
 // every kernel whose name its source mentions.
 #include "Entry.h"
 
+#include <sstream>
+
 using namespace scripted;
+
+namespace {
+
+// What the source declares in parentheses after the name; nothing if there are none.
+std::vector<KernelArgument> argumentsOf(const std::string& name, const std::string& source)
+{
+    std::vector<KernelArgument> arguments;
+    const std::size_t declaration = source.find(name + '(');
+    if (declaration == std::string::npos)
+        return arguments;
+    const std::size_t begin = declaration + name.size() + 1;
+    std::istringstream list(source.substr(begin, source.find(')', begin) - begin));
+    for (std::string argument; std::getline(list, argument, ',');)
+        arguments.push_back({.isMemory = argument.find('*') != std::string::npos});
+    return arguments;
+}
+
+} // namespace
 
 extern "C" {
 
@@ -64,7 +84,10 @@ cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
     call.require(!object || object->built, CL_INVALID_PROGRAM_EXECUTABLE, "not built");
     if (call.ok() && object && object->source.find(name) == std::string::npos)
         call.answerWith(CL_INVALID_KERNEL_NAME);
-    return call.result(call.create<cl_kernel>(Kind::kKernel), error);
+    const auto kernel = call.create<cl_kernel>(Kind::kKernel);
+    if (kernel && object)
+        call.object(Kind::kKernel, kernel)->arguments = argumentsOf(name, object->source);
+    return call.result(kernel, error);
 }
 
 cl_int clRetainKernel(cl_kernel kernel)

@@ -95,17 +95,26 @@ cl_command_queue clCreateCommandQueue(cl_context context, cl_device_id device,
     Entry call("clCreateCommandQueue", context, device, properties);
     call.object(Kind::kContext, context);
     call.object(Kind::kDevice, device);
-    return call.result(call.create<cl_command_queue>(Kind::kQueue), error);
+    const auto queue = call.create<cl_command_queue>(Kind::kQueue);
+    if (queue)
+        call.object(Kind::kQueue, queue)->profiled = (properties & CL_QUEUE_PROFILING_ENABLE) != 0;
+    return call.result(queue, error);
 }
 
 cl_int clFinish(cl_command_queue queue)
 {
-    return Entry("clFinish", queue).command(queue, {}, nullptr);
+    Entry call("clFinish", queue);
+    call.object(Kind::kQueue, queue);
+    if (call.ok())
+        call.waitForQueue(queue);
+    return call.status();
 }
 
 cl_int clFlush(cl_command_queue queue)
 {
-    return Entry("clFlush", queue).command(queue, {}, nullptr);
+    Entry call("clFlush", queue);
+    call.object(Kind::kQueue, queue);
+    return call.status();
 }
 
 cl_int clReleaseContext(cl_context context)

@@ -42,8 +42,13 @@ cl_mem createShared(const SharingNames& names, cl_context context, cl_mem_flags 
     if (scripted)
         return call.result(*scripted, error);
     const auto mem = call.create<cl_mem>(Kind::kMem);
-    if (mem)
-        call.object(Kind::kMem, mem)->shared = true;
+    if (mem) {
+        constexpr std::size_t kUsualBytes = 1 << 20;
+        const auto bytes = call.world().sharedBytes.find(resource);
+        Object* object = call.object(Kind::kMem, mem);
+        object->shared = true;
+        object->size = bytes == call.world().sharedBytes.end() ? kUsualBytes : bytes->second;
+    }
     return call.result(mem, error);
 }
 
@@ -65,10 +70,7 @@ cl_int changeSide(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_
                                    kAcquire ? "already acquired" : "not acquired"))
             objects.push_back(object);
     }
-    call.command(queue, list, event);
-    for (Object* object : objects)
-        object->acquired = call.ok() ? kAcquire : object->acquired;
-    return call.status();
+    return call.changeSide(queue, list, event, objects, kAcquire);
 }
 
 cl_mem createFromGLBuffer(cl_context context, cl_mem_flags flags, cl_GLuint buffer, cl_int* error)

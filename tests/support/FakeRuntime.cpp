@@ -16,6 +16,7 @@ void FakeRuntime::describe(const World& world)
 {
     fWorld = world;
     fLedger = {};
+    fCommands = {};
     fPlans.clear();
     fPlatforms.clear();
     fDevices.clear();
@@ -55,6 +56,16 @@ unsigned FakeRuntime::references(Kind kind, const void* handle)
 {
     const Object* object = fLedger.alive(kind, handle);
     return object ? object->references : 0;
+}
+
+std::vector<std::string> FakeRuntime::acquired() const
+{
+    std::vector<std::string> names;
+    fLedger.forEach([&names](const Object& object) {
+        if (object.acquired)
+            names.push_back(object.name);
+    });
+    return names;
 }
 
 std::size_t FakeRuntime::memSize(cl_mem mem)

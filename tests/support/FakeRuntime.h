@@ -9,6 +9,7 @@
 // nobody else calls.
 #pragma once
 
+#include "CommandOrder.h"
 #include "Ledger.h"
 #include "World.h"
 
@@ -45,7 +46,9 @@ public:
     // The calls since the last take, OpenCL's, OpenGL's and the host's in one order, each as text:
     //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, ptr, [event#1]) = event#3
     //     clCreateBuffer(context#1, 4, 64, null) ! -4
-    // Lists are in brackets; the first form names what the call made, the second its status.
+    //     clEnqueueNDRangeKernel(queue#1, kernel#1, 64, 64, []) on [mem#1, mem#2] = event#4
+    // Lists are in brackets; the first form names what the call made, the second its status, the
+    // third the memory objects in the kernel's arguments.
     std::vector<std::string> takeCalls() { return std::exchange(fCalls, {}); }
     // Calls of OpenCL and OpenGL since describe.
     unsigned callCount() const { return fCallCount; }
@@ -66,6 +69,12 @@ public:
     unsigned references(Kind kind, const void* handle);
     // Bytes of a living memory object.
     std::size_t memSize(cl_mem mem);
+
+    // The renderer's buffers that are acquired, by name.
+    std::vector<std::string> acquired() const;
+    // Whether commands stay incomplete until somebody waits for them, or until completeCommands.
+    void holdCommands(bool hold) { fCommands.hold(hold); }
+    void completeCommands() { fCommands.completeAll(); }
 
     // What the queries of every event made from now on answer, in turn; the last one stays. The
     // default is one CL_COMPLETE. Waiting for an event completes it.
@@ -96,6 +105,7 @@ private:
     QuietLock fLock;
     World fWorld;
     Ledger fLedger;
+    CommandOrder fCommands;
     std::vector<Plan> fPlans;
     std::vector<cl_platform_id> fPlatforms; // in the world's order, as the devices
     std::vector<cl_device_id> fDevices;

@@ -17,19 +17,32 @@ namespace scripted {
 enum class Kind { kPlatform, kDevice, kContext, kQueue, kMem, kEvent, kProgram, kKernel, kSync };
 inline constexpr std::size_t kKindCount = 9;
 
+struct KernelArgument {
+    bool isMemory = false;
+    bool set = false;
+    cl_mem mem = nullptr; // borrowed
+};
+
 struct Object {
     Kind kind;
     unsigned ordinal; // counts from 1 within the kind
     std::string name; // "mem#2"
     unsigned references = 1;
 
-    std::size_t index = 0;         // platforms and devices: place in the world
-    std::size_t size = 0;          // memory objects: bytes
-    bool shared = false;           // memory objects: made from a renderer's buffer
-    bool acquired = false;         // shared memory objects
-    bool mapped = false;           // memory objects
-    bool built = false;            // programs: built successfully
-    std::string source{};          // programs
+    std::size_t index = 0; // platforms and devices: place in the world
+    std::size_t size = 0;  // memory objects: bytes
+    bool shared = false;   // memory objects: made from a renderer's buffer
+    bool acquired = false; // shared memory objects
+    // Of shared memory objects, numbers of commands: the last acquire, its uses, the last release.
+    unsigned acquire = 0;
+    std::vector<unsigned> uses{};
+    unsigned release = 0;
+    bool mapped = false;                     // memory objects
+    bool built = false;                      // programs: built successfully
+    std::string source{};                    // programs
+    std::vector<KernelArgument> arguments{}; // kernels
+    bool profiled = false;                   // queues, and the events of their commands
+    unsigned command = 0;                    // events: its number
     std::deque<cl_int> statuses{}; // events: what the next queries answer; the last one stays
 };
 
@@ -43,6 +56,14 @@ public:
     Object* alive(Kind kind, const void* handle);
     // Takes one reference; the object dies with the last one.
     void release(const void* handle);
+
+    // Calls `use` with every living object.
+    template <typename Use>
+    void forEach(const Use& use) const
+    {
+        for (const auto& [handle, object] : fAlive)
+            use(object);
+    }
 
     // "mem#2" for anything that was ever handed out (dead or alive), "null", or "ptr".
     std::string name(const void* handle) const;

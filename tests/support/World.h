@@ -3,6 +3,8 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
+#include <map>
 #include <optional>
 #include <set>
 #include <string>
@@ -43,6 +45,8 @@ struct World {
     std::vector<std::size_t> d3dDevices{0};        // belong to the Direct3D 11 device
     std::set<std::string> missing;                 // extension entry points left out
     std::set<cl_uint> emptyAnswers;                // queries answered with size 0, unwritten
+    // Bytes of the renderer's buffers, by name or address; 1 MiB without an entry.
+    std::map<std::uintptr_t, std::size_t> sharedBytes;
     LookUp lookUp = LookUp::kAnswers;
     std::string buildLog = "line 1: 100%s wrong"; // of a program that does not build
 };

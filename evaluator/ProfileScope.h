@@ -1,11 +1,11 @@
-// An event of the host's profiler for as long as a scope lasts.
+// An event of the host's profiler for as long as a scope lasts. Internal.
 #pragma once
 
 #include "host/Profiler.h"
 
 #include <optional>
 
-namespace viewer {
+namespace vyra {
 
 class ProfileScope {
 public:
@@ -28,4 +28,4 @@ private:
     std::optional<profiler::EventId> fEvent;
 };
 
-} // namespace viewer
+} // namespace vyra

@@ -1,0 +1,59 @@
+#include "evaluator/CommandTimeline.h"
+
+#include <limits>
+#include <utility>
+
+namespace vyra {
+namespace {
+
+// Readings of both clocks. The first call on a queue can take milliseconds, later ones do not.
+constexpr int kClockComparisons = 16;
+
+} // namespace
+
+CommandTimeline::CommandTimeline(const OpenCLFunctions& cl, cl_command_queue queue,
+                                 std::string track, const EvaluatorSettings& settings)
+    : fCL(cl), fTrack(std::move(track)), fSettings(settings)
+{
+    // The device notes when a marker is queued, which is between two readings of the host's clock.
+    // The closest pair of readings counts.
+    std::int64_t closest = std::numeric_limits<std::int64_t>::max();
+    for (int comparison = 0; comparison < kClockComparisons; ++comparison) {
+        AutoCLObject<cl_event> marker;
+        const std::int64_t before = fSettings.traceClock();
+        fCL.clEnqueueMarkerWithWaitList(queue, 0, nullptr, marker.receive());
+        const std::int64_t after = fSettings.traceClock();
+        const cl_event event = marker.get();
+        if (!event || fCL.clWaitForEvents(1, &event) != CL_SUCCESS || after - before >= closest)
+            continue;
+        closest = after - before;
+        fHostMinusDevice = before + closest / 2 - time(event, CL_PROFILING_COMMAND_QUEUED);
+    }
+}
+
+void CommandTimeline::add(const char* name, const AutoCLObject<cl_event>& event)
+{
+    if (event.get())
+        fCommands.push_back({name, event});
+}
+
+void CommandTimeline::record()
+{
+    for (const Command& command : fCommands) {
+        const cl_event event = command.event.get();
+        if (fCL.clWaitForEvents(1, &event) == CL_SUCCESS)
+            fSettings.traceCommand(fTrack, command.name,
+                                   time(event, CL_PROFILING_COMMAND_START) + fHostMinusDevice,
+                                   time(event, CL_PROFILING_COMMAND_END) + fHostMinusDevice);
+    }
+    fCommands.clear();
+}
+
+std::int64_t CommandTimeline::time(cl_event event, cl_profiling_info moment) const
+{
+    cl_ulong nanoseconds = 0;
+    fCL.clGetEventProfilingInfo(event, moment, sizeof(nanoseconds), &nanoseconds, nullptr);
+    return static_cast<std::int64_t>(nanoseconds);
+}
+
+} // namespace vyra

@@ -1,0 +1,50 @@
+// The numbers of one evaluation for all kernels of a queue, in one device buffer. Internal.
+#pragma once
+
+#include "buffers/TopenCLBuffer.h"
+
+#include <cstddef>
+#include <vector>
+
+#include <CL/cl.h>
+
+namespace vyra {
+
+// Collects the bytes that deformers pass with KernelArguments::frame and uploads what changed since
+// the last evaluation with at most one command. Bytes that are appended in the same order and sizes
+// as before keep their place.
+//
+// Works with one in-order queue: an upload runs after all kernels that were enqueued before and
+// read the former bytes. One thread at a time uses an object.
+class FrameBlock {
+public:
+    // In the context of the runtime object.
+    FrameBlock();
+    // Waits for a pending upload.
+    ~FrameBlock();
+    FrameBlock(const FrameBlock&) = delete;
+    FrameBlock& operator=(const FrameBlock&) = delete;
+
+    // Starts an evaluation.
+    void begin();
+    // Copies the bytes. Returns the index of their first float4.
+    cl_uint append(const void* bytes, std::size_t sizeInBytes);
+    // Uploads what changed; `event` receives the command's event if there is a command. Returns an
+    // OpenCL status.
+    cl_int upload(cl_command_queue queue, AutoCLObject<cl_event>& event);
+
+    // The memory that kernels read after upload(). Null if nothing was appended.
+    cl_mem memory() const { return fDevice.buffer().get(); }
+
+private:
+    void change(std::size_t begin, const void* bytes, std::size_t sizeInBytes);
+
+    std::vector<std::byte> fHost; // what the device holds, or is about to receive
+    TopenCLBuffer fDevice;
+    std::size_t fEnd = 0; // of the bytes appended in this evaluation
+    std::size_t fChangedBegin = 0;
+    std::size_t fChangedEnd = 0; // equal to fChangedBegin: nothing changed
+    bool fUploadPending = false; // an earlier upload may still read fHost
+};
+
+} // namespace vyra

@@ -1,0 +1,82 @@
+// One pass of a deformer: its kernel object and the arguments of the kernel. Internal.
+#pragma once
+
+#include "evaluator/Deformer.h"
+#include "evaluator/FrameBlock.h"
+#include "evaluator/KernelArguments.h"
+#include "evaluator/KernelLibrary.h"
+#include "evaluator/OpenCLFunctions.h"
+#include "evaluator/Status.h"
+
+#include "diagnostics/AutoCLEventList.h"
+#include "diagnostics/AutoCLObject.h"
+
+#include <array>
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include <CL/cl.h>
+
+namespace vyra {
+
+// Positions and normals that a kernel reads or writes.
+struct VertexMemory {
+    cl_mem positions = nullptr;
+    cl_mem normals = nullptr;
+};
+
+// Owns a kernel object, so that arguments that did not change are set once. One thread at a time
+// uses an object.
+class KernelPass final : private KernelArguments {
+public:
+    // Borrows everything.
+    KernelPass(const OpenCLFunctions& cl, Deformer& deformer, unsigned pass);
+    ~KernelPass();
+
+    // Creates the kernel if there is none yet, if the deformer asks for another one, or if its file
+    // was replaced.
+    Status prepare(KernelLibrary& library);
+
+    // Sets the deformer's arguments and copies its numbers of this evaluation to `frame`.
+    Status setArguments(FrameBlock& frame);
+
+    // Enqueues one work-item per vertex after `waits`. Returns an OpenCL status; `event` receives
+    // the command's event on success.
+    cl_int enqueue(cl_command_queue queue, cl_uint vertexCount, const VertexMemory& input,
+                   const VertexMemory& output, cl_mem frame, const AutoCLEventList& waits,
+                   AutoCLObject<cl_event>& event);
+
+private:
+    // The last value of an argument. A value that does not fit is set in each evaluation.
+    struct Argument {
+        std::size_t sizeInBytes = 0; // 0: not set yet, or not kept
+        std::array<std::byte, 64> bytes{};
+    };
+
+    void setValue(const void* value, std::size_t sizeInBytes) override;
+    void setFrame(const void* bytes, std::size_t sizeInBytes) override;
+    void constant(const ConstantArray& array) override;
+    void set(cl_uint index, const void* value, std::size_t sizeInBytes);
+    bool isCurrent(const KernelSource& source, const KernelLibrary& library) const;
+    void giveBack();
+
+    const OpenCLFunctions& fCL;
+    Deformer& fDeformer;
+    unsigned fPass;
+    AutoCLObject<cl_kernel> fKernel;
+    std::string fFile; // of the kernel, with the two members below
+    std::string fFunction;
+    std::string fOptions;
+    unsigned fGeneration = 0;
+    std::size_t fWorkGroupSize = 0;
+    std::vector<Argument> fArguments;
+
+    // While the deformer's arguments are set.
+    FrameBlock* fFrame = nullptr;
+    cl_uint fIndex = 0;
+    cl_int fStatus = CL_SUCCESS;
+    std::vector<cl_uint> fFrameArguments; // indices of the arguments that receive the frame memory
+};
+
+} // namespace vyra

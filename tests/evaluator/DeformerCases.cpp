@@ -1,0 +1,125 @@
+#include "DeformerCases.h"
+
+#include "evaluator/MorphDeformer.h"
+#include "evaluator/SkinDeformer.h"
+#include "evaluator/SmoothDeformer.h"
+#include "evaluator/TwistDeformer.h"
+#include "evaluator/WaveDeformer.h"
+
+#include <cmath>
+
+namespace {
+
+using namespace vyra;
+
+// Neither a rotation nor symmetrical, and not at the origin.
+constexpr MatrixRows kSpace{0.5f, 0.1f, 0, 1, 0, 0.7f, 0.2f, -1, 0.3f, 0, 0.9f, 0.5f};
+
+std::unique_ptr<SkinDeformer> skin(const MeshGeometry& geometry, bool mirrored)
+{
+    const float side = mirrored ? -1.0f : 1.0f;
+    std::vector<SkinWeights::BoneIndices> indices;
+    std::vector<SkinWeights::BoneWeights> weights;
+    for (unsigned i = 0; i < geometry.rest.vertexCount(); ++i) {
+        const unsigned group = i / kProbes;
+        const float part = static_cast<float>(group % 5) / 8;
+        indices.push_back({group % 3, 2, 0, 1});
+        weights.push_back({0.125f, part, 0.625f - part, 0.25f});
+    }
+    auto result = std::make_unique<SkinDeformer>(SkinWeights(indices, weights));
+    result->bones = {{side * 0.8f, -0.6f, 0, 1, side * 0.6f, 0.8f, 0, 2, 0, 0, 1, 3},
+                     {side, 0.5f, 0, 0, 0, 1, 0, -1, 0, 0.2f, 1, 0},
+                     {side * 2, 0, 0, 0, 0, 0.7f, -0.7f, 0, 0, 0.7f, 0.7f, 1}};
+    return result;
+}
+
+std::unique_ptr<SkinDeformer> skinInDouble(const MeshGeometry& geometry)
+{
+    auto result = skin(geometry, false);
+    result->precision = SkinDeformer::kDouble;
+    return result;
+}
+
+std::unique_ptr<TwistDeformer> twist()
+{
+    auto result = std::make_unique<TwistDeformer>();
+    result->angle = 2;
+    result->space = kSpace;
+    return result;
+}
+
+std::unique_ptr<WaveDeformer> wave(WaveDeformer::Axis displacement, float amplitude)
+{
+    auto result = std::make_unique<WaveDeformer>();
+    result->amplitude = amplitude;
+    result->phase = 0.7f;
+    result->displacement = displacement;
+    result->space = kSpace;
+    return result;
+}
+
+// `targets` morph targets, the second of which has the weight 0 and is not a number.
+std::unique_ptr<MorphDeformer> morph(const MeshGeometry& geometry, unsigned targets,
+                                     bool withNormals)
+{
+    std::vector<MorphTarget> list(targets);
+    for (unsigned t = 0; t < targets; ++t) {
+        for (const Vector3& p : geometry.rest.positions) {
+            const float x = t == 1 ? NAN : std::sin(static_cast<float>(t + 1) * p.x);
+            list[t].positionDeltas.push_back({x, p.y, p.z * x});
+            if (withNormals && t % 3 == 0)
+                list[t].normalDeltas.push_back({0, x, p.z});
+        }
+    }
+    auto result = std::make_unique<MorphDeformer>(MorphTargets(list));
+    for (unsigned t = 0; t < targets; ++t)
+        result->weights[t] = t == 1 ? 0 : 0.1f + 0.05f * static_cast<float>(t);
+    result->strength = 0.5f;
+    return result;
+}
+
+std::unique_ptr<SmoothDeformer> smooth(const MeshGeometry& geometry, unsigned iterations)
+{
+    auto result = std::make_unique<SmoothDeformer>(SmoothTopology(geometry));
+    result->iterations = iterations;
+    result->weight = 0.75f;
+    return result;
+}
+
+} // namespace
+
+const std::vector<DeformerCase>& deformerCases()
+{
+    using Mesh = const MeshGeometry&;
+    static const std::vector<DeformerCase> cases = {
+        {"skin", [](Mesh m) { return skin(m, false); }, true},
+        {"skin, mirrored", [](Mesh m) { return skin(m, true); }, true},
+        {"skin, double", [](Mesh m) { return skinInDouble(m); }, true},
+        {"twist", [](Mesh) { return twist(); }, true},
+        {"wave", [](Mesh) { return wave(WaveDeformer::kY, 0.05f); }, true},
+        {"wave, compression", [](Mesh) { return wave(WaveDeformer::kX, 0.05f); }, true},
+        {"wave, inside out", [](Mesh) { return wave(WaveDeformer::kX, 0.3f); }, true},
+        {"morph, one pass", [](Mesh m) { return morph(m, 5, true); }, false},
+        {"morph, three passes", [](Mesh m) { return morph(m, 18, true); }, false},
+        {"morph, positions", [](Mesh m) { return morph(m, 10, false); }, false},
+        {"smooth, once", [](Mesh m) { return smooth(m, 1); }, false},
+        {"smooth, seven times", [](Mesh m) { return smooth(m, 7); }, false}};
+    return cases;
+}
+
+MeshGeometry makeSheet(unsigned side)
+{
+    MeshGeometry sheet;
+    for (unsigned i = 0; i < side * side; ++i) {
+        const float x = static_cast<float>(i % side) / static_cast<float>(side - 1);
+        const float z = static_cast<float>(i / side) / static_cast<float>(side - 1);
+        const float slope = 1.5f * std::cos(5 * x);
+        const float length = std::sqrt(1 + slope * slope);
+        sheet.rest.positions.push_back({x, 0.3f * std::sin(5 * x), z});
+        sheet.rest.normals.push_back({-slope / length, 1 / length, 0});
+        if (i % side + 1 < side && i / side + 1 < side)
+            for (const unsigned corner : {0U, side, 1U, 1U, side, side + 1})
+                sheet.triangles.push_back(i + corner);
+    }
+    return sheet;
+}

@@ -1,0 +1,23 @@
+// Deformers with settings that use all of their parts, for tests that run over all of them.
+#pragma once
+
+#include "evaluator/Deformer.h"
+
+#include <functional>
+#include <memory>
+#include <vector>
+
+struct DeformerCase {
+    const char* name;
+    std::function<std::unique_ptr<vyra::Deformer>(const vyra::MeshGeometry&)> make;
+    // Whether a point moves by its own place alone, and normals are those of the moved surface.
+    // Vertices that belong together are kProbes in a row.
+    bool isSmoothMap;
+};
+
+inline constexpr unsigned kProbes = 6;
+
+const std::vector<DeformerCase>& deformerCases();
+
+// A wavy sheet. `side` vertices along each edge.
+vyra::MeshGeometry makeSheet(unsigned side);

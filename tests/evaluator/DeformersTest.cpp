@@ -1,0 +1,357 @@
+// The CPU sides of skin, morph, twist and wave against closed forms and finite differences, and the
+// settings that deformers refuse.
+#include "DeformerCases.h"
+#include "evaluator/MorphDeformer.h"
+#include "evaluator/SkinDeformer.h"
+#include "evaluator/SmoothDeformer.h"
+#include "evaluator/TwistDeformer.h"
+#include "evaluator/VectorMath.h"
+#include "evaluator/WaveDeformer.h"
+
+#include <cmath>
+#include <limits>
+#include <numbers>
+#include <random>
+#include <utility>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using namespace vyra;
+using testing::HasSubstr;
+
+constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+constexpr float kPi = std::numbers::pi_v<float>;
+constexpr float kTolerance = 1e-6f;
+
+void expectNear(const Vector3& actual, const Vector3& expected, double tolerance = kTolerance)
+{
+    EXPECT_LT(length(wide(actual) - wide(expected)), tolerance)
+        << actual.x << ' ' << actual.y << ' ' << actual.z << ", expected " << expected.x << ' '
+        << expected.y << ' ' << expected.z;
+}
+
+MeshGeometry vertexAt(const Vector3& position, const Vector3& normal)
+{
+    MeshGeometry mesh;
+    mesh.rest = {{position}, {normal}};
+    return mesh;
+}
+
+MatrixRows moved(float x, float y, float z)
+{
+    return {1, 0, 0, x, 0, 1, 0, y, 0, 0, 1, z};
+}
+
+std::unique_ptr<SkinDeformer> skin(const SkinWeights& weights, std::vector<MatrixRows> bones)
+{
+    auto result = std::make_unique<SkinDeformer>(weights);
+    result->bones = std::move(bones);
+    return result;
+}
+
+std::unique_ptr<SkinDeformer> skin(const MatrixRows& bone)
+{
+    return skin(SkinWeights({{0, 0, 0, 0}}, {{1, 0, 0, 0}}), {bone});
+}
+
+std::unique_ptr<TwistDeformer> twist(float angle, const MatrixRows& space = kIdentityRows)
+{
+    auto result = std::make_unique<TwistDeformer>();
+    result->angle = angle;
+    result->space = space;
+    return result;
+}
+
+// Along x, 4 long, 0.5 high along y.
+std::unique_ptr<WaveDeformer> wave(float phase, const MatrixRows& space = kIdentityRows)
+{
+    auto result = std::make_unique<WaveDeformer>();
+    result->amplitude = 0.5f;
+    result->wavelength = 4;
+    result->phase = phase;
+    result->space = space;
+    return result;
+}
+
+std::unique_ptr<MorphDeformer> morph(const std::vector<MorphTarget>& targets,
+                                     std::vector<float> weights)
+{
+    auto result = std::make_unique<MorphDeformer>(MorphTargets(targets));
+    result->weights = std::move(weights);
+    return result;
+}
+
+TEST(Deformers, VertexGoesWhereTheFormulaPutsIt)
+{
+    const Vector3 up{0, 1, 0};
+    const float slope = kPi / 4; // of the wave where it crosses 0
+    const SkinWeights fourBones({{4, 0, 2, 1}}, {{0.5f, 0.25f, 0.125f, 0.125f}});
+    const std::vector<MatrixRows> fiveBones = {moved(8, 0, 0), moved(0, 8, 0), moved(0, 0, 8),
+                                               moved(99, 99, 99), moved(-4, 4, 0)};
+    const std::vector<MorphTarget> targets = {
+        {{{1, 0, 0}}, {{0, 0, 3}}}, {{{0, 2, 0}}, {}}, {{{kNan, 0, 0}}, {}}};
+    const struct {
+        const char* name;
+        std::unique_ptr<Deformer> deformer;
+        Vector3 position, normal, expectedPosition, expectedNormal;
+    } rows[] = {
+        {"identity", skin(kIdentityRows), {1, 2, 3}, up, {1, 2, 3}, up},
+        {"translation", skin(moved(5, 6, 7)), {1, 2, 3}, up, {6, 8, 10}, up},
+        {"rotation",
+         skin({0, -1, 0, 0, 1, 0, 0, 0, 0, 0, 1, 0}),
+         {1, 2, 3},
+         up,
+         {-2, 1, 3},
+         {-1, 0, 0}},
+        {"mirror",
+         skin({-1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}),
+         {1, 2, 3},
+         {0.6f, 0.8f, 0},
+         {-1, 2, 3},
+         {-0.6f, 0.8f, 0}},
+        {"shear",
+         skin({1, 1, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}),
+         {1, 2, 3},
+         {1, 0, 0},
+         {3, 2, 3},
+         {std::sqrt(0.5f), -std::sqrt(0.5f), 0}},
+        {"collapse", skin({0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3}), {1, 2, 3}, up, {1, 2, 3}, {}},
+        // Half of (-4, 4, 0), a quarter of (8, 0, 0), an eighth of (0, 0, 8) and of (0, 8, 0).
+        {"four bones", skin(fourBones, fiveBones), {1, 2, 3}, up, {1, 5, 4}, up},
+        {"quarter turn",
+         twist(kPi / 2),
+         {1, 1, 0},
+         {0, 0, 1},
+         {0, 1, -1},
+         {1 / std::hypot(1.0f, kPi / 2), kPi / 2 / std::hypot(1.0f, kPi / 2), 0}},
+        // Half as large, with the axis at x = 1.
+        {"quarter turn in a space",
+         twist(kPi / 2, {0.5f, 0, 0, -0.5f, 0, 0.5f, 0, 0, 0, 0, 0.5f, 0}),
+         {2, 2, 0},
+         up,
+         {1, 2, -1},
+         up},
+        {"crest", wave(0), {1, 2, 3}, up, {1, 2.5f, 3}, up},
+        {"crossing",
+         wave(kPi / 2),
+         {1, 2, 3},
+         up,
+         {1, 2, 3},
+         {-slope / std::hypot(1.0f, slope), 1 / std::hypot(1.0f, slope), 0}},
+        {"crest in a space",
+         wave(0, {0.5f, 0, 0, 0, 0, 0.5f, 0, 0, 0, 0, 0.5f, 0}),
+         {2, 2, 3},
+         up,
+         {2, 3, 3},
+         up},
+        {"two targets of three",
+         morph(targets, {0.5f, 2, 0}),
+         {1, 2, 3},
+         {0, 0, -1},
+         {1.5f, 6, 3},
+         {0, 0, 1}},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.name);
+        const MeshGeometry mesh = vertexAt(row.position, row.normal);
+        ASSERT_EQ(row.deformer->mismatch(mesh), "");
+        Surface surface = mesh.rest;
+        row.deformer->deform(mesh, surface);
+        expectNear(surface.positions[0], row.expectedPosition);
+        expectNear(surface.normals[0], row.expectedNormal);
+    }
+}
+
+// A point, four points next to it in the plane of its normal, and one above.
+class Probe {
+public:
+    static constexpr float kStep = 0.01f;
+
+    explicit Probe(std::mt19937& random)
+    {
+        std::uniform_real_distribution<double> number(-1, 1);
+        const auto next = [&] { return Vector{number(random), number(random), number(random)}; };
+        fPosition = next();
+        fNormal = normalised(next());
+        fAlong = normalised(cross(fNormal, next()));
+    }
+
+    void appendTo(Surface& surface) const
+    {
+        const Vector across = cross(fNormal, fAlong);
+        for (const Vector& offset : {Vector{}, fAlong, -1 * fAlong, across, -1 * across, fNormal}) {
+            surface.positions.push_back(narrow(fPosition + double{kStep} * offset));
+            surface.normals.push_back(narrow(fNormal));
+        }
+    }
+
+    // The normal of the deformed points, which begin at `first`.
+    static Vector3 normalOf(const Surface& surface, std::size_t first)
+    {
+        const auto point = [&](std::size_t i) { return wide(surface.positions[first + i]); };
+        const Vector normal = normalised(cross(point(1) - point(2), point(3) - point(4)));
+        return narrow((dot(normal, point(5) - point(0)) < 0 ? -1 : 1) * normal);
+    }
+
+private:
+    Vector fPosition, fNormal, fAlong;
+};
+
+TEST(Deformers, NormalsMatchFiniteDifferencesOfTheDeformedSurface)
+{
+    constexpr unsigned kSamples = 200;
+    std::mt19937 random(1);
+    MeshGeometry mesh;
+    for (unsigned i = 0; i < kSamples; ++i)
+        Probe(random).appendTo(mesh.rest);
+    static_assert(kProbes == 6);
+    for (const DeformerCase& row : deformerCases()) {
+        if (!row.isSmoothMap)
+            continue;
+        SCOPED_TRACE(row.name);
+        Surface surface = mesh.rest;
+        row.make(mesh)->deform(mesh, surface);
+        unsigned near = 0;
+        for (std::size_t first = 0; first < surface.vertexCount(); first += kProbes) {
+            const Vector difference =
+                wide(surface.normals[first]) - wide(Probe::normalOf(surface, first));
+            near += length(difference) < 0.02 ? 1 : 0;
+            EXPECT_NEAR(length(wide(surface.normals[first])), 1, kTolerance);
+        }
+        // Next to a fold the probe's points lie on both sides of it.
+        EXPECT_GE(near, std::string(row.name) == "wave, inside out" ? kSamples - 20 : kSamples);
+    }
+}
+
+TEST(SkinWeights, HeaviestFourAreKeptAndAddUpToOne)
+{
+    using Influences = std::vector<SkinWeights::Influence>;
+    const struct {
+        Influences given;
+        SkinWeights::BoneIndices bones;
+        SkinWeights::BoneWeights weights;
+    } rows[] = {
+        {{{7, 2}}, {7, 7, 7, 7}, {1, 0, 0, 0}},
+        {{{1, 0.2f}, {2, 0.6f}}, {2, 1, 2, 2}, {0.75f, 0.25f, 0, 0}},
+        {{{1, 1}, {2, 4}, {3, 2}, {4, 0.5f}, {5, 1}, {6, 1}},
+         {2, 3, 1, 5},
+         {.5f, .25f, .125f, .125f}},
+        {{{9, 0}, {3, 1}}, {3, 3, 3, 3}, {1, 0, 0, 0}},
+    };
+    for (const auto& row : rows) {
+        const SkinWeights weights({row.given});
+        EXPECT_EQ(weights.problem(), "");
+        EXPECT_EQ(weights.bones().values<SkinWeights::BoneIndices>()[0], row.bones);
+        EXPECT_THAT(weights.weights().values<SkinWeights::BoneWeights>()[0],
+                    testing::Pointwise(testing::FloatNear(1e-7f), row.weights));
+        EXPECT_EQ(weights.highestBone(), *std::max_element(row.bones.begin(), row.bones.end()));
+    }
+}
+
+TEST(SkinWeights, FourGivenWeightsAreScaledAndUnusedBonesIgnored)
+{
+    const SkinWeights weights({{5, 99, 1, 99}}, {{0.5f, 0, 0.495f, 0}});
+    EXPECT_EQ(weights.problem(), "");
+    EXPECT_EQ(weights.highestBone(), 5u);
+    EXPECT_THAT(weights.bones().values<std::uint32_t>(), testing::ElementsAre(5, 5, 1, 5));
+    EXPECT_NEAR(weights.weights().values<float>()[0], 0.5 / 0.995, 1e-7);
+}
+
+TEST(Deformers, SettingsThatDoNotFitAreNamed)
+{
+    using Lists = std::vector<std::vector<SkinWeights::Influence>>;
+    const MatrixRows flat{1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 0, 0};
+    const MatrixRows notANumber{kNan, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0};
+    const SkinWeights one({{0, 2, 0, 0}}, {{0.5f, 0.5f, 0, 0}});
+    const auto smooth = [](std::vector<std::uint32_t> triangles) {
+        MeshGeometry mesh = vertexAt({}, {});
+        mesh.triangles = std::move(triangles);
+        return std::make_unique<SmoothDeformer>(SmoothTopology(mesh));
+    };
+    const auto with = [](auto deformer, auto&& change) {
+        change(*deformer);
+        return deformer;
+    };
+    const std::pair<std::unique_ptr<Deformer>, const char*> rows[] = {
+        {skin(SkinWeights(), {}), "skin weights for 0 vertices, and the mesh has 1"},
+        {skin(one, {moved(0, 0, 0), moved(0, 0, 0)}), "refer to bone 2, and there are 2"},
+        {skin(SkinWeights({{}, {}}, {{1, 0, 0, 0}}), {}),
+         "indices for 2 vertices and weights for 1"},
+        {skin(SkinWeights({{}}, {{0.5f, 0.4f, 0, 0}}), {}), "vertex 0 add up to 0.9"},
+        {skin(SkinWeights({{}}, {{1.5f, -0.5f, 0, 0}}), {}),
+         "vertex 0 is negative or not a number"},
+        {skin(SkinWeights({{}}, {{kNan, 1, 0, 0}}), {}), "vertex 0 is negative or not a number"},
+        {skin(SkinWeights(Lists{{{0, 1}}, {{0, kNan}}}), {}),
+         "vertex 1 is negative or not a number"},
+        {skin(SkinWeights(Lists{{{0, 1}}, {}}), {}), "the weights of vertex 1 are all 0"},
+        {with(skin(moved(0, 0, 0)), [](auto& d) { d.precision = 2; }), "not 2"},
+        {morph({{{{}}, {}}}, {}), "0 weights and 1 morph targets"},
+        {morph({{{{}, {}}, {}}}, {1}), "targets have 2 vertices, and the mesh has 1"},
+        {morph({{{{}}, {}}, {{{}, {}}, {}}}, {1, 1}), "target 1 has 2 positions"},
+        {morph({{{{}}, {{}, {}}}}, {1}), "target 0 has 2 normals and 1 positions"},
+        {morph({{{{}}, {}}}, {kNan}), "not a finite number"},
+        {twist(1, flat), "no inverse"},
+        {twist(1, notANumber), "no inverse"},
+        {wave(0, flat), "no inverse"},
+        {with(wave(0), [](auto& d) { d.wavelength = 0; }), "the wavelength is 0"},
+        {with(wave(0), [](auto& d) { d.direction = 3; }), "axes from 0 to 2"},
+        {std::make_unique<SmoothDeformer>(SmoothTopology()), "topology has 0 vertices"},
+        {smooth({0, 0}), "2 vertex indices"},
+        {smooth({0, 0, 0, 0, 1, 0}), "triangle 1 refers to vertex 1"},
+        {with(smooth({}), [](auto& d) { d.weight = 1.5f; }), "the weight is 1.5"},
+        {with(smooth({}), [](auto& d) { d.weight = kNan; }), "the weight is nan"},
+        {with(smooth({}), [](auto& d) { d.iterations = 101; }), "101 iterations"},
+    };
+    for (const auto& [deformer, text] : rows)
+        EXPECT_THAT(deformer->mismatch(vertexAt({}, {})), HasSubstr(text));
+}
+
+TEST(Deformers, SettingsThatChangeNothingTakeNoPass)
+{
+    const MeshGeometry sheet = makeSheet(3);
+    SmoothDeformer smooth{SmoothTopology(sheet)};
+    EXPECT_EQ(smooth.passCount(), 2u);
+    smooth.weight = 0;
+    EXPECT_EQ(smooth.passCount(), 0u);
+    smooth.weight = 1;
+    smooth.iterations = 0;
+    EXPECT_EQ(smooth.passCount(), 0u);
+    EXPECT_EQ(twist(0)->passCount(), 0u);
+    const auto targets = morph(std::vector<MorphTarget>(17, {{{}}, {}}), {});
+    for (const auto& [active, passes] : {std::pair(0u, 0u), {1u, 1u}, {8u, 1u}, {9u, 2u}}) {
+        targets->weights.assign(17, 0);
+        std::fill_n(targets->weights.rbegin(), active, 1.0f);
+        EXPECT_EQ(targets->passCount(), passes) << active;
+    }
+    targets->strength = 0;
+    EXPECT_EQ(targets->passCount(), 0u);
+}
+
+TEST(Deformers, ParametersAreSetByName)
+{
+    const auto turned = twist(0);
+    const auto travelling = wave(0);
+    const auto skinned = skin(kIdentityRows);
+    const auto morphed = morph({}, {});
+    SmoothDeformer smoothed{SmoothTopology()};
+    const std::tuple<Deformer&, const char*, const char*> rows[] = {
+        {*turned, "angle", "-0.5"},        {*travelling, "amplitude", "2"},
+        {*travelling, "wavelength", "3"},  {*travelling, "phase", "-1"},
+        {*travelling, "direction", "z"},   {*travelling, "displacement", "x"},
+        {*skinned, "precision", "double"}, {*morphed, "strength", "0.25"},
+        {smoothed, "weight", "1"},         {smoothed, "iterations", "7"}};
+    for (const auto& [deformer, name, value] : rows)
+        EXPECT_EQ(setParameter(deformer, name, value), "");
+    EXPECT_EQ(turned->angle, -0.5f);
+    EXPECT_THAT(std::tuple(travelling->amplitude, travelling->wavelength, travelling->phase,
+                           travelling->direction, travelling->displacement),
+                testing::Eq(std::tuple(2, 3, -1, WaveDeformer::kZ, WaveDeformer::kX)));
+    EXPECT_EQ(skinned->precision, SkinDeformer::kDouble);
+    EXPECT_EQ(morphed->strength, 0.25f);
+    EXPECT_EQ(std::tuple(smoothed.weight, smoothed.iterations), std::tuple(1.0f, 7u));
+}
+
+} // namespace

@@ -1,0 +1,204 @@
+// Smoothing against closed forms, on meshes with seams, borders and faults.
+#include "evaluator/SmoothDeformer.h"
+#include "DeformerCases.h"
+#include "evaluator/VectorMath.h"
+
+#include <cmath>
+#include <numbers>
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using namespace vyra;
+
+constexpr double kTolerance = 1e-6;
+const Vector3 kUp{0, 1, 0};
+
+void expectNear(const Vector3& actual, const Vector3& expected)
+{
+    EXPECT_LT(length(wide(actual) - wide(expected)), kTolerance)
+        << actual.x << ' ' << actual.y << ' ' << actual.z << ", expected " << expected.x << ' '
+        << expected.y << ' ' << expected.z;
+}
+
+Surface smoothed(const MeshGeometry& mesh, const Surface& from, unsigned iterations,
+                 float weight = 0.5f)
+{
+    SmoothDeformer deformer{SmoothTopology(mesh)};
+    deformer.iterations = iterations;
+    deformer.weight = weight;
+    EXPECT_EQ(deformer.mismatch(mesh), "");
+    Surface surface = from;
+    deformer.deform(mesh, surface);
+    return surface;
+}
+
+MeshGeometry meshOf(std::vector<Vector3> positions, std::vector<std::uint32_t> triangles)
+{
+    MeshGeometry mesh;
+    mesh.rest = {std::move(positions), {}};
+    mesh.rest.normals.assign(mesh.rest.positions.size(), kUp);
+    mesh.triangles = std::move(triangles);
+    return mesh;
+}
+
+// A flat hexagon of radius 1 whose centre, vertex 0, is raised by `height`. Seen counterclockwise
+// from above.
+MeshGeometry hexagon(float height)
+{
+    std::vector<Vector3> positions{{0, height, 0}};
+    std::vector<std::uint32_t> triangles;
+    for (unsigned i = 0; i < 6; ++i) {
+        const float angle = static_cast<float>(i) * std::numbers::pi_v<float> / 3;
+        positions.push_back({std::cos(angle), 0, -std::sin(angle)});
+        triangles.insert(triangles.end(), {0, i + 1, (i + 1) % 6 + 1});
+    }
+    return meshOf(std::move(positions), std::move(triangles));
+}
+
+// Eight faces around the origin. Split: each face has vertices and a normal of its own.
+MeshGeometry octahedron(bool isSplit)
+{
+    MeshGeometry mesh;
+    const Vector3 corners[] = {{1, 0, 0}, {0, 1, 0}, {-1, 0, 0}, {0, -1, 0}, {0, 0, 1}, {0, 0, -1}};
+    for (std::uint32_t i = 0; i < 4; ++i) {
+        for (const std::array<std::uint32_t, 3>& face :
+             {std::array{i, (i + 1) % 4, 4u}, std::array{(i + 1) % 4, i, 5u}}) {
+            const Vector normal = normalised(wide(corners[face[0]]) + wide(corners[face[1]]) +
+                                             wide(corners[face[2]]));
+            for (const std::uint32_t corner : face) {
+                mesh.triangles.push_back(isSplit ? static_cast<std::uint32_t>(mesh.triangles.size())
+                                                 : corner);
+                if (isSplit) {
+                    mesh.rest.positions.push_back(corners[corner]);
+                    mesh.rest.normals.push_back(narrow(normal));
+                }
+            }
+        }
+    }
+    if (!isSplit)
+        mesh.rest = {{std::begin(corners), std::end(corners)},
+                     {std::begin(corners), std::end(corners)}};
+    return mesh;
+}
+
+// The four neighbours of a corner have the mean 0, so each iteration scales by 1 - weight.
+TEST(SmoothDeformer, SolidShrinksAndKeepsItsNormalsSmoothOrHard)
+{
+    for (const bool isSplit : {false, true}) {
+        const MeshGeometry mesh = octahedron(isSplit);
+        const Surface surface = smoothed(mesh, mesh.rest, 2, 0.25f);
+        ASSERT_EQ(surface.vertexCount(), isSplit ? 24u : 6u);
+        for (std::size_t i = 0; i < surface.vertexCount(); ++i) {
+            expectNear(surface.positions[i], narrow(0.5625 * wide(mesh.rest.positions[i])));
+            expectNear(surface.normals[i], mesh.rest.normals[i]);
+        }
+    }
+}
+
+TEST(SmoothDeformer, SpikeSinksAndBorderFollowsItself)
+{
+    const MeshGeometry mesh = hexagon(8);
+    const Surface surface = smoothed(mesh, mesh.rest, 3);
+    expectNear(surface.positions[0], {0, 1, 0});
+    expectNear(surface.normals[0], kUp);
+    // The mean of two neighbours on the border has the radius 1/2.
+    expectNear(surface.positions[1], {27.0f / 64, 0, 0});
+    // A border vertex has two triangles, symmetrical to the plane z = 0.
+    EXPECT_GT(surface.normals[1].x, 0.1f);
+    EXPECT_NEAR(surface.normals[1].z, 0, kTolerance);
+}
+
+TEST(SmoothDeformer, SheetStaysInItsPlaneAndItsStraightBorderOnItsLine)
+{
+    constexpr unsigned kSide = 9;
+    MeshGeometry mesh = makeSheet(kSide);
+    for (std::size_t i = 0; i < mesh.rest.vertexCount(); ++i) {
+        mesh.rest.positions[i].y = 0;
+        mesh.rest.normals[i] = kUp;
+    }
+    const Surface surface = smoothed(mesh, mesh.rest, 3);
+    expectNear(surface.positions[kSide / 2], mesh.rest.positions[kSide / 2]);
+    expectNear(surface.positions[kSide * kSide / 2], mesh.rest.positions[kSide * kSide / 2]);
+    EXPECT_GT(surface.positions[0].x, 0.01f); // a corner is rounded
+    for (std::size_t i = 0; i < surface.vertexCount(); ++i) {
+        EXPECT_NEAR(surface.positions[i].y, 0, kTolerance);
+        expectNear(surface.normals[i], kUp);
+    }
+}
+
+// The hexagon cut open: its centre is six vertices, each ring vertex two, all with one normal.
+TEST(SmoothDeformer, SeamDoesNotShow)
+{
+    const MeshGeometry whole = hexagon(1);
+    MeshGeometry cut;
+    for (const std::uint32_t vertex : whole.triangles) {
+        cut.triangles.push_back(static_cast<std::uint32_t>(cut.triangles.size()));
+        cut.rest.positions.push_back(whole.rest.positions[vertex]);
+        cut.rest.normals.push_back(whole.rest.normals[vertex]);
+    }
+    cut.rest.positions[0].x = -0.0f; // equal to 0
+    const Surface expected = smoothed(whole, whole.rest, 2);
+    const Surface actual = smoothed(cut, cut.rest, 2);
+    for (std::size_t i = 0; i < actual.vertexCount(); ++i) {
+        expectNear(actual.positions[i], expected.positions[whole.triangles[i]]);
+        expectNear(actual.normals[i], expected.normals[whole.triangles[i]]);
+    }
+}
+
+TEST(SmoothDeformer, NormalsLieOnTheSideOnWhichTheyCameIn)
+{
+    MeshGeometry clockwise = hexagon(2);
+    for (std::size_t i = 0; i < clockwise.triangles.size(); i += 3)
+        std::swap(clockwise.triangles[i + 1], clockwise.triangles[i + 2]);
+    expectNear(smoothed(clockwise, clockwise.rest, 1).normals[0], kUp);
+
+    // A deformer before this one has mirrored the mesh.
+    const MeshGeometry mesh = hexagon(2);
+    Surface mirrored = mesh.rest;
+    for (Vector3& position : mirrored.positions)
+        position.x = -position.x;
+    expectNear(smoothed(mesh, mirrored, 1).normals[0], kUp);
+}
+
+TEST(SmoothDeformer, FaultsOfAMeshHaveADefinedResult)
+{
+    const Vector3 a{0, 0, 0};
+    const Vector3 b{2, 0, 0};
+    const Vector3 c{0, 0, -2};
+    const Vector3 away{9, 9, 9};
+    const Vector3 tilted{0.6f, 0.8f, 0};
+    const struct {
+        const char* name;
+        MeshGeometry mesh;
+        Vector3 position, normal; // of vertex 0, whose normal at rest is tilted
+    } rows[] = {
+        {"no triangle", meshOf({a, b, c}, {}), a, tilted},
+        {"triangle with a corner twice", meshOf({a, b, a}, {0, 1, 2, 0, 0, 1}), a, tilted},
+        {"one triangle", meshOf({a, b, c}, {0, 1, 2}), {0.5f, 0, -0.5f}, kUp},
+        {"triangle without area", meshOf({a, b, {1, 0, 0}}, {0, 1, 2}), {0.75f, 0, 0}, tilted},
+        {"two triangles that cancel",
+         meshOf({a, b, c}, {0, 1, 2, 0, 2, 1}),
+         {0.5f, 0, -0.5f},
+         tilted},
+        // The edge from a to b is no border, and both of its ends are on borders.
+        {"edge of three triangles",
+         meshOf({a, b, c, {0, 0, 2}, {0, 2, 0}}, {0, 1, 2, 1, 0, 3, 0, 1, 4}),
+         {0, 1.0f / 3, 0},
+         {}},
+        {"vertex of no triangle", meshOf({away, a, b, c}, {1, 2, 3}), away, tilted},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.name);
+        MeshGeometry mesh = row.mesh;
+        mesh.rest.normals[0] = tilted;
+        const Surface surface = smoothed(mesh, mesh.rest, 1);
+        expectNear(surface.positions[0], row.position);
+        if (length(wide(row.normal)) > 0)
+            expectNear(surface.normals[0], row.normal);
+        EXPECT_NEAR(length(wide(surface.normals[0])), 1, kTolerance);
+    }
+}
+
+} // namespace
