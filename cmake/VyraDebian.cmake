@@ -18,7 +18,7 @@ set(CPACK_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS ${CMAKE_INSTALL_DEFAULT_DIRECTOR
 set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
 
 set(CPACK_DEB_COMPONENT_INSTALL ON)
-set(CPACK_COMPONENTS_ALL Library Development glshare Tools)
+set(CPACK_COMPONENTS_ALL Library Evaluator Development glshare Tools)
 set(CPACK_DEBIAN_ENABLE_COMPONENT_DEPENDS ON)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_COMPRESSION_TYPE xz)
@@ -75,11 +75,20 @@ set(CPACK_DEBIAN_LIBRARY_PACKAGE_RECOMMENDS "ocl-icd-libopencl1 | libopencl1")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_SUGGESTS "opencl-icd, glshare, vyra-opencl-tools")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_CONTROL_EXTRA ${VYRA_DEBIAN_DIR}/triggers)
 
+vyra_debian_package(Evaluator libvyra-evaluator${PROJECT_VERSION_MAJOR}
+"mesh deformers on the GPU through OpenCL - evaluator
+libvyra-evaluator deforms an application's meshes with vyra-opencl: queues,
+memory, events and kernels are its own. It has deformers for skinning, morph
+targets, twists, waves and smoothing, and runs those of the application.")
+set(CPACK_COMPONENT_EVALUATOR_DEPENDS Library)
+set(CPACK_DEBIAN_EVALUATOR_PACKAGE_SECTION libs)
+set(CPACK_DEBIAN_EVALUATOR_PACKAGE_CONTROL_EXTRA ${VYRA_DEBIAN_DIR}/triggers)
+
 vyra_debian_package(Development libvyra-opencl-dev
 "mesh deformers on the GPU through OpenCL - development files
 Headers, the CMake package VyraOpenCL and pkg-config files for programs that
-run deformers through vyra-opencl, with two examples to begin from.")
-set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS Library)
+run deformers through vyra-opencl, with examples to begin from.")
+set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS Library Evaluator)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_DEPENDS
     "opencl-c-headers, libtbb-dev (>= 2021), qt6-base-dev (>= 6.4), libqt6opengl6-dev (>= 6.4)")
@@ -102,7 +111,7 @@ vyra_debian_package(Tools vyra-opencl-tools
 \"vyra-opencl-info\" tells whether vyra-opencl can use OpenCL on this machine,
 what it decided at its start and why. \"vyra-viewer\" is a host application in
 small: it deforms an animated character through the library and draws it.")
-set(CPACK_COMPONENT_TOOLS_DEPENDS Library)
+set(CPACK_COMPONENT_TOOLS_DEPENDS Library Evaluator)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_SECTION graphics)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_RECOMMENDS "ocl-icd-libopencl1 | libopencl1, opencl-icd")
 set(CPACK_DEBIAN_TOOLS_PACKAGE_SUGGESTS "glshare, assimp-testmodels")

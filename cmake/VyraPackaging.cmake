@@ -25,7 +25,7 @@ set(VYRA_PKG_CONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
 file(RELATIVE_PATH VYRA_PREFIX_FROM_PKG_CONFIG
     ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
 string(REGEX REPLACE "/$" "" VYRA_PREFIX_FROM_PKG_CONFIG ${VYRA_PREFIX_FROM_PKG_CONFIG})
-foreach(library vyra-opencl vyra-host)
+foreach(library vyra-opencl vyra-host vyra-evaluator)
     configure_file(${CMAKE_CURRENT_LIST_DIR}/${library}.pc.in
         ${PROJECT_BINARY_DIR}/packaging/${library}.pc @ONLY)
     install(FILES ${PROJECT_BINARY_DIR}/packaging/${library}.pc
@@ -40,6 +40,9 @@ install(FILES
     DESTINATION ${VYRA_EXAMPLES_DIR}
     COMPONENT Development)
 install(DIRECTORY
+    ${PROJECT_SOURCE_DIR}/examples/custom_deformer
+    ${PROJECT_SOURCE_DIR}/examples/evaluator
+    ${PROJECT_SOURCE_DIR}/examples/hot_reload
     ${PROJECT_SOURCE_DIR}/examples/with-cmake
     ${PROJECT_SOURCE_DIR}/examples/with-pkg-config
     DESTINATION ${VYRA_EXAMPLES_DIR}
