@@ -20,8 +20,6 @@ OpenCLCalls findOpenCLCalls()
     if (!library)
         return calls;
     resolve(library, "clGetDeviceIDs", calls.clGetDeviceIDs);
-    resolve(library, "clSetKernelArg", calls.clSetKernelArg);
-    resolve(library, "clEnqueueNDRangeKernel", calls.clEnqueueNDRangeKernel);
     return calls;
 }
 

@@ -9,8 +9,6 @@ namespace info {
 // names and types of the functions.
 struct OpenCLCalls {
     decltype(&::clGetDeviceIDs) clGetDeviceIDs = nullptr;
-    decltype(&::clSetKernelArg) clSetKernelArg = nullptr;
-    decltype(&::clEnqueueNDRangeKernel) clEnqueueNDRangeKernel = nullptr;
 };
 
 OpenCLCalls findOpenCLCalls();

@@ -1,186 +1,149 @@
 #include "tools/SelfTestEvaluation.h"
 
 #include "host/EvaluationId.h"
-#include "loader/OpenCLLoader.h"
+#include "runtime/TopenCLInfo.h"
 
-#include <thread>
+#include <memory>
+#include <utility>
 
-#include <QOpenGLContext>
-#include <QOpenGLFunctions>
+#include <QOpenGLExtraFunctions>
 
 namespace info {
 namespace {
 
-TopenCLSharedBufferMgr& manager()
-{
-    return TopenCLInfo::theOne().sharedBufferMgr();
-}
-
-cl_command_queue queue()
-{
-    return TopenCLInfo::theOne().openCLCommandQueue();
-}
-
-// Small whole numbers, which floats hold exactly, other ones in each evaluation.
-std::vector<float> inputOf(int index, std::size_t count)
+// Small whole numbers, which floats hold exactly, different ones in each evaluation.
+std::vector<vyra::Vector3> inputOf(int index, std::size_t vertexCount)
 {
     constexpr std::size_t kDifferent = 1000;
-    std::vector<float> values(count);
-    for (std::size_t i = 0; i < count; ++i)
-        values[i] = static_cast<float>((i + static_cast<std::size_t>(index)) % kDifferent);
+    const auto number = [index](std::size_t i) {
+        return static_cast<float>((i + static_cast<std::size_t>(index)) % kDifferent);
+    };
+    std::vector<vyra::Vector3> values;
+    for (std::size_t i = 0; i < vertexCount; ++i)
+        values.push_back({number(3 * i), number(3 * i + 1), number(3 * i + 2)});
     return values;
+}
+
+vyra::EvaluatorSettings settingsFor(QOpenGLExtraFunctions& gl)
+{
+    vyra::EvaluatorSettings settings;
+    settings.finishRenderer = [&gl] { gl.glFinish(); };
+    settings.flushRenderer = [&gl] { gl.glFlush(); };
+    return settings;
+}
+
+std::shared_ptr<const vyra::MeshGeometry> geometryOf(std::size_t vertexCount)
+{
+    auto geometry = std::make_shared<vyra::MeshGeometry>();
+    geometry->name = "self-test";
+    geometry->rest.positions.resize(vertexCount);
+    geometry->rest.normals.resize(vertexCount);
+    return geometry;
+}
+
+std::size_t countWrong(const std::vector<vyra::Vector3>& input,
+                       const std::vector<vyra::Vector3>& output, float offset)
+{
+    std::size_t wrong = 0;
+    for (std::size_t i = 0; i < input.size(); ++i) {
+        const auto isWrong = [offset](float in, float out) {
+            return out != SelfTestDeformer::result(in, offset) ? 1U : 0U;
+        };
+        wrong += isWrong(input[i].x, output[i].x) + isWrong(input[i].y, output[i].y) +
+                 isWrong(input[i].z, output[i].z);
+    }
+    return wrong;
 }
 
 } // namespace
 
-SelfTestEvaluation::SelfTestEvaluation(SharedVertices& vertices, cl_kernel kernel,
-                                       std::size_t floats)
-    : fVertices(vertices), fKernel(kernel), fFloats(floats)
+SelfTestEvaluation::SelfTestEvaluation(QOpenGLExtraFunctions& gl, std::size_t vertexCount,
+                                       std::string kernelText)
+    : fGL(gl), fPositions(gl, vertexCount), fNormals(gl, vertexCount), fEvaluator(settingsFor(gl)),
+      fVertexCount(vertexCount)
 {
-    if (!fCalls.clSetKernelArg || !fCalls.clEnqueueNDRangeKernel)
-        fProblem = "the OpenCL library lacks the functions that run a kernel";
+    vyra::DeformableMesh& mesh =
+        fEvaluator.createMesh(geometryOf(vertexCount), {fPositions.name(), fNormals.name()});
+    fDeformer = &mesh.add<SelfTestDeformer>(std::move(kernelText));
+}
+
+void SelfTestEvaluation::prepare()
+{
+    check(fEvaluator.prepare());
 }
 
 EvaluationTimes SelfTestEvaluation::run(int index, bool inStages)
 {
     EvaluationTimes times;
-    if (!fProblem.empty())
-        return times;
-    const std::vector<float> input = inputOf(index, fFloats);
-    const auto offset = static_cast<float>(index + 1);
-    fVertices.write(input);
-    manager().RenderingComplete();
-    QOpenGLContext::currentContext()->functions()->glFlush();
-    if (TopenCLInfo::theOne().useGLFinish())
-        QOpenGLContext::currentContext()->functions()->glFinish();
+    const std::vector<vyra::Vector3> input = inputOf(index, fVertexCount);
+    fPositions.write(input);
+    fNormals.write(input);
+    fEvaluator.renderingComplete();
+    fDeformer->offset = static_cast<float>(index + 1);
+    ++fEvaluationId;
+
     const Stopwatch whole;
-    if (!evaluate(offset, inStages, times))
-        return times;
+    if (inStages)
+        evaluateInStages(times);
+    else
+        fEvaluator.evaluate(em::Id(fEvaluationId));
+    check(fEvaluator.status());
+    fEvaluator.waitUntilDrawable();
     const Stopwatch reading;
-    const std::vector<float> output = fVertices.read();
+    const std::vector<vyra::Vector3> positions = fPositions.read();
+    const std::vector<vyra::Vector3> normals = fNormals.read();
     times.read = reading.milliseconds();
     times.whole = whole.milliseconds();
-    compare(input, output, offset);
+    if (fProblem.empty())
+        compare(input, positions, normals);
     return times;
 }
 
-bool SelfTestEvaluation::evaluate(float offset, bool inStages, EvaluationTimes& times)
+// The same as Evaluator::evaluate, with a wait after each stage.
+void SelfTestEvaluation::evaluateInStages(EvaluationTimes& times)
 {
-    const Stopwatch open;
-    const AutoCLObject<cl_event> acquired = acquire();
-    if (!acquired.get() || (inStages && !waitFor(acquired.get())))
-        return false;
-    times.acquire = open.milliseconds();
+    TopenCLSharedBufferMgr& manager = TopenCLInfo::theOne().sharedBufferMgr();
+    const em::Id id(fEvaluationId);
+    if (TopenCLInfo::theOne().useGLFinish())
+        fGL.glFinish();
+    const Stopwatch acquire;
+    manager.PreEvaluate(id);
+    TopenCLInfo::finish();
+    times.acquire = acquire.milliseconds();
 
     const Stopwatch kernel;
-    const AutoCLObject<cl_event> deformed = enqueueKernel(offset, acquired.get());
-    if (!deformed.get() || (inStages && !waitFor(deformed.get())))
-        return false;
+    fEvaluator.deform();
+    fEvaluator.finish();
     times.kernel = kernel.milliseconds();
 
-    const Stopwatch close;
-    const AutoCLObject<cl_event> released = release(deformed.get());
-    if (!released.get() || (inStages && !waitFor(released.get())))
-        return false;
-    waitAsTheHostDoes(released.get());
-    times.release = close.milliseconds();
-    return true;
+    const Stopwatch release;
+    manager.PostEvaluate(id);
+    TopenCLInfo::finish();
+    times.release = release.milliseconds();
 }
 
-AutoCLObject<cl_event> SelfTestEvaluation::acquire()
+void SelfTestEvaluation::check(const vyra::Status& status)
 {
-    manager().PreEvaluate(em::Id(++fEvaluationId));
-    AutoCLObject<cl_event> acquired;
-    const int status =
-        manager().EnqueueAcquireSharedCLBuffer(queue(), fVertices.record(), acquired.receive());
-    if (succeeded(status, "the shared buffer cannot be acquired") && !acquired.get())
-        fProblem = "the shared buffer cannot be acquired; the warnings say why";
-    return acquired;
+    if (status.ok() || !fProblem.empty())
+        return;
+    fProblem = status.message;
+    fStatus = status.openCL;
 }
 
-AutoCLObject<cl_event> SelfTestEvaluation::enqueueKernel(float offset, cl_event acquired)
+void SelfTestEvaluation::compare(const std::vector<vyra::Vector3>& input,
+                                 const std::vector<vyra::Vector3>& positions,
+                                 const std::vector<vyra::Vector3>& normals)
 {
-    const cl_mem memory = fVertices.record()->fMem.get();
-    const auto count = static_cast<cl_uint>(fFloats);
-    std::size_t global = 0;
-    std::size_t local = 0;
-    AutoCLObject<cl_event> deformed;
-    if (succeeded(fCalls.clSetKernelArg(fKernel, 0, sizeof(cl_mem), &memory), "argument refused") &&
-        succeeded(fCalls.clSetKernelArg(fKernel, 1, sizeof offset, &offset), "argument refused") &&
-        succeeded(fCalls.clSetKernelArg(fKernel, 2, sizeof count, &count), "argument refused") &&
-        succeeded(TopenCLInfo::theOne().getWorkGroupSizes(fKernel, fFloats, global, local),
-                  "the kernel has no work-group size"))
-        succeeded(fCalls.clEnqueueNDRangeKernel(queue(), fKernel, 1, nullptr, &global, &local, 1,
-                                                &acquired, deformed.receive()),
-                  "the kernel cannot be run");
-    return deformed;
-}
-
-// With the batch, or on its own where nothing is batched.
-AutoCLObject<cl_event> SelfTestEvaluation::release(cl_event deformed)
-{
-    AutoCLObject<cl_event> released;
-    const em::Id id(fEvaluationId);
-    if (fVertices.record()->fInBatch) {
-        const cl_event* batch = manager().EnqueueReleaseBatchedSharedCLBuffer(1, &deformed);
-        manager().PostEvaluate(id);
-        if (*batch) {
-            retainCLObject(*batch); // the holder pays it back
-            released.adopt(*batch);
-        } else {
-            fProblem = "the shared buffer cannot be released; the warnings say why";
-        }
-        return released;
-    }
-    const cl_mem memory = fVertices.record()->fMem.get();
-    succeeded(manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &memory, 1, &deformed,
-                                                     released.receive()),
-              "the shared buffer cannot be released");
-    manager().PostEvaluate(id);
-    return released;
-}
-
-// What the modes leave to the host before it draws.
-void SelfTestEvaluation::waitAsTheHostDoes(cl_event released)
-{
-    const TopenCLInfo& library = TopenCLInfo::theOne();
-    TopenCLInfo::flush();
-    if (library.clToGraphicsSyncMode() == TopenCLInfo::kCLToGraphicsEventQuery) {
-        while (!TopenCLInfo::IsEventComplete(released))
-            std::this_thread::yield();
-    }
-    if (library.useCLFinish())
-        TopenCLInfo::finish();
-}
-
-void SelfTestEvaluation::compare(const std::vector<float>& input, const std::vector<float>& output,
-                                 float offset)
-{
-    if (output.empty()) {
+    if (positions.empty() || normals.empty()) {
         fProblem = "OpenGL does not let the vertex buffer be read";
         return;
     }
-    std::size_t wrong = 0;
-    for (std::size_t i = 0; i < input.size(); ++i)
-        wrong += output[i] != 2.0F * input[i] + offset ? 1 : 0;
+    const std::size_t wrong = countWrong(input, positions, fDeformer->offset) +
+                              countWrong(input, normals, fDeformer->offset);
     if (wrong > 0)
-        fProblem = std::to_string(wrong) + " of " + std::to_string(input.size()) +
+        fProblem = std::to_string(wrong) + " of " + std::to_string(6 * input.size()) +
                    " numbers in OpenGL's memory are wrong in evaluation " +
                    std::to_string(fEvaluationId);
-}
-
-bool SelfTestEvaluation::succeeded(int status, const char* what)
-{
-    if (status == CL_SUCCESS)
-        return true;
-    fProblem = what;
-    fStatus = status;
-    return false;
-}
-
-bool SelfTestEvaluation::waitFor(cl_event event)
-{
-    return succeeded(ocl.clWaitForEvents(1, &event), "a command failed while it ran");
 }
 
 } // namespace info

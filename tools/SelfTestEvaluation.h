@@ -1,16 +1,17 @@
-// One evaluation of the self-test, as a host and its deformer make it.
+// One evaluation of the self-test.
 #pragma once
 
-#include "diagnostics/AutoCLObject.h"
-#include "runtime/TopenCLInfo.h"
-#include "tools/OpenCLCalls.h"
-#include "tools/SharedVertices.h"
+#include "evaluator/Evaluator.h"
+#include "tools/RendererVertices.h"
+#include "tools/SelfTestDeformer.h"
 
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
 #include <string>
 #include <vector>
+
+class QOpenGLExtraFunctions;
 
 namespace info {
 
@@ -27,7 +28,7 @@ private:
     std::chrono::steady_clock::time_point fStart = std::chrono::steady_clock::now();
 };
 
-// In milliseconds. The stages are measured only where there is a wait behind each.
+// In milliseconds. The stages are measured only if each is waited for.
 struct EvaluationTimes {
     double whole = 0; // until OpenGL has read the result
     double acquire = 0;
@@ -36,36 +37,40 @@ struct EvaluationTimes {
     double read = 0;
 };
 
-// Borrows the vertices and the kernel. The first problem stays; nothing is to be run after it.
+// A mesh with two vertex buffers that OpenGL writes, OpenCL deforms and OpenGL reads. The first
+// problem stays; nothing is to be run after it. The renderer's context is current during each
+// operation.
 class SelfTestEvaluation {
 public:
-    SelfTestEvaluation(SharedVertices& vertices, cl_kernel kernel, std::size_t floats);
+    SelfTestEvaluation(QOpenGLExtraFunctions& gl, std::size_t vertexCount, std::string kernelText);
 
-    // OpenGL writes numbers that belong to `index`, OpenCL deforms them, OpenGL reads and compares
-    // them. `inStages` waits behind each stage.
+    // Builds the kernel and shares the vertex buffers.
+    void prepare();
+
+    // OpenGL writes numbers that depend on `index`, OpenCL deforms them, OpenGL reads and compares
+    // them. `inStages` waits for each stage.
     EvaluationTimes run(int index, bool inStages);
 
-    // Empty while all is right.
+    // Empty as long as all is right.
     const std::string& problem() const { return fProblem; }
     int status() const { return fStatus; }
 
 private:
-    bool evaluate(float offset, bool inStages, EvaluationTimes& times);
-    AutoCLObject<cl_event> acquire();
-    AutoCLObject<cl_event> enqueueKernel(float offset, cl_event acquired);
-    AutoCLObject<cl_event> release(cl_event deformed);
-    void waitAsTheHostDoes(cl_event released);
-    void compare(const std::vector<float>& input, const std::vector<float>& output, float offset);
-    bool succeeded(int status, const char* what);
-    bool waitFor(cl_event event);
+    void evaluateInStages(EvaluationTimes& times);
+    void check(const vyra::Status& status);
+    void compare(const std::vector<vyra::Vector3>& input,
+                 const std::vector<vyra::Vector3>& positions,
+                 const std::vector<vyra::Vector3>& normals);
 
-    SharedVertices& fVertices;
-    cl_kernel fKernel;
-    std::size_t fFloats;
-    OpenCLCalls fCalls = findOpenCLCalls();
+    QOpenGLExtraFunctions& fGL;
+    RendererVertices fPositions;
+    RendererVertices fNormals;
+    vyra::Evaluator fEvaluator; // destroyed before the vertex buffers
+    SelfTestDeformer* fDeformer = nullptr;
+    std::size_t fVertexCount;
     std::uint16_t fEvaluationId = 0;
     std::string fProblem;
-    int fStatus = CL_SUCCESS;
+    int fStatus = 0;
 };
 
 } // namespace info

@@ -1,6 +1,6 @@
 #include "tools/SelfTestRun.h"
 
-#include "kernels/TopenCLKernelStore.h"
+#include "runtime/TopenCLInfo.h"
 #include "tools/RenderWindow.h"
 #include "tools/SelfTestEvaluation.h"
 #include "tools/WarningLog.h"
@@ -14,7 +14,6 @@ namespace info {
 namespace {
 
 constexpr std::size_t kVertices = 10000; // a character's face; above every default minimum
-constexpr std::size_t kFloats = kVertices * 3;
 // Enough for a median; the whole test stays well under a second on a processor.
 constexpr int kEvaluations = 15;
 
@@ -25,17 +24,10 @@ double median(std::vector<double> values)
     return *middle;
 }
 
-AutoCLObject<cl_kernel> buildKernel(double& milliseconds)
+std::string kernelText()
 {
     QFile file(":/kernels/self_test.cl");
-    if (!file.open(QIODevice::ReadOnly))
-        return {};
-    const QByteArray source = file.readAll();
-    const Stopwatch stopwatch;
-    AutoCLObject<cl_kernel> kernel = TopenCLInfo::theOne().kernelStore().getKernelFromString(
-        source.constData(), "self_test.cl", nullptr, "deform", nullptr);
-    milliseconds = stopwatch.milliseconds();
-    return kernel;
+    return file.open(QIODevice::ReadOnly) ? file.readAll().toStdString() : std::string();
 }
 
 // The evaluations run free, as a host's do, and then once more with a wait behind each stage, so
@@ -71,31 +63,24 @@ void runEvaluations(SelfTestEvaluation& evaluation, SelfTest& test)
     test.times.read = median(read);
 }
 
-void runWithKernel(RenderWindow& window, const AutoCLObject<cl_kernel>& kernel, SelfTest& test)
-{
-    SharedVertices vertices(*window.context().extraFunctions(), kFloats);
-    if (!vertices.record()) {
-        test.problem = "OpenCL refuses to share a vertex buffer";
-        test.status = vertices.status();
-        return;
-    }
-    SelfTestEvaluation evaluation(vertices, kernel.get(), kFloats);
-    runEvaluations(evaluation, test);
-    TopenCLInfo::finish();
-}
-
 } // namespace
 
 SelfTest runSelfTest(RenderWindow& window, WarningLog& warnings)
 {
     SelfTest test;
     test.vertices = kVertices;
-    const AutoCLObject<cl_kernel> kernel = buildKernel(test.times.kernelBuild);
-    if (kernel.get()) {
-        runWithKernel(window, kernel, test);
-        TopenCLInfo::theOne().kernelStore().freeKernel(kernel);
-    } else {
-        test.problem = "the kernel cannot be built; the warnings hold the build log";
+    {
+        // The number of vertices does not decide here whether OpenCL is used.
+        TopenCLInfo::theOne().setUseMinimumBufferSize(false);
+        SelfTestEvaluation evaluation(*window.context().extraFunctions(), kVertices, kernelText());
+        const Stopwatch building;
+        evaluation.prepare();
+        test.times.kernelBuild = building.milliseconds();
+        test.problem = evaluation.problem();
+        test.status = evaluation.status();
+        if (test.problem.empty())
+            runEvaluations(evaluation, test);
+        TopenCLInfo::theOne().setUseMinimumBufferSize(true);
     }
     test.warnings = warnings.take();
     return test;

@@ -1,6 +1,8 @@
 #include "viewer/CharacterSpace.h"
 
-#include "viewer/Deformation.h"
+#include "evaluator/MorphDeformer.h"
+#include "evaluator/SkinDeformer.h"
+#include "viewer/MeshShape.h"
 #include "viewer/Pose.h"
 
 #include <algorithm>
@@ -40,14 +42,26 @@ std::vector<QVector3D> outlineDirections()
     return directions;
 }
 
-// All vertices of a pose, in the model's space.
-std::vector<QVector3D> vertices(const Model& model, const Pose& pose)
+// All vertices of a pose, in the model's space. The shapes are those of the model's meshes.
+std::vector<QVector3D> vertices(const Model& model, const std::vector<MeshShape>& shapes,
+                                const Animation* animation, double seconds)
 {
+    const Pose pose = poseAt(model, animation, seconds);
     std::vector<QVector3D> points;
-    for (const Mesh& mesh : model.meshes) {
+    for (std::size_t i = 0; i < shapes.size(); ++i) {
+        const Mesh& mesh = model.meshes[i];
+        vyra::Surface surface = shapes[i].geometry->rest;
+        vyra::MorphDeformer morph(shapes[i].morphTargets);
+        morphWeights(mesh, animation, seconds, morph.weights);
+        morph.deform(*shapes[i].geometry, surface);
+        if (mesh.hasBones()) {
+            vyra::SkinDeformer skin(shapes[i].skinWeights);
+            skin.bones = boneMatrices(mesh, pose);
+            skin.deform(*shapes[i].geometry, surface);
+        }
         const QMatrix4x4 toModel = meshToModel(mesh, pose);
-        for (const QVector3D& position : skin(mesh, boneMatrices(mesh, pose)).positions)
-            points.push_back(toModel.map(position));
+        for (const vyra::Vector3& p : surface.positions)
+            points.push_back(toModel.map(QVector3D(p.x, p.y, p.z)));
     }
     return points;
 }
@@ -69,10 +83,12 @@ CharacterSpace characterSpace(const Model& model, const Animation* animation)
 {
     Bounds bounds;
     std::vector<QVector3D> outline;
+    std::vector<MeshShape> shapes(model.meshes.size());
+    std::transform(model.meshes.begin(), model.meshes.end(), shapes.begin(), shapeOf);
     const int poses = animation && animation->seconds > 0 ? kMeasuredPoses : 1;
     for (int i = 0; i < poses; ++i) {
         const double seconds = animation ? animation->seconds * i / poses : 0.0;
-        const std::vector<QVector3D> points = vertices(model, poseAt(model, animation, seconds));
+        const std::vector<QVector3D> points = vertices(model, shapes, animation, seconds);
         appendOutline(points, outline);
         for (const QVector3D& point : points)
             bounds.include(point);

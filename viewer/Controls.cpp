@@ -36,6 +36,13 @@ std::optional<Action> actionOf(int key)
     return found == std::end(kBindings) ? std::nullopt : std::optional(found->action);
 }
 
+std::optional<std::size_t> deformerOf(int key)
+{
+    if (key < Qt::Key_1 || key > Qt::Key_9)
+        return std::nullopt;
+    return static_cast<std::size_t>(key - Qt::Key_1);
+}
+
 std::string keyHelp()
 {
     constexpr int kNameWidth = 8;
@@ -43,6 +50,8 @@ std::string keyHelp()
     for (const KeyBinding& binding : kBindings)
         text << "  " << std::left << std::setw(kNameWidth) << binding.name << binding.meaning
              << '\n';
+    text << "  " << std::left << std::setw(kNameWidth) << "1 to 9"
+         << "One deformer of the chain off, and on.\n";
     return text.str();
 }
 
@@ -51,7 +60,7 @@ std::string keyReminder()
     std::string text;
     for (const KeyBinding& binding : kBindings)
         text += std::string(text.empty() ? "" : "  ") + binding.name + ' ' + binding.word;
-    return text;
+    return text + "  1-9 one deformer";
 }
 
 } // namespace viewer

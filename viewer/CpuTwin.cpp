@@ -1,8 +1,11 @@
 #include "viewer/CpuTwin.h"
 
-#include "viewer/CpuDeformation.h"
+#include "evaluator/ProfileScope.h"
 
 #include <chrono>
+#include <vector>
+
+#include <tbb/parallel_for.h>
 
 namespace viewer {
 
@@ -14,15 +17,23 @@ CpuTwin::CpuTwin(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animat
 
 void CpuTwin::follow(const Scene& original)
 {
-    for (std::size_t i = 0; i < fScene.meshes().size(); ++i) {
+    const std::vector<CharacterMesh*>& meshes = fScene.meshes();
+    for (std::size_t i = 0; i < meshes.size(); ++i) {
         const CharacterMesh& from = *original.meshes()[i];
-        CharacterMesh& to = *fScene.meshes()[i];
-        to.pose = from.pose;
-        if (to.level != from.level)
-            fScene.changeLevel(to, EvaluationState::kClosed);
+        meshes[i]->pose = from.pose;
+        if (meshes[i]->level != from.level)
+            fScene.changeLevel(*meshes[i]);
     }
+    const vyra::ProfileScope scope("Deform on the CPU");
     const auto begin = std::chrono::steady_clock::now();
-    deformOnCpu(fGL, fScene);
+    std::vector<vyra::Surface> surfaces(meshes.size());
+    tbb::parallel_for(std::size_t{0}, meshes.size(), [&](std::size_t i) {
+        surfaces[i] = original.meshes()[i]->deformable->deformOnCpu();
+    });
+    for (std::size_t i = 0; i < meshes.size(); ++i) {
+        meshes[i]->positions.write(fGL, surfaces[i].positions);
+        meshes[i]->normals.write(fGL, surfaces[i].normals);
+    }
     const auto end = std::chrono::steady_clock::now();
     fMilliseconds = std::chrono::duration<double, std::milli>(end - begin).count();
 }

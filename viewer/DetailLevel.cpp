@@ -48,6 +48,12 @@ void appendVertex(const Mesh& from, std::size_t vertex, Mesh& to)
 {
     to.positions.push_back(from.positions[vertex]);
     to.normals.push_back(from.normals[vertex]);
+    for (std::size_t i = 0; i < from.morphTargets.size(); ++i) {
+        const MorphTarget& target = from.morphTargets[i];
+        to.morphTargets[i].positionDeltas.push_back(target.positionDeltas[vertex]);
+        if (!target.normalDeltas.empty())
+            to.morphTargets[i].normalDeltas.push_back(target.normalDeltas[vertex]);
+    }
     if (!from.hasBones())
         return;
     to.boneIndices.push_back(from.boneIndices[vertex]);
@@ -67,6 +73,9 @@ Mesh coarserMesh(const Mesh& mesh)
     coarse.node = mesh.node;
     coarse.colour = mesh.colour;
     coarse.bones = mesh.bones;
+    coarse.morphTargets.resize(mesh.morphTargets.size());
+    for (std::size_t i = 0; i < mesh.morphTargets.size(); ++i)
+        coarse.morphTargets[i].weight = mesh.morphTargets[i].weight;
 
     std::map<Cell, std::uint32_t> cells;
     std::vector<std::uint32_t> newIndex;

@@ -8,8 +8,8 @@
 namespace viewer {
 namespace {
 
-// The mean cosine between a normal and the direction from the middle, from which on a mesh counts as
-// inside out. Of a flat mesh it is 0, but for rounding.
+// The mean cosine between a normal and the direction from the middle, from which on a mesh counts
+// as inside out. Of a flat mesh it is 0, but for rounding.
 constexpr float kClearlyInside = -0.1f;
 
 struct ByCoordinates {

@@ -24,6 +24,13 @@ struct Bone {
     QMatrix4x4 offset; // from the mesh's space at rest to the bone's
 };
 
+// What a morph target adds to each vertex of the mesh at rest, at weight 1.
+struct MorphTarget {
+    std::vector<QVector3D> positionDeltas;
+    std::vector<QVector3D> normalDeltas; // empty: normals stay
+    float weight = 0;                    // without an animation
+};
+
 // All per-vertex arrays have the same length. `bones`, `boneIndices` and `boneWeights` are empty in
 // a mesh without bones, which moves with its node as a whole; else the weights of a vertex add up
 // to 1.
@@ -38,6 +45,7 @@ struct Mesh {
     std::vector<BoneWeights> boneWeights;
     std::vector<std::uint32_t> triangles; // three vertices each
     std::vector<Bone> bones;
+    std::vector<MorphTarget> morphTargets;
 
     std::size_t vertexCount() const { return positions.size(); }
     bool hasBones() const { return !bones.empty(); }
@@ -64,10 +72,17 @@ struct Channel {
     std::vector<Key<QVector3D>> scales;
 };
 
+// How the weights of the morph targets change in the meshes of one node: one weight per target.
+struct MorphChannel {
+    std::size_t node;
+    std::vector<Key<std::vector<float>>> weights; // in the order of time, at least one
+};
+
 struct Animation {
     std::string name;
     double seconds; // length of one cycle; 0 for a still
     std::vector<Channel> channels;
+    std::vector<MorphChannel> morphChannels = {};
 };
 
 struct Model {

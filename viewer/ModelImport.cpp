@@ -129,6 +129,27 @@ void copyBones(const aiMesh& source, const NodeIndex& nodes, Mesh& mesh)
     bindLooseVertices(mesh);
 }
 
+// Assimp's targets hold whole positions and normals.
+void copyMorphTargets(const aiMesh& source, Mesh& mesh)
+{
+    const auto deltas = [&source](const aiVector3D* target, const aiVector3D* base) {
+        std::vector<QVector3D> result;
+        for (unsigned i = 0; target && i < source.mNumVertices; ++i)
+            result.push_back(toQt(target[i] - base[i]));
+        return result;
+    };
+    for (unsigned i = 0; i < source.mNumAnimMeshes; ++i) {
+        const aiAnimMesh& target = *source.mAnimMeshes[i];
+        if (target.mNumVertices != source.mNumVertices)
+            continue;
+        MorphTarget& copy = mesh.morphTargets.emplace_back();
+        copy.positionDeltas = target.mVertices ? deltas(target.mVertices, source.mVertices)
+                                               : std::vector<QVector3D>(source.mNumVertices);
+        copy.normalDeltas = deltas(target.mNormals, source.mNormals);
+        copy.weight = target.mWeight;
+    }
+}
+
 Mesh copyMesh(const aiScene& scene, const aiMesh& source, std::size_t node, const NodeIndex& nodes)
 {
     Mesh mesh;
@@ -140,6 +161,7 @@ Mesh copyMesh(const aiScene& scene, const aiMesh& source, std::size_t node, cons
     turnNormalsOutside(mesh);
     if (source.HasBones())
         copyBones(source, nodes, mesh);
+    copyMorphTargets(source, mesh);
     return mesh;
 }
 
@@ -167,6 +189,23 @@ auto copyKeys(const SourceKey* source, unsigned count, double ticksPerSecond, Co
     return keys;
 }
 
+MorphChannel copyMorphChannel(const aiMeshMorphAnim& source, std::size_t node, double ticks)
+{
+    MorphChannel channel{node, {}};
+    for (unsigned i = 0; i < source.mNumKeys; ++i) {
+        const aiMeshMorphKey& key = source.mKeys[i];
+        std::vector<float> weights;
+        for (unsigned value = 0; value < key.mNumValuesAndWeights; ++value) {
+            const std::size_t target = key.mValues[value];
+            if (target >= weights.size())
+                weights.resize(target + 1);
+            weights[target] = static_cast<float>(key.mWeights[value]);
+        }
+        channel.weights.push_back({key.mTime / ticks, std::move(weights)});
+    }
+    return channel;
+}
+
 Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes)
 {
     const double ticks =
@@ -186,6 +225,12 @@ Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes)
             {node->second, copyKeys(channel.mPositionKeys, channel.mNumPositionKeys, ticks, vector),
              copyKeys(channel.mRotationKeys, channel.mNumRotationKeys, ticks, rotation),
              copyKeys(channel.mScalingKeys, channel.mNumScalingKeys, ticks, vector)});
+    }
+    for (unsigned i = 0; i < source.mNumMorphMeshChannels; ++i) {
+        const aiMeshMorphAnim& channel = *source.mMorphMeshChannels[i];
+        const auto node = nodes.find(channel.mName.C_Str());
+        if (node != nodes.end() && channel.mNumKeys > 0)
+            animation.morphChannels.push_back(copyMorphChannel(channel, node->second, ticks));
     }
     return animation;
 }

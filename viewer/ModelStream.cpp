@@ -119,6 +119,11 @@ void transferMesh(Stream& stream, Mesh& mesh)
         stream.plain(bone.node);
         stream.plain(bone.offset);
     });
+    stream.list(mesh.morphTargets, [&stream](MorphTarget& target) {
+        stream.plainList(target.positionDeltas);
+        stream.plainList(target.normalDeltas);
+        stream.plain(target.weight);
+    });
 }
 
 template <typename Stream, typename T>
@@ -147,6 +152,13 @@ void transferModel(Stream& stream, Model& model)
             transferKeys(stream, channel.positions);
             transferKeys(stream, channel.rotations);
             transferKeys(stream, channel.scales);
+        });
+        stream.list(animation.morphChannels, [&stream](MorphChannel& channel) {
+            stream.plain(channel.node);
+            stream.list(channel.weights, [&stream](Key<std::vector<float>>& key) {
+                stream.plain(key.seconds);
+                stream.plainList(key.value);
+            });
         });
     });
 }

@@ -19,17 +19,7 @@ bool resolveAll(QLibrary& library, OpenCLFunctions& cl)
 {
     return resolve(library, "clGetPlatformIDs", cl.clGetPlatformIDs) &&
            resolve(library, "clGetPlatformInfo", cl.clGetPlatformInfo) &&
-           resolve(library, "clGetDeviceInfo", cl.clGetDeviceInfo) &&
-           resolve(library, "clGetKernelInfo", cl.clGetKernelInfo) &&
-           resolve(library, "clCreateCommandQueue", cl.clCreateCommandQueue) &&
-           resolve(library, "clReleaseCommandQueue", cl.clReleaseCommandQueue) &&
-           resolve(library, "clSetKernelArg", cl.clSetKernelArg) &&
-           resolve(library, "clEnqueueNDRangeKernel", cl.clEnqueueNDRangeKernel) &&
-           resolve(library, "clEnqueueCopyBuffer", cl.clEnqueueCopyBuffer) &&
-           resolve(library, "clEnqueueMarkerWithWaitList", cl.clEnqueueMarkerWithWaitList) &&
-           resolve(library, "clGetEventProfilingInfo", cl.clGetEventProfilingInfo) &&
-           resolve(library, "clWaitForEvents", cl.clWaitForEvents) &&
-           resolve(library, "clFlush", cl.clFlush) && resolve(library, "clFinish", cl.clFinish);
+           resolve(library, "clGetDeviceInfo", cl.clGetDeviceInfo);
 }
 
 } // namespace

@@ -50,6 +50,11 @@ void describe(QCommandLineParser& parser)
         {"verify", "Compares every frame with a CPU reference."},
         {"trace", "Writes a timeline for Perfetto to <file>.", "file"},
         {"animation", "Plays the animation called <name>.", "name"},
+        {"deformers",
+         QString("Deforms with this chain, in this order (%1), such as "
+                 "skin,wave:amplitude=0.1:wavelength=0.5.")
+             .arg(kDefaultDeformers),
+         "list", kDefaultDeformers},
         {"min-verts", "Deforms meshes with fewer than <n> vertices on the CPU.", "n"},
         {"platform", "Uses the OpenCL platform of this <vendor>.", "vendor"},
         {"allow-cpu", "Deforms on the CPU where OpenCL cannot be used."},
@@ -123,6 +128,15 @@ public:
         return size;
     }
 
+    std::vector<DeformerChoice> deformers()
+    {
+        Result<std::vector<DeformerChoice>> chain = parseDeformers(text("deformers"));
+        if (chain)
+            return std::move(chain.value());
+        complain(QString::fromStdString(chain.failure().text));
+        return {};
+    }
+
     void complain(const QString& text)
     {
         if (!fFailure)
@@ -151,6 +165,7 @@ Options read(const QCommandLineParser& parser, Reader& reader)
     options.platform = reader.text("platform");
     options.allowCpu = parser.isSet("allow-cpu");
     options.resizeEvery = reader.number("resize-every", 1, kMostFrames).value_or(0);
+    options.deformers = reader.deformers();
     options.import.up = reader.axis("up");
     options.import.creaseAngle =
         reader.number("crease", 0, 180).value_or(static_cast<int>(options.import.creaseAngle));
@@ -192,8 +207,9 @@ std::string helpText()
 {
     QCommandLineParser parser;
     describe(parser);
-    return parser.helpText().toStdString() +
-           "\nIn the window: drag to orbit, wheel to zoom, and the keys\n" + keyHelp() + kExitCodes;
+    return parser.helpText().toStdString() + "\nDeformers and their parameters:\n" +
+           deformerHelp() + "\nIn the window: drag to orbit, wheel to zoom, and the keys\n" +
+           keyHelp() + kExitCodes;
 }
 
 } // namespace viewer

@@ -1,11 +1,13 @@
 // What the user asked for on the command line.
 #pragma once
 
+#include "viewer/DeformerChain.h"
 #include "viewer/Failure.h"
 #include "viewer/ModelImport.h"
 
 #include <optional>
 #include <string>
+#include <vector>
 
 #include <QSize>
 #include <QStringList>
@@ -15,20 +17,21 @@ namespace viewer {
 struct Options {
     std::string model;
     ImportSettings import;
-    int loadLimit = 60;                 // seconds that a model may take to load
-    std::string importProgram;          // imports models; empty: this process does
-    std::string animation;              // empty: the model's first
-    std::optional<int> frames;          // render so many and end; unset: play in a window
-    int crowd = 1;                      // number of characters
-    QSize size{1280, 720};              // pixels
-    std::string output;                 // folder of the pictures; empty: none
-    int every = 1;                      // each so many frames a picture
-    bool verify = false;                // compare with the CPU reference
-    std::string trace;                  // file of the trace; empty: none
-    std::optional<int> minimumVertices; // below it a mesh is deformed on the CPU
-    std::string platform;               // vendor of the OpenCL platform; empty: by the renderer
-    bool allowCpu = false;              // go on without OpenCL
-    int resizeEvery = 0;                // each so many frames another level of detail; 0: never
+    int loadLimit = 60;                    // seconds that a model may take to load
+    std::string importProgram;             // imports models; empty: this process does
+    std::vector<DeformerChoice> deformers; // the chain, in order
+    std::string animation;                 // empty: the model's first
+    std::optional<int> frames;             // render so many and end; unset: play in a window
+    int crowd = 1;                         // number of characters
+    QSize size{1280, 720};                 // pixels
+    std::string output;                    // folder of the pictures; empty: none
+    int every = 1;                         // each so many frames a picture
+    bool verify = false;                   // compare with the CPU reference
+    std::string trace;                     // file of the trace; empty: none
+    std::optional<int> minimumVertices;    // below it a mesh is deformed on the CPU
+    std::string platform;                  // vendor of the OpenCL platform; empty: by the renderer
+    bool allowCpu = false;                 // go on without OpenCL
+    int resizeEvery = 0;                   // each so many frames another level of detail; 0: never
     bool help = false;
     bool version = false;
 };

@@ -39,7 +39,7 @@ std::string overlayText(const OverlayFacts& facts)
         addOpenCL(*facts.openCL, text);
     else
         line(text, "Deformed by") << "the CPU, since OpenCL is not used\n";
-    line(text, "Deformers") << (facts.deforms ? "on\n" : "off: the shape at rest\n");
+    line(text, "Deformers") << facts.deformers << '\n';
     line(text, "Time") << (facts.paused ? "paused\n" : "running\n");
     text << '\n' << keyReminder() << '\n';
     return text.str();

@@ -18,7 +18,7 @@ struct OverlayFacts {
     double evaluationMs = 0;         // of late, the median
     std::optional<double> cpuTwinMs; // of the CPU's copy, where it is shown
     bool paused = false;
-    bool deforms = true;
+    std::string deformers; // the chain
 };
 
 // Lines of a label and what belongs to it, then the keys in short.

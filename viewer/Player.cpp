@@ -29,12 +29,12 @@ void Player::takeChangedKernels()
     for (const ChangedFile& file : fKernelWatch.changes()) {
         fComplaints.erase(file.name);
         fSinceTexts.invalidate();
-        const auto complaint = fSession.replaceKernelFile(file.name, file.text);
-        if (!complaint)
+        const vyra::Status status = fSession.replaceKernelFile(file.name, file.text);
+        if (status.ok())
             continue;
-        fComplaints[file.name] = *complaint;
+        fComplaints[file.name] = status.message;
         std::fprintf(stderr, "vyra-viewer: going on with the last good kernel: %s\n",
-                     complaint->c_str());
+                     status.message.c_str());
     }
 }
 
@@ -64,6 +64,12 @@ OverlayTexts Player::texts() const
         texts.rightHalf = "CPU";
     }
     return texts;
+}
+
+void Player::toggleDeformer(std::size_t number)
+{
+    fSinceTexts.invalidate();
+    fSession.toggleDeformer(number);
 }
 
 void Player::act(Action action)

@@ -8,6 +8,7 @@
 #include "viewer/Overlay.h"
 #include "viewer/PlayClock.h"
 
+#include <cstddef>
 #include <map>
 #include <string>
 
@@ -30,6 +31,8 @@ public:
     void showIn(unsigned framebuffer, const QSize& framebufferSize, double pixelRatio);
     // Does what a key asks for. To quit is the window's.
     void act(Action action);
+    // Switches one deformer of the chain.
+    void toggleDeformer(std::size_t number);
 
     Session& session() { return fSession; }
 

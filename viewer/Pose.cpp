@@ -16,6 +16,18 @@ QQuaternion mix(const QQuaternion& from, const QQuaternion& to, float fraction)
     return QQuaternion::slerp(from, to, fraction);
 }
 
+// A key may hold fewer weights than the next one: the others are 0.
+std::vector<float> mix(const std::vector<float>& from, const std::vector<float>& to, float fraction)
+{
+    std::vector<float> result(std::max(from.size(), to.size()));
+    for (std::size_t i = 0; i < result.size(); ++i) {
+        const float begin = i < from.size() ? from[i] : 0.0f;
+        const float end = i < to.size() ? to[i] : 0.0f;
+        result[i] = begin + (end - begin) * fraction;
+    }
+    return result;
+}
+
 template <typename T>
 T sampleKeys(const std::vector<Key<T>>& keys, double seconds)
 {
@@ -83,9 +95,9 @@ void poseAt(const Model& model, const Animation* animation, double seconds, Pose
     }
 }
 
-MatrixRows rowsOf(const QMatrix4x4& matrix)
+vyra::MatrixRows rowsOf(const QMatrix4x4& matrix)
 {
-    MatrixRows rows;
+    vyra::MatrixRows rows;
     auto next = rows.begin();
     for (int row = 0; row < 3; ++row) {
         for (int column = 0; column < 4; ++column)
@@ -94,18 +106,35 @@ MatrixRows rowsOf(const QMatrix4x4& matrix)
     return rows;
 }
 
-std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose)
+std::vector<vyra::MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose)
 {
-    std::vector<MatrixRows> matrices;
+    std::vector<vyra::MatrixRows> matrices;
     boneMatrices(mesh, pose, matrices);
     return matrices;
 }
 
-void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<MatrixRows>& matrices)
+void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<vyra::MatrixRows>& matrices)
 {
     matrices.resize(mesh.bones.size());
     std::transform(mesh.bones.begin(), mesh.bones.end(), matrices.begin(),
                    [&pose](const Bone& bone) { return rowsOf(pose[bone.node] * bone.offset); });
+}
+
+void morphWeights(const Mesh& mesh, const Animation* animation, double seconds,
+                  std::vector<float>& weights)
+{
+    weights.resize(mesh.morphTargets.size());
+    std::transform(mesh.morphTargets.begin(), mesh.morphTargets.end(), weights.begin(),
+                   [](const MorphTarget& target) { return target.weight; });
+    if (!animation || weights.empty())
+        return;
+    for (const MorphChannel& channel : animation->morphChannels) {
+        if (channel.node != mesh.node)
+            continue;
+        const std::vector<float> sampled =
+            sampleKeys(channel.weights, wrapped(seconds, animation->seconds));
+        std::copy_n(sampled.begin(), std::min(sampled.size(), weights.size()), weights.begin());
+    }
 }
 
 QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose)

@@ -1,9 +1,9 @@
 // Where the nodes of a model are at a moment of an animation, and what that means for its meshes.
 #pragma once
 
+#include "evaluator/Geometry.h"
 #include "viewer/Model.h"
 
-#include <array>
 #include <vector>
 
 #include <QMatrix4x4>
@@ -23,19 +23,18 @@ using Pose = std::vector<QMatrix4x4>;
 Pose poseAt(const Model& model, const Animation* animation, double seconds);
 void poseAt(const Model& model, const Animation* animation, double seconds, Pose& pose);
 
-// The upper three rows of a transform: what the kernels take. A point is transformed by the three
-// dot products of the rows with (x, y, z, 1).
-//
-//     | r0.x r0.y r0.z r0.w |
-//     | r1.x r1.y r1.z r1.w |
-//     | r2.x r2.y r2.z r2.w |
-using MatrixRows = std::array<float, 12>;
-MatrixRows rowsOf(const QMatrix4x4& matrix);
+// The upper three rows of a transform, as deformers take it.
+vyra::MatrixRows rowsOf(const QMatrix4x4& matrix);
 
 // For each bone of the mesh the transform from the mesh at rest to the model's space. The second
 // form reuses the storage of `matrices`.
-std::vector<MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
-void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<MatrixRows>& matrices);
+std::vector<vyra::MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
+void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<vyra::MatrixRows>& matrices);
+
+// The weight of each morph target of the mesh at `seconds`, which wraps around the animation's
+// length. Null stands for the weights at rest.
+void morphWeights(const Mesh& mesh, const Animation* animation, double seconds,
+                  std::vector<float>& weights);
 
 // The transform from the space in which the mesh's deformers leave it (the model's where bones took
 // it there, else its node's) to the model's.

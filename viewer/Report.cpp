@@ -49,6 +49,7 @@ void addMeshes(const RunFacts& facts, Lines& line)
 {
     line("Characters") << facts.characters;
     line("Meshes") << facts.meshes << " with " << facts.vertices << " vertices";
+    line("Deformers") << facts.deformers;
     if (!facts.openCL)
         line("Deformed by") << "the CPU, since OpenCL is not used";
     else if (facts.meshesOnCpu > 0)
@@ -61,12 +62,12 @@ void addMeshes(const RunFacts& facts, Lines& line)
 
 void addCounts(const OpenCLFacts& cl, Lines& line)
 {
-    const EvaluationCounts& counts = cl.counts;
+    const vyra::EvaluatorCounts& counts = cl.counts;
     line("Acquires per frame") << std::setprecision(3)
                                << perEvaluation(counts.acquires, counts.evaluations);
     line("Releases per frame") << perEvaluation(counts.releases, counts.evaluations);
-    line("Kernels") << counts.programsBuilt << " programs built, " << counts.kernelsServed
-                    << " kernels served";
+    line("Kernels") << counts.programsBuilt << " programs built, " << counts.kernelsCreated
+                    << " kernels created";
     line("Pool buffers") << counts.buffersCreated << " created, " << counts.buffersReused
                          << " times reused";
     line("Device memory") << mebibytes(cl.deviceBytes) << ", at most "

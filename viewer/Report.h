@@ -1,7 +1,7 @@
 // What the viewer tells at the end.
 #pragma once
 
-#include "viewer/Evaluation.h"
+#include "evaluator/Evaluator.h"
 #include "viewer/Verification.h"
 
 #include <cstddef>
@@ -18,7 +18,7 @@ struct OpenCLFacts {
     std::string clToGraphics;
     bool doublePrecision = false;
     int minimumVertices = 0;
-    EvaluationCounts counts;
+    vyra::EvaluatorCounts counts;
     std::size_t deviceBytes = 0;
     std::size_t peakDeviceBytes = 0;
 };
@@ -30,6 +30,7 @@ struct RunFacts {
     std::size_t meshes = 0; // of all characters, as the next two
     std::size_t meshesOnCpu = 0;
     std::size_t vertices = 0;
+    std::string deformers;            // the chain
     std::vector<double> evaluationMs; // of each frame, from its start until it could be drawn
     std::optional<Deviation> deviation;
 };

@@ -3,7 +3,9 @@
 #include "viewer/DetailLevel.h"
 #include "viewer/Pose.h"
 
+#include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include <tbb/parallel_for.h>
 
@@ -14,9 +16,8 @@ namespace {
 constexpr float kGap = 0.25f;
 // Neighbours differ by this part of a turn, the golden ratio's: no two move alike.
 constexpr double kPhaseStep = 0.61803398875;
-// How far a whole character twists, head against feet, and how long one sway takes.
-constexpr double kLargestTwist = 0.5; // radians
-constexpr double kTwistPeriod = 4.0;  // seconds
+// Characters of a model without an animation start within this time.
+constexpr double kPhaseSpread = 4.0; // seconds
 constexpr double kFullTurn = 6.28318530718;
 // How much the tints of a crowd differ from white.
 constexpr float kTintDepth = 0.13f;
@@ -91,8 +92,10 @@ Scene::Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation*
         auto levels = std::make_unique<MeshLevels>();
         levels->meshes[0] = mesh;
         levels->meshes[1] = coarserMesh(mesh);
-        for (std::size_t level = 0; level < MeshLevels::kCount; ++level)
+        for (std::size_t level = 0; level < MeshLevels::kCount; ++level) {
+            levels->shapes[level] = shapeOf(levels->meshes[level]);
             levels->indexBuffers[level] = createIndexBuffer(gl, levels->meshes[level]);
+        }
         fLevels.push_back(std::move(levels));
     }
 
@@ -105,8 +108,10 @@ Scene::Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation*
 Scene::~Scene()
 {
     for (CharacterMesh* mesh : fMeshes) {
-        mesh->positions.destroy(fGL, EvaluationState::kClosed);
-        mesh->normals.destroy(fGL, EvaluationState::kClosed);
+        if (mesh->deformable)
+            fEvaluator->destroyMesh(*mesh->deformable);
+        mesh->positions.destroy(fGL);
+        mesh->normals.destroy(fGL);
         fGL.glDeleteVertexArrays(1, &mesh->vertexArray);
     }
     for (const auto& levels : fLevels)
@@ -135,7 +140,7 @@ void Scene::createCharacter(const QMatrix4x4& placement, int number, int crowd)
     character.placement = placement;
     character.tint = crowd > 1 ? tintOf(number) : QVector3D(1, 1, 1);
     const double cycle = fAnimation ? fAnimation->seconds : 0.0;
-    character.phase = std::fmod(kPhaseStep * number, 1.0) * std::max(cycle, kTwistPeriod);
+    character.phase = std::fmod(kPhaseStep * number, 1.0) * std::max(cycle, kPhaseSpread);
     for (const auto& levels : fLevels) {
         auto mesh = std::make_unique<CharacterMesh>();
         mesh->levels = levels.get();
@@ -148,8 +153,8 @@ void Scene::createCharacter(const QMatrix4x4& placement, int number, int crowd)
 
 void Scene::createBuffers(CharacterMesh& mesh)
 {
-    mesh.positions.create(fGL, mesh.mesh().positions);
-    mesh.normals.create(fGL, mesh.mesh().normals);
+    mesh.positions.create(fGL, mesh.shape().geometry->rest.positions);
+    mesh.normals.create(fGL, mesh.shape().geometry->rest.normals);
     fGL.glGenVertexArrays(1, &mesh.vertexArray);
     fGL.glBindVertexArray(mesh.vertexArray);
     const VertexBuffer* attributes[] = {&mesh.positions, &mesh.normals};
@@ -162,13 +167,50 @@ void Scene::createBuffers(CharacterMesh& mesh)
     fGL.glBindVertexArray(0);
 }
 
-void Scene::changeLevel(CharacterMesh& mesh, EvaluationState state)
+void Scene::attach(vyra::Evaluator& evaluator, std::vector<DeformerChoice> deformers)
 {
-    mesh.positions.destroy(fGL, state);
-    mesh.normals.destroy(fGL, state);
+    fEvaluator = &evaluator;
+    fDeformers = std::move(deformers);
+    for (CharacterMesh* mesh : fMeshes)
+        attach(*mesh);
+}
+
+void Scene::attach(CharacterMesh& mesh)
+{
+    mesh.deformable = &fEvaluator->createMesh(mesh.shape().geometry,
+                                              {mesh.positions.name(), mesh.normals.name()});
+    fByDeformable[mesh.deformable] = &mesh;
+    addDeformers(fDeformers, mesh.shape(), *mesh.deformable);
+    applyPose(fDeformers, mesh.shape(), mesh.pose, *mesh.deformable);
+}
+
+void Scene::toggleDeformers()
+{
+    const bool anyEnabled = std::any_of(fDeformers.begin(), fDeformers.end(),
+                                        [](const DeformerChoice& each) { return each.enabled; });
+    for (DeformerChoice& deformer : fDeformers)
+        deformer.enabled = !anyEnabled;
+}
+
+void Scene::toggleDeformer(std::size_t number)
+{
+    if (number < fDeformers.size())
+        fDeformers[number].enabled = !fDeformers[number].enabled;
+}
+
+void Scene::changeLevel(CharacterMesh& mesh)
+{
+    if (mesh.deformable) {
+        fByDeformable.erase(mesh.deformable);
+        fEvaluator->destroyMesh(*mesh.deformable);
+    }
+    mesh.positions.destroy(fGL);
+    mesh.normals.destroy(fGL);
     fGL.glDeleteVertexArrays(1, &mesh.vertexArray);
     mesh.level = (mesh.level + 1) % MeshLevels::kCount;
     createBuffers(mesh);
+    if (fEvaluator)
+        attach(mesh);
 }
 
 void Scene::pose(double seconds)
@@ -181,16 +223,18 @@ void Scene::pose(double seconds)
 void Scene::poseCharacter(Character& character, double seconds) const
 {
     poseAt(fModel, fAnimation, seconds, character.pose);
-    const double twist = kLargestTwist * std::sin(kFullTurn * seconds / kTwistPeriod);
-    const float height = std::max(fSpace.size.y(), kGap);
     for (const auto& mesh : character.meshes) {
-        boneMatrices(mesh->mesh(), character.pose, mesh->pose.bones);
-        mesh->pose.deforms = fDeforms;
-        mesh->pose.geometryMatrix =
-            fSpace.fromModel * (fDeforms ? meshToModel(mesh->mesh(), character.pose)
-                                         : restToModel(mesh->mesh(), fRest));
-        mesh->pose.inverseGeometryMatrix = mesh->pose.geometryMatrix.inverted();
-        mesh->pose.twist = static_cast<float>(twist) / height;
+        MeshPose& pose = mesh->pose;
+        boneMatrices(mesh->mesh(), character.pose, pose.bones);
+        morphWeights(mesh->mesh(), fAnimation, seconds, pose.morphWeights);
+        pose.seconds = seconds;
+        pose.height = fSpace.size.y();
+        pose.skinnedToCharacter = fSpace.fromModel * meshToModel(mesh->mesh(), character.pose);
+        pose.restToCharacter = mesh->mesh().hasBones()
+                                   ? fSpace.fromModel * restToModel(mesh->mesh(), fRest)
+                                   : pose.skinnedToCharacter;
+        if (mesh->deformable)
+            applyPose(fDeformers, mesh->shape(), pose, *mesh->deformable);
     }
 }
 

@@ -2,15 +2,18 @@
 #pragma once
 
 #include "viewer/CharacterSpace.h"
-#include "viewer/Deformation.h"
-#include "viewer/MeshEvaluator.h"
+#include "viewer/DeformerChain.h"
+#include "viewer/MeshShape.h"
 #include "viewer/Model.h"
 #include "viewer/Pose.h"
 #include "viewer/VertexBuffer.h"
 
+#include "evaluator/Evaluator.h"
+
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include <QMatrix4x4>
@@ -23,6 +26,7 @@ namespace viewer {
 struct MeshLevels {
     static constexpr std::size_t kCount = 2;
     Mesh meshes[kCount]; // the finest first
+    MeshShape shapes[kCount];
     GLuint indexBuffers[kCount] = {};
 };
 
@@ -33,11 +37,11 @@ struct CharacterMesh {
     VertexBuffer positions;
     VertexBuffer normals;
     GLuint vertexArray = 0;
-    std::unique_ptr<MeshEvaluator> evaluator; // kept for the run once it was needed
-    bool onOpenCL = false;                    // else it is deformed on the CPU
+    vyra::DeformableMesh* deformable = nullptr; // the evaluator's; null in a scene without one
     MeshPose pose;
 
     const Mesh& mesh() const { return levels->meshes[level]; }
+    const MeshShape& shape() const { return levels->shapes[level]; }
 };
 
 struct Character {
@@ -52,25 +56,37 @@ struct Character {
 // renderer's context to be current.
 class Scene {
 public:
-    // Borrows everything. `animation` is of the model, or null.
+    // Borrows the OpenGL functions and the model. `animation` is of the model, or null.
     Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation, int crowd);
     ~Scene();
     Scene(const Scene&) = delete;
     Scene& operator=(const Scene&) = delete;
 
-    // Deformers that are off leave the meshes at rest from the next pose on.
-    void toggleDeformers() { fDeforms = !fDeforms; }
-    bool deforms() const { return fDeforms; }
+    // Adds every mesh to the evaluator, with these deformers. The evaluator is borrowed, and
+    // destroyed after the scene.
+    void attach(vyra::Evaluator& evaluator, std::vector<DeformerChoice> deformers);
+
+    // From the next pose on, all deformers are off, or on again.
+    void toggleDeformers();
+    // The same for one deformer of the chain, counted from 0. Ignores a number without a deformer.
+    void toggleDeformer(std::size_t number);
+    const std::vector<DeformerChoice>& deformers() const { return fDeformers; }
 
     // Moves every character to its pose at this time, in parallel.
     void pose(double seconds);
 
-    // Replaces both vertex buffers of a mesh by those of its other level of detail, not yet shared.
-    void changeLevel(CharacterMesh& mesh, EvaluationState state);
+    // Replaces both vertex buffers of a mesh by those of its other level of detail. Not while
+    // deformers run.
+    void changeLevel(CharacterMesh& mesh);
 
     const std::vector<Character>& characters() const { return fCharacters; }
     // All meshes of all characters.
     const std::vector<CharacterMesh*>& meshes() const { return fMeshes; }
+    // The mesh that `deformable` deforms.
+    const CharacterMesh& meshOf(const vyra::DeformableMesh& deformable) const
+    {
+        return *fByDeformable.at(&deformable);
+    }
     std::size_t meshesPerCharacter() const { return fLevels.size(); }
     QVector3D size() const { return fSize; } // of the stage, centred at the origin, feet at y = 0
     // Whether the model's extent over the animation is finite and not 0. Without it nothing is
@@ -82,6 +98,7 @@ public:
 private:
     void createCharacter(const QMatrix4x4& placement, int number, int crowd);
     void createBuffers(CharacterMesh& mesh);
+    void attach(CharacterMesh& mesh);
     void poseCharacter(Character& character, double seconds) const;
 
     QOpenGLFunctions_3_3_Core& fGL;
@@ -90,10 +107,12 @@ private:
     CharacterSpace fSpace;
     Pose fRest;
     QVector3D fSize;
-    bool fDeforms = true;
     std::vector<std::unique_ptr<MeshLevels>> fLevels;
     std::vector<Character> fCharacters;
     std::vector<CharacterMesh*> fMeshes;
+    vyra::Evaluator* fEvaluator = nullptr; // null until attach()
+    std::unordered_map<const vyra::DeformableMesh*, const CharacterMesh*> fByDeformable;
+    std::vector<DeformerChoice> fDeformers;
 };
 
 } // namespace viewer

@@ -1,13 +1,14 @@
 #include "viewer/Session.h"
 
+#include "evaluator/ProfileScope.h"
+#include "host/EvaluationId.h"
 #include "runtime/TopenCLInfo.h"
 #include "standalone/DeviceMemory.h"
-#include "viewer/CpuDeformation.h"
+#include "standalone/ProfileRecorder.h"
 #include "viewer/FileOutput.h"
 #include "viewer/ImportProcess.h"
 #include "viewer/LoadProgress.h"
 #include "viewer/OpenCLStart.h"
-#include "viewer/ProfileScope.h"
 #include "viewer/SyncModeNames.h"
 
 #include <algorithm>
@@ -48,6 +49,13 @@ Result<const Animation*> chooseAnimation(const Model& model, const std::string& 
                        (known.empty() ? "it has none at all" : "it has " + known)};
 }
 
+Status statusOf(const vyra::Status& status)
+{
+    if (status.ok())
+        return {};
+    return Failure{ExitCode::kOpenCLError, status.message};
+}
+
 std::string deviceName(const OpenCLFunctions& cl)
 {
     char name[256] = "";
@@ -81,6 +89,8 @@ Status Session::start(const QSize& pictureSize)
                                              "' has no extent, or one that is not finite, so it "
                                              "cannot be shown; check its transforms"};
     if (Status failure = startOpenCLIfPossible())
+        return failure;
+    if (Status failure = attachEvaluator())
         return failure;
     fRenderer = std::make_unique<Renderer>(*fGL);
     if (Status failure = fRenderer->initialize())
@@ -128,12 +138,34 @@ Status Session::startOpenCLIfPossible()
     fCL = cl.value();
     if (fOptions.minimumVertices)
         TopenCLInfo::theOne().setMinimumBufferSize(*fOptions.minimumVertices);
-    fEvaluation = std::make_unique<Evaluation>(*fGL, fCL, *fScene);
-    for (CharacterMesh* mesh : fScene->meshes()) {
-        if (Status refused = fEvaluation->adopt(*mesh))
-            return refused;
-    }
     return {};
+}
+
+vyra::EvaluatorSettings Session::evaluatorSettings()
+{
+    vyra::EvaluatorSettings settings;
+    settings.finishRenderer = [this] { fGL->glFinish(); };
+    settings.flushRenderer = [this] { fGL->glFlush(); };
+    settings.writeVertices = [this](vyra::DeformableMesh& deformable,
+                                    const vyra::Surface& surface) {
+        const CharacterMesh& mesh = fScene->meshOf(deformable);
+        mesh.positions.write(*fGL, surface.positions);
+        mesh.normals.write(*fGL, surface.normals);
+    };
+    settings.traceClock = ProfileRecorder::nowNs;
+    settings.traceCommand = [](const std::string& track, const char* name, std::int64_t begin,
+                               std::int64_t end) {
+        ProfileRecorder::record(track, name, begin, end);
+    };
+    return settings;
+}
+
+Status Session::attachEvaluator()
+{
+    fEvaluator = std::make_unique<vyra::Evaluator>(evaluatorSettings());
+    fScene->attach(*fEvaluator, fOptions.deformers);
+    fScene->pose(0); // the deformers are checked with what they need
+    return statusOf(fEvaluator->prepare());
 }
 
 Status Session::renderFrame(double seconds)
@@ -150,14 +182,13 @@ Status Session::renderFrame(double seconds)
 
     // Before the drawing, which takes so long that it would hide a wait that is missing.
     if (fOptions.verify) {
-        const ProfileScope scope("Verify");
+        const vyra::ProfileScope scope("Verify");
         if (!fDeviation)
             fDeviation.emplace();
         fDeviation->include(verify(*fGL, *fScene));
     }
     draw();
-    if (fEvaluation)
-        fEvaluation->renderingComplete();
+    fEvaluator->renderingComplete();
     Status failure = writePicture();
     ++fFrame;
     return failure;
@@ -166,7 +197,7 @@ Status Session::renderFrame(double seconds)
 // The original, and its copy where there is one, on the left and the right.
 void Session::draw()
 {
-    const ProfileScope scope("Draw");
+    const vyra::ProfileScope scope("Draw");
     const QRect left(QPoint(), viewSize());
     fRenderer->draw(*fScene, fCamera, *fCanvas, left);
     if (fCpuTwin)
@@ -176,22 +207,33 @@ void Session::draw()
 // From here to the return is what the report calls the evaluation time.
 Status Session::evaluate()
 {
-    Status failure;
+    const vyra::ProfileScope scope("Evaluate");
+    const em::Id id(static_cast<std::uint16_t>(fFrame % kEvaluationNumbers));
     if (levelChangeIsDue(EvaluationState::kClosed))
-        failure = changeLevels(EvaluationState::kClosed);
-    if (!failure && fEvaluation) {
-        const em::Id id(static_cast<std::uint16_t>(fFrame % kEvaluationNumbers));
-        failure = fEvaluation->evaluate(id, [this]() -> Status {
-            return levelChangeIsDue(EvaluationState::kOpen) ? changeLevels(EvaluationState::kOpen)
-                                                            : Status{};
-        });
-    }
-    if (failure)
+        changeLevels();
+    if (fEvaluator->usesOpenCL() && levelChangeIsDue(EvaluationState::kOpen))
+        evaluateWithLevelChange(id);
+    else
+        fEvaluator->evaluate(id);
+    if (Status failure = statusOf(fEvaluator->status()))
         return failure;
-    deformOnCpu(*fGL, *fScene);
-    if (fEvaluation)
-        fEvaluation->waitUntilDrawable();
+    const vyra::ProfileScope waiting("Wait for OpenCL");
+    fEvaluator->waitUntilDrawable();
     return {};
+}
+
+// Opens and closes the evaluation itself, as a host does whose graph has other users of the shared
+// buffers.
+void Session::evaluateWithLevelChange(const em::Id& id)
+{
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    if (info.useGLFinish())
+        fGL->glFinish();
+    info.sharedBufferMgr().PreEvaluate(id);
+    changeLevels();
+    fEvaluator->deform();
+    info.sharedBufferMgr().PostEvaluate(id);
+    TopenCLInfo::flush();
 }
 
 // --resize-every changes the level of detail in turn before and during an evaluation; the key does
@@ -206,26 +248,17 @@ bool Session::levelChangeIsDue(EvaluationState state) const
     return isOddChange == (state == EvaluationState::kOpen);
 }
 
-Status Session::changeLevels(EvaluationState state)
+// Of one mesh of each character, a different one each time, so that buffers in the batch and new
+// ones outside meet in one evaluation.
+void Session::changeLevels()
 {
-    if (fEvaluation)
-        fEvaluation->waitForSingles();
-    // One mesh of each character, a different one each time, so that buffers in the batch and new
-    // ones outside meet in one evaluation.
     const std::size_t count = fScene->meshesPerCharacter();
     const auto change = static_cast<std::size_t>(fFrame / std::max(fOptions.resizeEvery, 1));
     for (std::size_t i = 0; i < fScene->meshes().size(); ++i) {
-        if (!fChangeAll && i % count != change % count)
-            continue;
-        CharacterMesh& mesh = *fScene->meshes()[i];
-        fScene->changeLevel(mesh, state);
-        if (!fEvaluation)
-            continue;
-        if (Status failure = fEvaluation->adopt(mesh))
-            return failure;
+        if (fChangeAll || i % count == change % count)
+            fScene->changeLevel(*fScene->meshes()[i]);
     }
     fChangeAll = false;
-    return {};
 }
 
 void Session::resize(const QSize& pictureSize)
@@ -256,13 +289,12 @@ void Session::toggleCpuTwin()
 
 std::string Session::kernelFolder() const
 {
-    return fEvaluation ? KernelFiles::folder() : std::string();
+    return fEvaluator->usesOpenCL() ? vyra::Evaluator::kernelDirectory() : std::string();
 }
 
-std::optional<std::string> Session::replaceKernelFile(const std::string& file,
-                                                      const std::string& source)
+vyra::Status Session::replaceKernelFile(const std::string& file, const std::string& source)
 {
-    return fEvaluation ? fEvaluation->replaceKernelFile(file, source) : std::nullopt;
+    return fEvaluator->replaceKernelFile(file, source);
 }
 
 Status Session::writePicture() const
@@ -295,7 +327,7 @@ OpenCLFacts Session::openCLFacts() const
     facts.clToGraphics = nameOf(info.clToGraphicsSyncMode());
     facts.doublePrecision = info.supportsDoublePrecision();
     facts.minimumVertices = info.minimumBufferSize();
-    facts.counts = fEvaluation->counts();
+    facts.counts = fEvaluator->counts();
     facts.deviceBytes = memory.currentBytes;
     facts.peakDeviceBytes = memory.peakBytes;
     return facts;
@@ -304,31 +336,32 @@ OpenCLFacts Session::openCLFacts() const
 OverlayFacts Session::overlayFacts() const
 {
     OverlayFacts facts;
-    if (fEvaluation) {
+    if (fEvaluator->usesOpenCL()) {
         const OpenCLFacts cl = openCLFacts();
-        facts.openCL = {cl.device, cl.graphicsToCL, cl.clToGraphics, fEvaluation->batchSize()};
+        facts.openCL = {cl.device, cl.graphicsToCL, cl.clToGraphics, fEvaluator->batchSize()};
     }
     const std::size_t recent = std::min(fEvaluationMs.size(), kRecentFrames);
     const auto end = fEvaluationMs.end();
     facts.evaluationMs = percentile({end - static_cast<std::ptrdiff_t>(recent), end}, 0.5);
     if (fCpuTwin)
         facts.cpuTwinMs = fCpuTwin->milliseconds();
-    facts.deforms = fScene->deforms();
+    facts.deformers = chainText(fScene->deformers());
     return facts;
 }
 
 std::string Session::report() const
 {
     RunFacts facts;
-    if (fEvaluation)
+    if (fEvaluator->usesOpenCL())
         facts.openCL = openCLFacts();
     facts.renderer = reinterpret_cast<const char*>(fGL->glGetString(GL_RENDERER));
     facts.characters = fScene->characters().size();
     facts.meshes = fScene->meshes().size();
     for (const CharacterMesh* mesh : fScene->meshes()) {
         facts.vertices += mesh->mesh().vertexCount();
-        facts.meshesOnCpu += mesh->onOpenCL ? 0 : 1;
+        facts.meshesOnCpu += mesh->deformable->usesOpenCL() ? 0 : 1;
     }
+    facts.deformers = chainText(fScene->deformers());
     facts.evaluationMs = fEvaluationMs;
     facts.deviation = fDeviation;
     return reportText(facts);

@@ -4,7 +4,6 @@
 #include "viewer/Camera.h"
 #include "viewer/Canvas.h"
 #include "viewer/CpuTwin.h"
-#include "viewer/Evaluation.h"
 #include "viewer/Failure.h"
 #include "viewer/Model.h"
 #include "viewer/OpenCLFunctions.h"
@@ -15,6 +14,8 @@
 #include "viewer/Scene.h"
 #include "viewer/Verification.h"
 
+#include "evaluator/Evaluator.h"
+#include "evaluator/Status.h"
 #include "standalone/GLHost.h"
 
 #include <memory>
@@ -26,6 +27,9 @@
 #include <QOpenGLWindow>
 
 namespace viewer {
+
+// Whether an evaluation is open: its batch is acquired.
+enum class EvaluationState { kClosed, kOpen };
 
 // All operations, and the destruction, need the window's context to be current.
 class Session {
@@ -46,20 +50,22 @@ public:
     void changeDetail() { fChangeAll = true; }
     // From the next frame on the meshes stay at rest, or are deformed again.
     void toggleDeformers() { fScene->toggleDeformers(); }
+    void toggleDeformer(std::size_t number) { fScene->toggleDeformer(number); }
     // Shows a copy that the CPU deforms on the right half of the picture, or no longer. The camera
     // comes to where everything is seen.
     void toggleCpuTwin();
 
     // Where the kernel files are. Empty without OpenCL.
     std::string kernelFolder() const;
-    // Evaluation::replaceKernelFile.
-    std::optional<std::string> replaceKernelFile(const std::string& file,
-                                                 const std::string& source);
+    // Evaluator::replaceKernelFile.
+    vyra::Status replaceKernelFile(const std::string& file, const std::string& source);
 
     Camera& camera() { return fCamera; }
     Canvas& canvas() { return *fCanvas; }
     // False when a frame was beyond the bound of --verify.
     bool verified() const { return !fDeviation || fDeviation->withinBound(); }
+    // False if OpenCL deforms no mesh.
+    bool usesOpenCL() const { return deformsOnOpenCL(*fScene); }
     std::string report() const;
     // Of the present, all but the pause.
     OverlayFacts overlayFacts() const;
@@ -68,11 +74,14 @@ private:
     Status loadModel();
     Result<Model> importChosenModel();
     Status startOpenCLIfPossible();
+    vyra::EvaluatorSettings evaluatorSettings();
+    Status attachEvaluator();
     Status evaluate();
+    void evaluateWithLevelChange(const em::Id& id);
     void draw();
     void frameScene();
     QSize viewSize() const; // of one scene in the picture
-    Status changeLevels(EvaluationState state);
+    void changeLevels();
     bool levelChangeIsDue(EvaluationState state) const;
     Status writePicture() const;
     OpenCLFacts openCLFacts() const;
@@ -83,10 +92,10 @@ private:
     std::unique_ptr<GLHost> fHost;
     OpenCLFunctions fCL;
     Model fModel;
-    const Animation* fAnimation = nullptr; // of fModel
+    const Animation* fAnimation = nullptr;       // of fModel
+    std::unique_ptr<vyra::Evaluator> fEvaluator; // outlives the scene, whose meshes it owns
     std::unique_ptr<Scene> fScene;
-    std::unique_ptr<CpuTwin> fCpuTwin;       // null: the scene fills the picture
-    std::unique_ptr<Evaluation> fEvaluation; // null: without OpenCL
+    std::unique_ptr<CpuTwin> fCpuTwin; // null: the scene fills the picture
     std::unique_ptr<Renderer> fRenderer;
     std::unique_ptr<Canvas> fCanvas;
     Camera fCamera;

@@ -1,6 +1,7 @@
 // Compares what stands in the renderer's vertex buffers with the CPU reference.
 #pragma once
 
+#include "evaluator/Geometry.h"
 #include "viewer/Scene.h"
 
 #include <QOpenGLFunctions_3_3_Core>
@@ -23,10 +24,14 @@ inline constexpr double kNormalBound = 1e-4;
 
 // `toCharacter` leads from the space of both surfaces to the character's, where positions are
 // compared.
-Deviation compare(const Surface& actual, const Surface& expected, const QMatrix4x4& toCharacter);
+Deviation compare(const vyra::Surface& actual, const vyra::Surface& expected,
+                  const QMatrix4x4& toCharacter);
 
-// Reads every vertex buffer of the scene back from OpenGL. On the renderer's thread, its context
-// current, when the frame may be drawn.
+// Reads every vertex buffer of the scene back from OpenGL, and compares it with the CPU side of the
+// deformers. On the renderer's thread, its context current, when the frame may be drawn.
 Deviation verify(QOpenGLFunctions_3_3_Core& gl, const Scene& scene);
+
+// Whether OpenCL deforms any mesh. If not, verify() compares the CPU with itself.
+bool deformsOnOpenCL(const Scene& scene);
 
 } // namespace viewer

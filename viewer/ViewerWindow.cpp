@@ -107,6 +107,9 @@ void ViewerWindow::keyPressEvent(QKeyEvent* event)
     } else if (action && fPlayer) {
         makeCurrent();
         fPlayer->act(*action);
+    } else if (const auto number = deformerOf(event->key()); number && fPlayer) {
+        makeCurrent();
+        fPlayer->toggleDeformer(*number);
     }
 }
 

@@ -119,6 +119,11 @@ Status run(const Options& options, bool& verified)
     Status failure = options.frames ? renderFrames(session, window, *options.frames)
                                     : playInWindow(session, window);
     verified = session.verified();
+    if (!failure && options.verify && !session.usesOpenCL())
+        failure =
+            Failure{ExitCode::kDeviation,
+                    "--verify compared nothing that OpenCL deformed: all meshes were deformed "
+                    "on the CPU; the report shows why"};
     std::fputs(session.report().c_str(), stdout);
     return failure;
 }

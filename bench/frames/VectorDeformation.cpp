@@ -6,9 +6,8 @@
 
 namespace {
 
-using viewer::MatrixRows;
 using viewer::Mesh;
-using viewer::MeshPose;
+using vyra::MatrixRows;
 
 using Float4 = float __attribute__((vector_size(16))); // x, y, z and one to spare
 
@@ -84,10 +83,10 @@ void copyVertex(const Mesh& mesh, std::size_t vertex, Block& block, std::size_t 
     block.normals.set(slot, Float4{n.x(), n.y(), n.z(), 0});
 }
 
-void twist(const MeshPose& pose, std::size_t count, Block& block)
+void twist(const VectorPose& pose, std::size_t count, Block& block)
 {
-    const MatrixRows m = viewer::rowsOf(pose.geometryMatrix);
-    const MatrixRows w = viewer::rowsOf(pose.inverseGeometryMatrix);
+    const MatrixRows& m = pose.geometryMatrix;
+    const MatrixRows& w = pose.inverseGeometryMatrix;
     auto& [px, py, pz] = block.positions;
     auto& [nx, ny, nz] = block.normals;
     for (std::size_t i = 0; i < count; ++i) {
@@ -96,9 +95,10 @@ void twist(const MeshPose& pose, std::size_t count, Block& block)
         const float z = m[8] * px[i] + m[9] * py[i] + m[10] * pz[i] + m[11];
         const float u = w[0] * nx[i] + w[4] * ny[i] + w[8] * nz[i];
         const float t = w[2] * nx[i] + w[6] * ny[i] + w[10] * nz[i];
-        const float v = w[1] * nx[i] + w[5] * ny[i] + w[9] * nz[i] - pose.twist * (z * u - x * t);
-        const float c = std::cos(pose.twist * y);
-        const float s = std::sin(pose.twist * y);
+        const float v =
+            w[1] * nx[i] + w[5] * ny[i] + w[9] * nz[i] - pose.twistPerHeight * (z * u - x * t);
+        const float c = std::cos(pose.twistPerHeight * y);
+        const float s = std::sin(pose.twistPerHeight * y);
         const float turnedX = c * x + s * z;
         const float turnedZ = c * z - s * x;
         px[i] = w[0] * turnedX + w[1] * y + w[2] * turnedZ + w[3];
@@ -118,11 +118,12 @@ void twist(const MeshPose& pose, std::size_t count, Block& block)
 
 } // namespace
 
-void deformWithVectors(const Mesh& mesh, const MeshPose& pose, std::size_t begin, std::size_t end,
-                       QVector3D* positions, QVector3D* normals)
+void deformWithVectors(const VectorPose& pose, std::size_t begin, std::size_t end,
+                       vyra::Vector3* positions, vyra::Vector3* normals)
 {
-    std::vector<Columns> bones(pose.bones.size());
-    std::transform(pose.bones.begin(), pose.bones.end(), bones.begin(), columnsOf);
+    const Mesh& mesh = *pose.mesh;
+    std::vector<Columns> bones(pose.bones->size());
+    std::transform(pose.bones->begin(), pose.bones->end(), bones.begin(), columnsOf);
     Block block;
     for (std::size_t first = begin; first < end; first += kBlock) {
         const std::size_t count = std::min(kBlock, end - first);

@@ -1,14 +1,17 @@
 // Measures whole frames: the library beside what an application would do without it.
 #include "Allocations.h"
+#include "Path.h"
 #include "Runtime.h"
-#include "Way.h"
 #include "harness/Report.h"
 #include "harness/Statistics.h"
 #include "harness/Table.h"
+#include "runtime/TopenCLInfo.h"
+#include "viewer/DeformerChain.h"
 #include "viewer/ModelImport.h"
 #include "viewer/Verification.h"
 
 #include <algorithm>
+#include <climits>
 #include <cstdio>
 #include <iostream>
 #include <random>
@@ -25,15 +28,15 @@ namespace {
 
 constexpr const char* kUsage = R"(Usage: vyra-opencl-bench-frames [OPTION...] [MODEL]
 
-Deforms crowds of a model (X/Testwuson.X), frame after frame, in three ways: through the library in the
-vertex buffers themselves ("shared"); on OpenCL with the vertices read back and uploaded by
-glBufferSubData ("read back"); on the processor, with all its threads and vector instructions, and
-uploaded ("processor"). A time ends when OpenGL has finished. Nothing is drawn. At the end each way is
-compared with the viewer's reference.
+Deforms crowds of a model (X/Testwuson.X), frame after frame, on three paths: through the library in
+the vertex buffers themselves ("shared"); on OpenCL with the vertices read back and uploaded by
+glBufferSubData ("read back"); on the CPU, with all its threads and vector instructions, and uploaded
+("CPU"). A time ends when OpenGL has finished. Nothing is drawn. At the end each path is compared with
+the reference of the deformers.
 
   --crowds N,N,...   numbers of characters (1,2,5,16,50,156,500,1560)
-  --frames N         frames a way, of which the first are left out (25)
-  --only WAY         one way alone
+  --frames N         frames per path, of which the first are left out (25)
+  --only PATH        one path only
   --json FILE        also writes the results as JSON
   --help             this text
 )";
@@ -41,6 +44,7 @@ compared with the viewer's reference.
 // Frames until memory and kernels are there.
 constexpr int kWarmUp = 5;
 constexpr double kSecondsPerFrame = 1.0 / 24;
+constexpr const char* kDeformers = "skin,twist";
 
 struct Options {
     std::string model = "X/Testwuson.X";
@@ -104,10 +108,11 @@ Options parse(int count, char** arguments)
     return options;
 }
 
-// One way with its scene and what it took.
+// One path with its scene and its times.
 struct Candidate {
+    std::unique_ptr<vyra::Evaluator> evaluator; // outlives the scene
     std::unique_ptr<viewer::Scene> scene;
-    std::unique_ptr<Way> way;
+    std::unique_ptr<Path> path;
     std::vector<double> milliseconds{};
     Allocations allocations{}; // in the frames that were timed
 };
@@ -120,13 +125,9 @@ struct Crowd {
 
 class Stage {
 public:
-    Stage(QOpenGLFunctions_3_3_Core& gl, const viewer::OpenCLFunctions& cl,
-          const viewer::Model& model)
-        : fGL(gl), fCL(cl), fModel(model)
-    {
-    }
+    Stage(QOpenGLFunctions_3_3_Core& gl, const viewer::Model& model) : fGL(gl), fModel(model) {}
 
-    // The times of `frames` frames, the ways in random order in each. With `only`, of one way.
+    // The times of `frames` frames, the paths in random order in each. With `only`, of one path.
     Crowd measure(int characters, int frames, const std::string& only)
     {
         Crowd crowd{characters, 0, candidates(characters, only)};
@@ -140,11 +141,11 @@ public:
         }
         for (Candidate& candidate : crowd.candidates) {
             if (!viewer::verify(fGL, *candidate.scene).withinBound())
-                throw std::runtime_error(std::string("a frame of the way '") +
-                                         candidate.way->name() + "' is wrong");
+                throw std::runtime_error(std::string("a frame of the path '") +
+                                         candidate.path->name() + "' is wrong");
         }
         const auto byName = [](const Candidate& a, const Candidate& b) {
-            return std::string_view(a.way->name()) > b.way->name();
+            return std::string_view(a.path->name()) > b.path->name();
         };
         std::sort(crowd.candidates.begin(), crowd.candidates.end(), byName);
         return crowd;
@@ -161,18 +162,26 @@ private:
     std::vector<Candidate> candidates(int characters, const std::string& only)
     {
         std::vector<Candidate> all;
-        const auto add = [&](const char* name, auto&& make) {
+        const auto add = [&](const char* name, bool shares, auto&& make) {
             if (!only.empty() && only != name)
                 return;
+            // Vertex buffers that a path does not share must not be in the batch.
+            TopenCLInfo::theOne().setMinimumBufferSize(shares ? 0 : INT_MAX);
+            auto evaluator = std::make_unique<vyra::Evaluator>(settings());
             auto stage = scene(characters);
-            auto way = make(*stage);
-            all.push_back({std::move(stage), std::move(way)});
+            stage->attach(*evaluator, viewer::parseDeformers(kDeformers).value());
+            stage->pose(0);
+            auto path = make(*evaluator, *stage);
+            all.push_back({std::move(evaluator), std::move(stage), std::move(path)});
         };
-        add("shared", [&](viewer::Scene& s) { return makeSharedWay(fGL, fCL, s); });
-        add("read back", [&](viewer::Scene& s) { return makeReadBackWay(fGL, fCL, s); });
-        add("processor", [&](viewer::Scene& s) { return makeProcessorWay(fGL, s); });
+        add("shared", true,
+            [](vyra::Evaluator& e, viewer::Scene&) { return makeSharedBufferPath(e); });
+        add("read back", false,
+            [this](vyra::Evaluator&, viewer::Scene& s) { return makeReadBackPath(fGL, s); });
+        add("CPU", false,
+            [this](vyra::Evaluator&, viewer::Scene& s) { return makeCpuPath(fGL, s); });
         if (all.empty())
-            throw std::runtime_error("there is no way '" + only + "'; --help tells them");
+            throw std::runtime_error("there is no path '" + only + "'; --help lists them");
         return all;
     }
 
@@ -181,18 +190,25 @@ private:
         const Allocations before = allocationsSoFar();
         candidate.scene->pose(frame * kSecondsPerFrame);
         const Nanoseconds time = timed([&] {
-            candidate.way->deform();
+            candidate.path->deform();
             fGL.glFinish();
         });
-        candidate.way->drawn();
+        candidate.path->drawn();
         if (frame < kWarmUp)
             return;
         candidate.allocations += allocationsSoFar() - before;
         candidate.milliseconds.push_back(std::chrono::duration<double, std::milli>(time).count());
     }
 
+    vyra::EvaluatorSettings settings()
+    {
+        vyra::EvaluatorSettings settings;
+        settings.finishRenderer = [this] { fGL.glFinish(); };
+        settings.flushRenderer = [this] { fGL.glFlush(); };
+        return settings;
+    }
+
     QOpenGLFunctions_3_3_Core& fGL;
-    const viewer::OpenCLFunctions& fCL;
     const viewer::Model& fModel;
 };
 
@@ -212,7 +228,7 @@ void addRows(Table& table, const Crowd& crowd)
 {
     for (const Candidate& candidate : crowd.candidates) {
         const Spread spread = spreadOf(candidate.milliseconds);
-        table.add({std::string(candidate.way->name()), std::to_string(crowd.characters),
+        table.add({std::string(candidate.path->name()), std::to_string(crowd.characters),
                    std::to_string(crowd.vertices), fixed(spread.median, 2), fixed(spread.low, 2),
                    fixed(spread.high, 2), fixed(1000 * spread.median / crowd.characters, 1),
                    fixed(perFrame(candidate.allocations.library, candidate), 1),
@@ -227,7 +243,7 @@ QJsonArray toJson(const Crowd& crowd)
     for (const Candidate& candidate : crowd.candidates) {
         const Spread spread = spreadOf(candidate.milliseconds);
         rows.append(QJsonObject{
-            {"way", candidate.way->name()},
+            {"path", candidate.path->name()},
             {"characters", crowd.characters},
             {"vertices", static_cast<qint64>(crowd.vertices)},
             {"milliseconds",
@@ -249,16 +265,15 @@ void run(const Options& options, int& argumentCount, char** arguments)
     Runtime runtime(argumentCount, arguments);
     auto* gl = QOpenGLVersionFunctionsFactory::get<QOpenGLFunctions_3_3_Core>(
         QOpenGLContext::currentContext());
-    const viewer::Result<viewer::OpenCLFunctions> cl = viewer::loadOpenCLFunctions();
     const viewer::Result<viewer::Model> model = viewer::importModel(options.model);
     if (!gl)
         throw std::runtime_error("the graphics driver has no OpenGL 3.3");
-    if (!cl || !model)
-        throw std::runtime_error(cl ? model.failure().text : cl.failure().text);
+    if (!model)
+        throw std::runtime_error(model.failure().text);
 
     startCounting();
-    Stage stage(*gl, cl.value(), model.value());
-    Table table({"Way", "characters", "vertices", "ms", "10 %", "90 %", "us/character",
+    Stage stage(*gl, model.value());
+    Table table({"Path", "characters", "vertices", "ms", "10 %", "90 %", "us/character",
                  "new: library", "program", "others"});
     QJsonArray rows;
     for (const int characters : options.crowds) {

@@ -8,10 +8,10 @@ import matplotlib
 matplotlib.use("Agg")
 from matplotlib import pyplot  # noqa: E402: the backend comes first
 
-WAYS = {
+PATHS = {
     "shared": ("the library: OpenCL, in the vertex buffers", "#1f77b4", "o"),
     "read back": ("OpenCL, read back, glBufferSubData", "#d62728", "s"),
-    "processor": ("TBB and vector instructions, glBufferSubData", "#7f7f7f", "^"),
+    "CPU": ("TBB and vector instructions, glBufferSubData", "#7f7f7f", "^"),
 }
 
 
@@ -21,8 +21,8 @@ def main():
     with open(sys.argv[1], encoding="utf-8") as file:
         run = json.load(file)
     figure, axes = pyplot.subplots(figsize=(7.2, 4.2), layout="constrained")
-    for way, (label, colour, marker) in WAYS.items():
-        rows = [row for row in run["rows"] if row["way"] == way]
+    for path, (label, colour, marker) in PATHS.items():
+        rows = [row for row in run["rows"] if row["path"] == path]
         vertices = [row["vertices"] for row in rows]
         times = [row["milliseconds"] for row in rows]
         axes.plot(vertices, [time["median"] for time in times], marker=marker, color=colour, label=label)

@@ -15,10 +15,11 @@ ROOMS = [
     # PoCL links each kernel into a library of its own, in its cache.
     ("kernels", re.compile(r"/pocl/kcache/")),
     ("library", re.compile(r"libvyra-opencl\.so")),
+    ("evaluator", re.compile(r"libvyra-evaluator\.so")),
 ]
 # Outside of evaluations: poses of the next frame, start and end.
 NOT_EVALUATION = re.compile(r"viewer::Scene::|viewer::verify|clBuildProgram|POclBuildProgram")
-EVALUATION = re.compile(r"SharedWay::(deform|drawn)")
+EVALUATION = re.compile(r"SharedBufferPath::(deform|drawn)")
 
 
 def samples(lines):
@@ -52,7 +53,7 @@ def room_of(frames):
 
 
 def main():
-    counts = dict.fromkeys(["kernels", "runtime", "library", "host"], 0)
+    counts = dict.fromkeys(["kernels", "runtime", "library", "evaluator", "host"], 0)
     main_thread = None
     for (command, thread), frames in samples(sys.stdin):
         if not command.startswith("vyra-opencl-ben"):

@@ -6,13 +6,14 @@ import sys
 import unittest
 
 SCRIPT = pathlib.Path(__file__).parents[2] / "bench/frames/rooms.py"
-DEFORM = ("SharedWay::deform()", "/b/vyra-opencl-bench-frames")
+DEFORM = ("SharedBufferPath::deform()", "/b/vyra-opencl-bench-frames")
 SAMPLES = [
     # thread, frames from the innermost outwards, the room
     (1, [("strlen", "/l/libc.so.6"), ("main", "/b/vyra-opencl-bench-frames")], None),  # outside of an evaluation
     (1, [("malloc", "/l/libc.so.6"), ("AutoCLEventList::grow()", "/b/libvyra-opencl.so.1.0.0"), DEFORM], "library"),
     (1, [("entry", "[kernel.kallsyms]"), ("clFlush", "/l/libOpenCL.so.1.0.0"), DEFORM], "runtime"),
-    (2, [("viewer::DeformerChain::evaluate()", "/b/vyra-opencl-bench-frames")], "host"),
+    (2, [("vyra::DeformationQueue::deform()", "/b/libvyra-evaluator.so.1.0.0")], "evaluator"),
+    (2, [("tbb::task::execute()", "/b/vyra-opencl-bench-frames")], "host"),
     (2, [("viewer::Scene::poseCharacter()", "/b/vyra-opencl-bench-frames")], None),
     (3, [("skin", "/c/pocl/kcache/AB/skin/64/skin.so"), ("run", "/l/pocl/libpocl-devices-pthread.so")], "kernels"),
     (3, [("memcpy", "/l/libc.so.6"), ("copy", "/l/pocl/libpocl-devices-pthread.so")], "runtime"),
@@ -30,7 +31,7 @@ class Rooms(unittest.TestCase):
         ) + "Xvfb 9 \n\t    7f00 main (/usr/bin/Xvfb)\n\n"
         output = subprocess.run([sys.executable, SCRIPT], input=text, capture_output=True, text=True, check=True)
         rooms = [room for _, _, room in SAMPLES]
-        expected = {room: rooms.count(room) for room in ("kernels", "runtime", "library", "host")}
+        expected = {room: rooms.count(room) for room in ("kernels", "runtime", "library", "evaluator", "host")}
         self.assertEqual(json.loads(output.stdout), expected)
 
 

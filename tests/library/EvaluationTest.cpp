@@ -35,6 +35,7 @@ struct QueueRelease {
 struct Mesh {
     unsigned glBuffer = 0;
     const TopenCLSharedBuffer* shared = nullptr;
+    bool alone = false; // outside the batch in this evaluation
     AutoCLObject<cl_kernel> add;
     AutoCLObject<cl_kernel> scale;
     std::unique_ptr<_cl_command_queue, QueueRelease> queue;
@@ -67,10 +68,11 @@ protected:
         mesh.scale = deformKernel("scale");
         mesh.queue.reset(TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr));
         share(mesh);
+        mesh.alone = GetParam().forceThreading != nullptr;
         return mesh;
     }
 
-    void share(Mesh& mesh)
+    static void share(Mesh& mesh)
     {
         int error = CL_SUCCESS;
         mesh.shared = manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(),
@@ -92,7 +94,7 @@ protected:
         const auto scaled = enqueueDeform(mesh.queue.get(), mesh.scale.get(), memory, 2.0F,
                                           kElements, {added.get()});
         const cl_event last = scaled.get();
-        if (mesh.shared->fInBatch) {
+        if (!mesh.alone) {
             manager().EnqueueReleaseBatchedSharedCLBuffer(1, &last);
         } else {
             ASSERT_EQ(manager().EnqueueReleaseSharedCLBuffer(mesh.queue.get(), 1, &memory, 1, &last,
@@ -192,7 +194,9 @@ TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
             renderer().finish();
             share(meshes[1]);
             EXPECT_FALSE(meshes[1].shared->fInBatch);
+            meshes[1].alone = true;
         });
+        meshes[1].alone = GetParam().forceThreading != nullptr; // it has joined the batch
         for (const Mesh& mesh : meshes)
             EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements), everywhere(12.0F));
     }

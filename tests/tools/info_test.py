@@ -71,7 +71,7 @@ SCRIPTED = [
     # Its kernels do nothing.
     ("ordinary", {}, INTEL, 3, {
         "on": True, "selfTest.milliseconds": None,
-        "selfTest.problem": "30000 of 30000 numbers in OpenGL's memory are wrong in evaluation 1"}),
+        "selfTest.problem": "60000 of 60000 numbers in OpenGL's memory are wrong in evaluation 1"}),
     ("no-buffer", {}, INTEL, 3, {
         "selfTest.status.code": -60, "selfTest.status.name": "CL_INVALID_GL_OBJECT"}),
     ("no-platform", {}, INTEL, 1, {

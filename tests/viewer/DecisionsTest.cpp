@@ -1,17 +1,9 @@
-// Command line, and small decisions: vendor, platform, figures, texts, whose warnings are
-// collected.
+// Command line, and small decisions: vendor, platform, figures, texts.
 #include "viewer/GraphicsVendor.h"
 #include "viewer/OpenCLPlatforms.h"
 #include "viewer/Options.h"
 #include "viewer/OverlayText.h"
 #include "viewer/Report.h"
-#include "viewer/WarningCapture.h"
-
-#include "diagnostics/CLInternalWarning.h"
-#include "diagnostics/CLWarningSink.h"
-
-#include <optional>
-#include <thread>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -154,12 +146,14 @@ TEST(Report, TellsWhetherTheBoundHeld)
 
 TEST(OverlayText, TellsOnlyWhatIsShown)
 {
-    OverlayFacts facts{{{"a device", "2, fence", "4, finish", 128}}, 1.5, {}, true, false};
+    OverlayFacts facts{
+        {{"a device", "2, fence", "4, finish", 128}}, 1.5, {}, true, "skin, wave (off)"};
     EXPECT_THAT(overlayText(facts),
                 AllOf(HasSubstr("1.50 ms"), HasSubstr("a device\n"), HasSubstr("2, fence\n"),
                       HasSubstr("4, finish\n"), HasSubstr("128 vertex buffers\n"),
-                      HasSubstr("paused\n"), HasSubstr("off"), Not(HasSubstr("on the right"))));
-    facts = {{}, 1.5, 7.25, false, true};
+                      HasSubstr("paused\n"), HasSubstr("skin, wave (off)\n"),
+                      Not(HasSubstr("on the right"))));
+    facts = {{}, 1.5, 7.25, false, "skin"};
     EXPECT_THAT(overlayText(facts), AllOf(HasSubstr("7.25 ms"), HasSubstr("OpenCL is not used"),
                                           Not(HasSubstr("Batch")), Not(HasSubstr("paused"))));
 }
@@ -170,37 +164,6 @@ TEST(OverlayText, CutsALongBuildLog)
     const std::string cut = beginningOf(std::string(1000, 'x') + std::string(99, '\n'));
     EXPECT_LT(cut.size(), 200u);
     EXPECT_THAT(cut, HasSubstr("\n... and 83 more lines\n"));
-}
-
-std::string hostText;
-
-void hostSink(const char* text)
-{
-    hostText += text;
-}
-
-TEST(WarningCapture, CollectsOwnThreadAndForwardsAllToTheHost)
-{
-    setCLWarningSink(hostSink);
-    {
-        std::optional<WarningCapture> outer(std::in_place);
-        CLInternalWarning("one,");
-        std::thread([&] {
-            const WarningCapture inner;
-            CLInternalWarning("two,");
-            EXPECT_EQ(inner.text(), "two,");
-        }).join();
-        CLInternalWarning("three,");
-        EXPECT_EQ(outer->text(), "one,\nthree,");
-        outer.reset();
-        CLInternalWarning("four");
-        EXPECT_EQ(hostText, "one,two,three,four");
-    }
-    {
-        const WarningCapture capture;
-        setCLWarningSink(nullptr); // the host replaces its sink meanwhile
-    }
-    EXPECT_EQ(setCLWarningSink(nullptr), nullptr);
 }
 
 } // namespace

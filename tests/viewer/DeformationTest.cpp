@@ -1,6 +1,6 @@
-// From the keys of an animation to matrices, and the CPU reference, against cases that are
-// calculated in another way.
-#include "viewer/Deformation.h"
+// From the keys of an animation to matrices, the chain of deformers, and the comparison with the
+// CPU.
+#include "viewer/DeformerChain.h"
 #include "viewer/Pose.h"
 #include "viewer/Verification.h"
 
@@ -78,113 +78,59 @@ TEST(Pose, BoneMatricesLeadFromTheMeshAtRestToTheModel)
     Mesh mesh;
     mesh.bones.push_back({2, moved(-2, 0, 0)}); // the arm's origin in the mesh at rest
     // A quarter turn around the moved shoulder: (3, 0, 0) becomes (0, 1 + 3, 0).
-    const MatrixRows expected{0, -1, 0, 0, 1, 0, 0, 1, 0, 0, 1, 0};
+    const vyra::MatrixRows expected{0, -1, 0, 0, 1, 0, 0, 1, 0, 0, 1, 0};
     EXPECT_THAT(boneMatrices(mesh, poseAt(model, &model.animations[0], 1.0))[0],
                 testing::Pointwise(testing::FloatNear(kTolerance), expected));
 }
 
-Mesh meshOf(const QVector3D& position, const QVector3D& normal, const BoneIndices& indices,
-            const BoneWeights& weights)
+Result<std::vector<DeformerChoice>> parsed(const std::string& text)
 {
-    Mesh mesh;
-    mesh.positions = {position};
-    mesh.normals = {normal};
-    mesh.boneIndices = {indices};
-    mesh.boneWeights = {weights};
-    mesh.bones.resize(1);
-    return mesh;
+    return parseDeformers(text);
 }
 
-TEST(Skin, AVertexIsBlendedFromAllFourBones)
+TEST(DeformerChoices, AreReadInOrderWithTheirParameters)
 {
-    const Mesh mesh = meshOf({1, 2, 3}, {0, 0, 1}, {4, 0, 2, 1}, {0.5f, 0.25f, 0.125f, 0.125f});
-    const Surface surface =
-        skin(mesh, {rowsOf(moved(8, 0, 0)), rowsOf(moved(0, 8, 0)), rowsOf(moved(0, 0, 8)),
-                    rowsOf(moved(99, 99, 99)), rowsOf(moved(-4, 4, 0))});
-    // Half of (-4, 4, 0), a quarter of (8, 0, 0), an eighth of (0, 0, 8) and of (0, 8, 0).
-    expectNear(surface.positions[0], QVector3D(1, 2, 3) + QVector3D(0, 3, 1));
-    expectNear(surface.normals[0], {0, 0, 1});
+    const auto choices = parsed("wave:amplitude=0.5,skin:precision=double,smooth:iterations=3");
+    ASSERT_TRUE(choices);
+    EXPECT_EQ(chainText(choices.value()),
+              "wave:amplitude=0.5, skin:precision=double, smooth:iterations=3");
+    EXPECT_TRUE(parsed(kDefaultDeformers));
 }
 
-TEST(Skin, NormalsStayPerpendicularUnderStretchingAndOutsideUnderMirroring)
+TEST(DeformerChoices, WrongTextsAreRefusedWithWhatThereIs)
 {
-    const QVector3D normal = QVector3D(1, 1, 0).normalized();
-    const Mesh mesh = meshOf({0, 0, 0}, normal, {0, 0, 0, 0}, {1, 0, 0, 0});
-    for (const QVector3D& scale :
-         {QVector3D(4, 1, 1), QVector3D(1, 0.1f, 2), QVector3D(-1, 1, 1)}) {
-        SCOPED_TRACE(testing::Message() << scale.x() << ' ' << scale.y());
-        QMatrix4x4 scaling;
-        scaling.scale(scale);
-        const QVector3D result = skin(mesh, {rowsOf(scaling)}).normals[0];
-        EXPECT_NEAR(result.length(), 1, kTolerance);
-        EXPECT_NEAR(QVector3D::dotProduct(result, scaling.mapVector({1, -1, 0})), 0, kTolerance);
-        // A point above the surface is still above it.
-        EXPECT_GT(QVector3D::dotProduct(result, scaling.mapVector(normal)), 0);
-    }
-}
-
-// A plane at an angle, in a space that is not the character's, so that both matrices matter.
-class Twist : public testing::Test {
-protected:
-    Twist()
-    {
-        fPose.geometryMatrix.rotate(70, 1, 2, 3);
-        fPose.geometryMatrix.scale(0.25f);
-        fPose.geometryMatrix.translate(1, -2, 3);
-        fPose.inverseGeometryMatrix = fPose.geometryMatrix.inverted();
-        fPose.twist = 0.9f;
-    }
-
-    QVector3D twisted(const QVector3D& point) const
-    {
-        Surface surface{{point}, {{0, 1, 0}}};
-        twist(fPose, surface);
-        return surface.positions[0];
-    }
-
-    MeshPose fPose;
-};
-
-TEST_F(Twist, TurnsAPointByItsHeight)
-{
-    const QVector3D inCharacter(0.5f, 0.8f, -0.3f);
-    const QVector3D result =
-        fPose.geometryMatrix.map(twisted(fPose.inverseGeometryMatrix.map(inCharacter)));
-    const float degrees = fPose.twist * inCharacter.y() * 180 / static_cast<float>(M_PI);
-    expectNear(result, turned(degrees, {0, 1, 0}).rotatedVector(inCharacter));
-}
-
-TEST_F(Twist, NormalsArePerpendicularToTheTwistedSurface)
-{
-    const QVector3D point(0.7f, 2.5f, -0.4f);
-    const QVector3D along = QVector3D(1, 2, -1).normalized();
-    const QVector3D across = QVector3D::crossProduct(along, {0, 1, 1}).normalized();
-    Surface surface{{point}, {QVector3D::crossProduct(along, across)}};
-    twist(fPose, surface);
-
-    // The twisted tangents by central differences.
-    const auto tangent = [&](const QVector3D& direction) {
-        constexpr float kStep = 0.02f;
-        return twisted(point + kStep * direction) - twisted(point - kStep * direction);
+    const std::pair<const char*, const char*> rows[] = {
+        {"skin,bend", "no deformer 'bend'; there are skin, morph, twist, wave, smooth"},
+        {"", "no deformer ''"},
+        {"skin,", "no deformer ''"},
+        {"wave:height=1", "no parameter 'height'; it has "},
+        {"wave:amplitude", "'amplitude' is not PARAMETER=VALUE"},
+        {"wave:amplitude=high", "not 'high'"},
+        {"smooth:iterations=1.5", "whole number"},
+        {"skin:precision=half", "one of single, double, not 'half'"},
     };
-    const QVector3D expected = QVector3D::crossProduct(tangent(along), tangent(across));
-    expectNear(surface.normals[0], expected.normalized(), 1e-3f);
+    for (const auto& [text, reason] : rows) {
+        const auto choices = parsed(text);
+        ASSERT_FALSE(choices) << text;
+        EXPECT_THAT(choices.failure().text, testing::HasSubstr(reason));
+    }
 }
 
 TEST(Verification, FindsTheWorstVertexAndValuesThatAreNoNumbers)
 {
     constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
     constexpr double kInfinity = std::numeric_limits<double>::infinity();
-    const Surface expected{{{0, 0, 0}, {1, 0, 0}}, {{0, 1, 0}, {0, 1, 0}}};
-    const Surface oneOff{{{0, 0, 0}, {1, 0, 0.5f}}, expected.normals};
-    const Surface turnedNormal{expected.positions, {{0, 1, 0}, {1, 0, 0}}};
-    const Surface noNumber{{{kNan, 0, 0}, {1, 0, 0}}, expected.normals}; // before a good vertex
+    const vyra::Surface expected{{{0, 0, 0}, {1, 0, 0}}, {{0, 1, 0}, {0, 1, 0}}};
+    const vyra::Surface oneOff{{{0, 0, 0}, {1, 0, 0.5f}}, expected.normals};
+    const vyra::Surface turnedNormal{expected.positions, {{0, 1, 0}, {1, 0, 0}}};
+    const vyra::Surface noNumber{{{kNan, 0, 0}, {1, 0, 0}},
+                                 expected.normals}; // before a good vertex
     QMatrix4x4 toCharacter;
     toCharacter.scale(2);
-    const std::tuple<Surface, double, bool> rows[] = {{expected, 0, true},
-                                                      {oneOff, 1, false},
-                                                      {turnedNormal, 0, false},
-                                                      {noNumber, kInfinity, false}};
+    const std::tuple<vyra::Surface, double, bool> rows[] = {{expected, 0, true},
+                                                            {oneOff, 1, false},
+                                                            {turnedNormal, 0, false},
+                                                            {noNumber, kInfinity, false}};
     for (const auto& [actual, position, passes] : rows) {
         const Deviation deviation = compare(actual, expected, toCharacter);
         EXPECT_DOUBLE_EQ(deviation.position, position);

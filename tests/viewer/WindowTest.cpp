@@ -62,6 +62,7 @@ protected:
         QSurfaceFormat::setDefaultFormat(format);
         fApplication = std::make_unique<QGuiApplication>(fArguments, fNames);
         fOptions.model = "X/Testwuson.X";
+        fOptions.deformers = parseDeformers(kDefaultDeformers).value();
         fOptions.allowCpu = true;
         fOptions.verify = true;
         fWindow = std::make_unique<ViewerWindow>();
@@ -152,7 +153,8 @@ TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
     if (!TopenCLInfo::isValid())
         GTEST_SKIP() << "OpenCL cannot be used here";
     const QTemporaryDir resources;
-    std::filesystem::copy(KernelFiles::folder(), resources.filePath("kernels").toStdString());
+    std::filesystem::copy(vyra::Evaluator::kernelDirectory(),
+                          resources.filePath("kernels").toStdString());
     TopenCLInfo::theOne().getAbsolutePathToResources() = resources.path().toUtf8().constData();
     QFile file(resources.filePath("kernels/twist.cl"));
     ASSERT_TRUE(file.open(QIODevice::ReadOnly));
@@ -167,19 +169,24 @@ TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
     };
 
     testing::internal::CaptureStderr();
-    playWith("vload3", "vload33", kNoticedMs);
-    playWith("twistPerHeight,\n", "twistPerHeight, const int more,\n", kNoticedMs);
+    playWith("unitScale(", "unitScal(", kNoticedMs);
+    playWith("twistPerHeight)\n{", "twistPerHeight, const int more)\n{", kNoticedMs);
     EXPECT_THAT(testing::internal::GetCapturedStderr(),
-                AllOf(HasSubstr("cannot be built"), HasSubstr("'vload33'"),
-                      HasSubstr("takes 9 arguments")));
+                AllOf(HasSubstr("does not compile"), HasSubstr("'unitScal'"),
+                      HasSubstr("takes 13 arguments")));
     EXPECT_TRUE(fSession->verified());
-    playWith("const float angle = ", "const float angle = 2.0f * ", kHangMs);
+    playWith("sineAndCosine(twist", "sineAndCosine(2.0f * twist", kHangMs);
     EXPECT_FALSE(fSession->verified()) << "the mended kernel was not taken";
 }
 
 TEST_F(WindowTest, EveryFrameIsRightInEachStateOfTheKeys)
 {
     Player player(*fSession);
+    for (const std::size_t number : {1U, 2U, 1U, 9U, 2U}) {
+        player.toggleDeformer(number);
+        ASSERT_FALSE(player.renderFrame());
+        EXPECT_TRUE(fSession->verified()) << number;
+    }
     for (const Action action : {Action::kPause, Action::kDeformers, Action::kSideBySide,
                                 Action::kDetail, Action::kDeformers, Action::kSideBySide}) {
         player.act(action);

@@ -1,0 +1,34 @@
+// The paths on which an application can bring deformed meshes into vertex buffers.
+#pragma once
+
+#include "evaluator/Evaluator.h"
+#include "viewer/Scene.h"
+
+#include <memory>
+
+#include <QOpenGLFunctions_3_3_Core>
+
+// One path, with a scene of its own. All functions are called with the renderer's context current;
+// a failure of OpenCL throws std::runtime_error.
+class Path {
+public:
+    Path() = default;
+    virtual ~Path() = default;
+    Path(const Path&) = delete;
+    Path& operator=(const Path&) = delete;
+
+    virtual const char* name() const = 0;
+    // Brings the poses of the scene into its vertex buffers; they may be drawn from after OpenGL
+    // has finished.
+    virtual void deform() = 0;
+    // To be called after drawing.
+    virtual void drawn() {}
+};
+
+// The library: deformed on OpenCL in the vertex buffers themselves. The scene is attached to the
+// evaluator.
+std::unique_ptr<Path> makeSharedBufferPath(vyra::Evaluator& evaluator);
+// Deformed by the same kernels in memory of its own, read back, and uploaded with glBufferSubData.
+std::unique_ptr<Path> makeReadBackPath(QOpenGLFunctions_3_3_Core& gl, viewer::Scene& scene);
+// Deformed on all cores with vector instructions, and uploaded with glBufferSubData.
+std::unique_ptr<Path> makeCpuPath(QOpenGLFunctions_3_3_Core& gl, viewer::Scene& scene);
