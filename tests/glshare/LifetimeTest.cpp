@@ -30,6 +30,19 @@ TEST_F(LifetimeTest, ContextsTakeTheirWorkerAlong)
     EXPECT_TRUE(isSoon([&] { return threadsOfProcess() <= before; }));
 }
 
+// Names are given again from the lowest free one on.
+TEST_F(LifetimeTest, ContextsLeaveNoObjectsInTheShareGroup)
+{
+    queue_.rewrite(memory_, from(1), from(2));
+    memory_ = nullptr;
+    queue_ = Queue();
+    context_ = nullptr;
+    for (GLuint name = 1; name < 20; ++name) {
+        EXPECT_FALSE(glIsProgram(name) || glIsShader(name)) << name;
+        EXPECT_EQ(glIsBuffer(name) == GL_TRUE, name == buffer_) << name;
+    }
+}
+
 // The application's last reference to the context is not the last one.
 TEST_F(LifetimeTest, ObjectsOutliveTheReferenceToTheirContext)
 {

@@ -1,5 +1,7 @@
 #include "SharingTest.h"
 
+#include "tests/support/KeepModulesLoaded.h"
+
 #include <chrono>
 #include <cstdlib>
 #include <filesystem>
@@ -107,6 +109,7 @@ void SharingTest::SetUp()
     openGl();
     if (IsSkipped() || HasFatalFailure())
         return;
+    keepModulesLoaded();
     if (clGetPlatformIDs(1, &platform_, nullptr) != CL_SUCCESS)
         GTEST_SKIP() << "no OpenCL runtime here";
     ASSERT_NE(extensionsOf(platform_).find("cl_khr_gl_sharing"), std::string::npos)

@@ -2,6 +2,7 @@
 // are a crash, a hang, an OpenGL error that the program has not caused, and a wrong number. The
 // environment variable GLSHARE_STRESS_ROUNDS sets how often each test repeats what it does.
 #include "SharingTest.h"
+#include "StressRounds.h"
 
 #include <algorithm>
 #include <atomic>
@@ -11,12 +12,6 @@
 #include <utility>
 
 namespace {
-
-int rounds()
-{
-    const char* value = std::getenv("GLSHARE_STRESS_ROUNDS");
-    return value == nullptr ? 1 : std::max(1, std::atoi(value));
-}
 
 class StressTest : public SharingTest {
 protected:
@@ -124,7 +119,7 @@ TEST_F(StressTest, ContextsCreateObjectsOfOneBufferAtTheSameTime)
         for (int i = 0; i < 300; ++i)
             share(context, buffer_);
     };
-    for (int round = 0; round < rounds() && !HasFailure(); ++round) {
+    for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
         for (const std::size_t threads : {2, 4})
             onThreads(threads, round % 2 != 0, create, std::this_thread::yield);
     }
@@ -132,7 +127,7 @@ TEST_F(StressTest, ContextsCreateObjectsOfOneBufferAtTheSameTime)
 
 TEST_F(StressTest, ContextsCreateObjectsOfABufferThatOpenGlMapsAndDraws)
 {
-    for (int round = 0; round < rounds() && !HasFailure(); ++round) {
+    for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
         for (const std::size_t threads : {1, 2, 4}) {
             for (const bool haveGl : {false, true})
                 onThreads(
