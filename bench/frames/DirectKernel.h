@@ -15,7 +15,7 @@ struct DeviceSurface {
     AutoCLObject<cl_mem> normals;
 };
 
-// Device copies of constant arrays, each made once.
+// Device copies of constant arrays, each made once. Several threads may ask for copies that exist.
 class ConstantCopies {
 public:
     cl_mem copyOf(const vyra::ConstantArray& array);

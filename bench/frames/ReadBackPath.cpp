@@ -84,6 +84,10 @@ public:
         }
         for (CharacterMesh* mesh : scene.meshes())
             fMeshes.push_back(std::make_unique<ReadBackMesh>(*mesh, fConstants, restOf(*mesh)));
+        // Makes the device copies of all constants, on one thread.
+        for (const auto& mesh : fMeshes)
+            mesh->enqueue(fQueues.front());
+        clFinish(fQueues.front());
     }
 
     ~ReadBackPath() override

@@ -170,7 +170,7 @@ private:
             auto evaluator = std::make_unique<vyra::Evaluator>(settings());
             auto stage = scene(characters);
             stage->attach(*evaluator, viewer::parseDeformers(kDeformers).value());
-            stage->pose(0);
+            stage->pose(kSecondsPerFrame); // at 0 the twist has no pass
             auto path = make(*evaluator, *stage);
             all.push_back({std::move(evaluator), std::move(stage), std::move(path)});
         };
