@@ -93,17 +93,17 @@ const std::vector<DeformerCase>& deformerCases()
     using Mesh = const MeshGeometry&;
     static const std::vector<DeformerCase> cases = {
         {"skin", [](Mesh m) { return skin(m, false); }, true},
-        {"skin, mirrored", [](Mesh m) { return skin(m, true); }, true},
-        {"skin, double", [](Mesh m) { return skinInDouble(m); }, true},
+        {"skinMirrored", [](Mesh m) { return skin(m, true); }, true},
+        {"skinInDouble", [](Mesh m) { return skinInDouble(m); }, true},
         {"twist", [](Mesh) { return twist(); }, true},
         {"wave", [](Mesh) { return wave(WaveDeformer::kY, 0.05f); }, true},
-        {"wave, compression", [](Mesh) { return wave(WaveDeformer::kX, 0.05f); }, true},
-        {"wave, inside out", [](Mesh) { return wave(WaveDeformer::kX, 0.3f); }, true},
-        {"morph, one pass", [](Mesh m) { return morph(m, 5, true); }, false},
-        {"morph, three passes", [](Mesh m) { return morph(m, 18, true); }, false},
-        {"morph, positions", [](Mesh m) { return morph(m, 10, false); }, false},
-        {"smooth, once", [](Mesh m) { return smooth(m, 1); }, false},
-        {"smooth, seven times", [](Mesh m) { return smooth(m, 7); }, false}};
+        {"waveOfCompression", [](Mesh) { return wave(WaveDeformer::kX, 0.05f); }, true},
+        {"waveInsideOut", [](Mesh) { return wave(WaveDeformer::kX, 0.3f); }, true},
+        {"morphInOnePass", [](Mesh m) { return morph(m, 5, true); }, false},
+        {"morphInThreePasses", [](Mesh m) { return morph(m, 18, true); }, false},
+        {"morphPositions", [](Mesh m) { return morph(m, 10, false); }, false},
+        {"smoothOnce", [](Mesh m) { return smooth(m, 1); }, false},
+        {"smoothSevenTimes", [](Mesh m) { return smooth(m, 7); }, false}};
     return cases;
 }
 
@@ -121,5 +121,7 @@ MeshGeometry makeSheet(unsigned side)
             for (const unsigned corner : {0U, side, 1U, 1U, side, side + 1})
                 sheet.triangles.push_back(i + corner);
     }
+    sheet.triangles.resize(sheet.triangles.size() - 3);
+    sheet.triangles.insert(sheet.triangles.end(), {0, 1, side});
     return sheet;
 }

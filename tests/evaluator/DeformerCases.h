@@ -5,19 +5,27 @@
 
 #include <functional>
 #include <memory>
+#include <ostream>
 #include <vector>
 
 struct DeformerCase {
-    const char* name;
+    const char* name; // letters, for test names
     std::function<std::unique_ptr<vyra::Deformer>(const vyra::MeshGeometry&)> make;
     // Whether a point moves by its own place alone, and normals are those of the moved surface.
     // Vertices that belong together are kProbes in a row.
     bool isSmoothMap;
 };
 
+// For messages of tests.
+inline void PrintTo(const DeformerCase& row, std::ostream* stream)
+{
+    *stream << row.name;
+}
+
 inline constexpr unsigned kProbes = 6;
 
 const std::vector<DeformerCase>& deformerCases();
 
-// A wavy sheet. `side` vertices along each edge.
+// A wavy sheet with `side` vertices along each edge. The last vertex has no triangle, and the first
+// has two that cancel.
 vyra::MeshGeometry makeSheet(unsigned side);
