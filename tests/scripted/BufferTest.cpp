@@ -74,7 +74,7 @@ public:
         const cl_mem_flags flags = flagsOf(fState) | (hostData ? CL_MEM_COPY_HOST_PTR : 0);
         Lines lines{"AddToDeviceMemory(" + number(size) + ")",
                     "clCreateBuffer(context#1, " + number(flags) + ", " + number(size) + ", " +
-                        (hostData ? "ptr" : "null") + ") = " + mem};
+                        (hostData ? "host+0" : "null") + ") = " + mem};
         if (isMapped() && !hostData) {
             const char* mapFlags = fState == State::kMappedWrite  ? "2"
                                    : fState == State::kMappedRead ? "1"
@@ -118,8 +118,13 @@ private:
 
 class BufferTest : public ScriptedTest {
 protected:
-    void SetUp() override { ASSERT_TRUE(start()); }
-    cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
+    void SetUp() override
+    {
+        ASSERT_TRUE(start());
+        runtime().setHostMemory(fBytes.data(), fBytes.size());
+    }
+    // Not the queue that the library uses by itself.
+    cl_command_queue queue() { return TopenCLInfo::theOne().secondaryOpenCLCommandQueue(); }
     int upload(TopenCLBuffer& buffer, std::size_t offset, std::size_t size)
     {
         return buffer.uploadDataToGPU(queue(), CL_FALSE, offset, size, fBytes.data(), 0, nullptr);
@@ -174,7 +179,7 @@ TEST_P(BufferWithMemory, AFittingUploadIsOneWrite)
     EXPECT_EQ(upload(buffer(), kSize - 16, 16), 0);
     const std::string event = "event#" + number(fSubject->events() + 1);
     Lines expected = fSubject->hasEvent() ? Lines{"clReleaseEvent(event#1)"} : Lines{};
-    expected.push_back("clEnqueueWriteBuffer(queue#1, mem#1, 0, 48, 16, ptr, []) = " + event);
+    expected.push_back("clEnqueueWriteBuffer(queue#2, mem#1, 0, 48, 16, host+0, []) = " + event);
     EXPECT_EQ(calls(), expected);
     EXPECT_EQ(runtime().name(buffer().bufferReadyEvent().get()), event);
 }
@@ -193,8 +198,8 @@ TEST_P(BufferInState, AnUploadThatGrowsElsewhereCreatesAndWrites)
     Lines expected = fSubject->growing(kSize + 16, false);
     const bool hadEvent = fSubject->hasEvent() || fSubject->isMapped();
     const std::string mem = fSubject->holdsMemory() ? "mem#2" : "mem#1";
-    expected.push_back("clEnqueueWriteBuffer(queue#1, " + mem + ", 0, 64, 16, ptr, []) = event#" +
-                       number(hadEvent ? 2 : 1));
+    expected.push_back("clEnqueueWriteBuffer(queue#2, " + mem +
+                       ", 0, 64, 16, host+0, []) = event#" + number(hadEvent ? 2 : 1));
     EXPECT_EQ(calls(), expected);
 }
 
@@ -210,12 +215,18 @@ TEST_P(BufferInState, AnUploadOfNothingOrToAReadOnlyBufferChangesNothing)
 TEST_P(BufferInState, SizesBeyond32BitsAreRefusedBeforeAnyCall)
 {
     constexpr std::size_t kLimit = std::size_t{1} << 32;
+    const cl_event waitList = nullptr; // would be a noted misuse
+    const auto uploadAfter = [&](std::size_t offset, std::size_t size) {
+        return buffer().uploadDataToGPU(queue(), CL_FALSE, offset, size, nullptr, 1, &waitList);
+    };
     EXPECT_EQ(buffer().ensureBufferCapacity(kLimit), CL_INVALID_BUFFER_SIZE);
-    EXPECT_EQ(upload(buffer(), 0, kLimit), CL_INVALID_BUFFER_SIZE);
-    EXPECT_EQ(upload(buffer(), kLimit - 16, 16), CL_INVALID_BUFFER_SIZE);
-    EXPECT_EQ(upload(buffer(), SIZE_MAX, 2), CL_INVALID_BUFFER_SIZE);
-    EXPECT_EQ(upload(buffer(), 0, 0), CL_SUCCESS);
+    EXPECT_EQ(uploadAfter(0, kLimit), CL_INVALID_BUFFER_SIZE);
+    EXPECT_EQ(uploadAfter(kLimit - 16, 16), CL_INVALID_BUFFER_SIZE);
+    EXPECT_EQ(uploadAfter(SIZE_MAX, 2), CL_INVALID_BUFFER_SIZE);
+    EXPECT_EQ(uploadAfter(0, 0), CL_SUCCESS);
     EXPECT_EQ(calls(), Lines{});
+    EXPECT_EQ(buffer().ensureBufferCapacity(kLimit - 1), CL_SUCCESS);
+    EXPECT_EQ(buffer().capacityInBytes(), kLimit - 1);
 }
 
 TEST_P(BufferInState, ResetLetsGoOfEverythingOnce)
@@ -258,15 +269,15 @@ TEST_F(BufferTest, WaitListsPassUnchangedOnWritesAndOnlyWithACountOnReads)
     const AutoCLObject<cl_event> event = buffer.bufferReadyEvent();
     const cl_event list[] = {event.get(), event.get()};
     calls();
-    buffer.uploadDataToGPU(queue(), CL_TRUE, 0, 4, fBytes.data(), 2, list);
-    buffer.readBackDataFromGPU(queue(), CL_TRUE, 4, 4, fBytes.data(), 2, list);
-    buffer.readBackDataFromGPU(queue(), CL_FALSE, 4, 4, fBytes.data(), 0, list);
+    buffer.uploadDataToGPU(queue(), CL_TRUE, 8, 4, fBytes.data() + 1, 2, list);
+    buffer.readBackDataFromGPU(queue(), CL_TRUE, 4, 4, fBytes.data() + 2, 2, list);
+    buffer.readBackDataFromGPU(queue(), CL_FALSE, 4, 4, fBytes.data() + 3, 0, list);
     EXPECT_EQ(callsOf("clEnqueue"),
-              (Lines{"clEnqueueWriteBuffer(queue#1, mem#1, 1, 0, 4, ptr, [event#1, event#1]) = "
+              (Lines{"clEnqueueWriteBuffer(queue#2, mem#1, 1, 8, 4, host+1, [event#1, event#1]) = "
                      "event#2",
-                     "clEnqueueReadBuffer(queue#1, mem#1, 1, 4, 4, ptr, [event#1, event#1]) = "
+                     "clEnqueueReadBuffer(queue#2, mem#1, 1, 4, 4, host+2, [event#1, event#1]) = "
                      "event#3",
-                     "clEnqueueReadBuffer(queue#1, mem#1, 0, 4, 4, ptr, []) = event#4"}));
+                     "clEnqueueReadBuffer(queue#2, mem#1, 0, 4, 4, host+3, []) = event#4"}));
 
     // A null list with a count, and a list without, are the caller's affair.
     buffer.uploadDataToGPU(queue(), CL_FALSE, 0, 4, fBytes.data(), 0, list);
@@ -289,7 +300,7 @@ TEST_F(BufferTest, AGrowingUploadWaitsForTheWaitListFirst)
     const Lines elsewhere = calls();
     EXPECT_EQ(elsewhere.front(), "clWaitForEvents([event#1])");
     EXPECT_EQ(elsewhere.back(),
-              "clEnqueueWriteBuffer(queue#1, mem#3, 1, 65, 4, ptr, [event#1]) = event#2");
+              "clEnqueueWriteBuffer(queue#2, mem#3, 1, 65, 4, host+0, [event#1]) = event#2");
 }
 
 TEST_F(BufferTest, AReadBackChecksNeitherPermissionsNorCapacity)
@@ -298,8 +309,13 @@ TEST_F(BufferTest, AReadBackChecksNeitherPermissionsNorCapacity)
     buffer.ensureBufferCapacity(8);
     buffer.openCLDataBuffer().descriptor().setPermissions(TopenCLDataBufferDescriptor::kReadOnly);
     EXPECT_EQ(buffer.readBackDataFromGPU(queue(), CL_TRUE, 0, 8, fBytes.data(), 0, nullptr), 0);
-    buffer.readBackDataFromGPU(queue(), CL_TRUE, 4, 8, fBytes.data(), 0, nullptr);
-    expectMisuse("clEnqueueReadBuffer: beyond the end"); // the runtime's own check
+    // The checks of the runtime decide.
+    EXPECT_EQ(buffer.readBackDataFromGPU(queue(), CL_TRUE, 0, 0, fBytes.data(), 0, nullptr), 0);
+    for (const std::size_t offset : {std::size_t{4}, std::size_t{1} << 32}) {
+        buffer.readBackDataFromGPU(queue(), CL_TRUE, offset, 8, fBytes.data(), 0, nullptr);
+        expectMisuse("clEnqueueReadBuffer: beyond the end");
+    }
+    EXPECT_EQ(callsOf("clEnqueueRead").size(), 4U);
 }
 
 TEST_F(BufferTest, AFailedWaitDropsTheEventAllTheSame)
@@ -346,16 +362,28 @@ TEST_F(BufferTest, CopiesCreateMemoryAsTheirOriginalWould)
                                           "clCreateBuffer(context#1, 2, 9, null) = mem#2"}));
 }
 
-TEST_F(BufferTest, AssigningToACountedBufferTakesItsCountAwayOnce)
+TEST_F(BufferTest, AssignmentUnmapsAndUncountsTheTargetOnce)
 {
     TopenCLBuffer source;
     source.ensureBufferCapacity(kSize);
     {
-        TopenCLBuffer target;
+        TopenCLBuffer target(TopenCLInfo::theOne().openCLContext(), CL_MEM_ALLOC_HOST_PTR);
         target.ensureBufferCapacity(8);
-        target = source; // which shares memory that the target does not count
+        calls();
+        target = source; // shares memory that the target does not count
+        EXPECT_EQ(callsOf("clEnqueueUnmapMemObject").size(), 1U);
         EXPECT_EQ(deviceMemory(), kSize);
     }
+    EXPECT_EQ(deviceMemory(), kSize);
+}
+
+TEST_F(BufferTest, AFailedMappingKeepsTheCountedMemoryAndNoAddress)
+{
+    TopenCLBuffer buffer(TopenCLInfo::theOne().openCLContext(), CL_MEM_ALLOC_HOST_PTR);
+    runtime().plan({.function = "clEnqueueMapBuffer", .withHandle = true});
+    EXPECT_EQ(buffer.ensureBufferCapacity(kSize), CL_OUT_OF_RESOURCES);
+    EXPECT_EQ(buffer.mappedPointer(), nullptr);
+    EXPECT_NE(buffer.buffer().get(), nullptr);
     EXPECT_EQ(deviceMemory(), kSize);
 }
 
@@ -370,7 +398,7 @@ TEST_F(BufferTest, ConstructorsCreateWhatTheyAreAskedFor)
     byDefault.ensureBufferCapacity(10);
     EXPECT_EQ(error, 0);
     EXPECT_EQ(calls(),
-              (Lines{"AddToDeviceMemory(8)", "clCreateBuffer(context#1, 33, 8, ptr) = mem#1",
+              (Lines{"AddToDeviceMemory(8)", "clCreateBuffer(context#1, 33, 8, host+0) = mem#1",
                      "AddToDeviceMemory(9)", "clCreateBuffer(context#1, 1, 9, null) = mem#2",
                      "AddToDeviceMemory(10)", "clCreateBuffer(context#1, 4, 10, null) = mem#3"}));
     runtime().plan({.function = "clCreateBuffer", .status = -6});
@@ -382,6 +410,13 @@ TEST_F(BufferTest, ConstructorsCreateWhatTheyAreAskedFor)
     runtime().plan({.function = "clCreateBuffer", .status = CL_SUCCESS});
     const TopenCLBuffer silent(context, CL_MEM_READ_WRITE, 7, nullptr, &error);
     EXPECT_EQ(error, CL_MEM_OBJECT_ALLOCATION_FAILURE);
+    calls();
+    const TopenCLBuffer huge(context, CL_MEM_READ_WRITE, std::size_t{1} << 32, nullptr, &error);
+    EXPECT_EQ(error, CL_INVALID_BUFFER_SIZE);
+    EXPECT_EQ(calls(), Lines{});
+    const TopenCLBuffer ofNothing(context, CL_MEM_READ_WRITE, 0, nullptr, &error);
+    EXPECT_EQ(error, CL_INVALID_BUFFER_SIZE);
+    expectMisuse("clCreateBuffer: of no bytes"); // the check of the runtime
     EXPECT_EQ(deviceMemory(), 27U);
 }
 

@@ -84,7 +84,7 @@ void* clEnqueueMapBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking, c
     Entry call("clEnqueueMapBuffer", queue, mem, blocking, flags, offset, size, list);
     Object* object = call.usableMem(mem);
     call.command(queue, list, event, {}, blocking != CL_FALSE);
-    const bool mapped = object && call.ok();
+    const bool mapped = object && (call.ok() || call.withHandle());
     if (mapped)
         object->mapped = true;
     return call.result(mapped ? mappedAddress(mem) : nullptr, error);

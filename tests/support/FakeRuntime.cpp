@@ -1,5 +1,6 @@
 #include "FakeRuntime.h"
 
+#include <cstdint>
 #include <mutex>
 
 namespace scripted {
@@ -50,6 +51,13 @@ void FakeRuntime::log(std::string line)
 {
     const std::scoped_lock guard(fLock);
     fCalls.push_back(std::move(line));
+}
+
+std::string FakeRuntime::name(const void* handle) const
+{
+    const auto begin = reinterpret_cast<std::uintptr_t>(fHostMemory.first);
+    const std::uintptr_t offset = reinterpret_cast<std::uintptr_t>(handle) - begin;
+    return offset < fHostMemory.second ? "host+" + std::to_string(offset) : fLedger.name(handle);
 }
 
 unsigned FakeRuntime::references(Kind kind, const void* handle)

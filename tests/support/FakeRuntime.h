@@ -44,7 +44,7 @@ public:
     void describe(const World& world);
 
     // The calls since the last take, OpenCL's, OpenGL's and the host's in one order, each as text:
-    //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, ptr, [event#1]) = event#3
+    //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, host+16, [event#1]) = event#3
     //     clCreateBuffer(context#1, 4, 64, null) ! -4
     //     clEnqueueNDRangeKernel(queue#1, kernel#1, 64, 64, []) on [mem#1, mem#2] = event#4
     // Lists are in brackets; the first form names what the call made, the second its status, the
@@ -62,7 +62,10 @@ public:
     std::vector<std::string> takeMisuse() { return std::exchange(fMisuse, {}); }
 
     std::vector<std::string> balance() const { return fLedger.balance(); }
-    std::string name(const void* handle) const { return fLedger.name(handle); }
+    // The name of an object, "host+OFFSET" for an address in the host memory, else "null" or "ptr".
+    std::string name(const void* handle) const;
+    // The test's memory that transfers read and write, which the log then names.
+    void setHostMemory(const void* begin, std::size_t bytes) { fHostMemory = {begin, bytes}; }
     void forgetDead() { fLedger.forgetDead(); }
     unsigned created(Kind kind) const { return fLedger.created(kind); }
     // References of a living object, else 0.
@@ -110,6 +113,7 @@ private:
     std::vector<cl_platform_id> fPlatforms; // in the world's order, as the devices
     std::vector<cl_device_id> fDevices;
     std::vector<DeviceScript> fDeviceScripts;
+    std::pair<const void*, std::size_t> fHostMemory{};
     std::vector<std::string> fCalls;
     std::vector<std::string> fMisuse;
     unsigned fCallCount = 0;

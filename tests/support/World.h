@@ -52,13 +52,13 @@ struct World {
 };
 
 // A plan for the calls of one function. Retains and releases that fail still count; everything else
-// that fails does nothing, save for a create function or a build `withHandle`.
+// that fails does nothing, save for a create function, a mapping or a build `withHandle`.
 struct Fault {
     std::string function;                // "*": every function, OpenGL's included
     cl_int status = CL_OUT_OF_RESOURCES; // CL_SUCCESS: all is well, but nothing is handed out
     unsigned nth = 1;                    // the call that fails, counted from the moment of planning
     bool onwards = false;                // all later calls fail, too
-    bool withHandle = false; // hands out an object, or builds it, together with the status
+    bool withHandle = false; // hands out an object or an address, or builds, despite the status
 };
 
 } // namespace scripted
