@@ -213,6 +213,26 @@ TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
     EXPECT_GT(std::ranges::count(warnings(), ""), 0);
 }
 
+TEST_F(ScriptedTest, AFailedRequestLeavesNothingInTheStore)
+{
+    ASSERT_TRUE(start());
+    const auto allocationsOfAHit = [](bool afterAFailure) {
+        Bench bench;
+        bench.makeStore();
+        if (afterAFailure) {
+            runtime().plan({.function = "clCreateProgramWithSource"});
+            EXPECT_EQ(bench.getKernel(), 0);
+        }
+        bench.getKernel();
+        bench.getKernel();
+        allocations = 0;
+        EXPECT_EQ(bench.getKernel(), 1);
+        return allocations;
+    };
+    EXPECT_EQ(allocationsOfAHit(true), allocationsOfAHit(false));
+    EXPECT_EQ(warnings().size(), 1U);
+}
+
 #ifndef _WIN32
 TEST(Allocation, AMapKeepsItsEntriesWhereAnInsertionFailsAndNoneWhereACopyDoes)
 {
@@ -262,9 +282,11 @@ TEST_F(ScriptedTest, ABatchThatCannotBeRebuiltIsEmpty)
     bench.evaluate();
     bench.createShared();
     calls();
+    host().sampling = true;
     allocationsLeft = 1;
     EXPECT_THROW(bench.open(), std::bad_alloc);
     allocationsLeft = 0;
+    EXPECT_EQ(callsOf("eventEnd").size(), 1U) << "the profiler's scope stayed open";
     EXPECT_EQ(bench.leaveBatch(), CL_SUCCESS); // its record says so, but it is in no batch
     EXPECT_EQ(callsOf("clEnqueueRelease"), Lines{});
     bench.open();

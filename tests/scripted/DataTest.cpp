@@ -45,11 +45,15 @@ protected:
 TEST_F(DataTest, EqualityIsNameAndPlug)
 {
     const TopenCLDataBuffer data = makeData();
-    EXPECT_TRUE(data == makeData(describe(9)));
-    EXPECT_TRUE(data != makeData(describe(4, kOtherPlug)));
-    TopenCLDataBuffer renamed = data;
-    renamed.descriptor().setName(TuniqueString("normals"));
-    EXPECT_FALSE(renamed == data);
+    TopenCLDataBuffer same = makeData({kPlug, kName, Descriptor::kReadOnly, 12, 10, 99});
+    same.bufferReadyEvent().adopt(makeEvent());
+    TopenCLDataBuffer otherPlug = data;
+    otherPlug.descriptor().setPlug(kOtherPlug);
+    TopenCLDataBuffer otherName = data;
+    otherName.descriptor().setName(TuniqueString("normals"));
+    EXPECT_TRUE(data == same && !(data != same));
+    EXPECT_TRUE(data != otherPlug && !(data == otherPlug));
+    EXPECT_TRUE(data != otherName && !(data == otherName));
 }
 
 TEST_F(DataTest, TheNullBufferIsEmptyAndWritable)
@@ -277,9 +281,11 @@ TEST_F(DataTest, APoolBufferIsDescribedAsItIsAskedForWhereverItsMemoryIsFrom)
 TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
 {
     TopenCLDataBufferPool pool;
-    TopenCLDataBuffer input = makeData();
+    TopenCLDataBuffer input = makeData({kPlug, kName, Descriptor::kReadWrite, 12, 10, 130});
     input.bufferReadyEvent().adopt(makeEvent());
     const TopenCLDataBuffer inPlace = pool.createOutputBuffer(input, kOtherPlug);
+    EXPECT_EQ(numbersOf(inPlace.descriptor()), (std::array{12U, 10U, 130U}));
+    EXPECT_TRUE(inPlace.descriptor().name() == kName && !inPlace.descriptor().isReadOnly());
     EXPECT_EQ(inPlace.bufferReadyEvent().get(), input.bufferReadyEvent().get());
     EXPECT_EQ(inPlace.buffer().get(), input.buffer().get());
     EXPECT_TRUE(inPlace.descriptor().plug() == kOtherPlug);

@@ -93,6 +93,8 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
                 {"name", "-DA", {"a"}, 1},
                 {"name", "-DA", {"b"}, 1},
                 {"name", "-DA", {"a", "b"}, 1},
+                {"name", "-DA", {"b", "a"}, 1},
+                {"name", "-DA", {"a", "c"}, 1},
                 {"name", "-DA -I a", {}, 0}, // in other words
                 {"name", "", {}, 1},
                 {"name", nullptr, {}, 1},
@@ -114,7 +116,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     // Without double precision the options differ, and so does the key.
     TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
     fromText("skin", "-DA", "name");
-    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#11, [device#1], \"-DA\")"});
+    EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#13, [device#1], \"-DA\")"});
 }
 
 TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
@@ -295,6 +297,10 @@ TEST_F(KernelStoreTest, SourcesAreReadUnchangedBehindThePreamble)
     ASSERT_TRUE(TopenCLInfo::oclLoadProgSource(source, file("a\r\nb\n\x1A"), "#"));
     EXPECT_EQ(std::string(source.asChar(), source.length()), "#a\r\nb\n\x1A");
     EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, "no/such/file.cl", "#"));
+    EXPECT_EQ(source.length(), 0U);
+    constexpr std::uintmax_t kTooLarge = std::uintmax_t{1} << 31; // a sparse file
+    std::filesystem::resize_file(file("#"), kTooLarge);
+    EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, fFile.c_str(), "#"));
     EXPECT_EQ(source.length(), 0U);
     fStore->getKernel(file("skin"), "", "skin", nullptr);
     EXPECT_EQ(callsOf("clCreateProgram"),

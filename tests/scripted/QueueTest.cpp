@@ -54,10 +54,12 @@ TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
 {
     ASSERT_TRUE(start());
     bool outOfOrder = true;
+    runtime().plan({.function = "clCreateCommandQueue", .status = CL_INVALID_VALUE});
     const cl_command_queue first = TopenCLInfo::theOne().createOpenCLCommandQueue(&outOfOrder);
     const cl_command_queue second = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);
     EXPECT_FALSE(outOfOrder);
     EXPECT_EQ(calls(), (Lines{"clGetDeviceInfo(device#1, 4138)",
+                              "clCreateCommandQueue(context#1, device#1, 0) ! -30",
                               "clCreateCommandQueue(context#1, device#1, 0) = queue#3",
                               "clGetDeviceInfo(device#1, 4138)",
                               "clCreateCommandQueue(context#1, device#1, 0) = queue#4"}));
@@ -118,6 +120,7 @@ INSTANTIATE_TEST_SUITE_P(
     Queue, EventQuery,
     ::testing::Values(EventRow{"Done", kNVIDIA, {CL_COMPLETE}, 0, true, 1},
                       EventRow{"Running", kNVIDIA, {CL_RUNNING, CL_COMPLETE}, 0, false, 1},
+                      EventRow{"RunningElsewhere", "Somebody", {CL_RUNNING}, 0, false, 1},
                       EventRow{"Failed", kNVIDIA, {-5}, 0, false, 1},
                       EventRow{"QueryFails", kNVIDIA, {CL_RUNNING}, 1, true, 1},
                       EventRow{"DoneOnAMD", kAMD, {CL_COMPLETE}, 0, true, 1},
