@@ -19,6 +19,7 @@ protected:
     {
         startInModes(graphicsToCL, clToGraphics);
         makeManager();
+        calls();
     }
     void makeManager() { fManager = std::make_unique<TopenCLSharedBufferMgr>(); }
     const TopenCLSharedBuffer* startWithBuffer(int graphicsToCL, int clToGraphics)
@@ -26,9 +27,10 @@ protected:
         startIn(graphicsToCL, clToGraphics);
         return create();
     }
+    void dropManager() { fManager.reset(); }
     void TearDown() override
     {
-        fManager.reset();
+        dropManager();
         ScriptedTest::TearDown();
     }
     const TopenCLSharedBuffer* create(int expectedStatus = CL_SUCCESS)

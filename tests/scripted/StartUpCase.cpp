@@ -1,5 +1,7 @@
 #include "StartUpCase.h"
 
+#include "runtime/InteropFunctions.h"
+
 namespace scripted {
 
 std::string listing(const World& world, std::size_t taken)
@@ -40,6 +42,8 @@ void StartUp::onDirect3D(const char* extensions)
     arguments.usingDX = true;
     platform().extensions = extensions;
     threadedSharing = true;
+    lookUps = {kForceThreading};
+    table = "devices create pending final";
 }
 
 // The last platform of the row is the one that is asked for, the first of its vendor the one taken.
@@ -64,6 +68,8 @@ void StartUp::stopsBeforePlatform(const std::string& text)
     error = kAttempt + text;
     provider = kUnknownProvider;
     minimumBufferSize = 0;
+    modes = {3, 4};
+    table = "";
 }
 
 void StartUp::stopsBeforeDevice(const std::string& text)
@@ -74,6 +80,8 @@ void StartUp::stopsBeforeDevice(const std::string& text)
     asyncReadback = false;
     modes = arguments.usingDX ? std::pair{1, 1} : std::pair{3, 4};
     left = {};
+    lookUps = {kForceThreading};
+    table = arguments.usingDX ? "devices create pending" : "";
 }
 
 void StartUp::stopsWithContext(const std::string& text)
@@ -81,7 +89,14 @@ void StartUp::stopsWithContext(const std::string& text)
     error = world.platforms.empty() ? text : platformText() + text;
     valid = false;
     doublePrecision = false;
+    computeUnits = 0;
     left = {"context#1 x1"};
+}
+
+void StartUp::withoutDoublePrecision()
+{
+    doublePrecision = false;
+    lookUps.emplace_back("asInt32(VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT, 0)");
 }
 
 void StartUp::fails(const std::string& function, unsigned nth)
@@ -89,6 +104,25 @@ void StartUp::fails(const std::string& function, unsigned nth)
     faults.push_back({.function = function, .nth = nth});
     warnings = {kOutOfResources};
 }
+
+namespace {
+
+// The entries that are set of the interop function table; those of a pair are set together.
+std::string interopTable()
+{
+    std::string names;
+    const auto add = [&names](bool set, const char* name) {
+        if (set)
+            names += (names.empty() ? "" : " ") + std::string(name);
+    };
+    add(sfGetDeviceIDsFromD3D11, "devices");
+    add(sfCreateSharedCLBuffer, "create");
+    add(sfPendingEnqueueAcquireSharedObjects && sfPendingEnqueueReleaseSharedObjects, "pending");
+    add(sfEnqueueAcquireSharedObjects && sfEnqueueReleaseSharedObjects, "final");
+    return names;
+}
+
+} // namespace
 
 TEST_P(StartUpRows, PrintsAnswersAndLeaves)
 {
@@ -103,6 +137,13 @@ TEST_P(StartUpRows, PrintsAnswersAndLeaves)
         expected.prepareHost();
 
     EXPECT_EQ(startWatched(), expected.valid);
+    Lines lookUps = calls();
+    EXPECT_EQ(lookUps.back() == "initializeOffset()", expected.computeUnits != 0);
+    std::erase_if(lookUps, [](const std::string& line) {
+        return !line.starts_with("VyraGetEnv") && !line.starts_with("asInt32");
+    });
+    EXPECT_EQ(lookUps, expected.lookUps);
+    EXPECT_EQ(interopTable(), expected.table);
 
     EXPECT_EQ(printedError, expected.error ? *expected.error : expected.wholeText());
     EXPECT_EQ(printedOutput, expected.output);
@@ -111,13 +152,15 @@ TEST_P(StartUpRows, PrintsAnswersAndLeaves)
     const TopenCLInfo& info = TopenCLInfo::theOne();
     EXPECT_EQ(TopenCLInfo::isValid(), expected.valid);
     EXPECT_EQ(info.openCLProvider(), expected.provider);
+    EXPECT_EQ(info.computeUnitCount(), expected.computeUnits);
     EXPECT_EQ(info.minimumBufferSize(), expected.minimumBufferSize);
     EXPECT_EQ(info.supportsAsyncReadback(), expected.asyncReadback);
     EXPECT_EQ(info.platformSupportsDoublePrecision(), expected.doublePrecision);
     EXPECT_EQ(runtime().name(info.openCLDevice()), expected.device);
     EXPECT_EQ(info.graphicsToCLSyncMode(), expected.modes.first);
     EXPECT_EQ(info.clToGraphicsSyncMode(), expected.modes.second);
-    EXPECT_EQ(info.useGLFinish(), expected.modes.first == 3);
+    EXPECT_EQ(info.useGLFinish(), expected.modes.first == 3 && !expected.arguments.usingDX);
+    EXPECT_EQ(info.usingGLCoreProfile(), expected.arguments.usingGLCoreProfile);
     EXPECT_EQ(info.useCLFinish(), expected.modes.second == 4);
     EXPECT_EQ(info.supportsThreadedSharing(), expected.threadedSharing);
 }

@@ -11,6 +11,8 @@
 
 namespace scripted {
 
+inline const std::string kForceThreading = "VyraGetEnv(VYRA_OPENCL_FORCE_THREADING)";
+
 struct StartUp {
     World world;
     StartArguments arguments;
@@ -29,6 +31,11 @@ struct StartUp {
     std::string device = "device#1";
     std::pair<int, int> modes{1, 1}; // graphics to OpenCL, OpenCL to graphics
     bool threadedSharing = true;
+    Lines lookUps{kForceThreading, "asInt32(VYRA_OPENCL_FORCE_FINISH, 0)",
+                  "asInt32(VYRA_GRAPHICSTOOPENCL_SYNC_MODE, 0)",
+                  "asInt32(VYRA_OPENCLTOGRAPHICS_SYNC_MODE, 0)"}; // of variables, by the host
+    unsigned computeUnits = 8;                 // 0: start-up stopped before the host's last step
+    std::string table{"create pending final"}; // the filled entries of the interop function table
     Lines left{"context#1 x1", "queue#1 x1", "queue#2 x1"};
 
     PlatformScript& platform() { return world.platforms[0]; }
@@ -48,6 +55,8 @@ struct StartUp {
     void stopsBeforePlatform(const std::string& text);
     void stopsBeforeDevice(const std::string& text);
     void stopsWithContext(const std::string& text);
+    // There is no double precision: the host is asked whether that matters.
+    void withoutDoublePrecision();
     // The n-th call of `function` fails with CL_OUT_OF_RESOURCES, which is reported.
     void fails(const std::string& function, unsigned nth = 1);
 };

@@ -41,6 +41,13 @@ void demandModes(StartUp& c, const char* graphicsToCL, const char* clToGraphics)
                      {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", clToGraphics}};
 }
 
+void withoutGLFunction(StartUp& c, const char* name)
+{
+    c.world.missing = {name};
+    c.stopsWithContext(kNoGL);
+    c.table = "";
+}
+
 void withoutEvents(StartUp& c, std::pair<int, int> modes)
 {
     c.platform().extensions = "cl_khr_gl_sharing";
@@ -74,15 +81,15 @@ const StartUpRow kDeviceRows[] = {
     {"CurrentGLDeviceFails", [](StartUp& c) { c.fails("clGetGLContextInfoKHR", 2); c.stopsBeforeDevice(""); }},
     {"TypeOfCurrentDeviceFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
     {"TypeOfListedDeviceFails", [](StartUp& c) { c.world.currentGLDevice.reset(); c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
-    {"ContextFails", [](StartUp& c) { c.fails("clCreateContext"); c.stopsWithContext(""); c.modes = {3, 4}; c.left = {}; }},
+    {"ContextFails", [](StartUp& c) { c.stopsBeforeDevice(""); c.fails("clCreateContext"); c.device = "device#1"; c.asyncReadback = true; }},
     {"ContextOfNothing", [](StartUp& c) {
          c.faults = {{.function = "clCreateContext", .status = CL_SUCCESS}};
          c.stopsWithContext(kReported);
          c.doublePrecision = true;
          c.left = {}; }},
-    {"CreateFromGLMissing", [](StartUp& c) { c.world.missing = {"clCreateFromGLBuffer"}; c.stopsWithContext(kNoGL); }},
-    {"AcquireGLMissing", [](StartUp& c) { c.world.missing = {"clEnqueueAcquireGLObjects"}; c.stopsWithContext(kNoGL); }},
-    {"ReleaseGLMissing", [](StartUp& c) { c.world.missing = {"clEnqueueReleaseGLObjects"}; c.stopsWithContext(kNoGL); }},
+    {"CreateFromGLMissing", [](StartUp& c) { withoutGLFunction(c, "clCreateFromGLBuffer"); }},
+    {"AcquireGLMissing", [](StartUp& c) { withoutGLFunction(c, "clEnqueueAcquireGLObjects"); }},
+    {"ReleaseGLMissing", [](StartUp& c) { withoutGLFunction(c, "clEnqueueReleaseGLObjects"); }},
     {"DeviceNameFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 2); c.stopsWithContext(""); }},
     {"DeviceTypeFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 3); c.stopsWithContext(kNamed); }},
     {"AvailabilityFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 4); c.stopsWithContext(kNamed + "Device Type: GPU  "); }},
@@ -95,21 +102,22 @@ const StartUpRow kDeviceRows[] = {
          c.platform().version = "OpenCL 1.10 scripted";
          c.platform().extensions += " xcl_khr_fp64x";
          c.firstDevice().doublePrecision = 0; }},
-    {"NoDoubleByExtensionOn10", [](StartUp& c) { c.platform().version = "OpenCL 1.0 scripted"; c.doublePrecision = false; }},
+    {"NoDoubleByExtensionOn10", [](StartUp& c) { c.platform().version = "OpenCL 1.0 scripted"; c.withoutDoublePrecision(); }},
     {"FailingExtensionsOn10CountAsNone", [](StartUp& c) {
          c.platform().version = "OpenCL 1.0";
          c.platform().extensions += " cl_khr_fp64";
          c.faults = {{.function = "clGetPlatformInfo", .nth = 10, .onwards = true}};
-         c.doublePrecision = false; }},
+         c.withoutDoublePrecision(); }},
     {"NoDoubleByDeviceOn12", [](StartUp& c) {
          c.firstDevice().doublePrecision = 0;
-         c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "0"}};
-         c.doublePrecision = false; }},
+         c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1x"}}; // not an integer
+         c.withoutDoublePrecision(); }},
     {"DoubleDemandedAndThere", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1"}}; }},
     {"DoubleDemandedAndMissing", [](StartUp& c) {
          c.firstDevice().doublePrecision = 0;
          c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "-1"}};
-         c.stopsWithContext(kReported + "Vyra OpenCL is not supported on device because double precision is not supported.\n"); }},
+         c.stopsWithContext(kReported + "Vyra OpenCL is not supported on device because double precision is not supported.\n");
+         c.withoutDoublePrecision(); }},
     {"DriverRefused", [](StartUp& c) {
          c.onNVIDIA("365.10");
          c.stopsBeforeDevice("\nOpenCL is not supported by NVidia drivers between version 361.91 and 368.86.  To enabled "
@@ -125,12 +133,12 @@ const StartUpRow kDeviceRows[] = {
     {"IgnoredByAWord", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "yes"}}; c.modes = {1, 2}; }},
     {"IgnoredOlderDriverIsImplicit", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"ModesFromTheEnvironment", [](StartUp& c) { demandModes(c, "2", "3"); c.modes = {2, 3}; }},
-    {"DemandsThatAreNoNumbers", [](StartUp& c) { demandModes(c, "2x", ""); }},
+    {"DemandsThatAreNoNumbers", [](StartUp& c) { demandModes(c, "2x", "3x"); }},
     {"FinishGoesBeforeTheModes", [](StartUp& c) {
          withoutEvents(c, {3, 4});
          demandModes(c, "1", "1");
          c.environment.emplace_back("VYRA_OPENCL_FORCE_FINISH", "-2"); }},
-    {"FinishThatIsNoNumber", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "no"}}; }},
+    {"FinishThatIsNoNumber", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "1x"}}; }},
     {"FinishOfZero", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "0"}}; }},
     {"ModesWithoutEvents", [](StartUp& c) { withoutEvents(c, {2, 2}); }},
     {"ExtensionsAreFoundAnywhereInTheText", [](StartUp& c) { c.platform().extensions = "xcl_khr_gl_eventx"; }},
@@ -154,28 +162,12 @@ const StartUpRow kDeviceRows[] = {
     {"NoRetryForOtherStatuses", [](StartUp& c) { primaryQueueFails(c, -6, 1, "CL_OUT_OF_HOST_MEMORY"); }},
     {"QueuePropertiesFail", [](StartUp& c) { primaryQueueFails(c, 0, 0, "CL_OUT_OF_RESOURCES"); c.faults = {{.function = "clGetDeviceInfo", .nth = 6}}; }},
     {"SecondaryQueueFails", [](StartUp& c) { c.fails("clCreateCommandQueue", 2); c.left = {"context#1 x1", "queue#1 x1"}; }},
-    {"ComputeUnitsFail", [](StartUp& c) { c.fails("clGetDeviceInfo", 8); }},
+    {"ComputeUnitsFail", [](StartUp& c) { c.fails("clGetDeviceInfo", 8); c.computeUnits = 0; }},
 };
 // clang-format on
 INSTANTIATE_TEST_SUITE_P(Device, StartUpRows, ::testing::ValuesIn(kDeviceRows), kName);
 
 using DeviceStartUpOnce = ScriptedTest;
-
-TEST_F(DeviceStartUpOnce, ComputeUnitsComeLastButTheHost)
-{
-    ASSERT_TRUE(startWatched());
-    EXPECT_EQ(calls().back(), "initializeOffset()");
-    EXPECT_EQ(TopenCLInfo::theOne().computeUnitCount(), 8U);
-}
-
-TEST_F(DeviceStartUpOnce, TheHostIsNotToldWhenComputeUnitsFail)
-{
-    faults = {{.function = "clGetDeviceInfo", .nth = 8}};
-    EXPECT_TRUE(startWatched());
-    EXPECT_EQ(callsOf("initializeOffset"), Lines{});
-    EXPECT_EQ(TopenCLInfo::theOne().computeUnitCount(), 0U);
-    EXPECT_EQ(warnings(), Lines{kOutOfResources});
-}
 
 TEST_F(DeviceStartUpOnce, WithoutAQueueTheRestIsDoneAllTheSame)
 {
@@ -227,6 +219,7 @@ TEST_F(DeviceStartUpOnce, ForcedThreadingIsAskedForOnce)
     EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
     setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
     EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
+    EXPECT_EQ(calls(), Lines{kForceThreading});
 }
 
 // The display entry of each window system, by its number.

@@ -33,6 +33,7 @@ void incomplete(StartUp& c, const char* extensions, const char* missing, const c
 {
     c = onDirect3D(extensions, missing);
     c.stopsBeforeDevice("");
+    c.table = std::string(missing).starts_with("clGetDeviceIDs") ? "" : "devices";
     c.output = output;
 }
 
@@ -45,7 +46,13 @@ const StartUpRow kDirect3DRows[] = {
     {"OnNVIDIA", [](StartUp& c) { c.onNVIDIA("400.00"); c.onDirect3D(kNV); }},
     {"Neither", [](StartUp& c) {
          c = onDirect3D("cl_khr_gl_sharing", "");
-         c.stopsBeforeDevice("Error: using D3D11 but found no OpenCL/D3D11 interop extension."); }},
+         c.stopsBeforeDevice("Error: using D3D11 but found no OpenCL/D3D11 interop extension.");
+         c.table = ""; }},
+    {"StoppedBeforeTheModes", [](StartUp& c) {
+         c.onDirect3D(kNV);
+         c.arguments.usingGLCoreProfile = false;
+         c.environment = {{"VYRA_DISABLE_OPENCL", "1"}};
+         c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
     {"NVWithoutDevices", [](StartUp& c) { incomplete(c, kNV, "clGetDeviceIDsFromD3D11NV", kNVIncomplete); }},
     {"NVWithoutCreate", [](StartUp& c) { incomplete(c, kNV, "clCreateFromD3D11BufferNV", kNVIncomplete); }},
     {"NVWithoutAcquire", [](StartUp& c) { incomplete(c, kNV, "clEnqueueAcquireD3D11ObjectsNV", kNVIncomplete); }},

@@ -1,7 +1,18 @@
 // Start-up as far as the platform: loading, vendors, the listing and its failures.
+#include "PrivateMember.h"
 #include "StartUpCase.h"
+#include "kernels/TopenCLKernelStore.h"
 
 using namespace scripted;
+
+struct CleanUp : PrivateMember<void (TopenCLInfo::*)()> {
+    friend Type memberOf(CleanUp);
+};
+struct FindPlatform : PrivateMember<bool (*)(const Tstring&, cl_platform_id&, Tstring&)> {
+    friend Type memberOf(FindPlatform);
+};
+template struct Reveal<CleanUp, &TopenCLInfo::cleanUpOpenCL>;
+template struct Reveal<FindPlatform, &TopenCLInfo::findPlatformByVendor>;
 
 namespace {
 
@@ -36,6 +47,11 @@ const StartUpRow kPlatformRows[] = {
          c.onNVIDIA("365.10");
          c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", ""}};
          c.modes = {1, 2}; }},
+    {"ThreadingForcedByAnEmptyVariable", [](StartUp& c) {
+         c.onNVIDIA("400.00");
+         c.environment = {{"VYRA_OPENCL_FORCE_THREADING", ""}};
+         c.error = "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n" + c.wholeText();
+         c.threadedSharing = true; }},
 #endif
     {"ForcedThreadingIsAnnouncedFirst", [](StartUp& c) {
          c.environment = {{"VYRA_OPENCL_FORCE_THREADING", "0"}};
@@ -115,7 +131,7 @@ TEST_F(StartUpOnce, AFailedStartUpIsNotTriedAgain)
 {
     setEnvironment("VYRA_DISABLE_OPENCL", "0");
     EXPECT_FALSE(startWatched());
-    EXPECT_EQ(calls(), Lines{});
+    EXPECT_EQ(calls(), Lines{kForceThreading});
     removeEnvironment("VYRA_DISABLE_OPENCL");
     EXPECT_FALSE(startWatched());
     EXPECT_EQ(printedError, "");
@@ -132,6 +148,14 @@ TEST_F(StartUpOnce, PlatformTextsAreAskedForInTheirOrder)
     EXPECT_EQ(callsOf("clGetPlatformInfo"), expected);
 }
 
+TEST_F(StartUpOnce, OnlyExtensionsAreLookedUpThroughTheRuntime)
+{
+    ASSERT_TRUE(startWatched());
+    const Lines lookUps = callsOf("clGetExtensionFunctionAddress");
+    EXPECT_EQ(lookUps.size(), 12U);
+    EXPECT_THAT(lookUps, ::testing::Each(::testing::ContainsRegex("GL|D3D11")));
+}
+
 TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
 {
     world.platforms[0].devices[0].doublePrecision = 0;
@@ -144,21 +168,52 @@ TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
     EXPECT_TRUE(info.setUseMinimumBufferSize(false));
     EXPECT_FALSE(info.setUseMinimumBufferSize(false));
     EXPECT_EQ(info.minimumBufferSize(), 0);
+    EXPECT_TRUE(info.setUseMinimumBufferSize(true));
+    EXPECT_EQ(info.minimumBufferSize(), 7);
 
     setEnvironment("VYRA_OPENCL_DEFORMER_MIN_VERTS", "many");
     testing::internal::CaptureStderr();
     EXPECT_TRUE(info.setMinimumBufferSize(-1));
     EXPECT_FALSE(info.setMinimumBufferSize(-1));
+    EXPECT_FALSE(info.setMinimumBufferSize(0)) << "0 is no request for the default";
     const std::string line =
         "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 0.\n";
     EXPECT_EQ(testing::internal::GetCapturedStderr(), line + line);
 
     EXPECT_TRUE(info.usingGPU());
-    EXPECT_TRUE(info.usingGLCoreProfile());
     EXPECT_FALSE(info.usingOutOfOrderExecution());
     EXPECT_TRUE(info.setAllowDoublePrecisionSupport(true)); // becomes false: no double precision
     EXPECT_FALSE(info.allowDoublePrecisionSupport());
     EXPECT_FALSE(info.setAllowDoublePrecisionSupport(true));
+}
+
+TEST_F(StartUpOnce, CleanUpDeletesTheKernelStoreAndReleasesNothingElse)
+{
+    ASSERT_TRUE(start());
+    TopenCLInfo& info = TopenCLInfo::theOne();
+    info.kernelStore().getKernelFromString("skin", "program", "", "skin", nullptr);
+    calls();
+    (info.*memberOf(CleanUp()))();
+    (info.*memberOf(CleanUp()))();
+    EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#1)", "clReleaseProgram(program#1)"}));
+    EXPECT_EQ(info.openCLContext(), nullptr);
+    EXPECT_EQ(info.openCLCommandQueue(), nullptr);
+    EXPECT_EQ(info.secondaryOpenCLCommandQueue(), nullptr);
+    EXPECT_EQ(runtime().name(info.openCLDevice()), "device#1");
+}
+
+TEST_F(StartUpOnce, PlatformsAreListedUntilOnePassIsComplete)
+{
+    faults = {{.function = "clGetPlatformInfo"}};
+    EXPECT_FALSE(start());
+    EXPECT_EQ(warnings(), Lines{kOutOfResources});
+    for (const std::string& expected : {listing(world, 0), std::string()}) {
+        cl_platform_id platform = nullptr;
+        Tstring extensions;
+        testing::internal::CaptureStderr();
+        EXPECT_TRUE(memberOf(FindPlatform())(kIntel.c_str(), platform, extensions));
+        EXPECT_EQ(testing::internal::GetCapturedStderr(), expected);
+    }
 }
 
 TEST_F(StartUpOnce, ErrorsOfTheContextGoToStandardError)

@@ -2,11 +2,13 @@
 
 #include "FakeRuntime.h"
 #include "host/Application.h"
+#include "host/Environment.h"
 #include "host/MemoryMonitor.h"
 #include "host/Profiler.h"
 #include "host/ResourceWindow.h"
 
 #include <cstdint>
+#include <cstdlib>
 #include <sstream>
 #include <string>
 
@@ -73,6 +75,24 @@ Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int
     if (adapter != 0)
         log("MemoryMonitor of another adapter");
     return scripted::monitor();
+}
+
+// The log tells a look-up through the host from a plain getenv.
+const char* VyraGetEnv(const char* name)
+{
+    log("VyraGetEnv(", name, ")");
+    return std::getenv(name);
+}
+
+TenvironmentVariable::TenvironmentVariable(const char* name) : fName(name) {}
+
+std::int32_t TenvironmentVariable::asInt32(std::int32_t defaultValue) const
+{
+    log("asInt32(", fName, ", ", defaultValue, ")");
+    const char* value = std::getenv(fName);
+    char* end = nullptr;
+    const long number = value ? std::strtol(value, &end, 10) : 0;
+    return value && end != value && *end == 0 ? static_cast<std::int32_t>(number) : defaultValue;
 }
 
 Tstring TappLocale::getResourcesLocation()

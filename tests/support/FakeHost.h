@@ -3,13 +3,14 @@
 //
 // What is defined here takes the place of the stand-in's own definition, since the tests'
 // executables contain the library's objects and so bind to the executable's symbols first. Strings,
-// plugs, environment look-ups and the trace channel remain the stand-in's. Every call of the
-// library is a line in the runtime's log.
+// plugs and the trace channel remain the stand-in's. Every call of the library is a line in the
+// runtime's log.
 #pragma once
 
 #include "host/GLDisplay.h"
 
 #include <cstddef>
+#include <functional>
 #include <memory>
 
 class QOpenGLWindow;
@@ -20,6 +21,7 @@ struct HostScript {
     GLDisplayProperty display{0x200A, 77}; // CL_GLX_DISPLAY_KHR
     bool sampling = false;                 // the profiler records
     QOpenGLWindow* resourceWindow = nullptr;
+    std::function<void()> duringFenceWait; // runs once, at the next wait of an OpenGL client
 };
 HostScript& host();
 
