@@ -1,11 +1,19 @@
 // The list that several evaluators report their events to, while one more thread may read it.
 #include "interop/ConcurrentEventList.h"
 
+#include "PrivateMember.h"
+
 #include <algorithm>
+#include <chrono>
 #include <cstdint>
 #include <thread>
 
 #include <gtest/gtest.h>
+
+struct Size : PrivateMember<std::atomic<std::size_t> ConcurrentEventList::*> {
+    friend Type memberOf(Size);
+};
+template struct Reveal<Size, &ConcurrentEventList::fSize>;
 
 namespace {
 
@@ -65,8 +73,6 @@ TEST(ConcurrentEventList, ACopyBesideAppendsIsWholeAndABeginningOfWhatFollows)
     // Short lists, over and over: an event on its way is then soon met.
     for (int evaluation = 0; evaluation < 200; ++evaluation) {
         ConcurrentEventList list;
-        appendFromAllThreads(list, 50); // of which nothing may show up again
-        list.clear();
         std::atomic<bool> done = false;
         std::vector<std::vector<cl_event>> copies;
         std::thread reader([&] {
@@ -83,4 +89,30 @@ TEST(ConcurrentEventList, ACopyBesideAppendsIsWholeAndABeginningOfWhatFollows)
             ASSERT_TRUE(std::equal(copy.begin(), copy.end(), all.begin()));
         }
     }
+}
+
+TEST(ConcurrentEventList, AReaderWaitsForATakenSlotThatWasWrittenBeforeClear)
+{
+    ConcurrentEventList list;
+    list.append(fakeEvent(0, 0));
+    list.append(fakeEvent(0, 1));
+    list.clear();
+    list.append(fakeEvent(1, 0));
+    std::atomic<std::size_t>& size = list.*memberOf(Size());
+    size = 2; // another append has taken a slot and not written it yet
+    std::vector<cl_event> seen;
+    std::atomic<bool> reading = false;
+    std::thread reader([&] {
+        list.forEach([&](cl_event event) {
+            seen.push_back(event);
+            reading = true;
+        });
+    });
+    while (!reading)
+        std::this_thread::yield();
+    std::this_thread::sleep_for(std::chrono::milliseconds(50)); // to meet the slot unwritten
+    size = 1;
+    list.append(fakeEvent(1, 1));
+    reader.join();
+    EXPECT_EQ(seen, (std::vector{fakeEvent(1, 0), fakeEvent(1, 1)}));
 }
