@@ -1,18 +1,82 @@
-// Start-up where the OpenCL library on the search path cannot be used: CTest runs it with a file
-// that is no library, and with one that lacks a function.
+// Start-up where the OpenCL library cannot be used.
+#include "Platform.h"
 #include "runtime/TopenCLInfo.h"
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 
 #include <gtest/gtest.h>
 
-TEST(WithoutOpenCL, StartUpSaysSoAndStops)
+namespace {
+
+// The functions of OpenCL 1.0 that the library calls.
+constexpr const char* kRequired[] = {"clBuildProgram",
+                                     "clCreateBuffer",
+                                     "clCreateCommandQueue",
+                                     "clCreateContext",
+                                     "clCreateKernel",
+                                     "clCreateProgramWithSource",
+                                     "clEnqueueMapBuffer",
+                                     "clEnqueueReadBuffer",
+                                     "clEnqueueWriteBuffer",
+                                     "clEnqueueUnmapMemObject",
+                                     "clFinish",
+                                     "clFlush",
+                                     "clGetDeviceInfo",
+                                     "clGetEventInfo",
+                                     "clGetPlatformIDs",
+                                     "clGetExtensionFunctionAddress",
+                                     "clGetPlatformInfo",
+                                     "clGetKernelWorkGroupInfo",
+                                     "clGetProgramBuildInfo",
+                                     "clReleaseEvent",
+                                     "clReleaseKernel",
+                                     "clReleaseMemObject",
+                                     "clReleaseProgram",
+                                     "clRetainEvent",
+                                     "clRetainKernel",
+                                     "clRetainMemObject",
+                                     "clRetainProgram",
+                                     "clWaitForEvents"};
+
+std::string printedByStartUp()
 {
     testing::internal::CaptureStderr();
     EXPECT_FALSE(TopenCLInfo::initialize(nullptr, nullptr, nullptr, false, false, 0x8086));
-    EXPECT_EQ(testing::internal::GetCapturedStderr(),
-              "OpenCL evaluator is attempting to initialize OpenCL.\n"
-              "OpenCL evaluator failed to initialize clew.\n");
+    return testing::internal::GetCapturedStderr();
+}
 
-    // What the host may still call does nothing.
+void expectNothingLoaded()
+{
+    EXPECT_EQ(printedByStartUp(), "OpenCL evaluator is attempting to initialize OpenCL.\n"
+                                  "OpenCL evaluator failed to initialize clew.\n");
+}
+
+// Loads a copy of the scripted runtime in which no symbol has this name. It is what the library
+// gets when it opens OpenCL by name, since it is in the process already.
+void loadRuntimeWithout(const std::string& function)
+{
+    const std::filesystem::path original = VYRA_FAKE_OPENCL;
+    const std::filesystem::path folder = testing::TempDir() + "vyra-without-" + function;
+    std::filesystem::create_directories(folder);
+    std::ifstream input(original, std::ios::binary);
+    std::string bytes{std::istreambuf_iterator<char>(input), {}};
+    // The last letter: a table of names stays sorted.
+    const std::string name = '\0' + function + '\0';
+    for (std::size_t at = bytes.find(name); at != std::string::npos; at = bytes.find(name, at + 1))
+        bytes[at + function.size()] = '_';
+    const std::filesystem::path copy = folder / original.filename();
+    std::ofstream(copy, std::ios::binary) << bytes;
+    EXPECT_NE(loadLibrary(copy.string().c_str()), nullptr);
+    std::error_code inUse; // Windows removes no library that is loaded
+    std::filesystem::remove_all(folder, inUse);
+}
+
+// CTest puts a file on the search path that is no library.
+TEST(WithoutOpenCL, StartUpStopsAndCallsOfTheHostDoNothing)
+{
+    expectNothingLoaded();
     TopenCLInfo::finish();
     TopenCLInfo::flush();
     EXPECT_FALSE(TopenCLInfo::isValid());
@@ -24,3 +88,21 @@ TEST(WithoutOpenCL, StartUpSaysSoAndStops)
               CL_DEVICE_NOT_FOUND);
     EXPECT_EQ(global + local, 7U) << "written in spite of the failure";
 }
+
+class WithoutOneFunction : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(WithoutOneFunction, StartUpStops)
+{
+    loadRuntimeWithout(GetParam());
+    expectNothingLoaded();
+}
+INSTANTIATE_TEST_SUITE_P(OpenCL, WithoutOneFunction, ::testing::ValuesIn(kRequired),
+                         [](const auto& row) { return std::string(row.param); });
+
+TEST(WithoutOpenCL, AFunctionThatTheLibraryDoesNotCallMayBeMissing)
+{
+    loadRuntimeWithout("clReleaseContext");
+    EXPECT_NE(printedByStartUp().find("failed to find OpenCL device"), std::string::npos);
+}
+
+} // namespace
