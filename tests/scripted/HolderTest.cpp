@@ -80,19 +80,6 @@ TEST_F(HolderTest, EachOperationMakesExactlyItsCalls)
 }
 // NOLINTEND(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 
-TEST_F(HolderTest, FailingCountsAreReportedAndChangeNothingElse)
-{
-    Mem holder = adopted(makeMem());
-    runtime().plan({.function = "clRetainMemObject"});
-    runtime().plan({.function = "clReleaseMemObject", .status = CL_INVALID_MEM_OBJECT});
-    Mem copy(holder);
-    EXPECT_EQ(copy.get(), holder.get());
-    copy.reset();
-    EXPECT_EQ(copy.get(), nullptr);
-    EXPECT_EQ(warnings(),
-              (Lines{"OpenCL error: CL_OUT_OF_RESOURCES", "OpenCL error: CL_INVALID_MEM_OBJECT"}));
-}
-
 TEST_F(HolderTest, EventsKernelsAndProgramsUseTheirOwnCalls)
 {
     const auto event = adopted(makeEvent());

@@ -1,4 +1,4 @@
-// What the shared-buffer manager does beside the rules of its model: creation's odd answers, the
+// The shared-buffer manager in unusual circumstances: odd results of creations, failures, the
 // host's window, timeouts, profiling, missing abilities, copies.
 #include "ManagerTest.h"
 #include "host/GLFunctionTable.h"
@@ -15,24 +15,20 @@ static_assert(offsetof(TopenCLSharedBuffer, fMem) == 0);
 
 using SharedBufferTest = ManagerTest;
 
-TEST_F(SharedBufferTest, AHandleWithAStatusIsReleasedOnce)
+TEST_F(SharedBufferTest, AFailedCreationReturnsNullAndLeavesTheBatch)
 {
-    startIn(1, 1);
+    startWithBuffer(1, 1);
+    evaluate();
+    calls();
     runtime().plan({.function = "clCreateFromGLBuffer", .status = -60, .withHandle = true});
     EXPECT_EQ(create(-60), nullptr);
-    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 1, 7) = mem#1 ! -60",
-                              "clReleaseMemObject(mem#1)"}));
-    manager().PreEvaluate(kId); // nothing became of it
-    EXPECT_EQ(calls(), Lines{});
-    manager().PostEvaluate(kId);
-}
-
-TEST_F(SharedBufferTest, NoHandleWithSuccessIsNoBuffer)
-{
-    startIn(1, 1);
-    runtime().scriptNextSharedMem(nullptr);
+    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 1, 7) = mem#2 ! -60",
+                              "clReleaseMemObject(mem#2)"}));
+    runtime().scriptNextSharedMem(nullptr); // success without a handle
     EXPECT_EQ(create(), nullptr);
-    EXPECT_EQ(calls().size(), 1U);
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(callsOf("clRetainMemObject"), Lines{});
+    manager().PostEvaluate(kId);
 }
 
 TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
@@ -47,18 +43,6 @@ TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
     calls();
     manager().PreEvaluate(kId);
     EXPECT_EQ(callsOf("clRetainMemObject").size(), 1U) << "the batch is made anew";
-    manager().PostEvaluate(kId);
-}
-
-TEST_F(SharedBufferTest, AFailedCreationLeavesTheBatchAsItIs)
-{
-    startWithBuffer(1, 1);
-    evaluate();
-    runtime().plan({.function = "clCreateFromGLBuffer"});
-    EXPECT_EQ(create(CL_OUT_OF_RESOURCES), nullptr);
-    calls();
-    manager().PreEvaluate(kId);
-    EXPECT_EQ(callsOf("clRetainMemObject"), Lines{});
     manager().PostEvaluate(kId);
 }
 
@@ -88,18 +72,6 @@ TEST_P(FirstManagerTest, IsTheOnlyOneThatSaysSo)
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 INSTANTIATE_TEST_SUITE_P(SharedBuffers, FirstManagerTest, ::testing::Bool());
-
-TEST_F(SharedBufferTest, WithoutBatchingNothingIsProfiled)
-{
-    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
-    startIn(2, 3);
-    host().sampling = true;
-    manager().PreEvaluate(kId);
-    EXPECT_NE(manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr), nullptr);
-    manager().PostEvaluate(kId);
-    manager().RenderingComplete();
-    EXPECT_EQ(calls(), Lines{});
-}
 
 TEST_F(SharedBufferTest, AFailedWaitDissolvesTheBatchAllTheSame)
 {
@@ -131,6 +103,8 @@ TEST_F(SharedBufferTest, ABufferWhoseOwnReleaseFailsLeavesTheBatchAllTheSame)
 TEST_F(SharedBufferTest, ABatchWhoseAcquireFailedIsReleasedAllTheSame)
 {
     const auto* buffer = startWithBuffer(1, 1);
+    const auto* other = create();
+    evaluate(); // makes the wait list's storage, which stays: an empty list is null all the same
     runtime().plan({.function = "clEnqueueAcquireGLObjects"});
     manager().PreEvaluate(kId);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
@@ -139,10 +113,12 @@ TEST_F(SharedBufferTest, ABatchWhoseAcquireFailedIsReleasedAllTheSame)
     EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, &event), CL_SUCCESS);
     EXPECT_EQ(event, nullptr);
     EXPECT_EQ(calls(), Lines{});
+    manager().DestroyBatchedSharedCLBuffer(other);
     manager().PostEvaluate(kId);
-    EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects").size(), 1U);
+    EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects").size(), 2U);
     expectMisuse("clEnqueueReleaseGLObjects: not acquired");
-    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_GL_OBJECT"});
+    expectMisuse("clEnqueueReleaseGLObjects: not acquired");
+    EXPECT_EQ(warnings(), (Lines(2, "OpenCL error: CL_INVALID_GL_OBJECT")));
 }
 
 TEST_F(SharedBufferTest, AnEvaluationWhoseReleaseFailedIsClosedAllTheSame)
@@ -321,16 +297,6 @@ TEST_F(SharedBufferTest, OnlyUsableFunctionsAreCalled)
     }
 }
 
-TEST_F(SharedBufferTest, ASyncObjectThatCannotBeMadeIsSkipped)
-{
-    startWithBuffer(1, 3);
-    manager().PreEvaluate(kId);
-    runtime().plan({.function = "glCreateSyncFromCLeventARB"});
-    calls();
-    manager().PostEvaluate(kId);
-    EXPECT_EQ(callsOf("gl").size(), 1U);
-}
-
 TEST_F(SharedBufferTest, AnotherEvaluationAcquiresOnceMore)
 {
     startWithBuffer(1, 1);
@@ -343,28 +309,82 @@ TEST_F(SharedBufferTest, AnotherEvaluationAcquiresOnceMore)
     manager().PostEvaluate(kId);
 }
 
-TEST_F(SharedBufferTest, ACopyHasReferencesOfItsOwnAndAnEmptyList)
+// How a copy is made.
+class CopyTest : public SharedBufferTest, public ::testing::WithParamInterface<bool> {
+protected:
+    std::unique_ptr<TopenCLSharedBufferMgr> copied()
+    {
+        removeEnvironment("VYRA_OPENCL_FORCE_THREADING");
+        if (GetParam())
+            return std::make_unique<TopenCLSharedBufferMgr>(manager());
+        auto target = std::make_unique<TopenCLSharedBufferMgr>();
+        *target = manager();
+        return target;
+    }
+};
+
+TEST_P(CopyTest, GoesOnWhereTheOriginalStandsWithReferencesOfItsOwn)
 {
     const auto* buffer = startWithBuffer(1, 1);
+    evaluate();
+    const cl_event released = *manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr);
+    EXPECT_EQ(*copied()->EnqueueReleaseBatchedSharedCLBuffer(0, nullptr), released);
+
     manager().PreEvaluate(kId);
+    const auto* late = create();
+    const auto copy = copied();
+    EXPECT_EQ(runtime().references(Kind::kMem, buffer->fMem.get()), 4U) << "records and batches";
+    EXPECT_EQ(runtime().references(Kind::kMem, late->fMem.get()), 2U) << "records";
+    dropManager();
+    calls();
+    copy->PreEvaluate(kId);
+    EXPECT_EQ(calls(), Lines{}) << "its evaluation is open";
+    TopenCLSharedBuffer batched; // as the original's, which is gone
+    batched.fInBatch = true;
+    *batched.fMem.receive() = makeMem();
     AutoCLObject<cl_event> acquired;
-    acquire(buffer, acquired.receive());
-    const cl_event handed = acquired.get();
-    manager().EnqueueReleaseBatchedSharedCLBuffer(1, &handed);
-    {
-        const TopenCLSharedBufferMgr copy(manager());
-        EXPECT_EQ(runtime().references(Kind::kMem, buffer->fMem.get()), 4U);
-        // The list of the target pays its references back.
-        TopenCLSharedBufferMgr target;
-        target.EnqueueReleaseBatchedSharedCLBuffer(1, &handed);
-        const unsigned before = runtime().references(Kind::kEvent, handed);
-        target = copy;
-        TopenCLSharedBufferMgr& itself = target;
-        target = itself;
-        EXPECT_EQ(runtime().references(Kind::kEvent, handed), before); // one less, one more
+    copy->EnqueueAcquireSharedCLBuffer(queue(), &batched, acquired.receive());
+    EXPECT_EQ(runtime().name(acquired.get()), "event#3");
+    copy->PostEvaluate(kId);
+    EXPECT_EQ(callsOf("clEnqueue"),
+              Lines{"clEnqueueReleaseGLObjects(queue#1, [mem#1], []) = event#4"})
+        << "the reported events stay the original's";
+    copy->PreEvaluate(kId);
+    EXPECT_THAT(callsOf("clEnqueue"), ::testing::ElementsAre(::testing::HasSubstr("mem#2, mem#1")));
+    copy->PostEvaluate(kId);
+    ocl.clReleaseEvent(acquired.get()); // the reference in the list of the original
+}
+
+TEST_P(CopyTest, WithoutBatchingNeitherOriginalNorCopyDoesOrProfilesAnything)
+{
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startWithBuffer(2, 3);
+    const auto copy = copied();
+    host().sampling = true;
+    calls();
+    for (TopenCLSharedBufferMgr* unbatched : {&manager(), copy.get()}) {
+        unbatched->PreEvaluate(kId);
+        EXPECT_NE(unbatched->EnqueueReleaseBatchedSharedCLBuffer(0, nullptr), nullptr);
+        unbatched->PostEvaluate(kId);
+        unbatched->RenderingComplete();
+        EXPECT_EQ(calls(), Lines{});
     }
-    EXPECT_EQ(runtime().references(Kind::kMem, buffer->fMem.get()), 2U);
-    manager().PostEvaluate(kId);
+}
+INSTANTIATE_TEST_SUITE_P(SharedBuffers, CopyTest, ::testing::Bool(),
+                         [](const auto& row) { return row.param ? "Constructed" : "Assigned"; });
+
+TEST_F(SharedBufferTest, AssignmentReleasesTheEventsThatTheTargetLists)
+{
+    startIn(1, 1);
+    AutoCLObject<cl_event> event;
+    event.adopt(makeEvent());
+    const cl_event reported = event.get();
+    manager().EnqueueReleaseBatchedSharedCLBuffer(1, &reported);
+    TopenCLSharedBufferMgr& itself = manager();
+    manager() = itself;
+    EXPECT_EQ(runtime().references(Kind::kEvent, reported), 2U);
+    manager() = TopenCLSharedBufferMgr();
+    EXPECT_EQ(runtime().references(Kind::kEvent, reported), 1U);
 }
 
 } // namespace

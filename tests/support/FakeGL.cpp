@@ -22,6 +22,8 @@ void deleteSync(GLsync sync)
 
 unsigned clientWaitSync(GLsync sync, unsigned flags, std::uint64_t timeout)
 {
+    if (const auto hook = std::exchange(host().duringFenceWait, nullptr))
+        hook();
     Entry call("glClientWaitSync", sync, flags, timeout);
     call.object(Kind::kSync, sync);
     return call.ok() ? call.nextClientWait() : kWaitFailed;

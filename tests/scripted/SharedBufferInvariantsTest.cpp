@@ -1,0 +1,377 @@
+// Random sequences of the shared-buffer manager's operations, in every pair of synchronisation
+// modes, against what holds in any order: one acquire and one release for each evaluation, every
+// reported event in a release, balanced references, no misuse of the runtime. A failing sequence is
+// shortened before it is printed.
+#include "Objects.h"
+#include "ScriptedTest.h"
+#include "host/EvaluationId.h"
+#include "interop/GraphicsSync.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <memory>
+#include <random>
+#include <set>
+#include <sstream>
+
+using namespace scripted;
+
+namespace {
+
+constexpr unsigned kSequences = 300; // of each pair of modes
+constexpr unsigned kSteps = 80;
+
+struct Modes {
+    int graphicsToCL;
+    int clToGraphics;
+    bool batching;
+};
+void PrintTo(const Modes& modes, std::ostream* out)
+{
+    *out << modes.graphicsToCL << '_' << modes.clToGraphics << (modes.batching ? "" : "_Unbatched");
+}
+
+struct Step {
+    std::size_t operation; // of Sequence::kOperations
+    unsigned choice;       // of a buffer, or of a number of events
+};
+
+using Names = std::multiset<std::string>;
+
+// The names in the brackets that open at `begin`.
+Names namesAt(const std::string& line, std::size_t begin)
+{
+    std::istringstream text(line.substr(begin + 1, line.find(']', begin) - begin - 1));
+    Names names;
+    for (std::string name; std::getline(text >> std::ws, name, ',');)
+        names.insert(name);
+    return names;
+}
+
+// A sequence on a manager of its own, with what an observer of its operations can know.
+class Sequence {
+public:
+    struct Operation {
+        const char* name;
+        void (Sequence::*perform)(unsigned choice);
+    };
+    static const Operation kOperations[9];
+
+    explicit Sequence(const Modes& modes)
+        : fModes(modes), fBase(runtime().balance()),
+          fManager(std::make_unique<TopenCLSharedBufferMgr>())
+    {
+        for (cl_event& event : fEvents)
+            event = makeEvent();
+        runtime().takeMisuse();
+    }
+
+    // The first violation, or an empty text.
+    std::string play(const std::vector<Step>& steps)
+    {
+        for (std::size_t i = 0; i < steps.size() && fViolation.empty(); ++i) {
+            perform(kOperations[steps[i].operation].perform, steps[i].choice);
+            if (!fViolation.empty())
+                fViolation = "step " + std::to_string(i) + ": " + fViolation;
+        }
+        finish();
+        return fViolation;
+    }
+
+private:
+    struct Buffer {
+        const TopenCLSharedBuffer* record;
+        bool acquired = false; // by a command of its own
+
+        std::string name() const { return runtime().name(record->fMem.get()); }
+    };
+
+    void require(bool holds, const std::string& rule)
+    {
+        if (!holds && fViolation.empty())
+            fViolation = rule + ", calls " + testing::PrintToString(fCalls);
+    }
+    void perform(void (Sequence::*operation)(unsigned), unsigned choice)
+    {
+        runtime().takeCalls();
+        (this->*operation)(choice);
+        checkReferences();
+    }
+    // Requires one command since the operation began, with these objects and this wait list, and
+    // none if there are no objects. Returns its event.
+    std::string requireCommand(const char* function, const Names& mems, const Names& waitList)
+    {
+        fCalls = runtime().takeCalls();
+        Lines commands = fCalls;
+        std::erase_if(commands, [](const auto& line) { return !line.starts_with("clEnqueue"); });
+        if (mems.empty()) {
+            require(commands.empty(), "no command");
+            return "";
+        }
+        const std::string line = commands.empty() ? "[]" : commands.front();
+        require(commands.size() == 1 && line.starts_with(function) &&
+                    namesAt(line, line.find('[')) == mems &&
+                    namesAt(line, line.rfind('[')) == waitList,
+                std::string("one ") + function + " of " + testing::PrintToString(mems) + " after " +
+                    testing::PrintToString(waitList));
+        return line.substr(line.rfind(' ') + 1);
+    }
+    void requireNoCommand() { requireCommand("", {}, {}); }
+    void requireAllInBatch()
+    {
+        for (const Buffer& buffer : fBuffers)
+            require(buffer.record->fInBatch == fModes.batching, "all in the batch");
+    }
+    bool anyAcquired() const { return std::ranges::any_of(fBuffers, &Buffer::acquired); }
+    // The buffer that is chosen, or null.
+    Buffer* chosen(unsigned choice)
+    {
+        return fBuffers.empty() ? nullptr : &fBuffers[choice % fBuffers.size()];
+    }
+
+    void create(unsigned);
+    template <bool kKeepBatch>
+    void destroy(unsigned choice);
+    void preEvaluate(unsigned);
+    void acquire(unsigned choice);
+    void report(unsigned choice);
+    void release(unsigned choice);
+    void postEvaluate(unsigned);
+    void renderingComplete(unsigned);
+    void checkReferences();
+    void finish();
+
+    Modes fModes;
+    Lines fBase; // what was alive before
+    std::unique_ptr<TopenCLSharedBufferMgr> fManager;
+    std::vector<Buffer> fBuffers;
+    cl_event fEvents[3] = {};        // of an evaluator's last commands
+    std::vector<cl_event> fReleased; // by single commands since the last PostEvaluate
+    bool fOpen = false;
+    Names fHeld;    // acquired by the open evaluation and not released since
+    Names fPending; // events that the next batch release has to wait for
+    std::string fAcquireEvent = "null";
+    bool fFence = false; // is pending
+    Lines fCalls;
+    std::string fViolation;
+};
+
+const Sequence::Operation Sequence::kOperations[] = {
+    {"Create", &Sequence::create},
+    {"Destroy", &Sequence::destroy<false>},
+    {"DestroyBatched", &Sequence::destroy<true>},
+    {"PreEvaluate", &Sequence::preEvaluate},
+    {"Acquire", &Sequence::acquire},
+    {"Report", &Sequence::report},
+    {"Release", &Sequence::release},
+    {"PostEvaluate", &Sequence::postEvaluate},
+    {"RenderingComplete", &Sequence::renderingComplete},
+};
+
+std::vector<Step> randomSteps(unsigned seed)
+{
+    std::mt19937 random(seed);
+    std::discrete_distribution<std::size_t> operation{4, 1, 2, 4, 5, 3, 4, 4, 2}; // large batches
+    std::vector<Step> steps(kSteps);
+    for (Step& step : steps)
+        step = {operation(random), static_cast<unsigned>(random() % 1000)};
+    return steps;
+}
+
+void Sequence::create(unsigned)
+{
+    int status = 1;
+    fBuffers.push_back({makeShared(*fManager, &status)});
+}
+
+template <bool kKeepBatch>
+void Sequence::destroy(unsigned choice)
+{
+    const Buffer* buffer = chosen(choice);
+    if (!buffer)
+        return;
+    const Names mems =
+        kKeepBatch && fOpen && buffer->record->fInBatch ? Names{buffer->name()} : Names{};
+    if (kKeepBatch)
+        fManager->DestroyBatchedSharedCLBuffer(buffer->record);
+    else
+        fManager->DestroySharedCLBuffer(buffer->record);
+    fBuffers.erase(fBuffers.begin() + (buffer - fBuffers.data()));
+    requireCommand("clEnqueueRelease", mems, fPending);
+    for (const std::string& mem : mems)
+        fHeld.erase(mem);
+}
+
+// Buffers that have commands of their own are released before the batch takes them in.
+void Sequence::preEvaluate(unsigned)
+{
+    if (!fOpen && anyAcquired())
+        return;
+    fManager->PreEvaluate(em::Id(1));
+    if (fOpen || !fModes.batching)
+        return requireNoCommand();
+    fOpen = true;
+    for (const Buffer& buffer : fBuffers)
+        fHeld.insert(buffer.name());
+    const std::string event = requireCommand("clEnqueueAcquire", fHeld, {});
+    requireAllInBatch();
+    if (fHeld.empty())
+        return;
+    fAcquireEvent = event;
+    fPending.insert(event);
+    fFence = false;
+}
+
+void Sequence::acquire(unsigned choice)
+{
+    Buffer* buffer = chosen(choice);
+    if (!buffer || buffer->acquired)
+        return;
+    cl_event event = nullptr;
+    fManager->EnqueueAcquireSharedCLBuffer(TopenCLInfo::theOne().openCLCommandQueue(),
+                                           buffer->record, &event);
+    buffer->acquired = !buffer->record->fInBatch;
+    const Names mems = buffer->acquired ? Names{buffer->name()} : Names{};
+    const std::string own = requireCommand("clEnqueueAcquire", mems, {});
+    require(runtime().name(event) == (buffer->acquired ? own : fAcquireEvent), "the event");
+    fFence = fFence && !buffer->acquired;
+    if (event)
+        ocl.clReleaseEvent(event);
+}
+
+void Sequence::release(unsigned choice)
+{
+    Buffer* buffer = chosen(choice);
+    if (!buffer || !buffer->acquired)
+        return;
+    const cl_mem mem = buffer->record->fMem.get();
+    fManager->EnqueueReleaseSharedCLBuffer(TopenCLInfo::theOne().openCLCommandQueue(), 1, &mem, 0,
+                                           nullptr, &fReleased.emplace_back());
+    requireCommand("clEnqueueRelease", {buffer->name()}, {});
+    buffer->acquired = false;
+}
+
+void Sequence::report(unsigned choice)
+{
+    const unsigned number = choice % 4;
+    fManager->EnqueueReleaseBatchedSharedCLBuffer(number, fEvents);
+    requireNoCommand();
+    for (unsigned index = 0; index < number && fModes.batching; ++index)
+        fPending.insert(runtime().name(fEvents[index]));
+}
+
+void Sequence::postEvaluate(unsigned)
+{
+    if (anyAcquired())
+        return;
+    fManager->PostEvaluate(em::Id(1));
+    const std::string event = requireCommand("clEnqueueRelease", fHeld, fPending);
+    const cl_event slot = *fManager->EnqueueReleaseBatchedSharedCLBuffer(0, nullptr);
+    require(fHeld.empty() || event == runtime().name(slot), "the event at the address");
+    const bool graphicsWaits = fModes.batching && fModes.clToGraphics == 3;
+    const auto isWait = [](const auto& line) { return line.starts_with("glWaitSync"); };
+    require(std::ranges::count_if(fCalls, isWait) ==
+                (graphicsWaits ? std::ssize(fReleased) + (slot ? 1 : 0) : 0),
+            "one wait of the renderer for each release");
+    requireAllInBatch();
+    if (!fHeld.empty())
+        fPending.clear();
+    fHeld.clear();
+    fOpen = false;
+    for (cl_event released : fReleased)
+        ocl.clReleaseEvent(released);
+    fReleased.clear();
+}
+
+void Sequence::renderingComplete(unsigned)
+{
+    fManager->RenderingComplete();
+    fFence = fModes.batching && fModes.graphicsToCL == 2;
+}
+
+void Sequence::checkReferences()
+{
+    for (const Buffer& buffer : fBuffers)
+        require(runtime().references(Kind::kMem, buffer.record->fMem.get()) ==
+                    (buffer.record->fInBatch ? 2U : 1U),
+                "one reference of the record and one of the batch");
+    for (cl_event event : fEvents)
+        require(runtime().references(Kind::kEvent, event) ==
+                    1 + fPending.count(runtime().name(event)),
+                "one reference for each report");
+    const Lines alive = runtime().balance();
+    const auto isSync = [](const auto& line) { return line.starts_with("sync"); };
+    require(std::ranges::count_if(alive, isSync) == (fFence ? 1 : 0), "the pending fence alone");
+    const Lines misuse = runtime().takeMisuse();
+    require(misuse.empty(), testing::PrintToString(misuse));
+}
+
+// A last evaluation releases all events that are pending; then nothing is left.
+void Sequence::finish()
+{
+    for (unsigned index = 0; index < fBuffers.size(); ++index)
+        perform(&Sequence::release, index);
+    for (const auto operation : {&Sequence::postEvaluate, &Sequence::create, &Sequence::preEvaluate,
+                                 &Sequence::postEvaluate})
+        perform(operation, 0);
+    fManager.reset();
+    for (cl_event event : fEvents)
+        ocl.clReleaseEvent(event);
+    WaitForGraphicsFence();
+    require(runtime().balance() == fBase, testing::PrintToString(runtime().balance()));
+}
+
+class SharedBufferInvariants : public ScriptedTest, public ::testing::WithParamInterface<Modes> {
+protected:
+    void SetUp() override
+    {
+        if (!GetParam().batching)
+            setEnvironment("VYRA_OPENCL_FORCE_THREADING", "0");
+        startInModes(GetParam().graphicsToCL, GetParam().clToGraphics);
+    }
+
+    static std::string play(const std::vector<Step>& steps)
+    {
+        return Sequence(GetParam()).play(steps);
+    }
+    // Leaves out every step without which the sequence still fails.
+    static void shrink(std::vector<Step>& steps)
+    {
+        for (std::size_t i = steps.size(); i-- > 0;) {
+            std::vector<Step> fewer = steps;
+            fewer.erase(fewer.begin() + static_cast<std::ptrdiff_t>(i));
+            if (!play(fewer).empty())
+                steps = std::move(fewer);
+        }
+    }
+};
+
+TEST_P(SharedBufferInvariants, HoldInRandomSequences)
+{
+    const char* base = std::getenv("VYRA_TEST_SEED");
+    const unsigned firstSeed = base ? static_cast<unsigned>(std::atoi(base)) : 1;
+    for (unsigned seed = firstSeed; seed < firstSeed + kSequences; ++seed) {
+        std::vector<Step> steps = randomSteps(seed);
+        if (play(steps).empty())
+            continue;
+        shrink(steps);
+        std::ostringstream sequence;
+        for (const Step& step : steps)
+            sequence << "\n  " << Sequence::kOperations[step.operation].name << ' ' << step.choice;
+        FAIL() << "seed " << seed << " violates at " << play(steps) << "\nin" << sequence.str();
+    }
+}
+
+std::vector<Modes> allModes()
+{
+    std::vector<Modes> modes{{2, 3, false}};
+    for (int graphicsToCL = 1; graphicsToCL <= 3; ++graphicsToCL) {
+        for (int clToGraphics = 1; clToGraphics <= 4; ++clToGraphics)
+            modes.push_back({graphicsToCL, clToGraphics, true});
+    }
+    return modes;
+}
+INSTANTIATE_TEST_SUITE_P(SharedBuffers, SharedBufferInvariants, ::testing::ValuesIn(allModes()),
+                         ::testing::PrintToStringParamName());
+
+} // namespace
