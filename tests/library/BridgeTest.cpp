@@ -39,6 +39,12 @@ TEST(Bridge, PublishesOneBorrowedEvaluator)
     IDeformerEvaluatorBridge::getAPI()->evaluate(em::Id(7));
     EXPECT_EQ(first->lastEvaluation, 7);
 
+    // Modules of the host call by slot: those of the destructor (two in this ABI), then evaluate.
+    using Evaluate = void(IDeformerEvaluatorBridgeAPI*, const em::Id&);
+    Evaluate** slots = *reinterpret_cast<Evaluate***>(IDeformerEvaluatorBridge::getAPI());
+    slots[2](first.get(), em::Id(8));
+    EXPECT_EQ(first->lastEvaluation, 8);
+
     IDeformerEvaluatorBridge::setAPI(&second);
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second);
     EXPECT_FALSE(destroyed) << "the bridge deleted what it only borrowed";
