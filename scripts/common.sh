@@ -10,6 +10,12 @@ fail() {
     exit "${2:-1}"
 }
 
+# Whether a package is installed, or another one that provides it, as in a later release.
+installed() {
+    [[ $(dpkg-query -W -f='${db:Status-Status}' "$1" 2>/dev/null) == installed ]] ||
+        dpkg-query -W -f='${db:Status-Status} ${Provides}\n' | grep -qE "^installed (.*, )?${1//+/\\+}( \(|,|\$)"
+}
+
 # Installs what scripts/packages.txt and the arguments name and the machine lacks. Needs root only then.
 install_packages() {
     local wanted missing=() package
@@ -18,8 +24,7 @@ install_packages() {
     command -v dpkg-query >/dev/null ||
         fail "this machine has no Debian packages; install the counterparts of scripts/packages.txt by hand"
     for package in "${wanted[@]}"; do
-        [[ $(dpkg-query -W -f='${db:Status-Status}' "$package" 2>/dev/null) == installed ]] ||
-            missing+=("$package")
+        installed "$package" || missing+=("$package")
     done
     ((${#missing[@]})) || return 0
 
