@@ -3,18 +3,18 @@
 // that a model of the rules expects. Some OpenCL calls fail.
 #include "FakeRuntime.h"
 
+#include "evaluator/KernelLibrary.h"
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
-#include "viewer/KernelFiles.h"
 
 #include <algorithm>
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <map>
 #include <optional>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -28,7 +28,7 @@ using Kernel = AutoCLObject<cl_kernel>;
 constexpr unsigned kMostSteps = 64;
 // Texts of programs: '*' stands for an argument of their kernels, "#error" does not build.
 const std::string kTexts[] = {"skin(*)", "twist(*)", "skin(*) twist", "skin(**)", "#error skin(*)"};
-const std::string kNames[] = {"skin", "twist"}; // of kernels; the file NAME.cl has a kernel NAME
+const std::string kNames[] = {"skin", "twist"}; // of kernels, and of their files
 const char kLastOption[] = " -D SupportsDoublePrecision";
 const char* const kCalls[] = {"clCreateProgramWithSource", "clBuildProgram", "clCreateKernel"};
 
@@ -110,11 +110,12 @@ cl_int CL_API_CALL kernelInfo(cl_kernel kernel, cl_kernel_info, std::size_t, voi
     return CL_SUCCESS;
 }
 
-const viewer::OpenCLFunctions& functions()
+// A directory with the kernel files.
+const std::string& directory()
 {
-    static viewer::OpenCLFunctions table;
-    table.clGetKernelInfo = kernelInfo;
-    return table;
+    static const QTemporaryDir folder;
+    static const std::string path = folder.path().toStdString();
+    return path;
 }
 
 struct Request {
@@ -151,7 +152,7 @@ public:
             scripted::runtime().clearFaults();
             theLog.read();
             fFailing = fData.ConsumeIntegralInRange<unsigned>(0, 11);
-            if (fFailing < std::size(kCalls))
+            if (fails())
                 scripted::runtime().plan({.function = kCalls[fFailing]});
             switch (fData.ConsumeIntegralInRange(0, 3)) {
             case 0:
@@ -161,7 +162,7 @@ public:
                 giveBack();
                 break;
             case 2:
-                serveFile();
+                useFile();
                 break;
             default:
                 replaceFile();
@@ -171,7 +172,7 @@ public:
         scripted::runtime().clearFaults();
         while (!fHeld.empty())
             giveBack();
-        fFiles.reset();
+        fLibrary.reset();
         dropPrograms();
     }
 
@@ -187,7 +188,15 @@ private:
     };
     struct File {
         std::string text;
-        bool served = false; // a kernel, so that the number of its arguments is known
+        std::set<std::string> functions{}; // that were created
+
+        bool canBecome(const std::string& other) const
+        {
+            return compiles(other) && argumentsOf(other) == argumentsOf(text) &&
+                   std::all_of(functions.begin(), functions.end(), [&](const auto& function) {
+                       return other.find(function) != std::string::npos;
+                   });
+        }
     };
 
     // An option or a directory: often one of a few, so that requests meet again.
@@ -200,6 +209,12 @@ private:
     std::string name() { return fData.PickValueInArray(kNames); }
     static TopenCLKernelStore& store() { return TopenCLInfo::theOne().kernelStore(); }
     bool fails(unsigned call) const { return fFailing == call; }
+    bool fails() const { return fFailing < std::size(kCalls); }
+    // What the library requests for a program.
+    static Request ofLibrary(const std::string& program)
+    {
+        return {program, "", "", "-cl-no-signed-zeros -Werror", {directory()}};
+    }
 
     // Changes one part of the last request, so that requests meet again.
     void changeRequest()
@@ -271,52 +286,50 @@ private:
         fHeld.erase(held);
     }
 
-    void serveFile()
+    // Requests a kernel of a file from the library.
+    void useFile()
     {
-        const std::string kernelName = name();
-        File& file = fTexts.try_emplace(kernelName, File{kernelName + "(*)"}).first->second;
-        const Kernel kernel = fFiles->kernel(kernelName + ".cl", kernelName);
-        theLog.read();
-        require(kernel.get() || fFailing < std::size(kCalls));
-        if (!kernel.get())
+        const std::string fileName = name(), function = name();
+        File& file = fFiles.try_emplace(fileName, File{fileName + "(*)"}).first->second;
+        const vyra::LibraryKernel created = fLibrary->create({fileName, function});
+        const bool served = file.text.find(function) != std::string::npos;
+        require(created.status.ok() == (created.kernel.get() != nullptr));
+        require(created.status.ok() == served || (served && fails()));
+        if (!created.status.ok())
             return;
-        require(theLog.programOf(kernel.get()).text == file.text);
-        require(theLog.programOf(kernel.get()).options == expectedOptions({}));
-        file.served = true;
-        fHeld.push_back({kernel, std::nullopt});
+        theLog.read();
+        const Log::Program& program = theLog.programOf(created.kernel.get());
+        require(program.text == file.text && program.options == expectedOptions(ofLibrary("")));
+        file.functions.insert(function);
+        fHeld.push_back({created.kernel, std::nullopt});
     }
 
     void replaceFile()
     {
-        const std::string kernelName = name(), source = fData.PickValueInArray(kTexts);
-        const auto file = fTexts.find(kernelName);
-        const bool refused = fFiles->replace(kernelName + ".cl", source).has_value();
-        if (file == fTexts.end()) {
-            require(!refused); // a file that was never requested is ignored
-            return;
-        }
-        fReplaced.push_back(kernelName + ".cl, change " + std::to_string(fReplaced.size() + 1));
-        const bool good = compiles(source) && source.find(kernelName) != std::string::npos &&
-                          file->second.served &&
-                          argumentsOf(source) == argumentsOf(file->second.text);
-        require(refused == !good || fFailing < std::size(kCalls));
-        if (!refused)
-            file->second.text = source;
+        const std::string fileName = name(), text = fData.PickValueInArray(kTexts);
+        const bool accepted = fLibrary->replaceFile(fileName, text).ok();
+        fReplaced.push_back(fileName + ", change " + std::to_string(fReplaced.size() + 1));
+        const auto file = fFiles.find(fileName);
+        const bool used = file != fFiles.end() && !file->second.functions.empty();
+        const bool good = !used || file->second.canBecome(text);
+        require(accepted == good || (good && fails()));
+        if (accepted && used)
+            file->second.text = text;
     }
 
     // A program that no kernel could be made of stays in the store until one is given back; every
     // text has the kernel of the empty name.
     void dropPrograms()
     {
-        const auto drop = [](const std::string& program, const std::optional<std::string>& flags) {
-            require(store().freeKernel(send({program, "", "", flags})));
+        const auto drop = [](const Request& request) {
+            require(store().freeKernel(send(request)));
         };
         for (const auto& [key, cached] : fCached)
-            drop(key.first, key.second.substr(0, key.second.rfind(kLastOption)));
+            drop({key.first, "", "", key.second.substr(0, key.second.rfind(kLastOption))});
         for (const std::string& program : fReplaced)
-            drop(program, std::nullopt);
-        for (const auto& [kernelName, file] : fTexts)
-            drop(viewer::KernelFiles::folder() + "/" + kernelName + ".cl", std::nullopt);
+            drop(ofLibrary(program));
+        for (const std::string& fileName : kNames)
+            drop(ofLibrary(directory() + "/" + fileName));
     }
 
     FuzzedDataProvider& fData;
@@ -324,9 +337,11 @@ private:
     Request fRequest;
     std::vector<Held> fHeld;
     std::map<Key, Cached> fCached;
-    std::map<std::string, File> fTexts;
+    std::map<std::string, File> fFiles;
     std::vector<std::string> fReplaced;
-    std::optional<viewer::KernelFiles> fFiles{functions()};
+    vyra::OpenCLFunctions fFunctions{.clGetKernelInfo = kernelInfo};
+    std::optional<vyra::KernelLibrary> fLibrary{std::in_place, fFunctions,
+                                                std::vector{directory()}};
 };
 
 } // namespace
@@ -335,11 +350,8 @@ extern "C" int LLVMFuzzerInitialize(int* /*argumentCount*/, char*** /*arguments*
 {
     scripted::runtime().describe(scripted::World());
     require(TopenCLInfo::initialize(nullptr, nullptr, nullptr, false, false, 0x8086));
-    static const QTemporaryDir resources;
-    TopenCLInfo::theOne().getAbsolutePathToResources() = resources.path().toUtf8().constData();
-    std::filesystem::create_directory(viewer::KernelFiles::folder());
     for (const std::string& name : kNames)
-        std::ofstream(viewer::KernelFiles::folder() + "/" + name + ".cl") << name << "(*)";
+        std::ofstream(directory() + "/" + name) << name << "(*)";
     return 0;
 }
 
