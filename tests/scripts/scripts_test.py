@@ -4,6 +4,7 @@
 """
 import os
 import pathlib
+import re
 import shutil
 import subprocess
 import sys
@@ -106,6 +107,44 @@ class Scripts(unittest.TestCase):
         self.assertRegex(run.stdout, r"did not run:\n\ttests: library.Direct3D \(Skipped\)\n\tclang: ")
         self.assertTrue(run.stdout.endswith(
             "FAILED:\n\tasan: library.Fence (Failed)\n\ttsan (exit code 1)\n\tabi (exit code 1)\n"), run.stdout)
+
+    def test_format_looks_at_what_changed_since_the_branch_point(self):
+        project = self.root / "project"
+        self.stand_in(project / "scripts/tidy", STAND_IN)
+
+        def git(*arguments, date="2024-03-03T12:00:00Z"):
+            subprocess.run(["git", "-c", "user.name=A", "-c", "user.email=a@b.example", *arguments], cwd=project,
+                           env=os.environ | {"GIT_COMMITTER_DATE": date}, check=True, capture_output=True)
+
+        def commit(name, **date):
+            (project / name).touch()
+            git("add", name)
+            git("commit", "-m", name, **date)
+
+        def tidied():
+            self.log.unlink(missing_ok=True)
+            run, calls = self.run_script("format", "--check", "--changed")
+            self.assertEqual(run.returncode, 0, run.stderr)
+            return set(re.findall(r"(\w+)\.cpp", "".join(re.findall("^tidy .*", calls, re.M))))
+
+        (project / "no_repository.cpp").touch()
+        self.assertEqual(tidied(), {"Options", "no_repository"})
+        git("init", "-b", "main")
+        commit("young.cpp")
+        self.assertEqual(tidied(), {"Options", "no_repository", "young"}, "no commit is old enough: all files")
+        git("commit", "--amend", "-m", "old", date="2024-03-01T12:00:00Z")
+        (project / "no_repository.cpp").unlink()
+        (project / "viewer/Options.cpp").unlink()
+        commit("recent.cpp", date="2024-03-03T08:00:00Z")
+        commit("head.cpp")
+        self.assertEqual(tidied(), {"recent", "head"})
+        git("update-ref", "refs/remotes/origin/main", "HEAD")
+        self.assertEqual(tidied(), {"recent", "head"}, "a fresh clone")
+        git("update-ref", "refs/remotes/origin/main", "HEAD~1")
+        (project / "untracked.cpp").touch()
+        self.assertEqual(tidied(), {"head", "untracked"})
+        commit(".clang-tidy")
+        self.assertEqual(tidied(), {"young", "recent", "head", "untracked"}, "other checks: all files")
 
 
 if __name__ == "__main__":
