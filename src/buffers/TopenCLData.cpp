@@ -50,7 +50,9 @@ const TopenCLDataBuffer& TopenCLData::getData(const TuniqueString& name, const T
 void TopenCLData::setData(const TuniqueString& name, const Tplug& plug,
                           const TopenCLDataBuffer& buffer)
 {
-    const auto [entry, inserted] = fMap.emplace(Key(name, plug), buffer);
+    // A finished pair, unlike emplace, has the container make its node last: nothing that can fail
+    // comes after.
+    const auto [entry, inserted] = fMap.insert(Map::value_type(Key(name, plug), buffer));
     if (!inserted)
         entry->second = buffer;
 }
