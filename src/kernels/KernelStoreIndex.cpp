@@ -102,4 +102,5 @@ TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::Index::take(cl_kernel kerne
 void TopenCLKernelStore::Index::forget(const ProgramInfo& program)
 {
     std::erase_if(fRequests, [&](const auto& entry) { return entry.second.program == &program; });
+    std::erase_if(fKernels, [&](const HandedOut& entry) { return entry.program == &program; });
 }

@@ -48,7 +48,7 @@ public:
     // The program of `kernel`, which is known no longer afterwards; null when it is not known.
     ProgramInfo* take(cl_kernel kernel);
 
-    // Every request of the program. It has no kernels any more.
+    // Removes every entry of a program that is about to be dropped.
     void forget(const ProgramInfo& program);
 
 private:

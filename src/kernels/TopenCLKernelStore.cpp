@@ -97,9 +97,10 @@ bool TopenCLKernelStore::freeKernel(const AutoCLObject<cl_kernel>& kernel)
     ProgramInfo* program = fIndex->take(kernel.get());
     if (!program)
         return false;
-    std::erase_if(program->fKernels,
-                  [&](const auto& handedOut) { return handedOut.get() == kernel.get(); });
-    if (program->fKernels.empty()) {
+    // One element: a runtime that returned a handle twice listed it twice.
+    auto& kernels = program->fKernels;
+    kernels.erase(std::ranges::find(kernels, kernel.get(), &AutoCLObject<cl_kernel>::get));
+    if (kernels.empty()) {
         fIndex->forget(*program);
         std::erase_if(fPrograms, [&](const auto& entry) { return &entry.second == program; });
     }

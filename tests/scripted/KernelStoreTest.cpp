@@ -64,6 +64,26 @@ protected:
     std::string fFile;
 };
 
+// A runtime's fault, within one program or across two.
+TEST_F(KernelStoreTest, AHandleReturnedTwiceIsGivenBackTwice)
+{
+    for (const char* secondProgram : {"text", "other"}) {
+        SCOPED_TRACE(secondProgram);
+        const Kernel first = fromText();
+        runtime().scriptNextKernel(first.get());
+        const Kernel second = fromText("skin", "", secondProgram);
+        ASSERT_EQ(second.get(), first.get());
+        builds();
+        EXPECT_TRUE(fStore->freeKernel(first));
+        EXPECT_EQ(runtime().references(Kind::kKernel, first.get()), 3U);
+        EXPECT_TRUE(fStore->freeKernel(second));
+        EXPECT_FALSE(fStore->freeKernel(second));
+        const Kernel third = fromText();
+        EXPECT_EQ(builds(), 1U) << "the program went with its last kernel";
+        EXPECT_TRUE(fStore->freeKernel(third));
+    }
+}
+
 TEST_F(KernelStoreTest, AHitCreatesAnotherKernelOfTheSameProgram)
 {
     const Kernel first = fromText();

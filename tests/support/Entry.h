@@ -96,9 +96,10 @@ public:
     {
         return fRuntime.fCommands.isPending(event.command);
     }
-    // The result that a test has scripted for the next creation from a renderer's buffer, or for
-    // the next wait of an OpenGL client.
+    // The result that a test has scripted for the next creation from a renderer's buffer, of a
+    // kernel, or for the next wait of an OpenGL client.
     std::optional<cl_mem> nextSharedMem() { return std::exchange(fRuntime.fNextSharedMem, {}); }
+    cl_kernel nextKernel() { return std::exchange(fRuntime.fNextKernel, nullptr); }
     unsigned nextClientWait();
     void rememberNotify(ContextNotify notify) { fRuntime.fNotify = notify; }
     // Ends a query.

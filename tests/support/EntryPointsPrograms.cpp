@@ -84,6 +84,10 @@ cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
     call.require(!object || object->built, CL_INVALID_PROGRAM_EXECUTABLE, "not built");
     if (call.ok() && object && object->source.find(name) == std::string::npos)
         call.answerWith(CL_INVALID_KERNEL_NAME);
+    if (const cl_kernel scripted = call.nextKernel()) {
+        call.retain(Kind::kKernel, scripted);
+        return call.result(scripted, error);
+    }
     const auto kernel = call.create<cl_kernel>(Kind::kKernel);
     if (kernel && object)
         call.object(Kind::kKernel, kernel)->arguments = argumentsOf(name, object->source);

@@ -87,6 +87,8 @@ public:
     // The next creation from a renderer's buffer returns this memory object, with one more
     // reference; null: it returns null, with success.
     void scriptNextSharedMem(cl_mem mem) { fNextSharedMem = mem; }
+    // The next clCreateKernel returns this living kernel, with one more reference.
+    void scriptNextKernel(cl_kernel kernel) { fNextKernel = kernel; }
 
     // Calls what was given to clCreateContext for errors.
     void raiseContextError(const char* text) { fNotify(text, nullptr, 0, nullptr); }
@@ -121,6 +123,7 @@ private:
     std::deque<unsigned> fClientWaits;
     ContextNotify fNotify = nullptr;
     std::optional<cl_mem> fNextSharedMem;
+    cl_kernel fNextKernel = nullptr;
 };
 
 // The process's one.
