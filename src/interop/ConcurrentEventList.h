@@ -35,20 +35,21 @@ public:
         slot.isWritten.store(true, std::memory_order_release);
     }
 
-    // Hands each event to `use`, in order.
+    // Calls `use` with each event, in order.
     template <typename Use>
     void forEach(const Use& use) const
     {
-        const std::size_t size = fSize.load(std::memory_order_acquire);
-        for (std::size_t index = 0; index < size; ++index)
-            use(written(index));
+        forFirst(fSize.load(std::memory_order_acquire), use);
     }
 
-    // Replaces the contents of `events` by the events appended so far, in order.
+    // Replaces the contents of `events` by the events appended so far, in order. Running out of
+    // memory raises std::bad_alloc and leaves `events` empty.
     void copyTo(std::vector<cl_event>& events) const
     {
+        const std::size_t size = fSize.load(std::memory_order_acquire);
         events.clear();
-        forEach([&](cl_event event) { events.push_back(event); });
+        events.reserve(size);
+        forFirst(size, [&](cl_event event) { events.push_back(event); });
     }
 
     // Keeps the storage and releases nothing.
@@ -57,6 +58,10 @@ public:
         const std::size_t size = fSize.exchange(0);
         for (std::size_t index = 0; index < size; ++index)
             fSlots[index].isWritten.store(false, std::memory_order_relaxed);
+        if (!canGrow()) {
+            tbb::concurrent_vector<Slot>().swap(fSlots);
+            fSlotCount = 0;
+        }
     }
 
 private:
@@ -68,14 +73,24 @@ private:
     // More than the deformers of most scenes report in one evaluation; a longer list grows.
     static constexpr std::size_t kReservedEvents = 100;
 
+    template <typename Use>
+    void forFirst(std::size_t count, const Use& use) const
+    {
+        for (std::size_t index = 0; index < count; ++index)
+            use(written(index));
+    }
+
+    // A growth that ran out of memory half way leaves a vector that cannot grow past that; clear
+    // replaces it.
+    bool canGrow() const { return fSlots.size() == fSlotCount; }
+
     // Makes the slot at `index`, and as many again, unless another thread was faster.
     void grow(std::size_t index)
     {
         const std::scoped_lock lock(fGrowth);
         if (index < fSlotCount)
             return;
-        // A growth that ran out of memory half way leaves a vector that cannot grow past that.
-        if (fSlots.size() != fSlotCount)
+        if (!canGrow())
             throw std::bad_alloc();
         fSlots.grow_to_at_least(std::max(2 * index, kReservedEvents));
         fSlotCount.store(fSlots.size(), std::memory_order_release);

@@ -9,6 +9,8 @@
 #include "runtime/InteropFunctions.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <new>
+
 namespace {
 
 bool acquiresWaitForFence()
@@ -19,6 +21,33 @@ bool acquiresWaitForFence()
 bool graphicsWaitsForSyncObjects()
 {
     return TopenCLInfo::theOne().clToGraphicsSyncMode() == TopenCLInfo::kCLToGraphicsSyncObject;
+}
+
+// Appends `event` with a reference of the list's own, which ReleaseBufferBatch pays back. When the
+// list cannot grow, raises std::bad_alloc and keeps no reference.
+void appendOwned(ConcurrentEventList& list, cl_event event)
+{
+    retainCLObject(event);
+    try {
+        list.append(event);
+    } catch (...) {
+        releaseCLObject(event);
+        throw;
+    }
+}
+
+// Appends `event`; when the list cannot grow, waits for the event instead: what the list is read
+// for then needs no wait. For an event whose command cannot be taken back any more. Returns whether
+// it is in the list.
+bool appendOrWait(ConcurrentEventList& list, cl_event event)
+{
+    try {
+        list.append(event);
+        return true;
+    } catch (const std::bad_alloc&) {
+        reportFailure(ocl.clWaitForEvents(1, &event));
+        return false;
+    }
 }
 
 } // namespace
@@ -33,34 +62,35 @@ void TopenCLSharedBufferMgr::PreEvaluate(const em::Id& id)
 
     if (fBatchDirty)
         UpdateBufferBatch();
-    fEvaluationId = id.value();
     fReleaseEvent.reset();
     if (!fBatch.empty())
         AcquireBatch();
+    fEvaluationId = id.value();
 }
 
 void TopenCLSharedBufferMgr::AcquireBatch()
 {
     const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
-    fBatchAcquired = true;
     if (acquiresWaitForFence())
         WaitForGraphicsFence();
 
+    // From here on nothing is thrown: the release that goes with the acquire is still to come.
+    fBatchAcquired = true;
     const cl_int status = sfEnqueueAcquireSharedObjects(queue, static_cast<cl_uint>(fBatch.size()),
                                                         bareHandles(fBatch.data()), 0, nullptr,
                                                         fAcquireEvent.receive());
-    if (const cl_event acquired = fAcquireEvent.get()) {
-        fImpl->fReleaseWaitEvents.append(acquired);
+    const cl_event acquired = fAcquireEvent.get();
+    if (acquired && appendOrWait(fImpl->fReleaseWaitEvents, acquired))
         ocl.clRetainEvent(acquired); // the list's reference, paid back by ReleaseBufferBatch
-    }
     reportFailure(status);
 }
 
-// Makes the batch anew from the records, in the order of their handles. Takes no lock.
+// Rebuilds the batch from the records, in the order of their handles. Takes no lock. Running out of
+// memory raises std::bad_alloc and leaves the batch as it was.
 void TopenCLSharedBufferMgr::UpdateBufferBatch()
 {
-    fBatch.clear();
     fBatch.reserve(fBuffers.size());
+    fBatch.clear();
     for (auto& [memory, record] : fBuffers) {
         fBatch.push_back(record.fMem);
         record.fInBatch = true;
@@ -90,10 +120,8 @@ const cl_event* TopenCLSharedBufferMgr::EnqueueReleaseBatchedSharedCLBuffer(unsi
 {
     // While nothing is batched no release would ever pay the references back.
     if (fBatchingEnabled && events) {
-        for (unsigned int index = 0; index < numEvents; ++index) {
-            retainCLObject(events[index]); // paid back by ReleaseBufferBatch
-            fImpl->fReleaseWaitEvents.append(events[index]);
-        }
+        for (unsigned int index = 0; index < numEvents; ++index)
+            appendOwned(fImpl->fReleaseWaitEvents, events[index]);
     }
     return bareHandles(&fReleaseEvent);
 }
@@ -108,7 +136,7 @@ int TopenCLSharedBufferMgr::EnqueueReleaseSharedCLBuffer(cl_command_queue queue,
         sfEnqueueReleaseSharedObjects(queue, numMemObjects, memObjects, numEvents, waitList, event);
     if (fBatchingEnabled && status == CL_SUCCESS && event && *event &&
         graphicsWaitsForSyncObjects())
-        fImpl->fGraphicsWaitEvents.append(*event);
+        appendOrWait(fImpl->fGraphicsWaitEvents, *event);
     return status;
 }
 
@@ -126,8 +154,13 @@ void TopenCLSharedBufferMgr::PostEvaluate(const em::Id& /*id*/)
         fImpl->fGraphicsWaitEvents.forEach(GraphicsWaitForCLEvent);
     }
     fImpl->fGraphicsWaitEvents.clear();
-    if (fBatchDirty)
+    if (!fBatchDirty)
+        return;
+    try {
         UpdateBufferBatch();
+    } catch (const std::bad_alloc&) {
+        // The batch stays dirty, so that the next PreEvaluate rebuilds it.
+    }
 }
 
 void TopenCLSharedBufferMgr::ReleaseBufferBatch()
@@ -136,18 +169,13 @@ void TopenCLSharedBufferMgr::ReleaseBufferBatch()
         return;
     if (!fBatch.empty()) {
         const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
-        // The references move with the events from the list to its contiguous copy.
-        std::vector<cl_event>& waitList = fImpl->fWaitListScratch;
-        fImpl->fReleaseWaitEvents.copyTo(waitList);
-        fImpl->fReleaseWaitEvents.clear();
-
+        const std::vector<cl_event>& waitList = fImpl->releaseWaitList();
         reportFailure(sfEnqueueReleaseSharedObjects(
             queue, static_cast<cl_uint>(fBatch.size()), bareHandles(fBatch.data()),
             static_cast<cl_uint>(waitList.size()), waitList.empty() ? nullptr : waitList.data(),
             fReleaseEvent.receive()));
-        for (const cl_event event : waitList)
-            releaseCLObject(event);
-        waitList.clear();
+        fImpl->fReleaseWaitEvents.forEach([](cl_event event) { releaseCLObject(event); });
+        fImpl->fReleaseWaitEvents.clear();
     }
     fBatchAcquired = false;
 }

@@ -13,6 +13,10 @@
 inline constexpr std::uint16_t kNoEvaluation = 0xFFFE;
 
 struct TopenCLSharedBufferMgrImpl {
+    // The events that the next batch release waits for, as one array that is valid until the next
+    // call. Without memory for the array, waits for each event instead, and the array is empty.
+    const std::vector<cl_event>& releaseWaitList();
+
     // What the next batch release waits for. Each entry owns a reference.
     ConcurrentEventList fReleaseWaitEvents;
     // A contiguous copy of it, made for one release.

@@ -136,9 +136,7 @@ void TopenCLSharedBufferMgr::LeaveBatch(const TopenCLSharedBuffer& record)
 // The events stay listed, since the rest of the batch waits for them too.
 void TopenCLSharedBufferMgr::ReleaseAlone(const TopenCLSharedBuffer& record)
 {
-    std::vector<cl_event>& waitList = fImpl->fWaitListScratch;
-    fImpl->fReleaseWaitEvents.copyTo(waitList);
-
+    const std::vector<cl_event>& waitList = fImpl->releaseWaitList();
     AutoCLObject<cl_event> released;
     reportFailure(sfEnqueueReleaseSharedObjects(
         TopenCLInfo::theOne().openCLCommandQueue(), 1, bareHandles(&record.fMem),

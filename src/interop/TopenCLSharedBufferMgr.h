@@ -35,8 +35,12 @@ struct TopenCLSharedBufferMgrImpl;
 //
 // PreEvaluate and PostEvaluate come in pairs and overlap with no other operation of the manager. At
 // any other time the create and destroy operations, and between the two the acquire and release
-// operations, may be called from several threads. RenderingComplete belongs to the renderer's
-// thread, its OpenGL context current.
+// operations, may be called from several threads. RenderingComplete is called between evaluations,
+// on the renderer's thread with its OpenGL context current.
+//
+// Running out of memory raises std::bad_alloc in CreateSharedCLBuffer, PreEvaluate and
+// EnqueueReleaseBatchedSharedCLBuffer, and leaks nothing. An operation that has enqueued a command
+// already waits for events instead of listing them, and does not throw.
 //
 // With VYRA_OPENCL_FORCE_THREADING set, nothing is batched: each buffer is acquired and released on
 // its own.
@@ -65,9 +69,10 @@ public:
     // own, after all events handed over so far, and the call waits for that. Always 0.
     int DestroyBatchedSharedCLBuffer(const TopenCLSharedBuffer* buffer);
 
-    // Opens the evaluation `id`: brings the batch up to date, waits for the renderer's fence where
-    // the mode asks for it, and enqueues one acquire of the batch on the primary queue. Does
-    // nothing more when that evaluation is open already.
+    // Opens the evaluation `id`: brings the batch up to date, waits for the renderer's fence if the
+    // mode requires it, and enqueues one acquire of the batch on the primary queue. Does nothing if
+    // that evaluation is open already. If it throws, no evaluation is open and it can be tried
+    // again.
     void PreEvaluate(const em::Id& id);
 
     // Closes the evaluation: one release of the batch, after all events handed over; in the
@@ -85,7 +90,8 @@ public:
     // Makes the batch's release wait for `events`, each retained here. Returns the address at which
     // the event of the batch's release stands from PostEvaluate to the next PreEvaluate (null
     // otherwise); it stays valid for the manager's life. While nothing is batched the events stay
-    // the caller's.
+    // the caller's. If it throws, the events from the one that could not be listed on stay the
+    // caller's.
     const cl_event* EnqueueReleaseBatchedSharedCLBuffer(unsigned int numEvents,
                                                         const cl_event* events);
 
@@ -96,8 +102,10 @@ public:
                                      const cl_mem* memObjects, unsigned int numEvents,
                                      const cl_event* waitList, cl_event* event);
 
-    // Called after the renderer has drawn. Sets the fence that the next acquire waits for, where
-    // the mode asks for it.
+    // Called after the renderer has drawn. If the mode requires it, replaces the fence that the
+    // next acquire waits for. Must not overlap an acquire (PreEvaluate or
+    // EnqueueAcquireSharedCLBuffer on any thread), which would find no fence while it is replaced
+    // and would not wait for the drawing.
     void RenderingComplete();
 
 private:

@@ -255,6 +255,24 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
     EXPECT_EQ(callsOf("gl"), Lines{}) << "each fence is waited for once";
 }
 
+TEST_F(SharedBufferTest, PreEvaluateThatThrowsInTheFenceWaitOpensNothing)
+{
+    startWithBuffer(2, 1);
+    const ResourceWindow window;
+    for (const bool hostCloses : {false, true}) {
+        calls();
+        host().makeCurrentThrows = true;
+        EXPECT_THROW(manager().PreEvaluate(kId), std::bad_alloc);
+        host().makeCurrentThrows = false;
+        if (hostCloses)
+            manager().PostEvaluate(kId);
+        EXPECT_EQ(callsOf("clEnqueue"), Lines{});
+        manager().PreEvaluate(kId);
+        EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "tried again";
+        manager().PostEvaluate(kId);
+    }
+}
+
 TEST_F(SharedBufferTest, AFenceOutlastsATimeInWhichSyncObjectsCannotBeUsed)
 {
     const auto* buffer = startWithBuffer(2, 1);

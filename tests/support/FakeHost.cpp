@@ -9,6 +9,7 @@
 
 #include <cstdint>
 #include <cstdlib>
+#include <new>
 #include <sstream>
 #include <string>
 
@@ -121,6 +122,8 @@ QOpenGLWindow* Q3dPort::resourceWindow()
 void QOpenGLWindow::makeCurrent()
 {
     log("makeCurrent()");
+    if (host().makeCurrentThrows)
+        throw std::bad_alloc();
 }
 
 bool profiler::samplingActive()
