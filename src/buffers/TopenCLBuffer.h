@@ -51,7 +51,8 @@ public:
     int ensureBufferCapacity(std::size_t bytes);
 
     // Writes `size` bytes from `hostPtr` at `offset`, after the events of `waitList`; the write's
-    // event becomes the ready event. A buffer that is too small waits for `waitList` and grows
+    // event becomes the ready event. The buffer's own former ready event is released before the
+    // write is enqueued: if `waitList` has it, another holder must keep it alive. A buffer that is too small waits for `waitList` and grows
     // first: at offset 0 the memory is created with the data in it and no event remains; at another
     // offset the bytes before it are undefined. 0 bytes are always fine; otherwise a read-only
     // buffer gives CL_INVALID_OPERATION (-59). Wraps clEnqueueWriteBuffer.
@@ -60,7 +61,8 @@ public:
                         const cl_event* waitList);
 
     // Reads `size` bytes at `offset` into `hostPtr`, after the events of `waitList`; the read's
-    // event becomes the ready event. Nothing is checked here. Wraps clEnqueueReadBuffer.
+    // event becomes the ready event. The former ready event is released first, as in
+    // uploadDataToGPU. Neither capacity nor permissions are checked. Wraps clEnqueueReadBuffer.
     int readBackDataFromGPU(cl_command_queue queue, cl_uint blocking, std::size_t offset,
                             std::size_t size, void* hostPtr, cl_uint numEvents,
                             const cl_event* waitList);

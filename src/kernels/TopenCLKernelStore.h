@@ -24,8 +24,9 @@ class TstringArray;
 // Programs from files (named by their path) and from source texts share one cache; the text itself
 // is not part of the key. Any number of threads may call; they take turns, and a turn that misses
 // the cache lasts for the reading of a file and a whole build. Failing OpenCL calls are reported as
-// warnings and give an empty result; a failed build also hands its log to the warning sink. Nothing
-// that failed is remembered.
+// warnings and give an empty result; a failed build also passes its log to the warning sink. A file
+// that cannot be read and a program that does not build are not cached: the next request tries
+// again. A program that builds stays cached even if it has no kernel of the requested name.
 class VYRA_OPENCL_API TopenCLKernelStore {
 public:
     TopenCLKernelStore();
