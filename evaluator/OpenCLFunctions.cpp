@@ -1,5 +1,7 @@
 #include "evaluator/OpenCLFunctions.h"
 
+#include "loader/OpenCLLibraryName.h"
+
 #include <optional>
 
 #if defined(_WIN32)
@@ -15,7 +17,7 @@ namespace {
 
 void* openLibrary()
 {
-    return LoadLibraryA("OpenCL.dll");
+    return LoadLibraryA(kOpenCLLibraryName);
 }
 
 void* findFunction(void* library, const char* name)
@@ -27,7 +29,7 @@ void* findFunction(void* library, const char* name)
 
 void* openLibrary()
 {
-    return dlopen("libOpenCL.so.1", RTLD_NOW | RTLD_LOCAL);
+    return dlopen(kOpenCLLibraryName, RTLD_NOW | RTLD_LOCAL);
 }
 
 void* findFunction(void* library, const char* name)

@@ -9,9 +9,6 @@ namespace vyra::host {
 // library or it has no such symbol. Loads nothing.
 void* symbolOfLoadedLibrary(const char* name, const char* symbol);
 
-// The file name of the OpenCL library.
-extern const char* const openCLLibrary;
-
 // The file that this library was loaded from, links resolved; empty when the loader can't tell.
 std::filesystem::path fileOfThisLibrary();
 

@@ -6,8 +6,6 @@
 
 namespace vyra::host {
 
-const char* const openCLLibrary = "libOpenCL.so.1";
-
 void* symbolOfLoadedLibrary(const char* name, const char* symbol)
 {
     void* const library = dlopen(name, RTLD_NOLOAD | RTLD_LAZY);

@@ -7,8 +7,6 @@
 
 namespace vyra::host {
 
-const char* const openCLLibrary = "OpenCL.dll";
-
 void* symbolOfLoadedLibrary(const char* name, const char* symbol)
 {
     const HMODULE library = GetModuleHandleA(name);

@@ -1,5 +1,6 @@
 #include "standalone/SyncFunctions.h"
 
+#include "loader/OpenCLLibraryName.h"
 #include "standalone/Platform.h"
 
 #include <QOpenGLContext>
@@ -55,8 +56,8 @@ bool waitForCLEvent(cl_event event)
 {
     using WaitForEvents = cl_int(CL_API_CALL*)(cl_uint, const cl_event*);
     // The application decides which OpenCL is loaded, if any; an event comes from that one.
-    static const auto waitForEvents =
-        reinterpret_cast<WaitForEvents>(symbolOfLoadedLibrary(openCLLibrary, "clWaitForEvents"));
+    static const auto waitForEvents = reinterpret_cast<WaitForEvents>(
+        symbolOfLoadedLibrary(kOpenCLLibraryName, "clWaitForEvents"));
     if (waitForEvents == nullptr || event == nullptr) {
         return false;
     }

@@ -1,5 +1,6 @@
 #include "tools/OpenCLCalls.h"
 
+#include "loader/OpenCLLibraryName.h"
 #include "loader/SharedLibrary.h"
 
 namespace info {
@@ -16,7 +17,7 @@ void resolve(void* library, const char* name, Function& function)
 OpenCLCalls findOpenCLCalls()
 {
     OpenCLCalls calls;
-    void* library = openSharedLibrary("libOpenCL.so.1");
+    void* library = openSharedLibrary(kOpenCLLibraryName);
     if (!library)
         return calls;
     resolve(library, "clGetDeviceIDs", calls.clGetDeviceIDs);

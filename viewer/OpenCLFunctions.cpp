@@ -1,12 +1,11 @@
 #include "viewer/OpenCLFunctions.h"
 
+#include "loader/OpenCLLibraryName.h"
+
 #include <QLibrary>
 
 namespace viewer {
 namespace {
-
-// libOpenCL.so.1; Windows' OpenCL.dll has no version.
-constexpr int kLoaderVersion = 1;
 
 template <typename Function>
 bool resolve(QLibrary& library, const char* name, Function& function)
@@ -26,7 +25,7 @@ bool resolveAll(QLibrary& library, OpenCLFunctions& cl)
 
 Result<OpenCLFunctions> loadOpenCLFunctions()
 {
-    QLibrary library("OpenCL", kLoaderVersion);
+    QLibrary library(kOpenCLLibraryName);
     OpenCLFunctions cl;
     if (!library.load() || !resolveAll(library, cl))
         return Failure{ExitCode::kNoOpenCL,

@@ -1,16 +1,11 @@
 #include "loader/OpenCLLoader.h"
 
+#include "loader/OpenCLLibraryName.h"
 #include "loader/SharedLibrary.h"
 
 constinit OpenCLEntryPoints ocl;
 
 namespace {
-
-#if defined(_WIN32)
-constexpr const char* kSystemLibrary = "OpenCL.dll";
-#else
-constexpr const char* kSystemLibrary = "libOpenCL.so.1";
-#endif
 
 // Fills `entry` and returns whether it was found.
 template <typename Function>
@@ -27,7 +22,7 @@ bool resolve(void* library, const char* name, Function& entry)
 
 OpenCLLoadStatus loadOpenCL()
 {
-    void* library = openSharedLibrary(kSystemLibrary);
+    void* library = openSharedLibrary(kOpenCLLibraryName);
     if (!library)
         return OpenCLLoadStatus::kNoLibrary;
 
