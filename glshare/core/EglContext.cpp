@@ -17,13 +17,17 @@ void* resolveGl(const char* name)
 
 class EglContext final : public GlContext {
 public:
-    EglContext(EGLDisplay display, EGLContext context, EGLenum api)
-        : display_(display), context_(context), api_(api)
-    {
-    }
+    // Owns no context yet.
+    EglContext(EGLDisplay display, EGLenum api) : display_(display), api_(api) {}
 
     // After the application's eglTerminate this is refused with an error, which is fine.
-    ~EglContext() override { egl().destroyContext(display_, context_); }
+    ~EglContext() override
+    {
+        if (context_ != EGL_NO_CONTEXT)
+            egl().destroyContext(display_, context_);
+    }
+
+    void own(EGLContext context) { context_ = context; }
 
     bool makeCurrent() override
     {
@@ -45,7 +49,7 @@ public:
 
 private:
     EGLDisplay display_;
-    EGLContext context_;
+    EGLContext context_ = EGL_NO_CONTEXT;
     EGLenum api_;
 };
 
@@ -79,6 +83,7 @@ std::unique_ptr<GlContext> createEglContext(void* display, void* shareContext)
     EGLint type = 0;
     egl().queryContext(display, shareContext, EGL_CONTEXT_CLIENT_TYPE, &type);
     const auto api = static_cast<EGLenum>(type);
+    auto result = std::make_unique<EglContext>(display, api);
 
     // Only contexts of one client interface share. 3.3 and ES 3.0 are the oldest that have all we
     // call.
@@ -92,7 +97,8 @@ std::unique_ptr<GlContext> createEglContext(void* display, void* shareContext)
     egl().bindApi(before);
     if (context == EGL_NO_CONTEXT)
         return nullptr;
-    return std::make_unique<EglContext>(display, context, api);
+    result->own(context);
+    return result;
 }
 
 } // namespace glshare

@@ -12,6 +12,7 @@
 #include <functional>
 #include <map>
 #include <mutex>
+#include <new>
 #include <span>
 #include <utility>
 #include <vector>
@@ -39,7 +40,7 @@ public:
     void destroy(Display* display, GLXContext context);
 
     // For a context that is left behind: remembers it, so that it does not look lost.
-    void keep(GLXContext context);
+    void keep(GLXContext context) noexcept;
 
 private:
     // Xlib's hook: runs in XCloseDisplay, before GLX's own, since the newest extension comes first.
@@ -84,10 +85,14 @@ void OpenDisplays::destroy(Display* display, GLXContext context)
     glx().destroyContext(display, context);
 }
 
-void OpenDisplays::keep(GLXContext context)
+void OpenDisplays::keep(GLXContext context) noexcept
 {
     const std::scoped_lock lock(mutex_);
-    kept_.push_back(context);
+    try {
+        kept_.push_back(context);
+    } catch (const std::bad_alloc&) {
+        // It looks lost, and nothing else follows from that.
+    }
 }
 
 int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
@@ -106,13 +111,16 @@ int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
 
 class GlxContext final : public GlContext {
 public:
-    GlxContext(Display* display, GLXContext context) : display_(display), context_(context) {}
+    // Owns no context yet.
+    explicit GlxContext(Display* display) : display_(display) { openDisplays().open(display); }
 
     ~GlxContext() override
     {
         if (context_ != nullptr)
             openDisplays().destroy(display_, context_);
     }
+
+    void own(GLXContext context) { context_ = context; }
 
     bool makeCurrent() override
     {
@@ -134,7 +142,7 @@ public:
 
 private:
     Display* display_;
-    GLXContext context_;
+    GLXContext context_ = nullptr;
 };
 
 // Xlib ends the process on an error that nobody handles, and has one handler for all threads. This
@@ -209,11 +217,12 @@ std::unique_ptr<GlContext> createGlxContext(void* display, void* shareContext)
     GLXFBConfig config = configOf(x, share);
     if (config == nullptr)
         return nullptr;
+    auto result = std::make_unique<GlxContext>(x);
     GLXContext context = glx().createContextAttribs(x, config, share, True, attributes.data());
     if (context == nullptr)
         return nullptr;
-    openDisplays().open(x);
-    return std::make_unique<GlxContext>(x, context);
+    result->own(context);
+    return result;
 }
 
 } // namespace glshare

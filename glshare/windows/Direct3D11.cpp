@@ -2,12 +2,14 @@
 
 #include "core/Answer.h"
 #include "core/Devices.h"
+#include "entry/EntryPoint.h"
 #include "entry/EntryPoints.h"
 #include "windows/Direct3D11Buffer.h"
 
 #include <algorithm>
 #include <array>
 #include <cstdlib>
+#include <exception>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -67,6 +69,20 @@ void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
     records.buffers.erase(memory);
 }
 
+// Of a new object, which goes if there is no memory for its record.
+void addRecord(cl_mem memory, Direct3D11Buffer buffer)
+{
+    try {
+        auto record = std::make_shared<SharedRecord>(SharedRecord{std::move(buffer)});
+        const std::scoped_lock lock(Records::get().mutex);
+        Records::get().buffers[memory] = std::move(record);
+    } catch (...) {
+        runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
+        throw;
+    }
+    runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
+}
+
 cl_mem CL_API_CALL createFromBuffer(cl_context context, cl_mem_flags flags, ID3D11Buffer* resource,
                                     cl_int* error)
 {
@@ -83,11 +99,8 @@ cl_mem CL_API_CALL createFromBuffer(cl_context context, cl_mem_flags flags, ID3D
     cl_mem memory = nullptr;
     if (buffer)
         memory = runtime().clCreateBuffer(context, flags, buffer->size(), nullptr, &result);
-    if (memory != nullptr) {
-        const std::scoped_lock lock(records.mutex);
-        records.buffers[memory] = std::make_shared<SharedRecord>(SharedRecord{std::move(*buffer)});
-        runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
-    }
+    if (memory != nullptr)
+        addRecord(memory, std::move(*buffer));
     setError(error, result);
     return memory;
 }
@@ -146,15 +159,22 @@ template <bool acquired>
 cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* memory,
                            cl_uint waitCount, const cl_event* waitList, cl_event* event)
 {
-    if ((count == 0) != (memory == nullptr))
+    if (!isList(count, memory))
         return CL_INVALID_VALUE;
+    if (!isList(waitCount, waitList))
+        return CL_INVALID_EVENT_WAIT_LIST;
     const std::span objects(memory, count);
     std::vector<std::shared_ptr<SharedRecord>> records;
     if (const cl_int error = mark(objects, acquired, records); error != CL_SUCCESS)
         return error;
-    cl_int error = copyAll(queue, objects, records, {waitList, waitCount}, acquired);
-    if (error == CL_SUCCESS)
-        error = runtime().clEnqueueMarkerWithWaitList(queue, 0, nullptr, event);
+    cl_int error = CL_OUT_OF_HOST_MEMORY;
+    try {
+        error = copyAll(queue, objects, records, {waitList, waitCount}, acquired);
+        if (error == CL_SUCCESS)
+            error = runtime().clEnqueueMarkerWithWaitList(queue, 0, nullptr, event);
+    } catch (const std::exception&) {
+        // As any other failure of the command.
+    }
     if (error != CL_SUCCESS) {
         const std::scoped_lock lock(Records::get().mutex);
         for (const auto& record : records)
@@ -190,8 +210,13 @@ cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl
     Records& records = Records::get();
     const std::scoped_lock lock(records.mutex);
     records.devices.erase(context);
-    if (context != nullptr && device != nullptr)
-        records.devices[context] = device;
+    try {
+        if (context != nullptr && device != nullptr)
+            records.devices[context] = device;
+    } catch (...) {
+        inFront.clReleaseContext(context); // the one reference, which nobody has seen
+        throw;
+    }
     return context;
 }
 
@@ -225,18 +250,21 @@ void installDirect3D11(cl_icd_dispatch& table)
         return;
     addExtension(suffix() == "NV" ? "cl_nv_d3d11_sharing" : "cl_khr_d3d11_sharing");
     inFront = table;
-    table.clCreateContext = createContext;
-    table.clGetExtensionFunctionAddress = findFunction;
-    table.clGetExtensionFunctionAddressForPlatform = findFunctionForPlatform;
+    table.clCreateContext = entryPoint<createContext>;
+    table.clGetExtensionFunctionAddress = entryPoint<findFunction>;
+    table.clGetExtensionFunctionAddressForPlatform = entryPoint<findFunctionForPlatform>;
 }
 
 void* findDirect3D11Function(std::string_view name)
 {
     const std::array<std::pair<std::string, void*>, 4> functions{{
-        {"clGetDeviceIDsFromD3D11" + suffix(), reinterpret_cast<void*>(getDeviceIds)},
-        {"clCreateFromD3D11Buffer" + suffix(), reinterpret_cast<void*>(createFromBuffer)},
-        {"clEnqueueAcquireD3D11Objects" + suffix(), reinterpret_cast<void*>(enqueue<true>)},
-        {"clEnqueueReleaseD3D11Objects" + suffix(), reinterpret_cast<void*>(enqueue<false>)},
+        {"clGetDeviceIDsFromD3D11" + suffix(), reinterpret_cast<void*>(entryPoint<getDeviceIds>)},
+        {"clCreateFromD3D11Buffer" + suffix(),
+         reinterpret_cast<void*>(entryPoint<createFromBuffer>)},
+        {"clEnqueueAcquireD3D11Objects" + suffix(),
+         reinterpret_cast<void*>(entryPoint<enqueue<true>>)},
+        {"clEnqueueReleaseD3D11Objects" + suffix(),
+         reinterpret_cast<void*>(entryPoint<enqueue<false>>)},
     }};
     for (const auto& [ownName, address] : functions) {
         if (ownName == name)

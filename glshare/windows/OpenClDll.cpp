@@ -2,10 +2,13 @@
 // OpenCL.dll that a program finds beside itself. It passes everything on to the system's, with our
 // functions in front.
 #include "core/Switches.h"
+#include "entry/EntryPoint.h"
 #include "entry/EntryPoints.h"
 #include "windows/Direct3D11.h"
 #include "windows/Functions.h"
 #include "windows/SystemOpenCl.h"
+
+#include <exception>
 
 namespace glshare {
 
@@ -37,7 +40,11 @@ template <typename Result, typename... Arguments,
 struct Forward<member> {
     static Result CL_API_CALL call(Arguments... arguments)
     {
-        return (table().*member)(arguments...);
+        try {
+            return (table().*member)(arguments...);
+        } catch (const std::exception&) { // no memory for the table
+            return failWith<Result>(CL_OUT_OF_HOST_MEMORY, arguments...);
+        }
     }
 };
 

@@ -1,6 +1,7 @@
 #include "windows/SystemOpenCl.h"
 
 #include "core/LibraryFunctions.h"
+#include "entry/EntryPoint.h"
 #include "windows/Functions.h"
 
 #include <map>
@@ -50,9 +51,9 @@ void CALLBACK waitAndTell(PTP_CALLBACK_INSTANCE /*instance*/, void* argument)
 cl_int CL_API_CALL setEventCallback(cl_event event, cl_int /*status*/, EventNotify notify,
                                     void* user)
 {
+    auto callback = std::make_unique<EventCallback>(EventCallback{event, notify, user});
     if (const cl_int error = theSystem.clRetainEvent(event); error != CL_SUCCESS)
         return error;
-    auto callback = std::make_unique<EventCallback>(EventCallback{event, notify, user});
     if (!TrySubmitThreadpoolCallback(waitAndTell, callback.get(), nullptr)) {
         theSystem.clReleaseEvent(event);
         return CL_OUT_OF_RESOURCES;
@@ -111,8 +112,8 @@ cl_icd_dispatch loadSystemOpenCl()
     GLSHARE_FUNCTIONS(GLSHARE_FIND)
 #undef GLSHARE_FIND
     cl_icd_dispatch repaired = theSystem;
-    repaired.clSetEventCallback = setEventCallback;
-    repaired.clSetMemObjectDestructorCallback = setDestructorCallback;
+    repaired.clSetEventCallback = entryPoint<setEventCallback>;
+    repaired.clSetMemObjectDestructorCallback = entryPoint<setDestructorCallback>;
     repaired.clReleaseMemObject = releaseMemory;
     return repaired;
 }
