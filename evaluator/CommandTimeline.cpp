@@ -1,6 +1,7 @@
 #include "evaluator/CommandTimeline.h"
 
 #include <limits>
+#include <new>
 #include <utility>
 
 namespace vyra {
@@ -33,8 +34,13 @@ CommandTimeline::CommandTimeline(const OpenCLFunctions& cl, cl_command_queue que
 
 void CommandTimeline::add(const char* name, const AutoCLObject<cl_event>& event)
 {
-    if (event.get())
+    if (!event.get())
+        return;
+    try {
         fCommands.push_back({name, event});
+    } catch (const std::bad_alloc&) {
+        // The trace lacks a command; the evaluation goes on.
+    }
 }
 
 void CommandTimeline::record()

@@ -22,7 +22,7 @@ public:
     CommandTimeline(const OpenCLFunctions& cl, cl_command_queue queue, std::string track,
                     const EvaluatorSettings& settings);
 
-    // Adds a command. `name` is borrowed until record().
+    // Adds a command, unless there is no memory for it. `name` is borrowed until record().
     void add(const char* name, const AutoCLObject<cl_event>& event);
     // Waits for the commands that were added, and passes on their times.
     void record();

@@ -42,7 +42,8 @@ public:
     // Whether kernels deform the mesh. False if it has fewer vertices than
     // TopenCLInfo::minimumBufferSize, and without OpenCL.
     bool usesOpenCL() const;
-    // The result of the last evaluation of this mesh. A mesh that failed keeps its last good shape.
+    // The result of the last evaluation of this mesh, or of Evaluator::prepare. A mesh that failed
+    // keeps its last good shape.
     const Status& status() const;
 
     // The rest pose after all enabled deformers, computed on the CPU.

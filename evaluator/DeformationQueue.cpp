@@ -1,54 +1,24 @@
 #include "evaluator/DeformationQueue.h"
 
+#include "evaluator/Failure.h"
 #include "evaluator/MeshState.h"
 
-#include "diagnostics/CLErrorCodes.h"
 #include "host/Profiler.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
-#include <exception>
-#include <new>
 #include <string>
 #include <utility>
 
 namespace vyra {
 namespace {
 
-// Success, or a status that names the operation.
-Status statusOf(cl_int status, const char* operation)
-{
-    if (status == CL_SUCCESS)
-        return {};
-    return Status(std::string(operation) + " failed (" + CLErrorCodeStr(status) +
-                      "); the vertex buffers keep their last shape",
-                  status);
-}
-
-// Runs the steps of one mesh unless an earlier one failed. Deformers of the host may throw.
+// Runs the steps of one mesh unless an earlier one failed.
 template <typename Steps>
-void attempt(DeformableMesh& mesh, const Steps& steps)
+void attempt(DeformableMesh& mesh, const Steps& steps) noexcept
 {
-    Status& status = mesh.state().status;
-    if (!status.ok())
-        return;
-    try {
-        status = steps();
-    } catch (const std::bad_alloc&) {
-        status = Status("there is no memory left", CL_OUT_OF_HOST_MEMORY);
-    } catch (const std::exception& error) {
-        status = Status(std::string("a deformer threw an exception: ") + error.what());
-    }
-    if (!status.ok())
-        status.message = "mesh '" + mesh.geometry().name + "': " + status.message;
-}
-
-// Names the deformer that failed.
-Status ofDeformer(const Deformer& deformer, Status status)
-{
-    if (!status.ok())
-        status.message = std::string("deformer '") + deformer.name() + "': " + status.message;
-    return status;
+    if (Status& status = mesh.state().status; status.ok())
+        status = ofMesh(mesh, guarded(steps));
 }
 
 } // namespace
@@ -60,29 +30,25 @@ std::unique_ptr<DeformationQueue> DeformationQueue::create(const OpenCLFunctions
 {
     TopenCLInfo& info = TopenCLInfo::theOne();
     const bool traced = settings.traceCommand && settings.traceClock && profiler::samplingActive();
+    std::unique_ptr<DeformationQueue> result(new DeformationQueue(cl));
     cl_int created = CL_OUT_OF_RESOURCES; // the library reports its own status as a warning
-    cl_command_queue queue =
-        traced ? cl.clCreateCommandQueue(info.openCLContext(), info.openCLDevice(),
-                                         CL_QUEUE_PROFILING_ENABLE, &created)
-               : info.createOpenCLCommandQueue(nullptr);
-    if (!queue) {
+    result->fQueue = traced ? cl.clCreateCommandQueue(info.openCLContext(), info.openCLDevice(),
+                                                      CL_QUEUE_PROFILING_ENABLE, &created)
+                            : info.createOpenCLCommandQueue(nullptr);
+    if (!result->fQueue) {
         status = Status("OpenCL creates no command queue; check the driver", created);
         return nullptr;
     }
-    std::unique_ptr<DeformationQueue> result(new DeformationQueue(cl, queue));
     if (traced)
         result->fTimeline = std::make_unique<CommandTimeline>(
-            cl, queue, "OpenCL queue " + std::to_string(number), settings);
+            cl, result->fQueue, "OpenCL queue " + std::to_string(number), settings);
     return result;
-}
-
-DeformationQueue::DeformationQueue(const OpenCLFunctions& cl, cl_command_queue queue)
-    : fCL(cl), fQueue(queue)
-{
 }
 
 DeformationQueue::~DeformationQueue()
 {
+    if (!fQueue)
+        return;
     // The memory of the pool is released with this object, so nothing may use it any more.
     finish();
     fCL.clReleaseCommandQueue(fQueue);
@@ -119,69 +85,76 @@ std::size_t DeformationQueue::vertexCount() const
     return count;
 }
 
-void DeformationQueue::deform(KernelLibrary& library)
+void DeformationQueue::begin(cl_event releasedAlone)
 {
+    if (fLast.get())
+        fFormerLast = std::move(fLast);
     fLast.reset();
+    if (!fRetired.empty() && TopenCLInfo::IsEventComplete(fFormerLast.get()))
+        fRetired.clear();
     fAcquiredAlone.clear();
+    fReleasedAlone = releasedAlone;
+}
+
+void DeformationQueue::prepare(KernelLibrary& library)
+{
     fFrame.begin();
     for (DeformableMesh* mesh : fMeshes)
         attempt(*mesh, [&] { return collectArguments(*mesh, library); });
-
     AutoCLObject<cl_event> uploaded;
-    const cl_int upload = fFrame.upload(fQueue, uploaded);
+    fUpload = fFrame.upload(fQueue, uploaded);
     noteCommand("Upload", uploaded);
+}
+
+void DeformationQueue::deform(KernelLibrary& library)
+{
+    prepare(library);
     for (DeformableMesh* mesh : fMeshes) {
-        attempt(*mesh, [&] {
-            return upload == CL_SUCCESS
-                       ? enqueueMesh(*mesh)
-                       : statusOf(upload, "uploading the numbers of the evaluation");
-        });
+        attempt(*mesh, [&] { return enqueueMesh(*mesh); });
         // The next mesh may reuse the memory, since its commands run later.
         fPool.releaseBuffers();
     }
     // Others wait for the last event; without a flush they could wait forever.
-    fCL.clFlush(fQueue);
+    if (fLast.get())
+        fCL.clFlush(fQueue);
 }
 
+// Collects the passes of the enabled deformers, and their arguments.
 Status DeformationQueue::collectArguments(DeformableMesh& mesh, KernelLibrary& library)
 {
-    Status status = collectPasses(mesh, library, 0);
-    for (const auto& [deformer, pass] : mesh.state().active) {
-        if (status.ok())
-            status = ofDeformer(*deformer, pass->setArguments(fFrame));
-    }
-    return status;
-}
-
-Status DeformationQueue::prepare(DeformableMesh& mesh, KernelLibrary& library)
-{
-    return collectPasses(mesh, library, 1);
-}
-
-// Creates the kernels of at least `leastPasses` passes of each deformer, also of one whose present
-// settings need none.
-Status DeformationQueue::collectPasses(DeformableMesh& mesh, KernelLibrary& library,
-                                       unsigned leastPasses)
-{
-    MeshState& state = mesh.state();
-    state.active.clear();
-    state.passes.resize(mesh.deformers().size());
+    mesh.state().active.clear();
+    mesh.state().passes.resize(mesh.deformers().size());
     for (std::size_t i = 0; i < mesh.deformers().size(); ++i) {
-        Deformer& deformer = *mesh.deformers()[i];
+        const Deformer& deformer = *mesh.deformers()[i];
         if (!deformer.enabled)
             continue;
-        if (std::string text = deformer.mismatch(mesh.geometry()); !text.empty())
-            return ofDeformer(deformer, Status(std::move(text)));
-        const unsigned count = deformer.passCount();
-        for (unsigned pass = 0; pass < std::max(count, leastPasses); ++pass) {
-            if (pass == state.passes[i].size())
-                state.passes[i].push_back(std::make_unique<KernelPass>(fCL, deformer, pass));
-            KernelPass& kernel = *state.passes[i][pass];
-            if (Status status = kernel.prepare(library); !status.ok())
-                return ofDeformer(deformer, std::move(status));
-            if (pass < count)
-                state.active.push_back({&deformer, &kernel});
-        }
+        Status status = guarded([&] { return collectPasses(mesh, i, library); });
+        if (!status.ok())
+            return ofDeformer(deformer, std::move(status));
+    }
+    return {};
+}
+
+Status DeformationQueue::collectPasses(DeformableMesh& mesh, std::size_t index,
+                                       KernelLibrary& library)
+{
+    Deformer& deformer = *mesh.deformers()[index];
+    auto& passes = mesh.state().passes[index];
+    if (std::string text = deformer.mismatch(mesh.geometry()); !text.empty())
+        return Status(std::move(text));
+    const unsigned count = deformer.passCount();
+    // The first kernel also if the present settings need none: one that does not compile is found
+    // before it is needed.
+    for (unsigned i = 0; i < std::max(count, 1U); ++i) {
+        if (i == passes.size())
+            passes.push_back(std::make_unique<KernelPass>(fCL, deformer, i, fRetired));
+        Status status = passes[i]->prepare(library);
+        if (status.ok() && i < count)
+            status = passes[i]->setArguments(fFrame, library);
+        if (!status.ok())
+            return status;
+        if (i < count)
+            mesh.state().active.push_back({&deformer, passes[i].get()});
     }
     return {};
 }
@@ -202,40 +175,50 @@ Status DeformationQueue::enqueueMesh(DeformableMesh& mesh)
 // still draws.
 Status DeformationQueue::enqueuePasses(DeformableMesh& mesh)
 {
-    MeshState& state = mesh.state();
-    const std::size_t vertexCount = mesh.geometry().rest.vertexCount();
-    VertexMemory input = state.restMemory;
+    VertexMemory input = mesh.state().restMemory;
     VertexMemory spare; // scratch that no later pass reads
     fWaits = AutoCLEventList();
-    for (std::size_t i = 0; i < state.active.size(); ++i) {
-        const auto& [deformer, pass] = state.active[i];
-        const bool inputIsScratch = i > 0;
-        VertexMemory output;
-        Status status;
-        if (i + 1 == state.active.size()) {
-            status = acquireTarget(mesh);
-            output = {state.positions->fMem.get(), state.normals->fMem.get()};
-        } else if (inputIsScratch && !deformer->readsNeighbours()) {
-            output = input;
-        } else if (spare.positions) {
-            output = std::exchange(spare, {});
-        } else {
-            status = createScratch(vertexCount, output);
-        }
+    for (std::size_t i = 0; i < mesh.state().active.size(); ++i) {
+        Status status = enqueuePass(mesh, i, input, spare);
         if (!status.ok())
-            return status;
-        AutoCLObject<cl_event> enqueued;
-        status = statusOf(pass->enqueue(fQueue, static_cast<cl_uint>(vertexCount), input, output,
-                                        fFrame.memory(), fWaits, enqueued),
-                          "enqueuing the kernel");
-        if (!status.ok())
-            return ofDeformer(*deformer, std::move(status));
-        noteCommand(deformer->name(), enqueued);
-        if (inputIsScratch && output.positions != input.positions)
-            spare = input;
-        input = output;
+            return ofDeformer(*mesh.state().active[i].deformer, std::move(status));
     }
     return {};
+}
+
+// `input` becomes the output of the pass.
+Status DeformationQueue::enqueuePass(DeformableMesh& mesh, std::size_t index, VertexMemory& input,
+                                     VertexMemory& spare)
+{
+    const MeshState& state = mesh.state();
+    const auto& [deformer, pass] = state.active[index];
+    const std::size_t vertexCount = mesh.geometry().rest.vertexCount();
+    const bool inputIsScratch = index > 0;
+    if (pass->usesFrame() && fUpload != CL_SUCCESS)
+        return failureOf(fUpload, "uploading the numbers of the evaluation");
+    VertexMemory output;
+    Status status;
+    if (index + 1 == state.active.size()) {
+        status = acquireTarget(mesh);
+        output = {state.positions->fMem.get(), state.normals->fMem.get()};
+    } else if (inputIsScratch && !deformer->readsNeighbours()) {
+        output = input;
+    } else if (spare.positions) {
+        output = std::exchange(spare, {});
+    } else {
+        status = createScratch(vertexCount, output);
+    }
+    if (!status.ok())
+        return status;
+    AutoCLObject<cl_event> enqueued;
+    status = failureOf(pass->enqueue(fQueue, static_cast<cl_uint>(vertexCount), input, output,
+                                     fFrame.memory(), fWaits, enqueued),
+                       "enqueuing the kernel");
+    noteCommand(deformer->name(), enqueued);
+    if (inputIsScratch && output.positions != input.positions)
+        spare = input;
+    input = output;
+    return status;
 }
 
 Status DeformationQueue::enqueueRestPose(DeformableMesh& mesh)
@@ -245,9 +228,9 @@ Status DeformationQueue::enqueueRestPose(DeformableMesh& mesh)
     const auto copy = [&](cl_mem source, const TopenCLSharedBuffer& target) {
         AutoCLObject<cl_event> enqueued;
         Status status =
-            statusOf(fCL.clEnqueueCopyBuffer(fQueue, source, target.fMem.get(), 0, 0, bytes,
-                                             fWaits.size(), fWaits.array(), enqueued.receive()),
-                     "copying the rest pose");
+            failureOf(fCL.clEnqueueCopyBuffer(fQueue, source, target.fMem.get(), 0, 0, bytes,
+                                              fWaits.size(), fWaits.array(), enqueued.receive()),
+                      "copying the rest pose");
         noteCommand("Copy rest pose", enqueued);
         return status;
     };
@@ -275,25 +258,44 @@ Status DeformationQueue::acquireTarget(const DeformableMesh& mesh)
 Status DeformationQueue::acquire(const TopenCLSharedBuffer& buffer,
                                  AutoCLObject<cl_event>& acquired)
 {
-    TopenCLSharedBufferMgr& manager = TopenCLInfo::theOne().sharedBufferMgr();
-    cl_int status = manager.EnqueueAcquireSharedCLBuffer(fQueue, &buffer, acquired.receive());
-    if (status == CL_SUCCESS && !buffer.fInBatch) {
-        fAcquiredAlone.push_back(buffer.fMem.get());
-        AutoCLObject<cl_event> enqueued = acquired;
-        noteCommand("Acquire", enqueued);
+    cl_int status = CL_SUCCESS;
+    if (buffer.fInBatch) {
+        TopenCLInfo::theOne().sharedBufferMgr().EnqueueAcquireSharedCLBuffer(fQueue, &buffer,
+                                                                             acquired.receive());
+        // The acquire of the batch failed when the evaluation was opened.
+        status = acquired.get() ? CL_SUCCESS : CL_INVALID_EVENT;
+    } else {
+        status = acquireAlone(buffer, acquired);
     }
-    // The acquire of the batch failed when the evaluation was opened.
-    if (status == CL_SUCCESS && buffer.fInBatch && !acquired.get())
-        status = CL_INVALID_EVENT;
-    return statusOf(status, "acquiring a vertex buffer");
+    return failureOf(status, "acquiring a vertex buffer");
+}
+
+// The last release was enqueued on another queue, and the manager makes no acquire wait for it.
+cl_int DeformationQueue::acquireAlone(const TopenCLSharedBuffer& buffer,
+                                      AutoCLObject<cl_event>& acquired)
+{
+    if (fReleasedAlone) {
+        const cl_int status = fCL.clEnqueueMarkerWithWaitList(fQueue, 1, &fReleasedAlone, nullptr);
+        if (status != CL_SUCCESS)
+            return status;
+        fReleasedAlone = nullptr;
+    }
+    const cl_int status = TopenCLInfo::theOne().sharedBufferMgr().EnqueueAcquireSharedCLBuffer(
+        fQueue, &buffer, acquired.receive());
+    if (status != CL_SUCCESS)
+        return status;
+    fAcquiredAlone.push_back(buffer.fMem.get()); // has capacity
+    AutoCLObject<cl_event> enqueued = acquired;
+    noteCommand("Acquire", enqueued);
+    return CL_SUCCESS;
 }
 
 Status DeformationQueue::createScratch(std::size_t vertexCount, VertexMemory& scratch)
 {
     scratch = {createScratchArray(vertexCount), createScratchArray(vertexCount)};
-    return statusOf(scratch.positions && scratch.normals ? CL_SUCCESS
-                                                         : CL_MEM_OBJECT_ALLOCATION_FAILURE,
-                    "creating memory between two deformers");
+    return failureOf(scratch.positions && scratch.normals ? CL_SUCCESS
+                                                          : CL_MEM_OBJECT_ALLOCATION_FAILURE,
+                     "creating memory between two deformers");
 }
 
 cl_mem DeformationQueue::createScratchArray(std::size_t vertexCount)

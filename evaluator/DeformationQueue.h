@@ -36,6 +36,7 @@ public:
     static std::unique_ptr<DeformationQueue> create(const OpenCLFunctions& cl, std::size_t number,
                                                     const EvaluatorSettings& settings,
                                                     Status& status);
+    // Waits for all commands.
     ~DeformationQueue();
     DeformationQueue(const DeformationQueue&) = delete;
     DeformationQueue& operator=(const DeformationQueue&) = delete;
@@ -45,13 +46,15 @@ public:
     // Of all meshes.
     std::size_t vertexCount() const;
 
-    // Creates the kernels of the enabled deformers that are missing or were replaced, also those
-    // that the present settings do not need.
-    Status prepare(DeformableMesh& mesh, KernelLibrary& library);
-    // Enqueues the commands of one evaluation for all meshes and submits them. Failures are in the
-    // statuses of the meshes.
+    // Starts an evaluation. `releasedAlone` is the event of the last release of buffers outside the
+    // batch, or null; it is borrowed until deform() returns.
+    void begin(cl_event releasedAlone);
+    // Creates the kernels that are missing or were replaced, sets the arguments that changed and
+    // uploads the numbers of all meshes. Failures are in the statuses of the meshes. Never throws.
+    void prepare(KernelLibrary& library);
+    // The same, then enqueues the kernels and submits them. Once after begin(); never throws.
     void deform(KernelLibrary& library);
-    // The event of the last command that deform() enqueued; empty if it enqueued none.
+    // The event of the last command since begin(); empty if there was none.
     const AutoCLObject<cl_event>& lastEvent() const { return fLast; }
     // Memory that deform() acquired outside the batch, and that is to be released after
     // lastEvent().
@@ -64,27 +67,34 @@ public:
     std::size_t buffersReused() const { return fReused; }
 
 private:
-    DeformationQueue(const OpenCLFunctions& cl, cl_command_queue queue);
+    explicit DeformationQueue(const OpenCLFunctions& cl) : fCL(cl) {}
 
-    Status collectPasses(DeformableMesh& mesh, KernelLibrary& library, unsigned leastPasses);
     Status collectArguments(DeformableMesh& mesh, KernelLibrary& library);
+    Status collectPasses(DeformableMesh& mesh, std::size_t deformer, KernelLibrary& library);
     Status enqueueMesh(DeformableMesh& mesh);
     Status enqueuePasses(DeformableMesh& mesh);
+    Status enqueuePass(DeformableMesh& mesh, std::size_t index, VertexMemory& input,
+                       VertexMemory& spare);
     Status enqueueRestPose(DeformableMesh& mesh);
     Status acquireTarget(const DeformableMesh& mesh);
     Status acquire(const TopenCLSharedBuffer& buffer, AutoCLObject<cl_event>& acquired);
+    cl_int acquireAlone(const TopenCLSharedBuffer& buffer, AutoCLObject<cl_event>& acquired);
     Status createScratch(std::size_t vertexCount, VertexMemory& scratch);
     cl_mem createScratchArray(std::size_t vertexCount);
     void noteCommand(const char* name, AutoCLObject<cl_event>& enqueued);
 
     const OpenCLFunctions& fCL;
-    cl_command_queue fQueue; // owned
+    cl_command_queue fQueue = nullptr; // owned
     TopenCLDataBufferPool fPool;
     FrameBlock fFrame;
+    cl_int fUpload = CL_SUCCESS;                // of the numbers of this evaluation
     std::unique_ptr<CommandTimeline> fTimeline; // null: nothing is traced
     std::vector<DeformableMesh*> fMeshes;
     AutoCLObject<cl_event> fLast;
+    AutoCLObject<cl_event> fFormerLast; // of the last evaluation before that enqueued anything
+    RetiredMemory fRetired;             // released after fFormerLast
     std::vector<cl_mem> fAcquiredAlone;
+    cl_event fReleasedAlone = nullptr; // an acquire outside the batch comes after it
     // Of the mesh whose target was acquired last.
     AutoCLObject<cl_event> fAcquiredPositions;
     AutoCLObject<cl_event> fAcquiredNormals;

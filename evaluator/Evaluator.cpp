@@ -25,6 +25,10 @@ DeformableMesh& Evaluator::createMesh(std::shared_ptr<const MeshGeometry> geomet
                                       const VertexBuffers& buffers)
 {
     auto state = std::make_unique<MeshState>();
+    if (!geometry) {
+        state->creation = Status("it has no geometry");
+        geometry = std::make_shared<MeshGeometry>();
+    }
     std::unique_ptr<DeformableMesh> mesh(new DeformableMesh(std::move(geometry), std::move(state)));
     return fImplementation->add(std::move(mesh), buffers);
 }

@@ -1,6 +1,8 @@
 #include "evaluator/EvaluatorImplementation.h"
 
 #include "evaluator/ConstantStorage.h"
+#include "evaluator/Failure.h"
+#include "evaluator/OpenEvaluation.h"
 #include "evaluator/ProfileScope.h"
 
 #include "diagnostics/CLErrorCodes.h"
@@ -8,7 +10,6 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
-#include <exception>
 #include <new>
 #include <string>
 #include <thread>
@@ -26,24 +27,6 @@ TopenCLSharedBufferMgr& manager()
     return TopenCLInfo::theOne().sharedBufferMgr();
 }
 
-void pollUntilComplete(cl_event event)
-{
-    while (!TopenCLInfo::IsEventComplete(event))
-        std::this_thread::yield();
-}
-
-// Closes an evaluation, also if a function of the settings throws.
-class OpenEvaluation {
-public:
-    explicit OpenEvaluation(const em::Id& id) : fId(id) {}
-    ~OpenEvaluation() { manager().PostEvaluate(fId); }
-    OpenEvaluation(const OpenEvaluation&) = delete;
-    OpenEvaluation& operator=(const OpenEvaluation&) = delete;
-
-private:
-    const em::Id& fId;
-};
-
 // Sets a flag while a scope is open.
 class FlagScope {
 public:
@@ -55,11 +38,6 @@ public:
 private:
     bool& fFlag;
 };
-
-Status ofMesh(const DeformableMesh& mesh, const std::string& text, cl_int status = CL_SUCCESS)
-{
-    return Status("mesh '" + mesh.geometry().name + "': " + text, status);
-}
 
 } // namespace
 
@@ -106,15 +84,21 @@ DeformableMesh& EvaluatorImplementation::add(std::unique_ptr<DeformableMesh> mes
 {
     DeformableMesh& added = *fMeshes.emplace_back(std::move(mesh));
     MeshState& state = added.state();
-    if (const std::string problem = findProblem(added.geometry()); !problem.empty()) {
-        state.creation = ofMesh(added, problem);
-    } else if (usesOpenCL() &&
-               added.geometry().rest.vertexCount() >=
-                   static_cast<std::size_t>(TopenCLInfo::theOne().minimumBufferSize())) {
-        state.usesOpenCL = true;
-        state.creation = share(added, buffers);
+    try {
+        if (state.creation.ok())
+            state.creation = Status(findProblem(added.geometry()));
+        if (state.creation.ok() && usesOpenCL() &&
+            added.geometry().rest.vertexCount() >=
+                static_cast<std::size_t>(TopenCLInfo::theOne().minimumBufferSize())) {
+            state.usesOpenCL = true;
+            state.creation = share(added, buffers);
+        }
+        state.creation = ofMesh(added, std::move(state.creation));
+        state.status = state.creation;
+    } catch (...) {
+        destroy(added);
+        throw;
     }
-    state.status = state.creation;
     return added;
 }
 
@@ -129,37 +113,18 @@ Status EvaluatorImplementation::share(DeformableMesh& mesh, const VertexBuffers&
     if (status == CL_SUCCESS)
         state.restMemory.normals = state.rest.normals.storage()->memory(status);
     if (status != CL_SUCCESS)
-        return ofMesh(mesh,
-                      std::string("its rest pose has no room on the device (") +
+        return Status(std::string("its rest pose has no room on the device (") +
                           CLErrorCodeStr(status) + ")",
                       status);
-
-    const auto shareBuffer = [&](std::uint32_t name, void* d3d11Buffer, const char* what,
-                                 const TopenCLSharedBuffer*& record) {
-        record =
-            manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(), CL_MEM_READ_WRITE,
-                                           d3d11Buffer ? d3d11Buffer : &name, &status);
-        if (!record)
-            return ofMesh(mesh,
-                          std::string("OpenCL cannot share its buffer of ") + what + " (" +
-                              CLErrorCodeStr(status) + "); check that the renderer created it",
-                          status == CL_SUCCESS ? CL_INVALID_GL_OBJECT : status);
-        std::size_t size = 0;
-        status =
-            fCL->clGetMemObjectInfo(record->fMem.get(), CL_MEM_SIZE, sizeof(size), &size, nullptr);
-        if (status == CL_SUCCESS && size < bytes)
-            return ofMesh(mesh, std::string("its buffer of ") + what + " has " +
-                                    std::to_string(size) + " bytes, and the vertices need " +
-                                    std::to_string(bytes));
-        return Status();
-    };
     Status shared =
-        shareBuffer(buffers.positions, buffers.d3d11Positions, "positions", state.positions);
+        shareBuffer(buffers.positions, buffers.d3d11Positions, bytes, "positions", state.positions);
     if (shared.ok())
-        shared = shareBuffer(buffers.normals, buffers.d3d11Normals, "normals", state.normals);
-    if (!shared.ok())
+        shared =
+            shareBuffer(buffers.normals, buffers.d3d11Normals, bytes, "normals", state.normals);
+    if (!shared.ok()) {
+        unshare(state); // a batch acquires no buffer that is never written
         return shared;
-
+    }
     const auto fewest =
         std::min_element(fQueues.begin(), fQueues.end(), [](const auto& a, const auto& b) {
             return a->vertexCount() < b->vertexCount();
@@ -168,9 +133,47 @@ Status EvaluatorImplementation::share(DeformableMesh& mesh, const VertexBuffers&
     return {};
 }
 
+Status EvaluatorImplementation::shareBuffer(std::uint32_t name, void* d3d11Buffer,
+                                            std::size_t bytes, const char* what,
+                                            const TopenCLSharedBuffer*& record)
+{
+    const std::string itsBuffer = std::string("its buffer of ") + what;
+    cl_int status = CL_SUCCESS;
+    record =
+        manager().CreateSharedCLBuffer(TopenCLInfo::theOne().openCLContext(), CL_MEM_READ_WRITE,
+                                       d3d11Buffer ? d3d11Buffer : &name, &status);
+    if (!record) {
+        if (status == CL_SUCCESS)
+            status = CL_INVALID_GL_OBJECT; // the runtime gave no reason
+        return Status("OpenCL cannot share " + itsBuffer + " (" + CLErrorCodeStr(status) +
+                          "); check that the renderer created it",
+                      status);
+    }
+    std::size_t size = 0;
+    status = fCL->clGetMemObjectInfo(record->fMem.get(), CL_MEM_SIZE, sizeof(size), &size, nullptr);
+    if (status != CL_SUCCESS)
+        return Status("the size of " + itsBuffer + " is unknown (" + CLErrorCodeStr(status) +
+                          "); check the OpenCL driver",
+                      status);
+    if (size < bytes)
+        return Status(itsBuffer + " has " + std::to_string(size) +
+                          " bytes, and the vertices need " + std::to_string(bytes),
+                      CL_INVALID_BUFFER_SIZE);
+    return {};
+}
+
+// Takes the vertex buffers back from OpenCL; no command uses them.
+void EvaluatorImplementation::unshare(MeshState& state)
+{
+    for (const TopenCLSharedBuffer** record : {&state.positions, &state.normals}) {
+        if (*record)
+            manager().DestroyBatchedSharedCLBuffer(std::exchange(*record, nullptr));
+    }
+}
+
 RestPose& EvaluatorImplementation::restPose(const std::shared_ptr<const MeshGeometry>& geometry)
 {
-    std::erase_if(fRestPoses, [](const auto& entry) { return entry.second.geometry.expired(); });
+    dropUnusedRestPoses(); // also one at the address of the new geometry
     const auto [known, isNew] = fRestPoses.try_emplace(geometry.get());
     if (isNew) {
         known->second.geometry = geometry;
@@ -180,16 +183,20 @@ RestPose& EvaluatorImplementation::restPose(const std::shared_ptr<const MeshGeom
     return known->second.rest;
 }
 
+void EvaluatorImplementation::dropUnusedRestPoses()
+{
+    std::erase_if(fRestPoses, [](const auto& entry) { return entry.second.geometry.expired(); });
+}
+
 void EvaluatorImplementation::remove(DeformableMesh& mesh)
 {
-    if (fDeforming)
+    if (fBusy)
         mesh.state().removed = true;
     else
         destroy(mesh);
 }
 
-// Outside deform(): no command is enqueued meanwhile, and every event is reported to the batch
-// release.
+// No command is enqueued meanwhile, and every event is reported to the batch release.
 void EvaluatorImplementation::destroy(DeformableMesh& mesh)
 {
     MeshState& state = mesh.state();
@@ -198,31 +205,32 @@ void EvaluatorImplementation::destroy(DeformableMesh& mesh)
         state.queue->removeMesh(mesh);
     }
     if (state.positions || state.normals) {
+        releaseLeftOver();
         // The release follows the queue's commands, and the renderer may delete its buffers as soon
         // as this function returns.
         for (const cl_event released : {*fBatchReleased, fReleasedAlone.get()}) {
             if (released)
                 fCL->clWaitForEvents(1, &released);
         }
+        for (const TopenCLSharedBuffer* record : {state.positions, state.normals}) {
+            if (record)
+                std::erase(fAlone, record->fMem.get());
+        }
+        unshare(state);
     }
-    if (state.positions)
-        manager().DestroyBatchedSharedCLBuffer(state.positions);
-    if (state.normals)
-        manager().DestroyBatchedSharedCLBuffer(state.normals);
     std::erase_if(fMeshes, [&mesh](const auto& other) { return other.get() == &mesh; });
+    dropUnusedRestPoses();
 }
 
 Status EvaluatorImplementation::prepare()
 {
+    resetStatuses();
+    for (const auto& queue : fQueues)
+        queue->prepare(*fLibrary);
     Status first = fStartStatus;
     for (const auto& mesh : fMeshes) {
-        Status status = mesh->state().creation;
-        if (status.ok() && mesh->state().queue)
-            status = mesh->state().queue->prepare(*mesh, *fLibrary);
-        if (!status.ok() && mesh->state().creation.ok())
-            status = ofMesh(*mesh, status.message, status.openCL);
         if (first.ok())
-            first = std::move(status);
+            first = mesh->status();
     }
     return first;
 }
@@ -235,36 +243,57 @@ void EvaluatorImplementation::evaluate(const em::Id& id)
     }
     if (!mayDeform())
         return;
-    if (!usesOpenCL()) {
-        deform();
-        return;
-    }
-    if (TopenCLInfo::theOne().useGLFinish())
-        fSettings.finishRenderer();
-    // An evaluation that the host has opened with the same id stays open: opening it once more
-    // changes nothing, and the acquire event stays the same.
-    const AutoCLObject<cl_event> before = batchAcquireEvent();
-    manager().PreEvaluate(id);
-    const AutoCLObject<cl_event> acquired = batchAcquireEvent();
-    if (before.get() && before.get() == acquired.get()) {
-        deform();
-        return;
-    }
     {
-        const OpenEvaluation open(id);
-        const FlagScope evaluating(fEvaluating);
-        fCounts.acquires += acquired.get() ? 1 : 0;
-        deform();
+        const FlagScope busy(fBusy);
+        if (usesOpenCL())
+            evaluateWithOpenCL(id);
+        else
+            deformMeshes();
     }
-    TopenCLInfo::flush();
-    fCounts.releases += *fBatchReleased ? 1 : 0;
     destroyRemovedMeshes();
 }
 
-// Whether deform() can run; a refusal is in the status.
+void EvaluatorImplementation::evaluateWithOpenCL(const em::Id& id)
+{
+    if (TopenCLInfo::theOne().useGLFinish())
+        fSettings.finishRenderer();
+    finishIfUnordered();
+    bool closed = false;
+    bool acquired = false;
+    {
+        const OpenEvaluation evaluation(id, findWitness());
+        fCounts.acquires += evaluation.acquiredBatch() ? 1 : 0;
+        if (evaluation.isOpen())
+            deformMeshes();
+        else
+            refuse("there is no memory to open the evaluation", CL_OUT_OF_HOST_MEMORY);
+        closed = evaluation.isOwn();
+        acquired = evaluation.acquiredBatch();
+    }
+    fUnordered = fUnordered || (acquired && !*fBatchReleased);
+    if (!closed)
+        return;
+    TopenCLInfo::flush();
+    fCounts.releases += *fBatchReleased ? 1 : 0;
+}
+
+// A vertex buffer outside the batch if there is one, else one in the batch, else null.
+const TopenCLSharedBuffer* EvaluatorImplementation::findWitness() const
+{
+    const TopenCLSharedBuffer* found = nullptr;
+    for (const auto& mesh : fMeshes) {
+        if (const TopenCLSharedBuffer* buffer = mesh->state().positions)
+            found = buffer;
+        if (found && !found->fInBatch)
+            break;
+    }
+    return found;
+}
+
+// Whether meshes can be deformed; a refusal is in the status.
 bool EvaluatorImplementation::mayDeform()
 {
-    if (fDeforming)
+    if (fBusy)
         refuse("an evaluation was asked for inside an evaluation; wait for its end");
     else if (usesOpenCL() && !TopenCLInfo::theOne().usingDX() && !fSettings.finishRenderer)
         refuse("EvaluatorSettings::finishRenderer is not set; with OpenGL it calls glFinish");
@@ -273,64 +302,84 @@ bool EvaluatorImplementation::mayDeform()
     return false;
 }
 
-void EvaluatorImplementation::refuse(const char* reason)
+void EvaluatorImplementation::refuse(const char* reason, cl_int status)
 {
-    fStatus = Status(std::string("nothing was evaluated: ") + reason);
-}
-
-// The event of the batch's last acquire, with a reference; empty if no buffer is in the batch.
-AutoCLObject<cl_event> EvaluatorImplementation::batchAcquireEvent()
-{
-    AutoCLObject<cl_event> event;
-    for (const auto& mesh : fMeshes) {
-        const TopenCLSharedBuffer* buffer = mesh->state().positions;
-        if (buffer && buffer->fInBatch) {
-            manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, event.receive());
-            break;
-        }
-    }
-    return event;
+    fStatus =
+        guarded([&] { return Status(std::string("nothing was evaluated: ") + reason, status); });
 }
 
 void EvaluatorImplementation::deform()
 {
     if (!mayDeform())
         return;
+    // A release event stands from PostEvaluate to the next PreEvaluate.
+    if (usesOpenCL() && *fBatchReleased && batchSize() > 0) {
+        refuse("no evaluation is open; call TopenCLSharedBufferMgr::PreEvaluate before");
+        return;
+    }
     {
-        const FlagScope deforming(fDeforming);
-        fStatus = fStartStatus;
-        fCounts.evaluations += 1;
+        const FlagScope busy(fBusy);
+        deformMeshes();
+    }
+    destroyRemovedMeshes();
+}
+
+void EvaluatorImplementation::deformMeshes()
+{
+    fStatus = {};
+    fFailure = {};
+    fCounts.evaluations += 1;
+    finishIfUnordered();
+    if (!anyOutsideBatch())
+        fReleasedAlone.reset();
+    // A buffer outside the batch is acquired on a thread without an OpenGL context, and no mode
+    // orders that after the renderer's commands.
+    if (anyOutsideBatch() && fSettings.finishRenderer)
+        fSettings.finishRenderer();
+    fail(guarded([this] {
         fAlone.reserve(2 * fMeshes.size()); // releasing them must not fail
-        // A buffer outside the batch is acquired on a thread without an OpenGL context, and no mode
-        // orders that after the renderer's commands.
-        if (anyOutsideBatch() && fSettings.finishRenderer)
-            fSettings.finishRenderer();
-        for (const auto& mesh : fMeshes)
-            mesh->state().status = mesh->state().creation;
+        resetStatuses();
+        return Status();
+    }));
+    if (fFailure.ok()) {
+        releaseLeftOver();
         deformAll();
         reportLastEvents();
         releaseAlone();
-        writeCpuSurfaces();
         collectStatus();
+        writeCpuSurfaces();
     }
-    if (!fEvaluating)
-        destroyRemovedMeshes();
+    if (!fFailure.ok())
+        fStatus = std::move(fFailure);
+}
+
+void EvaluatorImplementation::resetStatuses()
+{
+    for (const auto& mesh : fMeshes)
+        mesh->state().status = mesh->state().creation;
 }
 
 // Isolated, so that a deformer that waits for tasks of its own does not run another mesh meanwhile.
 void EvaluatorImplementation::deformAll()
 {
-    fArena.execute([this] {
-        tbb::parallel_for(std::size_t{0}, fQueues.size() + fMeshes.size(), [this](std::size_t i) {
-            tbb::this_task_arena::isolate([this, i] {
-                const ProfileScope scope("Deform");
-                if (i < fQueues.size())
-                    fQueues[i]->deform(*fLibrary);
-                else if (!fMeshes[i - fQueues.size()]->state().usesOpenCL)
-                    deformOnCpu(*fMeshes[i - fQueues.size()]);
+    for (const auto& queue : fQueues)
+        queue->begin(fReleasedAlone.get());
+    const auto deformOne = [this](std::size_t i) {
+        const ProfileScope scope("Deform");
+        if (i < fQueues.size())
+            fQueues[i]->deform(*fLibrary);
+        else if (!fMeshes[i - fQueues.size()]->state().usesOpenCL)
+            deformOnCpu(*fMeshes[i - fQueues.size()]);
+    };
+    // Deforming never throws; the tasks need memory.
+    fail(guarded([&] {
+        fArena.execute([&] {
+            tbb::parallel_for(std::size_t{0}, fQueues.size() + fMeshes.size(), [&](std::size_t i) {
+                tbb::this_task_arena::isolate([&] { deformOne(i); });
             });
         });
-    });
+        return Status();
+    }));
 }
 
 void EvaluatorImplementation::deformOnCpu(DeformableMesh& mesh)
@@ -338,25 +387,36 @@ void EvaluatorImplementation::deformOnCpu(DeformableMesh& mesh)
     MeshState& state = mesh.state();
     if (!state.status.ok())
         return;
-    for (const auto& deformer : mesh.deformers()) {
-        const std::string text =
-            deformer->enabled ? deformer->mismatch(mesh.geometry()) : std::string();
-        if (!text.empty()) {
-            state.status =
-                ofMesh(mesh, std::string("deformer '") + deformer->name() + "': " + text);
-            return;
-        }
-    }
-    try {
-        state.surface = mesh.deformOnCpu();
-    } catch (const std::exception& error) {
-        state.status = ofMesh(mesh, std::string("a deformer threw an exception: ") + error.what());
-    }
+    state.status = ofMesh(mesh, guarded([&] {
+                              Surface surface = mesh.geometry().rest;
+                              for (const auto& deformer : mesh.deformers()) {
+                                  Status status = deformOnCpu(mesh, *deformer, surface);
+                                  if (!status.ok())
+                                      return ofDeformer(*deformer, std::move(status));
+                              }
+                              state.surface = std::move(surface);
+                              return Status();
+                          }));
+}
+
+Status EvaluatorImplementation::deformOnCpu(const DeformableMesh& mesh, const Deformer& deformer,
+                                            Surface& surface)
+{
+    if (!deformer.enabled)
+        return {};
+    return guarded([&] {
+        std::string text = deformer.mismatch(mesh.geometry());
+        if (text.empty())
+            deformer.deform(mesh.geometry(), surface);
+        return Status(std::move(text));
+    });
 }
 
 // One event per queue: it covers all commands of the queue.
 void EvaluatorImplementation::reportLastEvents()
 {
+    if (batchSize() == 0)
+        return; // there is no release
     for (const auto& queue : fQueues) {
         const cl_event last = queue->lastEvent().get();
         if (!last)
@@ -369,34 +429,72 @@ void EvaluatorImplementation::reportLastEvents()
     }
 }
 
-// Releases with one command on this thread, whose current context orders the release before the
-// drawing if the sharing extension orders the two; on the primary queue, which
-// TopenCLInfo::finish waits for.
+// Releases what the queues acquired outside the batch.
 void EvaluatorImplementation::releaseAlone()
 {
-    fAlone.clear();
     fAloneWaits = AutoCLEventList(); // keeps its storage
     for (const auto& queue : fQueues) {
-        if (queue->acquiredAlone().empty())
+        const std::vector<cl_mem>& acquired = queue->acquiredAlone();
+        if (acquired.empty())
             continue;
-        fAlone.insert(fAlone.end(), queue->acquiredAlone().begin(), queue->acquiredAlone().end());
-        try {
-            fAloneWaits.add(queue->lastEvent());
-        } catch (const std::bad_alloc&) {
+        fAlone.insert(fAlone.end(), acquired.begin(), acquired.end()); // has capacity
+        fCounts.acquires += acquired.size();
+        const bool isListed = guarded([&] {
+                                  fAloneWaits.add(queue->lastEvent());
+                                  return Status();
+                              }).ok();
+        if (!isListed || !queue->lastEvent().get())
             queue->finish(); // then the release need not wait
-        }
     }
+    enqueueReleaseAlone();
+}
+
+// Releases what an earlier release left acquired because it failed.
+void EvaluatorImplementation::releaseLeftOver()
+{
     if (fAlone.empty())
         return;
+    finish();
+    fAloneWaits = AutoCLEventList();
+    enqueueReleaseAlone();
+}
+
+// With one command on this thread, whose current context orders the release before the drawing if
+// the sharing extension orders the two; on the primary queue, which TopenCLInfo::finish waits for.
+void EvaluatorImplementation::enqueueReleaseAlone()
+{
+    if (fAlone.empty())
+        return;
+    const TopenCLInfo& info = TopenCLInfo::theOne();
+    const cl_command_queue queue = info.openCLCommandQueue();
+    // In this mode the manager borrows the event until PostEvaluate, and this object may go before.
+    const bool borrowed = info.clToGraphicsSyncMode() == TopenCLInfo::kCLToGraphicsSyncObject;
+    fReleasedAlone.reset();
     const cl_int status = manager().EnqueueReleaseSharedCLBuffer(
-        TopenCLInfo::theOne().openCLCommandQueue(), static_cast<unsigned>(fAlone.size()),
-        fAlone.data(), fAloneWaits.size(), fAloneWaits.array(), fReleasedAlone.receive());
-    fCounts.acquires += fAlone.size();
+        queue, static_cast<unsigned>(fAlone.size()), fAlone.data(), fAloneWaits.size(),
+        fAloneWaits.array(), borrowed ? nullptr : fReleasedAlone.receive());
+    if (status != CL_SUCCESS) {
+        fail(guarded([status] {
+            return Status(std::string("releasing vertex buffers outside the batch failed (") +
+                              CLErrorCodeStr(status) + "); check the OpenCL driver",
+                          status);
+        }));
+        return;
+    }
+    fAlone.clear();
     fCounts.releases += 1;
-    if (status != CL_SUCCESS)
-        fail(Status(std::string("releasing vertex buffers outside the batch failed (") +
-                        CLErrorCodeStr(status) + "); check the OpenCL driver",
-                    status));
+    if (borrowed)
+        fCL->clEnqueueMarkerWithWaitList(queue, 0, nullptr, fReleasedAlone.receive());
+    fUnordered = !fReleasedAlone.get();
+    if (fUnordered)
+        TopenCLInfo::finish(); // then nothing need wait for the release
+}
+
+// A release that failed or gave no event is one that nothing can wait for.
+void EvaluatorImplementation::finishIfUnordered()
+{
+    if (std::exchange(fUnordered, false))
+        finish();
 }
 
 void EvaluatorImplementation::writeCpuSurfaces()
@@ -405,23 +503,25 @@ void EvaluatorImplementation::writeCpuSurfaces()
         return;
     for (std::size_t i = 0; i < fMeshes.size(); ++i) { // the function may add meshes
         DeformableMesh& mesh = *fMeshes[i];
-        if (!mesh.usesOpenCL() && mesh.status().ok())
+        if (!mesh.usesOpenCL() && mesh.status().ok() && !mesh.state().removed)
             fSettings.writeVertices(mesh, mesh.state().surface);
     }
 }
 
 void EvaluatorImplementation::collectStatus()
 {
+    fail(guarded([this] { return fStartStatus; }));
     for (const auto& mesh : fMeshes) {
         if (!mesh->status().ok())
-            fail(mesh->status());
+            fail(guarded([&mesh] { return mesh->status(); }));
     }
 }
 
+// The first failure counts.
 void EvaluatorImplementation::fail(Status status)
 {
-    if (fStatus.ok())
-        fStatus = std::move(status);
+    if (fFailure.ok())
+        fFailure = std::move(status);
 }
 
 void EvaluatorImplementation::destroyRemovedMeshes()
@@ -454,23 +554,37 @@ void EvaluatorImplementation::waitUntilDrawable()
 {
     if (!usesOpenCL())
         return;
+    const cl_event releasedAlone = fReleasedAlone.get();
     switch (TopenCLInfo::theOne().clToGraphicsSyncMode()) {
     case TopenCLInfo::kCLToGraphicsImplicit:
-        break; // the releases come before what this thread draws
+        return; // the releases come before what this thread draws
     case TopenCLInfo::kCLToGraphicsEventQuery:
+        TopenCLInfo::flush(); // a command that is never submitted is never complete
         pollUntilComplete(*fBatchReleased);
-        pollUntilComplete(fReleasedAlone.get());
+        pollUntilComplete(releasedAlone);
         break;
     case TopenCLInfo::kCLToGraphicsSyncObject:
-        // PostEvaluate made the OpenGL stream wait for the batch, and for releases outside it
-        // unless batching is disabled.
-        if (const cl_event event = fReleasedAlone.get(); event && anyOutsideBatch())
-            fCL->clWaitForEvents(1, &event);
+        // PostEvaluate made the OpenGL stream wait for the batch.
+        if (releasedAlone)
+            fCL->clWaitForEvents(1, &releasedAlone);
         break;
     case TopenCLInfo::kCLToGraphicsFinish:
         TopenCLInfo::finish();
         break;
     }
+}
+
+// Returns also if the command failed, which TopenCLInfo::IsEventComplete does not count.
+void EvaluatorImplementation::pollUntilComplete(cl_event event) const
+{
+    const auto failed = [&] {
+        cl_int status = CL_COMPLETE;
+        fCL->clGetEventInfo(event, CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof(status), &status,
+                            nullptr);
+        return status < 0;
+    };
+    while (!TopenCLInfo::IsEventComplete(event) && !failed())
+        std::this_thread::yield();
 }
 
 void EvaluatorImplementation::renderingComplete()

@@ -10,6 +10,7 @@
 #include "diagnostics/AutoCLObject.h"
 
 #include <cstddef>
+#include <cstdint>
 #include <memory>
 #include <unordered_map>
 #include <vector>
@@ -42,25 +43,39 @@ public:
 private:
     void startOpenCL();
     Status share(DeformableMesh& mesh, const VertexBuffers& buffers);
+    Status shareBuffer(std::uint32_t name, void* d3d11Buffer, std::size_t bytes, const char* what,
+                       const TopenCLSharedBuffer*& record);
+    static void unshare(MeshState& state);
     RestPose& restPose(const std::shared_ptr<const MeshGeometry>& geometry);
+    void dropUnusedRestPoses();
     void destroy(DeformableMesh& mesh);
 
     bool mayDeform();
-    void refuse(const char* reason);
-    AutoCLObject<cl_event> batchAcquireEvent();
+    void refuse(const char* reason, cl_int status = CL_SUCCESS);
+    void evaluateWithOpenCL(const em::Id& id);
+    const TopenCLSharedBuffer* findWitness() const;
+    void deformMeshes();
+    void resetStatuses();
     void deformAll();
-    void deformOnCpu(DeformableMesh& mesh);
+    static void deformOnCpu(DeformableMesh& mesh);
+    static Status deformOnCpu(const DeformableMesh& mesh, const Deformer& deformer,
+                              Surface& surface);
     void reportLastEvents();
     void releaseAlone();
+    void releaseLeftOver();
+    void enqueueReleaseAlone();
     void writeCpuSurfaces();
     void collectStatus();
     void destroyRemovedMeshes();
+    void finishIfUnordered();
     bool anyOutsideBatch() const;
+    void pollUntilComplete(cl_event event) const;
     void fail(Status status);
 
     EvaluatorSettings fSettings;
     const OpenCLFunctions* fCL = nullptr; // null without OpenCL
     Status fStatus;
+    Status fFailure;     // of the evaluation that runs
     Status fStartStatus; // why there is no OpenCL although the library runs
     tbb::task_arena fArena;
     std::unique_ptr<KernelLibrary> fLibrary;
@@ -76,10 +91,10 @@ private:
 
     const cl_event* fBatchReleased = nullptr; // where the manager stores its last release event
     AutoCLObject<cl_event> fReleasedAlone;    // of the last release outside the batch
-    std::vector<cl_mem> fAlone;               // of one release outside the batch
-    AutoCLEventList fAloneWaits;
-    bool fDeforming = false;
-    bool fEvaluating = false;
+    std::vector<cl_mem> fAlone;               // acquired outside the batch, to be released
+    AutoCLEventList fAloneWaits;              // of that release
+    bool fBusy = false;                       // an evaluation runs
+    bool fUnordered = false;                  // the last release failed, or gave no event
     EvaluatorCounts fCounts;
 };
 

@@ -36,21 +36,23 @@ void FrameBlock::begin()
 cl_uint FrameBlock::append(const void* bytes, std::size_t sizeInBytes)
 {
     const std::size_t begin = fEnd;
-    fEnd += roundUp(sizeInBytes);
-    if (fEnd > fHost.size() ||
+    const std::size_t end = begin + roundUp(sizeInBytes);
+    if (end > fHost.size() ||
         (sizeInBytes && std::memcmp(fHost.data() + begin, bytes, sizeInBytes) != 0))
-        change(begin, bytes, sizeInBytes);
+        change(begin, end, bytes, sizeInBytes);
+    fEnd = end; // if there is no memory for the bytes, they are not appended
     return static_cast<cl_uint>(begin / kElementBytes);
 }
 
-void FrameBlock::change(std::size_t begin, const void* bytes, std::size_t sizeInBytes)
+void FrameBlock::change(std::size_t begin, std::size_t end, const void* bytes,
+                        std::size_t sizeInBytes)
 {
     if (fUploadPending) {
         fDevice.ensureBufferCapacity(0);
         fUploadPending = false;
     }
-    if (fEnd > fHost.size())
-        fHost.resize(std::max(fEnd, 2 * fHost.size()));
+    if (end > fHost.size())
+        fHost.resize(std::max(end, 2 * fHost.size()));
     if (sizeInBytes)
         std::memcpy(fHost.data() + begin, bytes, sizeInBytes);
     fChangedBegin = fChangedBegin == fChangedEnd ? begin : std::min(fChangedBegin, begin);
@@ -72,9 +74,8 @@ cl_int FrameBlock::upload(cl_command_queue queue, AutoCLObject<cl_event>& event)
         fDevice.uploadDataToGPU(queue, CL_FALSE, fChangedBegin, fChangedEnd - fChangedBegin,
                                 fHost.data() + fChangedBegin, 0, nullptr);
     if (status != CL_SUCCESS) {
-        // The device no longer holds what the host does: the next evaluation uploads everything.
+        // The device does not hold what the host does: the next evaluation uploads everything.
         fHost.clear();
-        fDevice.reset();
         return status;
     }
     fUploadPending = true;

@@ -33,11 +33,12 @@ public:
     // OpenCL status.
     cl_int upload(cl_command_queue queue, AutoCLObject<cl_event>& event);
 
-    // The memory that kernels read after upload(). Null if nothing was appended.
+    // The memory that kernels read after a successful upload(). Null if nothing was appended. More
+    // numbers than before are in another memory object; the former one goes once nobody holds it.
     cl_mem memory() const { return fDevice.buffer().get(); }
 
 private:
-    void change(std::size_t begin, const void* bytes, std::size_t sizeInBytes);
+    void change(std::size_t begin, std::size_t end, const void* bytes, std::size_t sizeInBytes);
 
     std::vector<std::byte> fHost; // what the device holds, or is about to receive
     TopenCLBuffer fDevice;

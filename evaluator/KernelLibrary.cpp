@@ -6,10 +6,12 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <set>
 #include <utility>
 
 namespace vyra {
@@ -42,40 +44,49 @@ KernelLibrary::KernelLibrary(const OpenCLFunctions& cl, const std::vector<std::s
         fIncludeDirectories.append(Tstring(directory.c_str()));
 }
 
-KernelLibrary::~KernelLibrary()
-{
-    for (const auto& [key, entry] : fEntries)
-        giveBack(entry.keeper);
-}
-
-void KernelLibrary::giveBack(const AutoCLObject<cl_kernel>& kernel)
-{
-    TopenCLInfo::theOne().kernelStore().freeKernel(kernel);
-}
-
 LibraryKernel KernelLibrary::create(const KernelSource& source)
 {
     const Key key(source.file, source.function, source.options);
     const std::scoped_lock lock(fMutex);
-    auto text = fTexts.find(std::get<0>(key));
-    if (text == fTexts.end() && !source.text.empty())
-        text = fTexts
-                   .emplace(source.file,
-                            ProgramText{std::string(source.file), std::string(source.text)})
-                   .first;
-    const ProgramText* program = text == fTexts.end() ? nullptr : &text->second;
-    LibraryKernel kernel = build(key, program);
-    if (!kernel.status.ok())
-        return kernel;
-    fKernelsCreated += 1;
-
-    Entry& entry = fEntries[key];
+    const ProgramText* program = textOf(source);
+    Entry& entry = fEntries[key]; // stays without a kernel if there is none: replaceFile tries it
     if (!entry.keeper.get()) {
+        const bool isNewProgram = !isProgramKept(key);
         LibraryKernel keeper = build(key, program);
-        entry = {std::move(keeper.kernel), kernel.argumentCount, kernel.workGroupSize};
-        fProgramsBuilt += 1;
+        if (!keeper.status.ok())
+            return keeper;
+        entry.keeper = std::move(keeper.kernel);
+        fProgramsBuilt += isNewProgram ? 1 : 0;
     }
+    LibraryKernel kernel = build(key, program);
+    fKernelsCreated += kernel.status.ok() ? 1 : 0;
     return kernel;
+}
+
+// The text that stands for the source's file, or null. The caller holds the lock.
+const KernelLibrary::ProgramText* KernelLibrary::textOf(const KernelSource& source)
+{
+    const std::string file(source.file);
+    if (!source.text.empty())
+        fTexts.try_emplace(file, ProgramText{file, std::string(source.text)});
+    const auto text = fTexts.find(file);
+    return text == fTexts.end() ? nullptr : &text->second;
+}
+
+// Whether a kernel of the same file and options keeps the program. The caller holds the lock.
+bool KernelLibrary::isProgramKept(const Key& key) const
+{
+    return std::any_of(fEntries.begin(), fEntries.end(), [&key](const auto& other) {
+        return other.second.keeper.get() && std::get<0>(other.first) == std::get<0>(key) &&
+               std::get<2>(other.first) == std::get<2>(key);
+    });
+}
+
+void KernelLibrary::noteArguments(const KernelSource& source, cl_uint count)
+{
+    const Key key(source.file, source.function, source.options);
+    const std::scoped_lock lock(fMutex);
+    fEntries[key].passedCount = count;
 }
 
 // One kernel of a program text, or of the file if it is null. The caller holds the lock.
@@ -89,48 +100,57 @@ LibraryKernel KernelLibrary::build(const Key& key, const ProgramText* program)
         result.status = Status(describeMissingFile(file));
         return result;
     }
-    TopenCLInfo& info = TopenCLInfo::theOne();
-    TopenCLKernelStore& store = info.kernelStore();
+    TopenCLKernelStore& store = TopenCLInfo::theOne().kernelStore();
     const std::string flags = buildOptions(options);
     const WarningCapture warnings;
-    result.kernel =
+    AutoCLObject<cl_kernel> kernel =
         program
             ? store.getKernelFromString(program->text.c_str(), program->programName.c_str(),
                                         flags.c_str(), function.c_str(), &fIncludeDirectories)
             : store.getKernel(path->c_str(), flags.c_str(), function.c_str(), &fIncludeDirectories);
-    if (!result.kernel.get()) {
-        result.status = failure(key, program ? std::string() : *path, warnings.text());
-        return result;
-    }
+    result.kernel = StoreKernel(std::move(kernel));
+    result.status = result.kernel.get()
+                        ? examine(key, result)
+                        : failure(key, program ? std::string() : *path, warnings.text());
+    if (!result.status.ok())
+        result.kernel = {};
+    return result;
+}
+
+Status KernelLibrary::examine(const Key& key, LibraryKernel& created) const
+{
     cl_int status =
-        fCL.clGetKernelInfo(result.kernel.get(), CL_KERNEL_NUM_ARGS, sizeof(result.argumentCount),
-                            &result.argumentCount, nullptr);
+        fCL.clGetKernelInfo(created.kernel.get(), CL_KERNEL_NUM_ARGS, sizeof(created.argumentCount),
+                            &created.argumentCount, nullptr);
     std::size_t roundedCount = 0;
     if (status == CL_SUCCESS)
-        status = info.getWorkGroupSizes(result.kernel.get(), 1, roundedCount, result.workGroupSize);
-    if (status != CL_SUCCESS) {
-        giveBack(result.kernel);
-        result.kernel.reset();
-        result.status =
-            Status("the kernel '" + function + "' of " + file + " cannot be examined (" +
-                       CLErrorCodeStr(status) + "); check the OpenCL driver",
-                   status);
-    }
-    return result;
+        status = TopenCLInfo::theOne().getWorkGroupSizes(created.kernel.get(), 1, roundedCount,
+                                                         created.workGroupSize);
+    if (status == CL_SUCCESS)
+        return {};
+    return Status("the kernel '" + std::get<1>(key) + "' of " + std::get<0>(key) +
+                      " cannot be examined (" + CLErrorCodeStr(status) +
+                      "); check the OpenCL driver",
+                  status);
 }
 
 Status KernelLibrary::failure(const Key& key, const std::string& path,
                               const std::string& warnings) const
 {
     const auto& [file, function, options] = key;
-    if (warnings.find("CL_INVALID_KERNEL_NAME") != std::string::npos)
+    const auto reported = [&warnings](const char* status) {
+        return warnings.find(std::string("OpenCL error: ") + status) != std::string::npos;
+    };
+    const bool compiles = !reported("CL_BUILD_PROGRAM_FAILURE");
+    if (compiles && reported("CL_INVALID_KERNEL_NAME"))
         return Status("the kernel file " + file + " has no kernel '" + function +
                           "'; check the names",
                       CL_INVALID_KERNEL_NAME);
     const std::string reason = path.empty() ? std::string() : unreadable(path);
     if (!reason.empty())
         return Status("the kernel file '" + path + "' " + reason);
-    return Status("the kernel file '" + (path.empty() ? file : path) + "' does not compile:\n" +
+    return Status("the kernel file '" + (path.empty() ? file : path) +
+                      (compiles ? "' cannot be built:\n" : "' does not compile:\n") +
                       (warnings.empty() ? "there is no build log\n" : warnings),
                   CL_BUILD_PROGRAM_FAILURE);
 }
@@ -163,36 +183,34 @@ std::string KernelLibrary::describeMissingFile(const std::string& file) const
 Status KernelLibrary::replaceFile(const std::string& file, const std::string& text)
 {
     const std::scoped_lock lock(fMutex);
-    const ProgramText next{file + ", change " + std::to_string(++fReplacementCount), text};
-    std::map<Key, Entry> replaced;
-    const auto giveBackAll = [&replaced] {
-        for (const auto& [key, entry] : replaced)
-            giveBack(entry.keeper);
-    };
+    ProgramText next{file + ", change " + std::to_string(++fReplacementCount), text};
+    std::map<Key, StoreKernel> replaced;
+    std::set<std::string> programs; // by their options
+    Status failed;                  // of kernels that the former text lacks, too
     for (const auto& [key, entry] : fEntries) {
         if (std::get<0>(key) != file)
             continue;
         LibraryKernel kernel = build(key, &next);
-        if (kernel.status.ok() && kernel.argumentCount != entry.argumentCount)
-            kernel.status = Status("the kernel '" + std::get<1>(key) + "' of " + file + " takes " +
-                                   std::to_string(kernel.argumentCount) +
-                                   " arguments, and its deformer passes " +
-                                   std::to_string(entry.argumentCount));
-        if (kernel.kernel.get())
-            replaced[key] = {std::move(kernel.kernel), kernel.argumentCount, kernel.workGroupSize};
-        if (!kernel.status.ok()) {
-            giveBackAll();
+        if (kernel.status.ok() && entry.passedCount && kernel.argumentCount != entry.passedCount)
+            kernel.status =
+                Status("the kernel '" + std::get<1>(key) + "' of " + file + " takes " +
+                       std::to_string(kernel.argumentCount) +
+                       " arguments, and its deformer passes " + std::to_string(entry.passedCount));
+        if (kernel.status.ok()) {
+            replaced[key] = std::move(kernel.kernel);
+            programs.insert(std::get<2>(key));
+        } else if (entry.keeper.get()) {
             return kernel.status;
+        } else {
+            failed = std::move(kernel.status);
         }
     }
     if (replaced.empty())
-        return {};
-    for (auto& [key, entry] : replaced) {
-        giveBack(fEntries[key].keeper);
-        fEntries[key] = std::move(entry);
-        fProgramsBuilt += 1;
-    }
-    fTexts[file] = next;
+        return failed;
+    fTexts.insert_or_assign(file, std::move(next));
+    for (auto& [key, kernel] : replaced)
+        fEntries.find(key)->second.keeper = std::move(kernel);
+    fProgramsBuilt += programs.size();
     fGeneration += 1;
     return {};
 }

@@ -4,8 +4,8 @@
 #include "evaluator/Deformer.h"
 #include "evaluator/OpenCLFunctions.h"
 #include "evaluator/Status.h"
+#include "evaluator/StoreKernel.h"
 
-#include "diagnostics/AutoCLObject.h"
 #include "host/TstringArray.h"
 
 #include <atomic>
@@ -23,7 +23,7 @@ namespace vyra {
 
 // A kernel for one user, with what is known about it.
 struct LibraryKernel {
-    AutoCLObject<cl_kernel> kernel; // empty on failure; goes back with KernelLibrary::giveBack
+    StoreKernel kernel; // empty on failure
     cl_uint argumentCount = 0;
     std::size_t workGroupSize = 0; // work-items
     unsigned generation = 0;       // KernelLibrary::generation() when it was created
@@ -36,17 +36,18 @@ class KernelLibrary {
 public:
     // Searches `directories` in their order. Needs the runtime object to be valid.
     KernelLibrary(const OpenCLFunctions& cl, const std::vector<std::string>& directories);
-    ~KernelLibrary();
     KernelLibrary(const KernelLibrary&) = delete;
     KernelLibrary& operator=(const KernelLibrary&) = delete;
 
     // A new kernel object. A failure names the file, and carries the build log if there is one.
     LibraryKernel create(const KernelSource& source);
-    static void giveBack(const AutoCLObject<cl_kernel>& kernel);
+    // Reports how many arguments a deformer passes to the kernel, which a text that replaces the
+    // file is measured by.
+    void noteArguments(const KernelSource& source, cl_uint count);
 
     // Uses this text for `file` from now on, for kernels created afterwards. Fails, and changes
     // nothing, unless every kernel that was created from the file can be created from the text with
-    // the same number of arguments. Ignores a file that was never used.
+    // the arguments that its deformer passes. Ignores a file that nobody asked for.
     Status replaceFile(const std::string& file, const std::string& text);
 
     // Changes whenever a file is replaced: kernels of an older generation are to be created again.
@@ -58,9 +59,8 @@ public:
 private:
     using Key = std::tuple<std::string, std::string, std::string>; // file, function, options
     struct Entry {
-        AutoCLObject<cl_kernel> keeper; // keeps the program built
-        cl_uint argumentCount = 0;
-        std::size_t workGroupSize = 0;
+        StoreKernel keeper;      // keeps the program built; empty if no kernel was created yet
+        cl_uint passedCount = 0; // of arguments, by the deformer; 0 while it is unknown
     };
     // A source that is not read from a file.
     struct ProgramText {
@@ -69,6 +69,9 @@ private:
     };
 
     LibraryKernel build(const Key& key, const ProgramText* program);
+    const ProgramText* textOf(const KernelSource& source);
+    bool isProgramKept(const Key& key) const;
+    Status examine(const Key& key, LibraryKernel& created) const;
     std::optional<std::string> findFile(const std::string& file) const;
     std::string describeMissingFile(const std::string& file) const;
     Status failure(const Key& key, const std::string& path, const std::string& warnings) const;

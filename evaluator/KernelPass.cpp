@@ -19,20 +19,10 @@ constexpr std::size_t kLargestWorkGroup = 256;
 
 } // namespace
 
-KernelPass::KernelPass(const OpenCLFunctions& cl, Deformer& deformer, unsigned pass)
-    : fCL(cl), fDeformer(deformer), fPass(pass)
+KernelPass::KernelPass(const OpenCLFunctions& cl, Deformer& deformer, unsigned pass,
+                       RetiredMemory& retired)
+    : fCL(cl), fDeformer(deformer), fPass(pass), fRetired(retired)
 {
-}
-
-KernelPass::~KernelPass()
-{
-    giveBack();
-}
-
-void KernelPass::giveBack()
-{
-    KernelLibrary::giveBack(fKernel);
-    fKernel.reset();
 }
 
 bool KernelPass::isCurrent(const KernelSource& source, const KernelLibrary& library) const
@@ -49,24 +39,39 @@ Status KernelPass::prepare(KernelLibrary& library)
     LibraryKernel created = library.create(source);
     if (!created.status.ok())
         return created.status;
-    giveBack();
+    // All that needs memory, so that nothing fails half-way.
+    std::vector<Argument> arguments(created.argumentCount);
+    std::string file(source.file);
+    std::string function(source.function);
+    std::string options(source.options);
+    fRetired.reserve(fRetired.size() + fArguments.size());
+
+    for (Argument& argument : fArguments) {
+        if (argument.memory.get())
+            fRetired.push_back(std::move(argument.memory));
+    }
     fKernel = std::move(created.kernel);
-    fFile = source.file;
-    fFunction = source.function;
-    fOptions = source.options;
+    fArguments = std::move(arguments);
+    fFile = std::move(file);
+    fFunction = std::move(function);
+    fOptions = std::move(options);
     fGeneration = created.generation;
     fWorkGroupSize = std::min(created.workGroupSize, kLargestWorkGroup);
-    fArguments.assign(created.argumentCount, {});
+    fNotedCount = 0;
     return {};
 }
 
-Status KernelPass::setArguments(FrameBlock& frame)
+Status KernelPass::setArguments(FrameBlock& frame, KernelLibrary& library)
 {
     fFrame = &frame;
     fIndex = kCommonArguments;
     fStatus = CL_SUCCESS;
     fFrameArguments.clear();
     fDeformer.setArguments(fPass, *this);
+    if (fNotedCount != fIndex) {
+        library.noteArguments(fDeformer.kernel(fPass), fIndex);
+        fNotedCount = fIndex;
+    }
     if (fIndex != fArguments.size())
         return Status("the kernel '" + fFunction + "' of " + fFile + " takes " +
                       std::to_string(fArguments.size()) + " arguments, and its deformer passes " +
@@ -100,24 +105,44 @@ void KernelPass::constant(const ConstantArray& array)
         memory = storage->memory(status);
     if (status != CL_SUCCESS && fStatus == CL_SUCCESS)
         fStatus = status;
-    set(fIndex++, &memory, sizeof(memory));
+    setMemory(fIndex++, memory);
 }
 
-// Skips the call if the argument has that value already.
-void KernelPass::set(cl_uint index, const void* value, std::size_t sizeInBytes)
+// Skips the call if the argument has that value already. Returns whether it was set.
+bool KernelPass::set(cl_uint index, const void* value, std::size_t sizeInBytes)
 {
     if (fStatus != CL_SUCCESS || index >= fArguments.size())
-        return;
+        return false;
     Argument& argument = fArguments[index];
     if (argument.sizeInBytes == sizeInBytes &&
         std::memcmp(argument.bytes.data(), value, sizeInBytes) == 0)
-        return;
+        return false;
     argument.sizeInBytes = 0;
     fStatus = fCL.clSetKernelArg(fKernel.get(), index, sizeInBytes, value);
-    if (fStatus != CL_SUCCESS || sizeInBytes > argument.bytes.size())
+    if (fStatus != CL_SUCCESS)
+        return false;
+    if (sizeInBytes <= argument.bytes.size()) {
+        std::memcpy(argument.bytes.data(), value, sizeInBytes);
+        argument.sizeInBytes = sizeInBytes;
+    }
+    return true;
+}
+
+// Sets memory that the deformer or the frame block may release at any time. Commands of earlier
+// evaluations may still use what the argument was before.
+void KernelPass::setMemory(cl_uint index, cl_mem memory)
+{
+    fRetired.reserve(fRetired.size() + 1);
+    if (!set(index, &memory, sizeof(memory)))
         return;
-    std::memcpy(argument.bytes.data(), value, sizeInBytes);
-    argument.sizeInBytes = sizeInBytes;
+    AutoCLObject<cl_mem> kept;
+    if (memory) {
+        retainCLObject(memory); // paid back by `kept`
+        kept.adopt(memory);
+    }
+    std::swap(fArguments[index].memory, kept);
+    if (kept.get())
+        fRetired.push_back(std::move(kept));
 }
 
 cl_int KernelPass::enqueue(cl_command_queue queue, cl_uint vertexCount, const VertexMemory& input,
@@ -130,7 +155,7 @@ cl_int KernelPass::enqueue(cl_command_queue queue, cl_uint vertexCount, const Ve
     set(3, &output.positions, sizeof(cl_mem));
     set(4, &output.normals, sizeof(cl_mem));
     for (const cl_uint index : fFrameArguments)
-        set(index, &frame, sizeof(frame));
+        setMemory(index, frame);
     if (fStatus != CL_SUCCESS)
         return fStatus;
     const std::size_t global = (vertexCount + fWorkGroupSize - 1) / fWorkGroupSize * fWorkGroupSize;

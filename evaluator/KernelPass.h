@@ -7,6 +7,7 @@
 #include "evaluator/KernelLibrary.h"
 #include "evaluator/OpenCLFunctions.h"
 #include "evaluator/Status.h"
+#include "evaluator/StoreKernel.h"
 
 #include "diagnostics/AutoCLEventList.h"
 #include "diagnostics/AutoCLObject.h"
@@ -26,20 +27,25 @@ struct VertexMemory {
     cl_mem normals = nullptr;
 };
 
+// Memory objects that kernels no longer name, but that commands may still use.
+using RetiredMemory = std::vector<AutoCLObject<cl_mem>>;
+
 // Owns a kernel object, so that arguments that did not change are set once. One thread at a time
 // uses an object.
 class KernelPass final : private KernelArguments {
 public:
-    // Borrows everything.
-    KernelPass(const OpenCLFunctions& cl, Deformer& deformer, unsigned pass);
-    ~KernelPass();
+    // Borrows everything. `retired` receives the memory of arguments that were replaced.
+    KernelPass(const OpenCLFunctions& cl, Deformer& deformer, unsigned pass,
+               RetiredMemory& retired);
 
     // Creates the kernel if there is none yet, if the deformer asks for another one, or if its file
-    // was replaced.
+    // was replaced. A failure leaves everything as it is.
     Status prepare(KernelLibrary& library);
 
     // Sets the deformer's arguments and copies its numbers of this evaluation to `frame`.
-    Status setArguments(FrameBlock& frame);
+    Status setArguments(FrameBlock& frame, KernelLibrary& library);
+    // Whether the last arguments had such numbers.
+    bool usesFrame() const { return !fFrameArguments.empty(); }
 
     // Enqueues one work-item per vertex after `waits`. Returns an OpenCL status; `event` receives
     // the command's event on success.
@@ -52,25 +58,29 @@ private:
     struct Argument {
         std::size_t sizeInBytes = 0; // 0: not set yet, or not kept
         std::array<std::byte, 64> bytes{};
+        // Keeps the memory that the deformer may replace, and with it the meaning of the handle.
+        AutoCLObject<cl_mem> memory;
     };
 
     void setValue(const void* value, std::size_t sizeInBytes) override;
     void setFrame(const void* bytes, std::size_t sizeInBytes) override;
     void constant(const ConstantArray& array) override;
-    void set(cl_uint index, const void* value, std::size_t sizeInBytes);
+    bool set(cl_uint index, const void* value, std::size_t sizeInBytes);
+    void setMemory(cl_uint index, cl_mem memory);
     bool isCurrent(const KernelSource& source, const KernelLibrary& library) const;
-    void giveBack();
 
     const OpenCLFunctions& fCL;
     Deformer& fDeformer;
     unsigned fPass;
-    AutoCLObject<cl_kernel> fKernel;
+    RetiredMemory& fRetired;
+    StoreKernel fKernel;
     std::string fFile; // of the kernel, with the two members below
     std::string fFunction;
     std::string fOptions;
     unsigned fGeneration = 0;
     std::size_t fWorkGroupSize = 0;
     std::vector<Argument> fArguments;
+    cl_uint fNotedCount = 0; // of arguments, as the library knows it
 
     // While the deformer's arguments are set.
     FrameBlock* fFrame = nullptr;

@@ -54,6 +54,7 @@ std::optional<OpenCLFunctions> load()
     OpenCLFunctions cl;
     const bool complete =
         resolve(library, "clGetMemObjectInfo", cl.clGetMemObjectInfo) &&
+        resolve(library, "clGetEventInfo", cl.clGetEventInfo) &&
         resolve(library, "clGetKernelInfo", cl.clGetKernelInfo) &&
         resolve(library, "clCreateCommandQueue", cl.clCreateCommandQueue) &&
         resolve(library, "clReleaseCommandQueue", cl.clReleaseCommandQueue) &&

@@ -9,6 +9,7 @@ namespace vyra {
 // calls. Nothing links the OpenCL loader. The members have the names and types of the functions.
 struct OpenCLFunctions {
     decltype(&::clGetMemObjectInfo) clGetMemObjectInfo = nullptr;
+    decltype(&::clGetEventInfo) clGetEventInfo = nullptr;
     decltype(&::clGetKernelInfo) clGetKernelInfo = nullptr;
     decltype(&::clCreateCommandQueue) clCreateCommandQueue = nullptr;
     decltype(&::clReleaseCommandQueue) clReleaseCommandQueue = nullptr;

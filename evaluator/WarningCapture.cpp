@@ -2,7 +2,6 @@
 
 #include "diagnostics/CLWarningSink.h"
 
-#include <atomic>
 #include <mutex>
 
 namespace vyra {
@@ -10,9 +9,16 @@ namespace {
 
 thread_local std::string* capturedText = nullptr;
 
-std::mutex installation; // guards captures
+std::mutex installation; // guards the two below, and who exchanges the library's sink
 int captures = 0;        // on all threads
-std::atomic<CLWarningSink> hostSink = nullptr;
+CLWarningSink hostSink = nullptr;
+
+// Waits while the sink is exchanged on another thread, so that the host's is known.
+CLWarningSink currentHostSink()
+{
+    const std::scoped_lock lock(installation);
+    return hostSink;
+}
 
 void forward(const char* text)
 {
@@ -24,7 +30,7 @@ void forward(const char* text)
             // A sink must not throw; the host still receives the warning.
         }
     }
-    if (const CLWarningSink sink = hostSink)
+    if (const CLWarningSink sink = currentHostSink())
         sink(text);
 }
 
@@ -33,8 +39,12 @@ void forward(const char* text)
 WarningCapture::WarningCapture()
 {
     const std::scoped_lock lock(installation);
-    if (captures++ == 0)
-        hostSink = setCLWarningSink(forward);
+    if (captures++ == 0) {
+        // A host that replaced the sink during a capture and then restored it has installed ours.
+        const CLWarningSink former = setCLWarningSink(forward);
+        if (former != forward)
+            hostSink = former;
+    }
     capturedText = &fText;
 }
 

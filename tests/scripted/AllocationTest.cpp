@@ -1,8 +1,8 @@
 // Running out of memory: what is promised to stay unchanged does, and nothing leaks or stays
 // locked.
 //
-// This file replaces the program's operator new. A test counts the allocations of an operation and
-// makes each of them fail in turn; the scripted runtime's own are left out.
+// A test counts the allocations of an operation and makes each of them fail in turn.
+#include "FailingAllocations.h"
 #include "FaultBench.h"
 #include "diagnostics/AutoCLEventList.h"
 #include "diagnostics/CLInternalWarning.h"
@@ -15,96 +15,6 @@
 #include <new>
 #include <set>
 #include <utility>
-
-namespace {
-
-// Allocations of this thread until one fails; 0: none fails.
-thread_local unsigned allocationsLeft = 0;
-thread_local bool allLaterFail = false; // too
-thread_local unsigned allocations = 0;
-thread_local unsigned failures = 0;
-
-bool nextFails()
-{
-    if (scripted::InsideRuntime::here())
-        return false;
-    ++allocations;
-    if (allocationsLeft == 0 || (allocationsLeft > 1 && --allocationsLeft > 0))
-        return false;
-    allocationsLeft = allLaterFail ? 1 : 0;
-    ++failures;
-    return true;
-}
-
-} // namespace
-
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept
-{
-    return nextFails() ? nullptr : std::malloc(size ? size : 1);
-}
-void* operator new(std::size_t size)
-{
-    void* memory = operator new(size, std::nothrow);
-    if (!memory)
-        throw std::bad_alloc();
-    return memory;
-}
-// A sanitizer's own would not come by.
-void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
-{
-    return operator new(size, std::nothrow);
-}
-void* operator new[](std::size_t size)
-{
-    return operator new(size);
-}
-// Not inlined, or a compiler sees free where it expects the counterpart of new.
-[[gnu::noinline]] void operator delete(void* memory) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete[](void* memory) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete[](void* memory, std::size_t) noexcept
-{
-    std::free(memory);
-}
-
-#ifndef _WIN32
-// What the allocators of TBB's containers call. A program's own goes before TBB's; on Windows that
-// is not so, and there the tests of such containers are left out.
-namespace tbb::detail::r1 {
-
-void* allocate_memory(std::size_t size)
-{
-    return operator new(size);
-}
-void deallocate_memory(void* memory)
-{
-    operator delete(memory);
-}
-void* cache_aligned_allocate(std::size_t size)
-{
-    constexpr std::size_t kLine = 128;
-    void* memory =
-        nextFails() ? nullptr : std::aligned_alloc(kLine, (size + kLine - 1) / kLine * kLine);
-    if (!memory)
-        throw std::bad_alloc();
-    return memory;
-}
-void cache_aligned_deallocate(void* memory)
-{
-    std::free(memory);
-}
-
-} // namespace tbb::detail::r1
-#endif
 
 namespace scripted {
 namespace {

@@ -39,7 +39,7 @@ unsigned CommandOrder::add(Command command)
 
 bool CommandOrder::precedes(unsigned first, const Command& second) const
 {
-    if (first == 0)
+    if (first == 0 || fGone.contains(command(first).queue))
         return true;
     const auto last = second.after.find(command(first).queue);
     return last != second.after.end() && last->second >= first;
@@ -58,6 +58,15 @@ void CommandOrder::observeQueue(const void* queue)
 {
     if (const auto last = fLast.find(queue); last != fLast.end())
         observe(last->second);
+}
+
+void CommandOrder::forget(const void* queue)
+{
+    fGone.insert(queue);
+    fLast.erase(queue);
+    fSeenByHost.erase(queue);
+    for (const auto& [other, last] : fLast)
+        fCommands[last - 1].after.erase(queue);
 }
 
 bool CommandOrder::isInUse(const void* mem) const

@@ -32,6 +32,8 @@ public:
     void observe(unsigned number);
     void observeQueue(const void* queue);
     void completeAll() { fPending.clear(); }
+    // The queue is gone; its commands count as complete.
+    void forget(const void* queue);
 
     bool isPending(unsigned number) const { return fPending.contains(number); }
     // Whether a command that is not complete uses a memory object.
@@ -45,6 +47,7 @@ private:
     std::vector<Command> fCommands;              // by number
     std::set<unsigned> fPending;                 // numbers
     std::map<const void*, unsigned> fLast;       // by queue
+    std::set<const void*> fGone;                 // queues
     std::map<const void*, unsigned> fSeenByHost; // by queue: the last that the host saw complete
 };
 

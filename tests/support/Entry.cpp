@@ -81,6 +81,8 @@ cl_int Entry::release(Kind kind, const void* handle)
         if (kind == Kind::kMem && found->references == 1)
             require(!fRuntime.fCommands.isInUse(handle), CL_INVALID_OPERATION,
                     found->name + " dies while a command uses it");
+        if (kind == Kind::kQueue && found->references == 1)
+            fRuntime.fCommands.forget(handle);
         fRuntime.fLedger.release(handle);
     }
     return fStatus;
@@ -132,10 +134,11 @@ cl_int Entry::command(cl_command_queue queue, const WaitList& list, cl_event* ev
                       const Mems& mems, bool blocking)
 {
     CommandOrder::Command next = nextCommand(queue, list);
+    const bool isOrdered = ok(); // otherwise it is not known what it waits for
     std::vector<Object*> shared;
     for (cl_mem mem : mems) {
         Object* used = usableMem(mem);
-        if (!used || !used->shared)
+        if (!used || !used->shared || !isOrdered)
             continue;
         require(fRuntime.fCommands.precedes(used->acquire, next), CL_INVALID_OPERATION,
                 used->name + " is used before its acquire is complete");
@@ -156,6 +159,8 @@ cl_int Entry::changeSide(cl_command_queue queue, const WaitList& list, cl_event*
                          const std::vector<Object*>& objects, bool acquire)
 {
     CommandOrder::Command next = nextCommand(queue, list);
+    if (!ok())
+        return fStatus;
     const auto requireAfter = [&](unsigned earlier, const Object& object, const char* what) {
         require(fRuntime.fCommands.precedes(earlier, next), CL_INVALID_OPERATION,
                 object.name + what);

@@ -22,7 +22,7 @@ struct HostScript {
     bool sampling = false;                 // the profiler records
     QOpenGLWindow* resourceWindow = nullptr;
     std::function<void()> duringFenceWait; // runs once, at the next wait of an OpenGL client
-    bool makeCurrentThrows = false; // std::bad_alloc
+    bool makeCurrentThrows = false;        // std::bad_alloc
 };
 HostScript& host();
 

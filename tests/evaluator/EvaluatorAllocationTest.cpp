@@ -1,0 +1,161 @@
+// An evaluation allocates nothing once everything is built, and wherever memory runs out before,
+// nothing stays acquired, nothing is lost, and the next evaluation works.
+#include "EvaluatorTest.h"
+#include "FailingAllocations.h"
+
+#include <utility>
+
+#include <tbb/global_control.h>
+
+using namespace scripted;
+
+namespace {
+
+class EvaluatorAllocationTest : public EvaluatorTest {
+protected:
+    // Runs the operation with each of its allocations failing in turn, until none does, on a
+    // subject that `prepare` makes anew. Returns how many allocations failed.
+    template <typename Prepare, typename Operation>
+    unsigned failEach(const Prepare& prepare, const Operation& operation)
+    {
+        for (unsigned nth = 1;; ++nth) {
+            SCOPED_TRACE(nth);
+            makeEvaluator();
+            prepare();
+            allocationsLeft = nth;
+            operation();
+            if (std::exchange(allocationsLeft, 0U) != 0)
+                return nth - 1;
+            EXPECT_EQ(runtime().acquired(), Lines{});
+            frame();
+            EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+            EXPECT_EQ(runtime().acquired(), Lines{});
+            EXPECT_EQ(linesOf(leftOver(), "program"), leftOver()) << "beyond what the store keeps";
+            if (HasFailure())
+                return nth;
+        }
+    }
+    void addTwoChains()
+    {
+        addChain();
+        addChain();
+    }
+
+    // One thread: allocations are counted by thread.
+    tbb::global_control fOneThread{tbb::global_control::max_allowed_parallelism, 1};
+};
+
+TEST_F(EvaluatorAllocationTest, SteadyStateAllocatesNothing)
+{
+    for (const bool batching : {true, false}) {
+        if (batching)
+            startIn(1, 1);
+        else
+            makeEvaluator();
+        vyra::DeformableMesh& mesh = addChain();
+        mesh.add<TestDeformer>().neighbours = true;
+        deformer(mesh, 1).label = "wave";
+        addMesh().add<TestDeformer>("skin", "full");
+        for (int i = 0; i < 3; ++i) {
+            deformer(mesh).numbers[0] += 1;
+            frame();
+        }
+        for (const bool changed : {false, true}) {
+            deformer(mesh).numbers[0] += changed ? 1 : 0;
+            allocations = 0;
+            evaluate();
+            EXPECT_EQ(allocations, 0U) << changed;
+            EXPECT_TRUE(evaluator->status().ok());
+        }
+    }
+}
+
+TEST_F(EvaluatorAllocationTest, FirstEvaluation)
+{
+    startIn(1, 1);
+    EXPECT_GT(failEach([this] { addTwoChains(); }, [this] { evaluate(); }), 20U);
+}
+
+TEST_F(EvaluatorAllocationTest, LaterEvaluationWithMoreNumbersPassesAndMeshes)
+{
+    startIn(2, 3);
+    const auto prepare = [this] {
+        vyra::DeformableMesh& mesh = addChain();
+        addChain();
+        frame();
+        deformer(mesh).numbers.resize(400, 7);
+        mesh.add<TestDeformer>("smooth", "full").passes = 3;
+        addChain();
+    };
+    EXPECT_GT(failEach(prepare, [this] { evaluate(); }), 20U);
+}
+
+TEST_F(EvaluatorAllocationTest, EvaluationInTheHosts)
+{
+    startIn(1, 2);
+    const auto run = [this] {
+        const unsigned left = std::exchange(allocationsLeft, 0U);
+        manager().PreEvaluate(em::Id(7));
+        addMesh().add<TestDeformer>();
+        allocationsLeft = left;
+        evaluator->deform();
+        const unsigned remaining = std::exchange(allocationsLeft, 0U);
+        manager().PostEvaluate(em::Id(7));
+        allocationsLeft = remaining;
+    };
+    EXPECT_GT(failEach([this] { addTwoChains(); }, run), 20U);
+}
+
+TEST_F(EvaluatorAllocationTest, MeshThatCannotBeCreatedLeavesNothing)
+{
+    startIn(1, 1);
+    const auto geometry = grid(4, "geometry of a name that is not short");
+    const auto create = [&] {
+        try {
+            evaluator->createMesh(geometry, {.positions = 90, .normals = 91});
+        } catch (const std::bad_alloc&) {
+            const unsigned left = std::exchange(allocationsLeft, 0U);
+            EXPECT_EQ(evaluator->batchSize(), 0U);
+            allocationsLeft = left;
+        }
+    };
+    EXPECT_GT(failEach([] {}, create), 5U);
+}
+
+TEST_F(EvaluatorAllocationTest, MeshesOnTheCpuKeepTheirShape)
+{
+    std::size_t written = 0;
+    settings.writeVertices = [&](vyra::DeformableMesh& mesh, const vyra::Surface& surface) {
+        EXPECT_EQ(surface.vertexCount(), mesh.geometry().rest.vertexCount());
+        ++written;
+    };
+    startIn(1, 1);
+    const auto prepare = [this] {
+        for (int i = 0; i < 2; ++i)
+            addMesh(kSmallest - 1).add<TestDeformer>();
+    };
+    EXPECT_GT(failEach(prepare, [this] { evaluate(); }), 1U);
+    EXPECT_GT(written, 0U);
+}
+
+TEST_F(EvaluatorAllocationTest, ReplacedKernelFile)
+{
+    startIn(1, 1);
+    const auto prepare = [this] {
+        addTwoChains();
+        frame();
+    };
+    const auto replace = [this] {
+        try {
+            EXPECT_TRUE(evaluator->replaceKernelFile("test.cl", kKernelText).ok());
+        } catch (const std::bad_alloc&) {
+            return; // the former kernels stay in use
+        }
+        evaluate();
+    };
+    EXPECT_GT(failEach(prepare, replace), 10U);
+    expectedLeft = leftOver(); // a program whose kernel found no memory stays in the store
+    EXPECT_LT(expectedLeft.size(), 4U);
+}
+
+} // namespace

@@ -1,0 +1,245 @@
+// Bad input: each mesh that cannot be deformed has a status that names it and the reason, and all
+// others go on.
+#include "EvaluatorTest.h"
+
+#include <limits>
+#include <stdexcept>
+#include <utility>
+
+using namespace scripted;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+namespace {
+
+constexpr float kNotANumber = std::numeric_limits<float>::quiet_NaN();
+
+struct MeshRow {
+    std::function<void(vyra::MeshGeometry&)> spoil;
+    const char* message; // after "mesh 'bad': "
+};
+
+const MeshRow kBadMeshes[] = {
+    {[](auto& g) { g = {.name = "bad", .rest = {}, .triangles = {}}; }, "it has no vertices"},
+    {[](auto& g) { g.rest.normals.pop_back(); },
+     "it has 4 positions and 3 normals; the numbers must be equal"},
+    {[](auto& g) { g.triangles.pop_back(); },
+     "the number of its triangle indices is not a multiple of 3"},
+    {[](auto& g) { g.triangles[4] = 4; },
+     "a triangle refers to vertex 4, and there are 4 vertices"},
+    {[](auto& g) { g.rest.positions[2].y = kNotANumber; }, "position 2 is not a finite number"},
+    {[](auto& g) { g.rest.normals[3].z = std::numeric_limits<float>::infinity(); },
+     "normal 3 is not a finite number"},
+};
+
+// The bad mesh fails with the message, in prepare and in each evaluation; the good one is drawn.
+class EvaluatorInputTest : public EvaluatorTest {
+protected:
+    void expectFailure(vyra::DeformableMesh& bad, const std::string& message)
+    {
+        addChain();
+        EXPECT_EQ(evaluator->prepare().message, message);
+        for (int i = 0; i < 2; ++i) {
+            EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), 2U) << message;
+            EXPECT_EQ(bad.status().message, message);
+            EXPECT_EQ(evaluator->status().message, message);
+            EXPECT_EQ(runtime().acquired(), Lines{});
+        }
+    }
+};
+
+TEST_F(EvaluatorInputTest, MeshesThatCannotBeDeformed)
+{
+    startIn(1, 1);
+    for (const MeshRow& row : kBadMeshes) {
+        makeEvaluator();
+        const auto geometry = grid(4, "bad");
+        row.spoil(*geometry);
+        vyra::DeformableMesh& bad = addMesh(geometry);
+        bad.add<TestDeformer>();
+        expectFailure(bad, std::string("mesh 'bad': ") + row.message);
+    }
+    makeEvaluator();
+    vyra::DeformableMesh& none = addMesh(std::shared_ptr<const vyra::MeshGeometry>());
+    expectFailure(none, "mesh '': it has no geometry");
+}
+
+TEST_F(EvaluatorInputTest, VertexBuffersThatCannotBeShared)
+{
+    world.sharedBytes[2] = 47;
+    startIn(1, 1);
+    expectFailure(addMesh(grid(4, "small")), "mesh 'small': its buffer of normals has 47 bytes, "
+                                             "and the vertices need 48");
+    makeEvaluator();
+    runtime().plan({.function = "clCreateFromGLBuffer", .status = CL_INVALID_GL_OBJECT, .nth = 2});
+    expectFailure(addMesh(grid(4, "gone")),
+                  "mesh 'gone': OpenCL cannot share its buffer of normals "
+                  "(CL_INVALID_GL_OBJECT); check that the renderer created it");
+    makeEvaluator();
+    runtime().clearFaults();
+    runtime().plan({.function = "clGetMemObjectInfo", .status = CL_OUT_OF_RESOURCES});
+    expectFailure(addMesh(grid(4, "unknown")),
+                  "mesh 'unknown': the size of its buffer of positions is unknown "
+                  "(CL_OUT_OF_RESOURCES); check the OpenCL driver");
+}
+
+struct DeformerRow {
+    std::function<void(TestDeformer&)> spoil;
+    const char* message; // after the mesh and the deformer
+};
+
+TEST_F(EvaluatorInputTest, DeformersThatDoNotFitOrThrow)
+{
+    startIn(1, 1);
+    for (const DeformerRow& row :
+         {DeformerRow{[](auto& d) { d.problem = "it has 3 bones, and the weights name 4"; },
+                      "it has 3 bones, and the weights name 4"},
+          {[](auto& d) { d.onArguments = [] { throw std::runtime_error("no pose"); }; },
+           "it threw an exception: no pose"},
+          {[](auto& d) { d.onArguments = [] { throw std::bad_alloc(); }; }, "out of memory"},
+          {[](auto& d) { d.onArguments = [] { throw 7; }; }, "it threw an exception"}}) {
+        makeEvaluator();
+        vyra::DeformableMesh& bad = addMesh(grid(4, "bad"));
+        row.spoil(bad.add<TestDeformer>("skin"));
+        expectFailure(bad, std::string("mesh 'bad': deformer 'skin': ") + row.message);
+        deformer(bad).problem.clear();
+        deformer(bad).onArguments = nullptr;
+        evaluate();
+        EXPECT_TRUE(bad.status().ok()) << bad.status().message;
+    }
+}
+
+// Of the meshes that the CPU deforms.
+class EvaluatorOnCpuTest : public EvaluatorTest {
+protected:
+    void SetUp() override
+    {
+        settings.writeVertices = [this](vyra::DeformableMesh& mesh, const vyra::Surface& surface) {
+            written.push_back(mesh.geometry().name + " " +
+                              std::to_string(static_cast<int>(surface.positions[0].x)));
+            if (onWrite)
+                onWrite();
+        };
+    }
+    Lines written; // name, and x of the first vertex
+    std::function<void()> onWrite;
+};
+
+TEST_F(EvaluatorOnCpuTest, WithoutOpenCLEveryMeshIsDeformedAndFailuresAreReported)
+{
+    world.platforms.clear();
+    EXPECT_FALSE(start());
+    settings.finishRenderer = nullptr;
+    makeEvaluator();
+    EXPECT_FALSE(evaluator->usesOpenCL());
+    vyra::DeformableMesh& a = addChain();
+    vyra::DeformableMesh& b = addChain();
+    frame();
+    EXPECT_EQ(written, (Lines{"a 2", "b 2"}));
+    EXPECT_TRUE(evaluator->status().ok());
+    EXPECT_FALSE(a.usesOpenCL());
+
+    const auto expectFailure = [&](const char* reason) {
+        written.clear();
+        frame();
+        EXPECT_EQ(written, Lines{"b 2"});
+        EXPECT_EQ(a.status().message, std::string("mesh 'a': deformer 'twist': ") + reason);
+        EXPECT_EQ(evaluator->status().message, a.status().message);
+    };
+    deformer(a, 1).problem = "no";
+    expectFailure("no");
+    deformer(a, 1).problem.clear();
+    deformer(a, 1).onDeform = [] { throw std::runtime_error("no pose"); };
+    expectFailure("it threw an exception: no pose");
+    deformer(a, 1).onDeform = [] { throw 7; };
+    expectFailure("it threw an exception");
+    deformer(a, 1).enabled = false;
+    written.clear();
+    frame();
+    EXPECT_EQ(written, (Lines{"a 1", "b 2"}));
+    evaluator->destroyMesh(b);
+    EXPECT_TRUE(evaluator->replaceKernelFile("test.cl", "#error").ok());
+    EXPECT_EQ(calls(), Lines{});
+}
+
+TEST_F(EvaluatorOnCpuTest, SmallMeshesAreWrittenWhileOthersUseOpenCL)
+{
+    startIn(1, 1);
+    vyra::DeformableMesh& small = addMesh(kSmallest - 1);
+    small.add<TestDeformer>();
+    addChain();
+    EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), 2U);
+    EXPECT_EQ(written, Lines{"a 1"});
+    EXPECT_FALSE(small.usesOpenCL());
+    EXPECT_EQ(countOf(callsOfEvaluation(), "clCreateBuffer"), 0U);
+}
+
+// In functions of the settings, which run while an evaluation is open.
+TEST_F(EvaluatorOnCpuTest, MeshesComeAndGoAndNothingIsEvaluatedInsideAnEvaluation)
+{
+    startIn(1, 1);
+    vyra::DeformableMesh& small = addMesh(kSmallest - 1);
+    vyra::DeformableMesh& large = addChain();
+    frame();
+    bool called = false;
+    onWrite = [&] {
+        if (std::exchange(called, true))
+            return;
+        evaluate();
+        EXPECT_THAT(evaluator->status().message, HasSubstr("inside an evaluation"));
+        EXPECT_THAT(evaluator->deform().message, StartsWith("nothing was evaluated: "));
+        evaluator->destroyMesh(large);
+        evaluator->destroyMesh(small);
+        addChain();
+    };
+    Lines lines = callsOfEvaluation();
+    EXPECT_EQ(countOf(lines, "clEnqueueAcquire"), 1U);
+    EXPECT_EQ(countOf(lines, "clEnqueueRelease"), 1U);
+    EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U);
+    EXPECT_THAT(evaluator->status().message, HasSubstr("inside an evaluation"));
+    EXPECT_EQ(evaluator->batchSize(), 2U);
+    lines = callsOfEvaluation();
+    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+    EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U);
+}
+
+TEST_F(EvaluatorTest, MeshesComeAndGoWhileTheRendererFinishes)
+{
+    vyra::DeformableMesh* gone = nullptr;
+    settings.finishRenderer = [&] {
+        if (!gone)
+            return;
+        evaluate();
+        EXPECT_THAT(evaluator->status().message, HasSubstr("inside an evaluation"));
+        evaluator->destroyMesh(*std::exchange(gone, nullptr));
+        addChain();
+    };
+    startIn(3, 1);
+    gone = &addChain();
+    addChain();
+    evaluate();
+    EXPECT_EQ(evaluator->batchSize(), 4U);
+    EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), 4U);
+    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+}
+
+TEST_F(EvaluatorTest, WhatCannotBeEvaluatedIsRefusedWithoutACall)
+{
+    startIn(1, 1);
+    addChain();
+    calls();
+    evaluator->evaluate(em::Id(0xFFFE));
+    EXPECT_THAT(evaluator->status().message, HasSubstr("65534 never names an evaluation"));
+    EXPECT_EQ(calls(), Lines{});
+
+    settings.finishRenderer = nullptr;
+    makeEvaluator();
+    addChain();
+    calls();
+    evaluate();
+    EXPECT_THAT(evaluator->status().message, HasSubstr("finishRenderer is not set"));
+    EXPECT_EQ(evaluator->deform().message, evaluator->status().message);
+    EXPECT_EQ(calls(), Lines{});
+}
+
+} // namespace

@@ -1,0 +1,296 @@
+// Who opens and closes evaluations, and what goes when: memory never dies while a command that is
+// not complete uses it, which the runtime notes as wrong use.
+#include "EvaluatorTest.h"
+
+#include "bridge/IDeformerEvaluatorBridge.h"
+
+using namespace scripted;
+using testing::HasSubstr;
+
+namespace {
+
+const em::Id kHosts(7);
+
+class EvaluatorLifetimeTest : public EvaluatorTest {
+protected:
+    // Two meshes that have been drawn; commands stay incomplete from now on.
+    void startWithMeshes(int clToGraphics = 1)
+    {
+        startIn(1, clToGraphics);
+        fMesh = &addChain();
+        fOther = &addChain();
+        frame();
+        frame();
+        runtime().holdCommands(true);
+        calls();
+    }
+    void expectBatchRelease(std::size_t count, const char* when)
+    {
+        EXPECT_EQ(callsOf("clEnqueueRelease").size(), count) << when;
+    }
+
+    vyra::DeformableMesh* fMesh = nullptr;
+    vyra::DeformableMesh* fOther = nullptr;
+};
+
+TEST_F(EvaluatorLifetimeTest, MeshDestroyedAfterAnEvaluationWaitsForItsCommands)
+{
+    startWithMeshes();
+    evaluate();
+    evaluator->destroyMesh(*fMesh);
+    EXPECT_EQ(evaluator->batchSize(), 2U);
+    EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), 2U);
+    evaluator->destroyMesh(*fOther);
+    evaluate();
+    EXPECT_TRUE(evaluator->status().ok());
+}
+
+TEST_F(EvaluatorLifetimeTest, MeshDestroyedInTheHostsEvaluationIsReleasedFirst)
+{
+    startWithMeshes();
+    manager().PreEvaluate(kHosts);
+    EXPECT_TRUE(evaluator->deform().ok());
+    evaluator->destroyMesh(*fMesh);
+    expectBatchRelease(2, "one for each vertex buffer of the mesh");
+    manager().PostEvaluate(kHosts);
+    expectBatchRelease(1, "the rest of the batch");
+    evaluate();
+    EXPECT_EQ(runtime().acquired(), Lines{});
+}
+
+TEST_F(EvaluatorLifetimeTest, MeshDestroyedBeforeTheHostsEvaluationDeformsIt)
+{
+    startWithMeshes();
+    evaluate();
+    manager().PreEvaluate(kHosts);
+    evaluator->destroyMesh(*fMesh);
+    evaluator->deform();
+    manager().PostEvaluate(kHosts);
+    EXPECT_TRUE(evaluator->status().ok());
+}
+
+TEST_F(EvaluatorLifetimeTest, EvaluatorDestroyedWithCommandsPending)
+{
+    startWithMeshes();
+    evaluate();
+    evaluator.reset();
+}
+
+TEST_F(EvaluatorLifetimeTest, EvaluatorDestroyedInTheHostsEvaluation)
+{
+    startWithMeshes(3);
+    // Of another evaluator, so that there is something to release in the end.
+    vyra::Evaluator second(settings);
+    second.createMesh(grid(4, "z"), {.positions = 90, .normals = 91});
+    manager().PreEvaluate(kHosts);
+    addChain(); // outside the batch
+    evaluator->deform();
+    addMesh();
+    evaluator.reset();
+    manager().PostEvaluate(kHosts);
+}
+
+TEST_F(EvaluatorLifetimeTest, DeformTwiceInOneEvaluationWhileABufferIsOutsideTheBatch)
+{
+    startWithMeshes(3);
+    manager().PreEvaluate(kHosts);
+    addChain();
+    for (int i = 0; i < 3; ++i)
+        EXPECT_TRUE(evaluator->deform().ok()) << evaluator->status().message;
+    manager().PostEvaluate(kHosts);
+    evaluator->waitUntilDrawable();
+}
+
+TEST_F(EvaluatorLifetimeTest, UnbatchedBufferIsAcquiredAfterItsLastRelease)
+{
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startWithMeshes();
+    evaluate();
+    evaluate();
+    evaluator->destroyMesh(*fMesh);
+}
+
+TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveTheirCommands)
+{
+    startWithMeshes();
+    const auto replace = [](vyra::DeformableMesh& mesh) {
+        deformer(mesh).weights = vyra::ConstantArray(std::vector<float>{3});
+    };
+    for (int i = 0; i < 3; ++i) {
+        evaluate();
+        replace(*fMesh);
+        if (i == 1) {
+            EXPECT_TRUE(evaluator->replaceKernelFile("test.cl", kKernelText).ok());
+        }
+    }
+    runtime().completeCommands();
+    evaluate();
+    evaluate();
+    // The rest pose, the weights in use, the numbers and the memory between the two deformers.
+    const std::size_t queues = runtime().created(Kind::kQueue) - 2;
+    const auto living = [] {
+        Lines lines = runtime().balance();
+        std::erase_if(lines, [](const std::string& line) { return !line.starts_with("mem"); });
+        return lines.size();
+    };
+    EXPECT_LE(living(), 4U + 4U + 3U + queues + 2 * queues);
+}
+
+TEST_F(EvaluatorLifetimeTest, NumbersThatNeedMoreMemoryWaitForTheKernelsThatReadTheFormer)
+{
+    startWithMeshes();
+    for (const std::size_t count : {16U, 400U, 4U, 1000U}) {
+        deformer(*fMesh).numbers.assign(count, 5);
+        evaluate();
+        EXPECT_TRUE(evaluator->status().ok());
+    }
+}
+
+TEST_F(EvaluatorLifetimeTest, MemoryOfAGeometryGoesWithItsLastMesh)
+{
+    startIn(1, 1);
+    std::shared_ptr<const vyra::MeshGeometry> geometry = grid(4, "shared");
+    vyra::DeformableMesh& first = addMesh(geometry);
+    vyra::DeformableMesh& second = addMesh(std::move(geometry));
+    calls();
+    evaluator->destroyMesh(first);
+    EXPECT_EQ(callsOf("clReleaseMemObject").size(), 2U) << "the vertex buffers";
+    evaluator->destroyMesh(second);
+    EXPECT_EQ(callsOf("clReleaseMemObject").size(), 4U) << "and the rest pose";
+}
+
+struct HostRow : Named {
+    bool batched;      // the meshes are in the batch when the host opens its evaluation
+    bool acquireFails; // of the batch
+    bool noBatching = false;
+};
+
+// The evaluation that a host opened with the same id stays open in evaluate, and its own is closed.
+class HostsEvaluationTest : public EvaluatorTest, public ::testing::WithParamInterface<HostRow> {};
+
+TEST_P(HostsEvaluationTest, StaysOpen)
+{
+    const HostRow& row = GetParam();
+    if (row.noBatching)
+        setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startIn(1, 1);
+    if (row.batched) {
+        addChain();
+        frame();
+    }
+    for (int round = 0; round < 2; ++round) {
+        if (row.acquireFails)
+            runtime().plan({.function = "clEnqueueAcquireGLObjects"});
+        manager().PreEvaluate(kHosts);
+        runtime().clearFaults();
+        if (round == 0 && !row.batched)
+            addChain();
+        calls();
+        evaluator->evaluate(kHosts);
+        evaluator->evaluate(kHosts);
+        const bool inBatch = row.batched || (round > 0 && !row.noBatching);
+        EXPECT_EQ(evaluator->status().ok(), !(row.acquireFails && inBatch));
+        EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 0U : 2U);
+        manager().PostEvaluate(kHosts);
+        EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 1U : 0U);
+        if (row.acquireFails) {
+            EXPECT_FALSE(warnings().empty());
+            runtime().takeMisuse(); // the release of what was not acquired, which the rules ask for
+        }
+    }
+    const Lines lines = callsOfEvaluation();
+    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+    EXPECT_EQ(countOf(lines, "clEnqueueReleaseGLObjects(queue#1"), 1U) << "its own is closed";
+}
+INSTANTIATE_TEST_SUITE_P(Evaluator, HostsEvaluationTest,
+                         ::testing::Values(HostRow{"Batched", true, false},
+                                           HostRow{"FirstOfItsMeshes", false, false},
+                                           HostRow{"AcquireFails", true, true},
+                                           HostRow{"WithoutBatching", false, false, true}),
+                         ::testing::PrintToStringParamName());
+
+TEST_F(EvaluatorLifetimeTest, EvaluationWhoseAcquireFailsIsClosed)
+{
+    startIn(1, 1);
+    addChain();
+    for (const char* when : {"first", "later"}) {
+        runtime().plan({.function = "clEnqueueAcquireGLObjects"});
+        evaluate();
+        runtime().clearFaults();
+        EXPECT_THAT(evaluator->status().message,
+                    HasSubstr("mesh 'a': deformer 'twist': acquiring a vertex buffer failed"))
+            << when;
+        evaluate();
+        EXPECT_TRUE(evaluator->status().ok()) << when << evaluator->status().message;
+        EXPECT_EQ(runtime().acquired(), Lines{});
+        runtime().takeMisuse();
+        warnings();
+    }
+}
+
+TEST_F(EvaluatorLifetimeTest, BatchedBufferWithoutAnAcquireEventIsNotWritten)
+{
+    startWithMeshes();
+    runtime().plan({.function = "clEnqueueAcquireGLObjects", .status = CL_SUCCESS});
+    const Lines lines = callsOfEvaluation();
+    runtime().clearFaults();
+    EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U) << "the first deformers alone";
+    EXPECT_EQ(fMesh->status().openCL, CL_INVALID_EVENT);
+    EXPECT_EQ(runtime().acquired(), Lines{});
+    evaluate();
+    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+}
+
+TEST_F(EvaluatorLifetimeTest, DeformIsRefusedUnlessAnEvaluationIsOpen)
+{
+    startWithMeshes();
+    EXPECT_THAT(evaluator->deform().message, HasSubstr("no evaluation is open"));
+    EXPECT_EQ(callsOf("clEnqueue"), Lines{});
+    evaluate();
+    EXPECT_TRUE(evaluator->status().ok());
+}
+
+TEST_F(EvaluatorLifetimeTest, EvaluatorWithdrawsFromTheBridgeOnlyItself)
+{
+    startIn(1, 1);
+    IDeformerEvaluatorBridge::setAPI(evaluator.get());
+    addChain();
+    calls();
+    IDeformerEvaluatorBridge::getAPI()->evaluate(em::Id(1));
+    EXPECT_EQ(callsOf("clEnqueueNDRangeKernel").size(), 2U);
+    {
+        const vyra::Evaluator second(settings);
+    }
+    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), evaluator.get());
+    evaluator.reset();
+    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);
+}
+
+TEST_F(EvaluatorLifetimeTest, TwoEvaluatorsShareTheBatch)
+{
+    startWithMeshes();
+    vyra::Evaluator second(settings);
+    second.createMesh(grid(4, "z"), {.positions = 90, .normals = 91}).add<TestDeformer>();
+    evaluate();
+    evaluate();
+    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+    for (std::uint16_t id = 20; id < 23; ++id)
+        second.evaluate(em::Id(id));
+    EXPECT_TRUE(second.status().ok()) << second.status().message;
+}
+
+TEST_F(EvaluatorTest, EvaluatorWithoutAQueueDeformsOnTheCpuAndSaysWhy)
+{
+    startIn(1, 1);
+    runtime().plan({.function = "clCreateCommandQueue", .onwards = true});
+    makeEvaluator();
+    runtime().clearFaults();
+    EXPECT_FALSE(evaluator->usesOpenCL());
+    addChain();
+    evaluate();
+    EXPECT_THAT(evaluator->status().message, HasSubstr("OpenCL creates no command queue"));
+    EXPECT_THAT(evaluator->prepare().message, HasSubstr("OpenCL creates no command queue"));
+    EXPECT_FALSE(warnings().empty());
+}
+
+} // namespace

@@ -1,0 +1,294 @@
+// The calls of evaluations without faults: how many there are, in which order, and which memory
+// each deformer reads and writes.
+#include "EvaluatorTest.h"
+#include "FakeHost.h"
+
+#include <map>
+
+using namespace scripted;
+using testing::HasSubstr;
+
+namespace {
+
+TEST_F(EvaluatorTest, SteadyStateTakesThreeCommandsPerMeshAndNoCallForWhatIsUnchanged)
+{
+    startIn(1, 1);
+    const std::size_t queues = runtime().created(Kind::kQueue) - 2;
+    std::vector<vyra::DeformableMesh*> meshes;
+    while (meshes.size() < 2 * queues + 1)
+        meshes.push_back(&addChain());
+    for (int warmUp = 0; warmUp < 3; ++warmUp)
+        frame();
+    ASSERT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+
+    const auto check = [&](std::size_t uploads) {
+        const Lines lines = callsOfEvaluation();
+        const Lines releases = linesOf(lines, "clEnqueueRelease");
+        ASSERT_EQ(releases.size(), 1U);
+        EXPECT_EQ(lastListOf(releases[0]).size(), 1 + queues) << "the acquire, one event a queue";
+        EXPECT_EQ(countOf(lines, "clEnqueueAcquire"), 1U);
+        EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2 * meshes.size());
+        EXPECT_EQ(countOf(lines, "clEnqueueWriteBuffer"), uploads);
+        EXPECT_EQ(countOf(lines, "clEnqueue"), 2 + uploads + 2 * meshes.size());
+        for (const char* none : {"clSetKernelArg", "clCreate", "clGet", "clFinish"})
+            EXPECT_EQ(countOf(lines, none), 0U) << none;
+    };
+    check(0);
+    deformer(*meshes[0]).numbers[2] = 7;
+    check(1);
+    for (vyra::DeformableMesh* mesh : meshes)
+        deformer(*mesh).numbers[0] = 8;
+    check(queues);
+    check(0);
+    EXPECT_EQ(evaluator->batchSize(), 2 * meshes.size());
+}
+
+TEST_F(EvaluatorTest, UploadCoversTheNumbersThatChangedAndNoOthers)
+{
+    startIn(1, 1);
+    vyra::DeformableMesh& mesh = addMesh();
+    for (int i = 0; i < 3; ++i)
+        mesh.add<TestDeformer>("skin", "full").numbers.resize(6); // two float4 each
+    evaluate();
+    deformer(mesh, 1).numbers[4] = 9;
+    EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
+                testing::ElementsAre(HasSubstr(", 0, 32, 24, ptr, []")));
+    deformer(mesh, 0).numbers[4] = 9;
+    deformer(mesh, 2).numbers[0] = 9;
+    EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
+                testing::ElementsAre(HasSubstr(", 0, 0, 88, ptr, []")));
+    deformer(mesh, 1).numbers[4] = 8;
+    deformer(mesh, 0).enabled = false; // the others move to the front
+    EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
+                testing::ElementsAre(HasSubstr(", 0, 0, 56, ptr, []")));
+}
+
+// What the kernels read and write, one pair of letters each: R is the rest pose, V the vertex
+// buffer, A and B are memory of the pool. `first` is 0 for positions and 1 for normals.
+std::string memoryOf(const Lines& kernelLines, std::size_t first)
+{
+    std::map<std::string, char> letters;
+    std::string text;
+    char next = 'A';
+    for (std::size_t i = 0; i < kernelLines.size(); ++i) {
+        std::string line = kernelLines[i];
+        line.resize(line.rfind(']') + 1);
+        const Lines memory = lastListOf(line);
+        text += text.empty() ? "" : " ";
+        letters.try_emplace(memory[first], i == 0 ? 'R' : next);
+        text += letters[memory[first]];
+        if (letters.try_emplace(memory[first + 2], i + 1 == kernelLines.size() ? 'V' : next).second)
+            next = static_cast<char>(next + 1);
+        text += letters[memory[first + 2]];
+    }
+    return text;
+}
+
+struct ChainRow {
+    const char* chain; // i: may run in place, n: reads neighbours, -: not enabled, 2: two passes
+    const char* memory;
+};
+
+TEST_F(EvaluatorTest, DeformersRunInPlaceOnlyIfTheyReadNoNeighbours)
+{
+    startIn(1, 1);
+    for (const ChainRow& row : {ChainRow{"i", "RV"},
+                                {"n", "RV"},
+                                {"ii", "RA AV"},
+                                {"iii", "RA AA AV"},
+                                {"nn", "RA AV"},
+                                {"nnn", "RA AB BV"},
+                                {"nnnn", "RA AB BA AV"},
+                                {"nin", "RA AA AV"},
+                                {"ini", "RA AB BV"},
+                                {"innii", "RA AB BA AA AV"},
+                                {"i-n", "RA AV"},
+                                {"-n-", "RV"},
+                                {"2", "RA AV"},
+                                {"2n", "RA AB BV"},
+                                {"n22", "RA AB BA AB BV"}}) {
+        makeEvaluator();
+        vyra::DeformableMesh& mesh = addMesh();
+        for (const char kind : std::string(row.chain)) {
+            auto& added = mesh.add<TestDeformer>();
+            added.neighbours = kind == 'n' || kind == '2';
+            added.enabled = kind != '-';
+            added.passes = kind == '2' ? 2 : 1;
+        }
+        evaluate();
+        for (int evaluation = 0; evaluation < 2; ++evaluation) {
+            const Lines kernelLines = linesOf(callsOfEvaluation(), "clEnqueueNDRangeKernel");
+            EXPECT_EQ(memoryOf(kernelLines, 0), row.memory) << row.chain;
+            EXPECT_EQ(memoryOf(kernelLines, 1), row.memory) << row.chain;
+        }
+        EXPECT_LE(evaluator->counts().buffersCreated, 4U) << row.chain;
+    }
+}
+
+TEST_F(EvaluatorTest, OnlyTheLastKernelWaitsForTheAcquire)
+{
+    startIn(1, 1);
+    addChain().add<TestDeformer>("wave");
+    evaluate();
+    const Lines lines = callsOfEvaluation();
+    const std::string acquired = linesOf(lines, "clEnqueueAcquire")[0];
+    const std::string event = acquired.substr(acquired.rfind(' ') + 1);
+    EXPECT_THAT(linesOf(lines, "clEnqueueNDRangeKernel"),
+                testing::ElementsAre(HasSubstr(", []) on"), HasSubstr(", []) on"),
+                                     HasSubstr(", [" + event + "]) on")));
+}
+
+TEST_F(EvaluatorTest, WithoutEnabledDeformersTheRestPoseIsCopiedOnce)
+{
+    startIn(1, 1);
+    vyra::DeformableMesh& mesh = addMesh();
+    auto& deformer = mesh.add<TestDeformer>();
+    const auto expect = [&](bool enabled, unsigned passes, std::size_t kernelsRun,
+                            std::size_t copies) {
+        deformer.enabled = enabled;
+        deformer.passes = passes;
+        const Lines lines = callsOfEvaluation();
+        EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), kernelsRun);
+        EXPECT_EQ(countOf(lines, "clEnqueueCopyBuffer"), copies);
+    };
+    expect(false, 1, 0, 2);
+    expect(false, 1, 0, 0);
+    expect(true, 0, 0, 0);
+    expect(true, 1, 1, 0);
+    expect(true, 0, 0, 2);
+    runtime().plan({.function = "clEnqueueCopyBuffer", .nth = 2});
+    expect(true, 1, 1, 0);
+    expect(false, 1, 0, 2); // the second one fails
+    EXPECT_FALSE(mesh.status().ok());
+    expect(false, 1, 0, 2);
+    expect(false, 1, 0, 0);
+}
+
+TEST_F(EvaluatorTest, ConstantsAreUploadedOnceForAllMeshesThatShareThem)
+{
+    startIn(1, 1);
+    const auto geometry = grid(4, "shared");
+    std::vector<vyra::DeformableMesh*> meshes;
+    const vyra::ConstantArray weights(std::vector<float>{1, 2, 3});
+    calls();
+    for (int i = 0; i < 4; ++i) {
+        meshes.push_back(&addMesh(geometry));
+        meshes.back()->add<TestDeformer>("skin", "full").weights = weights;
+    }
+    EXPECT_TRUE(evaluator->prepare().ok());
+    EXPECT_EQ(linesOf(calls(), "clCreateBuffer").size(), 3 + runtime().created(Kind::kQueue) - 2)
+        << "positions, normals, weights, and the numbers of each queue";
+    Lines lines = callsOfEvaluation();
+    EXPECT_EQ(countOf(lines, "clCreateBuffer"), 0U);
+    deformer(*meshes[0]).weights = vyra::ConstantArray(std::vector<float>{4});
+    deformer(*meshes[1]).weights = {};
+    lines = callsOfEvaluation();
+    EXPECT_EQ(countOf(lines, "clCreateBuffer"), 1U);
+    EXPECT_EQ(countOf(lines, "clSetKernelArg"), 2U);
+    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+}
+
+// Buffers outside the batch: each is acquired on its mesh's queue, all are released at once.
+TEST_F(EvaluatorTest, BuffersOutsideTheBatchAreReleasedTogetherAfterTheRenderersCommands)
+{
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startIn(1, 1);
+    addChain();
+    addChain();
+    evaluate();
+    for (int i = 0; i < 2; ++i) {
+        const Lines lines = callsOfEvaluation();
+        EXPECT_EQ(lines[0], "finishRenderer()");
+        EXPECT_EQ(countOf(lines, "clEnqueueAcquire"), 4U);
+        EXPECT_EQ(countOf(lines, "clEnqueueAcquireGLObjects(queue#1"), 0U);
+        EXPECT_EQ(countOf(lines, "clEnqueueReleaseGLObjects(queue#1"), 1U);
+        EXPECT_EQ(countOf(lines, "clEnqueueRelease"), 1U);
+        evaluator->waitUntilDrawable();
+    }
+    EXPECT_EQ(evaluator->batchSize(), 0U);
+    EXPECT_EQ(evaluator->counts().acquires, 12U);
+    EXPECT_EQ(evaluator->counts().releases, 3U);
+    EXPECT_EQ(evaluator->counts().evaluations, 3U);
+}
+
+struct ModeRow : Named {
+    int graphicsToCL;
+    int clToGraphics;
+    std::string beforeEvaluation; // the first function that evaluate calls
+    Lines whenDrawable;           // functions of waitUntilDrawable
+    Lines afterRendering;         // functions of renderingComplete
+};
+
+class EvaluatorModeTest : public EvaluatorTest, public ::testing::WithParamInterface<ModeRow> {
+protected:
+    Lines functions()
+    {
+        Lines names = calls();
+        for (std::string& line : names)
+            line.resize(line.find('('));
+        std::erase_if(names, [](const std::string& name) { return name == "clFlush"; });
+        return names;
+    }
+};
+
+TEST_P(EvaluatorModeTest, LeavesItsWaitsToTheEvaluator)
+{
+    settings.flushRenderer = [] { runtime().log("flushRenderer()"); };
+    startIn(GetParam().graphicsToCL, GetParam().clToGraphics);
+    addChain();
+    frame();
+    runtime().scriptEventStatuses({CL_RUNNING, CL_RUNNING, CL_COMPLETE});
+    calls();
+    evaluate();
+    EXPECT_EQ(functions()[0], GetParam().beforeEvaluation);
+    evaluator->waitUntilDrawable();
+    EXPECT_EQ(functions(), GetParam().whenDrawable);
+    evaluator->renderingComplete();
+    EXPECT_EQ(functions(), GetParam().afterRendering);
+}
+INSTANTIATE_TEST_SUITE_P(
+    Modes, EvaluatorModeTest,
+    ::testing::Values(
+        ModeRow{"Implicit", 1, 1, "clRetainEvent", {}, {"flushRenderer"}},
+        ModeRow{"FinishAndQuery",
+                3,
+                2,
+                "finishRenderer",
+                {"clGetEventInfo", "clGetEventInfo", "clGetEventInfo"},
+                {"flushRenderer"}},
+        ModeRow{"FenceAndSyncObject", 2, 3, "clRetainEvent", {}, {"glFenceSync", "flushRenderer"}},
+        ModeRow{"Finish", 1, 4, "clRetainEvent", {"clFinish", "clFinish"}, {"flushRenderer"}}),
+    ::testing::PrintToStringParamName());
+
+TEST_F(EvaluatorTest, QueryModeEndsAtACommandThatFailed)
+{
+    startIn(1, 2);
+    addChain();
+    runtime().scriptEventStatuses({CL_OUT_OF_RESOURCES});
+    evaluate();
+    evaluator->waitUntilDrawable(); // and does not query forever
+    EXPECT_GE(callsOf("clGetEventInfo").size(), 1U);
+}
+
+TEST_F(EvaluatorTest, TraceReceivesEachCommandOnceInTheHostsTime)
+{
+    host().sampling = true;
+    std::int64_t now = 0;
+    std::map<std::string, int> commands;
+    settings.traceClock = [&now] { return now += 1'000'000; };
+    settings.traceCommand = [&](const std::string& track, const char* name, std::int64_t begin,
+                                std::int64_t end) {
+        EXPECT_EQ(track, "OpenCL queue 1");
+        EXPECT_LT(begin, end);
+        EXPECT_GT(begin, 0);
+        ++commands[name];
+    };
+    startIn(1, 1);
+    addChain();
+    runtime().holdCommands(true);
+    for (int i = 0; i < 2; ++i)
+        frame();
+    EXPECT_EQ(commands, (std::map<std::string, int>{{"Upload", 1}, {"skin", 2}, {"twist", 2}}));
+}
+
+} // namespace
