@@ -96,11 +96,12 @@ void DeformationQueue::begin(cl_event releasedAlone)
     fReleasedAlone = releasedAlone;
 }
 
-void DeformationQueue::prepare(KernelLibrary& library)
+// Collects passes, arguments and numbers of all meshes, and uploads the numbers.
+void DeformationQueue::collect(KernelLibrary& library, unsigned leastPasses)
 {
     fFrame.begin();
     for (DeformableMesh* mesh : fMeshes)
-        attempt(*mesh, [&] { return collectArguments(*mesh, library); });
+        attempt(*mesh, [&] { return collectMesh(*mesh, library, leastPasses); });
     AutoCLObject<cl_event> uploaded;
     fUpload = fFrame.upload(fQueue, uploaded);
     noteCommand("Upload", uploaded);
@@ -108,7 +109,7 @@ void DeformationQueue::prepare(KernelLibrary& library)
 
 void DeformationQueue::deform(KernelLibrary& library)
 {
-    prepare(library);
+    collect(library, 0);
     for (DeformableMesh* mesh : fMeshes) {
         attempt(*mesh, [&] { return enqueueMesh(*mesh); });
         // The next mesh may reuse the memory, since its commands run later.
@@ -119,8 +120,8 @@ void DeformationQueue::deform(KernelLibrary& library)
         fCL.clFlush(fQueue);
 }
 
-// Collects the passes of the enabled deformers, and their arguments.
-Status DeformationQueue::collectArguments(DeformableMesh& mesh, KernelLibrary& library)
+Status DeformationQueue::collectMesh(DeformableMesh& mesh, KernelLibrary& library,
+                                     unsigned leastPasses)
 {
     mesh.state().active.clear();
     mesh.state().passes.resize(mesh.deformers().size());
@@ -128,24 +129,24 @@ Status DeformationQueue::collectArguments(DeformableMesh& mesh, KernelLibrary& l
         const Deformer& deformer = *mesh.deformers()[i];
         if (!deformer.enabled)
             continue;
-        Status status = guarded([&] { return collectPasses(mesh, i, library); });
+        Status status = guarded([&] { return collectPasses(mesh, i, library, leastPasses); });
         if (!status.ok())
             return ofDeformer(deformer, std::move(status));
     }
     return {};
 }
 
+// Creates the kernels of at least `leastPasses` passes of a deformer, also of one whose present
+// settings need none.
 Status DeformationQueue::collectPasses(DeformableMesh& mesh, std::size_t index,
-                                       KernelLibrary& library)
+                                       KernelLibrary& library, unsigned leastPasses)
 {
     Deformer& deformer = *mesh.deformers()[index];
     auto& passes = mesh.state().passes[index];
     if (std::string text = deformer.mismatch(mesh.geometry()); !text.empty())
         return Status(std::move(text));
     const unsigned count = deformer.passCount();
-    // The first kernel also if the present settings need none: one that does not compile is found
-    // before it is needed.
-    for (unsigned i = 0; i < std::max(count, 1U); ++i) {
+    for (unsigned i = 0; i < std::max(count, leastPasses); ++i) {
         if (i == passes.size())
             passes.push_back(std::make_unique<KernelPass>(fCL, deformer, i, fRetired));
         Status status = passes[i]->prepare(library);

@@ -49,10 +49,12 @@ public:
     // Starts an evaluation. `releasedAlone` is the event of the last release of buffers outside the
     // batch, or null; it is borrowed until deform() returns.
     void begin(cl_event releasedAlone);
-    // Creates the kernels that are missing or were replaced, sets the arguments that changed and
-    // uploads the numbers of all meshes. Failures are in the statuses of the meshes. Never throws.
-    void prepare(KernelLibrary& library);
-    // The same, then enqueues the kernels and submits them. Once after begin(); never throws.
+    // Creates the kernels of the enabled deformers that are missing or were replaced, also those
+    // that the present settings do not need, sets the arguments that changed and uploads the
+    // numbers of all meshes. Failures are in the statuses of the meshes. Never throws.
+    void prepare(KernelLibrary& library) { collect(library, 1); }
+    // The same for the kernels that are needed, which it enqueues and submits. Once after begin();
+    // never throws.
     void deform(KernelLibrary& library);
     // The event of the last command since begin(); empty if there was none.
     const AutoCLObject<cl_event>& lastEvent() const { return fLast; }
@@ -69,8 +71,10 @@ public:
 private:
     explicit DeformationQueue(const OpenCLFunctions& cl) : fCL(cl) {}
 
-    Status collectArguments(DeformableMesh& mesh, KernelLibrary& library);
-    Status collectPasses(DeformableMesh& mesh, std::size_t deformer, KernelLibrary& library);
+    void collect(KernelLibrary& library, unsigned leastPasses);
+    Status collectMesh(DeformableMesh& mesh, KernelLibrary& library, unsigned leastPasses);
+    Status collectPasses(DeformableMesh& mesh, std::size_t index, KernelLibrary& library,
+                         unsigned leastPasses);
     Status enqueueMesh(DeformableMesh& mesh);
     Status enqueuePasses(DeformableMesh& mesh);
     Status enqueuePass(DeformableMesh& mesh, std::size_t index, VertexMemory& input,

@@ -1,6 +1,6 @@
 // The calls of evaluations without faults: how many there are, in which order, and which memory
 // each deformer reads and writes.
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 #include "FakeHost.h"
 
 #include <map>

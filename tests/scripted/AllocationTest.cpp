@@ -9,7 +9,6 @@
 #include "interop/ConcurrentEventList.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <functional>
 #include <iterator>
 #include <new>

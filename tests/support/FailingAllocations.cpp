@@ -23,7 +23,7 @@ bool nextFails()
     if (InsideRuntime::here())
         return false;
     ++allocations;
-    if (allocationsLeft == 0 || --allocationsLeft > 0)
+    if (allocationsLeft == 0 || (allocationsLeft > 1 && --allocationsLeft > 0))
         return false;
     allocationsLeft = allLaterFail ? 1 : 0;
     ++failures;

@@ -1,6 +1,6 @@
 // Bad input: each mesh that cannot be deformed has a status that names it and the reason, and all
 // others go on.
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 
 #include <limits>
 #include <stdexcept>

@@ -1,4 +1,4 @@
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 
 #include <algorithm>
 #include <fstream>

@@ -1,6 +1,6 @@
 // Many meshes over several queues, and kernels that are replaced meanwhile. Under ThreadSanitizer a
 // lock that is missing shows as a race here.
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 
 using namespace scripted;
 

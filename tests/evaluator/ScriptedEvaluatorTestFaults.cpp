@@ -1,7 +1,7 @@
 // Every OpenCL and OpenGL call of an evaluation fails in turn, once and from there on: the meshes
 // that it concerns report it and all others are deformed, everything that was enqueued is reported
 // to the release, nothing stays acquired, and later evaluations work.
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 
 #include <algorithm>
 #include <map>

@@ -1,6 +1,6 @@
 // Who opens and closes evaluations, and what goes when: memory never dies while a command that is
 // not complete uses it, which the runtime notes as wrong use.
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 
 #include "bridge/IDeformerEvaluatorBridge.h"
 

@@ -1,6 +1,6 @@
 // Kernel files: what is wrong with them is in the status of the mesh, a text that replaces one is
 // used only if it fits, and the host's warning sink receives everything all the while.
-#include "EvaluatorTest.h"
+#include "ScriptedEvaluator.h"
 
 #include "diagnostics/CLInternalWarning.h"
 #include "diagnostics/CLWarningSink.h"

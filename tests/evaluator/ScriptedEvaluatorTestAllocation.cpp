@@ -1,7 +1,7 @@
 // An evaluation allocates nothing once everything is built, and wherever memory runs out before,
 // nothing stays acquired, nothing is lost, and the next evaluation works.
-#include "EvaluatorTest.h"
 #include "FailingAllocations.h"
+#include "ScriptedEvaluator.h"
 
 #include <utility>
 
