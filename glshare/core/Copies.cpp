@@ -34,7 +34,7 @@ cl_int enqueueMarker(cl_command_queue queue, std::span<const cl_event> waitList,
 // some runtimes need time for each pair of a command and an event that it waits for.
 cl_int mapAll(cl_command_queue queue, CopyBatch& batch)
 {
-    CopyEvents& events = *batch.events;
+    CopyEvents& events = batch.events;
     const cl_map_flags access =
         batch.direction == CopyDirection::FromGl ? CL_MAP_WRITE : CL_MAP_READ;
     for (CopyItem& item : batch.items) {
@@ -61,9 +61,9 @@ cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
     for (const CopyItem& item : batch.items) {
         if (!item.isMapped)
             continue;
-        const cl_int error = batch.events->unmaps.add([&](cl_event* event) {
+        const cl_int error = batch.events.unmaps.add([&](cl_event* event) {
             return runtime().clEnqueueUnmapMemObject(queue, item.buffer->memory, item.pointer, 1,
-                                                     batch.events->copied.data(), event);
+                                                     batch.events.copied.data(), event);
         });
         if (error != CL_SUCCESS)
             result = error;
@@ -72,56 +72,56 @@ cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
 }
 
 // The last marker waits for what comes before the copies too, so that it fails if that does.
-cl_int enqueueDone(cl_command_queue queue, const CopyBatch& batch)
+cl_int enqueueDone(cl_command_queue queue, CopyBatch& batch)
 {
-    CopyEvents& events = *batch.events;
-    std::vector<cl_event> all(events.unmaps.begin(), events.unmaps.end());
-    all.push_back(events.copied.back());
-    all.push_back(batch.ready());
-    return enqueueMarker(queue, all, events.done);
+    CopyEvents& events = batch.events;
+    batch.waitList.assign(events.unmaps.begin(), events.unmaps.end());
+    batch.waitList.push_back(events.copied.back());
+    batch.waitList.push_back(batch.ready());
+    return enqueueMarker(queue, batch.waitList, events.done);
 }
 
-// The commands after the first. The copies are requested at the end: until then the caller alone
-// decides about the user event.
-cl_int enqueueRest(cl_command_queue queue, const std::shared_ptr<CopyBatch>& batch)
+cl_int enqueueAll(cl_command_queue queue, CopyBatch& batch, std::span<const cl_event> waitList)
 {
-    cl_int error = mapAll(queue, *batch);
+    cl_int error = enqueueMarker(queue, waitList, batch.events.started);
     if (error == CL_SUCCESS)
-        error = unmapAll(queue, *batch);
+        error = mapAll(queue, batch);
     if (error == CL_SUCCESS)
-        error = enqueueDone(queue, *batch);
+        error = unmapAll(queue, batch);
     if (error == CL_SUCCESS)
-        error = copyWhenReady(batch);
+        error = enqueueDone(queue, batch);
     return error;
 }
 
 } // namespace
 
-cl_int enqueueCopies(cl_command_queue queue, std::vector<CopyItem> items, CopyDirection direction,
+cl_int enqueueCopies(cl_command_queue queue, CopyBatch::Ptr& batch,
                      std::span<const cl_event> waitList, cl_event* done)
 {
-    const auto batch = std::make_shared<CopyBatch>();
-    batch->items = std::move(items);
-    batch->direction = direction;
-    batch->events->unmaps.reserve(batch->items.size()); // so that what is mapped can be unmapped
-    cl_int error = createUserEvent(queue, batch->events->copied);
+    batch->events.unmaps.reserve(batch->items.size()); // so that what is mapped can be unmapped
+    cl_int error = createUserEvent(queue, batch->events.copied);
     if (error != CL_SUCCESS)
         return error;
     try {
-        error = enqueueMarker(queue, waitList, batch->events->started);
-        if (error == CL_SUCCESS)
-            error = enqueueRest(queue, batch);
+        error = enqueueAll(queue, *batch, waitList);
     } catch (const std::exception&) {
         error = CL_OUT_OF_HOST_MEMORY;
     }
     if (error == CL_SUCCESS) {
-        *done = batch->events->done.back();
-        return runtime().clRetainEvent(*done); // the caller's reference
+        *done = batch->events.done.back();
+        error = runtime().clRetainEvent(*done); // the caller's reference
+    }
+    // Requested at the end: until then the caller alone decides about the user event.
+    if (error == CL_SUCCESS) {
+        error = CopyBatch::copyWhenReady(batch);
+        if (error == CL_SUCCESS)
+            return CL_SUCCESS;
+        runtime().clReleaseEvent(*done);
     }
     // What was mapped is unmapped again, if that is not in the queue already.
-    if (batch->events->unmaps.empty())
+    if (batch->events.unmaps.empty())
         static_cast<void>(unmapAll(queue, *batch));
-    runtime().clSetUserEventStatus(batch->events->copied.back(), CL_COMPLETE);
+    runtime().clSetUserEventStatus(batch->events.copied.back(), CL_COMPLETE);
     return error;
 }
 

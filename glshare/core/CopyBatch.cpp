@@ -1,57 +1,91 @@
 #include "core/CopyBatch.h"
 
 #include "core/Counters.h"
+#include "core/EventTypes.h"
 
-#include <cstdint>
-#include <exception>
-#include <map>
-#include <mutex>
+#include <algorithm>
 #include <utility>
 
 namespace glshare {
 
 namespace {
 
-// The batches whose callback is outstanding, by number: it may come late, or never, and then finds
-// nothing. Safe from any thread.
-class OutstandingBatches {
-public:
-    // Never destroyed, as a callback may come while the process exits.
-    static OutstandingBatches& get()
-    {
-        static auto* const theBatches = new OutstandingBatches;
-        return *theBatches;
-    }
+// Runtimes use the events of commands that fail for a while after they have shown it. Far longer
+// than that, as threads may be interrupted.
+constexpr std::chrono::milliseconds kUseAfterFailure{100};
 
-    std::uintptr_t add(const std::shared_ptr<CopyBatch>& batch)
-    {
-        const std::scoped_lock lock(mutex_);
-        std::erase_if(batches_, [](const auto& entry) { return entry.second.expired(); });
-        batches_.emplace(++last_, batch);
-        return last_;
-    }
+bool hasEnded(cl_event event)
+{
+    cl_int status = CL_COMPLETE; // of an event that cannot be asked
+    runtime().clGetEventInfo(event, CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status, &status,
+                             nullptr);
+    return status <= CL_COMPLETE;
+}
 
-    // Null if the batch is gone.
-    std::shared_ptr<CopyBatch> take(std::uintptr_t number)
-    {
-        const std::scoped_lock lock(mutex_);
-        const auto found = batches_.extract(number);
-        return found ? found.mapped().lock() : nullptr;
-    }
+// Comes on a thread of the runtime's, possibly late, or not at all when a command fails.
+void CL_CALLBACK onReady(cl_event /*event*/, cl_int /*status*/, void* /*user*/)
+{
+    GlWorker::lookNow();
+}
 
-private:
-    std::mutex mutex_; // guards the rest
-    std::map<std::uintptr_t, std::weak_ptr<CopyBatch>> batches_;
-    std::uintptr_t last_ = 0;
-};
+} // namespace
+
+void CopyEvents::clear() noexcept
+{
+    for (EventList* events : {&started, &maps, &mapped, &copied, &unmaps, &done})
+        events->clear();
+}
+
+CopyBatch::Ptr CopyBatch::take(std::shared_ptr<SharingContext> context)
+{
+    Ptr batch(context->takeBatch().release());
+    batch->context_ = std::move(context);
+    return batch;
+}
+
+cl_int CopyBatch::copyWhenReady(Ptr& batch)
+{
+    const cl_int error =
+        runtime().clSetEventCallback(batch->ready(), CL_COMPLETE, onReady, nullptr);
+    if (error != CL_SUCCESS)
+        return error;
+    GlWorker& worker = batch->context_->worker();
+    worker.watch(std::move(batch));
+    return CL_SUCCESS;
+}
+
+bool CopyBatch::run(GlDevice* device) noexcept
+{
+    if (!isSettled_) {
+        cl_int status = CL_QUEUED;
+        runtime().clGetEventInfo(ready(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status, &status,
+                                 nullptr);
+        if (status > CL_COMPLETE)
+            return false;
+        settle(status, device);
+    }
+    return hasEnded(events.done.back()) && (!hasFailed_ || mayBeReleased());
+}
+
+void CopyBatch::settle(cl_int status, GlDevice* device) noexcept
+{
+    isSettled_ = true;
+    hasFailed_ = status != CL_COMPLETE;
+    if (!hasFailed_ && device != nullptr)
+        copyAll(*device);
+    else if (!hasFailed_)
+        counters().failedCopies += items.size();
+    endOfUse_ = std::chrono::steady_clock::time_point::max();
+    runtime().clSetUserEventStatus(events.copied.back(), CL_COMPLETE);
+}
 
 // A buffer that is gone by now keeps what it holds: the application broke the rules after the
 // command was given, and all that is left is to end well.
-void copyAll(const CopyBatch& batch, GlDevice& device)
+void CopyBatch::copyAll(GlDevice& device) noexcept
 {
-    for (const CopyItem& item : batch.items) {
+    for (const CopyItem& item : items) {
         const SharedBuffer& buffer = *item.buffer;
-        const bool isCopied = batch.direction == CopyDirection::FromGl
+        const bool isCopied = direction == CopyDirection::FromGl
                                   ? device.read(buffer.name, item.pointer, buffer.size)
                                   : device.write(buffer.name, item.pointer, buffer.size);
         if (isCopied)
@@ -59,72 +93,37 @@ void copyAll(const CopyBatch& batch, GlDevice& device)
         else
             ++counters().failedCopies;
     }
-    if (batch.direction == CopyDirection::ToGl)
+    if (direction == CopyDirection::ToGl)
         device.finish();
 }
 
-SharingContext& contextOf(const CopyBatch& batch)
+// Of a batch that has failed, once each of its commands has ended and is out of use.
+bool CopyBatch::mayBeReleased() noexcept
 {
-    return *batch.items.front().buffer->context;
+    using Clock = std::chrono::steady_clock;
+    if (!std::ranges::all_of(events.unmaps, hasEnded))
+        return false;
+    endOfUse_ = std::min(endOfUse_, Clock::now() + kUseAfterFailure);
+    return Clock::now() >= endOfUse_;
 }
 
-// On the worker, once the batch is ready with `status`. Runtimes still touch the events of
-// commands that failed after they show it, so that those are kept for longer.
-void settle(CopyBatch& batch, cl_int status, GlDevice* device)
+// Some runtimes use the event of a command that has failed whenever something else ends that the
+// command was to wait for. A program that lives with that keeps its event until then; so the other
+// events of the batch stay as long as the application's.
+void CopyBatch::drop() noexcept
 {
-    if (std::exchange(batch.isSettled, true))
-        return;
-    if (status == CL_COMPLETE && device != nullptr)
-        copyAll(batch, *device);
-    else if (status == CL_COMPLETE)
-        counters().failedCopies += batch.items.size();
-    else
-        contextOf(batch).keep(std::move(batch.keptIfFailed));
-    runtime().clSetUserEventStatus(batch.events->copied.back(), CL_COMPLETE);
-}
-
-// Comes on a thread of the runtime's, which must not be kept, nor enter the runtime again.
-void CL_CALLBACK onReady(cl_event /*event*/, cl_int status, void* number)
-{
-    const std::shared_ptr<CopyBatch> batch =
-        OutstandingBatches::get().take(reinterpret_cast<std::uintptr_t>(number));
-    if (batch == nullptr)
-        return;
-    const std::shared_ptr<SharingContext> context = batch->items.front().buffer->context;
-    try {
-        context->worker().post(
-            [batch, status](GlDevice* device) { settle(*batch, status, device); });
-    } catch (const std::exception&) {
-        // The watch sees the status instead.
+    if (std::exchange(hasFailed_, false)) {
+        GlTaskPtr self(this);
+        if (EventTypes::get().keep(events.done.back(), self))
+            return;
+        static_cast<void>(self.release());
     }
-}
-
-// Runtimes call back late, or not at all when a command fails, so that the worker has a look at
-// times.
-bool hasEnded(CopyBatch& batch, GlDevice* device)
-{
-    cl_int status = CL_QUEUED;
-    if (!batch.isSettled)
-        runtime().clGetEventInfo(batch.ready(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status,
-                                 &status, nullptr);
-    if (status <= CL_COMPLETE)
-        settle(batch, status, device);
-    return batch.isSettled;
-}
-
-} // namespace
-
-cl_int copyWhenReady(const std::shared_ptr<CopyBatch>& batch)
-{
-    // The watch is what keeps the batch.
-    GlWorker::PreparedWatch watch;
-    watch.emplace_back([batch](GlDevice* device) { return hasEnded(*batch, device); });
-    const std::uintptr_t number = OutstandingBatches::get().add(batch);
-    void* const user = reinterpret_cast<void*>(number); // NOLINT(performance-no-int-to-ptr)
-    const cl_int error = runtime().clSetEventCallback(batch->ready(), CL_COMPLETE, onReady, user);
-    if (error == CL_SUCCESS)
-        contextOf(*batch).worker().watch(std::move(watch));
-    return error;
+    events.clear();
+    items.clear();
+    buffers.clear();
+    isSettled_ = false;
+    const std::shared_ptr<SharingContext> context = std::move(context_);
+    context->keepBatch(std::unique_ptr<CopyBatch>(this));
 }
 
 } // namespace glshare

@@ -1,10 +1,12 @@
-// The part of a batch of copies that is not in the queue: waiting for the buffers to be mapped, and
-// the worker's copying.
+// One acquire or release that has to copy: its buffers, its events, and the part of it that is not
+// in the queue, which is the worker's copying.
 #pragma once
 
 #include "core/EventList.h"
+#include "core/GlTask.h"
 #include "core/SharingContext.h"
 
+#include <chrono>
 #include <memory>
 #include <vector>
 
@@ -20,32 +22,55 @@ struct CopyEvents {
     EventList copied; // a user event, completed by the worker
     EventList unmaps;
     EventList done; // the marker whose event the application gets
+
+    void clear() noexcept;
 };
 
 // One buffer to copy.
 struct CopyItem {
-    std::shared_ptr<SharedBuffer> buffer;
+    const SharedBuffer* buffer;
     // Where the memory object lies in the host's memory; null until it is mapped, if it has to be.
-    void* pointer = nullptr;
+    void* pointer;
     bool isMapped = false;
 };
 
-struct CopyBatch {
-    std::vector<CopyItem> items; // not empty, and of one context
-    CopyDirection direction = CopyDirection::FromGl;
-    std::shared_ptr<CopyEvents> events = std::make_shared<CopyEvents>();
-    SharingContext::Kept keptIfFailed{events};
-    bool isSettled = false; // `copied` has its status; touched by the worker alone
+// Owned by the thread that gives the command, then by the worker. Batches are used again, so that a
+// command allocates nothing once there have been some.
+class CopyBatch final : public GlTask {
+public:
+    using Ptr = std::unique_ptr<CopyBatch, Drop>;
+
+    // An empty batch for a command in `context`.
+    [[nodiscard]] static Ptr take(std::shared_ptr<SharingContext> context);
 
     // The event after which each item has its pointer.
     [[nodiscard]] cl_event ready() const
     {
-        return events->mapped.empty() ? events->started.back() : events->mapped.back();
+        return events.mapped.empty() ? events.started.back() : events.mapped.back();
     }
-};
 
-// Has the worker copy when the batch is ready, and complete `copied` then. If `ready` fails,
-// `copied` completes without copies. On failure nothing will be done, and `copied` is the caller's.
-[[nodiscard]] cl_int copyWhenReady(const std::shared_ptr<CopyBatch>& batch);
+    // Has the worker copy when the batch is ready, and complete `copied` then. If `ready` fails,
+    // `copied` completes without copies. On failure the batch stays with the caller.
+    [[nodiscard]] static cl_int copyWhenReady(Ptr& batch);
+
+    bool run(GlDevice* device) noexcept override;
+    void drop() noexcept override;
+
+    SharedBuffers buffers;       // all of the command's
+    std::vector<CopyItem> items; // those of them that are copied
+    CopyDirection direction = CopyDirection::FromGl;
+    CopyEvents events;
+    std::vector<cl_event> waitList; // of `done`, while it is enqueued
+
+private:
+    void settle(cl_int status, GlDevice* device) noexcept;
+    void copyAll(GlDevice& device) noexcept;
+    [[nodiscard]] bool mayBeReleased() noexcept;
+
+    std::shared_ptr<SharingContext> context_;
+    bool isSettled_ = false; // `copied` has its status
+    bool hasFailed_ = false;
+    std::chrono::steady_clock::time_point endOfUse_; // of the events of a batch that has failed
+};
 
 } // namespace glshare

@@ -12,14 +12,17 @@ class EventList {
 public:
     EventList() = default;
 
-    ~EventList()
-    {
-        for (cl_event event : events_)
-            runtime().clReleaseEvent(event);
-    }
+    ~EventList() { clear(); }
 
     EventList(const EventList&) = delete;
     EventList& operator=(const EventList&) = delete;
+
+    void clear() noexcept
+    {
+        for (cl_event event : events_)
+            runtime().clReleaseEvent(event);
+        events_.clear();
+    }
 
     // Makes space for `count` events: adding them allocates nothing.
     void reserve(std::size_t count) { events_.reserve(count); }

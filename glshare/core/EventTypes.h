@@ -2,6 +2,7 @@
 // events, and would say so.
 #pragma once
 
+#include "core/GlTask.h"
 #include "core/OpenCl.h"
 
 #include <atomic>
@@ -23,23 +24,33 @@ private:
     struct Entry {
         cl_command_type type;
         std::size_t references = 1; // the application's
+        GlTaskPtr kept{};           // as long as the entry
     };
     using Entries = std::map<cl_event, Entry>;
 
 public:
-    // An entry without its event, made in advance: adding it allocates nothing.
+    // An entry without its event, made in advance: adding it allocates nothing. Entries are used
+    // again, so that preparing one seldom does.
     using Prepared = Entries::node_type;
 
-    [[nodiscard]] static Prepared prepare(cl_command_type type);
+    [[nodiscard]] Prepared prepare(cl_command_type type);
     void add(cl_event event, Prepared prepared) noexcept;
+
+    // Takes `task`, to drop it when the event is no longer known; false if it is not now.
+    bool keep(cl_event event, GlTaskPtr& task) noexcept;
+
     void retain(cl_event event);
     void release(cl_event event);
     [[nodiscard]] std::optional<cl_command_type> find(cl_event event);
 
 private:
-    std::mutex mutex_; // guards entries_
+    // Forgets an entry, with the lock held; the result is dropped without it.
+    [[nodiscard]] GlTaskPtr retire(Entries::iterator entry) noexcept;
+
+    std::mutex mutex_; // guards the following
     Entries entries_;
-    std::atomic<std::size_t> count_{0}; // lets the events of others pass without the lock
+    std::multimap<cl_event, Entry> spares_; // all with the key null
+    std::atomic<std::size_t> count_{0};     // lets the events of others pass without the lock
 };
 
 } // namespace glshare

@@ -10,15 +10,29 @@ namespace glshare {
 
 namespace {
 
-// Looks at the sync object once; true if the event has its final status.
-bool settle(cl_event event, GLsync sync, const GlDevice* device)
-{
-    const bool exists = device != nullptr && device->isSync(sync);
-    if (exists && !device->isSignalled(sync))
-        return false;
-    runtime().clSetUserEventStatus(event, exists ? CL_COMPLETE : CL_INVALID_GL_OBJECT);
-    return true;
-}
+// Completes an event when a sync object is signalled. Keeps the context, whose worker runs it.
+class SyncWatch final : public GlTask {
+public:
+    SyncWatch(std::shared_ptr<SharingContext> context, GLsync sync)
+        : context_(std::move(context)), sync_(sync)
+    {
+    }
+
+    bool run(GlDevice* device) noexcept override
+    {
+        const bool exists = device != nullptr && device->isSync(sync_);
+        if (exists && !device->isSignalled(sync_))
+            return false;
+        runtime().clSetUserEventStatus(events.back(), exists ? CL_COMPLETE : CL_INVALID_GL_OBJECT);
+        return true;
+    }
+
+    EventList events; // the one event
+
+private:
+    std::shared_ptr<SharingContext> context_;
+    GLsync sync_;
+};
 
 } // namespace
 
@@ -33,9 +47,9 @@ cl_event createSyncEvent(cl_context handle, const std::shared_ptr<SharingContext
         setError(error, CL_INVALID_GL_OBJECT);
         return nullptr;
     }
-    EventTypes::Prepared type = EventTypes::prepare(CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR);
-    const auto events = std::make_shared<EventList>();
-    const cl_int result = events->add([&](cl_event* event) {
+    EventTypes::Prepared type = EventTypes::get().prepare(CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR);
+    auto watch = std::make_unique<SyncWatch>(context, sync);
+    const cl_int result = watch->events.add([&](cl_event* event) {
         cl_int status = CL_SUCCESS;
         *event = runtime().clCreateUserEvent(handle, &status);
         return status;
@@ -43,13 +57,11 @@ cl_event createSyncEvent(cl_context handle, const std::shared_ptr<SharingContext
     setError(error, result);
     if (result != CL_SUCCESS)
         return nullptr;
-    // The watch owns a reference to the event, and keeps the context, whose worker runs it.
-    context->worker().watch([events, context, sync](const GlDevice* device) {
-        return settle(events->back(), sync, device);
-    });
-    EventTypes::get().add(events->back(), std::move(type));
-    runtime().clRetainEvent(events->back()); // the application's reference
-    return events->back();
+    cl_event event = watch->events.back();
+    runtime().clRetainEvent(event); // the application's reference
+    EventTypes::get().add(event, std::move(type));
+    context->worker().watch(GlTaskPtr(watch.release()));
+    return event;
 }
 
 } // namespace glshare

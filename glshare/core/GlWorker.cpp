@@ -55,42 +55,43 @@ void GlWorker::stop()
     }
 }
 
-void GlWorker::post(Job job)
+void GlWorker::post(GlTaskPtr task) noexcept
 {
-    PreparedJob prepared;
-    prepared.push_back(std::move(job));
-    loop_->post(std::move(prepared));
+    loop_->post(std::move(task));
 }
 
-void GlWorker::post(PreparedJob job) noexcept
+void GlWorker::watch(GlTaskPtr task) noexcept
 {
-    loop_->post(std::move(job));
+    loop_->watch(std::move(task));
 }
 
-void GlWorker::call(const Job& job)
+void GlWorker::lookNow() noexcept
 {
-    std::promise<void> done;
-    post([&](GlDevice* device) {
-        try {
-            job(device);
-            done.set_value();
-        } catch (...) {
-            done.set_exception(std::current_exception());
-        }
-    });
-    done.get_future().get();
+    Loop::lookNow();
 }
 
-void GlWorker::watch(Watch watch)
+bool GlWorker::Call::run(GlDevice* device) noexcept
 {
-    PreparedWatch prepared;
-    prepared.push_back(std::move(watch));
-    loop_->watch(std::move(prepared));
+    try {
+        work(device);
+    } catch (...) {
+        thrown = std::current_exception();
+    }
+    return true;
 }
 
-void GlWorker::watch(PreparedWatch watch) noexcept
+void GlWorker::Call::drop() noexcept
 {
-    loop_->watch(std::move(watch));
+    loop->endCall(hasRun);
+}
+
+void GlWorker::run(Call& call)
+{
+    call.loop = loop_.get();
+    loop_->post(GlTaskPtr(&call));
+    loop_->waitForCall(call.hasRun);
+    if (call.thrown)
+        std::rethrow_exception(call.thrown);
 }
 
 bool GlWorker::callerSharesObjects() const

@@ -4,9 +4,9 @@
 
 #include "core/GlContext.h"
 #include "core/GlDevice.h"
+#include "core/GlTask.h"
 
-#include <functional>
-#include <list>
+#include <exception>
 #include <memory>
 #include <thread>
 
@@ -14,38 +14,37 @@ namespace glshare {
 
 class GlWorker {
 public:
-    // Work on the worker's thread; gets null once the GL side is gone, and must then only tell
-    // those who wait.
-    using Job = std::function<void(GlDevice* device)>;
-
-    // A job that is asked again and again, at short intervals, until it answers true.
-    using Watch = std::function<bool(GlDevice* device)>;
-
-    // One job or watch that was made in advance: passing it to the worker allocates nothing.
-    using PreparedJob = std::list<Job>;
-    using PreparedWatch = std::list<Watch>;
-
     // Starts the thread on `context`; null if the context cannot be used. Throws std::system_error
     // if the system creates no thread.
     [[nodiscard]] static std::unique_ptr<GlWorker> start(std::unique_ptr<GlContext> context);
 
-    // Stops. Any thread, the worker's own included, where the last owner may be a job.
+    // Stops. Any thread, the worker's own included, where the last owner may be a task.
     ~GlWorker();
 
     GlWorker(const GlWorker&) = delete;
     GlWorker& operator=(const GlWorker&) = delete;
 
-    // Jobs run in the order given. Any thread. A job must not throw.
-    void post(Job job);
-    void post(PreparedJob job) noexcept;
+    // Runs the task once. Tasks run in the order given. Any thread.
+    void post(GlTaskPtr task) noexcept;
 
-    // The same, and returns when the job has run; throws what the job throws. Not on the worker's
-    // thread.
-    void call(const Job& job);
+    // Runs the task at short intervals until it has ended. Any thread.
+    void watch(GlTaskPtr task) noexcept;
 
-    // A watch must not throw.
-    void watch(Watch watch);
-    void watch(PreparedWatch watch) noexcept;
+    // Has every worker of the process look at once at what it watches. Any thread.
+    static void lookNow() noexcept;
+
+    // Calls job(device) on the worker's thread, as a task would be run; returns when it has
+    // returned, and throws what it throws. Not on the worker's thread.
+    template <typename Job>
+    void call(Job&& job)
+    {
+        struct JobCall final : Call {
+            explicit JobCall(Job& work) : job(work) {}
+            void work(GlDevice* device) override { job(device); }
+            Job& job;
+        } call(job);
+        run(call);
+    }
 
     // Whether the calling thread has a current context of this share group. Any thread.
     [[nodiscard]] bool callerSharesObjects() const;
@@ -56,7 +55,21 @@ public:
 private:
     class Loop;
 
+    // A job with somebody who waits for it, and owns it.
+    class Call : public GlTask {
+    public:
+        virtual void work(GlDevice* device) = 0;
+        bool run(GlDevice* device) noexcept final;
+        void drop() noexcept final; // lets the caller go on
+
+        Loop* loop = nullptr;
+        std::exception_ptr thrown;
+        bool hasRun = false; // guarded by the loop
+    };
+
     explicit GlWorker(std::shared_ptr<Loop> loop);
+
+    void run(Call& call);
 
     // Ends the loop; returns when the thread uses the context no more.
     void stop();

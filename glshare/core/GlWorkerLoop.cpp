@@ -73,12 +73,12 @@ void GlWorker::Loop::run()
             changed_.wait(lock, [] { return false; });
         if (isDisplayClosing_ && hasGl_)
             letGoOfDisplay(lock);
-        if (!jobs_.empty()) {
-            runJob(lock);
+        if (!tasks_.empty()) {
+            runTask(lock);
         } else if (isStopping_ && !isExiting_) {
             break;
-        } else if (!watches_.empty()) {
-            lookAtWatches(lock);
+        } else if (!watched_.empty()) {
+            lookAtWatched(lock);
         } else {
             changed_.wait(lock);
         }
@@ -90,40 +90,51 @@ void GlWorker::Loop::run()
         device_->destroy();
         context_->releaseCurrent();
     }
-    for (const Watch& watch : watches_)
-        watch(nullptr);
+    while (!watched_.empty())
+        watched_.pop()->run(nullptr);
     context_.reset();
     lock.lock();
     isBusy_ = false;
     changed_.notify_all();
 }
 
-// The job is destroyed before the lock is taken again: it may be the last owner of its worker.
-void GlWorker::Loop::runJob(Lock& lock)
+// The task is dropped before the lock is taken again: it may be the last owner of its worker.
+void GlWorker::Loop::runTask(Lock& lock)
 {
-    Job job = std::move(jobs_.front());
-    jobs_.pop_front();
+    current_ = tasks_.pop();
     isBusy_ = true;
     lock.unlock();
-    job(device());
-    job = nullptr;
+    current_->run(device());
+    current_ = nullptr;
     lock.lock();
     isBusy_ = false;
     changed_.notify_all();
 }
 
-void GlWorker::Loop::lookAtWatches(Lock& lock)
+void GlWorker::Loop::lookAtWatched(Lock& lock)
 {
-    std::list<Watch> watches = std::exchange(watches_, {});
+    watched_.swap(unseen_);
+    mustLookNow_ = false;
     isBusy_ = true;
     lock.unlock();
-    std::erase_if(watches, [this](const Watch& watch) { return watch(device()); });
+    while (!unseen_.empty()) {
+        current_ = unseen_.pop();
+        if (current_->run(device()))
+            current_ = nullptr;
+        else
+            seen_.push(std::move(current_));
+    }
     lock.lock();
     isBusy_ = false;
     changed_.notify_all();
-    watches_.splice(watches_.begin(), watches);
-    if (!watches_.empty() && jobs_.empty() && !isStopping_ && !isExiting_)
-        changed_.wait_for(lock, kWatchInterval);
+    // Those that came in the meantime stand behind.
+    watched_.swap(seen_);
+    while (!seen_.empty())
+        watched_.push(seen_.pop());
+    changed_.wait_for(lock, kWatchInterval, [this] {
+        return watched_.empty() || mustLookNow_ || !tasks_.empty() || isStopping_ || isExiting_ ||
+               (isDisplayClosing_ && hasGl_);
+    });
 }
 
 void GlWorker::Loop::letGoOfDisplay(Lock& lock)
@@ -137,24 +148,56 @@ void GlWorker::Loop::letGoOfDisplay(Lock& lock)
     changed_.notify_all();
 }
 
-void GlWorker::Loop::post(PreparedJob job) noexcept
+void GlWorker::Loop::post(GlTaskPtr task) noexcept
 {
     {
         const std::scoped_lock lock(mutex_);
         if (!isExiting_) {
-            jobs_.splice(jobs_.end(), job);
+            tasks_.push(std::move(task));
             changed_.notify_all();
             return;
         }
     }
-    job.front()(nullptr);
+    task->run(nullptr);
 }
 
-void GlWorker::Loop::watch(PreparedWatch watch) noexcept
+void GlWorker::Loop::watch(GlTaskPtr task) noexcept
 {
     const std::scoped_lock lock(mutex_);
-    watches_.splice(watches_.end(), watch);
+    watched_.push(std::move(task));
+    mustLookNow_ = true;
     changed_.notify_all();
+}
+
+// Nobody waits for the list of loops here, which may be held by a thread that waits for this one;
+// the loops look at short intervals anyway.
+void GlWorker::Loop::lookNow() noexcept
+{
+    Running& running = Running::get();
+    const std::unique_lock lock(running.mutex, std::try_to_lock);
+    if (!lock)
+        return;
+    for (const Running::Entry& entry : running.entries) {
+        const std::shared_ptr<Loop> loop = entry.loop.lock();
+        if (loop == nullptr)
+            continue;
+        const std::scoped_lock loopLock(loop->mutex_);
+        loop->mustLookNow_ = true;
+        loop->changed_.notify_all();
+    }
+}
+
+void GlWorker::Loop::endCall(bool& hasRun) noexcept
+{
+    const std::scoped_lock lock(mutex_);
+    hasRun = true;
+    changed_.notify_all();
+}
+
+void GlWorker::Loop::waitForCall(const bool& hasRun)
+{
+    Lock lock(mutex_);
+    changed_.wait(lock, [&hasRun] { return hasRun; });
 }
 
 bool GlWorker::Loop::requestStop()

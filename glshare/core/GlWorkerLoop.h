@@ -25,8 +25,13 @@ public:
 
     // The following on any thread.
 
-    void post(PreparedJob job) noexcept;
-    void watch(PreparedWatch watch) noexcept;
+    void post(GlTaskPtr task) noexcept;
+    void watch(GlTaskPtr task) noexcept;
+    static void lookNow() noexcept;
+
+    // Sets `hasRun`, which belongs to a call that may be gone on return; waits until it is set.
+    void endCall(bool& hasRun) noexcept;
+    void waitForCall(const bool& hasRun);
 
     // False if the thread will not end any more, since the process is exiting.
     [[nodiscard]] bool requestStop();
@@ -54,8 +59,8 @@ private:
     static void parkAll();
 
     // With the lock held; the lock is given up while foreign code runs.
-    void runJob(Lock& lock);
-    void lookAtWatches(Lock& lock);
+    void runTask(Lock& lock);
+    void lookAtWatched(Lock& lock);
     void letGoOfDisplay(Lock& lock);
     [[nodiscard]] GlDevice* device();
 
@@ -63,10 +68,17 @@ private:
     std::optional<GlDevice> device_; // unchanged once begin has returned
     std::atomic<bool> hasGl_{false};
 
+    // The worker's thread alone: what it has taken from `watched_`, and the task that runs. No task
+    // is on the thread's stack, which a forked child does not have.
+    GlTaskQueue unseen_;
+    GlTaskQueue seen_;
+    GlTaskPtr current_;
+
     std::mutex mutex_; // guards everything below
     std::condition_variable changed_;
-    std::list<Job> jobs_;
-    std::list<Watch> watches_;
+    GlTaskQueue tasks_;
+    GlTaskQueue watched_;
+    bool mustLookNow_ = false;
     bool isBusy_ = false;
     bool isStopping_ = false;
     bool isEnding_ = false; // run is over, or nearly

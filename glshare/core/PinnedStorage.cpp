@@ -6,28 +6,40 @@
 
 namespace glshare {
 
+namespace {
+
+class Unpin final : public GlTask {
+public:
+    bool run(GlDevice* device) noexcept override
+    {
+        if (device != nullptr)
+            device->unpin(pin); // 0 is ignored
+        return true;
+    }
+
+    GLuint pin = 0;
+};
+
+} // namespace
+
 // The address is taken after pinning: only then is it known to stay.
 PinnedStorage::PinnedStorage(std::shared_ptr<SharingContext> context, GlDevice& device, GLuint name,
                              std::size_t size)
 {
-    GlWorker::PreparedJob release(1);
-    const GLuint pin = device.pin(name);
-    address_ = pin == 0 ? nullptr : device.address(name, size);
+    auto unpin = std::make_unique<Unpin>();
+    unpin->pin = device.pin(name);
+    address_ = unpin->pin == 0 ? nullptr : device.address(name, size);
     if (address_ == nullptr) {
-        device.unpin(pin); // 0 is ignored
+        unpin->run(&device);
         return;
     }
-    release.front() = [pin](GlDevice* worker) {
-        if (worker != nullptr)
-            worker->unpin(pin);
-    };
-    release_ = std::move(release);
+    release_.reset(unpin.release());
     context_ = std::move(context);
 }
 
 PinnedStorage::~PinnedStorage()
 {
-    if (!release_.empty())
+    if (release_ != nullptr)
         context_->worker().post(std::move(release_));
 }
 

@@ -3,7 +3,7 @@
 #pragma once
 
 #include "core/GlDevice.h"
-#include "core/GlWorker.h"
+#include "core/GlTask.h"
 
 #include <cstddef>
 #include <memory>
@@ -37,9 +37,9 @@ public:
 private:
     std::shared_ptr<SharingContext> context_;
     void* address_ = nullptr;
-    // Unpins the storage; empty if nothing is held. Made in advance, since a destructor that found
+    // Unpins the storage; null if nothing is held. Made in advance, since a destructor that found
     // no memory could not report it.
-    GlWorker::PreparedJob release_;
+    GlTaskPtr release_;
 };
 
 } // namespace glshare

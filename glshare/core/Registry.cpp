@@ -85,9 +85,8 @@ std::shared_ptr<SharedBuffer> Registry::find(cl_mem handle)
     return found == buffers_.end() ? nullptr : found->second.buffer;
 }
 
-SharedBuffers Registry::find(const cl_mem* handles, std::size_t count)
+void Registry::find(const cl_mem* handles, std::size_t count, SharedBuffers& result)
 {
-    SharedBuffers result;
     const std::scoped_lock lock(mutex_);
     result.reserve(std::min(count, buffers_.size()));
     for (std::size_t i = 0; i < count; ++i) {
@@ -96,7 +95,6 @@ SharedBuffers Registry::find(const cl_mem* handles, std::size_t count)
             break;
         result.push_back(found->second.buffer);
     }
-    return result;
 }
 
 // What is dropped is dropped without the lock: the record may be the last owner of its context, and

@@ -30,8 +30,9 @@ public:
     void add(cl_context handle, std::shared_ptr<SharedBuffer> buffer);
     [[nodiscard]] std::shared_ptr<SharedBuffer> find(cl_mem handle);
 
-    // Returns the records of `count` handles in their order, up to the first that is unknown.
-    [[nodiscard]] SharedBuffers find(const cl_mem* handles, std::size_t count);
+    // Appends the records of `count` handles to `result` in their order, up to the first that is
+    // unknown.
+    void find(const cl_mem* handles, std::size_t count, SharedBuffers& result);
 
     // When the runtime destroys the memory object. Does nothing if it is unknown.
     void remove(cl_mem handle);

@@ -29,7 +29,7 @@ cl_int errorOfUnknown(cl_mem memory)
 cl_int findAll(const SharingRequest& request, const std::shared_ptr<SharingContext>& context,
                SharedBuffers& buffers)
 {
-    buffers = Registry::get().find(request.memory.data(), request.memory.size());
+    Registry::get().find(request.memory.data(), request.memory.size(), buffers);
     if (buffers.size() < request.memory.size())
         return errorOfUnknown(request.memory[buffers.size()]);
     const bool areAllHere = std::ranges::all_of(
@@ -39,9 +39,9 @@ cl_int findAll(const SharingRequest& request, const std::shared_ptr<SharingConte
 
 // Decides for each buffer whether it must be copied, and lists those. CL_INVALID_GL_OBJECT if a
 // buffer is gone or has become too small now, when the command is given.
-cl_int inspect(const SharedBuffers& buffers, const GlDevice& device, std::vector<CopyItem>& copies)
+cl_int inspect(CopyBatch& batch, const GlDevice& device)
 {
-    for (const auto& buffer : buffers) {
+    for (const auto& buffer : batch.buffers) {
         void* const storage = buffer->storage.address();
         buffer->isCopied =
             storage == nullptr || device.address(buffer->name, buffer->size) != storage;
@@ -49,31 +49,30 @@ cl_int inspect(const SharedBuffers& buffers, const GlDevice& device, std::vector
             continue;
         if (device.bufferSize(buffer->name).value_or(0) < buffer->size)
             return CL_INVALID_GL_OBJECT;
-        copies.push_back({buffer, buffer->hostAddress()});
+        batch.items.push_back({buffer.get(), buffer->hostAddress()});
     }
     return CL_SUCCESS;
 }
 
-cl_int prepareAcquire(const SharingContext& context, const SharedBuffers& buffers,
-                      std::vector<CopyItem>& copies)
+cl_int prepareAcquire(const SharingContext& context, CopyBatch& batch)
 {
+    batch.direction = CopyDirection::FromGl;
     cl_int result = CL_INVALID_GL_OBJECT;
     context.worker().call([&](GlDevice* device) {
         if (device != nullptr)
-            result = inspect(buffers, *device, copies);
+            result = inspect(batch, *device);
     });
     return result;
 }
 
 // What was copied on the way in is copied on the way out.
-std::vector<CopyItem> prepareRelease(const SharedBuffers& buffers)
+void prepareRelease(CopyBatch& batch)
 {
-    std::vector<CopyItem> copies;
-    for (const auto& buffer : buffers) {
+    batch.direction = CopyDirection::ToGl;
+    for (const auto& buffer : batch.buffers) {
         if (buffer->isCopied)
-            copies.push_back({buffer, buffer->hostAddress()});
+            batch.items.push_back({buffer.get(), buffer->hostAddress()});
     }
-    return copies;
 }
 
 void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
@@ -87,16 +86,13 @@ void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
 }
 
 // The commands in the queue. In place nothing has to be done, and the command is a marker.
-cl_int enqueue(SharingCommand command, const SharingRequest& request, std::vector<CopyItem> copies,
-               cl_event* done)
+cl_int enqueue(const SharingRequest& request, CopyBatch::Ptr& batch, cl_event* done)
 {
-    if (copies.empty())
-        return runtime().clEnqueueMarkerWithWaitList(request.queue,
-                                                     static_cast<cl_uint>(request.waitList.size()),
-                                                     request.waitList.data(), done);
-    const auto direction =
-        command == SharingCommand::Acquire ? CopyDirection::FromGl : CopyDirection::ToGl;
-    return enqueueCopies(request.queue, std::move(copies), direction, request.waitList, done);
+    if (!batch->items.empty())
+        return enqueueCopies(request.queue, batch, request.waitList, done);
+    return runtime().clEnqueueMarkerWithWaitList(request.queue,
+                                                 static_cast<cl_uint>(request.waitList.size()),
+                                                 request.waitList.data(), done);
 }
 
 cl_command_type typeOf(SharingCommand command)
@@ -117,28 +113,27 @@ void handOver(cl_event done, EventTypes::Prepared type, cl_event* wanted)
 }
 
 cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
-                        const SharingContext& context, const SharedBuffers& buffers)
+                        const SharingContext& context, CopyBatch::Ptr& batch)
 {
     const bool isOrdered = context.isOrderedWithCaller();
     // Allocated before the command is in the queue, which nothing takes back.
     EventTypes::Prepared type;
     if (request.event != nullptr)
-        type = EventTypes::prepare(typeOf(command));
-    std::vector<CopyItem> copies;
+        type = EventTypes::get().prepare(typeOf(command));
     if (command == SharingCommand::Acquire) {
         if (isOrdered)
             context.worker().finishCaller();
-        if (const cl_int error = prepareAcquire(context, buffers, copies); error != CL_SUCCESS)
+        if (const cl_int error = prepareAcquire(context, *batch); error != CL_SUCCESS)
             return error;
     } else {
-        copies = prepareRelease(buffers);
+        prepareRelease(*batch);
     }
-    const std::size_t copied = copies.size();
+    const std::size_t copied = batch->items.size();
+    const std::size_t inPlace = batch->buffers.size() - copied;
     cl_event done = nullptr;
-    if (const cl_int error = enqueue(command, request, std::move(copies), &done);
-        error != CL_SUCCESS)
+    if (const cl_int error = enqueue(request, batch, &done); error != CL_SUCCESS)
         return error;
-    count(command, copied, buffers.size() - copied);
+    count(command, copied, inPlace);
     // A wait that fails tells of a command before this one, and so will the event.
     if (command == SharingCommand::Release && isOrdered)
         static_cast<void>(runtime().clWaitForEvents(1, &done));
@@ -151,21 +146,21 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
 cl_int enqueueSharing(SharingCommand command, const std::shared_ptr<SharingContext>& context,
                       const SharingRequest& request)
 {
-    SharedBuffers buffers;
-    if (const cl_int error = findAll(request, context, buffers); error != CL_SUCCESS)
+    CopyBatch::Ptr batch = CopyBatch::take(context);
+    if (const cl_int error = findAll(request, context, batch->buffers); error != CL_SUCCESS)
         return error;
 
     const bool acquired = command == SharingCommand::Acquire;
-    if (!context->setAcquired(buffers, acquired))
+    if (!context->setAcquired(batch->buffers, acquired))
         return CL_INVALID_GL_OBJECT;
     cl_int error = CL_OUT_OF_HOST_MEMORY;
     try {
-        error = acquireOrRelease(command, request, *context, buffers);
+        error = acquireOrRelease(command, request, *context, batch);
     } catch (const std::exception&) {
         // As any other failure of the command.
     }
     if (error != CL_SUCCESS)
-        static_cast<void>(context->setAcquired(buffers, !acquired));
+        static_cast<void>(context->setAcquired(batch->buffers, !acquired));
     return error;
 }
 

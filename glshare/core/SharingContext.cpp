@@ -1,10 +1,18 @@
 #include "core/SharingContext.h"
 
+#include "core/CopyBatch.h"
 #include "core/Switches.h"
 
 #include <utility>
 
 namespace glshare {
+
+namespace {
+
+// More than a program has commands under way that copy.
+constexpr std::size_t kKeptBatches = 16;
+
+} // namespace
 
 SharingContext::SharingContext(std::unique_ptr<GlWorker> worker, ContextProperties properties,
                                bool canUseHostMemory)
@@ -12,6 +20,8 @@ SharingContext::SharingContext(std::unique_ptr<GlWorker> worker, ContextProperti
       canUseHostMemory_(canUseHostMemory)
 {
 }
+
+SharingContext::~SharingContext() = default;
 
 bool SharingContext::isOrderedWithCaller() const
 {
@@ -32,10 +42,25 @@ bool SharingContext::setAcquired(const SharedBuffers& buffers, bool acquired)
     return true;
 }
 
-void SharingContext::keep(Kept things) noexcept
+std::unique_ptr<CopyBatch> SharingContext::takeBatch()
+{
+    {
+        const std::scoped_lock lock(mutex_);
+        batches_.reserve(kKeptBatches); // so that keepBatch allocates nothing
+        if (!batches_.empty()) {
+            std::unique_ptr<CopyBatch> batch = std::move(batches_.back());
+            batches_.pop_back();
+            return batch;
+        }
+    }
+    return std::make_unique<CopyBatch>();
+}
+
+void SharingContext::keepBatch(std::unique_ptr<CopyBatch> batch) noexcept
 {
     const std::scoped_lock lock(mutex_);
-    kept_.splice(kept_.end(), things);
+    if (batches_.size() < batches_.capacity())
+        batches_.push_back(std::move(batch));
 }
 
 } // namespace glshare

@@ -6,7 +6,6 @@
 #include "core/GlWorker.h"
 #include "core/SharedBuffer.h"
 
-#include <list>
 #include <memory>
 #include <mutex>
 #include <span>
@@ -15,12 +14,18 @@
 namespace glshare {
 
 using SharedBuffers = std::vector<std::shared_ptr<SharedBuffer>>;
+class CopyBatch;
 
 class SharingContext {
 public:
     // `canUseHostMemory` says that every device of the context works in the host's own memory.
     SharingContext(std::unique_ptr<GlWorker> worker, ContextProperties properties,
                    bool canUseHostMemory);
+
+    ~SharingContext();
+
+    SharingContext(const SharingContext&) = delete;
+    SharingContext& operator=(const SharingContext&) = delete;
 
     [[nodiscard]] const ContextProperties& properties() const { return properties_; }
     [[nodiscard]] bool canUseHostMemory() const { return canUseHostMemory_; }
@@ -34,16 +39,16 @@ public:
     // them is so already, or stands in the list twice.
     [[nodiscard]] bool setAcquired(const SharedBuffers& buffers, bool acquired);
 
-    // Keeps things as long as the context; allocates nothing.
-    using Kept = std::list<std::shared_ptr<const void>>;
-    void keep(Kept things) noexcept;
+    // Takes a batch that a command has used before, or makes one; and takes it back, empty.
+    [[nodiscard]] std::unique_ptr<CopyBatch> takeBatch();
+    void keepBatch(std::unique_ptr<CopyBatch> batch) noexcept;
 
 private:
     std::unique_ptr<GlWorker> worker_;
     ContextProperties properties_;
     bool canUseHostMemory_;
     std::mutex mutex_; // guards SharedBuffer::isAcquired and the following
-    Kept kept_;
+    std::vector<std::unique_ptr<CopyBatch>> batches_; // not in use
 };
 
 } // namespace glshare

@@ -28,7 +28,8 @@ namespace {
 // Allocations of the layer until one fails, on any thread; 0 or less: none fails.
 std::atomic<int> allocationsLeft{0};
 
-// Whether the innermost caller outside of this program and of the standard library is the layer.
+// Whether the innermost caller outside of this program, of the standard library and of a sanitizer
+// is the layer.
 bool isCalledByLayer()
 {
     std::array<void*, 24> frames{};
@@ -241,38 +242,70 @@ TEST_F(AllocationTest, CreationsReportThatMemoryIsShort)
                        CL_INVALID_CONTEXT);
 }
 
-// An acquire or a release of two buffers. One that has failed can be repeated.
+// A context with two buffers, and commands for both.
+struct Pair {
+    Context context;
+    Queue queue;
+    std::array<Memory, 2> owners;
+
+    [[nodiscard]] cl_int enqueue(bool isRelease, cl_event* event = nullptr) const
+    {
+        const std::array<cl_mem, 2> memory{owners[0], owners[1]};
+        const auto call = isRelease ? clEnqueueReleaseGLObjects : clEnqueueAcquireGLObjects;
+        const cl_int error = call(queue, 2, memory.data(), 0, nullptr, event);
+        return error != CL_SUCCESS || event == nullptr ? error : clWaitForEvents(1, event);
+    }
+};
+
+// The first acquire or release in a context. One that has failed can be repeated.
 TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
 {
-    const Memory second = share(makeGlBuffer(from(1)));
-    const std::array<cl_mem, 2> both{memory_, second};
+    const GLuint other = makeGlBuffer(from(1));
     cl_int value = 1;
-    const auto enqueue = [&](bool isRelease, cl_event* event) {
-        const auto call = isRelease ? clEnqueueReleaseGLObjects : clEnqueueAcquireGLObjects;
-        const cl_int error = call(queue_, 2, both.data(), 0, nullptr, event);
-        return error != CL_SUCCESS || event == nullptr ? error : clWaitForEvents(1, event);
-    };
     for (const bool isRelease : {false, true}) {
+        if (isRelease && isZeroCopy())
+            break; // allocates nothing
         const auto call = [&] {
+            Pair pair{makeContext(), {}, {}};
+            pair.queue = Queue(pair.context, device_);
+            pair.owners = {share(pair.context, buffer_), share(pair.context, other)};
             if (isRelease) {
-                EXPECT_EQ(enqueue(false, nullptr), CL_SUCCESS);
+                EXPECT_EQ(pair.enqueue(false), CL_SUCCESS);
             }
             Event event;
             beginShortage();
-            const cl_int error = endShortage(enqueue(isRelease, event.place()));
+            const cl_int error = endShortage(pair.enqueue(isRelease, event.place()));
             EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
             if (isRelease != (error == CL_SUCCESS)) // acquired
             {
-                EXPECT_EQ(queue_.read(memory_, count_), from(value));
-                queue_.write(memory_, from(++value));
-                EXPECT_EQ(enqueue(true, nullptr), CL_SUCCESS);
+                EXPECT_EQ(pair.queue.read(pair.owners[0], count_), from(value));
+                pair.queue.write(pair.owners[0], from(++value));
+                EXPECT_EQ(pair.enqueue(true), CL_SUCCESS);
             }
-            clFinish(queue_);
+            clFinish(pair.queue);
             EXPECT_EQ(readGl(buffer_, count_), from(value));
             return error;
         };
         failEachAllocation(isRelease ? "release" : "acquire", call, CL_SUCCESS, true);
     }
+}
+
+TEST_F(AllocationTest, CommandsAllocateNothingAfterTheFirst)
+{
+    constexpr int kMany = 1000000;
+    const Memory second = share(makeGlBuffer(from(1)));
+    for (int frame = 0; frame < 20; ++frame) {
+        if (frame == 10)
+            allocationsLeft = kMany;
+        std::array<Event, 2> events;
+        for (cl_mem memory : {cl_mem(memory_), cl_mem(second)}) {
+            EXPECT_EQ(queue_.acquire(memory, {}, &events[0]), CL_SUCCESS);
+            EXPECT_EQ(queue_.release(memory, {events[0]}, &events[1]), CL_SUCCESS);
+            events = {};
+        }
+        clFinish(queue_);
+    }
+    EXPECT_EQ(allocationsLeft, kMany);
 }
 
 TEST_F(AllocationTest, EventsOfSyncObjectsReportThatMemoryIsShort)

@@ -172,14 +172,18 @@ TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
         const Queue queue(context_, device_, kind);
         const Memory memory = share(buffer_);
         const Event gate = makeUserEvent();
+        const Event other = makeUserEvent();
         Event event;
         onOtherThread([&] {
-            EXPECT_EQ(queue.acquire(memory, {gate}, &event), CL_SUCCESS);
+            EXPECT_EQ(queue.acquire(memory, {gate, other}, &event), CL_SUCCESS);
             clFlush(queue);
         });
         clSetUserEventStatus(gate, -5);
         clWaitForEvents(1, event.place());
         EXPECT_LT(statusOf(event), CL_COMPLETE);
+        // The runtime still uses what waited for this one.
+        std::this_thread::sleep_for(2 * kSettled);
+        clSetUserEventStatus(other, CL_COMPLETE);
     }
 }
 

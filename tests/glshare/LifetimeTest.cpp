@@ -3,7 +3,9 @@
 #include "core/OpenCl.h"
 
 #include "SharingTest.h"
+#include "StressRounds.h"
 
+#include <malloc.h>
 #include <unistd.h>
 
 #include <fstream>
@@ -41,6 +43,28 @@ TEST_F(LifetimeTest, ContextsLeaveNoObjectsInTheShareGroup)
         EXPECT_FALSE(glIsProgram(name) || glIsShader(name)) << name;
         EXPECT_EQ(glIsBuffer(name) == GL_TRUE, name == buffer_) << name;
     }
+}
+
+// What the layer keeps for a command whose wait list fails goes with the command.
+TEST_F(LifetimeTest, CommandsThatFailLeaveNothing)
+{
+    EglTestContext::releaseCurrent();
+    const auto failOften = [this](int times) {
+        for (int i = 0; i < times; ++i) {
+            const Event gate = makeUserEvent();
+            const Queue queue(context_, device_);
+            const Memory memory = share(buffer_);
+            Event event;
+            EXPECT_EQ(queue.acquire(memory, {gate}, &event), CL_SUCCESS);
+            clSetUserEventStatus(gate, -5);
+            clWaitForEvents(1, event.place());
+        }
+    };
+    constexpr int kTimes = 200;
+    failOften(kTimes); // until the allocators have what they keep
+    const std::size_t before = mallinfo2().uordblks;
+    failOften(kTimes * stressRounds(1));
+    EXPECT_TRUE(isSoon([&] { return mallinfo2().uordblks < before + std::size_t{kTimes} * 1000; }));
 }
 
 // The application's last reference to the context is not the last one.

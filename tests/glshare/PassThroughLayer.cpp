@@ -1,38 +1,7 @@
-// A layer that changes nothing, for tests between others. With GLSHARE_TEST_OLD_RUNTIME, a runtime
-// under it looks like one of OpenCL 1.2 that insists on a platform.
-#undef CL_TARGET_OPENCL_VERSION
-#define CL_TARGET_OPENCL_VERSION 300
-#include <CL/cl_layer.h>
+// A layer for tests, which changes nothing by itself.
+#include "PassThroughLayer.h"
 
 #include <cstddef>
-
-namespace {
-
-cl_icd_dispatch theTable;
-[[maybe_unused]] cl_icd_dispatch theRuntime;
-
-#ifdef GLSHARE_TEST_OLD_RUNTIME
-void makeOld(cl_icd_dispatch& table)
-{
-    table.clGetPlatformInfo = [](cl_platform_id platform, cl_platform_info name, std::size_t size,
-                                 void* value, std::size_t* needed) -> cl_int {
-        return name == CL_PLATFORM_NUMERIC_VERSION
-                   ? CL_INVALID_VALUE
-                   : theRuntime.clGetPlatformInfo(platform, name, size, value, needed);
-    };
-    table.clGetDeviceIDs = [](cl_platform_id platform, cl_device_type type, cl_uint capacity,
-                              cl_device_id* devices, cl_uint* count) -> cl_int {
-        return platform == nullptr
-                   ? CL_INVALID_PLATFORM
-                   : theRuntime.clGetDeviceIDs(platform, type, capacity, devices, count);
-    };
-    table.clSetContextDestructorCallback = nullptr;
-}
-#else
-void makeOld(cl_icd_dispatch& /*table*/) {}
-#endif
-
-} // namespace
 
 extern "C" {
 
@@ -54,11 +23,12 @@ extern "C" {
                                                               cl_uint* countNeeded,
                                                               const cl_icd_dispatch** table)
 {
+    static cl_icd_dispatch theTable;
     if (count < sizeof theTable / sizeof(void*))
         return CL_INVALID_VALUE;
     theTable = *below;
-    theRuntime = *below;
-    makeOld(theTable);
+    if (changeTable != nullptr)
+        changeTable(theTable);
     *countNeeded = sizeof theTable / sizeof(void*);
     *table = &theTable;
     return CL_SUCCESS;

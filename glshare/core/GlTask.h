@@ -1,0 +1,80 @@
+// A piece of work for a worker's thread, and the queue that holds such work. Passing a task on
+// allocates nothing.
+#pragma once
+
+#include <memory>
+#include <utility>
+
+namespace glshare {
+
+class GlDevice;
+
+class GlTask {
+public:
+    GlTask() = default;
+    virtual ~GlTask() = default;
+
+    GlTask(const GlTask&) = delete;
+    GlTask& operator=(const GlTask&) = delete;
+
+    // Works on the worker's thread. `device` is null once the GL side is gone: then all that is
+    // left to do is to complete what others wait for. Returns whether the work has ended; a task
+    // that is watched runs again at short intervals until it has.
+    virtual bool run(GlDevice* device) noexcept = 0;
+
+    // What a GlTaskPtr does at its end. Nothing may be done with the task afterwards.
+    virtual void drop() noexcept { delete this; }
+
+    struct Drop {
+        void operator()(GlTask* task) const noexcept { task->drop(); }
+    };
+
+private:
+    friend class GlTaskQueue;
+    std::unique_ptr<GlTask, Drop> next_; // in the queue that owns the task
+};
+
+using GlTaskPtr = std::unique_ptr<GlTask, GlTask::Drop>;
+
+// First in, first out. Not synchronised.
+class GlTaskQueue {
+public:
+    GlTaskQueue() = default;
+    ~GlTaskQueue()
+    {
+        while (!empty())
+            pop();
+    }
+
+    GlTaskQueue(const GlTaskQueue&) = delete;
+    GlTaskQueue& operator=(const GlTaskQueue&) = delete;
+
+    void swap(GlTaskQueue& other) noexcept
+    {
+        std::swap(first_, other.first_);
+        std::swap(last_, other.last_);
+    }
+
+    [[nodiscard]] bool empty() const { return first_ == nullptr; }
+
+    void push(GlTaskPtr task) noexcept
+    {
+        GlTask* const added = task.get();
+        (empty() ? first_ : last_->next_) = std::move(task);
+        last_ = added;
+    }
+
+    // Takes the first; the queue must not be empty.
+    GlTaskPtr pop() noexcept
+    {
+        GlTaskPtr task = std::move(first_);
+        first_ = std::move(task->next_);
+        return task;
+    }
+
+private:
+    GlTaskPtr first_;
+    GlTask* last_ = nullptr; // valid unless the queue is empty
+};
+
+} // namespace glshare
