@@ -40,6 +40,14 @@ std::unique_ptr<SkinDeformer> skinInDouble(const MeshGeometry& geometry)
     return result;
 }
 
+// All bones take all vertices to one point, where no normal is right.
+std::unique_ptr<SkinDeformer> skinCollapsed(const MeshGeometry& geometry)
+{
+    auto result = skin(geometry, false);
+    result->bones.assign(3, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3});
+    return result;
+}
+
 std::unique_ptr<TwistDeformer> twist()
 {
     auto result = std::make_unique<TwistDeformer>();
@@ -95,6 +103,7 @@ const std::vector<DeformerCase>& deformerCases()
         {"skin", [](Mesh m) { return skin(m, false); }, true},
         {"skinMirrored", [](Mesh m) { return skin(m, true); }, true},
         {"skinInDouble", [](Mesh m) { return skinInDouble(m); }, true},
+        {"skinCollapsed", [](Mesh m) { return skinCollapsed(m); }, false},
         {"twist", [](Mesh) { return twist(); }, true},
         {"wave", [](Mesh) { return wave(WaveDeformer::kY, 0.05f); }, true},
         {"waveOfCompression", [](Mesh) { return wave(WaveDeformer::kX, 0.05f); }, true},
