@@ -136,10 +136,9 @@ Vector areaVector(const Vector& p, const Vector& next, const Vector& last)
     return cross(next - p, last - p);
 }
 
-// Orders the corners of one vertex as SmoothTopology::corners() has them.
+// Puts the corner first that SmoothTopology::corners() has first.
 void arrange(std::span<Corner> corners, const Surface& rest, Index vertex)
 {
-    const Vector normal = wide(rest.normals[vertex]);
     const auto area = [&](const Corner& corner) {
         return areaVector(wide(rest.positions[vertex]), wide(rest.positions[corner.next]),
                           wide(rest.positions[corner.last]));
@@ -147,16 +146,9 @@ void arrange(std::span<Corner> corners, const Surface& rest, Index vertex)
     Vector sum;
     for (const Corner& corner : corners)
         sum += area(corner);
-    if (dot(sum, normal) < 0) {
-        for (Corner& corner : corners)
-            std::swap(corner.next, corner.last);
-    }
-    const auto agreement = [&](const Corner& corner) {
-        return dot(normalised(area(corner)), normal);
-    };
     const auto best =
         std::max_element(corners.begin(), corners.end(), [&](const Corner& a, const Corner& b) {
-            return agreement(a) < agreement(b);
+            return dot(normalised(area(a)), sum) < dot(normalised(area(b)), sum);
         });
     if (best != corners.end())
         std::swap(*best, corners.front());
@@ -327,11 +319,11 @@ void SmoothDeformer::deform(const MeshGeometry& /*geometry*/, Surface& surface) 
         const Vector normal = normalOf(positions, corners, i);
         if (dot(normal, normal) == 0)
             continue;
-        // Upstream deformers may have mirrored the mesh.
+        // The triangles may be clockwise, and deformers before this one may have mirrored the mesh.
         const Corner& first = corners.front();
-        const bool isMirrored = dot(areaVector(before[i], before[first.next], before[first.last]),
+        const bool isReversed = dot(areaVector(before[i], before[first.next], before[first.last]),
                                     wide(surface.normals[i])) < 0;
-        surface.normals[i] = narrow((isMirrored ? -1 : 1) * normal);
+        surface.normals[i] = narrow((isReversed ? -1 : 1) * normal);
     }
 }
 

@@ -37,8 +37,7 @@ public:
         std::uint32_t begin = 0;
         std::uint32_t end = 0;
     };
-    // The two other corners of a triangle, in the order in which it is seen counterclockwise from
-    // the side of the rest normal.
+    // The two other corners of a triangle, in its order.
     struct Corner {
         std::uint32_t next = 0;
         std::uint32_t last = 0;
@@ -52,7 +51,8 @@ public:
     const ConstantArray& neighbourRanges() const { return fNeighbourRanges; }
     const ConstantArray& neighbours() const { return fNeighbours; }
     // One range per vertex in corners(): the triangles of the vertices that share its position and
-    // its rest normal. The first is the one that agrees best with the rest normal.
+    // its rest normal. The first is the one whose plane is nearest to the mean of all; it decides
+    // on which side of the triangles a normal lies.
     const ConstantArray& cornerRanges() const { return fCornerRanges; }
     const ConstantArray& corners() const { return fCorners; }
 

@@ -70,10 +70,10 @@ kernel void smoothNormals(const uint vertexCount, global const float* positions,
         size += fabs(area);
     }
     const float3 incoming = vload3(vertex, normals);
-    const bool isMirrored = dot(incoming, incoming) > 2.0f;
-    float3 normal = isMirrored ? 0.5f * incoming : incoming;
+    const bool isReversed = dot(incoming, incoming) > 2.0f;
+    float3 normal = isReversed ? 0.5f * incoming : incoming;
     if (sumOf(fabs(sum)) > CANCELLED * sumOf(size))
-        normal = sum * ((isMirrored ? -1.0f : 1.0f) * rsqrt(dot(sum, sum)));
+        normal = sum * ((isReversed ? -1.0f : 1.0f) * rsqrt(dot(sum, sum)));
     vstore3(position, vertex, deformedPositions);
     vstore3(normal, vertex, deformedNormals);
 }

@@ -60,7 +60,7 @@ std::unique_ptr<WaveDeformer> wave(WaveDeformer::Axis displacement, float amplit
 {
     auto result = std::make_unique<WaveDeformer>();
     result->amplitude = amplitude;
-    result->phase = 0.7f;
+    result->phase = 50000.7f; // grows with the time that a host runs
     result->displacement = displacement;
     result->space = kSpace;
     return result;

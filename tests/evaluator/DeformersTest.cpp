@@ -23,6 +23,7 @@ using namespace vyra;
 using testing::HasSubstr;
 
 constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+constexpr float kInfinity = std::numeric_limits<float>::infinity();
 constexpr float kPi = std::numbers::pi_v<float>;
 constexpr float kTolerance = 1e-6f;
 
@@ -284,6 +285,9 @@ TEST(Deformers, SettingsThatDoNotFitAreNamed)
         {skin(SkinWeights({{}}, {{1.5f, -0.5f, 0, 0}}), {}),
          "vertex 0 is negative or not a number"},
         {skin(SkinWeights({{}}, {{kNan, 1, 0, 0}}), {}), "vertex 0 is negative or not a number"},
+        {skin(SkinWeights({{}}, {{kInfinity, 1, 0, 0}}), {}),
+         "vertex 0 is negative or not a number"},
+        {skin(SkinWeights(Lists{{{0, kInfinity}}}), {}), "vertex 0 is negative or not a number"},
         {skin(SkinWeights(Lists{{{0, 1}}, {{0, kNan}}}), {}),
          "vertex 1 is negative or not a number"},
         {skin(SkinWeights(Lists{{{0, 1}}, {}}), {}), "the weights of vertex 1 are all 0"},
@@ -293,6 +297,7 @@ TEST(Deformers, SettingsThatDoNotFitAreNamed)
         {morph({{{{}}, {}}, {{{}, {}}, {}}}, {1, 1}), "target 1 has 2 positions"},
         {morph({{{{}}, {{}, {}}}}, {1}), "target 0 has 2 normals and 1 positions"},
         {morph({{{{}}, {}}}, {kNan}), "not a finite number"},
+        {with(morph({}, {}), [](auto& d) { d.strength = kNan; }), "not a finite number"},
         {twist(1, flat), "no inverse"},
         {twist(1, notANumber), "no inverse"},
         {wave(0, flat), "no inverse"},
