@@ -83,13 +83,15 @@ public:
     // evaluate does the same. Returns the first failure.
     Status prepare();
 
-    // Opens evaluation `id`, deforms all meshes, and closes it. 0xFFFE is not an evaluation:
-    // nothing is done. status() and DeformableMesh::status report failures.
+    // Opens evaluation `id`, deforms all meshes, and closes it; an evaluation that the host opened
+    // with the same id stays open. 0xFFFE is not an evaluation: nothing is done. status() and
+    // DeformableMesh::status report failures.
     void evaluate(const em::Id& id) override;
 
     // Deforms all meshes in an evaluation that the host opened with
-    // TopenCLSharedBufferMgr::PreEvaluate and closes with PostEvaluate. Afterwards every event is
-    // reported to the batch release, and buffers outside the batch are released. Returns status().
+    // TopenCLSharedBufferMgr::PreEvaluate and closes with PostEvaluate. Refused if none is open.
+    // Afterwards every event is reported to the batch release, and buffers outside the batch are
+    // released. Returns status().
     const Status& deform();
 
     // Returns when the renderer may draw what was evaluated: waits in the modes that leave this to

@@ -26,6 +26,7 @@ public:
     std::string file = "test.cl";
     std::string function; // "plain" takes the common arguments, "full" all kinds
     std::string options;
+    std::string text;    // of the kernels; empty: they are in the file
     std::string problem; // what mismatch returns
     unsigned passes = 1;
     bool neighbours = false;
@@ -40,7 +41,7 @@ public:
     unsigned passCount() const override { return passes; }
     vyra::KernelSource kernel(unsigned /*pass*/) const override
     {
-        return {file, function, options};
+        return {file, function, options, text};
     }
     bool readsNeighbours() const override { return neighbours; }
     void setArguments(unsigned pass, vyra::KernelArguments& arguments) override;

@@ -141,6 +141,16 @@ TEST_F(EvaluatorKernelFileTest, ReplacementThatDoesNotFitChangesNothing)
     expectedLeft = {"program#4 x1"}; // the store keeps what lacks the kernel
 }
 
+TEST_F(EvaluatorKernelFileTest, TextOfADeformerIsUsedUntilItIsReplaced)
+{
+    startWithMesh("memory.cl");
+    fDeformer->text = "#error";
+    EXPECT_THAT(messageOfMesh(), HasSubstr("the kernel file 'memory.cl' does not compile"));
+    EXPECT_TRUE(evaluator->replaceKernelFile("memory.cl", kKernelText).ok());
+    EXPECT_EQ(messageOfMesh(), "");
+    warnings();
+}
+
 TEST_F(EvaluatorKernelFileTest, OptionsArePrograms)
 {
     startWithMesh();
