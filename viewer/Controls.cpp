@@ -24,6 +24,7 @@ constexpr KeyBinding kBindings[] = {
     {Qt::Key_C, "C", Action::kSideBySide, "CPU", "A copy that the CPU deforms, on the right."},
     {Qt::Key_D, "D", Action::kDetail, "detail", "The other level of detail."},
     {Qt::Key_O, "O", Action::kOverlay, "overlay", "The overlay off, and on."},
+    {Qt::Key_Home, "Home", Action::kResetView, "view", "The first view again."},
     {Qt::Key_Escape, "Esc", Action::kQuit, "quit", "Quits."},
 };
 

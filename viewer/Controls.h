@@ -7,7 +7,7 @@
 
 namespace viewer {
 
-enum class Action { kPause, kDeformers, kSideBySide, kOverlay, kDetail, kQuit };
+enum class Action { kPause, kDeformers, kSideBySide, kOverlay, kDetail, kResetView, kQuit };
 
 // The place in the chain of the deformer that the key (of Qt::Key) switches: 0 for the key 1.
 // Nothing for other keys.

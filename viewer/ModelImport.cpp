@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cstring>
 #include <map>
 #include <new>
 #include <numeric>
@@ -26,9 +27,12 @@ const QVector3D kDefaultColour(0.76f, 0.57f, 0.43f);
 // Greys are what exporters write when the colour comes from a texture.
 constexpr float kLeastColour = 0.05f;
 
+// Formats whose z axis points up by definition and that Assimp leaves as they are, by the beginning
+// of what its metadata call them.
+constexpr const char* kFormatsWithZUp[] = {"Blender 3D", "3mf"};
+
 constexpr unsigned kPostProcessing = aiProcess_JoinIdenticalVertices | aiProcess_Triangulate |
-                                     aiProcess_GenSmoothNormals | aiProcess_LimitBoneWeights |
-                                     aiProcess_SortByPType;
+                                     aiProcess_LimitBoneWeights | aiProcess_SortByPType;
 
 using NodeIndex = std::map<std::string, std::size_t>;
 
@@ -75,7 +79,8 @@ void copyVertices(const aiMesh& source, Mesh& mesh)
 {
     for (unsigned i = 0; i < source.mNumVertices; ++i) {
         mesh.positions.push_back(toQt(source.mVertices[i]));
-        mesh.normals.push_back(toQt(source.mNormals[i]));
+        if (source.HasNormals())
+            mesh.normals.push_back(toQt(source.mNormals[i]));
     }
     for (unsigned i = 0; i < source.mNumFaces; ++i) {
         const aiFace& face = source.mFaces[i];
@@ -134,7 +139,7 @@ void copyMorphTargets(const aiMesh& source, Mesh& mesh)
 {
     const auto deltas = [&source](const aiVector3D* target, const aiVector3D* base) {
         std::vector<QVector3D> result;
-        for (unsigned i = 0; target && i < source.mNumVertices; ++i)
+        for (unsigned i = 0; target && base && i < source.mNumVertices; ++i)
             result.push_back(toQt(target[i] - base[i]));
         return result;
     };
@@ -150,34 +155,35 @@ void copyMorphTargets(const aiMesh& source, Mesh& mesh)
     }
 }
 
-Mesh copyMesh(const aiScene& scene, const aiMesh& source, std::size_t node, const NodeIndex& nodes)
+Mesh copyMesh(const aiScene& scene, const aiMesh& source, std::size_t node, const NodeIndex& nodes,
+              double creaseAngle)
 {
     Mesh mesh;
     mesh.name = source.mName.C_Str();
     mesh.node = node;
     mesh.colour = materialColour(scene, source.mMaterialIndex);
     copyVertices(source, mesh);
-    completeNormals(mesh);
-    turnNormalsOutside(mesh);
     if (source.HasBones())
         copyBones(source, nodes, mesh);
     copyMorphTargets(source, mesh);
+    completeNormals(mesh, creaseAngle);
+    turnNormalsOutside(mesh);
     return mesh;
 }
 
 // A mesh that several nodes use becomes a mesh for each. Walks in the order of addNodes, which
 // numbered the nodes; `self` is the number of `source` and becomes that of the next node.
 void addMeshes(const aiScene& scene, const aiNode& source, const NodeIndex& nodes,
-               std::size_t& self, Model& model)
+               double creaseAngle, std::size_t& self, Model& model)
 {
     for (unsigned i = 0; i < source.mNumMeshes; ++i) {
         const aiMesh& mesh = *scene.mMeshes[source.mMeshes[i]];
-        if ((mesh.mPrimitiveTypes & aiPrimitiveType_TRIANGLE) != 0 && mesh.HasNormals())
-            model.meshes.push_back(copyMesh(scene, mesh, self, nodes));
+        if ((mesh.mPrimitiveTypes & aiPrimitiveType_TRIANGLE) != 0)
+            model.meshes.push_back(copyMesh(scene, mesh, self, nodes, creaseAngle));
     }
     ++self;
     for (unsigned i = 0; i < source.mNumChildren; ++i)
-        addMeshes(scene, *source.mChildren[i], nodes, self, model);
+        addMeshes(scene, *source.mChildren[i], nodes, creaseAngle, self, model);
 }
 
 template <typename SourceKey, typename Convert>
@@ -248,16 +254,47 @@ QMatrix4x4 upright(UpAxis up, bool downwards)
     return rotation;
 }
 
+// Whether two matrices turn in the same way; importers round.
+bool sameRotation(const QMatrix4x4& a, const QMatrix4x4& b)
+{
+    constexpr float kTolerance = 1e-5f;
+    const QMatrix4x4 difference = a - b;
+    for (int row = 0; row < 3; ++row) {
+        if (difference.row(row).toVector3D().length() > kTolerance)
+            return false;
+    }
+    return true;
+}
+
+// The axis that the file's metadata or its format names.
+QMatrix4x4 uprightByFile(const aiMetadata& metadata)
+{
+    aiString format;
+    if (metadata.Get("SourceAsset_Format", format)) {
+        for (const char* known : kFormatsWithZUp) {
+            if (std::strncmp(format.C_Str(), known, std::strlen(known)) == 0)
+                return upright(UpAxis::kZ, false);
+        }
+    }
+    int axis = 0;
+    int sign = 1;
+    if (!metadata.Get("UpAxis", axis) || axis < 0 || axis > static_cast<int>(UpAxis::kZ))
+        return {};
+    metadata.Get("UpAxisSign", sign);
+    return upright(static_cast<UpAxis>(axis), sign < 0);
+}
+
+// Importers that stand a model upright by themselves turn its root.
 QMatrix4x4 upright(const aiScene& scene, const ImportSettings& settings)
 {
-    if (settings.up)
-        return upright(*settings.up, false);
-    int axis = static_cast<int>(UpAxis::kY);
-    int sign = 1;
-    if (!scene.mMetaData || !scene.mMetaData->Get("UpAxis", axis) || axis < 0 || axis > 2)
-        return {};
-    scene.mMetaData->Get("UpAxisSign", sign);
-    return upright(static_cast<UpAxis>(axis), sign < 0);
+    const QMatrix4x4 root = toQt(scene.mRootNode->mTransformation);
+    const QMatrix4x4 fromZ = upright(UpAxis::kZ, false);
+    if (settings.up) {
+        const QMatrix4x4 rotation = upright(*settings.up, false);
+        return sameRotation(root, fromZ) ? rotation * fromZ.transposed() : rotation;
+    }
+    const bool untouched = sameRotation(root, QMatrix4x4());
+    return untouched && scene.mMetaData ? uprightByFile(*scene.mMetaData) : QMatrix4x4();
 }
 
 // The root of the nodes stands the model upright; the file's nodes are below it.
@@ -268,7 +305,7 @@ Model copyScene(const aiScene& scene, const ImportSettings& settings)
     addNodes(*scene.mRootNode, 0, model);
     const NodeIndex nodes = indexByName(model);
     std::size_t first = 1;
-    addMeshes(scene, *scene.mRootNode, nodes, first, model);
+    addMeshes(scene, *scene.mRootNode, nodes, settings.creaseAngle, first, model);
     for (unsigned i = 0; i < scene.mNumAnimations; ++i)
         model.animations.push_back(copyAnimation(*scene.mAnimations[i], nodes));
     return model;
@@ -328,9 +365,6 @@ Result<Model> readModel(Assimp::Importer& importer, const std::string& file,
                         const ImportSettings& settings)
 {
     importer.SetPropertyInteger(AI_CONFIG_PP_LBW_MAX_WEIGHTS, static_cast<int>(kBonesPerVertex));
-    importer.SetPropertyFloat(AI_CONFIG_PP_GSN_MAX_SMOOTHING_ANGLE,
-                              static_cast<float>(settings.creaseAngle));
-    importer.SetPropertyBool(AI_CONFIG_IMPORT_COLLADA_IGNORE_UP_DIRECTION, settings.up.has_value());
     const aiScene* scene = importer.ReadFile(file, aiProcess_ValidateDataStructure);
     if (!scene || !scene->mRootNode)
         return unreadable(file, importer);
@@ -341,7 +375,6 @@ Result<Model> readModel(Assimp::Importer& importer, const std::string& file,
     // same.
     auto& changeable = const_cast<aiScene&>(*scene);
     rescaleExtremeScene(changeable);
-    removeUselessNormals(changeable);
     scene = importer.ApplyPostProcessing(kPostProcessing);
     if (!scene)
         return unreadable(file, importer);

@@ -208,7 +208,9 @@ std::string helpText()
     QCommandLineParser parser;
     describe(parser);
     return parser.helpText().toStdString() + "\nDeformers and their parameters:\n" +
-           deformerHelp() + "\nIn the window: drag to orbit, wheel to zoom, and the keys\n" +
+           deformerHelp() +
+           "\nIn the window: drag to orbit, drag with Shift or the right button to pan, wheel to "
+           "zoom, and the keys\n" +
            keyHelp() + kExitCodes;
 }
 

@@ -32,13 +32,14 @@ std::string overlayText(const OverlayFacts& facts)
 {
     std::ostringstream text;
     text << std::fixed << std::setprecision(2);
+    if (facts.framesPerSecond > 0)
+        line(text, "Frames per second") << facts.framesPerSecond << '\n';
     line(text, "Evaluation") << facts.evaluationMs << " ms\n";
     if (facts.cpuTwinMs)
         line(text, "CPU, on the right") << *facts.cpuTwinMs << " ms\n";
+    line(text, "Deformed by") << deformedBy(facts.share) << '\n';
     if (facts.openCL)
         addOpenCL(*facts.openCL, text);
-    else
-        line(text, "Deformed by") << "the CPU, since OpenCL is not used\n";
     line(text, "Deformers") << facts.deformers << '\n';
     line(text, "Time") << (facts.paused ? "paused\n" : "running\n");
     text << '\n' << keyReminder() << '\n';

@@ -1,6 +1,8 @@
 // What the overlay says.
 #pragma once
 
+#include "viewer/MeshShare.h"
+
 #include <cstddef>
 #include <optional>
 #include <string>
@@ -14,7 +16,9 @@ struct OverlayFacts {
         std::string clToGraphics;
         std::size_t batchSize = 0; // vertex buffers
     };
-    std::optional<OpenCL> openCL;    // empty: everything is deformed on the CPU
+    std::optional<OpenCL> openCL; // empty: everything is deformed on the CPU
+    MeshShare share;
+    double framesPerSecond = 0;      // 0: not measured yet
     double evaluationMs = 0;         // of late, the median
     std::optional<double> cpuTwinMs; // of the CPU's copy, where it is shown
     bool paused = false;

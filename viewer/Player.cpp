@@ -21,6 +21,7 @@ Player::Player(Session& session)
 Status Player::renderFrame()
 {
     takeChangedKernels();
+    fFrameRate.countFrame();
     return fSession.renderFrame(fClock.seconds());
 }
 
@@ -58,9 +59,10 @@ OverlayTexts Player::texts() const
         return texts;
     OverlayFacts facts = fSession.overlayFacts();
     facts.paused = fClock.paused();
+    facts.framesPerSecond = fFrameRate.perSecond();
     texts.facts = overlayText(facts);
     if (facts.cpuTwinMs) {
-        texts.leftHalf = facts.openCL ? "OpenCL" : "CPU";
+        texts.leftHalf = facts.share.allOnCpu() ? "CPU" : "OpenCL";
         texts.rightHalf = "CPU";
     }
     return texts;
@@ -90,6 +92,9 @@ void Player::act(Action action)
         break;
     case Action::kOverlay:
         fShowsOverlay = !fShowsOverlay;
+        break;
+    case Action::kResetView:
+        fSession.camera().reset();
         break;
     case Action::kQuit:
         break;

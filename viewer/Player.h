@@ -4,6 +4,7 @@
 
 #include "viewer/Controls.h"
 #include "viewer/Failure.h"
+#include "viewer/FrameRate.h"
 #include "viewer/KernelWatch.h"
 #include "viewer/Overlay.h"
 #include "viewer/PlayClock.h"
@@ -42,6 +43,7 @@ private:
 
     Session& fSession;
     PlayClock fClock;
+    FrameRate fFrameRate;
     KernelWatch fKernelWatch;
     std::map<std::string, std::string> fComplaints; // by the kernel file
     Overlay fOverlay;

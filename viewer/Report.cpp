@@ -48,16 +48,9 @@ void addOpenCL(const OpenCLFacts& cl, Lines& line)
 void addMeshes(const RunFacts& facts, Lines& line)
 {
     line("Characters") << facts.characters;
-    line("Meshes") << facts.meshes << " with " << facts.vertices << " vertices";
+    line("Meshes") << facts.share.meshes << " with " << facts.vertices << " vertices";
     line("Deformers") << facts.deformers;
-    if (!facts.openCL)
-        line("Deformed by") << "the CPU, since OpenCL is not used";
-    else if (facts.meshesOnCpu > 0)
-        line("Deformed by") << "OpenCL, but " << facts.meshesOnCpu
-                            << " meshes by the CPU: they have fewer than "
-                            << facts.openCL->minimumVertices << " vertices";
-    else
-        line("Deformed by") << "OpenCL, all of them";
+    line("Deformed by") << deformedBy(facts.share);
 }
 
 void addCounts(const OpenCLFacts& cl, Lines& line)
@@ -74,12 +67,14 @@ void addCounts(const OpenCLFacts& cl, Lines& line)
                           << mebibytes(cl.peakDeviceBytes);
 }
 
-void addDeviation(const Deviation& deviation, Lines& line)
+void addDeviation(const Deviation& deviation, const MeshShare& share, Lines& line)
 {
     line("Largest deviation") << std::scientific << std::setprecision(2) << deviation.position
                               << " of a character's size (bound " << kPositionBound << "), normals "
                               << deviation.normal << " (bound " << kNormalBound
                               << "): " << (deviation.withinBound() ? "passed" : "FAILED");
+    if (share.allOnCpu())
+        line("") << "Nothing ran on OpenCL: the CPU was compared with itself.";
 }
 
 } // namespace
@@ -109,7 +104,7 @@ std::string reportText(const RunFacts& facts)
     if (facts.openCL)
         addCounts(*facts.openCL, line);
     if (facts.deviation)
-        addDeviation(*facts.deviation, line);
+        addDeviation(*facts.deviation, facts.share, line);
     return line.text();
 }
 

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "evaluator/Evaluator.h"
+#include "viewer/MeshShare.h"
 #include "viewer/Verification.h"
 
 #include <cstddef>
@@ -17,7 +18,6 @@ struct OpenCLFacts {
     std::string graphicsToCL; // the two synchronisation modes
     std::string clToGraphics;
     bool doublePrecision = false;
-    int minimumVertices = 0;
     vyra::EvaluatorCounts counts;
     std::size_t deviceBytes = 0;
     std::size_t peakDeviceBytes = 0;
@@ -27,9 +27,8 @@ struct RunFacts {
     std::optional<OpenCLFacts> openCL; // empty: everything was deformed on the CPU
     std::string renderer;
     std::size_t characters = 0;
-    std::size_t meshes = 0; // of all characters, as the next two
-    std::size_t meshesOnCpu = 0;
-    std::size_t vertices = 0;
+    MeshShare share;                  // of the meshes of all characters
+    std::size_t vertices = 0;         // of all characters
     std::string deformers;            // the chain
     std::vector<double> evaluationMs; // of each frame, from its start until it could be drawn
     std::optional<Deviation> deviation;

@@ -7,6 +7,7 @@
 #include <cmath>
 #include <utility>
 
+#include <QtMath>
 #include <tbb/parallel_for.h>
 
 namespace viewer {
@@ -18,6 +19,8 @@ constexpr float kGap = 0.25f;
 constexpr double kPhaseStep = 0.61803398875;
 // Characters of a model without an animation start within this time.
 constexpr double kPhaseSpread = 4.0; // seconds
+// Radians, head against feet, that the picture leaves room for.
+constexpr float kFramedTwist = 0.5f;
 constexpr double kFullTurn = 6.28318530718;
 // How much the tints of a crowd differ from white.
 constexpr float kTintDepth = 0.13f;
@@ -67,6 +70,42 @@ QVector3D tintOf(int number)
         return 1.0f - kTintDepth * static_cast<float>(0.5 + 0.5 * std::cos(angle + shift));
     };
     return {channel(0), channel(kFullTurn / 3), channel(2 * kFullTurn / 3)};
+}
+
+// The points, and where both ends of the twist of the first deformers bring them.
+std::vector<QVector3D> twisted(const std::vector<QVector3D>& points, float height)
+{
+    const float perHeight = qRadiansToDegrees(kFramedTwist) / std::max(height, kGap);
+    std::vector<QVector3D> result = points;
+    for (const float angle : {-perHeight, perHeight}) {
+        for (const QVector3D& point : points) {
+            QMatrix4x4 turn;
+            turn.rotate(angle * point.y(), 0, 1, 0);
+            result.push_back(turn.map(point));
+        }
+    }
+    return result;
+}
+
+// Evenly over the sphere, on a spiral from pole to pole.
+std::vector<QVector3D> evenDirections()
+{
+    constexpr int kDirections = 200;
+    std::vector<QVector3D> directions;
+    for (int i = 0; i < kDirections; ++i) {
+        const double y = 1 - (2 * i + 1.0) / kDirections;
+        const double radius = std::sqrt(1 - y * y);
+        const double angle = kFullTurn * kPhaseStep * i;
+        directions.emplace_back(radius * std::cos(angle), y, radius * std::sin(angle));
+    }
+    return directions;
+}
+
+QVector3D outermost(const std::vector<QVector3D>& points, const QVector3D& direction)
+{
+    return *std::max_element(points.begin(), points.end(), [&](const auto& a, const auto& b) {
+        return QVector3D::dotProduct(a, direction) < QVector3D::dotProduct(b, direction);
+    });
 }
 
 GLuint createIndexBuffer(QOpenGLFunctions_3_3_Core& gl, const Mesh& mesh)
@@ -124,13 +163,17 @@ bool Scene::hasExtent() const
     return std::isfinite(extent) && extent > 0;
 }
 
+// All characters have the same outline, so the outermost point in a direction is that of the
+// outermost character.
 std::vector<QVector3D> Scene::outline() const
 {
+    std::vector<QVector3D> places;
+    for (const Character& character : fCharacters)
+        places.push_back(character.placement.map(QVector3D()));
+    const std::vector<QVector3D> character = twisted(fSpace.outline, fSpace.size.y());
     std::vector<QVector3D> points;
-    for (const Character& character : fCharacters) {
-        for (const QVector3D& point : fSpace.outline)
-            points.push_back(character.placement.map(point));
-    }
+    for (const QVector3D& direction : evenDirections())
+        points.push_back(outermost(places, direction) + outermost(character, direction));
     return points;
 }
 

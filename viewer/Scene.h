@@ -92,7 +92,7 @@ public:
     // Whether the model's extent over the animation is finite and not 0. Without it nothing is
     // seen.
     bool hasExtent() const;
-    // The outermost points of all characters over the animation.
+    // The outermost points of all characters over the animation, in many directions.
     std::vector<QVector3D> outline() const;
 
 private:

@@ -180,19 +180,4 @@ void rescaleExtremeScene(aiScene& scene)
     scaleNode(*scene.mRootNode, factor);
 }
 
-void removeUselessNormals(aiScene& scene)
-{
-    for (unsigned i = 0; i < scene.mNumMeshes; ++i) {
-        aiMesh& mesh = *scene.mMeshes[i];
-        if (!mesh.mNormals || std::any_of(mesh.mNormals, mesh.mNormals + mesh.mNumVertices,
-                                          [](const aiVector3D& normal) {
-                                              return isFinite(normal) && normal != aiVector3D();
-                                          }))
-            continue;
-        // As the destructor of a mesh does.
-        delete[] mesh.mNormals;
-        mesh.mNormals = nullptr;
-    }
-}
-
 } // namespace viewer

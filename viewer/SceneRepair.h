@@ -17,7 +17,4 @@ std::optional<std::string> findNonFiniteNumber(const aiScene& scene);
 // neither vanish nor overflow.
 void rescaleExtremeScene(aiScene& scene);
 
-// Removes the normals of meshes that have no usable one, so that post-processing computes them.
-void removeUselessNormals(aiScene& scene);
-
 } // namespace viewer

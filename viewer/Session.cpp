@@ -326,11 +326,22 @@ OpenCLFacts Session::openCLFacts() const
     facts.graphicsToCL = nameOf(info.graphicsToCLSyncMode());
     facts.clToGraphics = nameOf(info.clToGraphicsSyncMode());
     facts.doublePrecision = info.supportsDoublePrecision();
-    facts.minimumVertices = info.minimumBufferSize();
     facts.counts = fEvaluator->counts();
     facts.deviceBytes = memory.currentBytes;
     facts.peakDeviceBytes = memory.peakBytes;
     return facts;
+}
+
+MeshShare Session::meshShare() const
+{
+    MeshShare share;
+    share.openCLIsUsed = fEvaluator->usesOpenCL();
+    if (share.openCLIsUsed)
+        share.minimumVertices = TopenCLInfo::theOne().minimumBufferSize();
+    share.meshes = fScene->meshes().size();
+    for (const CharacterMesh* mesh : fScene->meshes())
+        share.meshesOnCpu += mesh->deformable->usesOpenCL() ? 0 : 1;
+    return share;
 }
 
 OverlayFacts Session::overlayFacts() const
@@ -340,6 +351,7 @@ OverlayFacts Session::overlayFacts() const
         const OpenCLFacts cl = openCLFacts();
         facts.openCL = {cl.device, cl.graphicsToCL, cl.clToGraphics, fEvaluator->batchSize()};
     }
+    facts.share = meshShare();
     const std::size_t recent = std::min(fEvaluationMs.size(), kRecentFrames);
     const auto end = fEvaluationMs.end();
     facts.evaluationMs = percentile({end - static_cast<std::ptrdiff_t>(recent), end}, 0.5);
@@ -356,11 +368,9 @@ std::string Session::report() const
         facts.openCL = openCLFacts();
     facts.renderer = reinterpret_cast<const char*>(fGL->glGetString(GL_RENDERER));
     facts.characters = fScene->characters().size();
-    facts.meshes = fScene->meshes().size();
-    for (const CharacterMesh* mesh : fScene->meshes()) {
+    facts.share = meshShare();
+    for (const CharacterMesh* mesh : fScene->meshes())
         facts.vertices += mesh->mesh().vertexCount();
-        facts.meshesOnCpu += mesh->deformable->usesOpenCL() ? 0 : 1;
-    }
     facts.deformers = chainText(fScene->deformers());
     facts.evaluationMs = fEvaluationMs;
     facts.deviation = fDeviation;

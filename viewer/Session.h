@@ -85,6 +85,7 @@ private:
     bool levelChangeIsDue(EvaluationState state) const;
     Status writePicture() const;
     OpenCLFacts openCLFacts() const;
+    MeshShare meshShare() const;
 
     const Options& fOptions;
     QOpenGLWindow& fWindow;

@@ -16,6 +16,8 @@ namespace {
 
 constexpr qint64 kOpenTimeoutMs = 10000;
 constexpr int kEventSliceMs = 10;
+// Pixels: what the overlay's first lines need.
+constexpr QSize kSmallestSize(160, 90);
 constexpr float kDegreesPerPixel = 0.4f;
 // Qt counts eighths of a degree, and a notch of a usual wheel is 15 degrees.
 constexpr float kUnitsPerNotch = 120.0f;
@@ -44,6 +46,7 @@ Status ViewerWindow::open(const QSize& size)
     if (!openGLIsUsable())
         return noOpenGL();
     setTitle("vyra-viewer");
+    setMinimumSize(kSmallestSize);
     resize(size);
     show();
     QElapsedTimer timer;
@@ -81,8 +84,9 @@ QSize ViewerWindow::pixelSize() const
 
 void ViewerWindow::resizeGL(int, int)
 {
+    // A window manager, or none, may allow less.
     if (fPlayer)
-        fPlayer->session().resize(pixelSize());
+        fPlayer->session().resize(pixelSize().expandedTo(kSmallestSize * devicePixelRatio()));
 }
 
 void ViewerWindow::paintGL()
@@ -122,9 +126,18 @@ void ViewerWindow::mouseMoveEvent(QMouseEvent* event)
 {
     const QPointF moved = event->position() - fLastPosition;
     fLastPosition = event->position();
-    if (fPlayer && event->buttons() != Qt::NoButton)
-        fPlayer->session().camera().orbit(-kDegreesPerPixel * static_cast<float>(moved.x()),
-                                          kDegreesPerPixel * static_cast<float>(moved.y()));
+    if (!fPlayer || event->buttons() == Qt::NoButton)
+        return;
+    Camera& camera = fPlayer->session().camera();
+    const bool pans = event->buttons().testFlag(Qt::RightButton) ||
+                      event->modifiers().testFlag(Qt::ShiftModifier);
+    const auto windowHeight = static_cast<float>(height());
+    if (pans)
+        camera.pan(static_cast<float>(moved.x()) / windowHeight,
+                   static_cast<float>(-moved.y()) / windowHeight);
+    else
+        camera.orbit(-kDegreesPerPixel * static_cast<float>(moved.x()),
+                     kDegreesPerPixel * static_cast<float>(moved.y()));
 }
 
 void ViewerWindow::wheelEvent(QWheelEvent* event)

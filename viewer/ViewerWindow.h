@@ -13,8 +13,8 @@ namespace viewer {
 class Player;
 class Session;
 
-// Without a session it stays empty. With one it draws frame after frame; the mouse orbits, the
-// wheel zooms, the keys do what Controls.h tells.
+// Without a session it stays empty. With one it draws frame after frame; the mouse orbits and
+// pans, the wheel zooms, the keys do what Controls.h tells.
 class ViewerWindow : public QOpenGLWindow {
 public:
     ViewerWindow();

@@ -135,27 +135,47 @@ TEST(Report, PercentilesAreValuesThatWereMeasured)
         EXPECT_EQ(percentile(values, part), expected);
 }
 
-TEST(Report, TellsWhetherTheBoundHeld)
+TEST(Report, DeviationLineNamesTheVerdictAndWhatWasCompared)
 {
+    const char* itself = "compared with itself";
     RunFacts facts;
     facts.deviation = Deviation{2 * kPositionBound, 0};
-    EXPECT_THAT(reportText(facts), HasSubstr("FAILED"));
+    EXPECT_THAT(reportText(facts), AllOf(HasSubstr("FAILED"), HasSubstr(itself)));
     facts.deviation = Deviation{kPositionBound, kNormalBound};
-    EXPECT_THAT(reportText(facts), HasSubstr("passed"));
+    facts.share = {true, 3, 2, 500};
+    EXPECT_THAT(reportText(facts), AllOf(HasSubstr("passed"), Not(HasSubstr(itself))));
+}
+
+TEST(MeshShare, CpuIsNamedIfNothingRanOnOpenCL)
+{
+    const std::pair<MeshShare, const char*> rows[] = {
+        {{false, 3, 3, 0}, "the CPU, since OpenCL is not used"},
+        {{true, 3, 3, 500}, "the CPU, since all meshes have fewer than 500 vertices"},
+        {{true, 3, 1, 500}, "OpenCL, but 1 meshes by the CPU: they have fewer than 500 vertices"},
+        {{true, 3, 0, 500}, "OpenCL, all of them"},
+    };
+    for (const auto& [share, text] : rows)
+        EXPECT_EQ(deformedBy(share), text);
 }
 
 TEST(OverlayText, TellsOnlyWhatIsShown)
 {
-    OverlayFacts facts{
-        {{"a device", "2, fence", "4, finish", 128}}, 1.5, {}, true, "skin, wave (off)"};
+    OverlayFacts facts{{{"a device", "2, fence", "4, finish", 128}},
+                       {true, 1, 0, 0},
+                       59.9,
+                       1.5,
+                       {},
+                       true,
+                       "skin, wave (off)"};
     EXPECT_THAT(overlayText(facts),
-                AllOf(HasSubstr("1.50 ms"), HasSubstr("a device\n"), HasSubstr("2, fence\n"),
-                      HasSubstr("4, finish\n"), HasSubstr("128 vertex buffers\n"),
-                      HasSubstr("paused\n"), HasSubstr("skin, wave (off)\n"),
-                      Not(HasSubstr("on the right"))));
-    facts = {{}, 1.5, 7.25, false, "skin"};
-    EXPECT_THAT(overlayText(facts), AllOf(HasSubstr("7.25 ms"), HasSubstr("OpenCL is not used"),
-                                          Not(HasSubstr("Batch")), Not(HasSubstr("paused"))));
+                AllOf(HasSubstr("59.90\n"), HasSubstr("1.50 ms"), HasSubstr("OpenCL, all of them"),
+                      HasSubstr("a device\n"), HasSubstr("2, fence\n"), HasSubstr("4, finish\n"),
+                      HasSubstr("128 vertex buffers\n"), HasSubstr("paused\n"),
+                      HasSubstr("skin, wave (off)\n"), Not(HasSubstr("on the right"))));
+    facts = {{}, {}, 0, 1.5, 7.25, false, "skin"};
+    EXPECT_THAT(overlayText(facts),
+                AllOf(HasSubstr("7.25 ms"), HasSubstr("OpenCL is not used"),
+                      Not(HasSubstr("Batch")), Not(HasSubstr("paused")), Not(HasSubstr("second"))));
 }
 
 TEST(OverlayText, CutsALongBuildLog)

@@ -264,30 +264,57 @@ TEST(ModelImport, WeightsAreScaledToAddUpToOne)
         EXPECT_EQ(normalised(weights), expected);
 }
 
-TEST(Camera, FramesAllPointsAsLargeAsThePictureAllows)
+// All points are in the picture and centred, and one of its sides is nearly filled.
+void expectFramed(const Camera& camera, const std::vector<QVector3D>& points)
+{
+    std::vector<QVector3D> inClip = points;
+    for (QVector3D& point : inClip)
+        point = camera.toClip().map(point);
+    const auto [low, high] = boundsOf(inClip);
+    EXPECT_GT(std::min({low.x(), low.y(), low.z()}), -1);
+    EXPECT_LT(std::max({high.x(), high.y(), high.z()}), 1);
+    EXPECT_NEAR(low.x() + high.x(), 0, 0.05);
+    EXPECT_NEAR(low.y() + high.y(), 0, 0.05);
+    EXPECT_GT(std::max(high.x() - low.x(), high.y() - low.y()), 1.5);
+}
+
+TEST(Camera, AllPointsStayInThePictureFromAllSidesAndInAllShapes)
 {
     const std::vector<QVector3D> shapes[] = {
         {{-0.3f, 0, -0.2f}, {0.3f, 1, 0.2f}, {0.3f, 0, 0.2f}}, // upright
         {{-9, 0, -9}, {9, 0.5f, 9}, {-9, 0, 9}, {9, 0, -9}},   // a wide crowd
         {{4, 2, 4}, {5, 2.5f, 4}},                             // away from the origin
+        {{-0.5f, 0, 0}, {0.5f, 0, 0}, {0.5f, 0.1f, 0}},        // long
     };
     for (const std::vector<QVector3D>& shape : shapes) {
-        for (const float aspect : {16.0f / 9, 1.0f, 0.5f}) {
-            SCOPED_TRACE(testing::Message() << shape[0].x() << " aspect " << aspect);
-            Camera camera;
-            camera.frame(shape, aspect);
-            std::vector<QVector3D> inClip = shape;
-            for (QVector3D& point : inClip)
-                point = camera.toClip().map(point);
-            const auto [low, high] = boundsOf(inClip);
-            EXPECT_GT(std::min(low.x(), low.y()), -1);
-            EXPECT_LT(std::max(high.x(), high.y()), 1);
-            // Centred, and one of the sides is nearly filled.
-            EXPECT_NEAR(low.x() + high.x(), 0, 0.05);
-            EXPECT_NEAR(low.y() + high.y(), 0, 0.05);
-            EXPECT_GT(std::max(high.x() - low.x(), high.y() - low.y()), 1.6);
+        Camera camera;
+        camera.frame(shape, 16.0f / 9);
+        for (const float aspect : {16.0f / 9, 1.0f, 0.5f, 0.1f}) {
+            camera.setAspect(aspect);
+            for (const float pitch : {0.0f, 500.0f, -500.0f}) {
+                SCOPED_TRACE(testing::Message() << shape[0].x() << ' ' << aspect << ' ' << pitch);
+                expectFramed(camera, shape);
+                camera.orbit(70, pitch);
+            }
         }
+        camera.zoom(5);
+        camera.pan(0.5f, 0.1f);
+        camera.reset();
+        expectFramed(camera, shape);
     }
+}
+
+TEST(Camera, PanMovesThePictureByPartsOfItsHeight)
+{
+    const QVector3D middle(0, 0.5f, 0);
+    Camera camera;
+    camera.frame({{-1, 0, -1}, {1, 1, 1}, {-1, 1, 1}, {1, 0, -1}}, 2);
+    camera.zoom(3);
+    const QVector3D before = camera.toClip().map(middle);
+    camera.pan(0.25f, 0.1f);
+    const QVector3D moved = camera.toClip().map(middle) - before;
+    EXPECT_NEAR(moved.x(), 0.25f, 0.02); // half a height is half of a width of 2
+    EXPECT_NEAR(moved.y(), 0.2f, 0.02);
 }
 
 TEST(Camera, StaysAboveTheGround)

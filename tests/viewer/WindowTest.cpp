@@ -31,6 +31,7 @@ using testing::AllOf, testing::HasSubstr, testing::Not;
 constexpr int kUnitsPerNotch = 120; // of the wheel
 constexpr int kFramesAfterEscape = 60;
 constexpr qint64 kSliceMs = 100;
+constexpr int kLeastFrames = 5;    // also if a frame takes that long
 constexpr qint64 kHangMs = 20000;
 const QSize kSize(160, 120);
 
@@ -40,10 +41,10 @@ void press(QWindow& window, Qt::Key key)
     QCoreApplication::sendEvent(&window, &event);
 }
 
-void moveMouse(QWindow& window, QEvent::Type type, const QPointF& position)
+void moveMouse(QWindow& window, QEvent::Type type, const QPointF& position,
+               Qt::MouseButton button = Qt::LeftButton)
 {
-    QMouseEvent event(type, position, window.mapToGlobal(position), Qt::LeftButton, Qt::LeftButton,
-                      Qt::NoModifier);
+    QMouseEvent event(type, position, window.mapToGlobal(position), button, button, Qt::NoModifier);
     QCoreApplication::sendEvent(&window, &event);
 }
 
@@ -104,7 +105,9 @@ protected:
     {
         QElapsedTimer timer;
         timer.start();
-        while (fSession->verified() && timer.elapsed() < milliseconds) {
+        for (int frames = 0;
+             fSession->verified() && (frames < kLeastFrames || timer.elapsed() < milliseconds);
+             ++frames) {
             ASSERT_FALSE(player.renderFrame());
             QGuiApplication::processEvents();
             fWindow->makeCurrent();
@@ -120,7 +123,7 @@ protected:
     std::unique_ptr<Session> fSession; // goes first, while the context is current
 };
 
-TEST_F(WindowTest, OrbitsZoomsResizesAndChangesTheVertexBuffersDetail)
+TEST_F(WindowTest, OrbitsZoomsPansResizesAndChangesTheVertexBuffersDetail)
 {
     const std::string before = fSession->report();
     press(*fWindow, Qt::Key_D); // without effect: nothing plays yet
@@ -130,7 +133,7 @@ TEST_F(WindowTest, OrbitsZoomsResizesAndChangesTheVertexBuffersDetail)
         moveMouse(*fWindow, QEvent::MouseMove, {60, 10});
         const QVector3D turned = fSession->camera().eye();
         EXPECT_GT((turned - eye).length(), 0.1f);
-        EXPECT_NEAR(turned.y(), eye.y(), 1e-4f);
+        EXPECT_NEAR(turned.y(), eye.y(), 0.05f);
 
         moveMouse(*fWindow, QEvent::MouseMove, {60, 40});
         const QVector3D raised = fSession->camera().eye();
@@ -140,10 +143,15 @@ TEST_F(WindowTest, OrbitsZoomsResizesAndChangesTheVertexBuffersDetail)
                           Qt::NoScrollPhase, false);
         QCoreApplication::sendEvent(fWindow.get(), &wheel);
         EXPECT_LT(fSession->camera().eye().length(), raised.length());
-        fWindow->resize(200, 100);
+        const QVector3D near = fSession->camera().eye();
+        moveMouse(*fWindow, QEvent::MouseMove, {80, 40}, Qt::RightButton);
+        EXPECT_GT((fSession->camera().eye() - near).length(), 0.01f);
+        press(*fWindow, Qt::Key_Home);
+        EXPECT_LT((fSession->camera().eye() - eye).length(), 1e-4f);
+        fWindow->resize(200, 1); // lower than the window's smallest size
         press(*fWindow, Qt::Key_D);
     });
-    EXPECT_EQ(fSession->canvas().size(), QSize(200, 100) * fWindow->devicePixelRatio());
+    EXPECT_EQ(fSession->canvas().size(), QSize(200, 90) * fWindow->devicePixelRatio());
     EXPECT_THAT(before, HasSubstr("3205 vertices"));
     EXPECT_THAT(fSession->report(), Not(HasSubstr("3205 vertices")));
 }

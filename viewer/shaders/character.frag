@@ -11,6 +11,10 @@ void main()
 {
     vec3 toEye = normalize(eye - stagePosition);
     vec3 normal = normalize(stageNormal);
+    // Both sides of a surface are lit: the normal is that of the side that is seen.
+    vec3 seenSide = cross(dFdx(stagePosition), dFdy(stagePosition));
+    if (dot(seenSide, toEye) * dot(seenSide, normal) < 0.0)
+        normal = -normal;
     float facing = dot(normal, lightDirection);
 
     // Off the surface, so that a surface does not shade itself.
