@@ -1,10 +1,11 @@
 // The layer without memory or threads: each call reports it, changes nothing and works afterwards.
 //
-// This file replaces the program's operator new, which the layer's allocations resolve to as well.
-// Those of OpenCL and OpenGL themselves are left alone.
-// Before the headers of the tests, as it includes those of the newest OpenCL.
+// The program's operator new is replaced, which the layer's allocations resolve to as well. Those
+// of OpenCL and OpenGL themselves are left alone. Before the headers of the tests, as it includes
+// those of the newest OpenCL.
 #include "core/OpenCl.h"
 
+#include "ReplacedOperators.h"
 #include "SharingTest.h"
 
 #include <algorithm>
@@ -48,66 +49,11 @@ bool isCalledByLayer()
     return false;
 }
 
-bool nextFails()
-{
-    return allocationsLeft > 0 && isCalledByLayer() && --allocationsLeft == 0;
-}
-
 } // namespace
 
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept
+bool nextAllocationFails()
 {
-    return nextFails() ? nullptr : std::malloc(size ? size : 1);
-}
-void* operator new(std::size_t size)
-{
-    void* memory = operator new(size, std::nothrow);
-    if (memory == nullptr)
-        throw std::bad_alloc();
-    return memory;
-}
-void* operator new(std::size_t size, std::align_val_t alignment)
-{
-    const auto step = static_cast<std::size_t>(alignment);
-    void* memory =
-        nextFails() ? nullptr : std::aligned_alloc(step, (size + step - 1) / step * step);
-    if (memory == nullptr)
-        throw std::bad_alloc();
-    return memory;
-}
-// A sanitizer's own would not come by.
-void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
-{
-    return operator new(size, std::nothrow);
-}
-void* operator new[](std::size_t size)
-{
-    return operator new(size);
-}
-// Not inlined, or a compiler sees free where it expects the counterpart of new.
-[[gnu::noinline]] void operator delete(void* memory) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::align_val_t) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::size_t, std::align_val_t) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete[](void* memory) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete[](void* memory, std::size_t) noexcept
-{
-    std::free(memory);
+    return allocationsLeft > 0 && isCalledByLayer() && --allocationsLeft == 0;
 }
 
 namespace {

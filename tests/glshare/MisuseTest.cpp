@@ -220,6 +220,7 @@ TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
 // The arguments of clGetDeviceIDs count whether or not a device of the type can exist.
 TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
 {
+    const Properties list = properties();
     cl_device_id device = nullptr;
     cl_uint count = 7;
     const cl_int ofNullPlatform = clGetDeviceIDs(nullptr, CL_DEVICE_TYPE_ALL, 1, &device, nullptr);
@@ -234,6 +235,9 @@ TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
     for (const cl_device_type type :
          {cl_device_type{CL_DEVICE_TYPE_CPU}, cl_device_type{CL_DEVICE_TYPE_GPU}}) {
         const cl_int found = clGetDeviceIDs(platform_, type, 1, &device, nullptr);
+        cl_int error = CL_SUCCESS;
+        EXPECT_EQ(clCreateContextFromType(list.data(), type, nullptr, &count, &error), nullptr);
+        EXPECT_EQ(error, CL_INVALID_VALUE) << "data for no callback";
         for (const auto& [what, platform, capacity, devices, number, expected] : rows) {
             SCOPED_TRACE(what);
             EXPECT_EQ(clGetDeviceIDs(platform, type, capacity, devices, number),

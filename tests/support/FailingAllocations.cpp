@@ -1,7 +1,8 @@
-// Replaces the operators new and delete of the program, and what oneTBB's containers call.
+// Decides which allocations fail, and replaces what oneTBB's containers call.
 #include "FailingAllocations.h"
 
 #include "FakeRuntime.h"
+#include "ReplacedOperators.h"
 
 #include <cstdlib>
 #include <new>
@@ -15,9 +16,7 @@ thread_local unsigned failures = 0;
 
 } // namespace scripted
 
-namespace {
-
-bool nextFails()
+bool nextAllocationFails()
 {
     using namespace scripted;
     if (InsideRuntime::here())
@@ -28,46 +27,6 @@ bool nextFails()
     allocationsLeft = allLaterFail ? 1 : 0;
     ++failures;
     return true;
-}
-
-} // namespace
-
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept
-{
-    return nextFails() ? nullptr : std::malloc(size ? size : 1);
-}
-void* operator new(std::size_t size)
-{
-    void* memory = operator new(size, std::nothrow);
-    if (!memory)
-        throw std::bad_alloc();
-    return memory;
-}
-// A sanitizer's own would not come by.
-void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
-{
-    return operator new(size, std::nothrow);
-}
-void* operator new[](std::size_t size)
-{
-    return operator new(size);
-}
-// Not inlined, or a compiler sees free where it expects the counterpart of new.
-[[gnu::noinline]] void operator delete(void* memory) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete[](void* memory) noexcept
-{
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete[](void* memory, std::size_t) noexcept
-{
-    std::free(memory);
 }
 
 #ifndef _WIN32
@@ -86,8 +45,9 @@ void deallocate_memory(void* memory)
 void* cache_aligned_allocate(std::size_t size)
 {
     constexpr std::size_t kLine = 128;
-    void* memory =
-        nextFails() ? nullptr : std::aligned_alloc(kLine, (size + kLine - 1) / kLine * kLine);
+    void* memory = nextAllocationFails()
+                       ? nullptr
+                       : std::aligned_alloc(kLine, (size + kLine - 1) / kLine * kLine);
     if (!memory)
         throw std::bad_alloc();
     return memory;
