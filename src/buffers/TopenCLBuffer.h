@@ -52,10 +52,11 @@ public:
 
     // Writes `size` bytes from `hostPtr` at `offset`, after the events of `waitList`; the write's
     // event becomes the ready event. The buffer's own former ready event is released before the
-    // write is enqueued: if `waitList` has it, another holder must keep it alive. A buffer that is too small waits for `waitList` and grows
-    // first: at offset 0 the memory is created with the data in it and no event remains; at another
-    // offset the bytes before it are undefined. 0 bytes are always fine; otherwise a read-only
-    // buffer gives CL_INVALID_OPERATION (-59). Wraps clEnqueueWriteBuffer.
+    // write is enqueued: if `waitList` has it, another holder must keep it alive. A buffer that is
+    // too small waits for `waitList` and grows first: at offset 0 the memory is created with the
+    // data in it and no event remains; at another offset the bytes before it are undefined. 0 bytes
+    // are always fine; otherwise a read-only buffer gives CL_INVALID_OPERATION (-59). Wraps
+    // clEnqueueWriteBuffer.
     int uploadDataToGPU(cl_command_queue queue, cl_uint blocking, std::size_t offset,
                         std::size_t size, void* hostPtr, cl_uint numEvents,
                         const cl_event* waitList);

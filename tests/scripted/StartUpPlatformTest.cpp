@@ -153,7 +153,8 @@ TEST_F(StartUpOnce, OnlyExtensionsAreLookedUpThroughTheRuntime)
     ASSERT_TRUE(startWatched());
     const Lines lookUps = callsOf("clGetExtensionFunctionAddress");
     EXPECT_EQ(lookUps.size(), 12U);
-    EXPECT_THAT(lookUps, ::testing::Each(::testing::ContainsRegex("GL|D3D11")));
+    EXPECT_THAT(lookUps, ::testing::Each(::testing::AnyOf(::testing::HasSubstr("GL"),
+                                                          ::testing::HasSubstr("D3D11"))));
 }
 
 TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)

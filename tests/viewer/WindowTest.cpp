@@ -31,7 +31,7 @@ using testing::AllOf, testing::HasSubstr, testing::Not;
 constexpr int kUnitsPerNotch = 120; // of the wheel
 constexpr int kFramesAfterEscape = 60;
 constexpr qint64 kSliceMs = 100;
-constexpr int kLeastFrames = 5;    // also if a frame takes that long
+constexpr int kLeastFrames = 5; // also if a frame takes that long
 constexpr qint64 kHangMs = 20000;
 const QSize kSize(160, 120);
 

@@ -1,4 +1,5 @@
-// Stands in for oneTBB, which is not built for ThreadSanitizer: what it orders would look like races.
+// Stands in for oneTBB, which is not built for ThreadSanitizer: what it orders would look like
+// races.
 #pragma once
 
 #include <atomic>
