@@ -254,11 +254,11 @@ TEST(SkinWeights, HeaviestFourAreKeptAndAddUpToOne)
 
 TEST(SkinWeights, FourGivenWeightsAreScaledAndUnusedBonesIgnored)
 {
-    const SkinWeights weights({{5, 99, 1, 99}}, {{0.5f, 0, 0.495f, 0}});
+    const SkinWeights weights({{99, 5, 1, 99}}, {{0, 0.5f, 0.495f, 0}});
     EXPECT_EQ(weights.problem(), "");
     EXPECT_EQ(weights.highestBone(), 5u);
     EXPECT_THAT(weights.bones().values<std::uint32_t>(), testing::ElementsAre(5, 5, 1, 5));
-    EXPECT_NEAR(weights.weights().values<float>()[0], 0.5 / 0.995, 1e-7);
+    EXPECT_NEAR(weights.weights().values<float>()[1], 0.5 / 0.995, 1e-7);
 }
 
 TEST(Deformers, SettingsThatDoNotFitAreNamed)

@@ -184,16 +184,20 @@ TEST(SmoothDeformer, FaultsOfAMeshHaveADefinedResult)
     } rows[] = {
         {"no triangle", meshOf({a, b, c}, {}), a, tilted},
         {"triangle with a corner twice", meshOf({a, b, a}, {0, 1, 2, 0, 0, 1}), a, tilted},
-        {"one triangle", meshOf({a, b, c}, {0, 1, 2}), {0.5f, 0, -0.5f}, kUp},
-        {"triangle without area", meshOf({a, b, {1, 0, 0}}, {0, 1, 2}), {0.75f, 0, 0}, tilted},
+        {"one triangle", meshOf({a, b, c}, {0, 1, 2}), {0.25f, 0, -0.25f}, kUp},
+        {"triangle without area", meshOf({a, b, {1, 0, 0}}, {0, 1, 2}), {0.375f, 0, 0}, tilted},
         {"two triangles that cancel",
          meshOf({a, b, c}, {0, 1, 2, 0, 2, 1}),
-         {0.5f, 0, -0.5f},
+         {0.25f, 0, -0.25f},
+         tilted},
+        {"two triangles that almost cancel",
+         meshOf({a, b, c, {0, 1e-6f, -2}}, {0, 1, 2, 0, 3, 1}),
+         {0, 0, -0.5f},
          tilted},
         // The edge from a to b is no border, and both of its ends are on borders.
         {"edge of three triangles",
          meshOf({a, b, c, {0, 0, 2}, {0, 2, 0}}, {0, 1, 2, 1, 0, 3, 0, 1, 4}),
-         {0, 1.0f / 3, 0},
+         {0, 1.0f / 6, 0},
          {}},
         {"vertex of no triangle", meshOf({away, a, b, c}, {1, 2, 3}), away, tilted},
     };
@@ -201,7 +205,7 @@ TEST(SmoothDeformer, FaultsOfAMeshHaveADefinedResult)
         SCOPED_TRACE(row.name);
         MeshGeometry mesh = row.mesh;
         mesh.rest.normals[0] = tilted;
-        const Surface surface = smoothed(mesh, mesh.rest, 1);
+        const Surface surface = smoothed(mesh, mesh.rest, 1, 0.25f);
         expectNear(surface.positions[0], row.position);
         if (length(wide(row.normal)) > 0)
             expectNear(surface.normals[0], row.normal);
