@@ -4,7 +4,6 @@
 #include "diagnostics/CLInternalWarning.h"
 #include "diagnostics/CLWarningSink.h"
 
-#include <algorithm>
 #include <array>
 #include <climits>
 #include <cwchar>
@@ -125,21 +124,27 @@ TEST(WarningSink, TheBuiltInOneWritesNothingAndIsRestoredByNull)
 // A sink that two replacements both return, or neither, is one that its owner cannot restore.
 TEST(WarningSink, ConcurrentReplacementsReturnEachSinkOnce)
 {
-    constexpr int kReplacements = 20000;
+    constexpr int kReplacements = 500'000;
+    constexpr int kBetweenWarnings = 1000; // rare, since they keep the threads apart
     const std::array<CLWarningSink, 2> sinks = {dropText, [](const char*) {}};
-    std::array<std::vector<CLWarningSink>, 2> before;
+    std::array<std::array<int, 2>, 2> returned{}; // by thread and sink
     const auto replace = [&](std::size_t thread) {
+        std::array<int, 2> counts{};
         for (int i = 0; i < kReplacements; ++i) {
-            before[thread].push_back(setCLWarningSink(sinks[thread]));
-            CLInternalWarning("warning");
+            const CLWarningSink before = setCLWarningSink(sinks[thread]);
+            counts[0] += before == sinks[0] ? 1 : 0;
+            counts[1] += before == sinks[1] ? 1 : 0;
+            if (i % kBetweenWarnings == 0)
+                CLInternalWarning("warning");
         }
+        returned[thread] = counts;
     };
     std::thread other(replace, 1);
     replace(0);
     other.join();
-    before[0].push_back(setCLWarningSink(nullptr));
-    for (const CLWarningSink sink : sinks)
-        EXPECT_EQ(std::ranges::count(before[0], sink) + std::ranges::count(before[1], sink),
+    const CLWarningSink last = setCLWarningSink(nullptr);
+    for (std::size_t sink = 0; sink < sinks.size(); ++sink)
+        EXPECT_EQ(returned[0][sink] + returned[1][sink] + (last == sinks[sink] ? 1 : 0),
                   kReplacements);
 }
 
