@@ -132,6 +132,8 @@ public:
     // Events that should have been waited for, and were not: of acquires, of the deformer's last
     // commands, and of single releases.
     const Lines& unwaited() const { return fUnwaited; }
+    // Since the last time.
+    std::size_t takeFailedWaits() { return std::exchange(fFailedWaits, 0); }
 
 private:
     static constexpr int kBuffers = 3;
@@ -211,6 +213,7 @@ private:
         const InsideRuntime notTheLibrarys;
         std::set<std::string> waitedFor;
         for (const std::string& line : runtime().takeCalls()) {
+            fFailedWaits += line.starts_with("clWaitForEvents") && line.ends_with("! -5") ? 1 : 0;
             if (std::ranges::none_of(functions, [&](auto* name) { return line.starts_with(name); }))
                 continue;
             for (std::size_t at = 0; (at = line.find("event#", at)) != std::string::npos; ++at)
@@ -246,21 +249,29 @@ private:
     TopenCLSharedBufferMgr fManager;
     std::vector<const TopenCLSharedBuffer*> fRecords; // the manager's
     Lines fUnwaited;
+    std::size_t fFailedWaits = 0;
     int fLeftOut = 0;
 };
 
-// Memory runs out at each allocation of an evaluation in turn, for that one or for all that follow.
-class EvaluationWithoutMemory : public ScriptedTest, public ::testing::WithParamInterface<bool> {};
+// Memory runs out at each allocation of an evaluation in turn, for that one or for all that follow;
+// waits for events succeed or fail.
+class EvaluationWithoutMemory : public ScriptedTest,
+                                public ::testing::WithParamInterface<std::tuple<bool, bool>> {};
 
 TEST_P(EvaluationWithoutMemory, IsReleasedOnceLosesNothingAndTheNextIsWhole)
 {
     startInModes(2, 3);
     const Lines before = runtime().balance();
     std::optional<Host> host(std::in_place);
-    const auto evaluate = [&] {
-        allLaterFail = GetParam();
+    const auto [allLater, waitsFail] = GetParam();
+    const auto evaluate = [&, &allLater = allLater, &waitsFail = waitsFail] {
+        if (waitsFail)
+            runtime().plan({.function = "clWaitForEvents", .onwards = true});
+        allLaterFail = allLater;
         host->evaluate();
         allLaterFail = false;
+        runtime().clearFaults();
+        EXPECT_EQ(warnings().size(), host->takeFailedWaits());
     };
     const auto check = [&] {
         EXPECT_EQ(host->evaluate(), 0) << "steps left out of the next evaluation";
@@ -273,7 +284,8 @@ TEST_P(EvaluationWithoutMemory, IsReleasedOnceLosesNothingAndTheNextIsWhole)
     };
     EXPECT_GT(untilMemorySuffices(evaluate, check), 10U); // 37, of which TBB's fail on Linux only
 }
-INSTANTIATE_TEST_SUITE_P(Allocation, EvaluationWithoutMemory, ::testing::Bool());
+INSTANTIATE_TEST_SUITE_P(Allocation, EvaluationWithoutMemory,
+                         ::testing::Combine(::testing::Bool(), ::testing::Bool()));
 
 TEST_F(ScriptedTest, AnEventListThatCannotGrowIsUnchanged)
 {
@@ -354,6 +366,10 @@ TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
     events.reserve(1000);
     allocationsLeft = 1;
     EXPECT_THROW(for (;;) list.append(nullptr), std::bad_alloc);
+    std::vector<cl_event> tooSmall = {nullptr};
+    allocationsLeft = 1;
+    EXPECT_THROW(list.copyTo(tooSmall), std::bad_alloc);
+    EXPECT_TRUE(tooSmall.empty());
     list.copyTo(events);
     const std::size_t listed = events.size();
     EXPECT_GE(listed, 100U);
