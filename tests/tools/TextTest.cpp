@@ -3,6 +3,10 @@
 #include "tools/Options.h"
 #include "tools/Sheet.h"
 #include "tools/StatusCodes.h"
+#include "tools/WarningLog.h"
+
+#include "diagnostics/CLInternalWarning.h"
+#include "diagnostics/CLWarningSink.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -89,6 +93,20 @@ TEST(CapturedOutput, KeepsTheOrderOfBothStreamsAndPutsThemBack)
     }
     std::printf("back");
     EXPECT_EQ(outer.finish(), "back");
+}
+
+TEST(WarningLog, KeepsTextsWithoutLineBreaksAndRestoresTheSinkBefore)
+{
+    const CLWarningSink before = [](const char*) {};
+    setCLWarningSink(before);
+    {
+        info::WarningLog log;
+        CLInternalWarning("one\n");
+        CLInternalWarning("two");
+        EXPECT_EQ(log.take(), (std::vector<std::string>{"one", "two"}));
+        EXPECT_TRUE(log.take().empty());
+    }
+    EXPECT_EQ(setCLWarningSink(nullptr), before);
 }
 
 } // namespace
