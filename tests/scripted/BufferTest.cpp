@@ -348,6 +348,13 @@ TEST_F(BufferTest, AWrappedBufferKeepsItsDescription)
     EXPECT_TRUE(wrapped.openCLDataBuffer() == data); // name and plug
     EXPECT_EQ(wrapped.capacityInBytes(), 120U);
     EXPECT_EQ(upload(wrapped, 0, 1), CL_INVALID_OPERATION);
+    const auto capacityOf = [](unsigned elementSize, unsigned count) {
+        return TopenCLBuffer(nullptr, 0,
+                             TopenCLDataBuffer(Tplug(), TuniqueString(), {}, elementSize, count, 7))
+            .capacityInBytes();
+    };
+    EXPECT_EQ(capacityOf(65536, 65537), 65536U) << "a 32-bit product";
+    EXPECT_EQ(capacityOf(12, 0), 0U);
 }
 
 TEST_F(BufferTest, CopiesCreateMemoryAsTheirOriginalWould)

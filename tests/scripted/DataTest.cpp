@@ -272,6 +272,8 @@ TEST_F(DataTest, APoolBufferIsDescribedAsItIsAskedForWhereverItsMemoryIsFrom)
         pool.collectDataForPlug(descriptor.plug(), data);
         EXPECT_EQ(data.getData(descriptor.name(), descriptor.plug()).buffer().get(),
                   made.buffer().get());
+        EXPECT_EQ(runtime().references(Kind::kMem, made.buffer().get()), 3U)
+            << "of the caller, the pool and the map";
         pool.releaseBuffers();
     }
     EXPECT_EQ(callsOf("clCreate"), (Lines{"clCreateBuffer(context#1, 1, 120, null) = mem#1",

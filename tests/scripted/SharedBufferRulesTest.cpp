@@ -126,6 +126,7 @@ TEST_F(SharedBufferRules, ABufferCreatedDuringAnEvaluationJoinsTheBatchAtItsEnd)
 {
     startWithThree(1, 3);
     manager().PreEvaluate(kId);
+    EXPECT_EQ(manager().DestroySharedCLBuffer(create()), CL_SUCCESS) << "it is not in the batch";
     const TopenCLSharedBuffer* late[] = {create(), create()};
     AutoCLObject<cl_event> released[2];
     calls();

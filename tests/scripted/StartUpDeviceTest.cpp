@@ -4,6 +4,7 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/SyncModes.h"
 
+#include <numeric>
 #include <sstream>
 
 using namespace scripted;
@@ -73,6 +74,13 @@ const StartUpRow kDeviceRows[] = {
     {"NoCurrentDevice", [](StartUp& c) { threeDevices(c, {2, 8, 4}, -1, "device#3"); }},
     {"CurrentDeviceNoGPU", [](StartUp& c) { threeDevices(c, {2, 4, 4}, 0, "device#2"); }},
     {"DefaultGPUIsNoGPU", [](StartUp& c) { threeDevices(c, {5, 2, 5}, 0, ""); c.stopsBeforeDevice(kNoGPU); }},
+    {"LastOf64Devices", [](StartUp& c) {
+         c.platform().devices.resize(64, {.type = CL_DEVICE_TYPE_CPU});
+         c.firstDevice().type = CL_DEVICE_TYPE_CPU;
+         c.platform().devices.back().type = CL_DEVICE_TYPE_GPU;
+         c.world.glDevices.resize(64);
+         std::iota(c.world.glDevices.begin(), c.world.glDevices.end(), 0U);
+         c.device = "device#64"; }},
     {"NoDeviceShares", [](StartUp& c) { c.world.glDevices.clear(); c.stopsBeforeDevice(kNoGPU); }},
     {"UnwrittenTypeIsNoGPU", [](StartUp& c) { c.world.emptyAnswers = {CL_DEVICE_TYPE}; c.stopsBeforeDevice(kNoGPU); }},
     {"UnwrittenDevicesAreNone", [](StartUp& c) { c.world.emptyAnswers = {0x2007, 0x2006}; c.stopsBeforeDevice(kNoGPU); }},
@@ -112,7 +120,7 @@ const StartUpRow kDeviceRows[] = {
          c.firstDevice().doublePrecision = 0;
          c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1x"}}; // not an integer
          c.withoutDoublePrecision(); }},
-    {"DoubleDemandedAndThere", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1"}}; }},
+    {"DoubleDemandedAndThere", [](StartUp& c) { c.firstDevice().doublePrecision = CL_FP_DENORM; c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1"}}; }},
     {"DoubleDemandedAndMissing", [](StartUp& c) {
          c.firstDevice().doublePrecision = 0;
          c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "-1"}};
