@@ -15,7 +15,10 @@ target_compile_definitions(vyra_options INTERFACE QT_NO_KEYWORDS)
 target_compile_definitions(vyra_options INTERFACE
     CL_TARGET_OPENCL_VERSION=120 CL_USE_DEPRECATED_OPENCL_1_1_APIS)
 
+set(VYRA_NO_UNDEFINED LINKER:--no-undefined)
 if(VYRA_SANITIZE)
+    # clang++ links the runtime libraries of sanitizers into programs alone.
+    set(VYRA_NO_UNDEFINED)
     add_compile_options(-fsanitize=${VYRA_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
     add_link_options(-fsanitize=${VYRA_SANITIZE})
 endif()
