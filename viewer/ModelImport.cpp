@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cmath>
 #include <cstring>
 #include <map>
 #include <new>
@@ -70,7 +71,7 @@ QVector3D materialColour(const aiScene& scene, unsigned material)
         return kDefaultColour;
     const float darkest = std::min({colour.r, colour.g, colour.b});
     const float brightest = std::max({colour.r, colour.g, colour.b});
-    if (brightest - darkest < kLeastColour)
+    if (brightest - darkest < kLeastColour || !std::isfinite(colour.r + colour.g + colour.b))
         return kDefaultColour;
     return {colour.r, colour.g, colour.b};
 }
@@ -89,9 +90,11 @@ void copyVertices(const aiMesh& source, Mesh& mesh)
     }
 }
 
-// Puts a weight into the first free place of its vertex.
+// Puts a weight into the first free place of its vertex. A negative one counts as none.
 void addInfluence(Mesh& mesh, std::size_t vertex, std::uint32_t bone, float weight)
 {
+    if (weight <= 0)
+        return;
     BoneWeights& weights = mesh.boneWeights[vertex];
     const auto place = std::find(weights.begin(), weights.end(), 0.0f);
     if (place == weights.end())
@@ -134,13 +137,24 @@ void copyBones(const aiMesh& source, const NodeIndex& nodes, Mesh& mesh)
     bindLooseVertices(mesh);
 }
 
+// Normals of the file and differences may be infinite or not a number.
+float finiteOrZero(float number)
+{
+    return std::isfinite(number) ? number : 0.0f;
+}
+
+QVector3D finiteOrZero(const aiVector3D& vector)
+{
+    return {finiteOrZero(vector.x), finiteOrZero(vector.y), finiteOrZero(vector.z)};
+}
+
 // Assimp's targets hold whole positions and normals.
 void copyMorphTargets(const aiMesh& source, Mesh& mesh)
 {
     const auto deltas = [&source](const aiVector3D* target, const aiVector3D* base) {
         std::vector<QVector3D> result;
         for (unsigned i = 0; target && base && i < source.mNumVertices; ++i)
-            result.push_back(toQt(target[i] - base[i]));
+            result.push_back(finiteOrZero(target[i] - base[i]));
         return result;
     };
     for (unsigned i = 0; i < source.mNumAnimMeshes; ++i) {
@@ -151,7 +165,7 @@ void copyMorphTargets(const aiMesh& source, Mesh& mesh)
         copy.positionDeltas = target.mVertices ? deltas(target.mVertices, source.mVertices)
                                                : std::vector<QVector3D>(source.mNumVertices);
         copy.normalDeltas = deltas(target.mNormals, source.mNormals);
-        copy.weight = target.mWeight;
+        copy.weight = finiteOrZero(target.mWeight);
     }
 }
 
@@ -186,16 +200,28 @@ void addMeshes(const aiScene& scene, const aiNode& source, const NodeIndex& node
         addMeshes(scene, *source.mChildren[i], nodes, creaseAngle, self, model);
 }
 
+// Assimp only warns about keys in another order. A time may overflow.
+template <typename Keys>
+Keys inOrderOfTime(Keys keys)
+{
+    std::erase_if(keys, [](const auto& key) { return !std::isfinite(key.seconds); });
+    std::stable_sort(keys.begin(), keys.end(),
+                     [](const auto& a, const auto& b) { return a.seconds < b.seconds; });
+    return keys;
+}
+
 template <typename SourceKey, typename Convert>
 auto copyKeys(const SourceKey* source, unsigned count, double ticksPerSecond, Convert convert)
 {
     std::vector<Key<decltype(convert(source->mValue))>> keys;
     for (unsigned i = 0; i < count; ++i)
         keys.push_back({source[i].mTime / ticksPerSecond, convert(source[i].mValue)});
-    return keys;
+    return inOrderOfTime(std::move(keys));
 }
 
-MorphChannel copyMorphChannel(const aiMeshMorphAnim& source, std::size_t node, double ticks)
+// Weights of targets that no mesh has are left out; their numbers may be arbitrarily large.
+MorphChannel copyMorphChannel(const aiMeshMorphAnim& source, std::size_t node, double ticks,
+                              std::size_t targets)
 {
     MorphChannel channel{node, {}};
     for (unsigned i = 0; i < source.mNumKeys; ++i) {
@@ -203,20 +229,25 @@ MorphChannel copyMorphChannel(const aiMeshMorphAnim& source, std::size_t node, d
         std::vector<float> weights;
         for (unsigned value = 0; value < key.mNumValuesAndWeights; ++value) {
             const std::size_t target = key.mValues[value];
+            if (target >= targets)
+                continue;
             if (target >= weights.size())
                 weights.resize(target + 1);
-            weights[target] = static_cast<float>(key.mWeights[value]);
+            weights[target] = finiteOrZero(static_cast<float>(key.mWeights[value]));
         }
         channel.weights.push_back({key.mTime / ticks, std::move(weights)});
     }
+    channel.weights = inOrderOfTime(std::move(channel.weights));
     return channel;
 }
 
-Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes)
+Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes, std::size_t targets)
 {
     const double ticks =
         source.mTicksPerSecond > 0 ? source.mTicksPerSecond : kDefaultTicksPerSecond;
-    Animation animation{source.mName.C_Str(), source.mDuration / ticks, {}};
+    const double seconds = source.mDuration / ticks;
+    Animation animation{
+        source.mName.C_Str(), std::isfinite(seconds) ? std::max(seconds, 0.0) : 0, {}};
     const auto vector = [](const aiVector3D& value) { return toQt(value); };
     const auto rotation = [](const aiQuaternion& value) {
         const QQuaternion quaternion(value.w, value.x, value.y, value.z);
@@ -235,8 +266,11 @@ Animation copyAnimation(const aiAnimation& source, const NodeIndex& nodes)
     for (unsigned i = 0; i < source.mNumMorphMeshChannels; ++i) {
         const aiMeshMorphAnim& channel = *source.mMorphMeshChannels[i];
         const auto node = nodes.find(channel.mName.C_Str());
-        if (node != nodes.end() && channel.mNumKeys > 0)
-            animation.morphChannels.push_back(copyMorphChannel(channel, node->second, ticks));
+        if (node == nodes.end())
+            continue;
+        MorphChannel copy = copyMorphChannel(channel, node->second, ticks, targets);
+        if (!copy.weights.empty())
+            animation.morphChannels.push_back(std::move(copy));
     }
     return animation;
 }
@@ -295,20 +329,6 @@ QMatrix4x4 upright(const aiScene& scene, const ImportSettings& settings)
     }
     const bool untouched = sameRotation(root, QMatrix4x4());
     return untouched && scene.mMetaData ? uprightByFile(*scene.mMetaData) : QMatrix4x4();
-}
-
-// The root of the nodes stands the model upright; the file's nodes are below it.
-Model copyScene(const aiScene& scene, const ImportSettings& settings)
-{
-    Model model;
-    model.nodes.push_back({"vyra-viewer upright", 0, upright(scene, settings)});
-    addNodes(*scene.mRootNode, 0, model);
-    const NodeIndex nodes = indexByName(model);
-    std::size_t first = 1;
-    addMeshes(scene, *scene.mRootNode, nodes, settings.creaseAngle, first, model);
-    for (unsigned i = 0; i < scene.mNumAnimations; ++i)
-        model.animations.push_back(copyAnimation(*scene.mAnimations[i], nodes));
-    return model;
 }
 
 bool hasArea(const Mesh& mesh)
@@ -375,22 +395,43 @@ Result<Model> readModel(Assimp::Importer& importer, const std::string& file,
     // same.
     auto& changeable = const_cast<aiScene&>(*scene);
     rescaleExtremeScene(changeable);
+    if (const auto found = findNonFiniteNumber(*scene))
+        return failure(file, "has numbers that are too far apart: scaled to a usual size, " +
+                                 *found + "; correct it in the program that made the file");
     scene = importer.ApplyPostProcessing(kPostProcessing);
     if (!scene)
         return unreadable(file, importer);
-    return copyScene(*scene, settings);
+    return convertScene(*scene, settings);
 }
 
 } // namespace
 
+// The root of the nodes stands the model upright; the file's nodes are below it.
+Model convertScene(const aiScene& scene, const ImportSettings& settings)
+{
+    Model model;
+    model.nodes.push_back({"vyra-viewer upright", 0, upright(scene, settings)});
+    addNodes(*scene.mRootNode, 0, model);
+    const NodeIndex nodes = indexByName(model);
+    std::size_t first = 1;
+    addMeshes(scene, *scene.mRootNode, nodes, settings.creaseAngle, first, model);
+    std::size_t targets = 0;
+    for (const Mesh& mesh : model.meshes)
+        targets = std::max(targets, mesh.morphTargets.size());
+    for (unsigned i = 0; i < scene.mNumAnimations; ++i)
+        model.animations.push_back(copyAnimation(*scene.mAnimations[i], nodes, targets));
+    return model;
+}
+
 BoneWeights normalised(const BoneWeights& weights)
 {
-    const float sum = std::accumulate(weights.begin(), weights.end(), 0.0f);
+    // In double precision, which the sum of large weights does not overflow.
+    const double sum = std::accumulate(weights.begin(), weights.end(), 0.0);
     if (sum <= 0)
         return {};
     BoneWeights result = weights;
     for (float& weight : result)
-        weight /= sum;
+        weight = static_cast<float>(weight / sum);
     return result;
 }
 

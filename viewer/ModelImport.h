@@ -7,6 +7,8 @@
 #include <optional>
 #include <string>
 
+struct aiScene;
+
 namespace viewer {
 
 enum class UpAxis { kX, kY, kZ };
@@ -25,6 +27,11 @@ struct ImportSettings {
 // numbers only, upright along y, or a sentence about the file. Files that are damaged on purpose
 // may crash Assimp or keep it busy without end: see ImportProcess.h.
 Result<Model> importModel(const std::string& name, const ImportSettings& settings = {});
+
+// Converts a scene in the form that Assimp's post-processing leaves it in: validated, triangulated,
+// with a root node and a material for each mesh. All numbers of it are finite, but for normals and
+// colours. The rest of importModel is Assimp's work.
+Model convertScene(const aiScene& scene, const ImportSettings& settings);
 
 // Returns the weights of a vertex, scaled so that they add up to 1. All zero stays all zero.
 BoneWeights normalised(const BoneWeights& weights);
