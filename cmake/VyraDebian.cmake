@@ -91,9 +91,8 @@ run deformers through vyra-opencl, with examples to begin from.")
 set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS Library Evaluator)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_DEPENDS
-    "opencl-c-headers, libtbb-dev (>= 2021), qt6-base-dev (>= 6.4), libqt6opengl6-dev (>= 6.4)")
-# The examples enqueue their kernels themselves.
-set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SUGGESTS "ocl-icd-opencl-dev | opencl-dev, cmake, pkg-config")
+    "ocl-icd-opencl-dev | opencl-dev, opencl-c-headers, libtbb-dev (>= 2021), qt6-base-dev (>= 6.4), libqt6opengl6-dev (>= 6.4)")
+set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SUGGESTS "cmake, pkg-config, glshare, vyra-opencl-tools")
 
 vyra_debian_package(glshare glshare
 "OpenGL buffer sharing in software for any OpenCL runtime

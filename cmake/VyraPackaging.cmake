@@ -48,6 +48,20 @@ install(DIRECTORY
     DESTINATION ${VYRA_EXAMPLES_DIR}
     COMPONENT Development)
 
+# The guides, without what only the source has. They need Python when they are written.
+find_package(Python3 COMPONENTS Interpreter)
+if(Python3_FOUND)
+    set(VYRA_GUIDES ${PROJECT_BINARY_DIR}/packaging/guides)
+    execute_process(
+        COMMAND ${Python3_EXECUTABLE} ${CMAKE_CURRENT_LIST_DIR}/installed_guides.py ${PROJECT_SOURCE_DIR} ${VYRA_GUIDES}
+        COMMAND_ERROR_IS_FATAL ANY)
+    file(GLOB guides ${PROJECT_SOURCE_DIR}/docs/*.md)
+    set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS
+        ${guides} ${CMAKE_CURRENT_LIST_DIR}/installed_guides.py)
+    install(DIRECTORY ${VYRA_GUIDES}
+        DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/libvyra-opencl-dev COMPONENT Development)
+endif()
+
 find_program(VYRA_GZIP gzip)
 include(VyraManPages)
 include(VyraDebian)

@@ -5,6 +5,7 @@
 #include "runtime/TopenCLInfo.h"
 #include "standalone/GLHost.h"
 #include "standalone/NativeContext.h"
+#include "standalone/OpenCLPlatforms.h"
 
 #include <CL/cl.h>
 #include <QGuiApplication>
@@ -12,6 +13,7 @@
 #include <QOpenGLContext>
 #include <QOpenGLExtraFunctions>
 #include <cstdio>
+#include <cstdlib>
 #include <vector>
 
 constexpr const char* kSource = R"(
@@ -22,23 +24,32 @@ __kernel void raise(__global float* heights, float amount, uint count)
         heights[index] += amount;
 })";
 
+constexpr const char* kNoOpenGL = "No OpenGL: start this where there is a display.\n";
+
 int main(int argc, char** argv)
 {
+    // Qt ends the process if there is no display.
+    qInstallMessageHandler([](QtMsgType type, const QMessageLogContext&, const QString&) {
+        if (type == QtFatalMsg)
+            std::fputs(kNoOpenGL, stderr), std::_Exit(1);
+    });
     // A renderer: here a hidden one. GLHost hands its OpenGL functions to the library.
     QGuiApplication application(argc, argv);
+    qInstallMessageHandler(nullptr);
     QOffscreenSurface surface;
     surface.create();
     QOpenGLContext context;
     if (!context.create() || !context.makeCurrent(&surface))
-        return std::fprintf(stderr, "No OpenGL: start this where there is a display.\n"), 1;
+        return std::fputs(kNoOpenGL, stderr), 1;
     const GLHost host(context);
 
     // Without a sink, failed OpenCL calls and the logs of kernels that do not compile are dropped.
     setCLWarningSink([](const char* text) { std::fprintf(stderr, "%s\n", text); });
 
-    // Once per process. The vendor id is the PCI id of the renderer's adapter, here NVIDIA's; set
-    // VYRA_OPENCL_PLATFORM to the name of a platform's vendor to run on another.
-    if (!TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true, 0x10DE))
+    // Once per process. The vendor id is the PCI id of the renderer's adapter; for a software
+    // renderer the host library chooses the platform that shares with it.
+    if (!TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true,
+                                 chooseOpenCLPlatform(context)))
         return std::fprintf(stderr, "OpenCL is off; the lines above say why.\n"), 1;
     TopenCLInfo& info = TopenCLInfo::theOne();
     TopenCLSharedBufferMgr& buffers = info.sharedBufferMgr();

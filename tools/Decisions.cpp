@@ -13,7 +13,10 @@ namespace {
 Decision decidePlatform(const Facts& facts, const Platform& platform)
 {
     Decision decision{"platform", "Platform", platform.name + " of " + platform.vendor, "", ""};
-    if (facts.environment.find("VYRA_OPENCL_PLATFORM")) {
+    if (facts.environment.platformWasChosen) {
+        decision.reason = "no GPU vendor follows from the renderer, and this platform alone shares "
+                          "with OpenGL";
+    } else if (facts.environment.find("VYRA_OPENCL_PLATFORM")) {
         decision.reason = facts.environment.platformFromOption
                               ? "--platform names its vendor"
                               : "VYRA_OPENCL_PLATFORM names its vendor";

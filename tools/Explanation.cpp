@@ -17,8 +17,15 @@ ExitCode exitCodeOf(const Explanation& explanation)
 
 std::string summaryOf(const Explanation& explanation)
 {
-    if (explanation.stop)
-        return std::string("OpenCL is off: ") + stepName(explanation.stop->step).failure + ".";
+    if (explanation.stop) {
+        const Facts& facts = explanation.facts;
+        const bool noPlatform =
+            explanation.stop->step == Step::kPlatform && facts.platforms.empty();
+        return std::string("OpenCL is off: ") +
+               (noPlatform ? "this machine has no OpenCL platform"
+                           : stepName(explanation.stop->step).failure) +
+               ".";
+    }
     const Platform* platform = chosenPlatform(explanation.facts);
     const Device* device = chosenDevice(explanation.facts);
     const std::string where = " (" + (device ? device->name : "unknown device") + " of " +

@@ -30,8 +30,9 @@ struct Renderer {
 // The OpenCL loader library.
 struct Loader {
     bool loaded = false;
-    std::string file;    // where the library was found
-    std::string problem; // the system's words when it cannot be opened
+    std::string file;                       // where the library was found
+    std::string problem;                    // the system's words when it cannot be opened
+    std::vector<std::string> missingLayers; // of OPENCL_LAYERS: no such file
     std::vector<std::string> missingCore;
     std::vector<std::string> missingSharing;
 };
@@ -91,6 +92,7 @@ struct Variable {
 struct Environment {
     std::vector<Variable> variables; // whatever begins with VYRA_, and what steers the loader
     bool platformFromOption = false; // --platform set VYRA_OPENCL_PLATFORM
+    bool platformWasChosen = false;  // as the only one that shares with an unknown renderer
     SyncModeVariables syncModes;
     std::optional<int> ignoreDriverVersion;
     int doubleDemanded = 0;

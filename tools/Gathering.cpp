@@ -1,6 +1,7 @@
 #include "tools/Gathering.h"
 
 #include "host/Environment.h"
+#include "standalone/OpenCLPlatforms.h"
 #include "tools/RenderWindow.h"
 #include "tools/SelfTestRun.h"
 #include "tools/StartUpRun.h"
@@ -8,6 +9,7 @@
 #include "tools/WarningLog.h"
 
 #include <algorithm>
+#include <cctype>
 #include <cstdlib>
 #include <string_view>
 
@@ -16,9 +18,10 @@
 namespace info {
 namespace {
 
+constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
+
 // Not the library's variables: they decide which OpenCL and which OpenGL it meets.
 constexpr std::string_view kSteering[] = {
-    "GLSHARE_",
     "OCL_ICD_",
     "OPENCL_LAYERS=",
     "OPENCL_VENDOR_PATH=",
@@ -30,9 +33,18 @@ constexpr std::string_view kSteering[] = {
     "CUDA_VISIBLE_DEVICES=",
 };
 
+// In any case, since one that is written in the wrong case has no effect.
+bool startsWith(std::string_view entry, std::string_view prefix)
+{
+    return entry.size() >= prefix.size() &&
+           std::equal(prefix.begin(), prefix.end(), entry.begin(), [](char wanted, char found) {
+               return std::toupper(static_cast<unsigned char>(found)) == wanted;
+           });
+}
+
 bool isOfInterest(std::string_view entry)
 {
-    return entry.starts_with("VYRA_") ||
+    return startsWith(entry, "VYRA_") || startsWith(entry, "GLSHARE_") ||
            std::any_of(std::begin(kSteering), std::end(kSteering),
                        [entry](std::string_view prefix) { return entry.starts_with(prefix); });
 }
@@ -79,18 +91,24 @@ Facts gatherFacts(const Options& options)
     // The variable is how a host's user names a platform, too: there is one way to start the
     // library.
     if (options.platform)
-        setenv("VYRA_OPENCL_PLATFORM", options.platform->c_str(), 1);
+        setenv(kPlatformVariable, options.platform->c_str(), 1);
     Facts facts;
     facts.environment = readEnvironment(options.platform.has_value());
 
     WarningLog warnings;
     RenderWindow window;
     facts.renderer = window.facts();
+    const bool isOpen = !options.deviceVendor && !facts.environment.find(kPlatformVariable);
+    if (facts.renderer.usable && isOpen) {
+        chooseOpenCLPlatform(window.context());
+        facts.environment.platformWasChosen = std::getenv(kPlatformVariable) != nullptr;
+    }
     const unsigned adapter = facts.renderer.adapterVendorId.value_or(0);
     const unsigned vendorId = options.deviceVendor.value_or(adapter);
     facts.startUp = runStartUp(window, vendorId, warnings);
     facts.wantedVendor = wantedVendor(vendorId);
     facts.loader = surveyLoader();
+    facts.loader.missingLayers = missingOpenCLLayers();
     surveyPlatforms(window, facts);
     if (facts.startUp.valid)
         facts.selfTest = runSelfTest(window, warnings);

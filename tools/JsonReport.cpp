@@ -77,6 +77,7 @@ QJsonObject loaderObject(const Loader& loader)
     return {{"loaded", loader.loaded},
             {"file", orNull(loader.file)},
             {"problem", orNull(loader.problem)},
+            {"missingLayers", arrayOf(loader.missingLayers, text)},
             {"missingCore", arrayOf(loader.missingCore, text)},
             {"missingSharing", arrayOf(loader.missingSharing, text)}};
 }

@@ -95,6 +95,10 @@ private:
     bool readPlatform(const std::string& name, const std::string& argument, std::size_t equals)
     {
         fOptions.platform = value(name, argument, equals);
+        if (fOptions.platform && fOptions.platform->empty()) {
+            fProblem = name + " takes a value that is not empty";
+            return false;
+        }
         return fOptions.platform.has_value();
     }
 

@@ -1,7 +1,7 @@
 #include "tools/RenderWindow.h"
 
 #include "standalone/NativeContext.h"
-#include "viewer/GraphicsVendor.h"
+#include "standalone/OpenCLPlatforms.h"
 
 #include <string_view>
 
@@ -83,7 +83,7 @@ void RenderWindow::open()
     fFacts.vendor = glText(*fContext, GL_VENDOR);
     fFacts.renderer = glText(*fContext, GL_RENDERER);
     fFacts.version = glText(*fContext, GL_VERSION);
-    fFacts.adapterVendorId = viewer::pciVendorId(fFacts.vendor, fFacts.renderer);
+    fFacts.adapterVendorId = ::adapterVendorId(fFacts.vendor, fFacts.renderer);
     fFacts.syncObjects = fHost->syncObjectsUsable();
 }
 

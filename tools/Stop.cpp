@@ -76,8 +76,11 @@ Step stepOfStop(const Facts& facts)
     if (!facts.renderer.usable)
         return Step::kRenderer;
     for (const StopMessage& message : kStopMessages) {
-        if (says(facts.startUp, message.text))
-            return message.step;
+        if (!says(facts.startUp, message.text))
+            continue;
+        // Without a platform no vendor would have helped.
+        const bool noPlatform = facts.loader.loaded && facts.platforms.empty();
+        return message.step == Step::kVendor && noPlatform ? Step::kPlatform : message.step;
     }
     return stepOfSilentStop(facts);
 }

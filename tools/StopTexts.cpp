@@ -17,6 +17,8 @@ constexpr char kInstallDriver[] =
 constexpr char kDriverProblem[] =
     "This is a problem of the OpenCL driver: update it, and close other programs that use the GPU.";
 
+constexpr char kPoclVendor[] = "The pocl project";
+
 std::vector<std::string> vendorsOf(const Facts& facts)
 {
     std::vector<std::string> vendors;
@@ -66,9 +68,13 @@ void explainVendor(const Facts& facts, Stop& stop)
                        ? "."
                        : ", from which no GPU vendor follows: software, or an unknown GPU.");
     const std::vector<std::string> vendors = vendorsOf(facts);
+    const bool anyShares =
+        std::any_of(facts.platforms.begin(), facts.platforms.end(), [](const Platform& platform) {
+            return listsExtension(platform.extensions, "cl_khr_gl_sharing");
+        });
     stop.remedy =
-        vendors.empty()
-            ? kInstallDriver
+        facts.startUp.vendorId == 0 && !anyShares
+            ? kUseSharingDriver
             : "Name the vendor of a platform of this machine with VYRA_OPENCL_PLATFORM or "
               "--platform: " +
                   quotedList(vendors) + ".";
@@ -122,12 +128,26 @@ std::string sharingDevices(const Platform& platform)
     return "The only devices that share with the renderer are no GPUs: " + commaList(devices) + ".";
 }
 
+void explainNoDevices(const Platform& platform, Stop& stop)
+{
+    stop.reason = "The platform " + quoted(platform.name) + " of " + quoted(platform.vendor) +
+                  " has 0 devices.";
+    stop.remedy = platform.vendor == kPoclVendor
+                      ? "PoCL has no devices if it cannot write its cache: set POCL_CACHE_DIR, or "
+                        "HOME, to a folder that can be written."
+                      : "Check the platform's driver, and the permissions of the device files.";
+}
+
 void explainDevice(const Facts& facts, Stop& stop)
 {
     stop.remedy = kUseSharingDriver;
     const Platform* platform = chosenPlatform(facts);
     if (!platform) {
         stop.reason = "No device was found.";
+        return;
+    }
+    if (platform->devices.empty()) {
+        explainNoDevices(*platform, stop);
         return;
     }
     const std::string where = "On the platform " + quoted(platform->name) + " of " +
@@ -210,6 +230,12 @@ constexpr void (*kExplanations[])(const Facts&, Stop&) = {
 void explainStop(const Facts& facts, Stop& stop)
 {
     kExplanations[static_cast<std::size_t>(stop.step)](facts, stop);
+    const std::vector<std::string>& layers = facts.loader.missingLayers;
+    if (layers.empty() || stop.step < Step::kLoader)
+        return;
+    stop.reason =
+        "OPENCL_LAYERS names " + quotedList(layers) + ", which is not a file. " + stop.reason;
+    stop.remedy = "Correct OPENCL_LAYERS. " + stop.remedy;
 }
 
 } // namespace info

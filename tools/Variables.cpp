@@ -7,6 +7,9 @@
 #include "tools/SyncDecisions.h"
 #include "tools/Words.h"
 
+#include <algorithm>
+#include <cctype>
+#include <iterator>
 #include <string_view>
 
 namespace info {
@@ -146,25 +149,46 @@ const KnownVariable* findKnown(const std::string& name)
     return nullptr;
 }
 
-VariableReport explainStranger(const Variable& variable)
+// What glshare reads; D3D11 only on Windows.
+constexpr const char* kGlshareVariables[] = {"GLSHARE_GL_EVENT", "GLSHARE_CPU_AS_GPU",
+                                             "GLSHARE_ZERO_COPY", "GLSHARE_D3D11"};
+
+bool isKnownToGlshare(const std::string& name)
 {
-    std::vector<std::string> names;
+    return std::find(std::begin(kGlshareVariables), std::end(kGlshareVariables), name) !=
+           std::end(kGlshareVariables);
+}
+
+// Whether the name begins with the upper-case prefix, in any case.
+bool resembles(const std::string& name, std::string_view prefix)
+{
+    return name.size() >= prefix.size() &&
+           std::equal(prefix.begin(), prefix.end(), name.begin(), [](char wanted, char found) {
+               return std::toupper(static_cast<unsigned char>(found)) == wanted;
+           });
+}
+
+VariableReport explainStranger(const Variable& variable, const char* owner)
+{
+    std::vector<std::string> names(std::begin(kGlshareVariables), std::end(kGlshareVariables));
     for (const KnownVariable& known : kKnownVariables)
         names.emplace_back(known.name);
     const std::string* nearest = nearestName(variable.name, names);
     return {variable.name, variable.value, Effect::kUnknown,
-            "the library knows no variable of this name", nearest ? *nearest : ""};
+            owner + std::string(" knows no variable of this name"), nearest ? *nearest : ""};
 }
 
 VariableReport explainVariable(const Facts& facts, const std::optional<Stop>& stop,
                                const Variable& variable)
 {
-    if (!std::string_view(variable.name).starts_with("VYRA_"))
+    const KnownVariable* known = findKnown(variable.name);
+    if (!known && resembles(variable.name, "VYRA_"))
+        return explainStranger(variable, "the library");
+    if (resembles(variable.name, "GLSHARE_") && !isKnownToGlshare(variable.name))
+        return explainStranger(variable, "glshare");
+    if (!known)
         return {variable.name, variable.value, Effect::kNoted,
                 "not the library's, but it steers what the library finds", ""};
-    const KnownVariable* known = findKnown(variable.name);
-    if (!known)
-        return explainStranger(variable);
     const Finding finding = stop && stop->step < known->readAt
                                 ? withoutEffect("start-up stopped before it made a difference")
                                 : known->explain(facts);

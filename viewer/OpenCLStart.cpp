@@ -1,16 +1,19 @@
 #include "viewer/OpenCLStart.h"
 
+#include "diagnostics/CLWarningSink.h"
 #include "host/Environment.h"
+#include "loader/OpenCLLibraryName.h"
 #include "runtime/TopenCLInfo.h"
 #include "standalone/NativeContext.h"
-#include "viewer/GraphicsVendor.h"
-#include "viewer/OpenCLPlatforms.h"
+#include "standalone/OpenCLPlatforms.h"
+#include "viewer/StartFailure.h"
 
-#include <optional>
+#include <string>
+#include <vector>
 
 #include <QByteArray>
+#include <QLibrary>
 #include <QOpenGLContext>
-#include <QOpenGLFunctions>
 #include <QOpenGLWindow>
 
 namespace viewer {
@@ -18,48 +21,69 @@ namespace {
 
 constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
 
-std::string glText(QOpenGLContext& context, unsigned name)
+// The library's warnings while an object lives. One thread starts the library.
+class WarningList {
+public:
+    WarningList() : fFormer(setCLWarningSink(keep)) { sfTexts.clear(); }
+    ~WarningList() { setCLWarningSink(fFormer); }
+    WarningList(const WarningList&) = delete;
+    WarningList& operator=(const WarningList&) = delete;
+
+    std::vector<std::string> texts() const { return sfTexts; }
+
+private:
+    static void keep(const char* text)
+    {
+        std::string warning = text;
+        while (warning.ends_with('\n'))
+            warning.pop_back();
+        sfTexts.push_back(std::move(warning));
+    }
+
+    static inline std::vector<std::string> sfTexts;
+    CLWarningSink fFormer;
+};
+
+std::string variable(const char* name)
 {
-    const auto* text = context.functions()->glGetString(name);
-    return text ? reinterpret_cast<const char*>(text) : "";
+    return qEnvironmentVariable(name).toStdString();
 }
 
-// Sets the variable from which the library takes the platform, where the adapter does not tell it.
-Status choosePlatform(const OpenCLFunctions& cl, const std::string& platform, bool adapterIsKnown)
+StartFacts gatherFacts(const Options& options, bool platformIsGiven, unsigned vendorId,
+                       const WarningList& warnings)
 {
-    if (!platform.empty()) {
-        qputenv(kPlatformVariable, QByteArray::fromStdString(platform));
-        return {};
-    }
-    if (adapterIsKnown || VyraGetEnv(kPlatformVariable))
-        return {};
-    const Result<std::string> vendor = sharingVendor(openCLPlatforms(cl));
-    if (!vendor)
-        return vendor.failure();
-    qputenv(kPlatformVariable, QByteArray::fromStdString(vendor.value()));
-    return {};
+    StartFacts facts;
+    facts.libraryFound = QLibrary(kOpenCLLibraryName).load();
+    facts.disabled = qEnvironmentVariableIsSet("VYRA_DISABLE_OPENCL");
+    facts.platformIsGiven = platformIsGiven;
+    facts.cpuIsAllowed = options.allowCpu;
+    facts.vendorId = vendorId;
+    facts.vendor = variable(kPlatformVariable);
+    facts.missingLayers = missingOpenCLLayers();
+    facts.platforms = openCLPlatforms();
+    facts.warnings = warnings.texts();
+    return facts;
 }
 
 } // namespace
 
-Status startOpenCL(QOpenGLWindow& window, const OpenCLFunctions& cl, const std::string& platform)
+Status startOpenCL(QOpenGLWindow& window, const Options& options)
 {
+    if (!options.platform.empty())
+        qputenv(kPlatformVariable, QByteArray::fromStdString(options.platform));
+    const bool platformIsGiven = qEnvironmentVariableIsSet(kPlatformVariable);
     QOpenGLContext& context = *window.context();
-    const std::optional<unsigned> vendorId =
-        pciVendorId(glText(context, GL_VENDOR), glText(context, GL_RENDERER));
-    if (Status failure = choosePlatform(cl, platform, vendorId.has_value()))
-        return failure;
+    const unsigned vendorId = chooseOpenCLPlatform(context);
 
     constexpr bool kUsingDirect3D = false;
     constexpr bool kUsingCoreProfile = true;
     // NOLINTNEXTLINE(performance-no-int-to-ptr): the library takes a window's number as a pointer
     void* const nativeWindow = reinterpret_cast<void*>(window.winId());
-    if (!TopenCLInfo::initialize(nativeWindow, nativeContext(context), nullptr, kUsingDirect3D,
-                                 kUsingCoreProfile, vendorId.value_or(0)))
-        return Failure{ExitCode::kNoOpenCL,
-                       "OpenCL cannot be used with this renderer, for the reason above; name "
-                       "another platform with --platform, or use --allow-cpu"};
-    return {};
+    const WarningList warnings;
+    if (TopenCLInfo::initialize(nativeWindow, nativeContext(context), nullptr, kUsingDirect3D,
+                                kUsingCoreProfile, vendorId))
+        return {};
+    return startFailure(gatherFacts(options, platformIsGiven, vendorId, warnings));
 }
 
 } // namespace viewer

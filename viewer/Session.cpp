@@ -5,6 +5,7 @@
 #include "runtime/TopenCLInfo.h"
 #include "standalone/DeviceMemory.h"
 #include "standalone/ProfileRecorder.h"
+#include "viewer/DeviceName.h"
 #include "viewer/FileOutput.h"
 #include "viewer/ImportProcess.h"
 #include "viewer/LoadProgress.h"
@@ -54,14 +55,6 @@ Status statusOf(const vyra::Status& status)
     if (status.ok())
         return {};
     return Failure{ExitCode::kOpenCLError, status.message};
-}
-
-std::string deviceName(const OpenCLFunctions& cl)
-{
-    char name[256] = "";
-    cl.clGetDeviceInfo(TopenCLInfo::theOne().openCLDevice(), CL_DEVICE_NAME, sizeof(name), name,
-                       nullptr);
-    return name;
 }
 
 } // namespace
@@ -127,15 +120,13 @@ Result<Model> Session::importChosenModel()
 
 Status Session::startOpenCLIfPossible()
 {
-    Result<OpenCLFunctions> cl = loadOpenCLFunctions();
-    Status failure = cl ? startOpenCL(fWindow, cl.value(), fOptions.platform) : cl.failure();
+    Status failure = startOpenCL(fWindow, fOptions);
     if (failure && !fOptions.allowCpu)
         return failure;
     if (failure) {
         std::fprintf(stderr, "vyra-viewer: going on without OpenCL: %s\n", failure->text.c_str());
         return {};
     }
-    fCL = cl.value();
     if (fOptions.minimumVertices)
         TopenCLInfo::theOne().setMinimumBufferSize(*fOptions.minimumVertices);
     return {};
@@ -322,7 +313,7 @@ OpenCLFacts Session::openCLFacts() const
     const TopenCLInfo& info = TopenCLInfo::theOne();
     const DeviceMemoryUse memory = deviceMemoryUse();
     OpenCLFacts facts;
-    facts.device = deviceName(fCL);
+    facts.device = deviceName(info.openCLDevice());
     facts.graphicsToCL = nameOf(info.graphicsToCLSyncMode());
     facts.clToGraphics = nameOf(info.clToGraphicsSyncMode());
     facts.doublePrecision = info.supportsDoublePrecision();

@@ -6,7 +6,6 @@
 #include "viewer/CpuTwin.h"
 #include "viewer/Failure.h"
 #include "viewer/Model.h"
-#include "viewer/OpenCLFunctions.h"
 #include "viewer/Options.h"
 #include "viewer/OverlayText.h"
 #include "viewer/Renderer.h"
@@ -91,7 +90,6 @@ private:
     QOpenGLWindow& fWindow;
     QOpenGLFunctions_3_3_Core* fGL = nullptr; // the context's
     std::unique_ptr<GLHost> fHost;
-    OpenCLFunctions fCL;
     Model fModel;
     const Animation* fAnimation = nullptr;       // of fModel
     std::unique_ptr<vyra::Evaluator> fEvaluator; // outlives the scene, whose meshes it owns

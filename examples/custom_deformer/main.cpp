@@ -5,6 +5,7 @@
 #include "runtime/TopenCLInfo.h"
 #include "standalone/GLHost.h"
 #include "standalone/NativeContext.h"
+#include "standalone/OpenCLPlatforms.h"
 
 #include <QGuiApplication>
 #include <QOffscreenSurface>
@@ -69,7 +70,8 @@ int main(int argc, char** argv)
         return std::fprintf(stderr, "There is no OpenGL: run this on a display.\n"), 1;
     QOpenGLExtraFunctions& gl = *context.extraFunctions();
     const GLHost host(context);
-    TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true, 0x10DE);
+    TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true,
+                            chooseOpenCLPlatform(context));
 
     // The evaluator looks for taper.cl in the directory of this program's sources.
     vyra::EvaluatorSettings settings;

@@ -9,6 +9,7 @@
 #include "runtime/TopenCLInfo.h"
 #include "standalone/GLHost.h"
 #include "standalone/NativeContext.h"
+#include "standalone/OpenCLPlatforms.h"
 
 #include <QGuiApplication>
 #include <QOpenGLContext>
@@ -83,7 +84,8 @@ private:
 
         // The library starts once, with the renderer; then the evaluator gets the mesh.
         fHost = std::make_unique<GLHost>(*this);
-        TopenCLInfo::initialize(nullptr, nativeContext(*context()), nullptr, false, true, 0x10DE);
+        TopenCLInfo::initialize(nullptr, nativeContext(*context()), nullptr, false, true,
+                                chooseOpenCLPlatform(*context()));
         vyra::EvaluatorSettings settings;
         settings.finishRenderer = [&gl] { gl.glFinish(); };
         settings.flushRenderer = [&gl] { gl.glFlush(); };

@@ -7,6 +7,7 @@
 #include "runtime/TopenCLInfo.h"
 #include "standalone/GLHost.h"
 #include "standalone/NativeContext.h"
+#include "standalone/OpenCLPlatforms.h"
 
 #include <QGuiApplication>
 #include <QOffscreenSurface>
@@ -73,7 +74,8 @@ int main(int argc, char** argv)
         return std::fprintf(stderr, "There is no OpenGL: run this on a display.\n"), 1;
     QOpenGLExtraFunctions& gl = *context.extraFunctions();
     const GLHost host(context);
-    TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true, 0x10DE);
+    TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true,
+                            chooseOpenCLPlatform(context));
 
     vyra::EvaluatorSettings settings;
     settings.finishRenderer = [&gl] { gl.glFinish(); };

@@ -54,6 +54,23 @@ ON_THIS_MACHINE = {
         "stop.step": "switch", "stop.reason": Part("'0'"), "stop.remedy": Part("unset VYRA_DISABLE_OPENCL"),
         "loader.loaded": True, "variables.1.effect": "unknown",
         "variables.1.suggestion": "VYRA_OPENCL_FORCE_FINISH"}),
+    "no vendor is known, and one platform shares": (LAYER, [], 0, {
+        "selfTest.passed": True, "decisions.0.reason": Part("this platform alone shares"), "decisions.0.variable": None,
+        "variables.1": ABSENT}),
+    "the platform has no devices": (LAYER | {"POCL_CACHE_DIR": "/dev/null/none"}, [], 1, {
+        "stop.step": "device", "stop.reason": Part("'The pocl project' has 0 devices."),
+        "stop.remedy": Part("PoCL has no devices if")}),
+    "a layer is missing": ({"OPENCL_LAYERS": "/none.so"}, [], 1, {
+        "stop.reason": Part("OPENCL_LAYERS names '/none.so', which is not a file. "),
+        "stop.remedy": Part("Correct OPENCL_LAYERS. ")}),
+    "no driver is installed": ({"OCL_ICD_VENDORS": "/nonexistent"}, [], 1, {
+        "summary": "OpenCL is off: this machine has no OpenCL platform.", "stop.step": "platform",
+        "stop.reason": Part("This machine has no OpenCL platform: the loader found no driver."),
+        "stop.remedy": Part("Install")}),
+    "names are written in other ways": (
+        {"vyra_disable_opencl": "1", "GLSHARE_ZERO_COPIES": "1"}, ["--platform=" + POCL], 1, {
+            "variables.0.name": "GLSHARE_ZERO_COPIES", "variables.0.suggestion": "GLSHARE_ZERO_COPY",
+            "variables.2.effect": "unknown", "variables.2.suggestion": "VYRA_DISABLE_OPENCL"}),
     "there is no OpenCL library": ({"LD_LIBRARY_PATH": OTHER_OPENCL + "/none"}, [], 1, {
         "stop.step": "loader", "stop.reason": Part("libOpenCL.so.1"), "stop.remedy": Part("Install"),
         "loader.loaded": False}),

@@ -1,9 +1,8 @@
 // Command line, and small decisions: vendor, platform, figures, texts.
-#include "viewer/GraphicsVendor.h"
-#include "viewer/OpenCLPlatforms.h"
 #include "viewer/Options.h"
 #include "viewer/OverlayText.h"
 #include "viewer/Report.h"
+#include "viewer/StartFailure.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -88,7 +87,7 @@ TEST(Options, EachMistakeIsNamed)
     }
 }
 
-TEST(GraphicsVendor, FollowsFromWhatTheDriverCallsItself)
+TEST(OpenCLPlatforms, AdapterVendorFollowsFromTheDriversTexts)
 {
     const std::tuple<const char*, const char*, std::optional<unsigned>> rows[] = {
         {"NVIDIA Corporation", "NVIDIA H100/PCIe/SSE2", 0x10DE},
@@ -99,25 +98,60 @@ TEST(GraphicsVendor, FollowsFromWhatTheDriverCallsItself)
         {"Microsoft Corporation", "GDI Generic", std::nullopt},
     };
     for (const auto& [vendor, renderer, id] : rows)
-        EXPECT_EQ(pciVendorId(vendor, renderer), id) << vendor << ' ' << renderer;
+        EXPECT_EQ(adapterVendorId(vendor, renderer), id) << vendor << ' ' << renderer;
 }
 
-TEST(OpenCLPlatforms, TheOneThatSharesIsTaken)
+TEST(StartFailure, FirstReasonIsNamedWithAdviceThatIsNotTakenYet)
 {
-    const OpenCLPlatform alone{"A", "cl_khr_icd"};
-    const OpenCLPlatform a{"A", "cl_khr_icd cl_khr_gl_sharing"};
-    const OpenCLPlatform b{"B", "cl_khr_icd cl_khr_gl_sharing"};
-    const std::pair<std::vector<OpenCLPlatform>, const char*> rows[] = {
-        {{alone, b}, "took B"},
-        {{b, b}, "took B"},
-        {{alone}, "libglshare.so"},
-        {{}, "install an OpenCL driver"},
-        {{a, b}, "--platform: 'A', 'B'"}};
-    for (const auto& [platforms, says] : rows) {
-        const Result<std::string> vendor = sharingVendor(platforms);
-        EXPECT_THAT(vendor ? "took " + vendor.value() : vendor.failure().text, HasSubstr(says));
-        EXPECT_TRUE(vendor || vendor.failure().code == ExitCode::kNoOpenCL);
-    }
+    const OpenCLPlatform alone{"A", "a", false, 1};
+    const OpenCLPlatform sharing{"B", "b", true, 1};
+    const OpenCLPlatform empty{"The pocl project", "p", true, 0};
+    const auto with = [](auto change) {
+        StartFacts facts;
+        facts.platforms = {{"A", "a", true, 1}, {"B", "b", true, 1}};
+        change(facts);
+        return startFailure(facts).text;
+    };
+    const std::pair<std::string, const char*> rows[] = {
+        {with([](StartFacts& f) {
+             f.missingLayers = {"/none.so"};
+             f.disabled = true;
+         }),
+         "OPENCL_LAYERS names '/none.so', which is not a file; correct the variable, or use "
+         "--allow-cpu"},
+        {with([](StartFacts& f) {
+             f.disabled = true;
+             f.cpuIsAllowed = true;
+         }),
+         "OpenCL is switched off, since VYRA_DISABLE_OPENCL is set; unset the variable"},
+        {with([](StartFacts& f) { f.libraryFound = false; }), "there is no OpenCL on this machine"},
+        {with([](StartFacts& f) { f.platforms = {}; }), "OpenCL has no platform on this machine"},
+        {with([](StartFacts& f) { f.vendor = "a"; }),
+         "no OpenCL platform has the vendor 'a'; there is 'A', 'B'"},
+        {with([&](StartFacts& f) {
+             f.vendor = empty.vendor;
+             f.platforms = {alone, empty};
+         }),
+         "'The pocl project' has 0 devices; PoCL has none if it cannot write its cache"},
+        {with([&](StartFacts& f) { f.platforms = {empty}; }), "has 0 devices"},
+        {with([&](StartFacts& f) {
+             f.vendor = "A";
+             f.platforms = {alone, sharing};
+         }),
+         "the OpenCL platform of 'A' does not offer cl_khr_gl_sharing"},
+        {with([&](StartFacts& f) { f.platforms = {alone}; }), "no OpenCL platform offers"},
+        {with([](StartFacts&) {}), "choose one with --platform: 'A', 'B'"},
+        {with([](StartFacts& f) {
+             f.vendor = "A";
+             f.platformIsGiven = true;
+             f.warnings = {"OpenCL error: CL_OUT_OF_HOST_MEMORY"};
+         }),
+         "with this renderer (OpenCL error: CL_OUT_OF_HOST_MEMORY); use --allow-cpu"},
+        {with([](StartFacts& f) { f.vendorId = 0x10DE; }),
+         "for the reason above; name another platform with --platform, or use --allow-cpu"},
+    };
+    for (const auto& [text, expected] : rows)
+        EXPECT_THAT(text, HasSubstr(expected));
 }
 
 TEST(Report, PercentilesAreValuesThatWereMeasured)
