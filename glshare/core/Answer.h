@@ -35,8 +35,8 @@ cl_int answerWith(const T& value, const Query& query)
     return answer(std::as_bytes(std::span<const T, 1>(&value, 1)), query);
 }
 
-// The most elements that a list given by the application can have. A larger count is a mistake,
-// such as -1 as a cl_uint, and nothing is read.
+// The most elements of a list that an application passes: 128 MiB of handles. A larger count is a
+// mistake, such as -1 as a cl_uint, and the list is not read.
 inline constexpr cl_uint kLongestList = cl_uint{1} << 24;
 
 // Whether `list` has `count` elements: none and a null pointer, or some and a pointer.

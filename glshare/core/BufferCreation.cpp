@@ -42,7 +42,6 @@ cl_mem createMemory(cl_context handle, SharedBuffer& buffer, bool inHostMemory, 
 
 } // namespace
 
-// None of them is the same as CL_MEM_READ_WRITE.
 bool areSharingFlags(cl_mem_flags flags)
 {
     return flags == 0 || flags == CL_MEM_READ_WRITE || flags == CL_MEM_READ_ONLY ||

@@ -7,7 +7,8 @@
 
 namespace glshare {
 
-// Whether `flags` may be given for an object made from one of OpenGL's.
+// Whether `flags` are valid for an object that is made from one of OpenGL's. 0 is, and means
+// CL_MEM_READ_WRITE.
 [[nodiscard]] bool areSharingFlags(cl_mem_flags flags);
 
 // clCreateFromGLBuffer, for a context that shares. The memory object lies over the buffer's own

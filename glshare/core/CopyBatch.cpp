@@ -83,18 +83,20 @@ void CopyBatch::settle(cl_int status, GlDevice* device) noexcept
 // command was given, and all that is left is to end well.
 void CopyBatch::copyAll(GlDevice& device) noexcept
 {
-    for (const CopyItem& item : items) {
-        const SharedBuffer& buffer = *item.buffer;
-        const bool isCopied = direction == CopyDirection::FromGl
-                                  ? device.read(buffer.name, item.pointer, buffer.size)
-                                  : device.write(buffer.name, item.pointer, buffer.size);
-        if (isCopied)
-            counters().bytesCopied += buffer.size;
-        else
-            ++counters().failedCopies;
+    const auto copyEach = [this](auto copy) {
+        for (const CopyItem& item : items) {
+            if (copy(item.buffer->name, item.pointer, item.buffer->size))
+                counters().bytesCopied += item.buffer->size;
+            else
+                ++counters().failedCopies;
+        }
+    };
+    if (direction == CopyDirection::FromGl) {
+        copyEach([&](auto... copy) { return device.read(copy...); });
+    } else {
+        GlDevice::Writing writing(device);
+        copyEach([&](auto... copy) { return writing.write(copy...); });
     }
-    if (direction == CopyDirection::ToGl)
-        device.finish();
 }
 
 // Of a batch that has failed, once each of its commands has ended and is out of use.

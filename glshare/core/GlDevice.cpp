@@ -109,6 +109,11 @@ bool GlDevice::read(GLuint name, void* to, std::size_t size)
     return true;
 }
 
+bool GlDevice::Writing::write(GLuint name, const void* from, std::size_t size)
+{
+    return device_.write(name, from, size);
+}
+
 // Storage that the application has made immutable may refuse to be written from the host; OpenGL's
 // own copies it takes.
 bool GlDevice::write(GLuint name, const void* from, std::size_t size)

@@ -21,12 +21,24 @@ public:
     // Bytes of a buffer's storage; empty if `name` is no buffer (now).
     [[nodiscard]] std::optional<std::size_t> bufferSize(GLuint name) const;
 
-    // Copies `size` bytes out of, or into, a buffer, without mapping it. False, and nothing done,
-    // if the buffer is gone, smaller, or mapped by the application. What was written is visible to
-    // the other contexts of the share group after finish().
+    // Copies `size` bytes out of a buffer, without mapping it. False, and nothing done, if the
+    // buffer is gone, smaller, or mapped by the application.
     [[nodiscard]] bool read(GLuint name, void* to, std::size_t size);
-    [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
-    void finish() const { gl_.finish(); }
+
+    // Copies into buffers, in the same way. The other contexts of the share group see what was
+    // written when this ends.
+    class Writing {
+    public:
+        explicit Writing(GlDevice& device) : device_(device) {}
+        ~Writing() { device_.gl_.finish(); }
+        Writing(const Writing&) = delete;
+        Writing& operator=(const Writing&) = delete;
+
+        [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
+
+    private:
+        GlDevice& device_;
+    };
 
     // The host address of a buffer's storage, null if it has none that lasts, or if the buffer is
     // gone, smaller than `size` bytes, or mapped by the application. Maps the buffer for well under
@@ -55,6 +67,7 @@ private:
 
     [[nodiscard]] bool buildPinProgram();
     [[nodiscard]] bool prepareCopy(GLuint name, std::size_t size) const;
+    [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
     // Makes the staging buffer that large, and binds it.
     void bindStaging(GLenum target, std::size_t size);
     [[nodiscard]] bool succeeded() const { return gl_.getError() == GL_NO_ERROR; }

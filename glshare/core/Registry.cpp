@@ -14,8 +14,7 @@ Registry& Registry::get()
     return *theRegistry;
 }
 
-// A table of functions may have something else where an older runtime has none, so that the version
-// counts.
+// The version is checked since the table of an older runtime ends before this function.
 void Registry::add(cl_context handle, std::shared_ptr<SharingContext> context)
 {
     const bool canReportEnd =

@@ -25,7 +25,8 @@ bool workInHostMemory(std::span<const cl_device_id> devices)
         devices, [](cl_device_id device) { return (ownType(device) & CL_DEVICE_TYPE_CPU) != 0; });
 }
 
-// Null, and the reason in `error`, if there is nothing to share with.
+// Starts sharing with the context of OpenGL that `properties` name. Null, and the reason in
+// `error`, if it cannot be shared with.
 std::shared_ptr<SharingContext> makeSharing(ContextProperties properties, bool canUseHostMemory,
                                             cl_int* error)
 {
@@ -133,8 +134,8 @@ cl_int CL_API_CALL getContextInfo(cl_context context, cl_context_info name, std:
 
 namespace {
 
-// The error of a context with these properties, found by making one. The extension has a code of
-// its own here for an attribute that only the runtime can know to be none.
+// Returns the error of a context with these properties, by creating and releasing one. An attribute
+// that the runtime does not have is CL_INVALID_VALUE in this query.
 cl_int tryContext(const cl_context_properties* properties, const ContextProperties& parsed,
                   cl_device_id device)
 {

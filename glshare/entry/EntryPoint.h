@@ -1,5 +1,5 @@
-// The C function around each function of EntryPoints.h: no exception leaves it, and it refuses to
-// work in a forked child.
+// The C functions around those of EntryPoints.h: no exception leaves them, and in a forked child
+// they fail.
 #pragma once
 
 #include "core/Answer.h"
@@ -27,8 +27,7 @@ Result failWith(cl_int error, Arguments... arguments)
     }
 }
 
-// Whether a function works in a child that was forked while this program had threads. Only those
-// do that use nothing but the runtime's description of itself.
+// Whether a function works in a forked child: true of those that only query platforms and devices.
 enum class InForkedChild { Fails, Works };
 
 template <auto function, InForkedChild inForkedChild = InForkedChild::Fails>
@@ -37,8 +36,8 @@ struct EntryPoint;
 template <typename Result, typename... Arguments, Result(CL_API_CALL* function)(Arguments...),
           InForkedChild inForkedChild>
 struct EntryPoint<function, inForkedChild> {
-    // Standard exceptions only: a cancelled thread unwinds by another, which has to pass. Each one
-    // means that the host lacks something, memory or a thread.
+    // Catches standard exceptions only: a cancelled thread unwinds by another, which must pass.
+    // Each means that the host has no memory or no thread to give.
     static Result CL_API_CALL call(Arguments... arguments)
     {
         if (inForkedChild == InForkedChild::Fails && isForkedChild())

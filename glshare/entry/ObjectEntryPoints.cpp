@@ -44,8 +44,8 @@ struct ImageRequest {
     cl_GLint level = 0;
 };
 
-// Textures and renderbuffers are not offered, so that no name is that of an object to share. The
-// other arguments are checked first.
+// Textures and renderbuffers are not offered: no name is that of an object to share. The other
+// arguments are checked first.
 cl_int errorOf(const ImageRequest& request)
 {
     if (Registry::get().find(request.context) == nullptr)
@@ -151,8 +151,8 @@ cl_int CL_API_CALL getGlTextureInfo(cl_mem memory, cl_gl_texture_info name, std:
 
 namespace {
 
-// The shared buffer that a memory object is, or was made from as a part or an image; null if it has
-// nothing to do with one.
+// Returns the shared buffer that a memory object is, or is a part or an image of; null if there is
+// none.
 std::shared_ptr<SharedBuffer> findWhole(cl_mem memory)
 {
     std::shared_ptr<SharedBuffer> buffer;
@@ -165,7 +165,7 @@ std::shared_ptr<SharedBuffer> findWhole(cl_mem memory)
     return buffer;
 }
 
-// What the application gave, which says nothing about where a shared buffer has its memory.
+// Returns the flags that the application has given, without those for the memory of `whole`.
 cl_mem_flags shownFlags(cl_mem memory, const SharedBuffer& whole)
 {
     if (memory == whole.memory)

@@ -88,6 +88,24 @@ TEST_F(BufferContentsTest, ImmutableBuffersAreShared)
     }
 }
 
+// OpenGL ES reads no buffer back but by a mapping.
+TEST_F(BufferContentsTest, BuffersOfOpenGlEsAreShared)
+{
+    const EglTestContext es(nullptr, EGL_OPENGL_ES_API);
+    ASSERT_TRUE(es.valid());
+    es.makeCurrent();
+    const GLuint buffer = makeGlBuffer(from(1));
+    const Context context = makeContext(properties(es.entries()));
+    const Queue queue(context, device_);
+    queue.rewrite(share(context, buffer), from(1), from(50));
+    const auto* numbers = static_cast<const cl_int*>(glMapBufferRange(
+        GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(count_ * sizeof(cl_int)), GL_MAP_READ_BIT));
+    ASSERT_NE(numbers, nullptr);
+    EXPECT_EQ(Numbers(numbers, numbers + count_), from(50));
+    EXPECT_EQ(glGetError(), GLenum{GL_NO_ERROR});
+    EglTestContext::releaseCurrent();
+}
+
 // One list with buffers of every kind: in place, moved, and never in place.
 TEST_F(BufferContentsTest, OneCommandCarriesManyBuffers)
 {

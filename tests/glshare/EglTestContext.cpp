@@ -15,17 +15,18 @@ EGLDisplay EglTestContext::display()
     return theDisplay;
 }
 
-EglTestContext::EglTestContext(const EglTestContext* share)
+EglTestContext::EglTestContext(const EglTestContext* share, EGLenum api) : api_(api)
 {
-    eglBindAPI(EGL_OPENGL_API);
+    eglBindAPI(api);
+    const bool isEs = api == EGL_OPENGL_ES_API;
     const std::array<EGLint, 5> wanted{EGL_SURFACE_TYPE, EGL_PBUFFER_BIT, EGL_RENDERABLE_TYPE,
-                                       EGL_OPENGL_BIT, EGL_NONE};
+                                       isEs ? EGL_OPENGL_ES3_BIT : EGL_OPENGL_BIT, EGL_NONE};
     EGLConfig config = nullptr;
     EGLint count = 0;
     if (eglChooseConfig(display(), wanted.data(), &config, 1, &count) != EGL_TRUE || count == 0)
         return;
-    const std::array<EGLint, 5> attributes{EGL_CONTEXT_MAJOR_VERSION, 4, EGL_CONTEXT_MINOR_VERSION,
-                                           5, EGL_NONE};
+    const std::array<EGLint, 5> attributes{EGL_CONTEXT_MAJOR_VERSION, isEs ? 3 : 4,
+                                           EGL_CONTEXT_MINOR_VERSION, isEs ? 0 : 5, EGL_NONE};
     context_ = eglCreateContext(
         display(), config, share == nullptr ? EGL_NO_CONTEXT : share->context_, attributes.data());
 }
@@ -43,7 +44,7 @@ std::vector<cl_context_properties> EglTestContext::entries() const
 
 void EglTestContext::makeCurrent() const
 {
-    eglBindAPI(EGL_OPENGL_API);
+    eglBindAPI(api_);
     eglMakeCurrent(display(), EGL_NO_SURFACE, EGL_NO_SURFACE, context_);
 }
 

@@ -13,7 +13,7 @@ public:
     static EGLDisplay display();
 
     // Shares its objects with `share`, which may be null. Not current on any thread; valid() tells.
-    explicit EglTestContext(const EglTestContext* share = nullptr);
+    explicit EglTestContext(const EglTestContext* share = nullptr, EGLenum api = EGL_OPENGL_API);
     ~EglTestContext();
 
     EglTestContext(const EglTestContext&) = delete;
@@ -32,5 +32,6 @@ public:
     void destroy();
 
 private:
+    EGLenum api_;
     EGLContext context_ = EGL_NO_CONTEXT;
 };

@@ -76,6 +76,18 @@ TEST_F(GlxTest, WritesCrossAlsoFromAThreadWithoutContextWhileTheContextIsInUse)
     EXPECT_EQ(readGl(buffer_, count_), from(50));
 }
 
+// Xlib reports the errors of earlier requests at any time, and the layer catches those of its own.
+TEST_F(GlxTest, EarlierErrorsReachTheApplication)
+{
+    static int errors = 0;
+    const XErrorHandler before = XSetErrorHandler([](Display*, XErrorEvent*) { return ++errors; });
+    XMapWindow(display_, None);
+    EXPECT_NE(makeContext(), nullptr);
+    XSync(display_, False);
+    XSetErrorHandler(before);
+    EXPECT_EQ(errors, 1);
+}
+
 // The order no application should choose: OpenCL is still at work when the display goes. What it
 // works on is left behind on purpose, so that this test runs without a search for leaks.
 using GlxDisplayTest = GlxTest;

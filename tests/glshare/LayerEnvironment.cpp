@@ -16,7 +16,7 @@ extern "C" [[gnu::visibility("default")]] const char* __asan_default_options()
 // cannot see how they synchronise.
 extern "C" [[gnu::visibility("default")]] const char* __tsan_default_suppressions()
 {
-    return "deadlock:libpocl\nrace:libpocl\nrace:swrast_dri\n";
+    return "deadlock:libpocl\nrace:swrast_dri\n";
 }
 
 int main(int argc, char** argv)

@@ -49,10 +49,10 @@ TEST_F(LifetimeTest, ContextsLeaveNoObjectsInTheShareGroup)
 TEST_F(LifetimeTest, CommandsThatFailLeaveNothing)
 {
     EglTestContext::releaseCurrent();
-    const auto failOften = [this](int times) {
+    const Queue queue(context_, device_, CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE);
+    const auto failOften = [&](int times) {
         for (int i = 0; i < times; ++i) {
             const Event gate = makeUserEvent();
-            const Queue queue(context_, device_);
             const Memory memory = share(buffer_);
             Event event;
             EXPECT_EQ(queue.acquire(memory, {gate}, &event), CL_SUCCESS);

@@ -120,7 +120,7 @@ TEST_F(StressTest, ContextsCreateObjectsOfOneBufferAtTheSameTime)
             share(context, buffer_);
     };
     for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
-        for (const std::size_t threads : {2, 4})
+        for (const std::size_t threads : {2U, 4U})
             onThreads(threads, round % 2 != 0, create, std::this_thread::yield);
     }
 }
@@ -128,7 +128,7 @@ TEST_F(StressTest, ContextsCreateObjectsOfOneBufferAtTheSameTime)
 TEST_F(StressTest, ContextsCreateObjectsOfABufferThatOpenGlMapsAndDraws)
 {
     for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
-        for (const std::size_t threads : {1, 2, 4}) {
+        for (const std::size_t threads : {1U, 2U, 4U}) {
             for (const bool haveGl : {false, true})
                 onThreads(
                     threads, haveGl, [this](cl_context context) { createObjects(context); },
