@@ -324,24 +324,21 @@ TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
     EXPECT_GT(std::ranges::count(warnings(), ""), 0);
 }
 
+// A list that only grows needs more memory now and then.
 TEST_F(ScriptedTest, AFailedRequestLeavesNothingInTheStore)
 {
     ASSERT_TRUE(start());
-    const auto allocationsOfAHit = [](bool afterAFailure) {
-        Bench bench;
-        bench.makeStore();
-        if (afterAFailure) {
-            runtime().plan({.function = "clCreateProgramWithSource"});
-            EXPECT_EQ(bench.getKernel(), 0);
-        }
-        bench.getKernel();
-        bench.getKernel();
+    Bench bench;
+    bench.makeStore();
+    runtime().plan({.function = "clCreateProgramWithSource", .onwards = true});
+    std::set<unsigned> counts;
+    for (int request = 0; request < 20; ++request) {
         allocations = 0;
-        EXPECT_EQ(bench.getKernel(), 1);
-        return allocations;
-    };
-    EXPECT_EQ(allocationsOfAHit(true), allocationsOfAHit(false));
-    EXPECT_EQ(warnings().size(), 1U);
+        EXPECT_EQ(bench.getKernel(), 0);
+        counts.insert(unsigned{allocations}); // a copy: inserting allocates
+    }
+    EXPECT_EQ(counts.size(), 1U);
+    EXPECT_EQ(warnings().size(), 20U);
 }
 
 #ifndef _WIN32

@@ -272,12 +272,15 @@ TEST_F(BufferTest, WaitListsPassUnchangedOnWritesAndOnlyWithACountOnReads)
     buffer.uploadDataToGPU(queue(), CL_TRUE, 8, 4, fBytes.data() + 1, 2, list);
     buffer.readBackDataFromGPU(queue(), CL_TRUE, 4, 4, fBytes.data() + 2, 2, list);
     buffer.readBackDataFromGPU(queue(), CL_FALSE, 4, 4, fBytes.data() + 3, 0, list);
-    EXPECT_EQ(callsOf("clEnqueue"),
-              (Lines{"clEnqueueWriteBuffer(queue#2, mem#1, 1, 8, 4, host+1, [event#1, event#1]) = "
-                     "event#2",
-                     "clEnqueueReadBuffer(queue#2, mem#1, 1, 4, 4, host+2, [event#1, event#1]) = "
-                     "event#3",
-                     "clEnqueueReadBuffer(queue#2, mem#1, 0, 4, 4, host+3, []) = event#4"}));
+    EXPECT_EQ(
+        calls(),
+        (Lines{
+            "clReleaseEvent(event#1)",
+            "clEnqueueWriteBuffer(queue#2, mem#1, 1, 8, 4, host+1, [event#1, event#1]) = event#2",
+            "clReleaseEvent(event#2)",
+            "clEnqueueReadBuffer(queue#2, mem#1, 1, 4, 4, host+2, [event#1, event#1]) = event#3",
+            "clReleaseEvent(event#3)",
+            "clEnqueueReadBuffer(queue#2, mem#1, 0, 4, 4, host+3, []) = event#4"}));
 
     // A null list with a count, and a list without, are the caller's affair.
     buffer.uploadDataToGPU(queue(), CL_FALSE, 0, 4, fBytes.data(), 0, list);

@@ -162,6 +162,7 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     EXPECT_TRUE(data.getSinglePlug() == Tplug::fsNULL);
     EXPECT_EQ(&data.getData(kName, kPlug), &TopenCLDataBuffer::fsNULL);
     data.setData(kName, kPlug, makeData()); // mem#1
+    EXPECT_EQ(&data.getData(kName, Tplug::fsNULL), &TopenCLDataBuffer::fsNULL);
     EXPECT_FALSE(data.empty());
     data.setData(kName, kPlug, makeData()); // mem#2 replaces it
     EXPECT_EQ(std::distance(data.begin(), data.end()), 1);
@@ -175,7 +176,11 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     EXPECT_EQ(std::distance(copy.begin(), copy.end()), 2);
     EXPECT_EQ(runtime().references(Kind::kMem, data.getData(normals, kPlug).buffer().get()), 2U);
     data.setData(kName, kOtherPlug, makeData());
-    EXPECT_TRUE(data.getSinglePlug() == Tplug::fsNULL);
+    for (std::uint64_t node = 10; node < 20; ++node) { // anywhere in the order of the map
+        TopenCLData severalPlugs(copy);
+        severalPlugs.setData(kName, Tplug(node, 0), {});
+        EXPECT_TRUE(severalPlugs.getSinglePlug() == Tplug::fsNULL);
+    }
     EXPECT_TRUE(copy.getSinglePlug() == kPlug) << "a copy is a map of its own";
 
     TopenCLData& itself = data;
@@ -291,6 +296,9 @@ TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
     EXPECT_EQ(inPlace.bufferReadyEvent().get(), input.bufferReadyEvent().get());
     EXPECT_EQ(inPlace.buffer().get(), input.buffer().get());
     EXPECT_TRUE(inPlace.descriptor().plug() == kOtherPlug);
+    TopenCLData data;
+    pool.collectDataForPlug(kOtherPlug, data);
+    EXPECT_TRUE(data.empty()) << "in-place outputs are not the pool's";
 
     input.descriptor().setPermissions(Descriptor::kReadOnly);
     const TopenCLDataBuffer pooled = pool.createOutputBuffer(input, kOtherPlug);
@@ -298,9 +306,6 @@ TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
     EXPECT_FALSE(pooled.descriptor().isReadOnly());
     EXPECT_TRUE(pooled.descriptor().name() == kName);
 
-    TopenCLData data;
-    pool.collectDataForPlug(kPlug, data);
-    EXPECT_TRUE(data.empty()) << "in-place outputs are not the pool's";
     const TopenCLDataBuffer later = pool.createBuffer(pooled); // same name and plug: it wins
     pool.collectDataForPlug(kOtherPlug, data);
     EXPECT_EQ(data.getData(kName, kOtherPlug).buffer().get(), later.buffer().get());

@@ -216,7 +216,7 @@ struct DestroyRow : Named {
     Batch batch;     // in which the three buffers are
     bool keepsBatch; // DestroyBatchedSharedCLBuffer
     int status;
-    Lines calls; // of destroying B
+    Lines calls; // of destroying A
 };
 
 class DestroyRules : public SharedBufferRules, public ::testing::WithParamInterface<DestroyRow> {
@@ -242,19 +242,19 @@ TEST_P(DestroyRules, TheOthersStayInTheBatchOrJoinItAgain)
 {
     const Batch batch = GetParam().batch;
     const bool keepsBatch = GetParam().keepsBatch;
-    const cl_mem destroyed = fBuffers[1]->fMem.get();
-    EXPECT_EQ(keepsBatch ? manager().DestroyBatchedSharedCLBuffer(fBuffers[1])
-                         : manager().DestroySharedCLBuffer(fBuffers[1]),
+    const cl_mem destroyed = fBuffers[0]->fMem.get();
+    EXPECT_EQ(keepsBatch ? manager().DestroyBatchedSharedCLBuffer(fBuffers[0])
+                         : manager().DestroySharedCLBuffer(fBuffers[0]),
               GetParam().status);
     EXPECT_EQ(calls(), named(GetParam().calls));
     const bool stay = batch == Batch::kAcquired || (batch != Batch::kNone && keepsBatch);
-    EXPECT_EQ(fBuffers[0]->fInBatch, stay);
+    EXPECT_EQ(fBuffers[1]->fInBatch, stay);
     EXPECT_EQ(fBuffers[2]->fInBatch, stay);
     if (batch == Batch::kAcquired) {
         manager().PostEvaluate(kId);
         EXPECT_THAT(callsOf("clEnqueueRelease"),
                     ::testing::ElementsAre(::testing::HasSubstr(
-                        named(std::string(keepsBatch ? "[<A>, <C>]" : "[<A>, <B>, <C>]")))));
+                        named(std::string(keepsBatch ? "[<B>, <C>]" : "[<A>, <B>, <C>]")))));
     }
     EXPECT_EQ(runtime().references(Kind::kMem, destroyed), 0U);
     manager().PreEvaluate(kId);
@@ -262,16 +262,16 @@ TEST_P(DestroyRules, TheOthersStayInTheBatchOrJoinItAgain)
     const auto isRetain = [](const auto& line) { return line.starts_with("clRetainMemObject"); };
     EXPECT_EQ(std::ranges::count_if(lines, isRetain), stay ? 0 : 2) << "the batch is rebuilt";
     EXPECT_THAT(lines, ::testing::Contains(::testing::HasSubstr(named(
-                           std::string("clEnqueueAcquireGLObjects(queue#1, [<A>, <C>], []")))));
+                           std::string("clEnqueueAcquireGLObjects(queue#1, [<B>, <C>], []")))));
     manager().PostEvaluate(kId);
 }
-const std::string kReleaseB = "clReleaseMemObject(<B>)";
-const Lines kDissolve{"clReleaseMemObject(<A>)", kReleaseB, "clReleaseMemObject(<C>)", kReleaseB};
+const std::string kReleaseA = "clReleaseMemObject(<A>)";
+const Lines kDissolve{kReleaseA, "clReleaseMemObject(<B>)", "clReleaseMemObject(<C>)", kReleaseA};
 INSTANTIATE_TEST_SUITE_P(
     SharedBuffers, DestroyRules,
     ::testing::Values(
-        DestroyRow{"Unbatched", Batch::kNone, false, 0, {kReleaseB}},
-        DestroyRow{"UnbatchedKeepingTheBatch", Batch::kNone, true, 0, {kReleaseB}},
+        DestroyRow{"Unbatched", Batch::kNone, false, 0, {kReleaseA}},
+        DestroyRow{"UnbatchedKeepingTheBatch", Batch::kNone, true, 0, {kReleaseA}},
         DestroyRow{"BatchedBeforeAnyRelease", Batch::kNeverReleased, false, 0, kDissolve},
         DestroyRow{
             "Batched",
@@ -279,15 +279,15 @@ INSTANTIATE_TEST_SUITE_P(
             false,
             0,
             {"clWaitForEvents([event#2])", kDissolve[0], kDissolve[1], kDissolve[2], kDissolve[3]}},
-        DestroyRow{"BatchedKeepingTheBatch", Batch::kReleased, true, 0, {kReleaseB, kReleaseB}},
-        DestroyRow{"Acquired", Batch::kAcquired, false, CL_INVALID_VALUE, {kReleaseB}},
+        DestroyRow{"BatchedKeepingTheBatch", Batch::kReleased, true, 0, {kReleaseA, kReleaseA}},
+        DestroyRow{"Acquired", Batch::kAcquired, false, CL_INVALID_VALUE, {kReleaseA}},
         DestroyRow{"AcquiredKeepingTheBatch",
                    Batch::kAcquired,
                    true,
                    0,
-                   {"clEnqueueReleaseGLObjects(queue#1, [<B>], [event#3]) = event#4",
-                    "clWaitForEvents([event#4])", "clReleaseEvent(event#4)", kReleaseB,
-                    kReleaseB}}),
+                   {"clEnqueueReleaseGLObjects(queue#1, [<A>], [event#3]) = event#4",
+                    "clWaitForEvents([event#4])", "clReleaseEvent(event#4)", kReleaseA,
+                    kReleaseA}}),
     ::testing::PrintToStringParamName());
 
 } // namespace
