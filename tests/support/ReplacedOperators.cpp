@@ -3,6 +3,35 @@
 #include <cstdlib>
 #include <new>
 
+#ifdef _WIN32
+#include <malloc.h>
+#endif
+
+namespace {
+
+// Windows has no aligned memory that free() takes.
+#ifdef _WIN32
+void* allocateAligned(std::size_t size, std::size_t alignment)
+{
+    return _aligned_malloc(size, alignment);
+}
+void freeAligned(void* memory)
+{
+    _aligned_free(memory);
+}
+#else
+void* allocateAligned(std::size_t size, std::size_t alignment)
+{
+    return std::aligned_alloc(alignment, (size + alignment - 1) / alignment * alignment);
+}
+void freeAligned(void* memory)
+{
+    std::free(memory);
+}
+#endif
+
+} // namespace
+
 void* operator new(std::size_t size, const std::nothrow_t&) noexcept
 {
     return nextAllocationFails() ? nullptr : std::malloc(size ? size : 1);
@@ -16,9 +45,9 @@ void* operator new(std::size_t size)
 }
 void* operator new(std::size_t size, std::align_val_t alignment)
 {
-    const auto step = static_cast<std::size_t>(alignment);
-    void* memory =
-        nextAllocationFails() ? nullptr : std::aligned_alloc(step, (size + step - 1) / step * step);
+    void* memory = nextAllocationFails()
+                       ? nullptr
+                       : allocateAligned(size, static_cast<std::size_t>(alignment));
     if (!memory)
         throw std::bad_alloc();
     return memory;
@@ -43,11 +72,11 @@ void* operator new[](std::size_t size)
 }
 [[gnu::noinline]] void operator delete(void* memory, std::align_val_t) noexcept
 {
-    std::free(memory);
+    freeAligned(memory);
 }
 [[gnu::noinline]] void operator delete(void* memory, std::size_t, std::align_val_t) noexcept
 {
-    std::free(memory);
+    freeAligned(memory);
 }
 [[gnu::noinline]] void operator delete[](void* memory) noexcept
 {

@@ -32,9 +32,10 @@ TEST(Options, AreReadInBothForms)
 
 TEST(Options, WrongOnesAreRefusedWithAReason)
 {
-    for (const char* wrong : {"--platform", "--platform=", "--device-vendor", "--device-vendor=10de",
-                              "--device-vendor=", "--device-vendor=0x", "--device-vendor=-1",
-                              "--device-vendor=99999999999", "--json=1", "report", "--verbose"}) {
+    for (const char* wrong :
+         {"--platform", "--platform=", "--device-vendor", "--device-vendor=10de",
+          "--device-vendor=", "--device-vendor=0x", "--device-vendor=-1",
+          "--device-vendor=99999999999", "--json=1", "report", "--verbose"}) {
         std::string problem;
         EXPECT_FALSE(info::parseOptions({"--json", wrong}, problem)) << wrong;
         EXPECT_FALSE(problem.empty()) << wrong;
