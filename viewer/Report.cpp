@@ -71,7 +71,7 @@ void addDeviation(const Deviation& deviation, const MeshShare& share, Lines& lin
 {
     line("Largest deviation") << std::scientific << std::setprecision(2) << deviation.position
                               << " of a character's size (bound " << kPositionBound << "), normals "
-                              << deviation.normal << " (bound " << kNormalBound
+                              << deviation.normal << " (bound " << deviation.normalBound
                               << "): " << (deviation.withinBound() ? "passed" : "FAILED");
     if (share.allOnCpu())
         line("") << "Nothing ran on OpenCL: the CPU was compared with itself.";

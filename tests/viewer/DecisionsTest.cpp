@@ -173,9 +173,9 @@ TEST(Report, DeviationLineNamesTheVerdictAndWhatWasCompared)
 {
     const char* itself = "compared with itself";
     RunFacts facts;
-    facts.deviation = Deviation{2 * kPositionBound, 0};
+    facts.deviation = Deviation{2 * kPositionBound};
     EXPECT_THAT(reportText(facts), AllOf(HasSubstr("FAILED"), HasSubstr(itself)));
-    facts.deviation = Deviation{kPositionBound, kNormalBound};
+    facts.deviation = Deviation{kPositionBound, kNormalBound, kNormalBound};
     facts.share = {true, 3, 2, 500};
     EXPECT_THAT(reportText(facts), AllOf(HasSubstr("passed"), Not(HasSubstr(itself))));
 }

@@ -138,4 +138,26 @@ TEST(Verification, FindsTheWorstVertexAndValuesThatAreNoNumbers)
     }
 }
 
+TEST(Verification, NormalsFromTrianglesMayTurnAsFarAsPositionsAllow)
+{
+    constexpr float kSize = 1e-3f; // of the triangle
+    const vyra::Surface expected{{{0, 0, 0}, {kSize, 0, 0}, {0, kSize, 0}},
+                                 {{0, 0, 1}, {0, 0, 1}, {0, 0, 1}}};
+    const vyra::SmoothTopology topology({"", expected, {0, 1, 2}});
+    const std::tuple<float, float, bool, bool> rows[] = {
+        // a corner moved, normals turned, passes without and with topology
+        {1e-6f, 5e-5f, true, true},   {1e-6f, 2e-3f, false, true}, {1e-6f, 2e-2f, false, false},
+        {1e-7f, 2e-3f, false, false}, {0, 2e-3f, false, false},
+    };
+    for (const auto& [moved, turned, passes, passesWithTopology] : rows) {
+        vyra::Surface actual = expected;
+        actual.positions[2].z = moved;
+        for (vyra::Vector3& normal : actual.normals)
+            normal.y = -turned;
+        EXPECT_EQ(compare(actual, expected, {}).withinBound(), passes) << moved << ", " << turned;
+        EXPECT_EQ(compare(actual, expected, {}, &topology).withinBound(), passesWithTopology)
+            << moved << ", " << turned;
+    }
+}
+
 } // namespace
