@@ -82,6 +82,7 @@ private:
     struct Buffer {
         const TopenCLSharedBuffer* record;
         bool acquired = false; // by a command of its own
+        bool inBatch = false;
 
         std::string name() const { return runtime().name(record->fMem.get()); }
     };
@@ -117,11 +118,27 @@ private:
         return line.substr(line.rfind(' ') + 1);
     }
     void requireNoCommand() { requireCommand("", {}, {}); }
-    void requireAllInBatch()
+    // Requires as many calls of `function` since the operation began.
+    void requireCount(const std::string& function, std::ptrdiff_t count)
     {
-        for (const Buffer& buffer : fBuffers)
-            require(buffer.record->fInBatch == fModes.batching, "all in the batch");
+        const auto isCall = [&](const auto& line) { return line.starts_with(function); };
+        require(std::ranges::count_if(fCalls, isCall) == count,
+                std::to_string(count) + " of " + function);
     }
+    // The operation rebuilds the batch from all buffers if some came or went, and only then.
+    void requireWholeBatch()
+    {
+        requireCount("clRetainMemObject", fDirty && fModes.batching ? std::ssize(fBuffers) : 0);
+        setInBatch(fModes.batching);
+        fDirty = false;
+    }
+    void setInBatch(bool inBatch)
+    {
+        for (Buffer& buffer : fBuffers)
+            buffer.inBatch = inBatch;
+    }
+    // The event of the last batch release, at its address.
+    cl_event releaseEvent() { return *fManager->EnqueueReleaseBatchedSharedCLBuffer(0, nullptr); }
     bool anyAcquired() const { return std::ranges::any_of(fBuffers, &Buffer::acquired); }
     // The buffer that is chosen, or null.
     Buffer* chosen(unsigned choice)
@@ -148,8 +165,9 @@ private:
     cl_event fEvents[3] = {};        // of an evaluator's last commands
     std::vector<cl_event> fReleased; // by single commands since the last PostEvaluate
     bool fOpen = false;
-    Names fHeld;    // acquired by the open evaluation and not released since
-    Names fPending; // events that the next batch release has to wait for
+    bool fDirty = false; // buffers came or went since the batch was built
+    Names fHeld;         // acquired by the open evaluation and not released since
+    Names fPending;      // events that the next batch release has to wait for
     std::string fAcquireEvent = "null";
     bool fFence = false; // is pending
     Lines fCalls;
@@ -182,6 +200,7 @@ void Sequence::create(unsigned)
 {
     int status = 1;
     fBuffers.push_back({makeShared(*fManager, &status)});
+    fDirty = true;
 }
 
 template <bool kKeepBatch>
@@ -190,14 +209,19 @@ void Sequence::destroy(unsigned choice)
     const Buffer* buffer = chosen(choice);
     if (!buffer)
         return;
-    const Names mems =
-        kKeepBatch && fOpen && buffer->record->fInBatch ? Names{buffer->name()} : Names{};
-    if (kKeepBatch)
-        fManager->DestroyBatchedSharedCLBuffer(buffer->record);
-    else
-        fManager->DestroySharedCLBuffer(buffer->record);
+    const bool isHeld = fOpen && buffer->inBatch;
+    const bool dissolves = !kKeepBatch && !fOpen && buffer->inBatch;
+    const Names mems = kKeepBatch && isHeld ? Names{buffer->name()} : Names{};
+    std::string awaited = dissolves && releaseEvent() ? runtime().name(releaseEvent()) : "";
+    const int status = kKeepBatch ? fManager->DestroyBatchedSharedCLBuffer(buffer->record)
+                                  : fManager->DestroySharedCLBuffer(buffer->record);
+    require(status == (!kKeepBatch && isHeld ? CL_INVALID_VALUE : CL_SUCCESS), "the status");
     fBuffers.erase(fBuffers.begin() + (buffer - fBuffers.data()));
-    requireCommand("clEnqueueRelease", mems, fPending);
+    awaited += requireCommand("clEnqueueRelease", mems, fPending);
+    requireCount("clWaitForEvents([" + awaited + ']', awaited.empty() ? 0 : 1);
+    fDirty = fDirty || !kKeepBatch;
+    if (dissolves)
+        setInBatch(false);
     for (const std::string& mem : mems)
         fHeld.erase(mem);
 }
@@ -214,7 +238,8 @@ void Sequence::preEvaluate(unsigned)
     for (const Buffer& buffer : fBuffers)
         fHeld.insert(buffer.name());
     const std::string event = requireCommand("clEnqueueAcquire", fHeld, {});
-    requireAllInBatch();
+    requireWholeBatch();
+    require(!releaseEvent(), "no release since");
     if (fHeld.empty())
         return;
     fAcquireEvent = event;
@@ -230,7 +255,7 @@ void Sequence::acquire(unsigned choice)
     cl_event event = nullptr;
     fManager->EnqueueAcquireSharedCLBuffer(TopenCLInfo::theOne().openCLCommandQueue(),
                                            buffer->record, &event);
-    buffer->acquired = !buffer->record->fInBatch;
+    buffer->acquired = !buffer->inBatch;
     const Names mems = buffer->acquired ? Names{buffer->name()} : Names{};
     const std::string own = requireCommand("clEnqueueAcquire", mems, {});
     require(runtime().name(event) == (buffer->acquired ? own : fAcquireEvent), "the event");
@@ -266,14 +291,11 @@ void Sequence::postEvaluate(unsigned)
         return;
     fManager->PostEvaluate(em::Id(1));
     const std::string event = requireCommand("clEnqueueRelease", fHeld, fPending);
-    const cl_event slot = *fManager->EnqueueReleaseBatchedSharedCLBuffer(0, nullptr);
-    require(fHeld.empty() || event == runtime().name(slot), "the event at the address");
+    require(fHeld.empty() || event == runtime().name(releaseEvent()), "the event at the address");
     const bool graphicsWaits = fModes.batching && fModes.clToGraphics == 3;
-    const auto isWait = [](const auto& line) { return line.starts_with("glWaitSync"); };
-    require(std::ranges::count_if(fCalls, isWait) ==
-                (graphicsWaits ? std::ssize(fReleased) + (slot ? 1 : 0) : 0),
-            "one wait of the renderer for each release");
-    requireAllInBatch();
+    requireCount("glWaitSync",
+                 graphicsWaits ? std::ssize(fReleased) + (releaseEvent() ? 1 : 0) : 0);
+    requireWholeBatch();
     if (!fHeld.empty())
         fPending.clear();
     fHeld.clear();
@@ -291,10 +313,12 @@ void Sequence::renderingComplete(unsigned)
 
 void Sequence::checkReferences()
 {
-    for (const Buffer& buffer : fBuffers)
+    for (const Buffer& buffer : fBuffers) {
+        require(buffer.record->fInBatch == buffer.inBatch, "in the batch");
         require(runtime().references(Kind::kMem, buffer.record->fMem.get()) ==
-                    (buffer.record->fInBatch ? 2U : 1U),
+                    (buffer.inBatch ? 2U : 1U),
                 "one reference of the record and one of the batch");
+    }
     for (cl_event event : fEvents)
         require(runtime().references(Kind::kEvent, event) ==
                     1 + fPending.count(runtime().name(event)),

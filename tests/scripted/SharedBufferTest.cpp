@@ -1,10 +1,12 @@
-// The shared-buffer manager in unusual circumstances: odd results of creations, failures, the
-// host's window, timeouts, profiling, missing abilities, copies.
+// The shared-buffer manager: the exact calls of an evaluation, then unusual circumstances: odd
+// results of creations, failures, the host's window, timeouts, profiling, missing abilities,
+// copies.
 #include "ManagerTest.h"
 #include "host/GLFunctionTable.h"
 #include "interop/ProfilerScope.h"
 
 #include <cstddef>
+#include <future>
 
 using namespace scripted;
 
@@ -15,19 +17,119 @@ static_assert(offsetof(TopenCLSharedBuffer, fMem) == 0);
 
 using SharedBufferTest = ManagerTest;
 
-TEST_F(SharedBufferTest, AFailedCreationReturnsNullAndLeavesTheBatch)
+TEST_F(SharedBufferTest, AnEvaluationIsOneAcquireAndOneReleaseAfterAllReportedEvents)
+{
+    const auto* buffer = startWithBuffer(2, 3);
+    const TopenCLSharedBuffer* buffers[] = {buffer, create(), create()};
+    std::ranges::sort(buffers, {}, [](const auto* one) {
+        return reinterpret_cast<std::uintptr_t>(one->fMem.get());
+    });
+    Lines retains;
+    std::string list; // of the memory objects, in the order of their handles
+    for (const auto* one : buffers) {
+        retains.push_back("clRetainMemObject(" + runtime().name(one->fMem.get()) + ')');
+        list += (list.empty() ? "" : ", ") + runtime().name(one->fMem.get());
+    }
+    AutoCLObject<cl_event> reported; // event#1
+    reported.adopt(makeEvent());
+    manager().RenderingComplete();
+    calls();
+    manager().PreEvaluate(kId);
+    EXPECT_EQ(calls(), (Lines{retains[0], retains[1], retains[2], "resourceWindow()",
+                              "glClientWaitSync(sync#1, 1, 1000000000)", "glDeleteSync(sync#1)",
+                              "clEnqueueAcquireGLObjects(queue#1, [" + list + "], []) = event#2",
+                              "clRetainEvent(event#2)"}));
+
+    AutoCLObject<cl_event> acquired;
+    EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, acquired.receive()), 0);
+    const cl_event events[] = {reported.get(), acquired.get()};
+    const cl_event* slot = manager().EnqueueReleaseBatchedSharedCLBuffer(2, events);
+    EXPECT_EQ(manager().EnqueueReleaseBatchedSharedCLBuffer(3, nullptr), slot);
+    EXPECT_EQ(calls(), (Lines{"clRetainEvent(event#2)", "clRetainEvent(event#1)",
+                              "clRetainEvent(event#2)"}));
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(
+        calls(),
+        (Lines{"clEnqueueReleaseGLObjects(queue#1, [" + list +
+                   "], [event#2, event#1, event#2]) = event#3",
+               "clReleaseEvent(event#2)", "clReleaseEvent(event#1)", "clReleaseEvent(event#2)",
+               "glCreateSyncFromCLeventARB(context#1, event#3, 0) = sync#2",
+               "glWaitSync(sync#2, 0, 18446744073709551615)", "glDeleteSync(sync#2)"}));
+    EXPECT_EQ(runtime().name(*slot), "event#3");
+}
+
+TEST_F(SharedBufferTest, TheRendererWaitsForTheBatchAndThenForSingleReleasesInTheirOrder)
+{
+    startWithBuffer(1, 3);
+    manager().PreEvaluate(kId);
+    const TopenCLSharedBuffer* late[] = {create(), create()};
+    AutoCLObject<cl_event> released[2];
+    for (int i : {1, 0}) {
+        acquire(late[i]);
+        release(late[i], released[i].receive());
+    }
+    calls();
+    manager().PostEvaluate(kId);
+    EXPECT_EQ(callsOf("glCreateSync"),
+              (Lines{"glCreateSyncFromCLeventARB(context#1, event#4, 0) = sync#1",
+                     "glCreateSyncFromCLeventARB(context#1, event#2, 0) = sync#2",
+                     "glCreateSyncFromCLeventARB(context#1, event#3, 0) = sync#3"}));
+}
+
+TEST_F(SharedBufferTest, AFenceReplacesThePendingOneButNotOneThatIsWaitedFor)
+{
+    const auto* buffer = startWithBuffer(2, 1);
+    std::future<void> set;
+    host().duringFenceWait = [&] {
+        set = std::async(std::launch::async, [&] { manager().RenderingComplete(); });
+        EXPECT_EQ(set.wait_for(std::chrono::seconds(10)), std::future_status::ready)
+            << "setting a fence waited for a lock";
+    };
+    manager().RenderingComplete();
+    manager().RenderingComplete();
+    acquire(buffer);
+    release(buffer);
+    acquire(buffer);
+    EXPECT_EQ(callsOf("gl"),
+              (Lines{"glFenceSync(37143, 0) = sync#1", "glDeleteSync(sync#1)",
+                     "glFenceSync(37143, 0) = sync#2", "glFenceSync(37143, 0) = sync#3",
+                     "glClientWaitSync(sync#2, 1, 1000000000)", "glDeleteSync(sync#2)",
+                     "glClientWaitSync(sync#3, 1, 1000000000)", "glDeleteSync(sync#3)"}));
+}
+
+TEST_F(SharedBufferTest, DestructionReleasesEventsBeforeMemory)
+{
+    startWithBuffer(1, 1);
+    evaluate();
+    calls();
+    dropManager();
+    EXPECT_EQ(calls(), (Lines{"clReleaseEvent(event#2)", "clReleaseEvent(event#1)",
+                              "clReleaseMemObject(mem#1)", "clReleaseMemObject(mem#1)"}));
+}
+
+TEST_F(SharedBufferTest, CreationPassesItsArgumentsOnAndFailsWithoutARecord)
 {
     startWithBuffer(1, 1);
     evaluate();
     calls();
     runtime().plan({.function = "clCreateFromGLBuffer", .status = -60, .withHandle = true});
     EXPECT_EQ(create(-60), nullptr);
-    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 1, 7) = mem#2 ! -60",
-                              "clReleaseMemObject(mem#2)"}));
     runtime().scriptNextSharedMem(nullptr); // success without a handle
     EXPECT_EQ(create(), nullptr);
+    unsigned glBuffer = 70000;
+    int status = CL_SUCCESS;
+    const cl_mem_flags flags = CL_MEM_WRITE_ONLY | cl_mem_flags{1} << 40;
+    EXPECT_EQ(manager().CreateSharedCLBuffer(nullptr, flags, &glBuffer, &status), nullptr);
+    EXPECT_EQ(status, CL_INVALID_CONTEXT);
+    expectMisuse("clCreateFromGLBuffer: null");
     manager().PreEvaluate(kId);
-    EXPECT_EQ(callsOf("clRetainMemObject"), Lines{});
+    EXPECT_EQ(calls(), (Lines{"clCreateFromGLBuffer(context#1, 1, 7) = mem#2 ! -60",
+                              "clReleaseMemObject(mem#2)", "clCreateFromGLBuffer(context#1, 1, 7)",
+                              "clCreateFromGLBuffer(null, 1099511627778, 70000) ! -34",
+                              "clReleaseEvent(event#2)", "clReleaseEvent(event#1)",
+                              "clEnqueueAcquireGLObjects(queue#1, [mem#1], []) = event#3",
+                              "clRetainEvent(event#3)"}))
+        << "the batch is not rebuilt";
     manager().PostEvaluate(kId);
 }
 
@@ -35,27 +137,14 @@ TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
 {
     const auto* first = startWithBuffer(1, 1);
     evaluate();
-    ASSERT_TRUE(first->fInBatch);
     runtime().scriptNextSharedMem(first->fMem.get());
     EXPECT_EQ(create(), first);
     EXPECT_TRUE(first->fInBatch);
     EXPECT_EQ(runtime().references(Kind::kMem, first->fMem.get()), 2U) << "record and batch";
     calls();
     manager().PreEvaluate(kId);
-    EXPECT_EQ(callsOf("clRetainMemObject").size(), 1U) << "the batch is made anew";
+    EXPECT_EQ(callsOf("clRetainMemObject").size(), 1U) << "the batch is rebuilt";
     manager().PostEvaluate(kId);
-}
-
-TEST_F(SharedBufferTest, CreationPassesItsArgumentsOn)
-{
-    startIn(1, 1);
-    unsigned glBuffer = 70000;
-    int status = CL_SUCCESS;
-    const cl_mem_flags flags = CL_MEM_WRITE_ONLY | cl_mem_flags{1} << 40;
-    EXPECT_EQ(manager().CreateSharedCLBuffer(nullptr, flags, &glBuffer, &status), nullptr);
-    EXPECT_EQ(status, CL_INVALID_CONTEXT);
-    EXPECT_EQ(calls(), Lines{"clCreateFromGLBuffer(null, 1099511627778, 70000) ! -34"});
-    expectMisuse("clCreateFromGLBuffer: null");
 }
 
 // The first manager of the process alone says that nothing is batched.
@@ -140,7 +229,7 @@ TEST_F(SharedBufferTest, AnEvaluationWhoseReleaseFailedIsClosedAllTheSame)
     EXPECT_EQ(calls(), Lines{}) << "released but once";
 }
 
-TEST_F(SharedBufferTest, EveryIdOpensAnEvaluation)
+TEST_F(SharedBufferTest, EveryOtherIdOpensAnEvaluation)
 {
     startWithBuffer(1, 1);
     for (const unsigned value : {0U, 0xFFFDU, 0xFFFEU, 0xFFFFU}) {
@@ -152,21 +241,30 @@ TEST_F(SharedBufferTest, EveryIdOpensAnEvaluation)
         EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << value;
         manager().PostEvaluate(id);
     }
+    manager().PreEvaluate(kId);
+    manager().PreEvaluate(em::Id(8));
+    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 2U);
+    expectMisuse("clEnqueueAcquireGLObjects: already acquired");
+    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_GL_OBJECT"});
+    manager().PostEvaluate(kId);
 }
 
-TEST_F(SharedBufferTest, SingleCommandsPassWholeListsOn)
+TEST_F(SharedBufferTest, SingleCommandsPassWholeListsOnAndRefuseBuffersWithoutMemory)
 {
     startIn(1, 1);
+    const TopenCLSharedBuffer empty;
+    EXPECT_EQ(acquire(nullptr), CL_INVALID_ARG_VALUE);
+    EXPECT_EQ(acquire(&empty), CL_INVALID_ARG_VALUE);
+    EXPECT_EQ(calls(), Lines{});
     const TopenCLSharedBuffer* buffers[] = {create(), create()};
     const cl_mem mems[] = {buffers[0]->fMem.get(), buffers[1]->fMem.get()};
     const cl_command_queue queue = TopenCLInfo::theOne().secondaryOpenCLCommandQueue();
     AutoCLObject<cl_event> events[2];
-    calls();
     for (int i = 0; i < 2; ++i)
         manager().EnqueueAcquireSharedCLBuffer(queue, buffers[i], events[i].receive());
     const cl_event list[] = {events[0].get(), events[1].get()};
     EXPECT_EQ(manager().EnqueueReleaseSharedCLBuffer(queue, 2, mems, 2, list, nullptr), 0);
-    EXPECT_EQ(calls(),
+    EXPECT_EQ(callsOf("clEnqueue"),
               (Lines{"clEnqueueAcquireGLObjects(queue#2, [mem#1], []) = event#1",
                      "clEnqueueAcquireGLObjects(queue#2, [mem#2], []) = event#2",
                      "clEnqueueReleaseGLObjects(queue#2, [mem#1, mem#2], [event#1, event#2])"}));
@@ -182,7 +280,6 @@ TEST_F(SharedBufferTest, AReleaseThatFailsOrGivesNoEventIsNotWaitedFor)
         cl_event event = status == CL_SUCCESS ? nullptr : acquired.get();
         EXPECT_EQ(release(buffer, &event), status);
     }
-    calls();
     manager().PostEvaluate(kId);
     EXPECT_EQ(callsOf("gl"), Lines{});
 }
@@ -211,15 +308,6 @@ TEST_F(SharedBufferTest, TheProfilersScopesEncloseTheCommandsEvenIfThereAreNone)
                  "Releasing the quorview shared buffer from the OpenCl buffer manager");
 }
 
-TEST_F(SharedBufferTest, BuffersWithoutMemoryAreRefused)
-{
-    startIn(1, 1);
-    const TopenCLSharedBuffer empty;
-    EXPECT_EQ(acquire(nullptr), CL_INVALID_ARG_VALUE);
-    EXPECT_EQ(acquire(&empty), CL_INVALID_ARG_VALUE);
-    EXPECT_EQ(calls(), Lines{});
-}
-
 TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
 {
     startWithBuffer(1, 1);
@@ -234,7 +322,7 @@ TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
     EXPECT_EQ(runtime().takeMisuse().size(), 3U) << "retain, wait list, release";
 }
 
-TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
+TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesInTheHostsContext)
 {
     const auto* buffer = startWithBuffer(2, 1);
     const ResourceWindow window;
@@ -243,16 +331,12 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesOnceInTheHostsContext)
         runtime().scriptClientWaits({0x911B, 0x911B, last});
         calls();
         acquire(buffer);
-        const Lines waiting = calls();
-        EXPECT_EQ(waiting.size(), 7U);
-        EXPECT_EQ(waiting[0], "resourceWindow()");
-        EXPECT_EQ(waiting[1], "makeCurrent()");
-        EXPECT_THAT(waiting[4], ::testing::MatchesRegex("glClientWaitSync.*, 1, 1000000000."));
-        EXPECT_THAT(waiting[5], ::testing::StartsWith("glDeleteSync"));
+        using namespace ::testing;
+        const auto wait = MatchesRegex("glClientWaitSync.*, 1, 1000000000.");
+        EXPECT_THAT(calls(), ElementsAre("resourceWindow()", "makeCurrent()", wait, wait, wait,
+                                         StartsWith("glDeleteSync"), _));
         release(buffer);
     }
-    acquire(buffer);
-    EXPECT_EQ(callsOf("gl"), Lines{}) << "each fence is waited for once";
 }
 
 TEST_F(SharedBufferTest, PreEvaluateThatThrowsInTheFenceWaitOpensNothing)
@@ -288,43 +372,23 @@ TEST_F(SharedBufferTest, AFenceOutlastsATimeInWhichSyncObjectsCannotBeUsed)
     }
 }
 
-struct AbilityRow {
-    bool functionTable;
-    bool syncObjects;
-    bool syncFromEvents;
-    std::size_t fences;
-    std::size_t graphicsWaits;
-};
-
 TEST_F(SharedBufferTest, OnlyUsableFunctionsAreCalled)
 {
     startWithBuffer(2, 3); // chosen while everything was usable
-    for (const AbilityRow& row : {AbilityRow{false, false, false, 0, 0},
-                                  {true, false, true, 0, 0},
-                                  {true, true, false, 1, 0},
-                                  {true, true, true, 1, 1}}) {
-        removeFunctionTable();
-        if (row.functionTable)
-            installFunctionTable(row.syncObjects, row.syncFromEvents);
+    const auto expectUse = [this](std::size_t fences, std::size_t graphicsWaits) {
         manager().RenderingComplete();
-        EXPECT_EQ(callsOf("glFenceSync").size(), row.fences);
-        manager().PreEvaluate(kId);
-        EXPECT_EQ(callsOf("resourceWindow").size(), 1U);
-        manager().PostEvaluate(kId);
-        EXPECT_EQ(callsOf("glWaitSync").size(), row.graphicsWaits);
-    }
-}
-
-TEST_F(SharedBufferTest, AnotherEvaluationAcquiresOnceMore)
-{
-    startWithBuffer(1, 1);
-    manager().PreEvaluate(kId);
-    calls();
-    manager().PreEvaluate(em::Id(8));
-    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U);
-    expectMisuse("clEnqueueAcquireGLObjects: already acquired");
-    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_GL_OBJECT"});
-    manager().PostEvaluate(kId);
+        EXPECT_EQ(callsOf("glFenceSync").size(), fences);
+        evaluate();
+        EXPECT_EQ(callsOf("glWaitSync").size(), graphicsWaits);
+    };
+    removeFunctionTable();
+    expectUse(0, 0);
+    installFunctionTable(false, true);
+    expectUse(0, 0);
+    installFunctionTable(true, false);
+    expectUse(1, 0);
+    installFunctionTable(true, true);
+    expectUse(1, 1);
 }
 
 // How a copy is made.
