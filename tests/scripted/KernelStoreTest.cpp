@@ -84,22 +84,6 @@ TEST_F(KernelStoreTest, AHandleReturnedTwiceIsGivenBackTwice)
     }
 }
 
-TEST_F(KernelStoreTest, AHitCreatesAnotherKernelOfTheSameProgram)
-{
-    const Kernel first = fromText();
-    EXPECT_EQ(
-        calls(),
-        (Lines{std::string("clCreateProgramWithSource(context#1, 1, \"") + kSource +
-                   "\", null) = program#1",
-               "clBuildProgram(program#1, [device#1], \" -D SupportsDoublePrecision\")",
-               "clGetProgramBuildInfo(program#1, device#1, 4481)",
-               "clCreateKernel(program#1, \"skin\") = kernel#1", "clRetainKernel(kernel#1)"}));
-    const Kernel second = fromText();
-    EXPECT_EQ(calls(), (Lines{"clCreateKernel(program#1, \"skin\") = kernel#2",
-                              "clRetainKernel(kernel#2)"}));
-    EXPECT_NE(first.get(), second.get());
-}
-
 TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
 {
     constexpr const char* kLong = "-DA -D THE_SAME_ENDING";
@@ -139,7 +123,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#13, [device#1], \"-DA\")"});
 }
 
-TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
+TEST_F(KernelStoreTest, AHitCreatesAKernelAndTheLastKernelGivenBackDropsTheProgram)
 {
     const TstringArray folders = arrayOf({"a"});
     const auto inOtherWords = [&](const char* kernel) {
@@ -147,15 +131,20 @@ TEST_F(KernelStoreTest, TheLastKernelGivenBackDropsTheProgram)
     };
     const Kernel first = fromText("skin", " -I a");
     const Kernel second = inOtherWords("wave");
-    calls();
+    EXPECT_EQ(
+        calls(),
+        (Lines{std::string("clCreateProgramWithSource(context#1, 1, \"") + kSource +
+                   "\", null) = program#1",
+               "clBuildProgram(program#1, [device#1], \" -I a -D SupportsDoublePrecision\")",
+               "clGetProgramBuildInfo(program#1, device#1, 4481)",
+               "clCreateKernel(program#1, \"skin\") = kernel#1", "clRetainKernel(kernel#1)",
+               "clCreateKernel(program#1, \"wave\") = kernel#2", "clRetainKernel(kernel#2)"}));
     EXPECT_TRUE(fStore->freeKernel(first));
-    EXPECT_EQ(calls(), Lines{"clReleaseKernel(kernel#1)"});
     EXPECT_FALSE(fStore->freeKernel(first));
     EXPECT_TRUE(fStore->freeKernel(Kernel()));
-    EXPECT_EQ(calls(), Lines{});
     EXPECT_TRUE(fStore->freeKernel(second));
-    EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#2)", "clReleaseProgram(program#1)"}));
-    EXPECT_EQ(runtime().references(Kind::kKernel, first.get()), 1U) << "the caller's own";
+    EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#1)", "clReleaseKernel(kernel#2)",
+                              "clReleaseProgram(program#1)"}));
     // The program is forgotten in all words, whichever it is asked for in next.
     for (const bool other : {true, false, true}) {
         const Kernel kernel = other ? inOtherWords("skin") : fromText("skin", " -I a");
@@ -181,17 +170,12 @@ TEST_F(KernelStoreTest, KernelsComeBackInAnyOrder)
     }
 }
 
-TEST_F(KernelStoreTest, AStoreThatGoesLeavesHandedOutKernels)
+TEST_F(KernelStoreTest, AStoreThatGoesReleasesItsProgramLast)
 {
     const Kernel kernel = fromText();
-    fromText("wave");
     calls();
     fStore.reset();
-    const Lines lines = calls();
-    EXPECT_THAT(lines, ::testing::UnorderedElementsAre("clReleaseKernel(kernel#1)",
-                                                       "clReleaseKernel(kernel#2)",
-                                                       "clReleaseProgram(program#1)"));
-    EXPECT_EQ(lines.back(), "clReleaseProgram(program#1)");
+    EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#1)", "clReleaseProgram(program#1)"}));
     EXPECT_EQ(runtime().references(Kind::kKernel, kernel.get()), 1U);
 }
 
@@ -221,45 +205,43 @@ TEST_F(KernelStoreTest, AHandleCountsWhateverTheStatus)
     }
 }
 
-TEST_F(KernelStoreTest, AFailedBuildIsReportedWithItsLogAndForgotten)
-{
-    runtime().plan({.function = "clReleaseProgram"}); // of which nobody hears
-    for (int attempt = 0; attempt < 2; ++attempt) {
-        EXPECT_EQ(fStore->getKernelFromString("#error", "bad", "", "skin", nullptr).get(), nullptr);
-        EXPECT_EQ(warnings(), (Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE", world.buildLog}));
-        EXPECT_EQ(builds(), 1U);
-    }
-}
-
-TEST_F(KernelStoreTest, ALogThatCannotBeReadIsNotQuoted)
-{
-    for (const unsigned query : {2U, 3U}) { // its size, its text
-        runtime().clearFaults();
-        runtime().plan({.function = "clGetProgramBuildInfo", .nth = query});
-        fStore->getKernelFromString("#error", "bad", "", "skin", nullptr);
-        EXPECT_EQ(warnings(), (Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE",
-                                     "OpenCL error: CL_OUT_OF_RESOURCES"}));
-    }
-}
-
-// Some runtimes answer with an empty text, some with no text at all.
-class SilentCompilerTest : public KernelStoreTest, public ::testing::WithParamInterface<bool> {
+struct LogRow : Named {
+    const char* log;
+    bool unanswered = false; // not even an empty text
+    unsigned fails = 0;      // the query that fails, or 0
+};
+class FailedBuild : public KernelStoreTest, public ::testing::WithParamInterface<LogRow> {
 protected:
     void SetUp() override
     {
-        world.buildLog = "";
-        if (GetParam())
+        world.buildLog = GetParam().log;
+        if (GetParam().unanswered)
             world.emptyAnswers = {CL_PROGRAM_BUILD_LOG};
         KernelStoreTest::SetUp();
     }
 };
 
-TEST_P(SilentCompilerTest, IsNotQuoted)
+TEST_P(FailedBuild, IsReportedWithItsLogAndForgotten)
 {
-    fStore->getKernelFromString("#error", "bad", "", "skin", nullptr);
-    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE"});
+    runtime().plan({.function = "clReleaseProgram"}); // of which nobody hears
+    for (const unsigned fails : {GetParam().fails, 0U}) {
+        runtime().plan({.function = "clGetProgramBuildInfo", .nth = fails});
+        EXPECT_EQ(fStore->getKernelFromString("#error", "bad", "", "skin", nullptr).get(), nullptr);
+        Lines expected{"OpenCL error: CL_BUILD_PROGRAM_FAILURE"};
+        if (fails > 0)
+            expected.push_back("OpenCL error: CL_OUT_OF_RESOURCES");
+        else if (*GetParam().log)
+            expected.push_back(GetParam().log);
+        EXPECT_EQ(warnings(), expected);
+        EXPECT_EQ(builds(), 1U);
+    }
 }
-INSTANTIATE_TEST_SUITE_P(KernelStore, SilentCompilerTest, ::testing::Bool());
+INSTANTIATE_TEST_SUITE_P(KernelStore, FailedBuild,
+                         ::testing::Values(LogRow{"Log", "line 1: 100%s wrong"},
+                                           LogRow{"LogSizeFails", "line 1", false, 2},
+                                           LogRow{"LogTextFails", "line 1", false, 3},
+                                           LogRow{"EmptyLog", ""}, LogRow{"NoLog", "", true}),
+                         ::testing::PrintToStringParamName());
 
 TEST_F(KernelStoreTest, ABuildThatOnlyReportsFailureCounts)
 {
@@ -272,28 +254,25 @@ TEST_F(KernelStoreTest, ABuildThatOnlyReportsFailureCounts)
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
 }
 
-TEST_F(KernelStoreTest, BeforeInitializeThereIsNoKernel)
+TEST_F(KernelStoreTest, InitializingWithoutAContextChangesNothing)
 {
+    const cl_device_id device = TopenCLInfo::theOne().openCLDevice();
+    fStore->initialize(nullptr, nullptr, kNVIDIAProvider);
+    fromText("skin", "-DA");
+    EXPECT_EQ(callsOf("clBuildProgram"),
+              Lines{"clBuildProgram(program#1, [device#1], \"-DA -D SupportsDoublePrecision\")"});
     fStore = std::make_unique<TopenCLKernelStore>();
-    fStore->initialize(nullptr, TopenCLInfo::theOne().openCLDevice(), kNVIDIAProvider);
+    fStore->initialize(nullptr, device, kNVIDIAProvider);
     EXPECT_EQ(fromText().get(), nullptr);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_CONTEXT"});
     expectMisuse("clCreateProgramWithSource: null");
-}
-
-TEST_F(KernelStoreTest, InitializingWithoutAContextChangesNothing)
-{
-    fStore->initialize(nullptr, nullptr, kNVIDIAProvider);
-    const Kernel kernel = fromText("skin", "-DA");
-    EXPECT_EQ(callsOf("clBuildProgram"),
-              Lines{"clBuildProgram(program#1, [device#1], \"-DA -D SupportsDoublePrecision\")"});
 }
 
 TEST_F(KernelStoreTest, TheVendorsOwnFlagIsNoPartOfTheKey)
 {
     const TopenCLInfo& info = TopenCLInfo::theOne();
     const TstringArray folders = arrayOf({"a"});
-    const Kernel kernel = fromText("skin", " -I a");
+    fromText("skin", " -I a");
     fStore->initialize(info.openCLContext(), info.openCLDevice(), kNVIDIAProvider);
     fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // in other words
     EXPECT_EQ(builds(), 1U);
@@ -307,24 +286,24 @@ TEST_F(KernelStoreTest, UnreadableFilesGiveNoKernelAndNoWord)
     for (const char* path : {"no/such/file.cl", empty.c_str(), directory.c_str(), withoutEnd})
         EXPECT_EQ(fStore->getKernel(path, "", "skin", nullptr).get(), nullptr) << path;
     EXPECT_EQ(calls(), Lines{});
-    file(kSource); // it is there now, and read again
+    file("skin"); // it is there now, and read again
     EXPECT_NE(fStore->getKernel(empty.c_str(), "", "skin", nullptr).get(), nullptr);
+    EXPECT_EQ(callsOf("clCreateProgram"),
+              Lines{"clCreateProgramWithSource(context#1, 1, \"skin\", null) = program#1"});
 }
 
-TEST_F(KernelStoreTest, SourcesAreReadUnchangedBehindThePreamble)
+TEST_F(KernelStoreTest, SourcesAreReadUnchangedAfterThePreamble)
 {
     Tstring source("before");
     ASSERT_TRUE(TopenCLInfo::oclLoadProgSource(source, file("a\r\nb\n\x1A"), "#"));
     EXPECT_EQ(std::string(source.asChar(), source.length()), "#a\r\nb\n\x1A");
-    EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, "no/such/file.cl", "#"));
-    EXPECT_EQ(source.length(), 0U);
     constexpr std::uintmax_t kTooLarge = std::uintmax_t{1} << 31; // a sparse file
-    std::filesystem::resize_file(file("#"), kTooLarge);
-    EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, fFile.c_str(), "#"));
-    EXPECT_EQ(source.length(), 0U);
-    fStore->getKernel(file("skin"), "", "skin", nullptr);
-    EXPECT_EQ(callsOf("clCreateProgram"),
-              Lines{"clCreateProgramWithSource(context#1, 1, \"skin\", null) = program#1"});
+    std::filesystem::resize_file(fFile, kTooLarge);
+    for (const char* path : {fFile.c_str(), "no/such/file.cl"}) {
+        EXPECT_FALSE(TopenCLInfo::oclLoadProgSource(source, path, "#"));
+        EXPECT_EQ(source.length(), 0U);
+        source = Tstring("before");
+    }
 }
 
 TEST_F(KernelStoreTest, TheResourceDirectoryIsAskedForOnce)
@@ -335,40 +314,35 @@ TEST_F(KernelStoreTest, TheResourceDirectoryIsAskedForOnce)
     EXPECT_EQ(calls(), Lines{"getResourcesLocation()"});
 }
 
-struct OptionsRow {
-    const char* flags; // may be null
-    std::vector<const char*> directories;
-    bool doublePrecision;
-    OpenCLProvider provider;
-    std::string options;
-};
-
 TEST_F(KernelStoreTest, BuildOptionsReachTheCompilerToTheCharacter)
 {
     const std::string standard = "-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror";
-    const OptionsRow rows[] = {
-        {nullptr, {}, false, kIntelProvider, standard},
-        {"", {}, false, kIntelProvider, ""},
-        {"-DFOO", {"inc"}, false, kIntelProvider, "-DFOO -I inc"},
-        {"", {" ab ", " a b "}, false, kIntelProvider, " -I ab -I \"a b\""},
-        {"", {"\ta\tb\t"}, false, kIntelProvider, " -I \ta\tb\t"},
-        {"", {"a \"b\"", "\"", "", "  "}, false, kIntelProvider, " -I \"a \"b\"\" -I \" -I  -I "},
-        {"", {}, false, kNVIDIAProvider, " -cl-nv-verbose"},
-        {"", {}, false, kAMDProvider, ""},
-        {"", {}, false, kAppleProvider, ""},
-        {"", {}, false, kUnknownProvider, ""},
-        {nullptr,
-         {"C:/res", " C:/My Res "},
-         true,
-         kNVIDIAProvider,
-         standard + " -I C:/res -I \"C:/My Res\" -D SupportsDoublePrecision -cl-nv-verbose"}};
-    for (const OptionsRow& row : rows) {
-        TopenCLInfo::theOne().setAllowDoublePrecisionSupport(row.doublePrecision);
-        makeStore(row.provider);
-        const TstringArray directories = arrayOf(row.directories);
-        fStore->getKernelFromString(kSource, "name", row.flags, "skin", &directories);
-        EXPECT_THAT(callsOf("clBuildProgram"),
-                    ::testing::ElementsAre(::testing::EndsWith(", \"" + row.options + "\")")));
+    const struct {
+        OpenCLProvider provider;
+        const char* flags;
+        std::vector<const char*> directories;
+        std::string options;
+    } rows[] = {{kIntelProvider, nullptr, {}, standard},
+                {kIntelProvider, "-DFOO", {"inc"}, "-DFOO -I inc"},
+                {kIntelProvider, "", {" ab ", " a b "}, " -I ab -I \"a b\""},
+                {kIntelProvider, "", {"\ta\tb\t"}, " -I \ta\tb\t"},
+                {kIntelProvider, "", {"a \"b\"", "\"", "", "  "}, " -I \"a \"b\"\" -I \" -I  -I "},
+                {kNVIDIAProvider, nullptr, {" C:/My Res "}, standard + " -I \"C:/My Res\""},
+                {kAMDProvider, "", {}, ""},
+                {kAppleProvider, "", {}, ""},
+                {kUnknownProvider, "", {}, ""}};
+    for (const auto& [provider, flags, list, options] : rows) {
+        for (const bool doublePrecision : {true, false}) {
+            TopenCLInfo::theOne().setAllowDoublePrecisionSupport(doublePrecision);
+            makeStore(provider);
+            const TstringArray directories = arrayOf(list);
+            fStore->getKernelFromString(kSource, "name", flags, "skin", &directories);
+            EXPECT_THAT(
+                callsOf("clBuildProgram"),
+                ::testing::ElementsAre(::testing::EndsWith(
+                    ", \"" + options + (doublePrecision ? " -D SupportsDoublePrecision" : "") +
+                    (provider == kNVIDIAProvider ? " -cl-nv-verbose" : "") + "\")")));
+        }
     }
 }
 
