@@ -107,7 +107,7 @@ run_tests() {
 
 # A display, a GPU to draw with, and an OpenCL runtime that is not the CPU's.
 has_display_and_gpu() {
-    [[ -n ${DISPLAY:-} ]] && compgen -G '/dev/dri/renderD*' >/dev/null &&
+    [[ -n ${DISPLAY:-}${WAYLAND_DISPLAY:-} ]] && compgen -G '/dev/dri/renderD*' >/dev/null &&
         compgen -G '/etc/OpenCL/vendors/*.icd' | grep -qv pocl
 }
 
