@@ -348,15 +348,18 @@ Failure failure(const std::string& file, const std::string& text)
     return {ExitCode::kModel, "the model '" + file + "' " + text};
 }
 
-// Assimp's reason on one line.
+// Assimp's reason on one line. It may quote all that is left of the file.
 std::string reasonOf(const Assimp::Importer& importer)
 {
+    constexpr std::size_t kLongestReason = 200;
     std::string reason = importer.GetErrorString();
     std::replace_if(
         reason.begin(), reason.end(), [](unsigned char letter) { return std::iscntrl(letter); },
         ' ');
     while (!reason.empty() && (reason.back() == ' ' || reason.back() == '.'))
         reason.pop_back();
+    if (reason.size() > kLongestReason)
+        reason = reason.substr(0, kLongestReason) + " ...";
     return reason.empty() ? "Assimp names no reason" : reason;
 }
 

@@ -13,9 +13,13 @@ std::FILE* takeStandardOutput();
 // and prevents a core file when it crashes.
 void limitResources();
 
+// Returns whether the process cannot get even a little memory.
+bool memoryIsShort();
+
 // Makes a crash that follows from a lack of memory, mostly in a driver that does not expect it, end
 // the process with this text on standard error and this exit code. Other crashes stay what they
-// are. `text` is a constant.
+// are. `text` is a constant. Compilers of drivers replace the handlers: call it again after they
+// ran.
 void reportCrashWithoutMemory(const char* text, int exitCode);
 
 } // namespace viewer

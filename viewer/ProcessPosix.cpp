@@ -26,14 +26,11 @@ int crashExitCode = 0;
 // Calls only what is safe in a signal handler.
 void endIfMemoryRanOut(int signal)
 {
-    void* memory =
-        mmap(nullptr, kLittleMemory, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-    if (memory == MAP_FAILED) {
+    if (memoryIsShort()) {
         [[maybe_unused]] const ssize_t written =
             write(STDERR_FILENO, crashText, std::strlen(crashText));
         _exit(crashExitCode);
     }
-    munmap(memory, kLittleMemory);
     std::signal(signal, SIG_DFL);
     raise(signal);
 }
@@ -55,6 +52,16 @@ std::FILE* takeStandardOutput()
     if (output < 0 || dup2(STDERR_FILENO, STDOUT_FILENO) < 0)
         return nullptr;
     return fdopen(output, "wb");
+}
+
+bool memoryIsShort()
+{
+    void* memory =
+        mmap(nullptr, kLittleMemory, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (memory == MAP_FAILED)
+        return true;
+    munmap(memory, kLittleMemory);
+    return false;
 }
 
 void reportCrashWithoutMemory(const char* text, int exitCode)

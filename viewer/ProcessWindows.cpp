@@ -17,6 +17,11 @@ std::FILE* takeStandardOutput()
 // Windows refuses memory beyond what it can provide, and writes no core files.
 void limitResources() {}
 
+bool memoryIsShort()
+{
+    return false;
+}
+
 // Nothing is known of drivers that crash there.
 void reportCrashWithoutMemory(const char*, int) {}
 

@@ -54,6 +54,10 @@ Status statusOf(const vyra::Status& status)
 {
     if (status.ok())
         return {};
+    if (status.openCL == CL_OUT_OF_HOST_MEMORY || status.openCL == CL_MEM_OBJECT_ALLOCATION_FAILURE)
+        return Failure{ExitCode::kOutOfMemory,
+                       status.message +
+                           "; use a smaller crowd or model, or allow the process more"};
     return Failure{ExitCode::kOpenCLError, status.message};
 }
 

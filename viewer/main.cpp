@@ -54,21 +54,33 @@ void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QS
     std::_Exit(code);
 }
 
-// Memory may run out on any thread and in any callback, where nobody catches the exception.
 [[noreturn]] void endWithoutMemory()
+{
+    std::fputs(kOutOfMemory, stderr);
+    std::_Exit(static_cast<int>(ExitCode::kOutOfMemory));
+}
+
+// Memory may run out on any thread and in any callback, where nothing catches the exception.
+[[noreturn]] void endAfterException()
 {
     try {
         if (const std::exception_ptr exception = std::current_exception())
             std::rethrow_exception(exception);
     } catch (const std::bad_alloc&) {
-        std::fputs(kOutOfMemory, stderr);
-        std::_Exit(static_cast<int>(ExitCode::kOutOfMemory));
+        endWithoutMemory();
     } catch (const std::exception& error) {
+        if (viewer::memoryIsShort()) // oneTBB throws other exceptions if a thread gets no stack
+            endWithoutMemory();
         std::fprintf(stderr, "vyra-viewer: ended by an error: %s\n", error.what());
     } catch (...) {
         std::fputs("vyra-viewer: ended by an unknown error\n", stderr);
     }
     std::abort();
+}
+
+void reportCrashes()
+{
+    viewer::reportCrashWithoutMemory(kOutOfMemory, static_cast<int>(ExitCode::kOutOfMemory));
 }
 
 QSurfaceFormat surfaceFormat(bool waitForDisplay)
@@ -115,6 +127,7 @@ Status run(const Options& options, bool& verified)
     Session session(options, window);
     if (Status failure = session.start(options.size))
         return failure;
+    reportCrashes(); // LLVM, which compiled kernels and shaders meanwhile, handles SIGABRT, too
 
     Status failure = options.frames ? renderFrames(session, window, *options.frames)
                                     : playInWindow(session, window);
@@ -157,8 +170,8 @@ int main(int argc, char* argv[])
 {
     if (viewer::isImportChild(argc, argv))
         return viewer::runImportChild(argv);
-    std::set_terminate(endWithoutMemory);
-    viewer::reportCrashWithoutMemory(kOutOfMemory, static_cast<int>(ExitCode::kOutOfMemory));
+    std::set_terminate(endAfterException);
+    reportCrashes();
     viewer::Result<Options> options = viewer::parseOptions(argumentsOf(argc, argv));
     if (!options)
         return tell(options.failure());

@@ -140,6 +140,8 @@ TEST(ModelImport, UselessFileIsRefusedWithItsReason)
 {
     const ModelFolder folder;
     std::filesystem::create_symlink("loop.obj", folder.path("loop.obj"));
+    const std::string longWord =
+        "solid a\nfacet normal 0 0 1\nouter loop\nvertex " + std::string(9999, 'x');
     const std::tuple<const char*, const char*, const char*> rows[] = {
         {"comment.obj", "# nothing\n", "cannot be read (OBJ"},
         {"points.obj", "v 0 0 0\nv 1 0 0\np 1\np 2\n", "no meshes"},
@@ -148,6 +150,7 @@ TEST(ModelImport, UselessFileIsRefusedWithItsReason)
         {"nan.obj", "v 0 0 0\nv 1 nan 0\nv 0 1 0\nf 1 2 3\n",
          "vertex 1 of the mesh 'defaultobject' is at (1, nan, 0)"},
         {"point.obj", "v 1 1 1\nv 1 1 1\nv 1 1 1\nf 1 2 3\n", "no triangle with an area"},
+        {"long.stl", longWord.c_str(), "xxx ...); it may be truncated"},
         {"empty.obj", "", "is empty"},
         {"missing.obj", nullptr, "there is no model file"},
         {"", nullptr, "is a directory"},
