@@ -69,7 +69,7 @@ read_ctest_arguments() {
     local known argument option='' values paths='^(-O|--output-log|--output-junit|--resource-spec-file)$'
     command -v ctest >/dev/null || install_packages
     known=$(ctest --help)
-    values=$(grep -oE -- '(^|[ ,])-[A-Za-z-]+ [<[]' <<<"$known" | tr -d ' ,<[')
+    values=$(grep -oE -- '(^|[ ,])-[A-Za-z-]+ <' <<<"$known" | tr -d ' ,<')
     ctest_arguments=()
     for argument in "$@"; do
         if [[ $option =~ $paths ]]; then
@@ -87,6 +87,7 @@ read_ctest_arguments() {
         fi
         ctest_arguments+=("$argument")
     done
+    if [[ -n $option ]] && grep -qxFe "$option" <<<"$values"; then fail "$option needs a value" 2; fi
 }
 
 # Runs the tests of a preset with `ctest_arguments`, in an environment that the arguments make. Tests

@@ -21,10 +21,12 @@ TOOLS = ["apt-get", "clang-format", "cmake", "dpkg-query", "doxygen", "ninja", "
 
 # Each is refused before anything is installed or built.
 WRONG_USE = [
-    ("abi", "--bogus"), ("bench", "--bogus"), ("check", "--bogus"), ("check", "tests", "bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
+    ("abi", "--bogus"), ("bench", "--bogus"), ("bench", "--against", "bogus"), ("check", "--bogus"),
+    ("check", "tests", "bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
     ("docs", "one", "two"), ("format", "--bogus"), ("gpu-check", "--bogus"), ("package", "--bogus"),
-    ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "KernelStore"),
-    ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"), ("trace-picture", "--bogus", "a", "b"),
+    ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "--fuzz", "--bogus"),
+    ("test", "KernelStore"), ("test", "-R"), ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"),
+    ("test-windows", "-j"), ("tidy", "--bogus", "build"), ("tidy", "bogus"), ("trace-picture", "--bogus", "a", "b"),
 ]
 
 
