@@ -4,9 +4,12 @@
 #include "evaluator/SkinDeformer.h"
 #include "evaluator/SmoothDeformer.h"
 #include "evaluator/TwistDeformer.h"
+#include "evaluator/VectorMath.h"
 #include "evaluator/WaveDeformer.h"
 
 #include <cmath>
+
+#include <gtest/gtest.h>
 
 namespace {
 
@@ -76,7 +79,7 @@ std::unique_ptr<MorphDeformer> morph(const MeshGeometry& geometry, unsigned targ
             const float x = t == 1 ? NAN : std::sin(static_cast<float>(t + 1) * p.x);
             list[t].positionDeltas.push_back({x, p.y, p.z * x});
             if (withNormals && t % 3 == 0)
-                list[t].normalDeltas.push_back({0, x, p.z});
+                list[t].normalDeltas.push_back({p.y, x, p.z});
         }
     }
     auto result = std::make_unique<MorphDeformer>(MorphTargets(list));
@@ -114,6 +117,13 @@ const std::vector<DeformerCase>& deformerCases()
         {"smoothOnce", [](Mesh m) { return smooth(m, 1); }, false},
         {"smoothSevenTimes", [](Mesh m) { return smooth(m, 7); }, false}};
     return cases;
+}
+
+void expectNear(const Vector3& actual, const Vector3& expected)
+{
+    EXPECT_LT(length(wide(actual) - wide(expected)), kTolerance)
+        << actual.x << ' ' << actual.y << ' ' << actual.z << ", expected " << expected.x << ' '
+        << expected.y << ' ' << expected.z;
 }
 
 MeshGeometry makeSheet(unsigned side)

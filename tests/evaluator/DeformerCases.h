@@ -26,6 +26,10 @@ inline constexpr unsigned kProbes = 6;
 
 const std::vector<DeformerCase>& deformerCases();
 
+constexpr double kTolerance = 1e-6;
+
+void expectNear(const vyra::Vector3& actual, const vyra::Vector3& expected);
+
 // A wavy sheet with `side` vertices along each edge. The last vertex has no triangle, and the first
 // has two that cancel.
 vyra::MeshGeometry makeSheet(unsigned side);

@@ -1,5 +1,10 @@
 // The kernels of the deformers on an OpenCL runtime, compared with their CPU sides and with the
 // bounds of their errors.
+#define CL_HPP_ENABLE_EXCEPTIONS
+#define CL_HPP_MINIMUM_OPENCL_VERSION 120
+#define CL_HPP_TARGET_OPENCL_VERSION 120
+#include <CL/opencl.hpp>
+
 #include "DeformerCases.h"
 #include "evaluator/SkinDeformer.h"
 #include "evaluator/VectorMath.h"
@@ -8,11 +13,8 @@
 #include <bit>
 #include <cmath>
 #include <fstream>
-#include <iterator>
 #include <map>
-#include <memory>
 #include <string>
-#include <type_traits>
 #include <utility>
 
 #include <gtest/gtest.h>
@@ -25,147 +27,105 @@ constexpr std::size_t kWorkGroup = 74;
 constexpr double kHalfUnit = 0x1p-24; // of the last place of a float, relative
 const std::string kKernels = VYRA_EVALUATOR_KERNELS;
 
-// Own references. The library's holders need the library's runtime.
-using Memory = std::shared_ptr<std::remove_pointer_t<cl_mem>>;
-using Program = std::shared_ptr<std::remove_pointer_t<cl_program>>;
-using Kernel = std::shared_ptr<std::remove_pointer_t<cl_kernel>>;
-
-// Runs kernels on the first OpenCL device, without the evaluator. A failing call fails the test.
-class Device {
-public:
-    // False if there is no device.
-    bool open()
-    {
-        cl_platform_id platform = nullptr;
-        if (clGetPlatformIDs(1, &platform, nullptr) != CL_SUCCESS ||
-            clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 1, &fDevice, nullptr) != CL_SUCCESS)
-            return false;
-        fContext = clCreateContext(nullptr, 1, &fDevice, nullptr, nullptr, nullptr);
-        fQueue = clCreateCommandQueue(fContext, fDevice, 0, nullptr);
-        return fQueue != nullptr;
-    }
-
-    ~Device()
-    {
-        fPrograms.clear();
-        if (fQueue)
-            clReleaseCommandQueue(fQueue);
-        if (fContext)
-            clReleaseContext(fContext);
-    }
-
-    bool supportsDouble() const
-    {
-        cl_device_fp_config config = 0;
-        clGetDeviceInfo(fDevice, CL_DEVICE_DOUBLE_FP_CONFIG, sizeof(config), &config, nullptr);
-        return config != 0;
-    }
-
-    Kernel kernel(const std::string& path, const std::string& function, const std::string& options)
-    {
-        Program& program = fPrograms[path + options];
-        if (!program)
-            program = build(path, options);
-        return {clCreateKernel(program.get(), function.c_str(), nullptr), clReleaseKernel};
-    }
-
-    template <typename T>
-    Memory memory(std::span<const T> values)
-    {
-        return {clCreateBuffer(fContext, CL_MEM_COPY_HOST_PTR, values.size_bytes(),
-                               const_cast<T*>(values.data()), nullptr),
-                clReleaseMemObject};
-    }
-
-    void run(cl_kernel kernel, std::size_t count)
-    {
-        const std::size_t global = (count + kWorkGroup - 1) / kWorkGroup * kWorkGroup;
-        EXPECT_EQ(clEnqueueNDRangeKernel(fQueue, kernel, 1, nullptr, &global, &kWorkGroup, 0,
-                                         nullptr, nullptr),
-                  CL_SUCCESS);
-    }
-
-    template <typename T>
-    void read(cl_mem memory, std::vector<T>& values)
-    {
-        EXPECT_EQ(clEnqueueReadBuffer(fQueue, memory, CL_TRUE, 0, values.size() * sizeof(T),
-                                      values.data(), 0, nullptr, nullptr),
-                  CL_SUCCESS);
-    }
-
-private:
-    Program build(const std::string& path, const std::string& options)
-    {
-        std::ifstream file(path);
-        const std::string source(std::istreambuf_iterator<char>(file), {});
-        const char* text = source.c_str();
-        const Program program(clCreateProgramWithSource(fContext, 1, &text, nullptr, nullptr),
-                              clReleaseProgram);
-        const std::string flags = "-cl-no-signed-zeros -Werror -I " + kKernels + " " + options;
-        const cl_int status =
-            clBuildProgram(program.get(), 1, &fDevice, flags.c_str(), nullptr, nullptr);
-        char log[4096] = "";
-        clGetProgramBuildInfo(program.get(), fDevice, CL_PROGRAM_BUILD_LOG, sizeof(log), log,
-                              nullptr);
-        EXPECT_EQ(status, CL_SUCCESS) << path << ' ' << log;
-        return program;
-    }
-
-    cl_device_id fDevice = nullptr;
-    cl_context fContext = nullptr;
-    cl_command_queue fQueue = nullptr;
-    std::map<std::string, Program> fPrograms; // by path and options
-};
-
+// Sets the arguments of a kernel, which keeps their memory.
 class Arguments final : public KernelArguments {
 public:
-    Arguments(Device& device, cl_kernel kernel) : fDevice(device), fKernel(kernel) {}
-
-    void constant(const ConstantArray& array) override
+    Arguments(const cl::Context& context, cl::Kernel& kernel) : fContext(context), fKernel(kernel)
     {
-        Memory memory;
-        if (array.sizeInBytes())
-            memory = fDevice.memory(array.values<char>());
-        add(memory);
     }
-    void add(const Memory& memory)
+
+    void add(const cl::Buffer& memory)
     {
         fMemory.push_back(memory);
-        KernelArguments::value(memory.get());
+        fKernel.setArg(fIndex++, memory);
+    }
+    void add(const void* bytes, std::size_t size)
+    {
+        add(cl::Buffer(fContext, CL_MEM_COPY_HOST_PTR, size, const_cast<void*>(bytes)));
+    }
+    void constant(const ConstantArray& array) override
+    {
+        if (array.sizeInBytes())
+            add(array.values<char>().data(), array.sizeInBytes());
+        else
+            add(cl::Buffer());
     }
 
 private:
     void setValue(const void* value, std::size_t sizeInBytes) override
     {
-        EXPECT_EQ(clSetKernelArg(fKernel, fIndex++, sizeInBytes, value), CL_SUCCESS);
+        fKernel.setArg(fIndex++, sizeInBytes, value);
     }
     // After numbers of another deformer.
     void setFrame(const void* bytes, std::size_t sizeInBytes) override
     {
-        const auto* begin = static_cast<const char*>(bytes);
-        std::vector<char> all(3 * sizeof(cl_float4), 0x7f);
-        all.insert(all.end(), begin, begin + sizeInBytes);
-        add(fDevice.memory(std::span<const char>(all)));
-        KernelArguments::value(cl_uint{3});
+        std::string all(3 * sizeof(cl_float4), 0x7f);
+        all.append(static_cast<const char*>(bytes), sizeInBytes);
+        add(all.data(), all.size());
+        value(cl_uint{3});
     }
 
-    Device& fDevice;
-    cl_kernel fKernel;
+    const cl::Context& fContext;
+    cl::Kernel& fKernel;
     cl_uint fIndex = 0;
-    std::vector<Memory> fMemory;
+    std::vector<cl::Buffer> fMemory;
 };
 
+// Runs kernels on the first OpenCL device, without the evaluator. A call that fails throws.
 class DeformerKernels : public testing::Test {
 protected:
     void SetUp() override
     {
-        if (!fDevice.open())
+        std::vector<cl::Platform> platforms;
+        std::vector<cl::Device> devices;
+        try {
+            cl::Platform::get(&platforms);
+            platforms.at(0).getDevices(CL_DEVICE_TYPE_ALL, &devices);
+        } catch (const cl::Error&) {
             GTEST_SKIP() << "no OpenCL device";
+        }
+        fDevice = devices.at(0);
+        fContext = cl::Context(fDevice);
+        fQueue = cl::CommandQueue(fContext, fDevice);
     }
 
     bool canRun(const Deformer& deformer) const
     {
-        return fDevice.supportsDouble() || deformer.kernel(0).options.empty();
+        return fDevice.getInfo<CL_DEVICE_DOUBLE_FP_CONFIG>() != 0 ||
+               deformer.kernel(0).options.empty();
+    }
+
+    cl::Kernel kernel(const std::string& path, std::string_view function, std::string_view options)
+    {
+        cl::Program& program = fPrograms[path.c_str() + std::string(options)];
+        if (!program()) {
+            std::ifstream file(path);
+            program = cl::Program(fContext, std::string(std::istreambuf_iterator<char>(file), {}));
+            try {
+                program.build(
+                    ("-cl-no-signed-zeros -Werror -I " + kKernels + " ").append(options).c_str());
+            } catch (const cl::BuildError& error) {
+                ADD_FAILURE() << path << ' ' << error.getBuildLog()[0].second;
+            }
+        }
+        return {program, std::string(function).c_str()};
+    }
+
+    void run(const cl::Kernel& kernel, std::size_t count)
+    {
+        const cl::NDRange global((count + kWorkGroup - 1) / kWorkGroup * kWorkGroup);
+        fQueue.enqueueNDRangeKernel(kernel, cl::NullRange, global, cl::NDRange(kWorkGroup));
+    }
+
+    template <typename T>
+    cl::Buffer memory(std::vector<T>& values)
+    {
+        return {fContext, CL_MEM_COPY_HOST_PTR, values.size() * sizeof(T), values.data()};
+    }
+    template <typename T>
+    void read(const cl::Buffer& memory, std::vector<T>& values)
+    {
+        fQueue.enqueueReadBuffer(memory, CL_TRUE, 0, values.size() * sizeof(T), values.data());
     }
 
     // All passes, from one pair of buffers to another, or in one. Nothing is written past the end.
@@ -176,24 +136,23 @@ protected:
         Surface padded = surface;
         padded.positions.resize(count + kWorkGroup, guard);
         padded.normals.resize(count + kWorkGroup, guard);
-        Buffers input = buffers(padded);
+        std::pair input(memory(padded.positions), memory(padded.normals));
         for (unsigned pass = 0; pass < deformer.passCount(); ++pass) {
-            const Buffers output = inPlace ? input : buffers(padded);
+            const std::pair output =
+                inPlace ? input : std::pair(memory(padded.positions), memory(padded.normals));
             const KernelSource source = deformer.kernel(pass);
-            const auto kernel =
-                fDevice.kernel(kKernels + "/" + std::string(source.file),
-                               std::string(source.function), std::string(source.options));
-            Arguments arguments(fDevice, kernel.get());
+            cl::Kernel passKernel =
+                kernel(kKernels + "/" + std::string(source.file), source.function, source.options);
+            Arguments arguments(fContext, passKernel);
             arguments.value(count);
-            for (const auto& memory :
-                 {input.positions, input.normals, output.positions, output.normals})
-                arguments.add(memory);
+            for (const auto& each : {input.first, input.second, output.first, output.second})
+                arguments.add(each);
             deformer.setArguments(pass, arguments);
-            fDevice.run(kernel.get(), count);
-            fDevice.read(output.positions.get(), padded.positions);
+            run(passKernel, count);
+            read(output.first, padded.positions);
             input = output;
         }
-        fDevice.read(input.normals.get(), padded.normals);
+        read(input.second, padded.normals);
         for (std::size_t i = count; i < padded.vertexCount(); ++i) {
             EXPECT_EQ(padded.positions[i].z, guard.z);
             EXPECT_EQ(padded.normals[i].x, guard.x);
@@ -203,18 +162,10 @@ protected:
         return padded;
     }
 
-    Device fDevice;
-
-private:
-    struct Buffers {
-        Memory positions;
-        Memory normals;
-    };
-    Buffers buffers(const Surface& surface)
-    {
-        return {fDevice.memory(std::span<const Vector3>(surface.positions)),
-                fDevice.memory(std::span<const Vector3>(surface.normals))};
-    }
+    cl::Device fDevice;
+    cl::Context fContext;
+    cl::CommandQueue fQueue;
+    std::map<std::string, cl::Program> fPrograms; // by path and options
 };
 
 class DeformerKernel : public DeformerKernels, public testing::WithParamInterface<DeformerCase> {};
@@ -233,29 +184,19 @@ TEST_P(DeformerKernel, EqualsItsCpuSide)
     if (!canRun(*deformer))
         GTEST_SKIP() << "the device has no double precision";
     Surface mirrored = sheet.rest;
-    for (std::size_t i = 0; i < mirrored.vertexCount(); ++i) {
-        mirrored.positions[i].x *= -1;
-        mirrored.normals[i].x *= -1;
-    }
+    for (auto* vectors : {&mirrored.positions, &mirrored.normals})
+        for (Vector3& vector : *vectors)
+            vector.x *= -1;
     for (const auto& [surface, inPlace] :
          {std::pair(sheet.rest, false), {mirrored, !deformer->readsNeighbours()}}) {
         Surface expected = surface;
         deformer->deform(sheet, expected);
         const Surface actual = deform(*deformer, surface, inPlace);
         for (std::size_t i = 0; i < surface.vertexCount(); ++i) {
-            const auto distance = [](const Vector3& a, const Vector3& b) {
-                return length(wide(a) - wide(b));
-            };
-            ASSERT_LT(distance(actual.positions[i], expected.positions[i]), kBound) << i;
-            ASSERT_LT(distance(actual.normals[i], expected.normals[i]), kBound) << i;
+            ASSERT_LT(length(wide(actual.positions[i]) - wide(expected.positions[i])), kBound) << i;
+            ASSERT_LT(length(wide(actual.normals[i]) - wide(expected.normals[i])), kBound) << i;
         }
     }
-}
-
-// |a| . |b|, with the terms' magnitudes.
-double magnitudes(const Vector& a, const Vector& b)
-{
-    return std::abs(a.x * b.x) + std::abs(a.y * b.y) + std::abs(a.z * b.z);
 }
 
 Vector magnitudes(const Vector& v)
@@ -269,39 +210,32 @@ Vector positiveCross(const Vector& a, const Vector& b)
     return {a.y * b.z + a.z * b.y, a.z * b.x + a.x * b.z, a.x * b.y + a.y * b.x};
 }
 
-struct Bounds {
-    Vector position; // per coordinate
-    double normal = 0;
-};
-
-// The bounds of the errors in single precision that SkinDeformer.h states.
-Bounds skinBounds(const SkinDeformer& skin, std::size_t vertex, const Surface& rest)
+// The bounds of the errors in single precision that SkinDeformer.h states: of the position, per
+// coordinate, and of the normal.
+std::pair<Vector, double> skinBounds(const SkinDeformer& skin, std::size_t i, const Surface& rest)
 {
-    const auto indices = skin.weights().bones().values<SkinWeights::BoneIndices>()[vertex];
-    const auto weights = skin.weights().weights().values<SkinWeights::BoneWeights>()[vertex];
-    const Vector p = wide(rest.positions[vertex]);
-    const Vector n = wide(rest.normals[vertex]);
     Affine sum{};
-    Affine sizes{};
-    Vector position;
-    for (std::size_t i = 0; i < SkinWeights::kInfluences; ++i) {
-        const Affine bone = wide(skin.bones[indices[i]]);
-        const double w = weights[i];
-        position += w * (Vector{magnitudes(bone.rows[0], p), magnitudes(bone.rows[1], p),
-                                magnitudes(bone.rows[2], p)} +
-                         magnitudes(bone.offset));
+    Affine sizes{}; // the sum of the terms' magnitudes
+    for (std::size_t k = 0; k < SkinWeights::kInfluences; ++k) {
+        const Affine bone =
+            wide(skin.bones[skin.weights().bones().values<SkinWeights::BoneIndices>()[i][k]]);
+        const double w = skin.weights().weights().values<SkinWeights::BoneWeights>()[i][k];
         for (std::size_t row = 0; row < 3; ++row) {
             sum.rows[row] += w * bone.rows[row];
             sizes.rows[row] += w * magnitudes(bone.rows[row]);
         }
+        sizes.offset += w * magnitudes(bone.offset);
     }
+    const auto apply = [](const auto& rows, const Vector& n) {
+        return Vector{dot(rows[0], n), dot(rows[1], n), dot(rows[2], n)};
+    };
+    const Vector n = wide(rest.normals[i]);
     const auto& r = sizes.rows;
-    const auto c = cofactors(sum);
-    const Vector exact{dot(c[0], n), dot(c[1], n), dot(c[2], n)};
-    const Vector positive{magnitudes(positiveCross(r[1], r[2]), n),
-                          magnitudes(positiveCross(r[2], r[0]), n),
-                          magnitudes(positiveCross(r[0], r[1]), n)};
-    return {8.01 * kHalfUnit * position, kHalfUnit * (15 * length(positive) / length(exact) + 6)};
+    const std::array positive{positiveCross(r[1], r[2]), positiveCross(r[2], r[0]),
+                              positiveCross(r[0], r[1])};
+    const double growth = length(apply(positive, magnitudes(n))) / length(apply(cofactors(sum), n));
+    return {8.01 * kHalfUnit * transformPoint(sizes, magnitudes(wide(rest.positions[i]))),
+            kHalfUnit * (15 * growth + 6)};
 }
 
 TEST_F(DeformerKernels, SkinStaysWithinItsBoundFarFromTheOrigin)
@@ -322,13 +256,12 @@ TEST_F(DeformerKernels, SkinStaysWithinItsBoundFarFromTheOrigin)
             const Surface actual = deform(skin, sheet.rest);
             double largest = 0; // part of the bound
             for (std::size_t i = 0; i < exact.vertexCount(); ++i) {
-                const Bounds bounds = skinBounds(skin, i, sheet.rest);
+                const auto& [position, normal] = skinBounds(skin, i, sheet.rest);
                 const Vector error =
                     magnitudes(wide(actual.positions[i]) - wide(exact.positions[i]));
                 largest = std::max(
-                    {largest, error.x / bounds.position.x, error.y / bounds.position.y,
-                     error.z / bounds.position.z,
-                     length(wide(actual.normals[i]) - wide(exact.normals[i])) / bounds.normal});
+                    {largest, error.x / position.x, error.y / position.y, error.z / position.z,
+                     length(wide(actual.normals[i]) - wide(exact.normals[i])) / normal});
             }
             EXPECT_LT(largest, 1);
             if (precision == SkinDeformer::kDouble)
@@ -354,18 +287,16 @@ TEST_F(DeformerKernels, SineAndCosineStayWithinTheirBound)
     std::vector<float> cosines(angles.size());
     for (const char* options : {"", "-D NotFused"}) {
         SCOPED_TRACE(options);
-        const auto kernel =
-            fDevice.kernel(VYRA_TEST_KERNELS "/sine_and_cosine.cl", "sinesAndCosines", options);
-        Arguments arguments(fDevice, kernel.get());
+        cl::Kernel both =
+            kernel(VYRA_TEST_KERNELS "/sine_and_cosine.cl", "sinesAndCosines", options);
+        const std::array buffers{memory(angles), memory(sines), memory(cosines)};
+        Arguments arguments(fContext, both);
         arguments.value(count);
-        const auto sineMemory = fDevice.memory(std::span<const float>(sines));
-        const auto cosineMemory = fDevice.memory(std::span<const float>(cosines));
-        arguments.add(fDevice.memory(std::span<const float>(angles)));
-        arguments.add(sineMemory);
-        arguments.add(cosineMemory);
-        fDevice.run(kernel.get(), count);
-        fDevice.read(sineMemory.get(), sines);
-        fDevice.read(cosineMemory.get(), cosines);
+        for (const cl::Buffer& buffer : buffers)
+            arguments.add(buffer);
+        run(both, count);
+        read(buffers[1], sines);
+        read(buffers[2], cosines);
 
         double largest = 0;
         for (std::size_t i = 0; i < withinBound; ++i) {

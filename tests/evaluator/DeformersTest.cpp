@@ -25,21 +25,6 @@ using testing::HasSubstr;
 constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
 constexpr float kInfinity = std::numeric_limits<float>::infinity();
 constexpr float kPi = std::numbers::pi_v<float>;
-constexpr float kTolerance = 1e-6f;
-
-void expectNear(const Vector3& actual, const Vector3& expected, double tolerance = kTolerance)
-{
-    EXPECT_LT(length(wide(actual) - wide(expected)), tolerance)
-        << actual.x << ' ' << actual.y << ' ' << actual.z << ", expected " << expected.x << ' '
-        << expected.y << ' ' << expected.z;
-}
-
-MeshGeometry vertexAt(const Vector3& position, const Vector3& normal)
-{
-    MeshGeometry mesh;
-    mesh.rest = {{position}, {normal}};
-    return mesh;
-}
 
 MatrixRows moved(float x, float y, float z)
 {
@@ -85,121 +70,79 @@ std::unique_ptr<MorphDeformer> morph(const std::vector<MorphTarget>& targets,
     return result;
 }
 
+// Checks where the deformer puts the one vertex of a mesh.
+void expectVertex(const char* what, const std::unique_ptr<Deformer>& deformer, const Surface& rest,
+                  const Surface& expected)
+{
+    SCOPED_TRACE(what);
+    MeshGeometry mesh;
+    mesh.rest = rest;
+    ASSERT_EQ(deformer->mismatch(mesh), "");
+    Surface surface = rest;
+    deformer->deform(mesh, surface);
+    expectNear(surface.positions[0], expected.positions[0]);
+    expectNear(surface.normals[0], expected.normals[0]);
+}
+
 TEST(Deformers, VertexGoesWhereTheFormulaPutsIt)
 {
     const Vector3 up{0, 1, 0};
+    const Surface rest{{{1, 2, 3}}, {up}};
     const float slope = kPi / 4; // of the wave where it crosses 0
+    const float slant = std::hypot(1.0f, slope);
+    const float twisted = std::hypot(1.0f, kPi / 2);
+    const float half = std::sqrt(0.5f);
     const SkinWeights fourBones({{4, 0, 2, 1}}, {{0.5f, 0.25f, 0.125f, 0.125f}});
     const std::vector<MatrixRows> fiveBones = {moved(8, 0, 0), moved(0, 8, 0), moved(0, 0, 8),
                                                moved(99, 99, 99), moved(-4, 4, 0)};
     const std::vector<MorphTarget> targets = {
         {{{1, 0, 0}}, {{0, 0, 3}}}, {{{0, 2, 0}}, {}}, {{{kNan, 0, 0}}, {}}};
-    const struct {
-        const char* name;
-        std::unique_ptr<Deformer> deformer;
-        Vector3 position, normal, expectedPosition, expectedNormal;
-    } rows[] = {
-        {"identity", skin(kIdentityRows), {1, 2, 3}, up, {1, 2, 3}, up},
-        {"translation", skin(moved(5, 6, 7)), {1, 2, 3}, up, {6, 8, 10}, up},
-        {"rotation",
-         skin({0, -1, 0, 0, 1, 0, 0, 0, 0, 0, 1, 0}),
-         {1, 2, 3},
-         up,
-         {-2, 1, 3},
-         {-1, 0, 0}},
-        {"mirror",
-         skin({-1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}),
-         {1, 2, 3},
-         {0.6f, 0.8f, 0},
-         {-1, 2, 3},
-         {-0.6f, 0.8f, 0}},
-        {"shear",
-         skin({1, 1, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}),
-         {1, 2, 3},
-         {1, 0, 0},
-         {3, 2, 3},
-         {std::sqrt(0.5f), -std::sqrt(0.5f), 0}},
-        {"collapse", skin({0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3}), {1, 2, 3}, up, {1, 2, 3}, {}},
-        // Half of (-4, 4, 0), a quarter of (8, 0, 0), an eighth of (0, 0, 8) and of (0, 8, 0).
-        {"four bones", skin(fourBones, fiveBones), {1, 2, 3}, up, {1, 5, 4}, up},
-        {"quarter turn",
-         twist(kPi / 2),
-         {1, 1, 0},
-         {0, 0, 1},
-         {0, 1, -1},
-         {1 / std::hypot(1.0f, kPi / 2), kPi / 2 / std::hypot(1.0f, kPi / 2), 0}},
-        // Half as large, with the axis at x = 1.
-        {"quarter turn in a space",
-         twist(kPi / 2, {0.5f, 0, 0, -0.5f, 0, 0.5f, 0, 0, 0, 0, 0.5f, 0}),
-         {2, 2, 0},
-         up,
-         {1, 2, -1},
-         up},
-        {"crest", wave(0), {1, 2, 3}, up, {1, 2.5f, 3}, up},
-        {"crossing",
-         wave(kPi / 2),
-         {1, 2, 3},
-         up,
-         {1, 2, 3},
-         {-slope / std::hypot(1.0f, slope), 1 / std::hypot(1.0f, slope), 0}},
-        {"crest in a space",
-         wave(0, {0.5f, 0, 0, 0, 0, 0.5f, 0, 0, 0, 0, 0.5f, 0}),
-         {2, 2, 3},
-         up,
-         {2, 3, 3},
-         up},
-        {"two targets of three",
-         morph(targets, {0.5f, 2, 0}),
-         {1, 2, 3},
-         {0, 0, -1},
-         {1.5f, 6, 3},
-         {0, 0, 1}},
-    };
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.name);
-        const MeshGeometry mesh = vertexAt(row.position, row.normal);
-        ASSERT_EQ(row.deformer->mismatch(mesh), "");
-        Surface surface = mesh.rest;
-        row.deformer->deform(mesh, surface);
-        expectNear(surface.positions[0], row.expectedPosition);
-        expectNear(surface.normals[0], row.expectedNormal);
+    expectVertex("translation", skin(moved(5, 6, 7)), rest, {{{6, 8, 10}}, {up}});
+    expectVertex("rotation", skin({0, -1, 0, 0, 1, 0, 0, 0, 0, 0, 1, 0}), rest,
+                 {{{-2, 1, 3}}, {{-1, 0, 0}}});
+    expectVertex("mirror", skin({-1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}),
+                 {{{1, 2, 3}}, {{0.6f, 0.8f, 0}}}, {{{-1, 2, 3}}, {{-0.6f, 0.8f, 0}}});
+    expectVertex("shear", skin({1, 1, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}), {{{1, 2, 3}}, {{1, 0, 0}}},
+                 {{{3, 2, 3}}, {{half, -half, 0}}});
+    expectVertex("collapse", skin({0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3}), rest, {{{1, 2, 3}}, {{}}});
+    // Half of (-4, 4, 0), a quarter of (8, 0, 0), an eighth of (0, 0, 8) and of (0, 8, 0).
+    expectVertex("four bones", skin(fourBones, fiveBones), rest, {{{1, 5, 4}}, {up}});
+    expectVertex("quarter turn", twist(kPi / 2), {{{1, 1, 0}}, {{0, 0, 1}}},
+                 {{{0, 1, -1}}, {{1 / twisted, kPi / 2 / twisted, 0}}});
+    // Half as large, with the axis at x = 1.
+    expectVertex("quarter turn in a space",
+                 twist(kPi / 2, {0.5f, 0, 0, -0.5f, 0, 0.5f, 0, 0, 0, 0, 0.5f, 0}),
+                 {{{2, 2, 0}}, {up}}, {{{1, 2, -1}}, {up}});
+    expectVertex("crossing", wave(kPi / 2), rest, {{{1, 2, 3}}, {{-slope / slant, 1 / slant, 0}}});
+    expectVertex("crest in a space", wave(0, {0.5f, 0, 0, 0, 0, 0.5f, 0, 0, 0, 0, 0.5f, 0}),
+                 {{{2, 2, 3}}, {up}}, {{{2, 3, 3}}, {up}});
+    expectVertex("two targets of three", morph(targets, {0.5f, 2, 0}), {{{1, 2, 3}}, {{0, 0, -1}}},
+                 {{{1.5f, 6, 3}}, {{0, 0, 1}}});
+}
+
+// Appends a point, four points next to it in the plane of its normal, and one above.
+void appendProbe(Surface& surface, std::mt19937& random)
+{
+    constexpr double kStep = 0.01;
+    std::uniform_real_distribution<double> number(-1, 1);
+    const auto next = [&] { return Vector{number(random), number(random), number(random)}; };
+    const Vector position = next();
+    const Vector normal = normalised(next());
+    const Vector along = normalised(cross(normal, next()));
+    const Vector across = cross(normal, along);
+    for (const Vector& offset : {Vector{}, along, -1 * along, across, -1 * across, normal}) {
+        surface.positions.push_back(narrow(position + kStep * offset));
+        surface.normals.push_back(narrow(normal));
     }
 }
 
-// A point, four points next to it in the plane of its normal, and one above.
-class Probe {
-public:
-    static constexpr float kStep = 0.01f;
-
-    explicit Probe(std::mt19937& random)
-    {
-        std::uniform_real_distribution<double> number(-1, 1);
-        const auto next = [&] { return Vector{number(random), number(random), number(random)}; };
-        fPosition = next();
-        fNormal = normalised(next());
-        fAlong = normalised(cross(fNormal, next()));
-    }
-
-    void appendTo(Surface& surface) const
-    {
-        const Vector across = cross(fNormal, fAlong);
-        for (const Vector& offset : {Vector{}, fAlong, -1 * fAlong, across, -1 * across, fNormal}) {
-            surface.positions.push_back(narrow(fPosition + double{kStep} * offset));
-            surface.normals.push_back(narrow(fNormal));
-        }
-    }
-
-    // The normal of the deformed points, which begin at `first`.
-    static Vector3 normalOf(const Surface& surface, std::size_t first)
-    {
-        const auto point = [&](std::size_t i) { return wide(surface.positions[first + i]); };
-        const Vector normal = normalised(cross(point(1) - point(2), point(3) - point(4)));
-        return narrow((dot(normal, point(5) - point(0)) < 0 ? -1 : 1) * normal);
-    }
-
-private:
-    Vector fPosition, fNormal, fAlong;
-};
+// The normal of the deformed points, which begin at `first`.
+Vector probedNormal(const Surface& surface, std::size_t first)
+{
+    const auto point = [&](std::size_t i) { return wide(surface.positions[first + i]); };
+    const Vector normal = normalised(cross(point(1) - point(2), point(3) - point(4)));
+    return (dot(normal, point(5) - point(0)) < 0 ? -1 : 1) * normal;
+}
 
 TEST(Deformers, NormalsMatchFiniteDifferencesOfTheDeformedSurface)
 {
@@ -207,8 +150,8 @@ TEST(Deformers, NormalsMatchFiniteDifferencesOfTheDeformedSurface)
     std::mt19937 random(1);
     MeshGeometry mesh;
     for (unsigned i = 0; i < kSamples; ++i)
-        Probe(random).appendTo(mesh.rest);
-    static_assert(kProbes == 6);
+        appendProbe(mesh.rest, random);
+    ASSERT_EQ(mesh.rest.vertexCount(), kSamples * kProbes);
     for (const DeformerCase& row : deformerCases()) {
         if (!row.isSmoothMap)
             continue;
@@ -217,10 +160,9 @@ TEST(Deformers, NormalsMatchFiniteDifferencesOfTheDeformedSurface)
         row.make(mesh)->deform(mesh, surface);
         unsigned near = 0;
         for (std::size_t first = 0; first < surface.vertexCount(); first += kProbes) {
-            const Vector difference =
-                wide(surface.normals[first]) - wide(Probe::normalOf(surface, first));
-            near += length(difference) < 0.02 ? 1 : 0;
-            EXPECT_NEAR(length(wide(surface.normals[first])), 1, kTolerance);
+            const Vector normal = wide(surface.normals[first]);
+            near += length(normal - probedNormal(surface, first)) < 0.02 ? 1 : 0;
+            EXPECT_NEAR(length(normal), 1, kTolerance);
         }
         // Next to a fold the probe's points lie on both sides of it.
         EXPECT_GE(near, std::string(row.name) == "waveInsideOut" ? kSamples - 20 : kSamples);
@@ -229,26 +171,23 @@ TEST(Deformers, NormalsMatchFiniteDifferencesOfTheDeformedSurface)
 
 TEST(SkinWeights, HeaviestFourAreKeptAndAddUpToOne)
 {
-    using Influences = std::vector<SkinWeights::Influence>;
-    const struct {
-        Influences given;
-        SkinWeights::BoneIndices bones;
-        SkinWeights::BoneWeights weights;
-    } rows[] = {
-        {{{7, 2}}, {7, 7, 7, 7}, {1, 0, 0, 0}},
-        {{{1, 0.2f}, {2, 0.6f}}, {2, 1, 2, 2}, {0.75f, 0.25f, 0, 0}},
-        {{{1, 1}, {2, 4}, {3, 2}, {4, 0.5f}, {5, 1}, {6, 1}},
-         {2, 3, 1, 5},
-         {.5f, .25f, .125f, .125f}},
-        {{{9, 0}, {3, 1}}, {3, 3, 3, 3}, {1, 0, 0, 0}},
-    };
-    for (const auto& row : rows) {
-        const SkinWeights weights({row.given});
+    const std::tuple<std::vector<SkinWeights::Influence>, SkinWeights::BoneIndices,
+                     SkinWeights::BoneWeights>
+        rows[] = {
+            {{{7, 2}}, {7, 7, 7, 7}, {1, 0, 0, 0}},
+            {{{1, 0.2f}, {2, 0.6f}}, {2, 1, 2, 2}, {0.75f, 0.25f, 0, 0}},
+            {{{1, 1}, {2, 4}, {3, 2}, {4, .5f}, {5, 1}, {6, 1}},
+             {2, 3, 1, 5},
+             {.5f, .25f, .125f, .125f}},
+            {{{9, 0}, {3, 1}}, {3, 3, 3, 3}, {1, 0, 0, 0}},
+        };
+    for (const auto& [given, bones, expected] : rows) {
+        const SkinWeights weights({given});
         EXPECT_EQ(weights.problem(), "");
-        EXPECT_EQ(weights.bones().values<SkinWeights::BoneIndices>()[0], row.bones);
+        EXPECT_EQ(weights.bones().values<SkinWeights::BoneIndices>()[0], bones);
         EXPECT_THAT(weights.weights().values<SkinWeights::BoneWeights>()[0],
-                    testing::Pointwise(testing::FloatNear(1e-7f), row.weights));
-        EXPECT_EQ(weights.highestBone(), *std::max_element(row.bones.begin(), row.bones.end()));
+                    testing::Pointwise(testing::FloatNear(1e-7f), expected));
+        EXPECT_EQ(weights.highestBone(), *std::max_element(bones.begin(), bones.end()));
     }
 }
 
@@ -265,10 +204,10 @@ TEST(Deformers, SettingsThatDoNotFitAreNamed)
 {
     using Lists = std::vector<std::vector<SkinWeights::Influence>>;
     const MatrixRows flat{1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 0, 0};
-    const MatrixRows notANumber{kNan, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0};
     const SkinWeights one({{0, 2, 0, 0}}, {{0.5f, 0.5f, 0, 0}});
-    const auto smooth = [](std::vector<std::uint32_t> triangles) {
-        MeshGeometry mesh = vertexAt({}, {});
+    MeshGeometry mesh;
+    mesh.rest = {{{}}, {{}}};
+    auto smooth = [mesh](std::vector<std::uint32_t> triangles) mutable {
         mesh.triangles = std::move(triangles);
         return std::make_unique<SmoothDeformer>(SmoothTopology(mesh));
     };
@@ -279,17 +218,11 @@ TEST(Deformers, SettingsThatDoNotFitAreNamed)
     const std::pair<std::unique_ptr<Deformer>, const char*> rows[] = {
         {skin(SkinWeights(), {}), "skin weights for 0 vertices, and the mesh has 1"},
         {skin(one, {moved(0, 0, 0), moved(0, 0, 0)}), "refer to bone 2, and there are 2"},
-        {skin(SkinWeights({{}, {}}, {{1, 0, 0, 0}}), {}),
-         "indices for 2 vertices and weights for 1"},
+        {skin(SkinWeights({{}, {}}, {{1, 0, 0, 0}}), {}), "for 2 vertices and weights for 1"},
         {skin(SkinWeights({{}}, {{0.5f, 0.4f, 0, 0}}), {}), "vertex 0 add up to 0.9"},
-        {skin(SkinWeights({{}}, {{1.5f, -0.5f, 0, 0}}), {}),
-         "vertex 0 is negative or not a number"},
-        {skin(SkinWeights({{}}, {{kNan, 1, 0, 0}}), {}), "vertex 0 is negative or not a number"},
-        {skin(SkinWeights({{}}, {{kInfinity, 1, 0, 0}}), {}),
-         "vertex 0 is negative or not a number"},
-        {skin(SkinWeights(Lists{{{0, kInfinity}}}), {}), "vertex 0 is negative or not a number"},
-        {skin(SkinWeights(Lists{{{0, 1}}, {{0, kNan}}}), {}),
-         "vertex 1 is negative or not a number"},
+        {skin(SkinWeights({{}}, {{1.5f, -0.5f, 0, 0}}), {}), "0 is negative or not a number"},
+        {skin(SkinWeights({{}}, {{kInfinity, 1, 0, 0}}), {}), "0 is negative or not a number"},
+        {skin(SkinWeights(Lists{{{0, 1}}, {{0, kNan}}}), {}), "1 is negative or not a number"},
         {skin(SkinWeights(Lists{{{0, 1}}, {}}), {}), "the weights of vertex 1 are all 0"},
         {with(skin(moved(0, 0, 0)), [](auto& d) { d.precision = 2; }), "not 2"},
         {morph({{{{}}, {}}}, {}), "0 weights and 1 morph targets"},
@@ -299,19 +232,17 @@ TEST(Deformers, SettingsThatDoNotFitAreNamed)
         {morph({{{{}}, {}}}, {kNan}), "not a finite number"},
         {with(morph({}, {}), [](auto& d) { d.strength = kNan; }), "not a finite number"},
         {twist(1, flat), "no inverse"},
-        {twist(1, notANumber), "no inverse"},
-        {wave(0, flat), "no inverse"},
+        {wave(0, {kNan, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0}), "no inverse"},
         {with(wave(0), [](auto& d) { d.wavelength = 0; }), "the wavelength is 0"},
         {with(wave(0), [](auto& d) { d.direction = 3; }), "axes from 0 to 2"},
         {std::make_unique<SmoothDeformer>(SmoothTopology()), "topology has 0 vertices"},
         {smooth({0, 0}), "2 vertex indices"},
         {smooth({0, 0, 0, 0, 1, 0}), "triangle 1 refers to vertex 1"},
-        {with(smooth({}), [](auto& d) { d.weight = 1.5f; }), "the weight is 1.5"},
         {with(smooth({}), [](auto& d) { d.weight = kNan; }), "the weight is nan"},
         {with(smooth({}), [](auto& d) { d.iterations = 101; }), "101 iterations"},
     };
     for (const auto& [deformer, text] : rows)
-        EXPECT_THAT(deformer->mismatch(vertexAt({}, {})), HasSubstr(text));
+        EXPECT_THAT(deformer->mismatch(mesh), HasSubstr(text));
 }
 
 TEST(Deformers, SettingsThatChangeNothingTakeNoPass)

@@ -52,13 +52,18 @@ void EvaluatorTest::TearDown()
     evaluator.reset();
     EXPECT_EQ(runtime().acquired(), Lines{});
     EXPECT_EQ(leftOver(), expectedLeft);
-    Lines kept = runtime().balance();
-    std::erase_if(kept, [this](const std::string& line) {
+    expectLeft(objectsSinceStart());
+    ScriptedTest::TearDown();
+}
+
+Lines EvaluatorTest::objectsSinceStart() const
+{
+    Lines lines = runtime().balance();
+    std::erase_if(lines, [this](const std::string& line) {
         return std::ranges::count(leftByStart, line) > 0 || line.starts_with("platform") ||
                line.starts_with("device");
     });
-    expectLeft(kept);
-    ScriptedTest::TearDown();
+    return lines;
 }
 
 Lines EvaluatorTest::leftOver()
@@ -68,14 +73,13 @@ Lines EvaluatorTest::leftOver()
         manager().PreEvaluate(em::Id(0));
         manager().PostEvaluate(em::Id(0));
     }
-    Lines lines = runtime().balance();
-    std::size_t events = 0;
-    std::size_t fences = 0;
-    std::erase_if(lines, [&](const std::string& line) {
-        return std::ranges::count(leftByStart, line) > 0 || line.starts_with("platform") ||
-               line.starts_with("device") || (line.starts_with("event") && ++events == 1) ||
-               (line.starts_with("sync") && ++fences == 1);
-    });
+    Lines lines = objectsSinceStart();
+    for (const char* kept : {"event", "sync"}) {
+        const auto first = std::ranges::find_if(
+            lines, [kept](const std::string& line) { return line.starts_with(kept); });
+        if (first != lines.end())
+            lines.erase(first);
+    }
     return lines;
 }
 
@@ -147,15 +151,13 @@ void EvaluatorTest::writeKernels(const std::string& file, const std::string& tex
 
 std::size_t countOf(const Lines& lines, const std::string& prefix)
 {
-    return static_cast<std::size_t>(std::ranges::count_if(
-        lines, [&prefix](const std::string& line) { return line.starts_with(prefix); }));
+    return linesOf(lines, prefix).size();
 }
 
-Lines linesOf(const Lines& lines, const std::string& prefix)
+Lines linesOf(Lines lines, const std::string& prefix)
 {
-    Lines found = lines;
-    std::erase_if(found, [&prefix](const std::string& line) { return !line.starts_with(prefix); });
-    return found;
+    std::erase_if(lines, [&prefix](const std::string& line) { return !line.starts_with(prefix); });
+    return lines;
 }
 
 Lines lastListOf(const std::string& line)

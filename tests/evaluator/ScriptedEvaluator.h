@@ -88,6 +88,8 @@ protected:
     Lines expectedLeft;            // of leftOver, when the test ends
 
 private:
+    Lines objectsSinceStart() const;
+
     std::uint16_t fEvaluations = 0;
     unsigned fMeshes = 0;
 };
@@ -101,7 +103,7 @@ inline constexpr const char* kKernelText =
 
 std::size_t countOf(const Lines& lines, const std::string& prefix);
 // The lines that begin with the prefix.
-Lines linesOf(const Lines& lines, const std::string& prefix);
+Lines linesOf(Lines lines, const std::string& prefix);
 // The names in a list of a line, the last one if there are several: "[event#1, event#2]".
 Lines lastListOf(const std::string& line);
 

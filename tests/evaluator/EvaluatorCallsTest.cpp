@@ -1,7 +1,7 @@
 // The calls of evaluations without faults: how many there are, in which order, and which memory
 // each deformer reads and writes.
-#include "ScriptedEvaluator.h"
 #include "FakeHost.h"
+#include "ScriptedEvaluator.h"
 
 #include <map>
 
@@ -50,17 +50,18 @@ TEST_F(EvaluatorTest, UploadCoversTheNumbersThatChangedAndNoOthers)
     for (int i = 0; i < 3; ++i)
         mesh.add<TestDeformer>("skin", "full").numbers.resize(6); // two float4 each
     evaluate();
+    const auto expectUpload = [this](const char* range) {
+        EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
+                    testing::ElementsAre(HasSubstr(std::string(range) + ", ptr, []")));
+    };
     deformer(mesh, 1).numbers[4] = 9;
-    EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
-                testing::ElementsAre(HasSubstr(", 0, 32, 24, ptr, []")));
+    expectUpload(", 0, 32, 24");
     deformer(mesh, 0).numbers[4] = 9;
     deformer(mesh, 2).numbers[0] = 9;
-    EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
-                testing::ElementsAre(HasSubstr(", 0, 0, 88, ptr, []")));
+    expectUpload(", 0, 0, 88");
     deformer(mesh, 1).numbers[4] = 8;
     deformer(mesh, 0).enabled = false; // the others move to the front
-    EXPECT_THAT(linesOf(callsOfEvaluation(), "clEnqueueWrite"),
-                testing::ElementsAre(HasSubstr(", 0, 0, 56, ptr, []")));
+    expectUpload(", 0, 0, 56");
 }
 
 // What the kernels read and write, one pair of letters each: R is the rest pose, V the vertex
@@ -84,32 +85,22 @@ std::string memoryOf(const Lines& kernelLines, std::size_t first)
     return text;
 }
 
-struct ChainRow {
-    const char* chain; // i: may run in place, n: reads neighbours, -: not enabled, 2: two passes
-    const char* memory;
-};
-
 TEST_F(EvaluatorTest, DeformersRunInPlaceOnlyIfTheyReadNoNeighbours)
 {
     startIn(1, 1);
-    for (const ChainRow& row : {ChainRow{"i", "RV"},
-                                {"n", "RV"},
-                                {"ii", "RA AV"},
-                                {"iii", "RA AA AV"},
-                                {"nn", "RA AV"},
-                                {"nnn", "RA AB BV"},
-                                {"nnnn", "RA AB BA AV"},
-                                {"nin", "RA AA AV"},
-                                {"ini", "RA AB BV"},
-                                {"innii", "RA AB BA AA AV"},
-                                {"i-n", "RA AV"},
-                                {"-n-", "RV"},
-                                {"2", "RA AV"},
-                                {"2n", "RA AB BV"},
-                                {"n22", "RA AB BA AB BV"}}) {
+    // i: may run in place, n: reads neighbours, -: not enabled, 2: two passes
+    for (const auto& [chain, memory] : {std::pair("n", "RV"),
+                                        {"ii", "RA AV"},
+                                        {"nnnn", "RA AB BA AV"},
+                                        {"nin", "RA AA AV"},
+                                        {"ini", "RA AB BV"},
+                                        {"innii", "RA AB BA AA AV"},
+                                        {"i-n", "RA AV"},
+                                        {"-n-", "RV"},
+                                        {"n22", "RA AB BA AB BV"}}) {
         makeEvaluator();
         vyra::DeformableMesh& mesh = addMesh();
-        for (const char kind : std::string(row.chain)) {
+        for (const char kind : std::string(chain)) {
             auto& added = mesh.add<TestDeformer>();
             added.neighbours = kind == 'n' || kind == '2';
             added.enabled = kind != '-';
@@ -118,10 +109,10 @@ TEST_F(EvaluatorTest, DeformersRunInPlaceOnlyIfTheyReadNoNeighbours)
         evaluate();
         for (int evaluation = 0; evaluation < 2; ++evaluation) {
             const Lines kernelLines = linesOf(callsOfEvaluation(), "clEnqueueNDRangeKernel");
-            EXPECT_EQ(memoryOf(kernelLines, 0), row.memory) << row.chain;
-            EXPECT_EQ(memoryOf(kernelLines, 1), row.memory) << row.chain;
+            EXPECT_EQ(memoryOf(kernelLines, 0), memory) << chain;
+            EXPECT_EQ(memoryOf(kernelLines, 1), memory) << chain;
         }
-        EXPECT_LE(evaluator->counts().buffersCreated, 4U) << row.chain;
+        EXPECT_LE(evaluator->counts().buffersCreated, 4U) << chain;
     }
 }
 
@@ -266,8 +257,34 @@ TEST_F(EvaluatorTest, QueryModeEndsAtACommandThatFailed)
     addChain();
     runtime().scriptEventStatuses({CL_OUT_OF_RESOURCES});
     evaluate();
-    evaluator->waitUntilDrawable(); // and does not query forever
+    evaluator->waitUntilDrawable(); // does not query forever
     EXPECT_GE(callsOf("clGetEventInfo").size(), 1U);
+}
+
+// Under ThreadSanitizer a missing lock shows as a race here.
+TEST_F(EvaluatorTest, ManyMeshesOverSeveralQueuesWhileKernelsAreReplaced)
+{
+    constexpr std::size_t kMeshes = 24;
+    startIn(1, 1);
+    const auto geometry = grid(4, "shared");
+    const vyra::ConstantArray weights(std::vector<float>{1, 2});
+    std::vector<vyra::DeformableMesh*> meshes;
+    for (std::size_t i = 0; i < kMeshes; ++i) {
+        meshes.push_back(&addMesh(geometry));
+        meshes.back()->add<TestDeformer>("skin", "full").weights = weights;
+        meshes.back()->add<TestDeformer>("twist").file = i % 3 ? "test.cl" : "missing.cl";
+    }
+    for (unsigned round = 0; round < 20; ++round) {
+        for (vyra::DeformableMesh* mesh : meshes)
+            deformer(*mesh).numbers[0] = static_cast<float>(round);
+        if (round % 5 == 4) {
+            EXPECT_TRUE(evaluator->replaceKernelFile("test.cl", kKernelText).ok());
+        }
+        EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), kMeshes * 4 / 3);
+        for (std::size_t i = 0; i < kMeshes; ++i)
+            EXPECT_EQ(meshes[i]->status().ok(), i % 3 != 0);
+        EXPECT_EQ(evaluator->counts().programsBuilt, 1 + (round + 1) / 5);
+    }
 }
 
 TEST_F(EvaluatorTest, TraceReceivesEachCommandOnceInTheHostsTime)

@@ -24,9 +24,26 @@ protected:
         runtime().holdCommands(true);
         calls();
     }
-    void expectBatchRelease(std::size_t count, const char* when)
+    // Two evaluations within one of the host's.
+    void expectHostsStaysOpen(bool inBatch, bool acquireFails)
     {
-        EXPECT_EQ(callsOf("clEnqueueRelease").size(), count) << when;
+        if (acquireFails)
+            runtime().plan({.function = "clEnqueueAcquireGLObjects"});
+        manager().PreEvaluate(kHosts);
+        runtime().clearFaults();
+        if (evaluator->batchSize() == 0 && !fMesh)
+            addChain();
+        calls();
+        evaluator->evaluate(kHosts);
+        evaluator->evaluate(kHosts);
+        EXPECT_EQ(evaluator->status().ok(), !acquireFails);
+        EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 0U : 2U);
+        manager().PostEvaluate(kHosts);
+        EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 1U : 0U);
+        if (acquireFails) {
+            EXPECT_FALSE(warnings().empty());
+            runtime().takeMisuse(); // the release of what was not acquired, which the rules ask for
+        }
     }
 
     vyra::DeformableMesh* fMesh = nullptr;
@@ -40,8 +57,10 @@ TEST_F(EvaluatorLifetimeTest, MeshDestroyedAfterAnEvaluationWaitsForItsCommands)
     evaluator->destroyMesh(*fMesh);
     EXPECT_EQ(evaluator->batchSize(), 2U);
     EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), 2U);
+    manager().PreEvaluate(kHosts);
     evaluator->destroyMesh(*fOther);
-    evaluate();
+    evaluator->deform();
+    manager().PostEvaluate(kHosts);
     EXPECT_TRUE(evaluator->status().ok());
 }
 
@@ -51,29 +70,10 @@ TEST_F(EvaluatorLifetimeTest, MeshDestroyedInTheHostsEvaluationIsReleasedFirst)
     manager().PreEvaluate(kHosts);
     EXPECT_TRUE(evaluator->deform().ok());
     evaluator->destroyMesh(*fMesh);
-    expectBatchRelease(2, "one for each vertex buffer of the mesh");
+    EXPECT_EQ(callsOf("clEnqueueRelease").size(), 2U) << "one for each vertex buffer of the mesh";
     manager().PostEvaluate(kHosts);
-    expectBatchRelease(1, "the rest of the batch");
+    EXPECT_EQ(callsOf("clEnqueueRelease").size(), 1U) << "the rest of the batch";
     evaluate();
-    EXPECT_EQ(runtime().acquired(), Lines{});
-}
-
-TEST_F(EvaluatorLifetimeTest, MeshDestroyedBeforeTheHostsEvaluationDeformsIt)
-{
-    startWithMeshes();
-    evaluate();
-    manager().PreEvaluate(kHosts);
-    evaluator->destroyMesh(*fMesh);
-    evaluator->deform();
-    manager().PostEvaluate(kHosts);
-    EXPECT_TRUE(evaluator->status().ok());
-}
-
-TEST_F(EvaluatorLifetimeTest, EvaluatorDestroyedWithCommandsPending)
-{
-    startWithMeshes();
-    evaluate();
-    evaluator.reset();
 }
 
 TEST_F(EvaluatorLifetimeTest, EvaluatorDestroyedInTheHostsEvaluation)
@@ -101,24 +101,12 @@ TEST_F(EvaluatorLifetimeTest, DeformTwiceInOneEvaluationWhileABufferIsOutsideThe
     evaluator->waitUntilDrawable();
 }
 
-TEST_F(EvaluatorLifetimeTest, UnbatchedBufferIsAcquiredAfterItsLastRelease)
-{
-    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
-    startWithMeshes();
-    evaluate();
-    evaluate();
-    evaluator->destroyMesh(*fMesh);
-}
-
 TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveTheirCommands)
 {
     startWithMeshes();
-    const auto replace = [](vyra::DeformableMesh& mesh) {
-        deformer(mesh).weights = vyra::ConstantArray(std::vector<float>{3});
-    };
     for (int i = 0; i < 3; ++i) {
         evaluate();
-        replace(*fMesh);
+        deformer(*fMesh).weights = vyra::ConstantArray(std::vector<float>{3});
         if (i == 1) {
             EXPECT_TRUE(evaluator->replaceKernelFile("test.cl", kKernelText).ok());
         }
@@ -128,12 +116,7 @@ TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveTheirCommands)
     evaluate();
     // The rest pose, the weights in use, the numbers and the memory between the two deformers.
     const std::size_t queues = runtime().created(Kind::kQueue) - 2;
-    const auto living = [] {
-        Lines lines = runtime().balance();
-        std::erase_if(lines, [](const std::string& line) { return !line.starts_with("mem"); });
-        return lines.size();
-    };
-    EXPECT_LE(living(), 4U + 4U + 3U + queues + 2 * queues);
+    EXPECT_LE(countOf(runtime().balance(), "mem"), 4U + 4U + 3U + queues + 2 * queues);
 }
 
 TEST_F(EvaluatorLifetimeTest, NumbersThatNeedMoreMemoryWaitForTheKernelsThatReadTheFormer)
@@ -159,55 +142,34 @@ TEST_F(EvaluatorLifetimeTest, MemoryOfAGeometryGoesWithItsLastMesh)
     EXPECT_EQ(callsOf("clReleaseMemObject").size(), 4U) << "and the rest pose";
 }
 
-struct HostRow : Named {
-    bool batched;      // the meshes are in the batch when the host opens its evaluation
-    bool acquireFails; // of the batch
-    bool noBatching = false;
-};
-
 // The evaluation that a host opened with the same id stays open in evaluate, and its own is closed.
-class HostsEvaluationTest : public EvaluatorTest, public ::testing::WithParamInterface<HostRow> {};
-
-TEST_P(HostsEvaluationTest, StaysOpen)
+TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpen)
 {
-    const HostRow& row = GetParam();
-    if (row.noBatching)
-        setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
     startIn(1, 1);
-    if (row.batched) {
-        addChain();
-        frame();
-    }
-    for (int round = 0; round < 2; ++round) {
-        if (row.acquireFails)
-            runtime().plan({.function = "clEnqueueAcquireGLObjects"});
-        manager().PreEvaluate(kHosts);
-        runtime().clearFaults();
-        if (round == 0 && !row.batched)
+    // Whether the meshes are in the batch when the host opens its evaluation.
+    for (const auto& [batched, acquireFails] :
+         {std::pair(false, false), {true, false}, {true, true}}) {
+        SCOPED_TRACE(testing::Message() << batched << acquireFails);
+        makeEvaluator();
+        if (batched) {
             addChain();
-        calls();
-        evaluator->evaluate(kHosts);
-        evaluator->evaluate(kHosts);
-        const bool inBatch = row.batched || (round > 0 && !row.noBatching);
-        EXPECT_EQ(evaluator->status().ok(), !(row.acquireFails && inBatch));
-        EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 0U : 2U);
-        manager().PostEvaluate(kHosts);
-        EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 1U : 0U);
-        if (row.acquireFails) {
-            EXPECT_FALSE(warnings().empty());
-            runtime().takeMisuse(); // the release of what was not acquired, which the rules ask for
+            frame();
         }
+        for (int round = 0; round < 2; ++round)
+            expectHostsStaysOpen(batched || round > 0, acquireFails);
+        const Lines lines = callsOfEvaluation();
+        EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
+        EXPECT_EQ(countOf(lines, "clEnqueueReleaseGLObjects(queue#1"), 1U) << "its own";
     }
-    const Lines lines = callsOfEvaluation();
-    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
-    EXPECT_EQ(countOf(lines, "clEnqueueReleaseGLObjects(queue#1"), 1U) << "its own is closed";
 }
-INSTANTIATE_TEST_SUITE_P(Evaluator, HostsEvaluationTest,
-                         ::testing::Values(HostRow{"Batched", true, false},
-                                           HostRow{"FirstOfItsMeshes", false, false},
-                                           HostRow{"AcquireFails", true, true},
-                                           HostRow{"WithoutBatching", false, false, true}),
-                         ::testing::PrintToStringParamName());
+
+TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpenWithoutBatching)
+{
+    setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
+    startWithMeshes();
+    expectHostsStaysOpen(false, false);
+    evaluator->destroyMesh(*fMesh); // its buffers are acquired after their last release
+}
 
 TEST_F(EvaluatorLifetimeTest, EvaluationWhoseAcquireFailsIsClosed)
 {
