@@ -3,7 +3,6 @@
 
 #include <memory>
 #include <type_traits>
-#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -30,38 +29,23 @@ private:
 TEST(Bridge, PublishesOneBorrowedEvaluator)
 {
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);
-
     bool destroyed = false;
-    auto first = std::make_unique<Evaluator>(destroyed);
-    bool otherDestroyed = false;
-    Evaluator second(otherDestroyed);
-    IDeformerEvaluatorBridge::setAPI(first.get());
+    auto owned = std::make_unique<Evaluator>(destroyed);
+    const Evaluator& evaluator = *owned;
+    IDeformerEvaluatorBridge::setAPI(owned.get());
     IDeformerEvaluatorBridge::getAPI()->evaluate(em::Id(7));
-    EXPECT_EQ(first->lastEvaluation, 7);
+    EXPECT_EQ(evaluator.lastEvaluation, 7);
 
     // Modules of the host call by slot: those of the destructor (two in this ABI), then evaluate.
     using Evaluate = void(IDeformerEvaluatorBridgeAPI*, const em::Id&);
     Evaluate** slots = *reinterpret_cast<Evaluate***>(IDeformerEvaluatorBridge::getAPI());
-    slots[2](first.get(), em::Id(8));
-    EXPECT_EQ(first->lastEvaluation, 8);
-
-    IDeformerEvaluatorBridge::setAPI(&second);
-    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second);
-    EXPECT_FALSE(destroyed) << "the bridge deleted what it only borrowed";
-
-    IDeformerEvaluatorBridge bridge;
-    IDeformerEvaluatorBridge other;
-    EXPECT_EQ(&(other = bridge), &other);
-    EXPECT_EQ(&(bridge = std::move(other)), &bridge);
-    EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), &second) << "a bridge has nothing of its own";
-
-    Evaluator copy(second);
-    IDeformerEvaluatorBridgeAPI& interface = copy;
-    EXPECT_EQ(&(interface = second), &interface);
+    slots[2](owned.get(), em::Id(8));
+    EXPECT_EQ(evaluator.lastEvaluation, 8);
 
     IDeformerEvaluatorBridge::setAPI(nullptr);
     EXPECT_EQ(IDeformerEvaluatorBridge::getAPI(), nullptr);
-    std::unique_ptr<IDeformerEvaluatorBridgeAPI> base = std::move(first);
+    EXPECT_FALSE(destroyed) << "the bridge deleted a borrowed evaluator";
+    std::unique_ptr<IDeformerEvaluatorBridgeAPI> base = std::move(owned);
     base.reset();
     EXPECT_TRUE(destroyed) << "deleting through the interface must destroy the evaluator";
 }

@@ -27,10 +27,6 @@ void PrintTo(const Modes& modes, std::ostream* stream)
     *stream << modes.description;
 }
 
-struct QueueRelease {
-    void operator()(cl_command_queue queue) const { clReleaseCommandQueue(queue); }
-};
-
 // One mesh: its vertex buffer at the renderer, its record, its kernels and its queue.
 struct Mesh {
     unsigned glBuffer = 0;
@@ -38,7 +34,7 @@ struct Mesh {
     bool alone = false; // outside the batch in this evaluation
     AutoCLObject<cl_kernel> add;
     AutoCLObject<cl_kernel> scale;
-    std::unique_ptr<_cl_command_queue, QueueRelease> queue;
+    std::shared_ptr<_cl_command_queue> queue;
     AutoCLObject<cl_event> released; // of a release on its own
 };
 
@@ -60,16 +56,16 @@ protected:
         return std::vector<float>(kElements, value);
     }
 
-    Mesh makeMesh()
+    void addMesh()
     {
-        Mesh mesh;
+        Mesh& mesh = fMeshes.emplace_back();
         mesh.glBuffer = renderer().makeBuffer(everywhere(0.0F));
         mesh.add = deformKernel("add");
         mesh.scale = deformKernel("scale");
-        mesh.queue.reset(TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr));
+        mesh.queue = {TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr),
+                      clReleaseCommandQueue};
         share(mesh);
         mesh.alone = GetParam().forceThreading != nullptr;
-        return mesh;
     }
 
     static void share(Mesh& mesh)
@@ -104,23 +100,8 @@ protected:
         clFlush(mesh.queue.get());
     }
 
-    std::vector<Mesh> makeMeshes()
-    {
-        std::vector<Mesh> meshes(3);
-        std::generate(meshes.begin(), meshes.end(), [this] { return makeMesh(); });
-        return meshes;
-    }
-
-    static void deformInParallel(std::vector<Mesh>& meshes)
-    {
-        std::vector<std::jthread> deformers;
-        deformers.reserve(meshes.size());
-        for (Mesh& mesh : meshes)
-            deformers.emplace_back([&mesh] { deform(mesh); });
-    }
-
     // What the modes leave to the host before it draws.
-    static void waitAsTheHostDoes(std::vector<Mesh>& meshes)
+    void waitAsTheHostDoes()
     {
         TopenCLInfo::flush();
         const cl_event batchReleased = *manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr);
@@ -130,8 +111,8 @@ protected:
         }
         if (TopenCLInfo::theOne().useCLFinish())
             TopenCLInfo::finish();
-        // Releases of single buffers came from threads that know of no OpenGL context.
-        for (Mesh& mesh : meshes) {
+        // Releases of single buffers came from threads without an OpenGL context.
+        for (Mesh& mesh : fMeshes) {
             if (const cl_event event = mesh.released.get()) {
                 EXPECT_EQ(clWaitForEvents(1, &event), CL_SUCCESS);
             }
@@ -140,8 +121,7 @@ protected:
     }
 
     // One evaluation, after the renderer has drawn; `atItsBeginning` is what else happens in it.
-    void evaluate(std::vector<Mesh>& meshes, int frame,
-                  const std::function<void()>& atItsBeginning = nullptr)
+    void evaluate(int frame, const std::function<void()>& atItsBeginning = nullptr)
     {
         manager().RenderingComplete();
         renderer().flush();
@@ -151,53 +131,59 @@ protected:
         manager().PreEvaluate(id);
         if (atItsBeginning)
             atItsBeginning();
-        deformInParallel(meshes);
+        std::vector<std::jthread> deformers;
+        for (Mesh& mesh : fMeshes)
+            deformers.emplace_back([&mesh] { deform(mesh); });
+        deformers.clear();
         manager().PostEvaluate(id);
-        waitAsTheHostDoes(meshes);
+        waitAsTheHostDoes();
     }
+
+    std::vector<Mesh> fMeshes;
 };
 
 } // namespace
 
 TEST_P(Evaluation, NumbersArriveInGLMemory)
 {
-    std::vector<Mesh> meshes = makeMeshes();
     for (int frame = 0; frame < kFrames; ++frame) {
         SCOPED_TRACE(frame);
+        while (fMeshes.size() < (frame < kFrames / 3 ? 3U : 4U))
+            addMesh(); // the last one is on its own until it joins the batch
         const auto first = static_cast<float>(frame * 10);
-        for (float input = first; const Mesh& mesh : meshes)
+        for (float input = first; const Mesh& mesh : fMeshes)
             renderer().writeBuffer(mesh.glBuffer, everywhere(input++));
-        evaluate(meshes, frame);
-        for (float input = first; const Mesh& mesh : meshes)
+        evaluate(frame);
+        for (float input = first; const Mesh& mesh : fMeshes)
             EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements),
                       everywhere(2.0F * (input++ + 1.0F)));
-        if (frame == kFrames / 3)
-            meshes.push_back(makeMesh()); // on its own until it joins the batch
     }
-    EXPECT_EQ(meshes.back().shared->fInBatch, GetParam().forceThreading == nullptr);
-    for (Mesh& mesh : meshes)
+    EXPECT_EQ(fMeshes.back().shared->fInBatch, GetParam().forceThreading == nullptr);
+    for (Mesh& mesh : fMeshes)
         manager().DestroySharedCLBuffer(mesh.shared);
 }
 
 TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
 {
-    std::vector<Mesh> meshes = makeMeshes();
+    while (fMeshes.size() < 3)
+        addMesh();
+    Mesh& changing = fMeshes[1];
     for (int frame = 0; frame < kFrames; ++frame) {
         SCOPED_TRACE(frame);
-        for (const Mesh& mesh : meshes)
+        for (const Mesh& mesh : fMeshes)
             renderer().writeBuffer(mesh.glBuffer, everywhere(5.0F));
-        evaluate(meshes, frame, [&] {
-            // The middle mesh changes its level of detail: its buffer goes and another comes.
-            EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(meshes[1].shared), CL_SUCCESS);
-            renderer().deleteBuffer(meshes[1].glBuffer);
-            meshes[1].glBuffer = renderer().makeBuffer(everywhere(5.0F));
+        evaluate(frame, [&] {
+            // The mesh changes its level of detail: its buffer goes and another comes.
+            EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(changing.shared), CL_SUCCESS);
+            renderer().deleteBuffer(changing.glBuffer);
+            changing.glBuffer = renderer().makeBuffer(everywhere(5.0F));
             renderer().finish();
-            share(meshes[1]);
-            EXPECT_FALSE(meshes[1].shared->fInBatch);
-            meshes[1].alone = true;
+            share(changing);
+            EXPECT_FALSE(changing.shared->fInBatch);
+            changing.alone = true;
         });
-        meshes[1].alone = GetParam().forceThreading != nullptr; // it has joined the batch
-        for (const Mesh& mesh : meshes)
+        changing.alone = GetParam().forceThreading != nullptr; // it has joined the batch
+        for (const Mesh& mesh : fMeshes)
             EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements), everywhere(12.0F));
     }
 }
