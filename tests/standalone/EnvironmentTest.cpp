@@ -20,7 +20,6 @@ std::int32_t read(const char* text)
 
 TEST(Environment, ReadsWholeIntegersAndNothingElse)
 {
-    EXPECT_EQ(read("0"), 0);
     EXPECT_EQ(read("-42"), -42);
     EXPECT_EQ(read("2147483647"), INT32_MAX);
     EXPECT_EQ(read("-2147483648"), INT32_MIN);
@@ -37,6 +36,10 @@ TEST(Environment, AnswersTheDefaultForAMissingVariable)
     removeEnvironment(variable);
     EXPECT_EQ(VyraGetEnv(variable), nullptr);
     EXPECT_EQ(TenvironmentVariable(variable).asInt32(defaultValue), defaultValue);
+#ifndef _WIN32 // where a variable that is set to the empty text is removed
+    setEnvironment(variable, "");
+    EXPECT_STREQ(VyraGetEnv(variable), "");
+#endif
 }
 
 } // namespace

@@ -59,17 +59,20 @@ TEST(String, CutsExtendsWithNulBytesAndAppends)
 
 TEST(String, FindsTextsAndCharacters)
 {
-    const Tstring text("one two one \xc3\xa9 \xe2\x82\xac");
+    const Tstring text("one two one \xc3\xa9 \xe2\x82\xac \xed\xa0\xbd");
     for (const auto& [from, found] : {std::pair(0, 0), {1, 8}, {8, 8}, {9, -1}, {-5, 0}, {99, -1}})
         EXPECT_EQ(text.findMB("one", from), found) << from;
     EXPECT_EQ(text.findMB("three"), -1);
     EXPECT_EQ(text.findMB(static_cast<const char*>(nullptr)), -1);
 
     EXPECT_EQ(text.findMB(L' ', 4), 7);
-    // The last is half of a surrogate pair.
+    // The last is half of a surrogate pair, which has no bytes.
     for (const auto& [code, found] :
          {std::pair(L' ', 3), {L'\t', -1}, {L'\u00e9', 12}, {L'\u20ac', 15}, {wchar_t{0xd83d}, -1}})
         EXPECT_EQ(text.findMB(code), found) << int{code};
+    if (sizeof(wchar_t) > 2) {
+        EXPECT_EQ(Tstring("a\xf0\x9f\x98\x80").findMB(static_cast<wchar_t>(0x1f600)), 1);
+    }
 }
 
 TEST(String, TrimsSpacesOnlyAndOnlyOutside)
