@@ -1,5 +1,6 @@
 #include "evaluator/KernelLibrary.h"
 
+#include "evaluator/KernelBuild.h"
 #include "evaluator/WarningCapture.h"
 
 #include "diagnostics/CLErrorCodes.h"
@@ -17,12 +18,9 @@
 namespace vyra {
 namespace {
 
-// Without -cl-fast-relaxed-math: the bounds of the deformers' errors hold on every device.
-constexpr const char* kBuildOptions = "-cl-no-signed-zeros -Werror";
-
 std::string buildOptions(const std::string& added)
 {
-    return added.empty() ? std::string(kBuildOptions) : kBuildOptions + (" " + added);
+    return added.empty() ? std::string(kKernelBuildOptions) : kKernelBuildOptions + (" " + added);
 }
 
 // Why the file cannot be a kernel file; empty if it has contents that can be read.

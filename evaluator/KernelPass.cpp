@@ -1,6 +1,7 @@
 #include "evaluator/KernelPass.h"
 
 #include "evaluator/ConstantStorage.h"
+#include "evaluator/KernelBuild.h"
 
 #include "diagnostics/CLErrorCodes.h"
 
@@ -13,9 +14,6 @@ namespace {
 
 // Vertex count, positions and normals, deformed positions and normals.
 constexpr cl_uint kCommonArguments = 5;
-
-// Work-items. Smaller than what some runtimes allow, so that one mesh occupies all compute units.
-constexpr std::size_t kLargestWorkGroup = 256;
 
 } // namespace
 

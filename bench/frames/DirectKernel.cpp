@@ -2,19 +2,17 @@
 
 #include "diagnostics/CLErrorCodes.h"
 #include "evaluator/Evaluator.h"
+#include "evaluator/KernelBuild.h"
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <algorithm>
 #include <cstring>
 #include <stdexcept>
 #include <string>
 
 namespace {
-
-// As the evaluator builds them.
-constexpr const char* kBuildOptions = "-cl-no-signed-zeros -Werror";
-constexpr std::size_t kLargestWorkGroup = 256;
 
 AutoCLObject<cl_mem> createMemory(cl_mem_flags flags, std::size_t size, const void* contents)
 {
@@ -53,7 +51,7 @@ DirectKernel::DirectKernel(vyra::Deformer& deformer, unsigned pass, ConstantCopi
     TstringArray includes;
     includes.append(Tstring(directory.c_str()));
     const std::string file = directory + "/" + std::string(source.file);
-    const std::string options = kBuildOptions + (" " + std::string(source.options));
+    const std::string options = vyra::kKernelBuildOptions + (" " + std::string(source.options));
     TopenCLInfo& info = TopenCLInfo::theOne();
     fKernel = info.kernelStore().getKernel(file.c_str(), options.c_str(),
                                            std::string(source.function).c_str(), &includes);
@@ -61,7 +59,7 @@ DirectKernel::DirectKernel(vyra::Deformer& deformer, unsigned pass, ConstantCopi
         throw std::runtime_error("the kernel file " + file + " cannot be used");
     std::size_t global = 0;
     requireSuccess(info.getWorkGroupSizes(fKernel.get(), 1, global, fWorkGroupSize));
-    fWorkGroupSize = std::min(fWorkGroupSize, kLargestWorkGroup);
+    fWorkGroupSize = std::min(fWorkGroupSize, vyra::kLargestWorkGroup);
 }
 
 DirectKernel::~DirectKernel()

@@ -98,8 +98,6 @@ public:
         }
     }
 
-    const char* name() const override { return "read back"; }
-
     void deform() override
     {
         tbb::parallel_for(std::size_t{0}, fQueues.size(), [this](std::size_t i) {

@@ -13,8 +13,6 @@ public:
         require(fEvaluator.prepare());
     }
 
-    const char* name() const override { return "shared"; }
-
     void deform() override
     {
         fEvaluator.evaluate(em::Id(fFrame));

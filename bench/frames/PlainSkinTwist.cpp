@@ -1,13 +1,21 @@
-#include "VectorDeformation.h"
+#include "CpuDeformation.h"
+#include "SkinTwistPose.h"
 
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <vector>
+
+#include <tbb/blocked_range.h>
+#include <tbb/parallel_for.h>
 
 namespace {
 
 using viewer::Mesh;
 using vyra::MatrixRows;
+
+// Vertices of a task: enough to hide the cost of a task, few enough to divide a single mesh.
+constexpr std::size_t kGrain = 1024;
 
 using Float4 = float __attribute__((vector_size(16))); // x, y, z and one to spare
 
@@ -83,10 +91,10 @@ void copyVertex(const Mesh& mesh, std::size_t vertex, Block& block, std::size_t 
     block.normals.set(slot, Float4{n.x(), n.y(), n.z(), 0});
 }
 
-void twist(const VectorPose& pose, std::size_t count, Block& block)
+void twist(const TwistPose& pose, std::size_t count, Block& block)
 {
-    const MatrixRows& m = pose.geometryMatrix;
-    const MatrixRows& w = pose.inverseGeometryMatrix;
+    const MatrixRows& m = pose.toTwist;
+    const MatrixRows& w = pose.fromTwist;
     auto& [px, py, pz] = block.positions;
     auto& [nx, ny, nz] = block.normals;
     for (std::size_t i = 0; i < count; ++i) {
@@ -96,9 +104,9 @@ void twist(const VectorPose& pose, std::size_t count, Block& block)
         const float u = w[0] * nx[i] + w[4] * ny[i] + w[8] * nz[i];
         const float t = w[2] * nx[i] + w[6] * ny[i] + w[10] * nz[i];
         const float v =
-            w[1] * nx[i] + w[5] * ny[i] + w[9] * nz[i] - pose.twistPerHeight * (z * u - x * t);
-        const float c = std::cos(pose.twistPerHeight * y);
-        const float s = std::sin(pose.twistPerHeight * y);
+            w[1] * nx[i] + w[5] * ny[i] + w[9] * nz[i] - pose.anglePerHeight * (z * u - x * t);
+        const float c = std::cos(pose.anglePerHeight * y);
+        const float s = std::sin(pose.anglePerHeight * y);
         const float turnedX = c * x + s * z;
         const float turnedZ = c * z - s * x;
         px[i] = w[0] * turnedX + w[1] * y + w[2] * turnedZ + w[3];
@@ -116,14 +124,14 @@ void twist(const VectorPose& pose, std::size_t count, Block& block)
     }
 }
 
-} // namespace
-
-void deformWithVectors(const VectorPose& pose, std::size_t begin, std::size_t end,
-                       vyra::Vector3* positions, vyra::Vector3* normals)
+// Deforms the vertices from `begin` up to `end`.
+void deformRange(const viewer::CharacterMesh& character, const TwistPose& pose, std::size_t begin,
+                 std::size_t end, vyra::Vector3* positions, vyra::Vector3* normals)
 {
-    const Mesh& mesh = *pose.mesh;
-    std::vector<Columns> bones(pose.bones->size());
-    std::transform(pose.bones->begin(), pose.bones->end(), bones.begin(), columnsOf);
+    const Mesh& mesh = character.mesh();
+    std::vector<Columns> bones(character.pose.bones.size());
+    std::transform(character.pose.bones.begin(), character.pose.bones.end(), bones.begin(),
+                   columnsOf);
     Block block;
     for (std::size_t first = begin; first < end; first += kBlock) {
         const std::size_t count = std::min(kBlock, end - first);
@@ -141,4 +149,30 @@ void deformWithVectors(const VectorPose& pose, std::size_t begin, std::size_t en
             normals[first + i] = {n.x[i], n.y[i], n.z[i]};
         }
     }
+}
+
+class PlainSkinTwist final : public CpuDeformation {
+public:
+    explicit PlainSkinTwist(const viewer::Scene& scene) : fScene(scene) {}
+
+    void deform(std::size_t mesh, vyra::Vector3* positions, vyra::Vector3* normals) override
+    {
+        const viewer::CharacterMesh& character = *fScene.meshes()[mesh];
+        const TwistPose pose = twistPoseOf(character);
+        using Range = tbb::blocked_range<std::size_t>;
+        tbb::parallel_for(
+            Range(0, character.mesh().vertexCount(), kGrain), [&](const Range& range) {
+                deformRange(character, pose, range.begin(), range.end(), positions, normals);
+            });
+    }
+
+private:
+    const viewer::Scene& fScene;
+};
+
+} // namespace
+
+std::unique_ptr<CpuDeformation> makePlainSkinTwist(const viewer::Scene& scene)
+{
+    return std::make_unique<PlainSkinTwist>(scene);
 }
