@@ -24,15 +24,15 @@ typedef float8 real8;
 INLINE real8 blendedColumns(global const float* bones, const uint4 index, const real4 weight,
                             const uint pair)
 {
-    return weight.x * TO_REAL8(vload8(2 * index.x + pair, bones)) +
-           weight.y * TO_REAL8(vload8(2 * index.y + pair, bones)) +
-           weight.z * TO_REAL8(vload8(2 * index.z + pair, bones)) +
-           weight.w * TO_REAL8(vload8(2 * index.w + pair, bones));
+    return weight.x * TO_REAL8(vload8(pair, bones + 16 * (size_t)index.x)) +
+           weight.y * TO_REAL8(vload8(pair, bones + 16 * (size_t)index.y)) +
+           weight.z * TO_REAL8(vload8(pair, bones + 16 * (size_t)index.z)) +
+           weight.w * TO_REAL8(vload8(pair, bones + 16 * (size_t)index.w));
 }
 
 INLINE real4 crossProduct(const real4 a, const real4 b)
 {
-    return a.yzxw * b.zxyw - a.zxyw * b.yzxw;
+    return a * b.yzxw - a.yzxw * b;
 }
 
 kernel void skin(const uint vertexCount, global const float* positions,
@@ -60,9 +60,10 @@ kernel void skin(const uint vertexCount, global const float* positions,
     // The columns of the cofactors carry normals through any blend, also a sheared one; the sign of
     // the determinant keeps them outside of a mirrored mesh.
     const real4 yz = crossProduct(y, z);
-    const real4 normal = yz * normals[at] + crossProduct(z, x) * normals[at + 1] +
+    const real4 turned = yz * normals[at] + crossProduct(z, x) * normals[at + 1] +
                          crossProduct(x, y) * normals[at + 2];
-    const real4 volumes = x * yz;
+    const real4 normal = turned.yzxw;
+    const real4 volumes = x.zxyw * yz;
     const real side = volumes.x + volumes.y + volumes.z < 0 ? -1 : 1;
     const real squared = normal.x * normal.x + normal.y * normal.y + normal.z * normal.z;
     const real4 unit = normal * (squared > 0 ? side * rsqrt(squared) : side);
