@@ -42,7 +42,22 @@ std::optional<GlDevice> GlDevice::create(GlFunctions::Resolver resolve)
     if (device.mark_ == nullptr)
         return std::nullopt;
     device.gl_.genBuffers(1, &device.staging_);
+    device.reportsImmutable_ = device.findsImmutableStorage();
     return device;
+}
+
+// OpenGL 4.4 and the extension GL_ARB_buffer_storage have it.
+bool GlDevice::findsImmutableStorage() const
+{
+    while (gl_.getError() != GL_NO_ERROR) {
+    }
+    GLuint buffer = 0;
+    gl_.genBuffers(1, &buffer);
+    gl_.bindBuffer(GL_COPY_READ_BUFFER, buffer);
+    static_cast<void>(parameter(GL_BUFFER_IMMUTABLE_STORAGE));
+    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    gl_.deleteBuffers(1, &buffer);
+    return succeeded();
 }
 
 void GlDevice::destroy()
@@ -59,11 +74,17 @@ std::optional<std::size_t> GlDevice::bufferSize(GLuint name) const
 {
     if (gl_.isBuffer(name) != GL_TRUE)
         return std::nullopt;
-    GLint64 size = 0;
     gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
-    gl_.getBufferParameteri64v(GL_COPY_READ_BUFFER, GL_BUFFER_SIZE, &size);
+    const GLint64 size = parameter(GL_BUFFER_SIZE);
     gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
     return static_cast<std::size_t>(size);
+}
+
+GLint64 GlDevice::parameter(GLenum name) const
+{
+    GLint64 value = 0;
+    gl_.getBufferParameteri64v(GL_COPY_READ_BUFFER, name, &value);
+    return value;
 }
 
 bool GlDevice::prepareCopy(GLuint name, std::size_t size) const
@@ -140,16 +161,46 @@ void* GlDevice::address(GLuint name, std::size_t size) const
 {
     if (!keepsBuffersInMemory_ || gl_.isBuffer(name) != GL_TRUE)
         return nullptr;
+    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
+    void* const mapped = addressOfBound(size);
+    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    return mapped;
+}
+
+void* GlDevice::addressOfBound(std::size_t size) const
+{
     // Contexts that share one buffer look at it in turn.
     static std::mutex theMutex;
     const std::scoped_lock lock(theMutex);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
     void* mapped = gl_.mapBufferRange(GL_COPY_READ_BUFFER, 0, static_cast<GLsizeiptr>(size),
                                       GL_MAP_WRITE_BIT | GL_MAP_UNSYNCHRONIZED_BIT);
     if (mapped != nullptr)
         gl_.unmapBuffer(GL_COPY_READ_BUFFER);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
     return mapped;
+}
+
+GlDevice::CallerLook::CallerLook(const GlDevice& device) : device_(device)
+{
+    device_.gl_.getIntegerv(GL_COPY_READ_BUFFER_BINDING, &bound_);
+}
+
+GlDevice::CallerLook::~CallerLook()
+{
+    device_.gl_.bindBuffer(GL_COPY_READ_BUFFER, static_cast<GLuint>(bound_));
+}
+
+// Whatever could make the mapping fail is looked at before, as errors are the application's.
+// Immutable storage may not be mappable; such a buffer is new, and its storage another one.
+void* GlDevice::CallerLook::address(GLuint name, std::size_t size) const
+{
+    const GlFunctions& gl = device_.gl_;
+    if (!device_.reportsImmutable_ || gl.isBuffer(name) != GL_TRUE)
+        return nullptr;
+    gl.bindBuffer(GL_COPY_READ_BUFFER, name);
+    const bool canBeMapped = device_.parameter(GL_BUFFER_SIZE) >= static_cast<GLint64>(size) &&
+                             device_.parameter(GL_BUFFER_MAPPED) == GL_FALSE &&
+                             device_.parameter(GL_BUFFER_IMMUTABLE_STORAGE) == GL_FALSE;
+    return canBeMapped ? device_.addressOfBound(size) : nullptr;
 }
 
 // Pinning needs a program in use that could be captured from; nothing is ever drawn with it.

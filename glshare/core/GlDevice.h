@@ -62,9 +62,32 @@ public:
     // On any thread: waits for what was drawn on the context that is current on it.
     void finishCaller() const { gl_.finish(); }
 
+    // Looks at buffers on any thread, with the context of this share group that is current on it,
+    // and leaves the state of that context and its errors as they were.
+    class CallerLook {
+    public:
+        explicit CallerLook(const GlDevice& device);
+        ~CallerLook();
+        CallerLook(const CallerLook&) = delete;
+        CallerLook& operator=(const CallerLook&) = delete;
+
+        // As GlDevice::address, of a buffer that had an address before. Null also if only the
+        // worker's own context can look.
+        [[nodiscard]] void* address(GLuint name, std::size_t size) const;
+
+    private:
+        const GlDevice& device_;
+        GLint bound_ = 0; // what the application has bound
+    };
+
 private:
     GlDevice() = default;
 
+    // The address of the buffer that is bound to GL_COPY_READ_BUFFER, which may be mapped.
+    [[nodiscard]] void* addressOfBound(std::size_t size) const;
+    // A fact about that buffer.
+    [[nodiscard]] GLint64 parameter(GLenum name) const;
+    [[nodiscard]] bool findsImmutableStorage() const;
     [[nodiscard]] bool buildPinProgram();
     [[nodiscard]] bool prepareCopy(GLuint name, std::size_t size) const;
     [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
@@ -74,6 +97,7 @@ private:
 
     GlFunctions gl_;
     bool isEs_ = false;
+    bool reportsImmutable_ = false;     // whether buffers report immutable storage
     bool keepsBuffersInMemory_ = false; // where they can be pinned
     GLuint pinProgram_ = 0;             // made with the first pin
     GLuint staging_ = 0;                // a buffer of our own, for copies that OpenGL has to make

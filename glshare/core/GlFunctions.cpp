@@ -20,10 +20,11 @@ bool GlFunctions::load(Resolver resolve)
     };
     static_cast<void>(found(getBufferSubData, "glGetBufferSubData")); // OpenGL ES has none
     return found(getString, "glGetString") && found(finish, "glFinish") &&
-           found(getError, "glGetError") && found(isBuffer, "glIsBuffer") &&
-           found(genBuffers, "glGenBuffers") && found(deleteBuffers, "glDeleteBuffers") &&
-           found(bindBuffer, "glBindBuffer") && found(bindBufferBase, "glBindBufferBase") &&
-           found(bufferData, "glBufferData") && found(bufferSubData, "glBufferSubData") &&
+           found(getError, "glGetError") && found(getIntegerv, "glGetIntegerv") &&
+           found(isBuffer, "glIsBuffer") && found(genBuffers, "glGenBuffers") &&
+           found(deleteBuffers, "glDeleteBuffers") && found(bindBuffer, "glBindBuffer") &&
+           found(bindBufferBase, "glBindBufferBase") && found(bufferData, "glBufferData") &&
+           found(bufferSubData, "glBufferSubData") &&
            found(copyBufferSubData, "glCopyBufferSubData") &&
            found(getBufferParameteri64v, "glGetBufferParameteri64v") &&
            found(mapBufferRange, "glMapBufferRange") && found(unmapBuffer, "glUnmapBuffer") &&

@@ -17,6 +17,7 @@ struct GlFunctions {
     const GLubyte*(APIENTRYP getString)(GLenum) = nullptr;
     void(APIENTRYP finish)() = nullptr;
     GLenum(APIENTRYP getError)() = nullptr;
+    void(APIENTRYP getIntegerv)(GLenum, GLint*) = nullptr;
 
     PFNGLISBUFFERPROC isBuffer = nullptr;
     PFNGLGENBUFFERSPROC genBuffers = nullptr;

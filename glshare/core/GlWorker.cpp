@@ -104,4 +104,9 @@ void GlWorker::finishCaller() const
     loop_->finishCaller();
 }
 
+GlDevice::CallerLook GlWorker::lookFromCaller() const
+{
+    return loop_->lookFromCaller();
+}
+
 } // namespace glshare

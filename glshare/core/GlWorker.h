@@ -52,6 +52,9 @@ public:
     // Waits for what was drawn on the context that is current on the calling thread.
     void finishCaller() const;
 
+    // Looks at buffers with the context that is current on the calling thread.
+    [[nodiscard]] GlDevice::CallerLook lookFromCaller() const;
+
 private:
     class Loop;
 

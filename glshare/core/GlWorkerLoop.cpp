@@ -252,6 +252,11 @@ void GlWorker::Loop::finishCaller() const
     device_->finishCaller();
 }
 
+GlDevice::CallerLook GlWorker::Loop::lookFromCaller() const
+{
+    return GlDevice::CallerLook(*device_);
+}
+
 void GlWorker::Loop::leaveDisplay()
 {
     Lock lock(mutex_);

@@ -43,6 +43,7 @@ public:
 
     [[nodiscard]] bool callerSharesObjects() const;
     void finishCaller() const;
+    [[nodiscard]] GlDevice::CallerLook lookFromCaller() const;
 
     // Lets go of the GL side when its display closes, and parks the thread when the process exits:
     // the exit handlers of the drivers must not run beside a thread that uses them, nor beside one

@@ -4,6 +4,7 @@
 #include "glshare.h"
 
 #include <array>
+#include <functional>
 #include <thread>
 
 namespace {
@@ -69,6 +70,33 @@ TEST_F(BufferContentsTest, ReallocationWhileAcquiredIsHarmless)
     redraw(buffer_, from(21));
     glFinish();
     roundTrip(buffer_, memory_, from(21), from(31));
+}
+
+// Acquires look at buffers with the context that is current on the calling thread.
+TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndTheErrorsOfTheCaller)
+{
+    const GLuint bound = makeGlBuffer(from(4));
+    const auto bytes = static_cast<GLsizeiptr>(count_ * sizeof(cl_int));
+    const std::function<void()> changes[] = {
+        [] {}, [this] { refill(buffer_, numbersFrom(2, 2 * count_)); },
+        [this] { glMapBuffer(GL_ARRAY_BUFFER, GL_READ_ONLY); },
+        [bytes] {
+            glUnmapBuffer(GL_ARRAY_BUFFER);
+            glBufferStorage(GL_ARRAY_BUFFER, bytes, nullptr, 0);
+        }};
+    for (const auto& change : changes) {
+        SCOPED_TRACE(&change - changes);
+        glBindBuffer(GL_ARRAY_BUFFER, buffer_);
+        change();
+        glBindBuffer(GL_COPY_READ_BUFFER, bound);
+        EXPECT_EQ(queue_.acquire(memory_), CL_SUCCESS);
+        EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
+        clFinish(queue_);
+        GLint now = 0;
+        glGetIntegerv(GL_COPY_READ_BUFFER_BINDING, &now);
+        EXPECT_EQ(static_cast<GLuint>(now), bound);
+        EXPECT_EQ(glGetError(), static_cast<GLenum>(GL_NO_ERROR));
+    }
 }
 
 // Storage that the application keeps mapped, and storage that nobody may map.
