@@ -231,7 +231,7 @@ void explainStop(const Facts& facts, Stop& stop)
 {
     kExplanations[static_cast<std::size_t>(stop.step)](facts, stop);
     const std::vector<std::string>& layers = facts.loader.missingLayers;
-    if (layers.empty() || stop.step < Step::kLoader)
+    if (layers.empty() || stop.step == Step::kRenderer)
         return;
     stop.reason =
         "OPENCL_LAYERS names " + quotedList(layers) + ", which is not a file. " + stop.reason;
