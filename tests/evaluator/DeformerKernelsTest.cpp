@@ -287,8 +287,8 @@ TEST_F(DeformerKernels, SineAndCosineStayWithinTheirBound)
     std::vector<float> cosines(angles.size());
     for (const char* options : {"", "-D NotFused"}) {
         SCOPED_TRACE(options);
-        cl::Kernel both =
-            kernel(VYRA_TEST_KERNELS "/sine_and_cosine.cl", "sinesAndCosines", options);
+        cl::Kernel both = kernel(VYRA_TEST_KERNELS "/evaluator/kernels/sine_and_cosine.cl",
+                                 "sinesAndCosines", options);
         const std::array buffers{memory(angles), memory(sines), memory(cosines)};
         Arguments arguments(fContext, both);
         arguments.value(count);
@@ -307,6 +307,36 @@ TEST_F(DeformerKernels, SineAndCosineStayWithinTheirBound)
         EXPECT_LT(largest, kBound);
         for (std::size_t i = withinBound; i < angles.size(); ++i)
             EXPECT_NEAR(std::hypot(sines[i], cosines[i]), 1, 1e-6) << angles[i];
+    }
+}
+
+// Each once, for tools that look at the accesses of kernels.
+TEST_F(DeformerKernels, KernelsOfTestsLeavePaddingUnchanged)
+{
+    constexpr cl_uint kCount = kWorkGroup + 1;
+    for (const char* function : {"add", "scale", "sinesAndCosines"}) {
+        SCOPED_TRACE(function);
+        const bool isDeformer = std::string_view(function) != "sinesAndCosines";
+        cl::Kernel tested =
+            kernel(isDeformer ? VYRA_TEST_KERNELS "/library/kernels/deform.cl"
+                              : VYRA_TEST_KERNELS "/evaluator/kernels/sine_and_cosine.cl",
+                   function, "");
+        std::vector<float> values(2 * kWorkGroup, 0.5f);
+        const std::array buffers{memory(values), memory(values), memory(values)};
+        Arguments arguments(fContext, tested);
+        if (isDeformer) {
+            arguments.add(buffers[1]);
+            arguments.value(3.0f);
+        }
+        arguments.value(kCount);
+        if (!isDeformer) {
+            for (const cl::Buffer& buffer : buffers)
+                arguments.add(buffer);
+        }
+        run(tested, kCount);
+        read(buffers[1], values);
+        EXPECT_NE(values[kCount - 1], 0.5f);
+        EXPECT_EQ(values[kCount], 0.5f);
     }
 }
 
