@@ -91,18 +91,13 @@ TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
     const auto renderbuffer = [](cl_context context, cl_mem_flags flags) {
         return [=](cl_int* error) { return clCreateFromGLRenderbuffer(context, flags, 1, error); };
     };
-    using CreateTexture = decltype(&clCreateFromGLTexture);
-    const auto texture = [](CreateTexture create, cl_context context, cl_mem_flags flags,
-                            cl_GLenum target, cl_GLint level) {
+    const auto texture = [](auto create, cl_context context, cl_mem_flags flags, cl_GLenum target,
+                            cl_GLint level) {
         return [=](cl_int* error) { return create(context, flags, target, level, 1, error); };
     };
-    const auto find = [&](const char* name) {
-        return reinterpret_cast<CreateTexture>(
-            clGetExtensionFunctionAddressForPlatform(platform_, name));
-    };
-    const CreateTexture any = find("clCreateFromGLTexture");
-    const CreateTexture flat = find("clCreateFromGLTexture2D");
-    const CreateTexture solid = find("clCreateFromGLTexture3D");
+    const auto any = clCreateFromGLTexture;
+    const auto flat = clCreateFromGLTexture2D;
+    const auto solid = clCreateFromGLTexture3D;
     const std::tuple<const char*, cl_int, std::function<cl_mem(cl_int*)>> rows[] = {
         {"no context", CL_INVALID_CONTEXT, buffer(nullptr, kUse, buffer_)},
         {"a context that does not share", CL_INVALID_CONTEXT, buffer(plain, kUse, buffer_)},
@@ -146,53 +141,37 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
     constexpr cl_context_properties kEgl = CL_EGL_DISPLAY_KHR;
     constexpr cl_context_properties kNonsense = 0x5eed;
     constexpr cl_int kNoShareGroup = CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    struct Row {
-        const char* what;
-        cl_context_properties context;
-        Properties others;
-        cl_int error;
-        cl_int errorOfQuery = error;
-    };
-    const Row rows[] = {
-        {"no display", gl, {}, kNoShareGroup},
-        {"an unknown context", kNonsense, {kEgl, display}, kNoShareGroup},
-        {"an unknown display", gl, {kEgl, kNonsense}, kNoShareGroup},
-        {"two systems", gl, {kEgl, display, CL_GLX_DISPLAY_KHR, display}, CL_INVALID_OPERATION},
-        {"a window system of elsewhere", gl, {CL_WGL_HDC_KHR, display}, CL_INVALID_OPERATION},
-        {"a share group of elsewhere", gl, {CL_CGL_SHAREGROUP_KHR, gl}, CL_INVALID_OPERATION},
-        {"a property twice", gl, {kEgl, display, kEgl, display}, CL_INVALID_PROPERTY},
-        {"a platform twice",
-         gl,
-         {kEgl, display, CL_CONTEXT_PLATFORM, reinterpret_cast<cl_context_properties>(platform_)},
-         CL_INVALID_PROPERTY},
-        {"neither true nor false",
-         gl,
-         {kEgl, display, CL_CONTEXT_INTEROP_USER_SYNC, 2},
-         CL_INVALID_PROPERTY},
-        {"an unknown name",
-         gl,
-         {kEgl, display, kNonsense, 1},
-         CL_INVALID_PROPERTY,
-         CL_INVALID_VALUE},
-    };
+    const cl_context_properties platform = reinterpret_cast<cl_context_properties>(platform_);
     const std::ptrdiff_t threads = threadsOfProcess();
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.what);
-        Properties entries{CL_GL_CONTEXT_KHR, row.context};
-        entries.insert(entries.end(), row.others.begin(), row.others.end());
-        const Properties list = properties(entries);
+    const auto check = [&](const char* what, cl_int expected, Properties others,
+                           cl_context_properties context = 0, cl_int ofQuery = CL_SUCCESS) {
+        SCOPED_TRACE(what);
+        others.insert(others.begin(), {CL_GL_CONTEXT_KHR, context == 0 ? gl : context});
+        const Properties list = properties(others);
         cl_int error = CL_SUCCESS;
         EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
-        EXPECT_EQ(error, row.error);
+        EXPECT_EQ(error, expected);
         EXPECT_EQ(
             clCreateContextFromType(list.data(), CL_DEVICE_TYPE_ALL, nullptr, nullptr, &error),
             nullptr);
-        EXPECT_EQ(error, row.error);
+        EXPECT_EQ(error, expected);
         cl_device_id device = nullptr;
         EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
                                         sizeof(cl_device_id), &device, nullptr),
-                  row.errorOfQuery);
-    }
+                  ofQuery == CL_SUCCESS ? expected : ofQuery);
+    };
+    check("no display", kNoShareGroup, {});
+    check("an unknown context", kNoShareGroup, {kEgl, display}, kNonsense);
+    check("an unknown display", kNoShareGroup, {kEgl, kNonsense});
+    check("two systems", CL_INVALID_OPERATION, {kEgl, display, CL_GLX_DISPLAY_KHR, display});
+    check("an absent window system", CL_INVALID_OPERATION, {CL_WGL_HDC_KHR, display});
+    check("an absent kind of share group", CL_INVALID_OPERATION, {CL_CGL_SHAREGROUP_KHR, gl});
+    check("a property twice", CL_INVALID_PROPERTY, {kEgl, display, kEgl, display});
+    check("a platform twice", CL_INVALID_PROPERTY, {kEgl, display, CL_CONTEXT_PLATFORM, platform});
+    check("neither true nor false", CL_INVALID_PROPERTY,
+          {kEgl, display, CL_CONTEXT_INTEROP_USER_SYNC, 2});
+    check("an unknown name", CL_INVALID_PROPERTY, {kEgl, display, kNonsense, 1}, 0,
+          CL_INVALID_VALUE);
     EXPECT_LE(threadsOfProcess(), threads);
 }
 
@@ -271,10 +250,8 @@ TEST_F(MisuseTest, FunctionsRefuseObjectsThatAreNotTheirs)
         {"memory: null", info(clGetMemObjectInfo, cl_mem(), CL_MEM_FLAGS), CL_INVALID_MEM_OBJECT},
         {"context: null", info(clGetContextInfo, cl_context(), CL_CONTEXT_PROPERTIES),
          CL_INVALID_CONTEXT},
-        {"context: retain", clRetainContext(nullptr), CL_INVALID_CONTEXT},
         {"context: release", clReleaseContext(nullptr), CL_INVALID_CONTEXT},
         {"event: null", info(clGetEventInfo, cl_event(), CL_EVENT_COMMAND_TYPE), CL_INVALID_EVENT},
-        {"event: retain", clRetainEvent(nullptr), CL_INVALID_EVENT},
         {"event: release", clReleaseEvent(nullptr), CL_INVALID_EVENT},
         {"event: set", clSetUserEventStatus(nullptr, CL_COMPLETE), CL_INVALID_EVENT},
         {"event: set a command's", clSetUserEventStatus(acquired, CL_COMPLETE), CL_INVALID_EVENT},

@@ -17,12 +17,9 @@ bool isWordOf(const std::string& list, const std::string& word)
 TEST_F(QueriesTest, ExtensionsAreAddedToDeviceAndPlatform)
 {
     std::size_t size = 0;
-    ASSERT_EQ(clGetDeviceInfo(device_, CL_DEVICE_EXTENSIONS, 0, nullptr, &size), CL_SUCCESS);
+    clGetDeviceInfo(device_, CL_DEVICE_EXTENSIONS, 0, nullptr, &size);
     std::string text(size, 'x');
-    EXPECT_EQ(clGetDeviceInfo(device_, CL_DEVICE_EXTENSIONS, size - 1, text.data(), nullptr),
-              CL_INVALID_VALUE);
-    ASSERT_EQ(clGetDeviceInfo(device_, CL_DEVICE_EXTENSIONS, size, text.data(), nullptr),
-              CL_SUCCESS);
+    clGetDeviceInfo(device_, CL_DEVICE_EXTENSIONS, size, text.data(), nullptr);
     EXPECT_EQ(text.find('\0'), size - 1);
     text.pop_back();
     for (const std::string& extensions : {text, extensionsOf(platform_)}) {
@@ -78,32 +75,24 @@ TEST_F(QueriesTest, CpuDevicesAreGpusUnlessSwitchedOff)
 
 TEST_F(QueriesTest, GlContextInfoNamesTheDevices)
 {
-    const auto get = [list = properties()](cl_gl_context_info name, std::size_t room,
-                                           cl_device_id* device, std::size_t* size) {
-        return clGetGLContextInfoKHR(list.data(), name, room, device, size);
-    };
-    for (const cl_gl_context_info name : std::vector<cl_gl_context_info>{
-             CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, CL_DEVICES_FOR_GL_CONTEXT_KHR}) {
-        SCOPED_TRACE(name);
-        std::size_t size = 0;
-        cl_device_id device = nullptr;
-        EXPECT_EQ(get(name, sizeof(cl_device_id), &device, &size), CL_SUCCESS);
-        EXPECT_EQ(device, device_);
-        EXPECT_EQ(size, sizeof(cl_device_id));
-        EXPECT_EQ(get(name, 1, &device, nullptr), CL_INVALID_VALUE);
-        EXPECT_EQ(get(CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device, nullptr), CL_INVALID_VALUE);
+    const Properties list = properties();
+    cl_device_id device = nullptr;
+    for (const cl_gl_context_info name :
+         {CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, CL_DEVICES_FOR_GL_CONTEXT_KHR}) {
+        EXPECT_EQ(infoOf<cl_device_id>(clGetGLContextInfoKHR, list.data(), name), device_);
     }
+    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device,
+                                    nullptr),
+              CL_INVALID_VALUE);
 }
 
 TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
 {
     const Properties list = properties();
     Properties seen(list.size());
-    std::size_t size = 0;
     EXPECT_EQ(clGetContextInfo(context_, CL_CONTEXT_PROPERTIES,
-                               seen.size() * sizeof(cl_context_properties), seen.data(), &size),
+                               seen.size() * sizeof(cl_context_properties), seen.data(), nullptr),
               CL_SUCCESS);
-    EXPECT_EQ(size, list.size() * sizeof(cl_context_properties));
     EXPECT_EQ(seen, list);
 
     const Memory memory = share(context_, buffer_, CL_MEM_READ_ONLY);
@@ -150,6 +139,10 @@ TEST_F(QueriesTest, SizesAreAnsweredAndChecked)
     };
     const std::pair<std::function<cl_int(std::size_t, void*, std::size_t*)>, std::size_t> rows[] = {
         {query(clGetDeviceInfo, device_, CL_DEVICE_TYPE), sizeof(cl_device_type)},
+        {query(clGetPlatformInfo, platform_, CL_PLATFORM_EXTENSIONS),
+         extensionsOf(platform_).size() + 1},
+        {query(clGetGLContextInfoKHR, list.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR),
+         sizeof(cl_device_id)},
         {query(clGetContextInfo, cl_context(context_), CL_CONTEXT_PROPERTIES),
          list.size() * sizeof list[0]},
         {query(clGetGLContextInfoKHR, list.data(), CL_DEVICES_FOR_GL_CONTEXT_KHR),
@@ -159,7 +152,7 @@ TEST_F(QueriesTest, SizesAreAnsweredAndChecked)
         {query(clGetEventInfo, cl_event(event), CL_EVENT_COMMAND_TYPE), sizeof(cl_command_type)},
     };
     for (const auto& [ask, expected] : rows) {
-        std::array<char, 256> value{};
+        std::array<char, 16384> value{};
         std::size_t size = 0;
         EXPECT_EQ(ask(0, nullptr, &size), CL_SUCCESS);
         EXPECT_EQ(size, expected);

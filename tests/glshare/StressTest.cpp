@@ -88,10 +88,9 @@ protected:
         ASSERT_EQ(glGetError(), GLenum{GL_NO_ERROR});
     }
 
-    // Runs `create` on as many threads, each with an OpenCL context of its own, while `meanwhile`
+    // Runs createObjects on as many threads, each with an OpenCL context of its own, while useGl
     // repeats on this thread. With `haveGl` each thread has a current OpenGL context, too.
-    void onThreads(std::size_t threads, bool haveGl, const std::function<void(cl_context)>& create,
-                   const std::function<void()>& meanwhile)
+    void onThreads(std::size_t threads, bool haveGl)
     {
         std::atomic<std::size_t> running = threads;
         std::vector<std::jthread> creators;
@@ -100,39 +99,25 @@ protected:
                 const EglTestContext own(haveGl ? gl_.get() : nullptr);
                 if (haveGl)
                     own.makeCurrent();
-                create(makeContext(properties(haveGl ? own.entries() : glEntries_)));
+                createObjects(makeContext(properties(haveGl ? own.entries() : glEntries_)));
                 EglTestContext::releaseCurrent();
                 --running;
             });
         }
         while (running > 0 && !HasFatalFailure())
-            meanwhile();
+            useGl();
     }
 
     std::shared_mutex turn_; // guards the buffer's contents, and:
     cl_int first_ = 1;       // its first number
 };
 
-TEST_F(StressTest, ContextsCreateObjectsOfOneBufferAtTheSameTime)
-{
-    const auto create = [this](cl_context context) {
-        for (int i = 0; i < 300; ++i)
-            share(context, buffer_);
-    };
-    for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
-        for (const std::size_t threads : {2U, 4U})
-            onThreads(threads, round % 2 != 0, create, std::this_thread::yield);
-    }
-}
-
 TEST_F(StressTest, ContextsCreateObjectsOfABufferThatOpenGlMapsAndDraws)
 {
     for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
         for (const std::size_t threads : {1U, 2U, 4U}) {
             for (const bool haveGl : {false, true})
-                onThreads(
-                    threads, haveGl, [this](cl_context context) { createObjects(context); },
-                    [this] { useGl(); });
+                onThreads(threads, haveGl);
         }
     }
 }
