@@ -1,21 +1,11 @@
 // Fuzzes the reading of NVIDIA driver versions, and the decisions that follow from a version.
+#include "Require.h"
 #include "runtime/DriverVersion.h"
 
 #include <cstdint>
-#include <cstdlib>
 #include <exception>
 #include <optional>
 #include <string>
-
-namespace {
-
-void require(bool holds)
-{
-    if (!holds)
-        std::abort();
-}
-
-} // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size)
 {

@@ -1,7 +1,8 @@
 // Fuzzes sequences of requests to the kernel store, with build options, and of kernel files that
-// are edited while the viewer runs. Each kernel must come from the program text and the options
-// that a model of the rules expects. Some OpenCL calls fail.
+// are edited while the viewer runs. Each kernel must come from the text and the options that were
+// requested, and nothing is left in the end. Some OpenCL calls fail.
 #include "FakeRuntime.h"
+#include "Require.h"
 
 #include "evaluator/KernelLibrary.h"
 #include "host/TstringArray.h"
@@ -9,9 +10,8 @@
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <fstream>
-#include <iostream>
+#include <iterator>
 #include <map>
 #include <optional>
 #include <set>
@@ -26,28 +26,14 @@ namespace {
 using Kernel = AutoCLObject<cl_kernel>;
 
 constexpr unsigned kMostSteps = 64;
-// Texts of programs: '*' stands for an argument of their kernels, "#error" does not build.
-const std::string kTexts[] = {"skin(*)", "twist(*)", "skin(*) twist", "skin(**)", "#error skin(*)"};
+const std::string kTexts[] = {"skin", "twist", "skin twist", "skin // edited", "#error skin"};
 const std::string kNames[] = {"skin", "twist"}; // of kernels, and of their files
-const char kLastOption[] = " -D SupportsDoublePrecision";
+const char kLibraryFlags[] = "-cl-no-signed-zeros -Werror";
 const char* const kCalls[] = {"clCreateProgramWithSource", "clBuildProgram", "clCreateKernel"};
 
-void require(bool holds, int line = __builtin_LINE())
+bool contains(const std::string& text, const std::string& part)
 {
-    if (holds)
-        return;
-    std::cerr << "The requirement in line " << line << " does not hold.\n";
-    std::abort();
-}
-
-bool compiles(const std::string& text)
-{
-    return text.find("#error") == std::string::npos;
-}
-
-cl_uint argumentsOf(const std::string& text)
-{
-    return static_cast<cl_uint>(std::count(text.begin(), text.end(), '*'));
+    return text.find(part) != std::string::npos;
 }
 
 // The programs that the runtime has seen, read from its log.
@@ -64,51 +50,32 @@ public:
         unsigned builds = 0;
         for (const std::string& call : scripted::runtime().takeCalls()) {
             const auto open = call.find('(') + 1;
-            const std::string function = call.substr(0, open - 1);
             const std::string first = call.substr(open, call.find(',') - open);
-            const auto made = call.rfind(" = ");
-            const std::string result = made == std::string::npos ? "" : call.substr(made + 3);
-            if (function == "clCreateProgramWithSource")
-                fPrograms[result] = {quoted(call), ""};
-            if (function == "clBuildProgram") {
-                fPrograms[first].options = quoted(call);
+            const auto quote = call.find('"') + 1;
+            const std::string quoted = call.substr(quote, call.rfind('"') - quote);
+            const std::string result = call.substr(call.rfind(' ') + 1);
+            if (call.starts_with("clCreateProgramWithSource"))
+                fPrograms[result] = {quoted, ""};
+            if (call.starts_with("clBuildProgram")) {
+                fPrograms[first].options = quoted;
                 ++builds;
             }
-            if (function == "clCreateKernel")
+            if (call.starts_with("clCreateKernel"))
                 fKernels[result] = first;
         }
         return builds;
     }
-    const Program& programOf(cl_kernel kernel) const
+    const Program& programOf(cl_kernel kernel)
     {
+        read();
         return fPrograms.at(fKernels.at(scripted::runtime().name(kernel)));
-    }
-    void clear()
-    {
-        fPrograms.clear();
-        fKernels.clear();
     }
 
 private:
-    // The text between the outermost double quotes.
-    static std::string quoted(const std::string& call)
-    {
-        const auto first = call.find('"') + 1;
-        return call.substr(first, call.rfind('"') - first);
-    }
-
     std::map<std::string, Program> fPrograms;
     std::map<std::string, std::string> fKernels; // to their programs
 };
 Log theLog;
-
-cl_int CL_API_CALL kernelInfo(cl_kernel kernel, cl_kernel_info, std::size_t, void* value,
-                              std::size_t*)
-{
-    theLog.read();
-    *static_cast<cl_uint*>(value) = argumentsOf(theLog.programOf(kernel).text);
-    return CL_SUCCESS;
-}
 
 // A directory with the kernel files.
 const std::string& directory()
@@ -119,28 +86,36 @@ const std::string& directory()
 }
 
 struct Request {
-    std::string program = "program skin";
-    std::string kernel = "skin";
-    std::string source = "skin(*)";
-    std::optional<std::string> flags = std::nullopt;
-    std::vector<std::string> directories{};
-};
+    std::string program;
+    std::string text;
+    std::optional<std::string> flags = kLibraryFlags;
+    std::vector<std::string> directories = {directory()};
 
-// The composition of options, written another way than the library's.
-std::string expectedOptions(const Request& request)
-{
-    std::string options =
-        request.flags.value_or("-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror");
-    for (const std::string& directory : request.directories) {
-        const auto first = directory.find_first_not_of(' ');
-        const auto last = directory.find_last_not_of(' ');
-        const std::string trimmed =
-            first == std::string::npos ? "" : directory.substr(first, last - first + 1);
-        const char* quote = trimmed.find(' ') == std::string::npos ? "" : "\"";
-        options += " -I " + (quote + trimmed) + quote;
+    // The composition of options, written another way than the library's.
+    std::string options() const
+    {
+        std::string options =
+            flags.value_or("-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror");
+        for (const std::string& each : directories) {
+            const auto first = std::min(each.find_first_not_of(' '), each.size());
+            const std::string trimmed = each.substr(first, each.find_last_not_of(' ') + 1 - first);
+            const char* quote = contains(trimmed, " ") ? "\"" : "";
+            options += " -I " + (quote + trimmed) + quote;
+        }
+        return options + " -D SupportsDoublePrecision";
     }
-    return options + kLastOption;
-}
+
+    Kernel send(const std::string& kernel) const
+    {
+        TstringArray list;
+        for (const std::string& each : directories)
+            list.append(Tstring(each.c_str()));
+        return store().getKernelFromString(text.c_str(), program.c_str(),
+                                           flags ? flags->c_str() : nullptr, kernel.c_str(),
+                                           directories.empty() ? nullptr : &list);
+    }
+    static TopenCLKernelStore& store() { return TopenCLInfo::theOne().kernelStore(); }
+};
 
 class Session {
 public:
@@ -149,54 +124,33 @@ public:
     void run()
     {
         for (unsigned step = 0; step < kMostSteps && fData.remaining_bytes() > 0; ++step) {
-            scripted::runtime().clearFaults();
             theLog.read();
-            fFailing = fData.ConsumeIntegralInRange<unsigned>(0, 11);
-            if (fails())
-                scripted::runtime().plan({.function = kCalls[fFailing]});
-            switch (fData.ConsumeIntegralInRange(0, 3)) {
-            case 0:
-                request();
-                break;
-            case 1:
-                giveBack();
-                break;
-            case 2:
-                useFile();
-                break;
-            default:
-                replaceFile();
-                break;
-            }
+            const auto failing = fData.ConsumeIntegralInRange<unsigned>(0, 11);
+            fFails = failing < std::size(kCalls);
+            if (fFails)
+                scripted::runtime().plan({.function = kCalls[failing]});
+            const auto steps = {&Session::request, &Session::giveBack, &Session::useFile,
+                                &Session::replaceFile};
+            (this->*steps.begin()[fData.ConsumeIntegralInRange(0, 3)])();
+            scripted::runtime().clearFaults();
         }
-        scripted::runtime().clearFaults();
         while (!fHeld.empty())
             giveBack();
+        fOfFiles.clear();
         fLibrary.reset();
-        dropPrograms();
+        // A program that no kernel could be made of stays in the store until one is given back;
+        // every text has the kernel of the empty name.
+        for (const std::string& fileName : kNames)
+            fSent.push_back({directory() + "/" + fileName, ""});
+        for (const Request& sent : fSent)
+            require(Request::store().freeKernel(sent.send("")) || contains(sent.text, "#error"));
     }
 
 private:
-    using Key = std::pair<std::string, std::string>; // name and options of a program
-    struct Cached {
-        std::string text;
-        unsigned kernels = 0; // handed out
-    };
-    struct Held {
-        Kernel kernel;
-        std::optional<Key> key; // none for a kernel of a file
-    };
     struct File {
         std::string text;
-        std::set<std::string> functions{}; // that were created
-
-        bool canBecome(const std::string& other) const
-        {
-            return compiles(other) && argumentsOf(other) == argumentsOf(text) &&
-                   std::all_of(functions.begin(), functions.end(), [&](const auto& function) {
-                       return other.find(function) != std::string::npos;
-                   });
-        }
+        std::set<std::string> requested{};
+        std::set<std::string> created{};
     };
 
     // An option or a directory: often one of a few, so that requests meet again.
@@ -207,82 +161,39 @@ private:
         return fData.ConsumeRandomLengthString(24).c_str(); // up to its first NUL
     }
     std::string name() { return fData.PickValueInArray(kNames); }
-    static TopenCLKernelStore& store() { return TopenCLInfo::theOne().kernelStore(); }
-    bool fails(unsigned call) const { return fFailing == call; }
-    bool fails() const { return fFailing < std::size(kCalls); }
-    // What the library requests for a program.
-    static Request ofLibrary(const std::string& program)
-    {
-        return {program, "", "", "-cl-no-signed-zeros -Werror", {directory()}};
-    }
 
-    // Changes one part of the last request, so that requests meet again.
-    void changeRequest()
-    {
-        switch (fData.ConsumeIntegralInRange(0, 5)) {
-        case 0:
-            fRequest.program = "program " + name();
-            break;
-        case 1:
-            fRequest.kernel = name();
-            break;
-        case 2:
-            fRequest.source = fData.PickValueInArray(kTexts);
-            break;
-        case 3:
-            fRequest.flags = fData.ConsumeBool() ? std::optional(text()) : std::nullopt;
-            break;
-        case 4:
-            fRequest.directories.push_back(text());
-            break;
-        default:
-            if (!fRequest.directories.empty())
-                fRequest.directories.pop_back();
-        }
-    }
-
-    static Kernel send(const Request& request)
-    {
-        TstringArray directories;
-        for (const std::string& directory : request.directories)
-            directories.append(Tstring(directory.c_str()));
-        return store().getKernelFromString(request.source.c_str(), request.program.c_str(),
-                                           request.flags ? request.flags->c_str() : nullptr,
-                                           request.kernel.c_str(),
-                                           request.directories.empty() ? nullptr : &directories);
-    }
-
+    // A program of one name always has one text.
     void request()
     {
-        changeRequest();
-        const Request& request = fRequest;
-        const Key key{request.program, expectedOptions(request)};
-        const Kernel kernel = send(request);
-        const bool cached = fCached.contains(key);
-        require(theLog.read() == (cached || fails(0) ? 0 : 1));
-        if (!cached && compiles(request.source) && !fails(0) && !fails(1))
-            fCached[key].text = request.source;
-        const auto entry = fCached.find(key);
-        const bool served = entry != fCached.end() && !fails(2) &&
-                            entry->second.text.find(request.kernel) != std::string::npos;
-        require(served == (kernel.get() != nullptr));
-        if (!served)
+        Request request{"", fData.PickValueInArray(kTexts), std::nullopt, {}};
+        request.program = "program " + request.text;
+        if (fData.ConsumeBool())
+            request.flags = text();
+        while (fData.ConsumeBool())
+            request.directories.push_back(text());
+        const std::string function = name();
+        const bool held = std::ranges::any_of(fHeld, [&](const Kernel& kernel) {
+            const Log::Program& program = theLog.programOf(kernel.get());
+            return program.text == request.text && program.options == request.options();
+        });
+        const Kernel kernel = request.send(function);
+        fSent.push_back(request);
+        require(theLog.read() <= (held ? 0 : 1));
+        const bool good = !contains(request.text, "#error") && contains(request.text, function);
+        require(good ? kernel.get() || fFails : !kernel.get());
+        if (!kernel.get())
             return;
-        require(theLog.programOf(kernel.get()).text == entry->second.text);
-        require(theLog.programOf(kernel.get()).options == key.second);
-        ++entry->second.kernels;
-        fHeld.push_back({kernel, key});
+        require(theLog.programOf(kernel.get()).text == request.text);
+        require(theLog.programOf(kernel.get()).options == request.options());
+        fHeld.push_back(kernel);
     }
 
     void giveBack()
     {
         if (fHeld.empty())
             return;
-        const auto held = fHeld.begin() + fData.ConsumeIntegralInRange<int>(0, 255) %
-                                              static_cast<int>(fHeld.size());
-        require(store().freeKernel(held->kernel) && !store().freeKernel(held->kernel));
-        if (held->key && --fCached.at(*held->key).kernels == 0)
-            fCached.erase(*held->key);
+        const auto held = fHeld.begin() + fData.ConsumeIntegral<std::uint8_t>() % std::ssize(fHeld);
+        require(Request::store().freeKernel(*held) && !Request::store().freeKernel(*held));
         fHeld.erase(held);
     }
 
@@ -290,56 +201,46 @@ private:
     void useFile()
     {
         const std::string fileName = name(), function = name();
-        File& file = fFiles.try_emplace(fileName, File{fileName + "(*)"}).first->second;
-        const vyra::LibraryKernel created = fLibrary->create({fileName, function});
-        const bool served = file.text.find(function) != std::string::npos;
+        File& file = fFiles.try_emplace(fileName, File{fileName}).first->second;
+        vyra::LibraryKernel created = fLibrary->create({fileName, function});
+        file.requested.insert(function);
         require(created.status.ok() == (created.kernel.get() != nullptr));
-        require(created.status.ok() == served || (served && fails()));
+        require(contains(file.text, function) ? created.status.ok() || fFails
+                                              : !created.status.ok());
         if (!created.status.ok())
             return;
-        theLog.read();
-        const Log::Program& program = theLog.programOf(created.kernel.get());
-        require(program.text == file.text && program.options == expectedOptions(ofLibrary("")));
-        file.functions.insert(function);
-        fHeld.push_back({created.kernel, std::nullopt});
+        require(theLog.programOf(created.kernel.get()).text == file.text);
+        require(theLog.programOf(created.kernel.get()).options == Request().options());
+        file.created.insert(function);
+        fOfFiles.push_back(std::move(created.kernel));
     }
 
+    // Every kernel that was created must fit, and one at least of those that were requested.
     void replaceFile()
     {
+        scripted::runtime().clearFaults();
         const std::string fileName = name(), text = fData.PickValueInArray(kTexts);
+        const auto has = [&](const std::string& function) { return contains(text, function); };
+        File& file = fFiles.try_emplace(fileName, File{fileName}).first->second;
+        const bool fits = !has("#error") && std::ranges::all_of(file.created, has) &&
+                          std::ranges::any_of(file.requested, has);
         const bool accepted = fLibrary->replaceFile(fileName, text).ok();
-        fReplaced.push_back(fileName + ", change " + std::to_string(fReplaced.size() + 1));
-        const auto file = fFiles.find(fileName);
-        const bool used = file != fFiles.end() && !file->second.functions.empty();
-        const bool good = !used || file->second.canBecome(text);
-        require(accepted == good || (good && fails()));
-        if (accepted && used)
-            file->second.text = text;
-    }
-
-    // A program that no kernel could be made of stays in the store until one is given back; every
-    // text has the kernel of the empty name.
-    void dropPrograms()
-    {
-        const auto drop = [](const Request& request) {
-            require(store().freeKernel(send(request)));
-        };
-        for (const auto& [key, cached] : fCached)
-            drop({key.first, "", "", key.second.substr(0, key.second.rfind(kLastOption))});
-        for (const std::string& program : fReplaced)
-            drop(ofLibrary(program));
-        for (const std::string& fileName : kNames)
-            drop(ofLibrary(directory() + "/" + fileName));
+        fSent.push_back({fileName + ", change " + std::to_string(++fReplaced), text});
+        require(accepted == (fits || file.requested.empty()));
+        if (!fits)
+            return;
+        file.text = text;
+        std::ranges::copy_if(file.requested, std::inserter(file.created, file.created.end()), has);
     }
 
     FuzzedDataProvider& fData;
-    unsigned fFailing = 0; // the next call of this index in kCalls
-    Request fRequest;
-    std::vector<Held> fHeld;
-    std::map<Key, Cached> fCached;
+    bool fFails = false; // a call of this step
+    std::vector<Request> fSent;
+    std::vector<Kernel> fHeld;
+    std::vector<vyra::StoreKernel> fOfFiles;
     std::map<std::string, File> fFiles;
-    std::vector<std::string> fReplaced;
-    vyra::OpenCLFunctions fFunctions{.clGetKernelInfo = kernelInfo};
+    unsigned fReplaced = 0;
+    vyra::OpenCLFunctions fFunctions{.clGetKernelInfo = clGetKernelInfo};
     std::optional<vyra::KernelLibrary> fLibrary{std::in_place, fFunctions,
                                                 std::vector{directory()}};
 };
@@ -351,7 +252,7 @@ extern "C" int LLVMFuzzerInitialize(int* /*argumentCount*/, char*** /*arguments*
     scripted::runtime().describe(scripted::World());
     require(TopenCLInfo::initialize(nullptr, nullptr, nullptr, false, false, 0x8086));
     for (const std::string& name : kNames)
-        std::ofstream(directory() + "/" + name) << name << "(*)";
+        std::ofstream(directory() + "/" + name) << name;
     return 0;
 }
 
@@ -360,10 +261,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const std::vector<std::string> before = scripted::runtime().balance();
     FuzzedDataProvider input(data, size);
     Session(input).run();
-    theLog.read();
+    theLog = Log();
+    scripted::runtime().takeCalls();
     require(scripted::runtime().balance() == before);
     require(scripted::runtime().takeMisuse().empty());
-    theLog.clear();
     scripted::runtime().forgetDead();
     return 0;
 }
