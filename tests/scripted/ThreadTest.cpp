@@ -45,11 +45,11 @@ TEST_F(ThreadTest, KernelRequestsTakeTurns)
     const std::string file = testing::TempDir() + "vyra-threads.cl";
     std::ofstream(file) << "skin";
     onThreads([&](int thread) {
-        const char* const names[] = {"a", "b", file.c_str()};
         for (int round = 0; round < kRounds; ++round) {
-            const char* name = names[(thread + round) % 3];
-            const auto kernel = name == file
-                                    ? store.getKernel(name, "", "skin", nullptr)
+            const int choice = (thread + round) % 3;
+            const char* name = choice == 0 ? "a" : "b";
+            const auto kernel = choice == 2
+                                    ? store.getKernel(file.c_str(), "", "skin", nullptr)
                                     : store.getKernelFromString("skin", name, "", "skin", nullptr);
             EXPECT_NE(kernel.get(), nullptr);
             EXPECT_TRUE(store.freeKernel(kernel));
@@ -64,22 +64,17 @@ TEST_F(ThreadTest, PoolBuffersAreHandedOutOnceAndTakenBackByAnyone)
     TopenCLDataBufferPool pool;
     const TopenCLDataBufferDescriptor descriptor(Tplug(1, 2), TuniqueString("positions"),
                                                  TopenCLDataBufferDescriptor::kReadWrite, 4, 16, 0);
-    std::vector<cl_mem> taken[kThreads];
-    onThreads([&](int thread) {
-        for (int round = 0; round < kRounds; ++round)
-            taken[thread].push_back(pool.createBuffer(descriptor).buffer().get());
-    });
-    std::set<cl_mem> distinct;
-    for (const auto& list : taken)
-        distinct.insert(list.begin(), list.end());
-    EXPECT_EQ(distinct.size(), kThreads * std::size_t{kRounds});
-
-    onThreads([&](int) {
-        for (int round = 0; round < kRounds; ++round) {
-            EXPECT_NE(pool.createBuffer(descriptor).buffer().get(), nullptr);
-            pool.releaseBuffers();
-        }
-    });
+    for (const bool takeBack : {false, true}) {
+        onThreads([&](int) {
+            for (int round = 0; round < kRounds; ++round) {
+                EXPECT_NE(pool.createBuffer(descriptor).buffer().get(), nullptr);
+                if (takeBack)
+                    pool.releaseBuffers();
+            }
+        });
+        EXPECT_EQ(runtime().created(Kind::kMem), unsigned{kThreads * kRounds});
+        pool.releaseBuffers();
+    }
 }
 
 TEST_F(ThreadTest, TheDataMapIsFilledAndReadAtOnce)
@@ -88,11 +83,11 @@ TEST_F(ThreadTest, TheDataMapIsFilledAndReadAtOnce)
     TopenCLData data;
     onThreads([&data](int thread) {
         const TuniqueString name("positions");
-        for (int round = 0; round < kRounds; ++round) {
-            const Tplug own(static_cast<std::uint64_t>(thread), static_cast<std::uint64_t>(round));
+        for (unsigned round = 0; round < kRounds; ++round) {
+            const Tplug own(static_cast<unsigned>(thread), round);
             data.setData(name, own, TopenCLDataBuffer(own, name, {}, 4, 1, 4));
             EXPECT_EQ(data.getData(name, own).descriptor().capacityInBytes(), 4U);
-            data.getData(name, Tplug(static_cast<std::uint64_t>(kThreads), 0));
+            data.getData(name, Tplug(kThreads, 0));
             data.getSinglePlug();
         }
     });
@@ -103,21 +98,18 @@ TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
 {
     const auto* batched = startWithBuffer(1, 3);
     manager().PreEvaluate(kId);
-    std::vector<const TopenCLSharedBuffer*> alone(kThreads);
+    const TopenCLSharedBuffer* alone[kThreads];
     for (auto& buffer : alone)
         buffer = create();
-    std::vector<AutoCLObject<cl_event>> released(kThreads * std::size_t{kRounds});
+    AutoCLObject<cl_event> released[kThreads][kRounds];
     onThreads([&](int thread) {
-        const TopenCLSharedBuffer* own = alone[static_cast<std::size_t>(thread)];
-        for (int round = 0; round < kRounds; ++round) {
-            AutoCLObject<cl_event>& event = released[static_cast<std::size_t>(thread) * kRounds +
-                                                     static_cast<std::size_t>(round)];
-            cl_event acquired = nullptr;
-            acquire(batched, &acquired);
-            manager().EnqueueReleaseBatchedSharedCLBuffer(1, &acquired);
-            ocl.clReleaseEvent(acquired);
-            acquire(own);
-            release(own, event.receive());
+        for (AutoCLObject<cl_event>& event : released[thread]) {
+            AutoCLObject<cl_event> acquired;
+            acquire(batched, acquired.receive());
+            const cl_event reported = acquired.get();
+            manager().EnqueueReleaseBatchedSharedCLBuffer(1, &reported);
+            acquire(alone[thread]);
+            release(alone[thread], event.receive());
         }
     });
     calls();
@@ -147,14 +139,14 @@ TEST_F(ThreadTest, SharedBuffersComeAndGoAtOnce)
 TEST_F(ThreadTest, OneThreadWaitsForTheFenceAndNobodyOvertakesIt)
 {
     startIn(2, 1);
-    std::vector<const TopenCLSharedBuffer*> buffers(kThreads);
+    const TopenCLSharedBuffer* buffers[kThreads];
     for (auto& buffer : buffers)
         buffer = create();
     for (int round = 0; round < kRounds; ++round) {
         manager().RenderingComplete();
         runtime().scriptClientWaits(std::deque<unsigned>(20, 0x911B)); // a long wait
         calls();
-        onThreads([&](int thread) { acquire(buffers[static_cast<std::size_t>(thread)]); });
+        onThreads([&](int thread) { acquire(buffers[thread]); });
         Lines lines = calls();
         std::erase(lines, "resourceWindow()");
         // 21 waits, one deletion, and only then the acquires.
