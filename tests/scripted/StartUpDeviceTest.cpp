@@ -116,10 +116,7 @@ const StartUpRow kDeviceRows[] = {
          c.platform().extensions += " cl_khr_fp64";
          c.faults = {{.function = "clGetPlatformInfo", .nth = 10, .onwards = true}};
          c.withoutDoublePrecision(); }},
-    {"NoDoubleByDeviceOn12", [](StartUp& c) {
-         c.firstDevice().doublePrecision = 0;
-         c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1x"}}; // not an integer
-         c.withoutDoublePrecision(); }},
+    {"NoDoubleByDeviceOn12", [](StartUp& c) { c.firstDevice().doublePrecision = 0; c.withoutDoublePrecision(); }},
     {"DoubleDemandedAndThere", [](StartUp& c) { c.firstDevice().doublePrecision = CL_FP_DENORM; c.environment = {{"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", "1"}}; }},
     {"DoubleDemandedAndMissing", [](StartUp& c) {
          c.firstDevice().doublePrecision = 0;
@@ -136,18 +133,14 @@ const StartUpRow kDeviceRows[] = {
          unreadableDriver(c);
          c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"DriverVersionFails", [](StartUp& c) { c.onNVIDIA("400.00"); c.fails("clGetDeviceInfo", 2); c.stopsBeforeDevice(""); c.device = "device#1"; }},
-    {"OlderDriverQueriesEvents", [](StartUp& c) { c.onNVIDIA("385.30"); c.modes = {1, 2}; }},
     {"OldDriverReadsBackSynchronously", [](StartUp& c) { c.onNVIDIA("359.90"); c.asyncReadback = false; c.modes = {1, 2}; }},
     {"IgnoredByAWord", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "yes"}}; c.modes = {1, 2}; }},
     {"IgnoredOlderDriverIsImplicit", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"ModesFromTheEnvironment", [](StartUp& c) { demandModes(c, "2", "3"); c.modes = {2, 3}; }},
-    {"DemandsThatAreNoNumbers", [](StartUp& c) { demandModes(c, "2x", "3x"); }},
     {"FinishGoesBeforeTheModes", [](StartUp& c) {
          withoutEvents(c, {3, 4});
          demandModes(c, "1", "1");
          c.environment.emplace_back("VYRA_OPENCL_FORCE_FINISH", "-2"); }},
-    {"FinishThatIsNoNumber", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "1x"}}; }},
-    {"FinishOfZero", [](StartUp& c) { c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "0"}}; }},
     {"ModesWithoutEvents", [](StartUp& c) { withoutEvents(c, {2, 2}); }},
     {"ExtensionsAreFoundAnywhereInTheText", [](StartUp& c) { c.platform().extensions = "xcl_khr_gl_eventx"; }},
     {"ImpossibleDemandsAreTold", [](StartUp& c) {
@@ -159,7 +152,6 @@ const StartUpRow kDeviceRows[] = {
          withoutEvents(c, {3, 2});
          c.prepareHost = [] { installFunctionTable(false, true); }; }},
     {"ModesWithoutFunctionTable", [](StartUp& c) { withoutEvents(c, {3, 2}); c.prepareHost = removeFunctionTable; }},
-    {"ImplicitModesNeedNoSyncObjects", [](StartUp& c) { c.prepareHost = [] { installFunctionTable(false, true); }; }},
     {"ThreadedSharingForcedOnNVIDIA", [](StartUp& c) {
          c.onNVIDIA("400.00");
          c.environment = {{"VYRA_OPENCL_FORCE_THREADING", "0"}};
@@ -204,20 +196,20 @@ TEST_F(DeviceStartUpOnce, WithoutAContextThereIsNoQueue)
     EXPECT_EQ(calls(), Lines{});
 }
 
-TEST_F(DeviceStartUpOnce, ThereIsRoomForADeviceNameOf127Characters)
-{
-    world.platforms[0].devices[0].name = std::string(127, 'n');
-    EXPECT_TRUE(startWatched());
-    EXPECT_THAT(printedError, ::testing::HasSubstr("Device " + std::string(127, 'n') + ".  "));
-}
+class DeviceName : public ScriptedTest, public ::testing::WithParamInterface<std::size_t> {};
 
-TEST_F(DeviceStartUpOnce, ALongerDeviceNameStops)
+TEST_P(DeviceName, HasRoomFor127Characters)
 {
-    world.platforms[0].devices[0].name = std::string(128, 'n');
-    EXPECT_FALSE(startWatched());
-    EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_VALUE\n"});
-    expectMisuse("clGetDeviceInfo: no room for the answer");
+    const bool fits = GetParam() == 127;
+    world.platforms[0].devices[0].name = std::string(GetParam(), 'n');
+    EXPECT_EQ(startWatched(), fits);
+    EXPECT_EQ(warnings(), fits ? Lines{} : Lines{"OpenCL error: CL_INVALID_VALUE\n"});
+    EXPECT_EQ(printedError.find("Device " + std::string(127, 'n') + ".  ") != std::string::npos,
+              fits);
+    if (!fits)
+        expectMisuse("clGetDeviceInfo: no room for the answer");
 }
+INSTANTIATE_TEST_SUITE_P(Device, DeviceName, ::testing::Values(127, 128));
 
 TEST_F(DeviceStartUpOnce, ForcedThreadingIsAskedForOnce)
 {

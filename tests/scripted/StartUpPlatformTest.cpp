@@ -117,36 +117,22 @@ INSTANTIATE_TEST_SUITE_P(Platform, StartUpRows, ::testing::ValuesIn(kPlatformRow
 
 using StartUpOnce = ScriptedTest;
 
-TEST_F(StartUpOnce, ASecondInitializeChangesAndPrintsNothing)
+class StartUpAgain : public ScriptedTest, public ::testing::WithParamInterface<bool> {};
+
+TEST_P(StartUpAgain, ChangesAndPrintsNothing)
 {
-    ASSERT_TRUE(start());
+    const bool disabled = GetParam();
+    if (disabled)
+        setEnvironment("VYRA_DISABLE_OPENCL", "0");
+    EXPECT_EQ(start(), !disabled);
+    removeEnvironment("VYRA_DISABLE_OPENCL");
     testing::internal::CaptureStderr();
-    EXPECT_TRUE(TopenCLInfo::initialize(nullptr, nullptr, nullptr, true, false, 0));
+    EXPECT_EQ(TopenCLInfo::initialize(nullptr, nullptr, nullptr, true, false, 0x8086), !disabled);
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
     EXPECT_EQ(calls(), Lines{});
     EXPECT_FALSE(TopenCLInfo::theOne().usingDX());
 }
-
-TEST_F(StartUpOnce, AFailedStartUpIsNotTriedAgain)
-{
-    setEnvironment("VYRA_DISABLE_OPENCL", "0");
-    EXPECT_FALSE(startWatched());
-    EXPECT_EQ(calls(), Lines{kForceThreading});
-    removeEnvironment("VYRA_DISABLE_OPENCL");
-    EXPECT_FALSE(startWatched());
-    EXPECT_EQ(printedError, "");
-    EXPECT_EQ(calls(), Lines{});
-}
-
-TEST_F(StartUpOnce, PlatformTextsAreAskedForInTheirOrder)
-{
-    ASSERT_TRUE(startWatched());
-    Lines expected; // vendor, name, version, extensions: size and value; the version again
-    for (const char* query :
-         {"2307", "2307", "2306", "2306", "2305", "2305", "2308", "2308", "2305"})
-        expected.push_back(std::string("clGetPlatformInfo(platform#1, ") + query + ')');
-    EXPECT_EQ(callsOf("clGetPlatformInfo"), expected);
-}
+INSTANTIATE_TEST_SUITE_P(StartUp, StartUpAgain, ::testing::Bool());
 
 TEST_F(StartUpOnce, OnlyExtensionsAreLookedUpThroughTheRuntime)
 {
