@@ -50,16 +50,6 @@ cl_mem clCreateBuffer(cl_context context, cl_mem_flags flags, std::size_t size, 
     return call.result(mem, error);
 }
 
-cl_int clRetainMemObject(cl_mem mem)
-{
-    return Entry("clRetainMemObject", mem).retain(Kind::kMem, mem);
-}
-
-cl_int clReleaseMemObject(cl_mem mem)
-{
-    return Entry("clReleaseMemObject", mem).release(Kind::kMem, mem);
-}
-
 cl_int clEnqueueWriteBuffer(cl_command_queue queue, cl_mem mem, cl_bool blocking,
                             std::size_t offset, std::size_t size, const void* data,
                             cl_uint waitCount, const cl_event* waitList, cl_event* event)
@@ -131,16 +121,6 @@ cl_int clGetMemObjectInfo(cl_mem mem, cl_mem_info query, std::size_t room, void*
     call.require(query == CL_MEM_SIZE, CL_INVALID_VALUE, "unknown query");
     const std::size_t bytes = object ? object->size : 0;
     return call.answer(query, &bytes, sizeof bytes, room, value, size);
-}
-
-cl_int clRetainEvent(cl_event event)
-{
-    return Entry("clRetainEvent", event).retain(Kind::kEvent, event);
-}
-
-cl_int clReleaseEvent(cl_event event)
-{
-    return Entry("clReleaseEvent", event).release(Kind::kEvent, event);
 }
 
 cl_int clWaitForEvents(cl_uint count, const cl_event* events)

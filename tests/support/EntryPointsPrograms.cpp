@@ -67,16 +67,6 @@ cl_int clGetProgramBuildInfo(cl_program program, cl_device_id device, cl_program
     return call.answer(query, &status, sizeof status, room, value, size);
 }
 
-cl_int clRetainProgram(cl_program program)
-{
-    return Entry("clRetainProgram", program).retain(Kind::kProgram, program);
-}
-
-cl_int clReleaseProgram(cl_program program)
-{
-    return Entry("clReleaseProgram", program).release(Kind::kProgram, program);
-}
-
 cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
 {
     Entry call("clCreateKernel", program, name);
@@ -92,16 +82,6 @@ cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
     if (kernel && object)
         call.object(Kind::kKernel, kernel)->arguments = argumentsOf(name, object->source);
     return call.result(kernel, error);
-}
-
-cl_int clRetainKernel(cl_kernel kernel)
-{
-    return Entry("clRetainKernel", kernel).retain(Kind::kKernel, kernel);
-}
-
-cl_int clReleaseKernel(cl_kernel kernel)
-{
-    return Entry("clReleaseKernel", kernel).release(Kind::kKernel, kernel);
 }
 
 cl_int clGetKernelWorkGroupInfo(cl_kernel kernel, cl_device_id device,

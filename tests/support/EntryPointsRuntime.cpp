@@ -117,14 +117,22 @@ cl_int clFlush(cl_command_queue queue)
     return call.status();
 }
 
-cl_int clReleaseContext(cl_context context)
-{
-    return Entry("clReleaseContext", context).release(Kind::kContext, context);
-}
-
-cl_int clReleaseCommandQueue(cl_command_queue queue)
-{
-    return Entry("clReleaseCommandQueue", queue).release(Kind::kQueue, queue);
-}
+// A function that counts the references of its only argument.
+#define VYRA_COUNTING(function, operation, Handle, kind)                                           \
+    cl_int function(Handle handle)                                                                 \
+    {                                                                                              \
+        return Entry(#function, handle).operation(kind, handle);                                   \
+    }
+VYRA_COUNTING(clRetainMemObject, retain, cl_mem, Kind::kMem)
+VYRA_COUNTING(clReleaseMemObject, release, cl_mem, Kind::kMem)
+VYRA_COUNTING(clRetainEvent, retain, cl_event, Kind::kEvent)
+VYRA_COUNTING(clReleaseEvent, release, cl_event, Kind::kEvent)
+VYRA_COUNTING(clRetainProgram, retain, cl_program, Kind::kProgram)
+VYRA_COUNTING(clReleaseProgram, release, cl_program, Kind::kProgram)
+VYRA_COUNTING(clRetainKernel, retain, cl_kernel, Kind::kKernel)
+VYRA_COUNTING(clReleaseKernel, release, cl_kernel, Kind::kKernel)
+VYRA_COUNTING(clReleaseContext, release, cl_context, Kind::kContext)
+VYRA_COUNTING(clReleaseCommandQueue, release, cl_command_queue, Kind::kQueue)
+#undef VYRA_COUNTING
 
 } // extern "C"
