@@ -2,7 +2,6 @@
 #include "runtime/DriverVersion.h"
 #include "runtime/SyncModes.h"
 
-#include <array>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -56,12 +55,9 @@ TEST(DriverVersionRule, UnreadableVersionsRaise)
     }
 }
 
-TEST(ProviderRule, EachHasItsNumber)
-{
-    EXPECT_EQ((std::array<int, 5>{kNVIDIAProvider, kAMDProvider, kIntelProvider, kAppleProvider,
-                                  kUnknownProvider}),
-              (std::array<int, 5>{0, 1, 2, 3, 4}));
-}
+// The numbers are the host's, too.
+static_assert(kNVIDIAProvider == 0 && kAMDProvider == 1 && kIntelProvider == 2);
+static_assert(kAppleProvider == 3 && kUnknownProvider == 4);
 
 enum Message { kSilent, kUnstable, kUsesGLFinish, kUsesEventInfo };
 const char* const kMessages[] = {
