@@ -23,7 +23,6 @@ void Entry::begin(const char* function, std::initializer_list<std::string> argum
         fLine += (fLine.back() == '(' ? "" : ", ") + argument;
     fLine += ')';
 
-    ++fRuntime.fCallCount;
     if (const Fault* fault = fRuntime.meetFault(fFunction)) {
         fStatus = fault->status;
         fWithHandle = fault->withHandle;

@@ -91,9 +91,7 @@ std::int32_t TenvironmentVariable::asInt32(std::int32_t defaultValue) const
 {
     log("asInt32(", fName, ", ", defaultValue, ")");
     const char* value = std::getenv(fName);
-    char* end = nullptr;
-    const long number = value ? std::strtol(value, &end, 10) : 0;
-    return value && end != value && *end == 0 ? static_cast<std::int32_t>(number) : defaultValue;
+    return value ? std::atoi(value) : defaultValue;
 }
 
 Tstring TappLocale::getResourcesLocation()

@@ -24,7 +24,6 @@ void FakeRuntime::describe(const World& world)
     fDeviceScripts.clear();
     fCalls.clear();
     fMisuse.clear();
-    fCallCount = 0;
     for (const PlatformScript& platform : world.platforms) {
         add(Kind::kPlatform, fPlatforms);
         for (const DeviceScript& device : platform.devices) {

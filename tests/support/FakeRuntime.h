@@ -50,8 +50,6 @@ public:
     // Lists are in brackets; the first form names what the call made, the second its status, the
     // third the memory objects in the kernel's arguments.
     std::vector<std::string> takeCalls() { return std::exchange(fCalls, {}); }
-    // Calls of OpenCL and OpenGL since describe.
-    unsigned callCount() const { return fCallCount; }
     // A line of the host's in the same log.
     void log(std::string line);
 
@@ -118,7 +116,6 @@ private:
     std::pair<const void*, std::size_t> fHostMemory{};
     std::vector<std::string> fCalls;
     std::vector<std::string> fMisuse;
-    unsigned fCallCount = 0;
     std::deque<cl_int> fEventStatuses{CL_COMPLETE};
     std::deque<unsigned> fClientWaits;
     ContextNotify fNotify = nullptr;
