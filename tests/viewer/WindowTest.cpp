@@ -4,6 +4,7 @@
 #include "viewer/Player.h"
 
 #include "runtime/TopenCLInfo.h"
+#include "viewer/LoadProgress.h"
 #include "viewer/Session.h"
 #include "viewer/ViewerWindow.h"
 
@@ -14,6 +15,7 @@
 #include <QElapsedTimer>
 #include <QFile>
 #include <QGuiApplication>
+#include <QImage>
 #include <QKeyEvent>
 #include <QMouseEvent>
 #include <QSurfaceFormat>
@@ -50,6 +52,8 @@ void moveMouse(QWindow& window, QEvent::Type type, const QPointF& position,
 
 class WindowTest : public testing::Test {
 protected:
+    WindowTest() { fOptions.model = "X/Testwuson.X"; }
+
     void SetUp() override
     {
         if (!std::filesystem::exists("/usr/share/assimp/models/X/Testwuson.X"))
@@ -62,7 +66,6 @@ protected:
         format.setSwapInterval(0);
         QSurfaceFormat::setDefaultFormat(format);
         fApplication = std::make_unique<QGuiApplication>(fArguments, fNames);
-        fOptions.model = "X/Testwuson.X";
         fOptions.deformers = parseDeformers(kDefaultDeformers).value();
         fOptions.allowCpu = true;
         fOptions.verify = true;
@@ -156,6 +159,20 @@ TEST_F(WindowTest, OrbitsZoomsPansResizesAndChangesTheVertexBuffersDetail)
     EXPECT_THAT(fSession->report(), Not(HasSubstr("3205 vertices")));
 }
 
+TEST_F(WindowTest, LoadProgressIsInTheTitleAndNowAndThenOnStandardError)
+{
+    testing::internal::CaptureStderr();
+    {
+        LoadProgress progress(*fWindow, "a.fbx");
+        for (const int seconds : {0, 1, 1, 2, 3, 4, 5, 6})
+            EXPECT_TRUE(progress.show(seconds));
+        EXPECT_EQ(fWindow->title(), "vyra-viewer: loading 'a.fbx', 6 s so far");
+    }
+    EXPECT_EQ(fWindow->title(), "vyra-viewer");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "vyra-viewer: loading 'a.fbx', 1 s so far\n"
+                                                      "vyra-viewer: loading 'a.fbx', 5 s so far\n");
+}
+
 TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
 {
     if (!TopenCLInfo::isValid())
@@ -196,6 +213,37 @@ TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
     edit("sineAndCosine(twist", "sineAndCosine(2.0f * twist");
     playWhileRight(player, kHangMs);
     EXPECT_FALSE(fSession->verified()) << "the mended kernel was not taken";
+}
+
+// A square on the floor: in one plane with the ground that is drawn below it.
+class FlatModelTest : public WindowTest {
+protected:
+    FlatModelTest()
+    {
+        fOptions.model = fFolder.filePath("flat.obj").toStdString();
+        QFile file(fFolder.filePath("flat.obj"));
+        if (file.open(QIODevice::WriteOnly))
+            file.write("v 0 0 0\nv 1 0 0\nv 1 0 1\nv 0 0 1\nf 1 4 3 2\n");
+    }
+
+private:
+    const QTemporaryDir fFolder;
+};
+
+TEST_F(FlatModelTest, GroundHidesNoPartOfIt)
+{
+    Player player(*fSession);
+    ASSERT_FALSE(player.renderFrame());
+    const QImage picture = fSession->canvas().image();
+    for (const float x : {-0.4f, -0.2f, 0.0f, 0.2f, 0.4f}) {
+        for (const float z : {-0.4f, -0.2f, 0.0f, 0.2f, 0.4f}) {
+            const QVector3D place = fSession->camera().toClip().map(QVector3D(x, 0, z));
+            const QColor colour = picture.pixelColor(
+                static_cast<int>((1 + place.x()) / 2 * static_cast<float>(picture.width())),
+                static_cast<int>((1 - place.y()) / 2 * static_cast<float>(picture.height())));
+            EXPECT_GT(colour.red(), colour.blue() + 30) << "the ground is grey: " << x << ' ' << z;
+        }
+    }
 }
 
 TEST_F(WindowTest, EveryFrameIsRightInEachStateOfTheKeys)
