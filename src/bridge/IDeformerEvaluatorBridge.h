@@ -1,12 +1,12 @@
-// Where the modules of the host find the deformer evaluator.
+// Gives the modules of the host access to the deformer evaluator.
 #pragma once
 
 #include "VyraOpenCLExport.h"
 #include "bridge/IDeformerEvaluatorBridgeAPI.h"
 
-// The one place in the process where an evaluator is published. The object is borrowed: its
-// publisher keeps it alive while it is published and withdraws it with setAPI(nullptr). Nothing is
-// locked; callers order publishing and reading.
+// Publishes one evaluator per process. The object is borrowed: its publisher keeps it alive while
+// it is published and withdraws it with setAPI(nullptr). Takes no lock: callers order publishing
+// and reading.
 class VYRA_OPENCL_API IDeformerEvaluatorBridge {
 public:
     IDeformerEvaluatorBridge() = default;
@@ -14,9 +14,9 @@ public:
     IDeformerEvaluatorBridge& operator=(const IDeformerEvaluatorBridge& other);
     IDeformerEvaluatorBridge& operator=(IDeformerEvaluatorBridge&& other) noexcept;
 
-    // The published object, or null.
+    // Returns the published object, or null.
     static IDeformerEvaluatorBridgeAPI* getAPI();
-    // Publishes `api`, or withdraws with null. The object published before is not told.
+    // Publishes `api` in place of the published object; null withdraws it. Calls neither object.
     static void setAPI(IDeformerEvaluatorBridgeAPI* api);
 
 private:

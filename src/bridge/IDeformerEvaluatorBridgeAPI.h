@@ -7,8 +7,8 @@ namespace em {
 class Id;
 }
 
-// Implemented by the evaluator, and published through IDeformerEvaluatorBridge. Objects belong to
-// their publisher.
+// Implemented by the evaluator and published through IDeformerEvaluatorBridge. The publisher owns
+// the object.
 class VYRA_OPENCL_API IDeformerEvaluatorBridgeAPI {
 public:
     IDeformerEvaluatorBridgeAPI();

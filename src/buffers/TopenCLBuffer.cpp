@@ -22,8 +22,8 @@ bool fitsCapacity(std::size_t offset, std::size_t size)
     return offset <= kLargest && size <= kLargest - offset;
 }
 
-// A mapping is made where the flags ask for host-accessible memory and do not forbid the access.
-bool wantsMapping(cl_mem_flags flags)
+// Returns whether the flags require host-accessible memory and permit the host's access.
+bool requiresMapping(cl_mem_flags flags)
 {
     return (flags & CL_MEM_ALLOC_HOST_PTR) != 0 && (flags & CL_MEM_HOST_NO_ACCESS) == 0;
 }
@@ -94,9 +94,7 @@ int TopenCLBuffer::ensureBufferCapacity(std::size_t bytes)
     AutoCLObject<cl_event>& readyEvent = bufferReadyEvent();
     if (!readyEvent.get())
         return CL_SUCCESS;
-    const cl_event event = readyEvent.get();
-    const cl_int status = ocl.clWaitForEvents(1, &event);
-    reportFailure(status);
+    const cl_int status = waitForEvent(readyEvent.get());
     readyEvent.reset();
     return status;
 }
@@ -157,8 +155,8 @@ void TopenCLBuffer::reset()
     fDataBuffer.descriptor().setCapacityInBytes(0);
 }
 
-// Makes memory of exactly `size` bytes unless the present memory is large enough; `*error` is
-// written only when it is not.
+// Creates memory of exactly `size` bytes unless the present memory is large enough. Writes `*error`
+// only if it is not.
 void TopenCLBuffer::allocateOpenCLBuffer(std::size_t size, void* hostPtr, int* error)
 {
     if (!fitsCapacity(0, size)) {
@@ -171,13 +169,12 @@ void TopenCLBuffer::allocateOpenCLBuffer(std::size_t size, void* hostPtr, int* e
         reset();
     }
     *error = createMemory(size, hostPtr);
-    if (*error == CL_SUCCESS && !hostPtr && wantsMapping(fMemFlags))
+    if (*error == CL_SUCCESS && !hostPtr && requiresMapping(fMemFlags))
         mapMemory(size, error);
     bufferReadyEvent().reset();
 }
 
-// Counts the memory, then creates it; a creation that fails leaves nothing held and nothing
-// counted.
+// Counts the memory, then creates it. A creation that fails leaves no memory and no count.
 int TopenCLBuffer::createMemory(std::size_t size, void* hostPtr)
 {
     const unsigned int capacity = static_cast<unsigned int>(size);
@@ -195,7 +192,7 @@ int TopenCLBuffer::createMemory(std::size_t size, void* hostPtr)
     fDeviceMemoryCounted = false;
     fDataBuffer.buffer().reset();
     fDataBuffer.descriptor().setCapacityInBytes(0);
-    // A runtime that gives neither a handle nor a reason has failed all the same.
+    // Neither a handle nor an error status is a failure, too.
     return status == CL_SUCCESS ? CL_MEM_OBJECT_ALLOCATION_FAILURE : status;
 }
 
@@ -214,9 +211,9 @@ void TopenCLBuffer::unmapMemory()
     reportFailure(ocl.clEnqueueUnmapMemObject(TopenCLInfo::theOne().openCLCommandQueue(),
                                               buffer().get(), fMappedPointer, 0, nullptr,
                                               unmapped));
-    // A failed unmapping leaves no event to wait for.
+    // A failed call returns no event to wait for.
     if (*unmapped)
-        reportFailure(ocl.clWaitForEvents(1, unmapped));
+        waitForEvent(*unmapped);
     fMappedPointer = nullptr;
 }
 

@@ -34,7 +34,7 @@ TopenCLData& TopenCLData::operator=(const TopenCLData& other)
     try {
         fMap = other.fMap;
     } catch (...) {
-        // The container would keep what it had copied by then.
+        // The container would keep the entries copied before the failure.
         fMap.clear();
         throw;
     }
@@ -50,8 +50,7 @@ const TopenCLDataBuffer& TopenCLData::getData(const TuniqueString& name, const T
 void TopenCLData::setData(const TuniqueString& name, const Tplug& plug,
                           const TopenCLDataBuffer& buffer)
 {
-    // A finished pair, unlike emplace, has the container make its node last: nothing that can fail
-    // comes after.
+    // With insert, unlike emplace, the container creates its node after everything that can fail.
     const auto [entry, inserted] = fMap.insert(Map::value_type(Key(name, plug), buffer));
     if (!inserted)
         entry->second = buffer;

@@ -16,19 +16,18 @@
 // A concurrent map from a data name and a plug to a data buffer.
 //
 // setData, getData, getSinglePlug, empty and iteration may run at the same time; iteration may or
-// may not see what is inserted meanwhile. Writing a key that is present is a plain assignment: give
-// each key one writer at a time and no reader meanwhile. Copying, assigning and destroying need the
-// maps to themselves. Entries are never removed one by one, so a reference to a stored buffer stays
-// valid until the map is assigned to or destroyed. Running out of memory raises std::bad_alloc and
-// keeps what was there.
+// may not see entries inserted during it. Writing to a key that is present is a plain assignment:
+// it must not overlap with another writer or a reader of that key. Copying, assigning and
+// destroying must not overlap with any other use of the maps. Single entries are never removed, so
+// a reference to a stored buffer stays valid until the map is assigned to or destroyed. Throws
+// std::bad_alloc when memory runs out, and then keeps its entries.
 class VYRA_OPENCL_API TopenCLData {
 public:
     using Key = std::pair<TuniqueString, Tplug>;
 
-    // With h the plug's hash and n the name's: h xor (F(n) + 0x9e3779b9 + (h << 6) + (h >> 2)) in
-    // 64-bit arithmetic that wraps. F is the 64-bit FNV-1a hash of the eight bytes of n, least
-    // significant first; the rest is the usual combination of two hashes with the golden ratio's
-    // bits.
+    // Returns, for the plug's hash h and the name's hash n, h xor (F(n) + 0x9e3779b9 + (h << 6) +
+    // (h >> 2)) modulo 2^64. F is the 64-bit FNV-1a hash of the eight bytes of n, least significant
+    // first; the rest is the usual combination of two hashes with the bits of the golden ratio.
     struct KeyHash {
         std::size_t operator()(const Key& key) const;
     };
@@ -45,15 +44,15 @@ public:
     TopenCLData& operator=(const TopenCLData& other);
     ~TopenCLData();
 
-    // The buffer stored for the pair, or TopenCLDataBuffer::fsNULL.
+    // Returns the buffer stored for the pair, or TopenCLDataBuffer::fsNULL.
     const TopenCLDataBuffer& getData(const TuniqueString& name, const Tplug& plug) const;
-    // Stores a copy of `buffer` for the pair, over the one that is there.
+    // Stores a copy of `buffer` for the pair, in place of the present one.
     void setData(const TuniqueString& name, const Tplug& plug, const TopenCLDataBuffer& buffer);
-    // The plug that all entries share; Tplug::fsNULL when there are several, or no entry.
+    // Returns the plug of all entries; Tplug::fsNULL if they have several, or there is no entry.
     const Tplug& getSinglePlug() const;
     bool empty() const;
 
-    // Entries in the map's own order.
+    // Iterate over the entries in the map's order.
     iterator begin();
     iterator end();
     const_iterator begin() const;

@@ -1,24 +1,24 @@
-// A piece of a deformer's data on the device.
+// Data of a deformer on the device.
 #pragma once
 
 #include "VyraOpenCLExport.h"
 #include "buffers/TopenCLDataBufferDescriptor.h"
 #include "diagnostics/AutoCLObject.h"
 
-// One memory object, the event that says when its contents are ready, and what it holds.
+// One memory object, the event that signals that its contents are ready, and their description.
 //
-// Copies share the memory object and the event, each with references of its own; the last one to go
-// releases them. A plain value: one object is not written by one thread while another uses it,
-// distinct copies may be used on different threads. A retain or release that fails is reported as a
-// warning, and the value changes all the same.
+// A value: copies share the memory object and the event, each with references of its own. One
+// object must not be written by one thread while another uses it; different copies may be used on
+// different threads. A retain or release that fails is reported as a warning; the value changes as
+// if it had succeeded.
 class VYRA_OPENCL_API TopenCLDataBuffer {
 public:
-    // Empty handles and a default descriptor: what look-ups return when they find nothing.
+    // Has empty handles and a default descriptor. The result of look-ups that find nothing.
     static const TopenCLDataBuffer fsNULL;
 
     TopenCLDataBuffer();
     TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor);
-    // Shares both handles; the descriptor is taken whole, its capacity included.
+    // Shares both handles and copies the descriptor with its capacity.
     TopenCLDataBuffer(const TopenCLDataBufferDescriptor& descriptor,
                       const AutoCLObject<cl_mem>& buffer, const AutoCLObject<cl_event>& readyEvent);
     TopenCLDataBuffer(const Tplug& plug, const TuniqueString& name,
@@ -30,7 +30,7 @@ public:
     // Leaves `other` without handles.
     TopenCLDataBuffer(TopenCLDataBuffer&& other) noexcept;
     TopenCLDataBuffer& operator=(const TopenCLDataBuffer& other);
-    // Exchanges the handles: the former ones of this object are released with `other`.
+    // Exchanges the handles: the previous ones of this object are released by `other`.
     TopenCLDataBuffer& operator=(TopenCLDataBuffer&& other) noexcept;
     ~TopenCLDataBuffer();
 
@@ -45,7 +45,7 @@ public:
     void setBuffer(const AutoCLObject<cl_mem>& buffer, unsigned int capacityInBytes);
     void setBufferReadyEvent(const AutoCLObject<cl_event>& readyEvent);
 
-    // Equality is identity of the data, not of the memory: equal names and equal plugs.
+    // Compare name and plug only, not the memory.
     bool operator==(const TopenCLDataBuffer& other) const;
     bool operator!=(const TopenCLDataBuffer& other) const;
 

@@ -1,29 +1,29 @@
-// What a data buffer holds.
+// The description of a data buffer.
 #pragma once
 
 #include "VyraOpenCLExport.h"
 #include "host/Tplug.h"
 #include "host/TuniqueString.h"
 
-// Describes the contents of a device buffer: the name of the data, the plug that it belongs to, how
-// many elements of how many bytes, the size of the memory, and whether the memory may be written.
+// The name of the data in a device buffer, the plug that it belongs to, count and size of its
+// elements, the size of the memory, and whether the memory may be written.
 //
 //     |<------------------ capacityInBytes ------------------->|
 //     | element 0 | element 1 | ... | element count-1 |  slack  |
 //     |<- size -->|
 //
-// The bytes asked for are element size times element count, a 32-bit product; the capacity is
-// recorded on its own and may differ. A plain value: one object is not written by one thread while
+// The requested bytes are element size times element count, a 32-bit product; the capacity is
+// recorded separately and may differ. A value: one object must not be written by one thread while
 // another uses it.
 class VYRA_OPENCL_API TopenCLDataBufferDescriptor {
 public:
-    // Any value may be stored: 0 is read-only, everything else is read-write.
+    // Any value may be stored: 0 is read-only, all others are read-write.
     enum Tpermissions : int {
         kReadOnly = 0,
         kReadWrite = 1,
     };
 
-    // The empty name, the null plug, sizes 0, read-write.
+    // Sets the empty name, the null plug, sizes of 0, read-write.
     TopenCLDataBufferDescriptor();
 
     // Sizes and capacity in bytes.
@@ -31,8 +31,8 @@ public:
                                 Tpermissions permissions, unsigned int elementSizeInBytes,
                                 unsigned int elementCount, unsigned int capacityInBytes);
 
-    // The description of an output that is derived from `other`: name and layout are kept, the plug
-    // is the output's, and the permissions are folded to kReadOnly or kReadWrite.
+    // Describes an output derived from `other`: copies its name and layout, sets the output's plug,
+    // and sets the permissions to kReadOnly or kReadWrite as isReadOnly() reports.
     TopenCLDataBufferDescriptor(const Tplug& plug, const TopenCLDataBufferDescriptor& other);
 
     const TuniqueString& name() const { return fName; }

@@ -2,13 +2,14 @@
 
 #include "buffers/TopenCLBuffer.h"
 #include "buffers/TopenCLData.h"
+#include "diagnostics/ReserveForOne.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <utility>
 
 namespace {
 
-// An entry without a buffer, not in any list yet.
+// Returns an entry without a buffer that is in no list.
 template <typename Map>
 typename Map::node_type newEntry()
 {
@@ -26,16 +27,17 @@ TopenCLDataBuffer TopenCLDataBufferPool::createBuffer(const TopenCLDataBufferDes
     const std::scoped_lock lock(fMutex);
     const unsigned int requiredBytes = descriptor.elementSizeInBytes() * descriptor.elementCount();
     TopenCLDataBuffer result(descriptor);
-    // The lists' room before the memory: when there is none, nothing has been taken yet.
-    if (fUsedBuffers.size() == fUsedBuffers.capacity())
-        fUsedBuffers.reserve(2 * fUsedBuffers.size() + 1);
-    FreeBuffers::node_type place = takeBestFit(requiredBytes, result);
-    if (place.empty()) {
-        place = newEntry<FreeBuffers>();
+    // The list's capacity first, so that running out of memory loses no buffer.
+    reserveForOne(fUsedBuffers);
+    Entry entry = takeBestFit(requiredBytes, result);
+    if (entry.empty()) {
+        entry = newEntry<FreeBuffers>();
         createMemory(requiredBytes, result);
     }
-    if (requiredBytes == 0 || result.buffer().get())
-        fUsedBuffers.push_back({result, std::move(place)});
+    if (requiredBytes == 0 || result.buffer().get()) {
+        entry.mapped() = result;
+        fUsedBuffers.push_back(std::move(entry));
+    }
     return result;
 }
 
@@ -44,10 +46,10 @@ TopenCLDataBuffer TopenCLDataBufferPool::createBuffer(const TopenCLDataBuffer& b
     return createBuffer(buffer.descriptor());
 }
 
-// Moves the handles of the tightest free buffer into `result`, the first of equals, and takes its
-// entry off the free list. No entry when no buffer is large enough.
-TopenCLDataBufferPool::FreeBuffers::node_type
-TopenCLDataBufferPool::takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result)
+// Moves the handles of the smallest sufficient free buffer, the first of equals, into `result` and
+// removes its entry from the free list. Returns an empty entry if no buffer is large enough.
+TopenCLDataBufferPool::Entry TopenCLDataBufferPool::takeBestFit(unsigned int requiredBytes,
+                                                                TopenCLDataBuffer& result)
 {
     const auto best = fFreeBuffers.lower_bound(requiredBytes);
     if (best == fFreeBuffers.end())
@@ -58,7 +60,7 @@ TopenCLDataBufferPool::takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer
     return fFreeBuffers.extract(best);
 }
 
-// Leaves `result` without memory when that cannot be created.
+// Creates memory for `result`, which stays without memory on failure.
 void TopenCLDataBufferPool::createMemory(unsigned int requiredBytes, TopenCLDataBuffer& result)
 {
     TopenCLBuffer memory(TopenCLInfo::theOne().openCLContext(), CL_MEM_READ_WRITE);
@@ -79,17 +81,17 @@ TopenCLDataBuffer TopenCLDataBufferPool::createOutputBuffer(const TopenCLDataBuf
 void TopenCLDataBufferPool::releaseBuffers()
 {
     const std::scoped_lock lock(fMutex);
-    for (auto& [buffer, place] : fUsedBuffers) {
-        place.key() = buffer.descriptor().capacityInBytes();
-        place.mapped() = buffer;
-        fFreeBuffers.insert(std::move(place));
+    for (Entry& entry : fUsedBuffers) {
+        entry.key() = entry.mapped().descriptor().capacityInBytes();
+        fFreeBuffers.insert(std::move(entry));
     }
     fUsedBuffers.clear();
 }
 
 void TopenCLDataBufferPool::collectDataForPlug(const Tplug& plug, TopenCLData& data) const
 {
-    for (const auto& [buffer, place] : fUsedBuffers) {
+    for (const Entry& entry : fUsedBuffers) {
+        const TopenCLDataBuffer& buffer = entry.mapped();
         if (buffer.descriptor().plug() == plug)
             data.setData(buffer.descriptor().name(), plug, buffer);
     }

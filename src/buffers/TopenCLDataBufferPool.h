@@ -1,4 +1,4 @@
-// Device memory that is reused from evaluation to evaluation.
+// A pool of device memory for evaluations.
 #pragma once
 
 #include "VyraOpenCLExport.h"
@@ -10,15 +10,16 @@
 
 class TopenCLData;
 
-// Hands out data buffers and takes all of them back at once. Memory is freed only with the pool.
+// A pool that returns data buffers and reclaims all of them in one call. Memory is released only by
+// the pool's destructor.
 //
-// The pool keeps a copy of every buffer that it hands out, with references of its own; what the
-// caller later does to its copy does not reach the pool's. The ready event that a buffer had when
-// it was handed out (none, where the pool made the memory) comes along with the memory's next user.
+// The pool keeps a copy of every buffer that it returns, with references of its own: changes to the
+// caller's copy do not change the pool's. The next user of the memory receives it with the ready
+// event that it had when it was returned last; new memory has none.
 //
 // createBuffer, createOutputBuffer and releaseBuffers may be called from any thread.
 // collectDataForPlug takes no lock and must not overlap with them on the same pool. OpenCL failures
-// do not throw. Needs TopenCLInfo::initialize to have run.
+// do not throw. Requires TopenCLInfo::initialize.
 class VYRA_OPENCL_API TopenCLDataBufferPool {
 public:
     TopenCLDataBufferPool();
@@ -27,35 +28,34 @@ public:
     TopenCLDataBufferPool(const TopenCLDataBufferPool&) = delete;
     TopenCLDataBufferPool& operator=(const TopenCLDataBufferPool&) = delete;
 
-    // A buffer of at least element size times element count bytes (a 32-bit product): the free one
-    // that fits best, the first of equals, else new memory of exactly that size. The buffer records
-    // the size of its memory as capacity. When the memory cannot be created the result has no
-    // memory: test buffer().
+    // Returns a buffer of at least element size times element count bytes (a 32-bit product): the
+    // smallest free one that is large enough, the first of equals, else new memory of exactly that
+    // size. Its capacity is the size of the memory. If the memory cannot be created, buffer() of
+    // the result is empty.
     TopenCLDataBuffer createBuffer(const TopenCLDataBufferDescriptor& descriptor);
     TopenCLDataBuffer createBuffer(const TopenCLDataBuffer& buffer);
 
-    // The output of a deformer for `plug`: the memory of `input` itself where that may be written
-    // (nothing is recorded then), else a writable buffer of the same name and layout from the pool.
+    // Returns the output of a deformer for `plug`: the memory of `input` if that may be written
+    // (the pool keeps no copy then), else a writable buffer of the same name and layout from the
+    // pool.
     TopenCLDataBuffer createOutputBuffer(const TopenCLDataBuffer& input, const Tplug& plug);
 
-    // Makes every buffer handed out so far free for reuse, though callers may still hold copies.
+    // Makes every buffer returned so far free for reuse, even if callers still hold copies.
     void releaseBuffers();
 
-    // Stores each handed-out buffer of `plug` in `data` under its name; the later of two wins.
+    // Stores each buffer in use of `plug` in `data` under its name. Of two with one name the later
+    // is stored.
     void collectDataForPlug(const Tplug& plug, TopenCLData& data) const;
 
 private:
-    // By capacity in bytes; equal ones in the order of giving back.
+    // By capacity in bytes; equal ones in the order of their release.
     using FreeBuffers = std::multimap<unsigned int, TopenCLDataBuffer>;
-    struct UsedBuffer {
-        TopenCLDataBuffer buffer;
-        FreeBuffers::node_type place; // the entry that it will have when it is free
-    };
+    using Entry = FreeBuffers::node_type;
 
-    FreeBuffers::node_type takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result);
+    Entry takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result);
     static void createMemory(unsigned int requiredBytes, TopenCLDataBuffer& result);
 
     FreeBuffers fFreeBuffers;
-    std::vector<UsedBuffer> fUsedBuffers; // in the order of handing out
-    std::mutex fMutex;                    // guards both lists
+    std::vector<Entry> fUsedBuffers; // in the order of creation
+    std::mutex fMutex;               // guards both lists
 };

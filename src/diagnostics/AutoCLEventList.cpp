@@ -36,7 +36,7 @@ AutoCLEventList& AutoCLEventList::operator=(const AutoCLEventList& other)
     return *this;
 }
 
-// Makes room for one more event at least.
+// Provides capacity for at least one more event.
 void AutoCLEventList::grow()
 {
     const unsigned int capacity = grownCapacity(fCapacity, fSize + 1);

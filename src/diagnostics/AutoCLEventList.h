@@ -10,19 +10,18 @@ class TopenCLBuffer;
 
 // An array of events for the wait-list arguments of an enqueue call: `list.size(), list.array()`.
 //
-// The list borrows: the holders that it is filled from must stay alive, and keep their handles, for
-// as long as it is used. Events keep the order of addition; one that is added twice is held twice.
-// One list belongs to one thread at a time. Running out of memory raises std::bad_alloc and changes
-// nothing.
+// Borrows the events: the holders that they come from must stay alive and keep their handles while
+// the list is used. Keeps the order of addition; an event added twice is listed twice. One list is
+// used by one thread at a time. Throws std::bad_alloc when memory runs out, and is then unchanged.
 class VYRA_OPENCL_API AutoCLEventList {
 public:
     AutoCLEventList();
     AutoCLEventList(const AutoCLEventList& other);
-    // Reuses the present storage when it is large enough.
+    // Reuses its storage if that is large enough.
     AutoCLEventList& operator=(const AutoCLEventList& other);
     ~AutoCLEventList();
 
-    // Appends the event; an empty holder is skipped.
+    // Appends the event; skips an empty holder.
     void add(const AutoCLObject<cl_event>& event)
     {
         if (!event.get())
@@ -34,9 +33,10 @@ public:
     // Appends the event of the buffer's last transfer, if it has one.
     void add(TopenCLBuffer& buffer);
 
-    // The first handle, or null when the list is empty.
+    // Returns the address of the first handle, or null if the list is empty. Valid until the list
+    // changes.
     const cl_event* array() const;
-    // Number of events.
+    // Returns the number of events.
     unsigned int size() const;
 
 private:

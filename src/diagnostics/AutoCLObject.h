@@ -5,9 +5,8 @@
 
 #include <CL/cl.h>
 
-// The runtime's reference counting, one pair per kind of handle. A status other than CL_SUCCESS is
-// reported as a warning and otherwise ignored, also the one that the runtime gives for a null
-// handle.
+// Retain or release one reference to an OpenCL object. A status other than CL_SUCCESS, such as that
+// for a null handle, is reported as a warning and otherwise ignored.
 VYRA_OPENCL_API void retainCLObject(cl_mem handle);
 VYRA_OPENCL_API void releaseCLObject(cl_mem handle);
 VYRA_OPENCL_API void retainCLObject(cl_event handle);
@@ -17,13 +16,13 @@ VYRA_OPENCL_API void releaseCLObject(cl_kernel handle);
 VYRA_OPENCL_API void retainCLObject(cl_program handle);
 VYRA_OPENCL_API void releaseCLObject(cl_program handle);
 
-// Owns exactly one reference to the object of its handle while it is not empty. Copies share the
-// object, each with a reference of its own. `T` is cl_mem, cl_event, cl_kernel or cl_program.
+// An owner of exactly one reference to an OpenCL object, or of none when it is empty. Copies share
+// the object, each with a reference of its own. `T` is cl_mem, cl_event, cl_kernel or cl_program.
 //
-// A holder has the size and layout of its bare handle, so its address serves where OpenCL wants the
-// address of one handle, and an array of holders where it wants an array of handles.
+// A holder has the size and layout of its handle: its address can be passed to OpenCL as the
+// address of one handle, and an array of holders as an array of handles.
 //
-// One holder belongs to one thread at a time; different holders of one object may live and die on
+// One holder is used by one thread at a time; different holders of one object may be used on
 // different threads.
 template <typename T>
 class AutoCLObject {
@@ -47,7 +46,7 @@ public:
             releaseCLObject(fHandle);
     }
 
-    // Releases the own object, then retains the other's. Makes no call when both hold the same one.
+    // Releases this holder's object, then retains the other's. Makes no call if both are the same.
     AutoCLObject& operator=(const AutoCLObject& other)
     {
         if (this == &other || fHandle == other.fHandle)
@@ -60,17 +59,17 @@ public:
         return *this;
     }
 
-    // Exchanges the two handles: the former object of this holder is released with `other`.
+    // Exchanges the two handles: the previous object of this holder is released by `other`.
     AutoCLObject& operator=(AutoCLObject&& other) noexcept
     {
-        T former = fHandle;
+        T previous = fHandle;
         fHandle = other.fHandle;
-        other.fHandle = former;
+        other.fHandle = previous;
         return *this;
     }
 
-    // Takes over the reference that the caller owns to `handle`, such as the one that a create
-    // function returns; null empties the holder. Does nothing when it is the handle held already.
+    // Takes over the caller's reference to `handle`, such as the one that a create function
+    // returns; null empties the holder. Does nothing if the holder has this handle already.
     void adopt(T handle)
     {
         if (handle == fHandle)
@@ -88,15 +87,15 @@ public:
         fHandle = nullptr;
     }
 
-    // Empties the holder and returns the address of its handle, for an OpenCL call that creates an
-    // object through an out-parameter. What the call writes there belongs to the holder.
+    // Empties the holder and returns the address of its handle, for an OpenCL call that returns an
+    // object through an out-parameter. The holder owns the reference that the call writes.
     T* receive()
     {
         reset();
         return &fHandle;
     }
 
-    // The handle, or null when the holder is empty. No reference is handed out.
+    // Returns the handle, or null if the holder is empty. The reference stays the holder's.
     T get() const { return fHandle; }
 
 private:
@@ -105,3 +104,10 @@ private:
 
 static_assert(sizeof(AutoCLObject<cl_mem>) == sizeof(cl_mem));
 static_assert(sizeof(AutoCLObject<cl_event>) == sizeof(cl_event));
+
+// Returns the address of a holder's handle, or of the handles of an array of holders.
+template <typename T>
+const T* rawHandles(const AutoCLObject<T>* holders)
+{
+    return reinterpret_cast<const T*>(holders);
+}

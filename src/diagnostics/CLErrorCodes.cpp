@@ -107,7 +107,7 @@ const char* CLErrorCodeStr(int code)
     if (const char* name = findName(code))
         return name;
 
-    // Room for any 32-bit number: a sign, ten digits and the end.
+    // Capacity for any 32-bit number: a sign, ten digits and the terminating NUL.
     thread_local std::array<char, 12> decimalText;
     std::snprintf(decimalText.data(), decimalText.size(), "%d", code);
     return decimalText.data();

@@ -13,7 +13,7 @@ namespace {
 // Null stands for the built-in sink, which writes nothing.
 constinit std::atomic<CLWarningSink> currentSink = nullptr;
 
-// The whole message, or null when it cannot be formatted or there is no memory for it.
+// Returns the whole message, or null if it cannot be formatted or memory runs out.
 std::unique_ptr<char[]> formatMessage(const char* format, va_list arguments)
 {
     va_list argumentsAgain;

@@ -1,9 +1,9 @@
-// The one entry point of the library's warnings.
+// Reports the library's warnings.
 #pragma once
 
 #include "VyraOpenCLExport.h"
 
 // Formats a printf-style message of any length without truncation and passes it to the warning
-// sink (CLWarningSink.h); the built-in sink writes nothing. Never fails: a message that cannot be
-// formatted is passed on empty. Safe from any thread.
+// sink (CLWarningSink.h); the built-in sink writes nothing. Never fails: passes an empty text if
+// the message cannot be formatted. Safe from any thread.
 [[gnu::format(printf, 1, 2)]] VYRA_OPENCL_API void CLInternalWarning(const char* format, ...);

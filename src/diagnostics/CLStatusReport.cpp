@@ -2,6 +2,7 @@
 
 #include "diagnostics/CLErrorCodes.h"
 #include "diagnostics/CLInternalWarning.h"
+#include "loader/OpenCLLoader.h"
 
 void reportFailure(cl_int status, CLReportStyle style)
 {
@@ -13,8 +14,15 @@ void reportFailure(cl_int status, CLReportStyle style)
         CLInternalWarning("OpenCL error: %s", CLErrorCodeStr(status));
 }
 
-bool succeeded(cl_int status, CLReportStyle style)
+bool checkStatus(cl_int status, CLReportStyle style)
 {
     reportFailure(status, style);
     return status == CL_SUCCESS;
+}
+
+cl_int waitForEvent(cl_event event)
+{
+    const cl_int status = ocl.clWaitForEvents(1, &event);
+    reportFailure(status);
+    return status;
 }

@@ -1,13 +1,17 @@
-// From an OpenCL status to a report: the only place that knows how. Internal.
+// Reports of OpenCL statuses as warnings. Internal.
 #pragma once
 
 #include <CL/cl.h>
 
-// The runtime object's own reports end with a line break, all others do not.
+// The reports of the runtime object end with a line break, all others do not.
 enum class CLReportStyle { kPlain, kWithLineBreak };
 
-// Reports a `status` other than CL_SUCCESS as a warning with the code's name, and goes on.
+// Reports a `status` other than CL_SUCCESS as a warning with the code's name.
 void reportFailure(cl_int status, CLReportStyle style = CLReportStyle::kPlain);
 
-// The same for a step that stops on a failure: returns whether `status` is CL_SUCCESS.
-[[nodiscard]] bool succeeded(cl_int status, CLReportStyle style = CLReportStyle::kPlain);
+// Reports like reportFailure, and returns whether `status` is CL_SUCCESS.
+[[nodiscard]] bool checkStatus(cl_int status, CLReportStyle style = CLReportStyle::kPlain);
+
+// Waits for one event. Returns the status of the wait, after reporting a failure. Wraps
+// clWaitForEvents.
+cl_int waitForEvent(cl_event event);

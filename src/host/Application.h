@@ -1,4 +1,4 @@
-// What the library asks the host application itself.
+// The host application's resources and memory accounting.
 #pragma once
 
 #include "host/HostExport.h"
@@ -6,12 +6,12 @@
 
 class VYRA_HOST_API TappLocale {
 public:
-    // The directory of the application's resources, kernel sources among them.
+    // Returns the directory of the application's resources, which include kernel sources.
     static Tstring getResourcesLocation();
 };
 
 class VYRA_HOST_API TresourceGuard {
 public:
-    // Called once, when OpenCL is up: the host notes how much device memory is taken already.
+    // Records how much device memory is in use. Called once, after OpenCL has started.
     static void initializeOffset();
 };

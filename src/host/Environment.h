@@ -1,21 +1,21 @@
-// The host's look-ups of environment variables.
+// The host's access to environment variables.
 #pragma once
 
 #include "host/HostExport.h"
 
 #include <cstdint>
 
-// The value of `name`, or null when it is not set. The text belongs to the environment.
+// Returns the value of `name`, or null if it is not set. The environment owns the text.
 VYRA_HOST_API const char* VyraGetEnv(const char* name);
 
-// One environment variable, read when it is asked for.
+// One environment variable, read on each call.
 class VYRA_HOST_API TenvironmentVariable {
 public:
     // `name` is borrowed and must outlive the object.
     explicit TenvironmentVariable(const char* name);
 
-    // The value as a decimal integer; `defaultValue` when the variable is not set, is not an
-    // integer or does not fit 32 bits.
+    // Returns the value as a decimal integer, or `defaultValue` if the variable is not set, is not
+    // an integer or does not fit 32 bits.
     std::int32_t asInt32(std::int32_t defaultValue) const;
 
 private:

@@ -5,7 +5,7 @@
 
 namespace em {
 
-// Carries 16 bits. 0xFFFE never names an evaluation.
+// A 16-bit value. 0xFFFE is reserved: it identifies no evaluation.
 class Id {
 public:
     explicit constexpr Id(std::uint16_t value) : fValue(value) {}

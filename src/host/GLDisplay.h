@@ -8,10 +8,11 @@
 struct GLDisplayProperty {
     // CL_WGL_HDC_KHR, CL_GLX_DISPLAY_KHR or CL_EGL_DISPLAY_KHR; never 0, which would end the list.
     cl_context_properties name = 0;
-    // The device context or display that goes with it; 0 when no context is current.
+    // The device context or display; 0 if no context is current.
     cl_context_properties value = 0;
 };
 
-// On Windows CL_WGL_HDC_KHR with GetDC(window), which is never released; elsewhere the display of
-// the context that is current on the calling thread, and `window` is not looked at.
+// Returns the property for the renderer's OpenGL context. On Windows: CL_WGL_HDC_KHR with
+// GetDC(window), which is never released. Elsewhere: the display of the context that is current on
+// the calling thread; `window` is ignored.
 VYRA_HOST_API GLDisplayProperty glDisplayProperty(void* window);

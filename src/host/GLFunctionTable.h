@@ -7,13 +7,13 @@
 
 #include <cstdint>
 
-// As in the OpenGL headers, which this header does not need.
+// The type of the OpenGL headers, without including them.
 using GLsync = struct __GLsync*;
 
-// The function pointers are those of the renderer's context (or wrappers that work on any thread);
-// an entry is only called when the query that covers it answers true.
+// The functions of the renderer's context, or wrappers that work on any thread. The library calls
+// an entry only if the query that covers it returns true.
 struct VYRA_HOST_API GLFunctionTable {
-    // The renderer's table; null before there is one.
+    // The renderer's table; null before the renderer has started.
     static GLFunctionTable* fpGlobalFunctionTable;
 
     // GL_ARB_sync: glFenceSync, glDeleteSync, glClientWaitSync and glWaitSync are usable.

@@ -1,4 +1,4 @@
-// The host's account of GPU memory.
+// The host's accounting of GPU memory.
 #pragma once
 
 #include "host/HostExport.h"
@@ -17,7 +17,7 @@ public:
 
 class VYRA_HOST_API ObjModel {
 public:
-    // The monitor of adapter `adapter`; lives until the process ends. The library always passes 0.
+    // Returns the monitor of `adapter`, which lives until the process ends. The library passes 0.
     static AMemoryMonitor& MemoryMonitor(unsigned int adapter);
 };
 

@@ -29,10 +29,10 @@ public:
     const Category& main() const;
 };
 
-// The host's categories; ready before any static object of the library is built.
+// Returns the host's categories. Usable before any static object of the library is constructed.
 VYRA_HOST_API const Categories& categories();
 
-// What all events of one kind have in common. The texts are borrowed and must outlive the type.
+// The description of all events of one kind. The texts are borrowed and must outlive the type.
 class VYRA_HOST_API EventType {
 public:
     EventType(const Category& category, Color color, const char* name, const char* description);
@@ -49,13 +49,13 @@ private:
     const char* fDescription;
 };
 
-// Identifies an event that has begun and not yet ended.
+// The identifier of an event that has begun and not ended.
 using EventId = std::uint64_t;
 
-// True while the profiler records. Safe from any thread, as are the two calls below.
+// Returns whether the profiler records. Safe from any thread, as are the two functions below.
 VYRA_HOST_API bool samplingActive();
 
-// Begins an event on the calling thread. `data` is an opaque pointer of `dataSize` bytes, or null.
+// Begins an event on the calling thread. `data` points to `dataSize` bytes, or is null.
 VYRA_HOST_API EventId eventBegin(std::uint32_t categoryId, Color color, const char* name,
                                  const char* description, const void* data, std::uint32_t dataSize);
 VYRA_HOST_API void eventEnd(EventId event);

@@ -7,7 +7,7 @@ class QOpenGLWindow;
 
 class VYRA_HOST_API Q3dPort {
 public:
-    // The window whose OpenGL context shares objects with the viewport's and may be made current on
-    // the calling thread, or null when there is none for this thread. Borrowed.
+    // Returns the window whose OpenGL context shares objects with the viewport's and may be made
+    // current on the calling thread, or null if this thread has none. Borrowed.
     static QOpenGLWindow* resourceWindow();
 };

@@ -5,7 +5,7 @@
 
 #include <cstdint>
 
-// A plain value: a node of the dependency graph and one of its attributes.
+// A value: a node of the dependency graph and one of its attributes.
 class VYRA_HOST_API Tplug {
 public:
     constexpr Tplug() = default;
@@ -14,10 +14,11 @@ public:
     {
     }
 
-    // The plug of no node. Constant-initialised: other modules' static objects may copy it.
+    // The plug of no node. Constant-initialised, so that static objects of other modules may copy
+    // it.
     static const Tplug fsNULL;
 
-    // 64-bit hash of node and attribute.
+    // Returns a 64-bit hash of node and attribute.
     std::uint64_t hash() const;
 
     bool operator==(const Tplug& other) const = default;

@@ -27,6 +27,6 @@ private:
 
 class VYRA_HOST_API TdebugOutput {
 public:
-    // The host's error output. Lives until the process ends.
+    // Returns the host's error stream, which lives until the process ends.
     static std::ostream& sCerr();
 };

@@ -5,26 +5,26 @@
 
 #include <string>
 
-// A sequence of bytes with a NUL behind the last one. Lengths are 32-bit and count bytes. One
-// object belongs to one thread at a time.
+// A sequence of bytes, followed by a NUL. Lengths are 32-bit numbers of bytes. One object is used
+// by one thread at a time.
 class VYRA_HOST_API Tstring {
 public:
     Tstring() = default;
-    // A copy of the NUL-terminated `text`; null reads as the empty string.
+    // Copies the NUL-terminated `text`; null is the empty string.
     Tstring(const char* text);
 
     unsigned int length() const;
-    // Cuts the string, or extends it with NUL bytes.
+    // Truncates the string, or extends it with NUL bytes.
     void setLength(unsigned int length);
 
-    // Valid until the string is changed or destroyed. Never null.
+    // Return the bytes, valid until the string is changed or destroyed. Never null.
     const char* asChar() const;
     char* data();
 
-    // 32-bit hash of the bytes; equal strings have equal hashes.
+    // Returns a 32-bit hash of the bytes; equal strings have equal hashes.
     unsigned int hash() const;
 
-    // Index of the first occurrence at or behind `from`, or -1.
+    // Returns the byte index of the first occurrence at or after `from`, or -1.
     int findMB(const char* text, int from = 0) const;
     int findMB(wchar_t character, int from = 0) const;
 

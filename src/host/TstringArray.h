@@ -6,11 +6,11 @@
 
 #include <vector>
 
-// One object belongs to one thread at a time.
+// An array of strings that grows. One object is used by one thread at a time.
 class VYRA_HOST_API TstringArray {
 public:
     unsigned int length() const;
-    // `index` is below length().
+    // Returns the string at `index`, which is less than length().
     const Tstring& operator[](unsigned int index) const;
     void append(const Tstring& text);
 

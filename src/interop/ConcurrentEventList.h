@@ -1,4 +1,4 @@
-// Events that several threads report at once. Internal.
+// A list of events to which several threads append. Internal.
 #pragma once
 
 #include <algorithm>
@@ -12,16 +12,16 @@
 #include <CL/cl.h>
 #include <tbb/concurrent_vector.h>
 
-// A list to which any number of threads append at the same time, with one atomic operation each; a
-// lock is taken only to make the list longer than it ever was. Borrows the events.
+// A list to which any number of threads append at the same time. An append needs no lock unless the
+// list becomes longer than ever before. Borrows the events.
 //
-// append and copyTo may run at the same time; everything else needs the list to itself.
+// append and copyTo may run at the same time; no other function may overlap with another.
 class ConcurrentEventList {
 public:
     ConcurrentEventList() { grow(0); }
 
-    // A null event is an entry like any other. Running out of memory raises std::bad_alloc and
-    // appends nothing.
+    // Appends an event, which may be null. Throws std::bad_alloc, and appends nothing, when memory
+    // runs out.
     void append(cl_event event)
     {
         std::size_t index = fSize.load(std::memory_order_relaxed);
@@ -42,8 +42,8 @@ public:
         forFirst(fSize.load(std::memory_order_acquire), use);
     }
 
-    // Replaces the contents of `events` by the events appended so far, in order. Running out of
-    // memory raises std::bad_alloc and leaves `events` empty.
+    // Replaces the contents of `events` by the events appended so far, in order. Throws
+    // std::bad_alloc, and leaves `events` empty, when memory runs out.
     void copyTo(std::vector<cl_event>& events) const
     {
         const std::size_t size = fSize.load(std::memory_order_acquire);
@@ -52,7 +52,7 @@ public:
         forFirst(size, [&](cl_event event) { events.push_back(event); });
     }
 
-    // Keeps the storage and releases nothing.
+    // Removes all events without releasing them. Keeps the storage.
     void clear()
     {
         const std::size_t size = fSize.exchange(0);
@@ -70,7 +70,7 @@ private:
         std::atomic<bool> isWritten = false;
     };
 
-    // More than the deformers of most scenes report in one evaluation; a longer list grows.
+    // Most scenes report fewer events in one evaluation.
     static constexpr std::size_t kReservedEvents = 100;
 
     template <typename Use>
@@ -80,11 +80,10 @@ private:
             use(written(index));
     }
 
-    // A growth that ran out of memory half way leaves a vector that cannot grow past that; clear
-    // replaces it.
+    // Growth that runs out of memory leaves a vector that cannot grow any more; clear replaces it.
     bool canGrow() const { return fSlots.size() == fSlotCount; }
 
-    // Makes the slot at `index`, and as many again, unless another thread was faster.
+    // Creates the slot at `index`, and as many again, unless another thread has done so.
     void grow(std::size_t index)
     {
         const std::scoped_lock lock(fGrowth);
@@ -96,7 +95,7 @@ private:
         fSlotCount.store(fSlots.size(), std::memory_order_release);
     }
 
-    // The event of a slot that is taken, once it is written.
+    // Waits until the slot at `index`, which is taken, is written, and returns its event.
     cl_event written(std::size_t index) const
     {
         const Slot& slot = fSlots[index];

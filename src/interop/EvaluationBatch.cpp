@@ -23,8 +23,8 @@ bool graphicsWaitsForSyncObjects()
     return TopenCLInfo::theOne().clToGraphicsSyncMode() == TopenCLInfo::kCLToGraphicsSyncObject;
 }
 
-// Appends `event` with a reference of the list's own, which ReleaseBufferBatch pays back. When the
-// list cannot grow, raises std::bad_alloc and keeps no reference.
+// Appends `event` with a reference of the list's own, which ReleaseBufferBatch releases. Throws
+// std::bad_alloc, and keeps no reference, if the list cannot grow.
 void appendOwned(ConcurrentEventList& list, cl_event event)
 {
     retainCLObject(event);
@@ -36,16 +36,15 @@ void appendOwned(ConcurrentEventList& list, cl_event event)
     }
 }
 
-// Appends `event`; when the list cannot grow, waits for the event instead: what the list is read
-// for then needs no wait. For an event whose command cannot be taken back any more. Returns whether
-// it is in the list.
+// Appends `event`, or waits for it if the list cannot grow: then no later command needs to. For an
+// event whose command is enqueued already. Returns whether the event is in the list.
 bool appendOrWait(ConcurrentEventList& list, cl_event event)
 {
     try {
         list.append(event);
         return true;
     } catch (const std::bad_alloc&) {
-        reportFailure(ocl.clWaitForEvents(1, &event));
+        waitForEvent(event);
         return false;
     }
 }
@@ -74,19 +73,19 @@ void TopenCLSharedBufferMgr::AcquireBatch()
     if (acquiresWaitForFence())
         WaitForGraphicsFence();
 
-    // From here on nothing is thrown: the release that goes with the acquire is still to come.
+    // Nothing below throws, so that the release that belongs to this acquire is always enqueued.
     fBatchAcquired = true;
     const cl_int status = sfEnqueueAcquireSharedObjects(queue, static_cast<cl_uint>(fBatch.size()),
-                                                        bareHandles(fBatch.data()), 0, nullptr,
+                                                        rawHandles(fBatch.data()), 0, nullptr,
                                                         fAcquireEvent.receive());
     const cl_event acquired = fAcquireEvent.get();
     if (acquired && appendOrWait(fImpl->fReleaseWaitEvents, acquired))
-        ocl.clRetainEvent(acquired); // the list's reference, paid back by ReleaseBufferBatch
+        ocl.clRetainEvent(acquired); // the list's reference, released by ReleaseBufferBatch
     reportFailure(status);
 }
 
-// Rebuilds the batch from the records, in the order of their handles. Takes no lock. Running out of
-// memory raises std::bad_alloc and leaves the batch as it was.
+// Rebuilds the batch from the records, in the order of their handles. Takes no lock. Throws
+// std::bad_alloc, and leaves the batch unchanged, when memory runs out.
 void TopenCLSharedBufferMgr::UpdateBufferBatch()
 {
     fBatch.reserve(fBuffers.size());
@@ -112,18 +111,18 @@ int TopenCLSharedBufferMgr::EnqueueAcquireSharedCLBuffer(cl_command_queue queue,
     }
     if (acquiresWaitForFence())
         WaitForGraphicsFence();
-    return sfEnqueueAcquireSharedObjects(queue, 1, bareHandles(&buffer->fMem), 0, nullptr, event);
+    return sfEnqueueAcquireSharedObjects(queue, 1, rawHandles(&buffer->fMem), 0, nullptr, event);
 }
 
 const cl_event* TopenCLSharedBufferMgr::EnqueueReleaseBatchedSharedCLBuffer(unsigned int numEvents,
                                                                             const cl_event* events)
 {
-    // While nothing is batched no release would ever pay the references back.
+    // If batching is off, no release would ever release the references.
     if (fBatchingEnabled && events) {
         for (unsigned int index = 0; index < numEvents; ++index)
             appendOwned(fImpl->fReleaseWaitEvents, events[index]);
     }
-    return bareHandles(&fReleaseEvent);
+    return rawHandles(&fReleaseEvent);
 }
 
 int TopenCLSharedBufferMgr::EnqueueReleaseSharedCLBuffer(cl_command_queue queue,
@@ -159,7 +158,7 @@ void TopenCLSharedBufferMgr::PostEvaluate(const em::Id& /*id*/)
     try {
         UpdateBufferBatch();
     } catch (const std::bad_alloc&) {
-        // The batch stays dirty, so that the next PreEvaluate rebuilds it.
+        // The batch stays dirty: the next PreEvaluate rebuilds it.
     }
 }
 
@@ -171,7 +170,7 @@ void TopenCLSharedBufferMgr::ReleaseBufferBatch()
         const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
         const std::vector<cl_event>& waitList = fImpl->releaseWaitList();
         reportFailure(sfEnqueueReleaseSharedObjects(
-            queue, static_cast<cl_uint>(fBatch.size()), bareHandles(fBatch.data()),
+            queue, static_cast<cl_uint>(fBatch.size()), rawHandles(fBatch.data()),
             static_cast<cl_uint>(waitList.size()), waitList.empty() ? nullptr : waitList.data(),
             fReleaseEvent.receive()));
         fImpl->fReleaseWaitEvents.forEach([](cl_event event) { releaseCLObject(event); });

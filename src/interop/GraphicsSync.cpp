@@ -12,28 +12,28 @@
 
 namespace {
 
-// As in the OpenGL headers.
+// Values of the OpenGL headers.
 constexpr unsigned int kGLSyncGPUCommandsComplete = 0x9117;
 constexpr unsigned int kGLSyncFlushCommandsBit = 1;
 constexpr unsigned int kGLTimeoutExpired = 0x911B;
 constexpr std::uint64_t kGLTimeoutIgnored = ~std::uint64_t{0};
 
-// One slice of a wait: long enough to cost nothing, short enough that the flush bit is given again.
+// The time-out of one call; each call of a longer wait flushes again.
 constexpr std::uint64_t kFenceWaitNanoseconds = 1'000'000'000;
 
-// The renderer's fence, or null while none is pending. Whoever exchanges it out deletes it.
+// The renderer's fence, or null if none is pending. The thread that exchanges it out deletes it.
 constinit std::atomic<GLsync> sfGraphicsFence = nullptr;
 
-// Held from taking the fence out until it is deleted, so that nobody overtakes a wait. Made with
-// the first wait: std::mutex needs a constructor on some systems, and no static object here may
-// have one.
+// Held from exchanging the fence until it is deleted, so that other threads return only after the
+// wait. Constructed by the first wait: std::mutex has a constructor on some systems, and static
+// objects of this file must not have one.
 std::mutex& fenceWaitMutex()
 {
     static std::mutex theMutex;
     return theMutex;
 }
 
-// The host's table when sync objects are usable, else null.
+// Returns the host's table if sync objects are usable, else null.
 GLFunctionTable* syncObjectFunctions()
 {
     GLFunctionTable* gl = GLFunctionTable::fpGlobalFunctionTable;
@@ -64,7 +64,7 @@ void WaitForGraphicsFence()
     GLsync fence = sfGraphicsFence.exchange(nullptr);
     if (!fence)
         return;
-    // Any other answer ends the wait, a failure too.
+    // Any other result ends the wait, including a failure.
     while (gl->glClientWaitSync(fence, kGLSyncFlushCommandsBit, kFenceWaitNanoseconds) ==
            kGLTimeoutExpired) {
     }

@@ -1,18 +1,18 @@
-// How OpenCL and the OpenGL stream wait for each other where the sharing extension does not see to
-// it. Internal.
+// Waits between OpenCL and the OpenGL stream, if the sharing extension does not order them.
+// Internal.
 #pragma once
 
 #include <CL/cl.h>
 
-// Replaces the pending fence by a new one behind all OpenGL commands so far. On the renderer's
-// thread. Does nothing when sync objects are not usable.
+// Replaces the pending fence by a new one after all OpenGL commands so far. Called on the
+// renderer's thread. Does nothing if sync objects are not usable.
 void SetGraphicsFence();
 
-// Blocks until the pending fence, if there is one, is signalled, and removes it. From any thread:
-// one waits and removes, the others go on only when that wait has ended. Makes the resource
-// window's context current where the host offers one for the calling thread.
+// Blocks until the pending fence, if there is one, is signalled, and deletes it. Safe from any
+// thread: one thread waits and deletes, the others return after that. Makes the resource window's
+// context current if the host has one for the calling thread.
 void WaitForGraphicsFence();
 
-// Makes the OpenGL stream of the context that is current on the calling thread wait for `event`;
-// the thread itself does not. Does nothing where no sync object can be made from it.
+// Makes the OpenGL stream of the calling thread's current context wait for `event`. Does not block.
+// Does nothing if no sync object can be created from the event.
 void GraphicsWaitForCLEvent(cl_event event);

@@ -1,4 +1,4 @@
-// What the host's profiler hears of the batch. Internal.
+// The batch's events for the host's profiler. Internal.
 #pragma once
 
 #include "host/Profiler.h"
@@ -7,7 +7,7 @@
 extern const profiler::EventType sfAcquireBatchEventType;
 extern const profiler::EventType sfReleaseBatchEventType;
 
-// An event of the host's profiler from construction to destruction, when the profiler records.
+// An event of the host's profiler from construction to destruction, if the profiler records.
 class ProfilerScope {
 public:
     explicit ProfilerScope(const profiler::EventType& type) : fActive(profiler::samplingActive())

@@ -1,4 +1,4 @@
-// Part of TopenCLSharedBufferMgr: its construction, and how shared buffers come and go.
+// Part of TopenCLSharedBufferMgr: construction, and creation and destruction of shared buffers.
 #include "diagnostics/CLStatusReport.h"
 #include "host/Environment.h"
 #include "interop/SharedBufferMgrBlock.h"
@@ -13,13 +13,13 @@
 
 namespace {
 
-// A manager has been constructed in this process: the message of the first is not considered again.
+// Whether a manager has been constructed in this process: only the first one prints its message.
 constinit bool sfConstructedOnce = false;
 
 } // namespace
 
 TopenCLSharedBufferMgr::TopenCLSharedBufferMgr()
-    : fImpl(std::make_unique<TopenCLSharedBufferMgrImpl>()), fEvaluationId(kNoEvaluation)
+    : fImpl(std::make_unique<TopenCLSharedBufferMgrImpl>())
 {
     const bool forceThreading = VyraGetEnv("VYRA_OPENCL_FORCE_THREADING") != nullptr;
     fBatchingEnabled = !forceThreading;
@@ -41,7 +41,7 @@ TopenCLSharedBufferMgr& TopenCLSharedBufferMgr::operator=(const TopenCLSharedBuf
 {
     if (this == &other)
         return *this;
-    // The list owns its references; the copy begins with an empty one.
+    // The list owns its references; it is not copied.
     fImpl->fReleaseWaitEvents.forEach([](cl_event event) { releaseCLObject(event); });
     fImpl->fReleaseWaitEvents.clear();
     fImpl->fGraphicsWaitEvents.clear();
@@ -59,8 +59,8 @@ TopenCLSharedBufferMgr& TopenCLSharedBufferMgr::operator=(const TopenCLSharedBuf
 
 TopenCLSharedBufferMgr::~TopenCLSharedBufferMgr()
 {
-    // The lists go first, before the events that they may borrow; the members follow in reverse
-    // order.
+    // Destroys the lists before the events that they may borrow; the other members follow in
+    // reverse order.
     fImpl.reset();
 }
 
@@ -77,7 +77,7 @@ const TopenCLSharedBuffer* TopenCLSharedBufferMgr::CreateSharedCLBuffer(cl_conte
 
     const std::scoped_lock lock(fImpl->fMutex);
     TopenCLSharedBuffer& record = fBuffers[created.get()];
-    // An exchange: the reference of a record that was there already goes with `created`.
+    // An exchange: `created` releases the reference of a record that already existed.
     record.fMem = std::move(created);
     fBatchDirty = true;
     return &record;
@@ -94,16 +94,11 @@ int TopenCLSharedBufferMgr::DestroySharedCLBuffer(const TopenCLSharedBuffer* buf
     return result;
 }
 
-// Waits for the batch's last release and leaves every buffer on its own. Returns the status of the
+// Waits for the batch's last release and makes every buffer unbatched. Returns the status of the
 // wait.
 int TopenCLSharedBufferMgr::DissolveBatch()
 {
-    int result = CL_SUCCESS;
-    if (fReleaseEvent.get()) {
-        const cl_event released = fReleaseEvent.get();
-        result = ocl.clWaitForEvents(1, &released);
-        reportFailure(result);
-    }
+    const int result = fReleaseEvent.get() ? waitForEvent(fReleaseEvent.get()) : CL_SUCCESS;
     fBatch.clear();
     for (auto& [memory, record] : fBuffers)
         record.fInBatch = false;
@@ -119,7 +114,7 @@ int TopenCLSharedBufferMgr::DestroyBatchedSharedCLBuffer(const TopenCLSharedBuff
     return CL_SUCCESS;
 }
 
-// Takes one buffer out of the batch, which keeps the order of the others.
+// Removes one buffer from the batch, which keeps the order of the others.
 void TopenCLSharedBufferMgr::LeaveBatch(const TopenCLSharedBuffer& record)
 {
     const auto member = std::find_if(fBatch.begin(), fBatch.end(), [&](const auto& memory) {
@@ -128,21 +123,21 @@ void TopenCLSharedBufferMgr::LeaveBatch(const TopenCLSharedBuffer& record)
     if (member == fBatch.end())
         return;
     if (fBatchAcquired)
-        ReleaseAlone(record);
+        ReleaseUnbatched(record);
     fBatch.erase(member);
 }
 
-// Releases one buffer of the acquired batch, after all events handed over so far, and waits for it.
-// The events stay listed, since the rest of the batch waits for them too.
-void TopenCLSharedBufferMgr::ReleaseAlone(const TopenCLSharedBuffer& record)
+// Releases one buffer of the acquired batch, after all events reported so far, and waits for that.
+// The events stay listed, since the release of the rest of the batch waits for them too.
+void TopenCLSharedBufferMgr::ReleaseUnbatched(const TopenCLSharedBuffer& record)
 {
     const std::vector<cl_event>& waitList = fImpl->releaseWaitList();
     AutoCLObject<cl_event> released;
     reportFailure(sfEnqueueReleaseSharedObjects(
-        TopenCLInfo::theOne().openCLCommandQueue(), 1, bareHandles(&record.fMem),
+        TopenCLInfo::theOne().openCLCommandQueue(), 1, rawHandles(&record.fMem),
         static_cast<cl_uint>(waitList.size()), waitList.empty() ? nullptr : waitList.data(),
         released.receive()));
-    // A failed release leaves no event to wait for.
+    // A failed release returns no event to wait for.
     if (released.get())
-        reportFailure(ocl.clWaitForEvents(1, bareHandles(&released)));
+        waitForEvent(released.get());
 }

@@ -8,9 +8,9 @@
 
 // The record of one shared buffer. Its address stays valid until the record is destroyed.
 struct VYRA_OPENCL_API TopenCLSharedBuffer {
-    // The memory object made from the renderer's buffer. First, so that the record's address serves
-    // as a list of one memory object.
+    // The memory object created from the renderer's buffer. The first member, so that the record's
+    // address is also that of an array of one memory object.
     AutoCLObject<cl_mem> fMem;
-    // The buffer is acquired and released with the manager's batch, not on its own.
+    // True if the buffer is acquired and released with the manager's batch.
     bool fInBatch = false;
 };

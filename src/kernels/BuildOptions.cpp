@@ -1,15 +1,15 @@
-// Part of TopenCLKernelStore: the option string of a build, which is also half of a program's key.
+// Part of TopenCLKernelStore: the option string of a build, which is part of a program's key.
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
 namespace {
 
-// What a caller without wishes of its own gets: fast arithmetic, and warnings that stop the build.
+// The options for callers that pass none: fast arithmetic, and warnings as errors.
 constexpr const char* kDefaultFlags =
     "-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror";
 
-// `dir` without the spaces around it, in double quotes when there are spaces in it.
+// Returns `dir` without spaces at its ends, in double quotes if it contains spaces.
 Tstring quoteIncludePath(const Tstring& dir)
 {
     Tstring trimmed = dir;

@@ -12,22 +12,22 @@ std::string_view viewOf(const Tstring& text)
     return {text.asChar(), text.length()};
 }
 
-// Of the last bytes alone: there the files of a folder differ, and the variants of a program. To
-// hash the whole of long texts would cost more than the rest of a look-up.
-std::size_t hashOfEnd(std::string_view text)
+// Hashes only the last bytes, in which the files of a folder and the variants of a program differ:
+// hashing the whole of long texts would cost more than the rest of a look-up.
+std::size_t hashEnd(std::string_view text)
 {
     constexpr std::size_t kHashed = 16;
     text.remove_prefix(text.size() - std::min(text.size(), kHashed));
     return std::hash<std::string_view>()(text);
 }
 
-bool sameTexts(const TstringArray& known, const TstringArray* asked)
+bool sameTexts(const TstringArray& known, const TstringArray* requested)
 {
-    const unsigned int count = asked ? asked->length() : 0;
+    const unsigned int count = requested ? requested->length() : 0;
     if (known.length() != count)
         return false;
     for (unsigned int index = 0; index < count; ++index) {
-        if (!(known[index] == (*asked)[index]))
+        if (!(known[index] == (*requested)[index]))
             return false;
     }
     return true;
@@ -45,8 +45,8 @@ TopenCLKernelStore::Index::Request::Request(const char* programName, const char*
 
 std::size_t TopenCLKernelStore::Index::Request::hash() const
 {
-    constexpr std::size_t kFactor = 31; // so that name and flags do not stand for each other
-    return hashOfEnd(name) * kFactor + hashOfEnd(flags);
+    constexpr std::size_t kFactor = 31; // exchanging name and flags changes the hash
+    return hashEnd(name) * kFactor + hashEnd(flags);
 }
 
 TopenCLKernelStore::Index::KnownRequest::KnownRequest(const Request& request,
@@ -90,7 +90,7 @@ TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::Index::take(cl_kernel kerne
 {
     const auto found =
         std::find_if(fKernels.rbegin(), fKernels.rend(),
-                     [&](const HandedOut& handedOut) { return handedOut.kernel == kernel; });
+                     [&](const KernelInUse& entry) { return entry.kernel == kernel; });
     if (found == fKernels.rend())
         return nullptr;
     ProgramInfo* program = found->program;
@@ -102,5 +102,5 @@ TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::Index::take(cl_kernel kerne
 void TopenCLKernelStore::Index::forget(const ProgramInfo& program)
 {
     std::erase_if(fRequests, [&](const auto& entry) { return entry.second.program == &program; });
-    std::erase_if(fKernels, [&](const HandedOut& entry) { return entry.program == &program; });
+    std::erase_if(fKernels, [&](const KernelInUse& entry) { return entry.program == &program; });
 }

@@ -1,6 +1,7 @@
-// Short cuts into the kernel store's cache. Internal.
+// Fast look-up in the kernel store's cache. Internal.
 #pragma once
 
+#include "diagnostics/ReserveForOne.h"
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
 
@@ -9,23 +10,15 @@
 #include <unordered_map>
 #include <vector>
 
-// So that one more element can be appended without memory.
-template <typename Element>
-void makeRoomForOne(std::vector<Element>& list)
-{
-    if (list.size() == list.capacity())
-        list.reserve(2 * list.size() + 1);
-}
-
-// Finds a program by the words in which it was asked for, without its option string being put
-// together, and by a kernel that was made from it, without a walk through all programs.
+// An index that finds a program by the arguments of a request, without building its option string,
+// and by a kernel created from it, without a search through all programs.
 //
-// Everything in here stands in the store's own map and lists as well; a program that is not found
-// by its request may still be there, asked for in other words. Guarded by the store's lock. Running
-// out of memory raises std::bad_alloc and changes nothing.
+// The store's own map and lists hold the same entries. A program that is not found by a request may
+// still be in the store, under other arguments that give the same key. Guarded by the store's lock.
+// Throws std::bad_alloc when memory runs out, and is then unchanged.
 class TopenCLKernelStore::Index {
 public:
-    // What a program's key depends on, as it was asked for. Borrows its arguments.
+    // The arguments of a request that determine a program's key. Borrowed.
     struct Request {
         Request(const char* programName, const char* buildFlags, const TstringArray* dirs);
         std::size_t hash() const;
@@ -37,22 +30,22 @@ public:
         bool doublePrecision;
     };
 
-    // Null when nobody asked in these words since the program was built.
+    // Returns the program of an equal request since the program was built, or null.
     ProgramInfo* find(const Request& request) const;
-    // Has `program` found by `request`. Returns `program`; null is not remembered.
+    // Makes find return `program` for `request`. Returns `program`; null is not stored.
     ProgramInfo* remember(const Request& request, ProgramInfo* program);
 
-    // So that the next kernel can be added without memory.
-    void makeRoomForKernel() { makeRoomForOne(fKernels); }
+    // Makes the next call of add allocate nothing.
+    void reserveForKernel() { reserveForOne(fKernels); }
     void add(cl_kernel kernel, ProgramInfo& program);
-    // The program of `kernel`, which is known no longer afterwards; null when it is not known.
+    // Removes `kernel` and returns its program, or null if the kernel is not in the index.
     ProgramInfo* take(cl_kernel kernel);
 
-    // Removes every entry of a program that is about to be dropped.
+    // Removes every entry of a program that is about to be destroyed.
     void forget(const ProgramInfo& program);
 
 private:
-    // A request with texts of its own.
+    // A request that owns its texts.
     struct KnownRequest {
         KnownRequest(const Request& request, ProgramInfo* itsProgram);
         bool operator==(const Request& request) const;
@@ -64,11 +57,11 @@ private:
         bool doublePrecision;
         ProgramInfo* program;
     };
-    struct HandedOut {
+    struct KernelInUse {
         cl_kernel kernel;
         ProgramInfo* program;
     };
 
     std::unordered_multimap<std::size_t, KnownRequest> fRequests; // by hash
-    std::vector<HandedOut> fKernels;                              // the latest near the end
+    std::vector<KernelInUse> fKernels;                            // the latest near the end
 };

@@ -1,4 +1,4 @@
-// Part of TopenCLInfo: where kernel sources lie, and how they are read.
+// Part of TopenCLInfo: the directory of kernel sources, and reading them.
 #include "host/Application.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -15,7 +15,7 @@ struct FileCloser {
 };
 using File = std::unique_ptr<std::FILE, FileCloser>;
 
-// The size in bytes, or a negative number when it cannot be told. Leaves the position at the start.
+// Returns the size in bytes, or a negative number on failure. Sets the position to the start.
 long fileSize(std::FILE* file)
 {
     if (std::fseek(file, 0, SEEK_END) != 0)
@@ -36,14 +36,14 @@ Tstring& TopenCLInfo::getAbsolutePathToResources()
 bool TopenCLInfo::oclLoadProgSource(Tstring& source, const char* fileName, const char* preamble)
 {
     source.setLength(0);
-    // Binary, so that line ends reach the OpenCL compiler unchanged.
+    // Binary, so that the OpenCL compiler receives line ends unchanged.
     const File file(std::fopen(fileName, "rb"));
     if (!file)
         return false;
 
     const std::size_t preambleLength = std::strlen(preamble);
     const long size = fileSize(file.get());
-    // Also refuses what is no file: a directory opens here and tells an absurd size.
+    // Also rejects directories, which open on some systems and report a huge size.
     if (size < 0 || size > std::numeric_limits<std::int32_t>::max())
         return false;
     const std::size_t textLength = preambleLength + static_cast<std::size_t>(size);
@@ -52,7 +52,7 @@ bool TopenCLInfo::oclLoadProgSource(Tstring& source, const char* fileName, const
 
     source.setLength(static_cast<unsigned int>(textLength + 1));
     std::memcpy(source.data(), preamble, preambleLength);
-    // One element of the file's size: an empty file counts as unreadable.
+    // Reads one element of the file's size, which fails for an empty file.
     if (std::fread(source.data() + preambleLength, static_cast<std::size_t>(size), 1, file.get()) !=
         1)
         return false;

@@ -71,13 +71,13 @@ AutoCLObject<cl_kernel> TopenCLKernelStore::getKernelFromString(const char* sour
     return program ? createKernel(*program, kernelName) : AutoCLObject<cl_kernel>();
 }
 
-// A new kernel with two references: the result's, and the one in the program's list.
+// Creates a kernel with two references: the result's, and that of the program's list.
 AutoCLObject<cl_kernel> TopenCLKernelStore::createKernel(ProgramInfo& program,
                                                          const char* kernelName)
 {
-    // Memory for both lists first: without it nothing has been created yet.
-    makeRoomForOne(program.fKernels);
-    fIndex->makeRoomForKernel();
+    // Memory for both lists first, so that running out of it loses no kernel.
+    reserveForOne(program.fKernels);
+    fIndex->reserveForKernel();
     AutoCLObject<cl_kernel> kernel;
     cl_int status = CL_SUCCESS;
     kernel.adopt(ocl.clCreateKernel(program.fProgram.get(), kernelName, &status));
@@ -97,7 +97,7 @@ bool TopenCLKernelStore::freeKernel(const AutoCLObject<cl_kernel>& kernel)
     ProgramInfo* program = fIndex->take(kernel.get());
     if (!program)
         return false;
-    // One element: a runtime that returned a handle twice listed it twice.
+    // One element: a handle that the runtime returned twice is listed twice.
     auto& kernels = program->fKernels;
     kernels.erase(std::ranges::find(kernels, kernel.get(), &AutoCLObject<cl_kernel>::get));
     if (kernels.empty()) {
@@ -131,8 +131,7 @@ TopenCLKernelStore::getProgramFromString(const char* source, const char* program
     return cacheProgram(std::move(key), source);
 }
 
-// Builds the program of a key that is not cached. Null, and nothing cached, when it cannot be
-// built.
+// Builds the program of a key that is not cached. Returns null, and caches nothing, on failure.
 TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::cacheProgram(ProgramKey&& key,
                                                                   const char* source)
 {
@@ -145,7 +144,7 @@ TopenCLKernelStore::ProgramInfo* TopenCLKernelStore::cacheProgram(ProgramKey&& k
     return &info;
 }
 
-// A built program with one reference, which is the caller's; null when it cannot be built.
+// Returns a built program, whose one reference the caller owns, or null on failure.
 cl_program TopenCLKernelStore::getProgramFromString(const char* source, const char* options)
 {
     Tstring buildOptions(options);
@@ -161,30 +160,30 @@ cl_program TopenCLKernelStore::getProgramFromString(const char* source, const ch
     reportFailure(
         ocl.clBuildProgram(program, 1, &fDevice, buildOptions.asChar(), nullptr, nullptr));
     cl_build_status buildStatus = CL_BUILD_ERROR;
-    const bool known = succeeded(ocl.clGetProgramBuildInfo(
+    const bool known = checkStatus(ocl.clGetProgramBuildInfo(
         program, fDevice, CL_PROGRAM_BUILD_STATUS, sizeof buildStatus, &buildStatus, nullptr));
     if (known && buildStatus == CL_BUILD_SUCCESS)
         return program;
 
     reportBuildLog(program);
-    ocl.clReleaseProgram(program); // the only reference; nobody could act on a failure
+    ocl.clReleaseProgram(program); // the only reference; a failure cannot be handled
     return nullptr;
 }
 
-// Hands what the compiler said to the warning sink, if it said anything.
+// Passes the build log to the warning sink unless it is empty.
 void TopenCLKernelStore::reportBuildLog(cl_program program)
 {
     std::size_t size = 0;
-    if (!succeeded(
+    if (!checkStatus(
             ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, 0, nullptr, &size)))
         return;
     if (size == 0)
         return;
-    // Without memory for the log there is no log: the program must still be released.
+    // Without memory for the log there is none: the caller must still release the program.
     const std::unique_ptr<char[]> log(new (std::nothrow) char[size + 1]());
     if (log &&
-        succeeded(ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, size, log.get(),
-                                            nullptr)) &&
+        checkStatus(ocl.clGetProgramBuildInfo(program, fDevice, CL_PROGRAM_BUILD_LOG, size,
+                                              log.get(), nullptr)) &&
         log[0] != '\0')
         CLInternalWarning("%s", log.get());
 }

@@ -1,4 +1,4 @@
-// Kernels, from programs that are built once.
+// A cache of programs that hands out kernels.
 #pragma once
 
 #include "VyraOpenCLExport.h"
@@ -17,54 +17,54 @@
 
 class TstringArray;
 
-// Builds each program once per name and option string, keeps it while kernels made from it are
-// outstanding, and hands out a new kernel object for every request, so that no two callers share
-// the arguments of one.
+// A cache that builds each program once per name and option string and keeps it while kernels
+// created from it are in use. Every request returns a new kernel object, so that no two callers
+// share its arguments.
 //
 // Programs from files (named by their path) and from source texts share one cache; the text itself
-// is not part of the key. Any number of threads may call; they take turns, and a turn that misses
-// the cache lasts for the reading of a file and a whole build. Failing OpenCL calls are reported as
-// warnings and give an empty result; a failed build also passes its log to the warning sink. A file
-// that cannot be read and a program that does not build are not cached: the next request tries
-// again. A program that builds stays cached even if it has no kernel of the requested name.
+// is not part of the key. Safe from any thread; calls are serialised, and a call that misses the
+// cache reads a file and builds a program. Failing OpenCL calls are reported as warnings and return
+// an empty holder; a failed build also passes its log to the warning sink. A file that cannot be
+// read and a program that does not build are not cached: the next request tries again. A program
+// that builds stays cached even if it has no kernel of the requested name.
 class VYRA_OPENCL_API TopenCLKernelStore {
 public:
     TopenCLKernelStore();
-    // Drops the store's references. Kernels that callers still hold stay usable.
+    // Releases the store's references. Kernels that callers still hold stay usable.
     ~TopenCLKernelStore();
     TopenCLKernelStore(const TopenCLKernelStore&) = delete;
     TopenCLKernelStore& operator=(const TopenCLKernelStore&) = delete;
 
-    // Called once, before anybody else uses the store. The handles are borrowed. A null `context`
-    // changes nothing.
+    // Sets the context and device to build for. Called once, before any other function. The handles
+    // are borrowed. A null `context` changes nothing.
     void initialize(cl_context context, cl_device_id device, OpenCLProvider provider);
 
-    // A new kernel `kernelName` of the program in the file `fileName`, taken exactly as given. Null
-    // `buildFlags` stand for the default options (an empty text does not); `includeDirs` may be
-    // null. The caller owns the result's reference and gives the kernel back with freeKernel. Wraps
-    // clCreateKernel and, for a program that is not cached, clCreateProgramWithSource and
-    // clBuildProgram.
+    // Returns a new kernel `kernelName` of the program in the file `fileName`, a path that is used
+    // unchanged. Null `buildFlags` select the default options (an empty text does not);
+    // `includeDirs` may be null. The caller owns the result's reference and releases the kernel
+    // with freeKernel. Wraps clCreateKernel and, for a program that is not cached,
+    // clCreateProgramWithSource and clBuildProgram.
     AutoCLObject<cl_kernel> getKernel(const char* fileName, const char* buildFlags,
                                       const char* kernelName, const TstringArray* includeDirs);
 
-    // The same for the NUL-terminated program text `source`, cached under `programName`.
+    // As getKernel, for the NUL-terminated program text `source`, cached under `programName`.
     AutoCLObject<cl_kernel> getKernelFromString(const char* source, const char* programName,
                                                 const char* buildFlags, const char* kernelName,
                                                 const TstringArray* includeDirs);
 
-    // Gives back a kernel of this store; its program goes with the last one. True when the kernel
-    // was found, and for an empty holder. The caller's own reference is not touched.
+    // Removes a kernel from the store, and its program with the program's last kernel. Returns true
+    // if the kernel was found, and for an empty holder. The caller's own reference is unchanged.
     bool freeKernel(const AutoCLObject<cl_kernel>& kernel);
 
 private:
     struct ProgramInfo {
         AutoCLObject<cl_program> fProgram;
-        std::vector<AutoCLObject<cl_kernel>> fKernels; // handed out and not yet given back
+        std::vector<AutoCLObject<cl_kernel>> fKernels; // returned by getKernel and not yet freed
     };
 
-    class Index; // short cuts to what fPrograms holds
+    class Index; // fast look-up of the contents of fPrograms
 
-    // The program's name and its option string, without the vendor's own flag.
+    // The program's name and its option string, without the vendor's flag.
     using ProgramKey = std::pair<Tstring, Tstring>;
     struct ProgramKeyHash {
         std::size_t operator()(const ProgramKey& key) const;

@@ -1,8 +1,8 @@
 // The file name of the OpenCL library.
 #pragma once
 
-// The library that the system's loader finds by this name is opened at run time; nothing links it.
-// Code that calls OpenCL next to this library opens the same one.
+// The library is opened at run time by this name; nothing links it. Other code of the process that
+// calls OpenCL opens the same file.
 #if defined(_WIN32)
 inline constexpr const char* kOpenCLLibraryName = "OpenCL.dll";
 #else

@@ -26,7 +26,7 @@ OpenCLLoadStatus loadOpenCL()
     if (!library)
         return OpenCLLoadStatus::kNoLibrary;
 
-    // First, since the others may be found through it.
+    // First, since it may resolve the others.
     resolve(library, "clGetExtensionFunctionAddress", ocl.clGetExtensionFunctionAddress);
 
     bool complete = true;

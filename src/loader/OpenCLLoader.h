@@ -1,14 +1,14 @@
 // Every OpenCL entry point that the library calls, resolved at run time. Internal.
 //
-// Nothing links the OpenCL loader library: ours loads, and says so politely, where there is none.
+// Nothing links the OpenCL loader library, so that this library also loads without one.
 #pragma once
 
 #include <CL/cl.h>
 #include <CL/cl_gl.h>
 
-// Direct3D 11 objects travel as plain pointers and its enumerations as 32-bit numbers, since the
-// system's own headers are Windows'. The two extensions, of the Khronos group and of NVIDIA, share
-// all signatures and values.
+// Direct3D 11 objects are passed as plain pointers and its enumerations as 32-bit numbers, since
+// Direct3D's headers exist on Windows only. The two extensions, of the Khronos group and of NVIDIA,
+// have the same signatures and values.
 using D3D11GetDeviceIDs = cl_int(CL_API_CALL*)(cl_platform_id platform, cl_uint sourceKind,
                                                void* d3dObject, cl_uint deviceSet,
                                                cl_uint numEntries, cl_device_id* devices,
@@ -24,7 +24,7 @@ inline constexpr cl_uint kCLPreferredDevicesForD3D11 = 0x401B; // CL_PREFERRED_D
 inline constexpr cl_context_properties kCLContextD3D11Device =
     0x401D; // CL_CONTEXT_D3D11_DEVICE_KHR
 
-// The OpenCL 1.0 functions without which nothing works.
+// The functions of OpenCL 1.0 that are required.
 #define VYRA_OPENCL_CORE_ENTRY_POINTS(X)                                                           \
     X(clGetPlatformIDs)                                                                            \
     X(clGetPlatformInfo)                                                                           \
@@ -55,14 +55,14 @@ inline constexpr cl_context_properties kCLContextD3D11Device =
     X(clReleaseKernel)                                                                             \
     X(clGetExtensionFunctionAddress)
 
-// OpenGL sharing; each may be missing.
+// The functions of OpenGL sharing. Each is optional.
 #define VYRA_OPENCL_GL_ENTRY_POINTS(X)                                                             \
     X(clGetGLContextInfoKHR)                                                                       \
     X(clCreateFromGLBuffer)                                                                        \
     X(clEnqueueAcquireGLObjects)                                                                   \
     X(clEnqueueReleaseGLObjects)
 
-// Direct3D 11 sharing, with their types; each may be missing.
+// The functions of Direct3D 11 sharing, with their types. Each is optional.
 #define VYRA_OPENCL_D3D11_ENTRY_POINTS(X)                                                          \
     X(D3D11GetDeviceIDs, clGetDeviceIDsFromD3D11KHR)                                               \
     X(D3D11GetDeviceIDs, clGetDeviceIDsFromD3D11NV)                                                \
@@ -91,7 +91,7 @@ extern OpenCLEntryPoints ocl;
 enum class OpenCLLoadStatus : int {
     kLoaded = 0,
     kNoLibrary,        // the library cannot be opened
-    kNoCoreEntryPoint, // it lacks a function of OpenCL 1.0
+    kNoCoreEntryPoint, // the library lacks a required function
 };
 
 // Opens the system's OpenCL loader library and fills the table; each entry is looked up in the

@@ -3,17 +3,22 @@
 #include "loader/OpenCLLoader.h"
 #include "runtime/TopenCLInfo.h"
 
+#include <optional>
+
 namespace {
 
-// The work-group size, in work-items, of a kernel for which the runtime names none.
+// The work-group size, in work-items, if the runtime reports none.
 constexpr std::size_t kDefaultWorkGroupSize = 256;
 
-// Reads the execution status of `event`. False, reported, when it cannot be asked.
-bool readExecutionStatus(cl_event event, cl_int& executionStatus)
+// Returns the execution status of the command of `event`. Empty if the query fails, which is
+// reported.
+std::optional<cl_int> executionStatusOf(cl_event event)
 {
-    executionStatus = -1;
-    return succeeded(ocl.clGetEventInfo(event, CL_EVENT_COMMAND_EXECUTION_STATUS,
-                                        sizeof executionStatus, &executionStatus, nullptr));
+    cl_int status = -1;
+    if (!checkStatus(ocl.clGetEventInfo(event, CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status,
+                                        &status, nullptr)))
+        return std::nullopt;
+    return status;
 }
 
 } // namespace
@@ -26,18 +31,18 @@ cl_command_queue TopenCLInfo::createOpenCLCommandQueue(bool* usingOutOfOrderExec
     if (!fContext || !fDevice)
         return nullptr;
 
-    // What the device supports makes no difference, but a device that cannot even say is not used.
+    // The answer makes no difference, but a device that fails the query gets no queue.
     cl_command_queue_properties supported = 0;
-    if (!succeeded(ocl.clGetDeviceInfo(fDevice, CL_DEVICE_QUEUE_PROPERTIES, sizeof supported,
-                                       &supported, nullptr),
-                   CLReportStyle::kWithLineBreak))
+    if (!checkStatus(ocl.clGetDeviceInfo(fDevice, CL_DEVICE_QUEUE_PROPERTIES, sizeof supported,
+                                         &supported, nullptr),
+                     CLReportStyle::kWithLineBreak))
         return nullptr;
 
     cl_int status = CL_SUCCESS;
     cl_command_queue queue = ocl.clCreateCommandQueue(fContext, fDevice, 0, &status);
     if (status == CL_INVALID_VALUE || status == CL_INVALID_QUEUE_PROPERTIES)
         queue = ocl.clCreateCommandQueue(fContext, fDevice, 0, &status);
-    return succeeded(status, CLReportStyle::kWithLineBreak) ? queue : nullptr;
+    return checkStatus(status, CLReportStyle::kWithLineBreak) ? queue : nullptr;
 }
 
 void TopenCLInfo::finish()
@@ -60,13 +65,11 @@ bool TopenCLInfo::IsEventComplete(cl_event event)
 {
     if (!event)
         return true;
-    cl_int executionStatus = -1;
-    if (!readExecutionStatus(event, executionStatus) || executionStatus == CL_COMPLETE)
-        return true;
-    // On AMD a second look decides.
-    if (theOne().fProvider == kAMDProvider && !readExecutionStatus(event, executionStatus))
-        return true;
-    return executionStatus == CL_COMPLETE;
+    std::optional<cl_int> status = executionStatusOf(event);
+    // On AMD a second query decides.
+    if (status && *status != CL_COMPLETE && theOne().fProvider == kAMDProvider)
+        status = executionStatusOf(event);
+    return status.value_or(CL_COMPLETE) == CL_COMPLETE;
 }
 
 int TopenCLInfo::getWorkGroupSizes(cl_kernel kernel, std::size_t workItemCount,
@@ -82,10 +85,10 @@ int TopenCLInfo::getWorkGroupSizes(cl_kernel kernel, std::size_t workItemCount,
     const cl_int status =
         ocl.clGetKernelWorkGroupInfo(kernel, fDevice, CL_KERNEL_WORK_GROUP_SIZE,
                                      sizeof workGroupSize, &workGroupSize, &answeredBytes);
-    if (!succeeded(status, CLReportStyle::kWithLineBreak))
+    if (!checkStatus(status, CLReportStyle::kWithLineBreak))
         return status;
 
-    // No runtime answers 0 for a valid kernel, but one that did would be divided by.
+    // 0 is not a valid answer, and the size is a divisor.
     localWorkSize = answeredBytes > 0 && workGroupSize > 0 ? workGroupSize : kDefaultWorkGroupSize;
     const std::size_t padded = workItemCount + localWorkSize - 1;
     globalWorkSize = padded - padded % localWorkSize;

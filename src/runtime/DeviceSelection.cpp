@@ -1,4 +1,4 @@
-// The choice of the device, and the parts of TopenCLInfo that ask what it can do.
+// The choice of the device, and the parts of TopenCLInfo that query its abilities.
 #include "runtime/DeviceSelection.h"
 
 #include "diagnostics/CLStatusReport.h"
@@ -20,11 +20,11 @@
 
 namespace {
 
-// More devices than any machine shares with one renderer.
+// Above the number of devices that share with one renderer on any machine.
 constexpr std::size_t kMaximumDevices = 64;
 using DeviceList = std::array<cl_device_id, kMaximumDevices>;
 
-// Room for a driver version, a device name or a platform version.
+// Capacity, in bytes, for a driver version, a device name or a platform version.
 using InfoText = std::array<char, 128>;
 
 cl_context_properties asProperty(void* handle)
@@ -32,15 +32,15 @@ cl_context_properties asProperty(void* handle)
     return reinterpret_cast<cl_context_properties>(handle);
 }
 
-// Reads what the value has room for. False, reported, when the query fails.
+// Reads as many bytes as `value` has. Returns false if the query fails, which is reported.
 template <typename Value>
 bool readDeviceInfo(cl_device_id device, cl_device_info name, Value& value)
 {
-    return succeeded(ocl.clGetDeviceInfo(device, name, sizeof value, &value, nullptr),
-                     CLReportStyle::kWithLineBreak);
+    return checkStatus(ocl.clGetDeviceInfo(device, name, sizeof value, &value, nullptr),
+                       CLReportStyle::kWithLineBreak);
 }
 
-// Sets `isGPU` when the type is a GPU and nothing else besides.
+// Sets `isGPU` to whether the device's type is GPU and no other. Returns false if the query fails.
 bool readIsGPU(cl_device_id device, bool& isGPU)
 {
     cl_device_type type = 0;
@@ -50,17 +50,18 @@ bool readIsGPU(cl_device_id device, bool& isGPU)
     return true;
 }
 
-// Reads devices of the OpenGL context into `value`; `size` receives the number of bytes.
+// Reads devices of the OpenGL context into `value`, which has `capacity` bytes. `size` receives the
+// number of bytes read. Returns false if the query fails.
 bool readGLContextInfo(const ContextProperties& properties, cl_gl_context_info name,
-                       std::size_t room, void* value, std::size_t& size)
+                       std::size_t capacity, void* value, std::size_t& size)
 {
     size = 0;
-    return succeeded(ocl.clGetGLContextInfoKHR(properties.data(), name, room, value, &size),
-                     CLReportStyle::kWithLineBreak);
+    return checkStatus(ocl.clGetGLContextInfoKHR(properties.data(), name, capacity, value, &size),
+                       CLReportStyle::kWithLineBreak);
 }
 
-// Takes the first GPU among `devices`, `current` before the others where it is one of them.
-// `chosen` stays null when there is no GPU; false when a query fails.
+// Chooses `current` if it is a GPU and one of `devices`, else the first GPU of `devices`. `chosen`
+// stays null if there is no GPU. Returns false if a query fails.
 bool chooseGPU(const DeviceList& devices, std::size_t count, cl_device_id current,
                cl_device_id& chosen)
 {
@@ -103,19 +104,19 @@ bool chooseDeviceForOpenGL(const ContextProperties& properties, cl_device_id& de
             return false;
     }
     if (!device)
-        std::fprintf(stderr,
-                     "OpenCL evaluator is unable to find a GPU device that can share VBOs with "
-                     "OpenGL.\n");
+        std::fprintf(
+            stderr,
+            "OpenCL evaluator is unable to find a GPU device that can share VBOs with OpenGL.\n");
     return device != nullptr;
 }
 
 bool chooseDeviceForD3D11(void* d3dDevice, cl_platform_id platform, cl_device_id& device)
 {
     DeviceList devices{};
-    if (!succeeded(sfGetDeviceIDsFromD3D11(
-                       platform, kCLD3D11Device, d3dDevice, kCLPreferredDevicesForD3D11,
-                       static_cast<cl_uint>(devices.size()), devices.data(), nullptr),
-                   CLReportStyle::kWithLineBreak))
+    if (!checkStatus(sfGetDeviceIDsFromD3D11(
+                         platform, kCLD3D11Device, d3dDevice, kCLPreferredDevicesForD3D11,
+                         static_cast<cl_uint>(devices.size()), devices.data(), nullptr),
+                     CLReportStyle::kWithLineBreak))
         return false;
     device = devices.front();
     return device != nullptr;
@@ -180,7 +181,7 @@ bool TopenCLInfo::decideAsyncReadback()
     return true;
 }
 
-// False when the driver is one of those whose OpenCL fails, or its version cannot be asked for.
+// Returns false if the driver's OpenCL is known to fail, or if the query of its version fails.
 bool TopenCLInfo::judgeNVIDIADriver()
 {
     InfoText text{};
@@ -190,18 +191,17 @@ bool TopenCLInfo::judgeNVIDIADriver()
         const DriverVersion version = parseDriverVersion(std::string(text.data()));
         const DriverVerdict verdict = judgeDriver(version, ignoreDriverVersion());
         if (!verdict.usable) {
-            std::fprintf(stderr,
-                         "\nOpenCL is not supported by NVidia drivers between version 361.91 and "
-                         "368.86.  To enabled OpenCL for this driver version set "
-                         "VYRA_OPENCL_IGNORE_DRIVER_VERSION=1.\n");
+            std::fprintf(
+                stderr,
+                "\nOpenCL is not supported by NVidia drivers between version 361.91 and 368.86.  To enabled OpenCL for this driver version set VYRA_OPENCL_IGNORE_DRIVER_VERSION=1.\n");
             return false;
         }
         fDriverSupportsImplicitSync = verdict.implicitSync;
         fSupportsAsyncReadback = verdict.asyncReadback;
     } catch (...) {
-        std::fprintf(stderr,
-                     "Unable to detect NVidia driver version.  Disabling asynchronous read-back "
-                     "for OpenCL.\n");
+        std::fprintf(
+            stderr,
+            "Unable to detect NVidia driver version.  Disabling asynchronous read-back for OpenCL.\n");
         fSupportsAsyncReadback = false;
     }
     return true;
@@ -210,16 +210,15 @@ bool TopenCLInfo::judgeNVIDIADriver()
 bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
 {
     InfoText version{};
-    if (!succeeded(ocl.clGetPlatformInfo(platform, CL_PLATFORM_VERSION, sizeof version,
-                                         version.data(), nullptr),
-                   CLReportStyle::kWithLineBreak))
+    if (!checkStatus(ocl.clGetPlatformInfo(platform, CL_PLATFORM_VERSION, sizeof version,
+                                           version.data(), nullptr),
+                     CLReportStyle::kWithLineBreak))
         return false;
 
     constexpr std::size_t kVersionPrefix = 10;
     if (std::strncmp(version.data(), "OpenCL 1.0", kVersionPrefix) == 0 ||
         std::strncmp(version.data(), "OpenCL 1.1", kVersionPrefix) == 0) {
-        // Before version 1.2 double precision is an extension; a failing query reads as "not
-        // there".
+        // Before version 1.2 double precision is an extension; a failing query counts as absence.
         std::vector<char> extensions;
         queryPlatformInfo(platform, CL_PLATFORM_EXTENSIONS, extensions);
         fPlatformSupportsDoublePrecision = platformText(extensions).findMB("cl_khr_fp64") != -1;
@@ -232,9 +231,9 @@ bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
 
     if (!fPlatformSupportsDoublePrecision &&
         TenvironmentVariable("VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT").asInt32(0) != 0) {
-        std::fprintf(stderr,
-                     "Vyra OpenCL is not supported on device because double precision is not "
-                     "supported.\n");
+        std::fprintf(
+            stderr,
+            "Vyra OpenCL is not supported on device because double precision is not supported.\n");
         return false;
     }
     return true;

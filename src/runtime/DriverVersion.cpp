@@ -2,7 +2,7 @@
 
 namespace {
 
-// Both ends belong to the range of drivers whose OpenCL fails.
+// The range of drivers whose OpenCL fails, both ends included.
 constexpr DriverVersion kFirstUnusable{361, 92};
 constexpr DriverVersion kLastUnusable{368, 85};
 constexpr DriverVersion kFirstWithAsyncReadback{359, 91};

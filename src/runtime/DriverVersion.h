@@ -9,21 +9,22 @@ struct DriverVersion {
     int major = 0;
     int minor = 0;
 
-    // NOLINTNEXTLINE(modernize-use-nullptr): meant is the zero that the compiler compares with.
+    // NOLINTNEXTLINE(modernize-use-nullptr): the check mistakes the generated comparison with 0.
     auto operator<=>(const DriverVersion&) const = default;
 };
 
-// Reads "361.92": the number in the first three characters and the one in the two behind the
-// separator. Raises a standard exception when the text is too short or a part has no digits.
+// Parses a text such as "361.92": three characters, a separator, two characters. Throws a standard
+// exception if the text is too short or a part has no digits.
 DriverVersion parseDriverVersion(const std::string& text);
 
-// What a driver is good for.
+// The features of a driver that work.
 struct DriverVerdict {
-    bool usable = false;        // not in the range whose OpenCL fails
-    bool implicitSync = false;  // its implicit OpenCL-to-graphics synchronisation holds
-    bool asyncReadback = false; // its asynchronous read-back works
+    bool usable = false;        // outside the range of versions whose OpenCL fails
+    bool implicitSync = false;  // implicit OpenCL-to-graphics synchronisation
+    bool asyncReadback = false; // asynchronous read-back
 };
 
-// `ignoreVersion` is the value of VYRA_OPENCL_IGNORE_DRIVER_VERSION where that is set: 0 and more
-// accepts every driver, and more than 0 also trusts its implicit synchronisation.
+// Returns the features that work in a driver of this version. `ignoreVersion` is the value of
+// VYRA_OPENCL_IGNORE_DRIVER_VERSION if it is set: with 0 or more every driver is usable, and with
+// more than 0 its implicit synchronisation works.
 DriverVerdict judgeDriver(const DriverVersion& version, std::optional<int> ignoreVersion);

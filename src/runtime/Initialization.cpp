@@ -39,7 +39,7 @@ bool loadRuntime()
     return false;
 }
 
-// Says which platform was chosen, or that there is none, which is false.
+// Prints the chosen platform, or that there is none. Returns whether there is one.
 bool reportPlatform(const Tstring& vendor, cl_platform_id platform)
 {
     if (!platform) {
@@ -62,7 +62,7 @@ bool TopenCLInfo::initialize(void* window, void* graphicsContext, void* reserved
     return isValid();
 }
 
-// While this runs there is no object for theOne() to return: no step may ask for it.
+// theOne() has no object to return during construction: no step may call it.
 TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/, bool usingDX,
                          bool usingGLCoreProfile, unsigned vendorId)
     : fUsingDX(usingDX), fUsingGLCoreProfile(usingGLCoreProfile)
@@ -76,7 +76,7 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
         return;
     cl_platform_id platform = nullptr;
     Tstring extensions;
-    // A search that fails behind the match has found its platform all the same.
+    // The result is ignored: a search that fails after the match has found the platform.
     findPlatformByVendor(*vendor, platform, extensions);
     if (!reportPlatform(*vendor, platform))
         return;
@@ -109,7 +109,7 @@ bool TopenCLInfo::createContext(const cl_context_properties* properties)
 {
     cl_int status = CL_SUCCESS;
     fContext = ocl.clCreateContext(properties, 1, &fDevice, contextErrorCallback, nullptr, &status);
-    return succeeded(status, CLReportStyle::kWithLineBreak);
+    return checkStatus(status, CLReportStyle::kWithLineBreak);
 }
 
 void TopenCLInfo::createQueuesAndKernelStore()
@@ -125,7 +125,7 @@ TopenCLInfo::~TopenCLInfo()
     cleanUpOpenCL();
 }
 
-// Context and queues are forgotten, not released.
+// Context and queues are set to null and not released.
 void TopenCLInfo::cleanUpOpenCL()
 {
     delete fKernelStore;

@@ -19,13 +19,15 @@ namespace {
 
 // The entry points of one Direct3D 11 extension.
 struct D3D11Extension {
+    const char* name;
+    bool isKHR;
     D3D11GetDeviceIDs getDeviceIDs;
     D3D11CreateBuffer createBuffer;
     D3D11EnqueueObjects enqueueAcquire;
     D3D11EnqueueObjects enqueueRelease;
 };
 
-// Fills the table; false when an entry point is missing. The device query is set in either case.
+// Fills the table. Returns false if an entry point is missing; the device query is set even then.
 bool useD3D11Extension(const D3D11Extension& extension)
 {
     sfGetDeviceIDsFromD3D11 = extension.getDeviceIDs;
@@ -45,7 +47,7 @@ cl_mem CL_API_CALL createFromGLBuffer(cl_context context, cl_mem_flags flags, vo
                                     error);
 }
 
-// Fills the table; false when an entry point of OpenGL sharing is missing.
+// Fills the table. Returns false if an entry point of OpenGL sharing is missing.
 bool useGLSharing()
 {
     if (!ocl.clCreateFromGLBuffer || !ocl.clEnqueueAcquireGLObjects ||
@@ -57,9 +59,9 @@ bool useGLSharing()
     return true;
 }
 
-// The chosen mode, after telling the user what there is to tell.
+// Prints the message of a choice, if it has one, and returns the mode.
 template <typename Mode>
-Mode tellChoice(const SyncModeChoice<Mode>& choice)
+Mode reportChoice(const SyncModeChoice<Mode>& choice)
 {
     if (choice.message)
         std::fputs(choice.message, stderr);
@@ -77,30 +79,26 @@ bool TopenCLInfo::setupDirectXExtensionFunctions(Tstring* extensions)
 {
     if (!fUsingDX)
         return true;
-    // Both extensions order the two sides themselves; no variable changes that.
+    // Both extensions order Direct3D and OpenCL themselves; no variable changes that.
     fGraphicsToCLSyncMode = kGraphicsToCLImplicit;
     fCLToGraphicsSyncMode = kCLToGraphicsImplicit;
 
-    if (listsExtension(*extensions, "cl_nv_d3d11_sharing")) {
-        if (useD3D11Extension({ocl.clGetDeviceIDsFromD3D11NV, ocl.clCreateFromD3D11BufferNV,
-                               ocl.clEnqueueAcquireD3D11ObjectsNV,
-                               ocl.clEnqueueReleaseD3D11ObjectsNV})) {
-            fUsingKHRD3D11Sharing = false;
+    const D3D11Extension known[] = {
+        {"cl_nv_d3d11_sharing", false, ocl.clGetDeviceIDsFromD3D11NV, ocl.clCreateFromD3D11BufferNV,
+         ocl.clEnqueueAcquireD3D11ObjectsNV, ocl.clEnqueueReleaseD3D11ObjectsNV},
+        {"cl_khr_d3d11_sharing", true, ocl.clGetDeviceIDsFromD3D11KHR,
+         ocl.clCreateFromD3D11BufferKHR, ocl.clEnqueueAcquireD3D11ObjectsKHR,
+         ocl.clEnqueueReleaseD3D11ObjectsKHR},
+    };
+    for (const D3D11Extension& extension : known) {
+        if (!listsExtension(*extensions, extension.name))
+            continue;
+        if (useD3D11Extension(extension)) {
+            fUsingKHRD3D11Sharing = extension.isKHR;
             return true;
         }
-        std::printf(
-            "Error: found cl_nv_d3d11_sharing extension but failed to get function pointers.");
-        return false;
-    }
-    if (listsExtension(*extensions, "cl_khr_d3d11_sharing")) {
-        if (useD3D11Extension({ocl.clGetDeviceIDsFromD3D11KHR, ocl.clCreateFromD3D11BufferKHR,
-                               ocl.clEnqueueAcquireD3D11ObjectsKHR,
-                               ocl.clEnqueueReleaseD3D11ObjectsKHR})) {
-            fUsingKHRD3D11Sharing = true;
-            return true;
-        }
-        std::printf(
-            "Error: found cl_khr_d3d11_sharing extension but failed to get function pointers.");
+        std::printf("Error: found %s extension but failed to get function pointers.",
+                    extension.name);
         return false;
     }
     std::fprintf(stderr, "Error: using D3D11 but found no OpenCL/D3D11 interop extension.");
@@ -123,9 +121,9 @@ bool TopenCLInfo::setupExtensionFunctions(Tstring* extensions)
             .implicitSyncTrusted = fProvider != kNVIDIAProvider || fDriverSupportsImplicitSync,
         };
         fGraphicsToCLSyncMode =
-            tellChoice(chooseGraphicsToCLSyncMode(variables.graphicsToCL, abilities));
+            reportChoice(chooseGraphicsToCLSyncMode(variables.graphicsToCL, abilities));
         fCLToGraphicsSyncMode =
-            tellChoice(chooseCLToGraphicsSyncMode(variables.clToGraphics, abilities));
+            reportChoice(chooseCLToGraphicsSyncMode(variables.clToGraphics, abilities));
     }
 
     if (useGLSharing())

@@ -5,9 +5,8 @@
 
 BOOL WINAPI DllMain(HINSTANCE module, DWORD reason, LPVOID /*reserved*/)
 {
-    // What the library keeps per thread is a plain buffer, so it need not hear of threads. A
-    // compiler may give the library thread-local storage of a kind for which Windows refuses the
-    // call; no matter.
+    // The library's thread-local data needs no constructor, so it needs no notification of threads.
+    // The call fails, without harm, if the compiler uses static thread-local storage.
     if (reason == DLL_PROCESS_ATTACH)
         DisableThreadLibraryCalls(module);
     return TRUE;

@@ -1,5 +1,5 @@
 // Every static object of the library that needs a constructor, in the order of construction;
-// unloading destroys them in reverse. They stand in one file because the order across files is
+// unloading destroys them in reverse order. They are in one file because the order across files is
 // undefined.
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBuffer.h"
@@ -13,13 +13,13 @@ const TuniqueString TopenCLData::sfGeometryMatrixName("geometryMatrix");
 const TuniqueString TopenCLData::sfInverseGeometryMatrixName("inverseGeometryMatrix");
 const TuniqueString TopenCLData::sfNormalIdxToPositionIdxName("normalIdxToPositionIdx");
 
-// Before the null data buffer, which takes this name.
+// Before the null data buffer, which copies this name.
 const TuniqueString TopenCLDataBufferDescriptor::sfEmptyName("");
 const TopenCLDataBuffer TopenCLDataBuffer::fsNULL;
 
 namespace {
 
-// Kept for developers' traces of the kernel store; nothing writes to it.
+// Registered for developers' traces of the kernel store; nothing writes to it.
 const TdbTrace clKernelTrace(1, "clKernel", TdebugOutput::sCerr(),
                              "Errors and warnings from the OpenCL Kernel Store");
 

@@ -36,20 +36,20 @@ struct VendorId {
 constexpr std::array<VendorId, 4> kVendorIds = {{
     {0x10DE, kNVIDIAVendor},
     {0x1002, kAMDVendor},
-    {0x3EA, kAMDVendor}, // 1002 written in decimal
+    {0x3EA, kAMDVendor}, // decimal 1002
     {0x8086, kIntelVendor},
 }};
 
 bool readPlatformText(cl_platform_id platform, cl_platform_info name, Tstring& text)
 {
     std::vector<char> value;
-    if (!succeeded(queryPlatformInfo(platform, name, value), CLReportStyle::kWithLineBreak))
+    if (!checkStatus(queryPlatformInfo(platform, name, value), CLReportStyle::kWithLineBreak))
         return false;
     text = platformText(value);
     return true;
 }
 
-// How a platform introduces itself.
+// The texts by which a platform is listed and chosen.
 struct PlatformNames {
     Tstring vendor;
     Tstring name;
@@ -73,10 +73,10 @@ std::optional<Tstring> chooseVendor(unsigned vendorId)
         if (vendor.id == vendorId)
             return Tstring(vendor.name);
     }
-    std::fprintf(stderr,
-                 "OpenCL evaluator encountered an unknown vendor id %x while trying to initialize "
-                 "OpenCL.\n",
-                 vendorId);
+    std::fprintf(
+        stderr,
+        "OpenCL evaluator encountered an unknown vendor id %x while trying to initialize OpenCL.\n",
+        vendorId);
     return std::nullopt;
 }
 
@@ -111,8 +111,8 @@ bool TopenCLInfo::findPlatformByVendor(const Tstring& vendor, cl_platform_id& pl
     if (ocl.clGetPlatformIDs(0, nullptr, &count) != CL_SUCCESS || count == 0)
         return false;
     std::vector<cl_platform_id> platforms(count);
-    if (!succeeded(ocl.clGetPlatformIDs(count, platforms.data(), nullptr),
-                   CLReportStyle::kWithLineBreak))
+    if (!checkStatus(ocl.clGetPlatformIDs(count, platforms.data(), nullptr),
+                     CLReportStyle::kWithLineBreak))
         return false;
 
     if (sfListPlatforms)
@@ -130,7 +130,7 @@ bool TopenCLInfo::findPlatformByVendor(const Tstring& vendor, cl_platform_id& pl
         if (sfListPlatforms)
             std::fprintf(stderr, " Supported extensions: %s \n", supported.asChar());
 
-        // The first match wins; later platforms of the vendor are only listed.
+        // The first match is chosen; later platforms of the vendor are only listed.
         if (platform || !(names.vendor == vendor))
             continue;
         if (sfListPlatforms)

@@ -1,4 +1,4 @@
-// Which vendor's platform the library runs on. Internal.
+// The choice of the platform. Internal.
 #pragma once
 
 #include "host/Tstring.h"
@@ -15,16 +15,16 @@ inline constexpr const char* kAMDVendor = "Advanced Micro Devices, Inc.";
 inline constexpr const char* kIntelVendor = "Intel(R) Corporation";
 inline constexpr const char* kAppleVendor = "Apple";
 
-// The vendor's name: VYRA_OPENCL_PLATFORM, else by the PCI vendor id of the renderer's adapter.
-// Empty, and said on standard error, for an unknown id.
+// Returns the vendor's name: the value of VYRA_OPENCL_PLATFORM if it is set, else the vendor with
+// the PCI id `vendorId`. Empty for an unknown id, which is reported on standard error.
 std::optional<Tstring> chooseVendor(unsigned vendorId);
 
-// The class of the vendor of exactly that name.
+// Returns the provider with exactly this vendor name, or kUnknownProvider.
 OpenCLProvider providerOfVendor(const Tstring& vendor);
 
-// Reads a text of a platform with its terminating NUL. Returns the failing call's status,
-// unreported.
+// Reads a text of a platform with its terminating NUL. Returns the status of the first call that
+// fails, without reporting it.
 cl_int queryPlatformInfo(cl_platform_id platform, cl_platform_info name, std::vector<char>& value);
 
-// The text in `value`, also when a runtime answered with nothing at all.
+// Returns the text in `value` up to its first NUL; the empty string if `value` is empty.
 Tstring platformText(const std::vector<char>& value);

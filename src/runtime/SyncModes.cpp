@@ -7,19 +7,12 @@ namespace {
 using GraphicsToCLChoice = SyncModeChoice<TopenCLInfo::GraphicsToCLSyncMode>;
 using CLToGraphicsChoice = SyncModeChoice<TopenCLInfo::CLToGraphicsSyncMode>;
 
-constexpr const char* kImplicitUnstable = "VYRA_GRAPHICSTOOPENCL_SYNC_MODE=1 (Implicit Graphics to "
-                                          "OpenCL synchronization) is not supported "
-                                          "because cl_khr_gl_event is not supported.  Vyra will "
-                                          "run in implicit sync mode but expect unstable "
-                                          "results.\n";
+constexpr const char* kImplicitUnstable =
+    "VYRA_GRAPHICSTOOPENCL_SYNC_MODE=1 (Implicit Graphics to OpenCL synchronization) is not supported because cl_khr_gl_event is not supported.  Vyra will run in implicit sync mode but expect unstable results.\n";
 constexpr const char* kExplicitOverridden =
-    "Overriding VYRA_GRAPHICSTOOPENCL_SYNC_MODE=2 (Explicit Graphics to OpenCL synchronization) "
-    "because "
-    "GL_ARB_sync is not supported.  Using glFinish to synchronize.\n";
+    "Overriding VYRA_GRAPHICSTOOPENCL_SYNC_MODE=2 (Explicit Graphics to OpenCL synchronization) because GL_ARB_sync is not supported.  Using glFinish to synchronize.\n";
 constexpr const char* kImplicitOverridden =
-    "Overriding VYRA_OPENCLTOGRAPHICS_SYNC_MODE=1 (Implicit OpenCL to Graphics synchronization) "
-    "because "
-    "cl_khr_gl_event is not supported.  Using clGetEventInfo to synchronize.\n";
+    "Overriding VYRA_OPENCLTOGRAPHICS_SYNC_MODE=1 (Implicit OpenCL to Graphics synchronization) because cl_khr_gl_event is not supported.  Using clGetEventInfo to synchronize.\n";
 
 } // namespace
 

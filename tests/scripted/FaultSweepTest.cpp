@@ -164,7 +164,6 @@ const Row kBufferRows[] = {
     {"WrapAndCopy", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.wrap(); }},
     {"PoolCreates", [](B& b) { b.makePool(0); }, [](B& b) { return b.fromPool(64); }, {{kCreate, 0}}, {{kCreate, 0}}},
     {"PoolReuses", [](B& b) { b.makePool(64); }, [](B& b) { return b.fromPool(64); }, {}, {}, {}, true},
-    {"PoolTakesBack", [](B& b) { b.makePool(64); b.fromPool(64); }, [](B& b) { b.pool->releaseBuffers(); return 0; }, {}, {}, {}, true},
     {"PoolOutputInPlace", [](B& b) { b.makePool(64); }, [](B& b) { return b.output(); }},
     {"DataMap", [](B& b) { b.makePool(64); }, [](B& b) { return b.mapTwice(); }},
 };
