@@ -18,9 +18,8 @@ using namespace vyra;
 // Neither a rotation nor symmetrical, and not at the origin.
 constexpr MatrixRows kSpace{0.5f, 0.1f, 0, 1, 0, 0.7f, 0.2f, -1, 0.3f, 0, 0.9f, 0.5f};
 
-std::unique_ptr<SkinDeformer> skin(const MeshGeometry& geometry, bool mirrored)
+std::unique_ptr<SkinDeformer> skin(const MeshGeometry& geometry, float side, unsigned precision = 0)
 {
-    const float side = mirrored ? -1.0f : 1.0f;
     std::vector<SkinWeights::BoneIndices> indices;
     std::vector<SkinWeights::BoneWeights> weights;
     for (unsigned i = 0; i < geometry.rest.vertexCount(); ++i) {
@@ -33,21 +32,9 @@ std::unique_ptr<SkinDeformer> skin(const MeshGeometry& geometry, bool mirrored)
     result->bones = {{side * 0.8f, -0.6f, 0, 1, side * 0.6f, 0.8f, 0, 2, 0, 0, 1, 3},
                      {side, 0.5f, 0, 0, 0, 1, 0, -1, 0, 0.2f, 1, 0},
                      {side * 2, 0, 0, 0, 0, 0.7f, -0.7f, 0, 0, 0.7f, 0.7f, 1}};
-    return result;
-}
-
-std::unique_ptr<SkinDeformer> skinInDouble(const MeshGeometry& geometry)
-{
-    auto result = skin(geometry, false);
-    result->precision = SkinDeformer::kDouble;
-    return result;
-}
-
-// All bones take all vertices to one point, where no normal is right.
-std::unique_ptr<SkinDeformer> skinCollapsed(const MeshGeometry& geometry)
-{
-    auto result = skin(geometry, false);
-    result->bones.assign(3, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3});
+    if (side == 0) // all bones take all vertices to one point, where no normal is right
+        result->bones.assign(3, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3});
+    result->precision = precision;
     return result;
 }
 
@@ -103,10 +90,10 @@ const std::vector<DeformerCase>& deformerCases()
 {
     using Mesh = const MeshGeometry&;
     static const std::vector<DeformerCase> cases = {
-        {"skin", [](Mesh m) { return skin(m, false); }, true},
-        {"skinMirrored", [](Mesh m) { return skin(m, true); }, true},
-        {"skinInDouble", [](Mesh m) { return skinInDouble(m); }, true},
-        {"skinCollapsed", [](Mesh m) { return skinCollapsed(m); }, false},
+        {"skin", [](Mesh m) { return skin(m, 1); }, true},
+        {"skinMirrored", [](Mesh m) { return skin(m, -1); }, true},
+        {"skinInDouble", [](Mesh m) { return skin(m, 1, SkinDeformer::kDouble); }, true},
+        {"skinCollapsed", [](Mesh m) { return skin(m, 0); }, false},
         {"twist", [](Mesh) { return twist(); }, true},
         {"wave", [](Mesh) { return wave(WaveDeformer::kY, 0.05f); }, true},
         {"waveOfCompression", [](Mesh) { return wave(WaveDeformer::kX, 0.05f); }, true},

@@ -62,6 +62,11 @@ TEST_F(EvaluatorTest, UploadCoversTheNumbersThatChangedAndNoOthers)
     deformer(mesh, 1).numbers[4] = 8;
     deformer(mesh, 0).enabled = false; // the others move to the front
     expectUpload(", 0, 0, 56");
+    deformer(mesh, 2).numbers[4] = 7;
+    runtime().plan({.function = "clEnqueueWriteBuffer"});
+    evaluate();
+    EXPECT_FALSE(mesh.status().ok());
+    expectUpload(", 0, 0, 56"); // all that the device may lack
 }
 
 // What the kernels read and write, one pair of letters each: R is the rest pose, V the vertex

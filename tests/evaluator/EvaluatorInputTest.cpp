@@ -61,6 +61,7 @@ TEST_F(EvaluatorInputTest, VertexBuffersThatCannotBeShared)
     startIn(1, 1);
     expectFailure(addMesh(grid(4, "small")), "mesh 'small': its buffer of normals has 47 bytes, "
                                              "and the vertices need 48");
+    EXPECT_EQ(evaluator->batchSize(), 2U) << "those of the other mesh";
     makeEvaluator();
     runtime().plan({.function = "clCreateFromGLBuffer", .status = CL_INVALID_GL_OBJECT, .nth = 2});
     expectFailure(addMesh(grid(4, "gone")),
