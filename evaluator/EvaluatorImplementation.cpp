@@ -501,7 +501,8 @@ void EvaluatorImplementation::writeCpuSurfaces()
 {
     if (!fSettings.writeVertices)
         return;
-    for (std::size_t i = 0; i < fMeshes.size(); ++i) { // the function may add meshes
+    // By index, since the function may add meshes.
+    for (std::size_t i = 0; i < fMeshes.size(); ++i) { // NOLINT(modernize-loop-convert)
         DeformableMesh& mesh = *fMeshes[i];
         if (!mesh.usesOpenCL() && mesh.status().ok() && !mesh.state().removed)
             fSettings.writeVertices(mesh, mesh.state().surface);

@@ -23,7 +23,8 @@ vyra::MeshGeometry cylinder(std::size_t rings, std::size_t sides)
     geometry.name = "cylinder";
     for (std::size_t i = 0; i < rings * sides; ++i) {
         const float angle = 6.2831853F * static_cast<float>(i % sides) / static_cast<float>(sides);
-        const float y = static_cast<float>(i / sides) / static_cast<float>(rings - 1);
+        const std::size_t ring = i / sides;
+        const float y = static_cast<float>(ring) / static_cast<float>(rings - 1);
         geometry.rest.positions.push_back({std::cos(angle), y, std::sin(angle)});
         geometry.rest.normals.push_back({std::cos(angle), 0, std::sin(angle)});
     }

@@ -118,12 +118,13 @@ MeshGeometry makeSheet(unsigned side)
     MeshGeometry sheet;
     for (unsigned i = 0; i < side * side; ++i) {
         const float x = static_cast<float>(i % side) / static_cast<float>(side - 1);
-        const float z = static_cast<float>(i / side) / static_cast<float>(side - 1);
+        const unsigned row = i / side;
+        const float z = static_cast<float>(row) / static_cast<float>(side - 1);
         const float slope = 1.5f * std::cos(5 * x);
         const float length = std::sqrt(1 + slope * slope);
         sheet.rest.positions.push_back({x, 0.3f * std::sin(5 * x), z});
         sheet.rest.normals.push_back({-slope / length, 1 / length, 0});
-        if (i % side + 1 < side && i / side + 1 < side)
+        if (i % side + 1 < side && row + 1 < side)
             for (const unsigned corner : {0U, side, 1U, 1U, side, side + 1})
                 sheet.triangles.push_back(i + corner);
     }

@@ -103,7 +103,8 @@ std::shared_ptr<vyra::MeshGeometry> EvaluatorTest::grid(unsigned vertices, std::
     auto geometry = std::make_shared<vyra::MeshGeometry>();
     geometry->name = std::move(name);
     for (unsigned i = 0; i < vertices; ++i) {
-        geometry->rest.positions.push_back({static_cast<float>(i / 2), static_cast<float>(i % 2)});
+        const unsigned column = i / 2;
+        geometry->rest.positions.push_back({static_cast<float>(column), static_cast<float>(i % 2)});
         geometry->rest.normals.push_back({0, 0, 1});
         if (i >= 2)
             geometry->triangles.insert(geometry->triangles.end(), {i - 2, i - 1, i});
