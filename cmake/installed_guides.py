@@ -2,8 +2,8 @@
 
     installed_guides.py SOURCE_DIRECTORY OUTPUT_DIRECTORY
 
-Links to files that the development package installs lead there; the text of other links stays without
-the link. Lines between <!-- source only --> and <!-- end --> are left out.
+Links to files that the packages install lead there; the text of other links stays, marked as "in the
+source". Lines between <!-- source only --> and <!-- end --> are left out.
 """
 import os
 import pathlib
@@ -18,6 +18,12 @@ GUIDES = ["README", "deformers", "evaluation", "evaluator", "glshare", "hazards"
 GUIDES_FOLDER = "share/doc/libvyra-opencl-dev/guides"
 HEADERS_FOLDER = "include/vyra-opencl"
 EXAMPLES_FOLDER = "share/doc/libvyra-opencl-dev/examples"
+OTHER_PLACES = {
+    "glshare/README.md": "share/doc/glshare/README.md",
+    "glshare/glshare.h": "include/glshare.h",
+    "tools/info.schema.json": "share/vyra-opencl/info.schema.json",
+    "evaluator/kernels/deformers.clh": "share/vyra-opencl/kernels/deformers.clh",
+}
 
 SOURCE_ONLY = re.compile(r"<!-- source only -->\n.*?<!-- end -->\n", re.DOTALL)
 QUOTE_MARK = re.compile(r"^<!-- from .* -->\n", re.MULTILINE)
@@ -45,7 +51,7 @@ def installed_path(target, source, headers):
         return f"{EXAMPLES_FOLDER}/{relative.relative_to('examples')}"
     if target in headers:
         return f"{HEADERS_FOLDER}/{relative.relative_to('src') if relative.parts[0] == 'src' else relative}"
-    return None
+    return OTHER_PLACES.get(str(relative))
 
 
 def installed(text, source, headers):
@@ -56,7 +62,7 @@ def installed(text, source, headers):
         path, _, anchor = target.partition("#")
         place = installed_path((source / "docs" / path).resolve(), source, headers)
         if place is None:
-            return words
+            return f"{words} (in the source)"
         return f"{image}[{words}]({os.path.relpath(place, GUIDES_FOLDER)}{anchor and '#' + anchor})"
 
     text = SOURCE_ONLY.sub("", text)
