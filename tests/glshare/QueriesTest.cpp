@@ -78,7 +78,7 @@ TEST_F(QueriesTest, GlContextInfoNamesTheDevices)
     const Properties list = properties();
     cl_device_id device = nullptr;
     for (const cl_gl_context_info name :
-         {CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR, CL_DEVICES_FOR_GL_CONTEXT_KHR}) {
+         {cl_uint{CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR}, cl_uint{CL_DEVICES_FOR_GL_CONTEXT_KHR}}) {
         EXPECT_EQ(infoOf<cl_device_id>(clGetGLContextInfoKHR, list.data(), name), device_);
     }
     EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device,
