@@ -29,7 +29,7 @@ private:
     std::atomic<std::size_t> fOffset = 0;
 };
 
-// Never destroyed: buffers that other modules' static objects hold are counted out of it late.
+// Never destroyed: static objects of other modules may release buffers late.
 DeviceMemoryMonitor& monitor()
 {
     static auto* const theOne = new DeviceMemoryMonitor;
@@ -38,7 +38,7 @@ DeviceMemoryMonitor& monitor()
 
 } // namespace
 
-// This host drives one adapter, so every index means that one.
+// This host has one adapter: every index selects it.
 Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int /*adapter*/)
 {
     return monitor();

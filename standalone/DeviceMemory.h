@@ -1,18 +1,19 @@
-// What the host knows of the device memory in use.
+// The device memory in use, as counted by the host.
 #pragma once
 
 #include "host/HostExport.h"
 
 #include <cstddef>
 
-// All values are bytes, as the memory monitor was told.
+// Bytes that the memory monitor has counted.
 struct DeviceMemoryUse {
     std::size_t currentBytes = 0;
-    // The most that was ever in use at once.
+    // The maximum of currentBytes so far.
     std::size_t peakBytes = 0;
-    // In use already when OpenCL came up.
+    // In use when OpenCL started.
     std::size_t offsetBytes = 0;
 };
 
-// Safe from any thread. While others allocate, the values may be of slightly different moments.
+// Returns the memory in use. Safe from any thread. If other threads allocate at the same time, the
+// values may be of slightly different moments.
 VYRA_HOST_API DeviceMemoryUse deviceMemoryUse();

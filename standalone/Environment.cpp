@@ -7,7 +7,7 @@
 
 namespace {
 
-// Blanks around a number are allowed: `set NAME=1 && ...` leaves one behind in some shells.
+// Blanks around a number are allowed: in some shells `set NAME=1 && ...` sets "1 ".
 std::string_view trimmed(std::string_view text)
 {
     constexpr std::string_view blanks = " \t\r\n";
@@ -34,7 +34,7 @@ std::int32_t TenvironmentVariable::asInt32(std::int32_t defaultValue) const
         return defaultValue;
     }
     std::string_view digits = trimmed(value);
-    // std::from_chars knows no plus sign.
+    // std::from_chars rejects a plus sign.
     if (digits.starts_with('+') && !digits.starts_with("+-")) {
         digits.remove_prefix(1);
     }

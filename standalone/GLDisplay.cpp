@@ -1,5 +1,5 @@
-// The display of the OpenGL context that is current on the calling thread. A context can only be
-// current when its window-system library is loaded, so both are looked up, never linked.
+// The display of the OpenGL context that is current on the calling thread. If a context is current,
+// its window-system library is loaded: GLX and EGL are looked up, not linked.
 #include "host/GLDisplay.h"
 
 #include "standalone/Platform.h"
@@ -10,7 +10,8 @@
 
 namespace {
 
-// The answer of the library's function of no arguments that returns a handle; null without it.
+// Calls a function of the library that has no arguments and returns a handle. Returns null if the
+// library is not loaded or has no such function.
 void* askCurrentDisplay(std::initializer_list<const char*> libraries, const char* function)
 {
     for (const char* library : libraries) {

@@ -20,7 +20,7 @@ HiddenContext::HiddenContext(QOpenGLContext& shared)
     fThread.reset(QThread::create([this] { serve(); }));
     fContext->moveToThread(fThread.get());
     fThread->start();
-    // The first call is answered once the thread has tried its context.
+    // Returns after the thread has tried to make its context current.
     run([this] { fValid = QOpenGLContext::currentContext() == fContext.get(); });
 }
 
@@ -63,7 +63,7 @@ void HiddenContext::serve()
         task->done = true;
         fChanged.notify_all();
     }
-    // Current nowhere, the context can be destroyed from any thread.
+    // A context that is not current can be destroyed on any thread.
     fContext->doneCurrent();
 }
 

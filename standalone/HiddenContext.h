@@ -1,4 +1,4 @@
-// A context of the renderer's share group, kept for threads that have none of their own.
+// A context of the renderer's share group for threads without one.
 #pragma once
 
 #include <condition_variable>
@@ -14,25 +14,25 @@ class QThread;
 
 namespace vyra::host {
 
-// Qt lets a context be current only on the thread that owns it, so the hidden context lives on a
-// thread of its own and callers hand it their calls. That works alike on every window system, which
-// native contexts, made current on each caller's thread in turn, would not.
+// A context on a thread of its own, which runs the calls of other threads. Qt makes a context
+// current only on the thread that owns it; native contexts that each caller's thread makes current
+// in turn would not work on every window system.
 class HiddenContext {
 public:
-    // On the GUI thread. `shared` is the renderer's context; it may be current.
+    // Called on the GUI thread. `shared` is the renderer's context, which may be current.
     explicit HiddenContext(QOpenGLContext& shared);
-    // Carries out what was handed over, then ends the thread and its context.
+    // Runs the pending calls, then ends the thread and its context.
     ~HiddenContext();
     HiddenContext(const HiddenContext&) = delete;
     HiddenContext& operator=(const HiddenContext&) = delete;
 
-    // The context could be made and is current on its thread.
+    // Returns whether the context was created and is current on its thread.
     bool valid() const { return fValid; }
 
-    // Runs `function` with the context current, one call at a time; returns when it has ended. From
-    // any thread, while valid().
+    // Runs `function` with the context current, and returns after it has ended. Calls are run one
+    // at a time. Safe from any thread. Requires valid().
     void run(std::function<void()> function);
-    // The same, and returns the function's result.
+    // As run, and returns the function's result.
     template <class Function>
     auto call(Function function) -> decltype(function())
     {

@@ -5,6 +5,6 @@
 
 class QOpenGLContext;
 
-// What TopenCLInfo::initialize takes as the graphics context: the handle that GLX, EGL or WGL gave
-// to `context`. Borrowed from it. Null when the context has not been created.
+// Returns the handle of `context` in GLX, EGL or WGL, as TopenCLInfo::initialize takes it. The
+// context owns it. Null if the context has not been created.
 VYRA_HOST_API void* nativeContext(const QOpenGLContext& context);

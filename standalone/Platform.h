@@ -1,15 +1,16 @@
-// What the operating system's loader knows.
+// Queries of the operating system's loader.
 #pragma once
 
 #include <filesystem>
 
 namespace vyra::host {
 
-// The address of `symbol` in the library `name`, or null when the process has not loaded that
+// Returns the address of `symbol` in the library `name`, or null if the process has not loaded that
 // library or it has no such symbol. Loads nothing.
 void* symbolOfLoadedLibrary(const char* name, const char* symbol);
 
-// The file that this library was loaded from, links resolved; empty when the loader can't tell.
+// Returns the file that this library was loaded from, with symbolic links resolved; empty on
+// failure.
 std::filesystem::path fileOfThisLibrary();
 
 } // namespace vyra::host

@@ -13,7 +13,7 @@ void* symbolOfLoadedLibrary(const char* name, const char* symbol)
         return nullptr;
     }
     void* const address = dlsym(library, symbol);
-    // Gives back the reference just taken; whoever loaded the library keeps it loaded.
+    // Releases the reference of dlopen; the user of the library keeps it loaded.
     dlclose(library);
     return address;
 }

@@ -23,7 +23,7 @@ std::filesystem::path fileOfThisLibrary()
         return {};
     }
     std::wstring file(MAX_PATH, L'\0');
-    // A name that fills the room was cut.
+    // A name as long as the buffer has been truncated.
     while (true) {
         const DWORD length =
             GetModuleFileNameW(library, file.data(), static_cast<DWORD>(file.size()));

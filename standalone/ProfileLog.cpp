@@ -6,8 +6,8 @@
 namespace vyra::host {
 namespace {
 
-// An identifier is, from its lowest bit: the event's place in its log plus 1, its log's index, its
-// log's generation.
+// An identifier consists of, from its lowest bit: the event's index in its log plus 1, the log's
+// index, the log's generation.
 constexpr unsigned int placeBits = 32;
 constexpr unsigned int logBits = 20;
 constexpr std::uint64_t placeMask = (std::uint64_t{1} << placeBits) - 1;

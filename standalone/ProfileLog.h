@@ -1,8 +1,8 @@
-// The profiler's store: one log of events for each thread.
+// The profiler's storage: one log of events per thread.
 //
-// A log belongs to its thread; its lock is held for the length of one append, and only a reader or
-// the end of an event on a foreign thread ever contends for it. Logs live until the process ends,
-// so events of threads that have ended can still be read.
+// Only the log's thread appends. Its lock is contended only by a reader, or by another thread that
+// ends an event. Logs exist until the process ends, so that events of threads that have ended can
+// still be read.
 #pragma once
 
 #include "host/Profiler.h"
@@ -24,7 +24,7 @@ inline constexpr std::int64_t stillOpen = -1;
 struct ProfileEvent {
     TuniqueString name;
     TuniqueString description;
-    // The track it belongs to; the empty text for the thread that recorded it.
+    // The track of the event; empty for the thread that recorded it.
     TuniqueString track;
     std::uint32_t categoryId = mainCategoryId;
     profiler::Color color = 0;
@@ -32,7 +32,7 @@ struct ProfileEvent {
     std::int64_t endNs = stillOpen;
 };
 
-// What one thread has recorded.
+// The events that one thread has recorded.
 struct ThreadProfile {
     std::string threadName;
     std::vector<ProfileEvent> events;
@@ -40,19 +40,19 @@ struct ThreadProfile {
 
 class ProfileLog {
 public:
-    // The log of the calling thread, made on its first call.
+    // Returns the log of the calling thread, created by its first call.
     static ProfileLog& ofThisThread();
 
-    // Copies of all logs, in the order of their threads' first events.
+    // Returns copies of all logs, in the order of their creation.
     static std::vector<ThreadProfile> copyAll();
-    // Empties all logs; events that are open are forgotten, and their ends are ignored.
+    // Empties all logs. The ends of events that are open are ignored.
     static void clearAll();
 
     void setThreadName(std::string name);
 
-    // The identifier to end the event with; never 0.
+    // Appends an event and returns the identifier with which to end it; never 0.
     profiler::EventId append(ProfileEvent event);
-    // Ends an event of any thread. Unknown and forgotten events are ignored.
+    // Ends an event of any thread. Ignores unknown identifiers and those from before clearAll.
     static void end(profiler::EventId id, std::int64_t endNs);
 
 private:
@@ -62,7 +62,7 @@ private:
     std::mutex fMutex; // guards all that follows
     ThreadProfile fProfile;
     std::uint32_t fIndex;
-    // Counts the clearings, so that an identifier of before one is known to be stale.
+    // The number of clearings, part of the identifiers: those from before a clearing are invalid.
     std::uint32_t fGeneration = 0;
 };
 

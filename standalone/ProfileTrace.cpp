@@ -1,4 +1,4 @@
-// Writes what the profiler recorded as Chrome trace-event JSON ("Trace Event Format").
+// Writes the profiler's events as Chrome trace-event JSON ("Trace Event Format").
 #include "standalone/ProfileLog.h"
 #include "standalone/ProfileRecorder.h"
 
@@ -18,7 +18,7 @@ namespace {
 using vyra::host::ProfileEvent;
 using vyra::host::ThreadProfile;
 
-// All rows are of one process. Tracks are rows too, numbered behind any thread.
+// All rows are of one process. Tracks are rows, too, with numbers after those of threads.
 constexpr int processId = 1;
 constexpr int firstTrackRow = 1'000'000;
 
@@ -62,7 +62,7 @@ QJsonObject rowName(const std::string& name, int row)
             {"args", QJsonObject{{"name", QString::fromStdString(name)}}}};
 }
 
-// Writes objects as the elements of the file's one array, one a line.
+// Writes objects as elements of the file's only array, one per line.
 class TraceFile {
 public:
     explicit TraceFile(const std::string& path) : fFile(QString::fromStdString(path))
@@ -77,7 +77,7 @@ public:
         write(QJsonDocument(object).toJson(QJsonDocument::Compact));
     }
 
-    // Returns whether all of it reached the file. If not, removes the file, unless it is a device.
+    // Returns whether everything was written. If not, removes the file unless it is a device.
     bool finish()
     {
         write("\n]}\n");
@@ -90,7 +90,7 @@ public:
         return fGood;
     }
 
-    // Why finish returned false.
+    // The system's message if finish returned false.
     const std::string& reason() const { return fReason; }
 
 private:
@@ -102,7 +102,7 @@ private:
     bool fGood = false;
 };
 
-// Gives every thread and track with events its row, named before its first event.
+// Assigns a row to every thread and track with events, and writes its name before its first event.
 class RowTable {
 public:
     explicit RowTable(TraceFile& file) : fFile(file) {}

@@ -11,7 +11,7 @@ namespace {
 
 constinit std::atomic<bool> sampling = false;
 
-// No event; what beginning one answers while nothing is recorded.
+// The identifier of no event, returned if the profiler does not record.
 constexpr profiler::EventId noEvent = 0;
 
 } // namespace

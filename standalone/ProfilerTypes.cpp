@@ -1,4 +1,4 @@
-// The profiler's categories and event types, which need no profiler. See Profiler.h.
+// The profiler's categories and event types, which do not depend on the profiler.
 #include "host/Profiler.h"
 
 #include "standalone/ProfileLog.h"

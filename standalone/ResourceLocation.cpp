@@ -8,7 +8,8 @@
 
 namespace {
 
-// The installed resources beside this library when they are there, else those of the source tree.
+// Returns the resources installed next to this library if they exist, else those of the source
+// tree.
 std::string findResources()
 {
     namespace fs = std::filesystem;
@@ -21,7 +22,7 @@ std::string findResources()
 
 } // namespace
 
-// Without a trailing separator. Kernel sources are <resources>/kernels/NAME.cl.
+// Returns a path without a trailing separator. Kernel sources are <resources>/kernels/NAME.cl.
 Tstring TappLocale::getResourcesLocation()
 {
     static const std::string resources = findResources();

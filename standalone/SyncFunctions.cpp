@@ -12,13 +12,13 @@
 namespace vyra::host {
 namespace {
 
-// Values of the OpenGL registry, which OpenGL ES headers of Qt's choosing may lack.
+// Values of the OpenGL registry, which the OpenGL ES headers that Qt may choose lack.
 constexpr unsigned int glSyncGpuCommandsComplete = 0x9117;
 constexpr unsigned int glTimeoutExpired = 0x911B;
 constexpr std::uint64_t glTimeoutIgnored = ~std::uint64_t{0};
 
-// How long one caller's wait may keep the hidden context from the others: a millisecond, beside
-// which handing over a call (microseconds) is cheap.
+// The longest time, in nanoseconds, for which one wait occupies the hidden context: long compared
+// with passing a call to its thread (microseconds).
 constexpr std::uint64_t turnNs = 1'000'000;
 
 template <class Function>
@@ -51,11 +51,12 @@ GLFunctionTable driverFunctions(QOpenGLContext& context)
     return table;
 }
 
-// Returns true once the event's command has ended, well or not; false for what is no event.
+// Waits until the event's command has ended, successfully or not. Returns false for an invalid
+// event.
 bool waitForCLEvent(cl_event event)
 {
     using WaitForEvents = cl_int(CL_API_CALL*)(cl_uint, const cl_event*);
-    // The application decides which OpenCL is loaded, if any; an event comes from that one.
+    // The event comes from the OpenCL library that the application has loaded, if any.
     static const auto waitForEvents = reinterpret_cast<WaitForEvents>(
         symbolOfLoadedLibrary(kOpenCLLibraryName, "clWaitForEvents"));
     if (waitForEvents == nullptr || event == nullptr) {
@@ -102,7 +103,7 @@ void SyncFunctions::serverWait(GLsync sync, unsigned int flags, std::uint64_t ti
     if (callerHasContext()) {
         fDriver.glWaitSync(sync, flags, timeoutNs);
     } else {
-        // Holding back the hidden context's commands would hold back no drawing.
+        // A wait of the hidden context's command stream would delay no drawing.
         waitInTurns(sync, flags, timeoutNs);
     }
 }
@@ -126,7 +127,7 @@ bool SyncFunctions::callerHasContext() const
     return current != nullptr && current->shareGroup() == fShareGroup;
 }
 
-// Flushed, so that the fence is signalled without further calls in its context.
+// Creates a fence and flushes, so that it is signalled without further calls in its context.
 GLsync SyncFunctions::fenceAndFlush(unsigned int condition, unsigned int flags) const
 {
     const GLsync sync = fDriver.glFenceSync(condition, flags);
@@ -134,7 +135,7 @@ GLsync SyncFunctions::fenceAndFlush(unsigned int condition, unsigned int flags) 
     return sync;
 }
 
-// glClientWaitSync in the hidden context, in turns with the waits of other threads.
+// Calls glClientWaitSync in the hidden context, alternating with the waits of other threads.
 unsigned int SyncFunctions::waitInTurns(GLsync sync, unsigned int flags, std::uint64_t timeoutNs)
 {
     std::uint64_t remaining = timeoutNs;

@@ -12,11 +12,11 @@ class QOpenGLContextGroup;
 
 namespace vyra::host {
 
-// The driver's functions, and the choice of the context that a call goes to: the calling thread's
-// own where that shares with the renderer's, else the hidden one.
+// The driver's sync functions, called in the calling thread's context if that shares with the
+// renderer's, else in the hidden context.
 class SyncFunctions {
 public:
-    // `context` is the renderer's and current on the calling GUI thread.
+    // Requires that `context`, the renderer's, is current on the calling GUI thread.
     explicit SyncFunctions(QOpenGLContext& context);
 
     // Whether the functions below may be called.
@@ -26,7 +26,7 @@ public:
     void remove(GLsync sync);
     unsigned int clientWait(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
     void serverWait(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
-    // Null for an invalid event or flags other than 0.
+    // Returns null for an invalid event or flags other than 0.
     GLsync fromCLEvent(cl_context context, cl_event event, unsigned int flags);
 
 private:

@@ -19,7 +19,7 @@ struct Registry {
     std::vector<Registration> channels;
 };
 
-// Never destroyed: channels are static objects of other modules and may go later than this one's.
+// Never destroyed: channels are static objects of other modules, which may be destroyed later.
 Registry& registry()
 {
     static auto* const theOne = new Registry;

@@ -11,9 +11,9 @@ struct TraceChannel {
     int level = 0;
     std::string name;
     std::string description;
-    // Where the channel's traces go. Borrowed from whoever registered the channel.
+    // The stream that receives the traces. Owned by the code that registered the channel.
     std::ostream* output = nullptr;
 };
 
-// The channels that exist now, in the order of their registration. Safe from any thread.
+// Returns the channels that exist, in the order of their registration. Safe from any thread.
 VYRA_HOST_API std::vector<TraceChannel> traceChannels();

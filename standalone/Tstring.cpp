@@ -1,6 +1,6 @@
 #include "host/Tstring.h"
 
-#include "standalone/FowlerNollVo.h"
+#include "standalone/Fnv1a.h"
 
 #include <string_view>
 
@@ -13,7 +13,7 @@ int findFrom(const std::string& text, std::string_view wanted, int from)
     return found == std::string::npos ? -1 : static_cast<int>(found);
 }
 
-// The UTF-8 sequence of a code point.
+// Returns the UTF-8 sequence of a code point.
 std::string utf8(char32_t code)
 {
     const auto lead = [code](char32_t mark, unsigned shift) {
@@ -57,7 +57,7 @@ char* Tstring::data()
 
 unsigned int Tstring::hash() const
 {
-    return vyra::host::fowlerNollVo<std::uint32_t>(fText);
+    return vyra::host::fnv1a<std::uint32_t>(fText);
 }
 
 int Tstring::findMB(const char* text, int from) const
@@ -68,7 +68,7 @@ int Tstring::findMB(const char* text, int from) const
 int Tstring::findMB(wchar_t character, int from) const
 {
     const auto code = static_cast<char32_t>(character);
-    // Half of a surrogate pair is no character and has no bytes.
+    // Half of a surrogate pair is not a character: it has no bytes.
     const bool isSurrogate = code >= 0xD800 && code < 0xE000;
     return isSurrogate ? -1 : findFrom(fText, utf8(code), from);
 }

@@ -1,6 +1,6 @@
 #include "host/TuniqueString.h"
 
-#include "standalone/FowlerNollVo.h"
+#include "standalone/Fnv1a.h"
 
 #include <array>
 #include <atomic>
@@ -8,21 +8,21 @@
 #include <string>
 #include <string_view>
 
-// One interned text; also a link of its bucket's chain.
+// One interned text, and a link of its bucket's chain.
 //
-// Entries are only ever added, at the head of a chain, and never removed, so a reader needs no
-// lock. The table is constant-initialised and never destroyed: other modules' static objects may
-// intern texts while they are built and read them while they are destroyed.
+// Entries are added at the head of a chain and never removed, so that readers need no lock. The
+// table is constant-initialised and never destroyed: constructors and destructors of other modules'
+// static objects may use it.
 struct TuniqueString::Entry {
     std::string text;
     std::uint64_t hash;
     const Entry* next;
 
-    // The one entry of `text`, made when there is none yet.
+    // Returns the entry of `text`, created if there is none.
     static const Entry* intern(std::string_view text);
 
 private:
-    // Texts are attribute and data names, some thousands in a large scene: chains stay short.
+    // Texts are names of attributes and data, some thousands in a large scene: chains are short.
     static constexpr std::size_t bucketCount = 1u << 14;
     static std::array<std::atomic<const Entry*>, bucketCount> buckets;
 
@@ -33,7 +33,7 @@ private:
 constinit std::array<std::atomic<const TuniqueString::Entry*>, TuniqueString::Entry::bucketCount>
     TuniqueString::Entry::buckets{};
 
-// The entry of `text` in the chain from `head` up to, not including, `end`; null when not there.
+// Returns the entry of `text` in the chain from `head` to, not including, `end`, or null.
 const TuniqueString::Entry* TuniqueString::Entry::find(const Entry* head, const Entry* end,
                                                        std::string_view text, std::uint64_t hash)
 {
@@ -47,7 +47,7 @@ const TuniqueString::Entry* TuniqueString::Entry::find(const Entry* head, const 
 
 const TuniqueString::Entry* TuniqueString::Entry::intern(std::string_view text)
 {
-    const auto hash = vyra::host::fowlerNollVo<std::uint64_t>(text);
+    const auto hash = vyra::host::fnv1a<std::uint64_t>(text);
     std::atomic<const Entry*>& bucket = buckets[hash % bucketCount];
     const Entry* searched = bucket.load(std::memory_order_acquire);
     if (const Entry* known = find(searched, nullptr, text, hash)) {
@@ -57,7 +57,7 @@ const TuniqueString::Entry* TuniqueString::Entry::intern(std::string_view text)
     std::unique_ptr<Entry> entry(new Entry{std::string(text), hash, searched});
     while (!bucket.compare_exchange_weak(entry->next, entry.get(), std::memory_order_acq_rel,
                                          std::memory_order_acquire)) {
-        // Other threads were faster: their entries, new at the head, may hold the text.
+        // Other threads have added entries at the head, one of which may hold the text.
         if (const Entry* known = find(entry->next, searched, text, hash)) {
             return known;
         }

@@ -15,7 +15,7 @@
 namespace {
 
 // Published values of FNV-1a; the sign of char must not leak into them.
-TEST(Hashes, AreFowlerNollVo)
+TEST(Hashes, EqualFnv1a)
 {
     EXPECT_EQ(Tstring("").hash(), 0x811c9dc5u);
     EXPECT_EQ(Tstring("foobar").hash(), 0xbf9cf968u);

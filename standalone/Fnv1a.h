@@ -7,27 +7,28 @@
 namespace vyra::host {
 
 template <class Word>
-struct FowlerNollVo;
+struct Fnv1aConstants;
 
 template <>
-struct FowlerNollVo<std::uint32_t> {
+struct Fnv1aConstants<std::uint32_t> {
     static constexpr std::uint32_t offsetBasis = 0x811c9dc5u;
     static constexpr std::uint32_t prime = 0x01000193u;
 };
 
 template <>
-struct FowlerNollVo<std::uint64_t> {
+struct Fnv1aConstants<std::uint64_t> {
     static constexpr std::uint64_t offsetBasis = 0xcbf29ce484222325u;
     static constexpr std::uint64_t prime = 0x00000100000001b3u;
 };
 
+// Returns the hash of 32 or 64 bits.
 template <class Word>
-constexpr Word fowlerNollVo(std::string_view bytes)
+constexpr Word fnv1a(std::string_view bytes)
 {
-    Word hash = FowlerNollVo<Word>::offsetBasis;
+    Word hash = Fnv1aConstants<Word>::offsetBasis;
     for (const char byte : bytes) {
         hash ^= static_cast<unsigned char>(byte);
-        hash *= FowlerNollVo<Word>::prime;
+        hash *= Fnv1aConstants<Word>::prime;
     }
     return hash;
 }
