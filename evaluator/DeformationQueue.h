@@ -43,6 +43,7 @@ public:
 
     void addMesh(DeformableMesh& mesh);
     void removeMesh(DeformableMesh& mesh);
+    bool hasMeshes() const { return !fMeshes.empty(); }
     // Of all meshes.
     std::size_t vertexCount() const;
 

@@ -338,6 +338,7 @@ void EvaluatorImplementation::deformMeshes()
         fSettings.finishRenderer();
     fail(guarded([this] {
         fAlone.reserve(2 * fMeshes.size()); // releasing them must not fail
+        collectWork();
         resetStatuses();
         return Status();
     }));
@@ -365,21 +366,39 @@ void EvaluatorImplementation::deformAll()
     for (const auto& queue : fQueues)
         queue->begin(fReleasedAlone.get());
     const auto deformOne = [this](std::size_t i) {
-        const ProfileScope scope("Deform");
-        if (i < fQueues.size())
-            fQueues[i]->deform(*fLibrary);
-        else if (!fMeshes[i - fQueues.size()]->state().usesOpenCL)
-            deformOnCpu(*fMeshes[i - fQueues.size()]);
+        tbb::this_task_arena::isolate([&] {
+            const ProfileScope scope("Deform");
+            const auto& [queue, mesh] = fWork[i];
+            if (queue)
+                queue->deform(*fLibrary);
+            else
+                deformOnCpu(*mesh);
+        });
     };
     // Deforming never throws; the tasks need memory.
     fail(guarded([&] {
         fArena.execute([&] {
-            tbb::parallel_for(std::size_t{0}, fQueues.size() + fMeshes.size(), [&](std::size_t i) {
-                tbb::this_task_arena::isolate([&] { deformOne(i); });
-            });
+            if (fWork.size() == 1)
+                deformOne(0); // waking another thread would cost more
+            else
+                tbb::parallel_for(std::size_t{0}, fWork.size(), deformOne);
         });
         return Status();
     }));
+}
+
+// The queues that have meshes, and the meshes of the CPU.
+void EvaluatorImplementation::collectWork()
+{
+    fWork.clear();
+    for (const auto& queue : fQueues) {
+        if (queue->hasMeshes())
+            fWork.push_back({queue.get(), nullptr});
+    }
+    for (const auto& mesh : fMeshes) {
+        if (!mesh->state().usesOpenCL)
+            fWork.push_back({nullptr, mesh.get()});
+    }
 }
 
 void EvaluatorImplementation::deformOnCpu(DeformableMesh& mesh)

@@ -57,6 +57,7 @@ private:
     void deformMeshes();
     void resetStatuses();
     void deformAll();
+    void collectWork();
     static void deformOnCpu(DeformableMesh& mesh);
     static Status deformOnCpu(const DeformableMesh& mesh, const Deformer& deformer,
                               Surface& surface);
@@ -88,6 +89,12 @@ private:
     };
     std::unordered_map<const MeshGeometry*, SharedRestPose> fRestPoses;
     std::vector<std::unique_ptr<DeformableMesh>> fMeshes;
+    // What one thread does in an evaluation: all meshes of a queue, or one mesh on the CPU.
+    struct Work {
+        DeformationQueue* queue = nullptr;
+        DeformableMesh* mesh = nullptr;
+    };
+    std::vector<Work> fWork; // of this evaluation
 
     const cl_event* fBatchReleased = nullptr; // where the manager stores its last release event
     AutoCLObject<cl_event> fReleasedAlone;    // of the last release outside the batch
