@@ -21,5 +21,6 @@ std::vector<GroupMaker> allGroups(Runtime* runtime)
     append(all, dataMapGroups());
     append(all, batchGroups(runtime));
     append(all, sharingGroups(runtime));
+    append(all, evaluatorGroups(runtime));
     return all;
 }

@@ -13,5 +13,6 @@ std::vector<GroupMaker> dataMapGroups();
 // These share buffers with the renderer; `runtime` is used when a group is made.
 std::vector<GroupMaker> batchGroups(Runtime* runtime);
 std::vector<GroupMaker> sharingGroups(Runtime* runtime);
+std::vector<GroupMaker> evaluatorGroups(Runtime* runtime);
 
 std::vector<GroupMaker> allGroups(Runtime* runtime);

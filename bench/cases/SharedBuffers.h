@@ -6,12 +6,12 @@
 
 class Runtime;
 
-// A number of small OpenGL buffers; gone with the object.
+// A number of OpenGL buffers; gone with the object.
 class GLBuffers {
 public:
     static constexpr std::size_t kBytes = 4096; // each; sharing does not depend on it
 
-    GLBuffers(Runtime& runtime, std::size_t count);
+    GLBuffers(Runtime& runtime, std::size_t count, std::size_t bytes = kBytes);
     ~GLBuffers();
     GLBuffers(const GLBuffers&) = delete;
     GLBuffers& operator=(const GLBuffers&) = delete;
