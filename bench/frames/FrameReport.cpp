@@ -32,6 +32,7 @@ struct Comparison {
     std::string crowd;
     std::string name;
     Spread ratio;
+    double undisturbed; // the quotient of the 10th percentiles of both times
     Goal goal;
 };
 
@@ -85,7 +86,13 @@ void addGrowth(const std::vector<CrowdTimes>& crowds, std::vector<Comparison>& a
                    "shared, per character",
                    {many.median / few.median / crowd, many.low / few.high / crowd,
                     many.high / few.low / crowd},
+                   many.low / few.low / crowd,
                    Goal::ratio(kGrowth)});
+}
+
+double lowOf(const CrowdTimes& crowd, const char* path)
+{
+    return spreadOf(crowd.find(path)->milliseconds).low;
 }
 
 std::vector<Comparison> comparisonsOf(const std::vector<CrowdTimes>& crowds)
@@ -96,7 +103,8 @@ std::vector<Comparison> comparisonsOf(const std::vector<CrowdTimes>& crowds)
             const Spread ratio = crowd.ratio(kShared, other);
             if (ratio.median > 0)
                 all.push_back({crowd.content->name, std::to_string(crowd.characters),
-                               std::string(kShared) + " / " + other, ratio, goalOf(crowd, other)});
+                               std::string(kShared) + " / " + other, ratio,
+                               lowOf(crowd, kShared) / lowOf(crowd, other), goalOf(crowd, other)});
         }
     }
     addGrowth(crowds, all);
@@ -157,12 +165,13 @@ void writeTimes(std::ostream& output, const std::vector<CrowdTimes>& crowds)
 
 void writeGoals(std::ostream& output, const std::vector<CrowdTimes>& crowds)
 {
-    Table table(
-        {"content", "characters", "comparison", "ratio", "10 %", "90 %", "goal", "verdict"});
+    Table table({"content", "characters", "comparison", "ratio", "10 %", "90 %", "of the 10 %",
+                 "goal", "verdict"});
     for (const Comparison& comparison : comparisonsOf(crowds))
         table.add({comparison.content, comparison.crowd, comparison.name,
                    fixed(comparison.ratio.median, 2), fixed(comparison.ratio.low, 2),
-                   fixed(comparison.ratio.high, 2), limitOf(comparison), verdictOf(comparison)});
+                   fixed(comparison.ratio.high, 2), fixed(comparison.undisturbed, 2),
+                   limitOf(comparison), verdictOf(comparison)});
     table.write(output);
 }
 
@@ -179,6 +188,7 @@ QJsonObject toJson(const std::vector<CrowdTimes>& crowds)
                                  {"characters", QString::fromStdString(comparison.crowd)},
                                  {"comparison", QString::fromStdString(comparison.name)},
                                  {"ratio", toJson(comparison.ratio)},
+                                 {"undisturbed", comparison.undisturbed},
                                  {"goal", QString::fromStdString(limitOf(comparison))},
                                  {"verdict", QString::fromStdString(verdictOf(comparison))}});
     return {{"rows", rows}, {"comparisons", goals}};
