@@ -51,7 +51,8 @@ Status ViewerWindow::open(const QSize& size)
     show();
     QElapsedTimer timer;
     timer.start();
-    while (!isValid() && !isExposed() && timer.elapsed() < kOpenTimeoutMs)
+    // A Wayland compositor ends the program that draws into a window before it is exposed.
+    while (!(isValid() && isExposed()) && timer.elapsed() < kOpenTimeoutMs)
         QGuiApplication::processEvents(QEventLoop::WaitForMoreEvents | QEventLoop::AllEvents,
                                        kEventSliceMs);
     return isValid() ? Status{} : noOpenGL();
@@ -73,6 +74,8 @@ void ViewerWindow::stop()
 
 void ViewerWindow::present(Session& session)
 {
+    if (!isExposed())
+        return;
     session.canvas().showIn(defaultFramebufferObject(), pixelSize());
     context()->swapBuffers(this);
 }
