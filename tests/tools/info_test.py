@@ -63,7 +63,7 @@ ON_THIS_MACHINE = {
     "a layer is missing": ({"OPENCL_LAYERS": "/none.so"}, [], 1, {
         "stop.reason": Part("OPENCL_LAYERS names '/none.so', which is not a file. "),
         "stop.remedy": Part("Correct OPENCL_LAYERS. ")}),
-    "a layer is missing and OpenCL is switched off": ({"OPENCL_LAYERS": "/none.so", "VYRA_DISABLE_OPENCL": "1"}, [], 1, {
+    "a layer is missing and OpenCL is off": ({"OPENCL_LAYERS": "/none.so", "VYRA_DISABLE_OPENCL": "1"}, [], 1, {
         "stop.reason": Part("which is not a file. VYRA_DISABLE_OPENCL is set"),
         "stop.remedy": Part("Correct OPENCL_LAYERS. Remove")}),
     "no driver is installed": ({"OCL_ICD_VENDORS": "/nonexistent"}, [], 1, {
