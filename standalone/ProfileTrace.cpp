@@ -67,7 +67,7 @@ class TraceFile {
 public:
     explicit TraceFile(const std::string& path) : fFile(QString::fromStdString(path))
     {
-        fGood = fFile.open(QIODevice::WriteOnly | QIODevice::Truncate);
+        fGood = fFile.open(QIODevice::WriteOnly | QIODevice::Truncate | QIODevice::Unbuffered);
         write("{\"traceEvents\":[");
     }
 
@@ -81,7 +81,7 @@ public:
     bool finish()
     {
         write("\n]}\n");
-        fGood = fGood && fFile.flush();
+        fGood = fGood && writeContent();
         fReason = fFile.errorString().toStdString();
         fFile.close();
         if (!fGood && QFileInfo(fFile).isFile()) {
@@ -94,9 +94,25 @@ public:
     const std::string& reason() const { return fReason; }
 
 private:
-    void write(const QByteArray& bytes) { fGood = fGood && fFile.write(bytes) == bytes.size(); }
+    void write(const QByteArray& bytes) { fContent += bytes; }
+
+    // A write that is cut short gets its reason from the system only when it is continued.
+    bool writeContent()
+    {
+        qint64 written = 0;
+        while (written < fContent.size()) {
+            const qint64 more =
+                fFile.write(fContent.constData() + written, fContent.size() - written);
+            if (more <= 0) {
+                return false;
+            }
+            written += more;
+        }
+        return true;
+    }
 
     QFile fFile;
+    QByteArray fContent;
     std::string fReason;
     const char* fSeparator = "\n";
     bool fGood = false;

@@ -10,10 +10,13 @@
 
 #include <gtest/gtest.h>
 
+#include <csignal>
 #include <map>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <sys/resource.h>
 
 namespace {
 
@@ -162,6 +165,20 @@ TEST(Profiler, SaysWhenTheFileCannotBeWritten)
     profiler::eventEnd(begin("event"));
     ProfileRecorder::stop();
     EXPECT_FALSE(ProfileRecorder::writeChromeTrace("/dev/full"));
+
+    // Half of the file fits.
+    const QTemporaryDir folder;
+    const QString file = folder.filePath("trace.json");
+    std::signal(SIGXFSZ, SIG_IGN);
+    rlimit before{};
+    getrlimit(RLIMIT_FSIZE, &before);
+    const rlimit half{20, before.rlim_max};
+    setrlimit(RLIMIT_FSIZE, &half);
+    std::string reason;
+    EXPECT_FALSE(ProfileRecorder::writeChromeTrace(file.toStdString(), &reason));
+    setrlimit(RLIMIT_FSIZE, &before);
+    EXPECT_EQ(reason, "File too large");
+    EXPECT_FALSE(QFile::exists(file));
 }
 
 } // namespace
