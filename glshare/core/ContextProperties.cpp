@@ -43,9 +43,9 @@ void* pointerOf(cl_context_properties value)
 cl_int findBinding(const GlEntries& gl, std::optional<GlBinding>& binding)
 {
     std::vector<GlBinding> given;
-    for (const auto& [windowSystem, display] : {std::pair(WindowSystem::Glx, gl.glx),
-                                                {WindowSystem::Egl, gl.egl},
-                                                {WindowSystem::Wgl, gl.wgl}}) {
+    for (const auto& [windowSystem, display] : {std::pair(WindowSystem::kGlx, gl.glx),
+                                                {WindowSystem::kEgl, gl.egl},
+                                                {WindowSystem::kWgl, gl.wgl}}) {
         if (display != 0)
             given.push_back({windowSystem, pointerOf(display), pointerOf(gl.context)});
     }

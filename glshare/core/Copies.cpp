@@ -36,7 +36,7 @@ cl_int mapAll(cl_command_queue queue, CopyBatch& batch)
 {
     CopyEvents& events = batch.events;
     const cl_map_flags access =
-        batch.direction == CopyDirection::FromGl ? CL_MAP_WRITE : CL_MAP_READ;
+        batch.direction == CopyDirection::kFromGl ? CL_MAP_WRITE : CL_MAP_READ;
     for (CopyItem& item : batch.items) {
         if (item.pointer != nullptr)
             continue;

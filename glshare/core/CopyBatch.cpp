@@ -39,7 +39,7 @@ void CopyEvents::clear() noexcept
 CopyBatch::Ptr CopyBatch::take(std::shared_ptr<SharingContext> context)
 {
     Ptr batch(context->takeBatch().release());
-    batch->context_ = std::move(context);
+    batch->fContext = std::move(context);
     return batch;
 }
 
@@ -49,14 +49,14 @@ cl_int CopyBatch::copyWhenReady(Ptr& batch)
         runtime().clSetEventCallback(batch->ready(), CL_COMPLETE, onReady, nullptr);
     if (error != CL_SUCCESS)
         return error;
-    GlWorker& worker = batch->context_->worker();
+    GlWorker& worker = batch->fContext->worker();
     worker.watch(std::move(batch));
     return CL_SUCCESS;
 }
 
 bool CopyBatch::run(GlDevice* device) noexcept
 {
-    if (!isSettled_) {
+    if (!fIsSettled) {
         cl_int status = CL_QUEUED;
         runtime().clGetEventInfo(ready(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status, &status,
                                  nullptr);
@@ -64,18 +64,18 @@ bool CopyBatch::run(GlDevice* device) noexcept
             return false;
         settle(status, device);
     }
-    return hasEnded(events.done.back()) && (!hasFailed_ || mayBeReleased());
+    return hasEnded(events.done.back()) && (!fHasFailed || mayBeReleased());
 }
 
 void CopyBatch::settle(cl_int status, GlDevice* device) noexcept
 {
-    isSettled_ = true;
-    hasFailed_ = status != CL_COMPLETE;
-    if (!hasFailed_ && device != nullptr)
+    fIsSettled = true;
+    fHasFailed = status != CL_COMPLETE;
+    if (!fHasFailed && device != nullptr)
         copyAll(*device);
-    else if (!hasFailed_)
+    else if (!fHasFailed)
         counters().failedCopies += items.size();
-    endOfUse_ = std::chrono::steady_clock::time_point::max();
+    fEndOfUse = std::chrono::steady_clock::time_point::max();
     runtime().clSetUserEventStatus(events.copied.back(), CL_COMPLETE);
 }
 
@@ -91,7 +91,7 @@ void CopyBatch::copyAll(GlDevice& device) noexcept
                 ++counters().failedCopies;
         }
     };
-    if (direction == CopyDirection::FromGl) {
+    if (direction == CopyDirection::kFromGl) {
         copyEach([&](auto... copy) { return device.read(copy...); });
     } else {
         GlDevice::Writing writing(device);
@@ -105,8 +105,8 @@ bool CopyBatch::mayBeReleased() noexcept
     using Clock = std::chrono::steady_clock;
     if (!std::ranges::all_of(events.unmaps, hasEnded))
         return false;
-    endOfUse_ = std::min(endOfUse_, Clock::now() + kUseAfterFailure);
-    return Clock::now() >= endOfUse_;
+    fEndOfUse = std::min(fEndOfUse, Clock::now() + kUseAfterFailure);
+    return Clock::now() >= fEndOfUse;
 }
 
 // Some runtimes use the event of a command that has failed whenever something else ends that the
@@ -114,7 +114,7 @@ bool CopyBatch::mayBeReleased() noexcept
 // events of the batch stay as long as the application's.
 void CopyBatch::drop() noexcept
 {
-    if (std::exchange(hasFailed_, false)) {
+    if (std::exchange(fHasFailed, false)) {
         GlTaskPtr self(this);
         if (EventTypes::get().keep(events.done.back(), self))
             return;
@@ -123,8 +123,8 @@ void CopyBatch::drop() noexcept
     events.clear();
     items.clear();
     buffers.clear();
-    isSettled_ = false;
-    const std::shared_ptr<SharingContext> context = std::move(context_);
+    fIsSettled = false;
+    const std::shared_ptr<SharingContext> context = std::move(fContext);
     context->keepBatch(std::unique_ptr<CopyBatch>(this));
 }
 

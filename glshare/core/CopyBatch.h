@@ -12,7 +12,7 @@
 
 namespace glshare {
 
-enum class CopyDirection { FromGl, ToGl };
+enum class CopyDirection { kFromGl, kToGl };
 
 // The events of the commands around the copies.
 struct CopyEvents {
@@ -58,7 +58,7 @@ public:
 
     SharedBuffers buffers;       // all of the command's
     std::vector<CopyItem> items; // those of them that are copied
-    CopyDirection direction = CopyDirection::FromGl;
+    CopyDirection direction = CopyDirection::kFromGl;
     CopyEvents events;
     std::vector<cl_event> waitList; // of `done`, while it is enqueued
 
@@ -67,10 +67,10 @@ private:
     void copyAll(GlDevice& device) noexcept;
     [[nodiscard]] bool mayBeReleased() noexcept;
 
-    std::shared_ptr<SharingContext> context_;
-    bool isSettled_ = false; // `copied` has its status
-    bool hasFailed_ = false;
-    std::chrono::steady_clock::time_point endOfUse_; // of the events of a batch that has failed
+    std::shared_ptr<SharingContext> fContext;
+    bool fIsSettled = false; // `copied` has its status
+    bool fHasFailed = false;
+    std::chrono::steady_clock::time_point fEndOfUse; // of the events of a batch that has failed
 };
 
 } // namespace glshare

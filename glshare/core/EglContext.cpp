@@ -18,21 +18,21 @@ void* resolveGl(const char* name)
 class EglContext final : public GlContext {
 public:
     // Owns no context yet.
-    EglContext(EGLDisplay display, EGLenum api) : display_(display), api_(api) {}
+    EglContext(EGLDisplay display, EGLenum api) : fDisplay(display), fApi(api) {}
 
     // After the application's eglTerminate this is refused with an error, which is fine.
     ~EglContext() override
     {
-        if (context_ != EGL_NO_CONTEXT)
-            egl().destroyContext(display_, context_);
+        if (fContext != EGL_NO_CONTEXT)
+            egl().destroyContext(fDisplay, fContext);
     }
 
-    void own(EGLContext context) { context_ = context; }
+    void own(EGLContext context) { fContext = context; }
 
     bool makeCurrent() override
     {
-        return egl().bindApi(api_) == EGL_TRUE &&
-               egl().makeCurrent(display_, EGL_NO_SURFACE, EGL_NO_SURFACE, context_) == EGL_TRUE;
+        return egl().bindApi(fApi) == EGL_TRUE &&
+               egl().makeCurrent(fDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, fContext) == EGL_TRUE;
     }
 
     // eglMakeCurrent would refuse to unbind on a terminated display; this never does.
@@ -48,9 +48,9 @@ public:
     void onDisplayClosing(std::function<void()>) override {}
 
 private:
-    EGLDisplay display_;
-    EGLContext context_ = EGL_NO_CONTEXT;
-    EGLenum api_;
+    EGLDisplay fDisplay;
+    EGLContext fContext = EGL_NO_CONTEXT;
+    EGLenum fApi;
 };
 
 // The configuration of the application's context, or none at all where it was made without one.

@@ -21,9 +21,9 @@ EventTypes::Prepared EventTypes::prepare(cl_command_type type)
 {
     Prepared prepared;
     {
-        const std::scoped_lock lock(mutex_);
-        if (!spares_.empty())
-            prepared = spares_.extract(spares_.begin());
+        const std::scoped_lock lock(fMutex);
+        if (!fSpares.empty())
+            prepared = fSpares.extract(fSpares.begin());
     }
     if (prepared.empty()) {
         Entries entries;
@@ -40,18 +40,18 @@ void EventTypes::add(cl_event event, Prepared prepared) noexcept
 {
     prepared.key() = event;
     GlTaskPtr kept; // dropped without the lock
-    const std::scoped_lock lock(mutex_);
-    if (const auto found = entries_.find(event); found != entries_.end())
+    const std::scoped_lock lock(fMutex);
+    if (const auto found = fEntries.find(event); found != fEntries.end())
         kept = retire(found);
-    entries_.insert(std::move(prepared));
-    count_ = entries_.size();
+    fEntries.insert(std::move(prepared));
+    fCount = fEntries.size();
 }
 
 bool EventTypes::keep(cl_event event, GlTaskPtr& task) noexcept
 {
-    const std::scoped_lock lock(mutex_);
-    const auto found = entries_.find(event);
-    if (found == entries_.end())
+    const std::scoped_lock lock(fMutex);
+    const auto found = fEntries.find(event);
+    if (found == fEntries.end())
         return false;
     found->second.kept = std::move(task);
     return true;
@@ -60,44 +60,44 @@ bool EventTypes::keep(cl_event event, GlTaskPtr& task) noexcept
 GlTaskPtr EventTypes::retire(Entries::iterator entry) noexcept
 {
     GlTaskPtr kept = std::move(entry->second.kept);
-    if (spares_.size() < kSpares) {
-        Prepared node = entries_.extract(entry);
+    if (fSpares.size() < kSpares) {
+        Prepared node = fEntries.extract(entry);
         node.key() = nullptr;
-        spares_.insert(std::move(node));
+        fSpares.insert(std::move(node));
     } else {
-        entries_.erase(entry);
+        fEntries.erase(entry);
     }
-    count_ = entries_.size();
+    fCount = fEntries.size();
     return kept;
 }
 
 void EventTypes::retain(cl_event event)
 {
-    if (count_ == 0)
+    if (fCount == 0)
         return;
-    const std::scoped_lock lock(mutex_);
-    if (const auto found = entries_.find(event); found != entries_.end())
+    const std::scoped_lock lock(fMutex);
+    if (const auto found = fEntries.find(event); found != fEntries.end())
         ++found->second.references;
 }
 
 void EventTypes::release(cl_event event)
 {
-    if (count_ == 0)
+    if (fCount == 0)
         return;
     GlTaskPtr kept; // dropped without the lock
-    const std::scoped_lock lock(mutex_);
-    const auto found = entries_.find(event);
-    if (found != entries_.end() && --found->second.references == 0)
+    const std::scoped_lock lock(fMutex);
+    const auto found = fEntries.find(event);
+    if (found != fEntries.end() && --found->second.references == 0)
         kept = retire(found);
 }
 
 std::optional<cl_command_type> EventTypes::find(cl_event event)
 {
-    if (count_ == 0)
+    if (fCount == 0)
         return std::nullopt;
-    const std::scoped_lock lock(mutex_);
-    const auto found = entries_.find(event);
-    return found == entries_.end() ? std::nullopt : std::optional(found->second.type);
+    const std::scoped_lock lock(fMutex);
+    const auto found = fEntries.find(event);
+    return found == fEntries.end() ? std::nullopt : std::optional(found->second.type);
 }
 
 } // namespace glshare

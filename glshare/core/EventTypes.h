@@ -47,10 +47,10 @@ private:
     // Forgets an entry, with the lock held; the result is dropped without it.
     [[nodiscard]] GlTaskPtr retire(Entries::iterator entry) noexcept;
 
-    std::mutex mutex_; // guards the following
-    Entries entries_;
-    std::multimap<cl_event, Entry> spares_; // all with the key null
-    std::atomic<std::size_t> count_{0};     // lets the events of others pass without the lock
+    std::mutex fMutex; // guards the following
+    Entries fEntries;
+    std::multimap<cl_event, Entry> fSpares; // all with the key null
+    std::atomic<std::size_t> fCount{0};     // lets the events of others pass without the lock
 };
 
 } // namespace glshare

@@ -9,7 +9,7 @@
 
 namespace glshare {
 
-enum class WindowSystem { Glx, Egl, Wgl };
+enum class WindowSystem { kGlx, kEgl, kWgl };
 
 // The application's context, as it came in the properties of an OpenCL context.
 struct GlBinding {

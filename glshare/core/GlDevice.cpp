@@ -32,58 +32,58 @@ bool keepsBuffersInMemory(std::string_view renderer)
 std::optional<GlDevice> GlDevice::create(GlFunctions::Resolver resolve)
 {
     GlDevice device;
-    if (!device.gl_.load(resolve))
+    if (!device.fGl.load(resolve))
         return std::nullopt;
-    device.isEs_ = textOf(device.gl_.getString(GL_VERSION)).starts_with("OpenGL ES");
-    if (device.isEs_)
-        device.gl_.getBufferSubData = nullptr; // whatever stands under that name
-    device.keepsBuffersInMemory_ = keepsBuffersInMemory(textOf(device.gl_.getString(GL_RENDERER)));
-    device.mark_ = device.gl_.fenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
-    if (device.mark_ == nullptr)
+    device.fIsEs = textOf(device.fGl.getString(GL_VERSION)).starts_with("OpenGL ES");
+    if (device.fIsEs)
+        device.fGl.getBufferSubData = nullptr; // whatever stands under that name
+    device.fKeepsBuffersInMemory = keepsBuffersInMemory(textOf(device.fGl.getString(GL_RENDERER)));
+    device.fMark = device.fGl.fenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
+    if (device.fMark == nullptr)
         return std::nullopt;
-    device.gl_.genBuffers(1, &device.staging_);
-    device.reportsImmutable_ = device.findsImmutableStorage();
+    device.fGl.genBuffers(1, &device.fStaging);
+    device.fReportsImmutable = device.findsImmutableStorage();
     return device;
 }
 
 // OpenGL 4.4 and the extension GL_ARB_buffer_storage have it.
 bool GlDevice::findsImmutableStorage() const
 {
-    while (gl_.getError() != GL_NO_ERROR) {
+    while (fGl.getError() != GL_NO_ERROR) {
     }
     GLuint buffer = 0;
-    gl_.genBuffers(1, &buffer);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, buffer);
+    fGl.genBuffers(1, &buffer);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, buffer);
     static_cast<void>(parameter(GL_BUFFER_IMMUTABLE_STORAGE));
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
-    gl_.deleteBuffers(1, &buffer);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    fGl.deleteBuffers(1, &buffer);
     return succeeded();
 }
 
 void GlDevice::destroy()
 {
-    gl_.useProgram(0);
-    gl_.deleteProgram(pinProgram_); // 0 is ignored
-    gl_.deleteBuffers(1, &staging_);
-    gl_.deleteSync(mark_);
+    fGl.useProgram(0);
+    fGl.deleteProgram(fPinProgram); // 0 is ignored
+    fGl.deleteBuffers(1, &fStaging);
+    fGl.deleteSync(fMark);
 }
 
 // glIsBuffer comes first everywhere: binding a name that is no buffer would create one in some
 // profiles.
 std::optional<std::size_t> GlDevice::bufferSize(GLuint name) const
 {
-    if (gl_.isBuffer(name) != GL_TRUE)
+    if (fGl.isBuffer(name) != GL_TRUE)
         return std::nullopt;
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, name);
     const GLint64 size = parameter(GL_BUFFER_SIZE);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
     return static_cast<std::size_t>(size);
 }
 
 GLint64 GlDevice::parameter(GLenum name) const
 {
     GLint64 value = 0;
-    gl_.getBufferParameteri64v(GL_COPY_READ_BUFFER, name, &value);
+    fGl.getBufferParameteri64v(GL_COPY_READ_BUFFER, name, &value);
     return value;
 }
 
@@ -91,17 +91,17 @@ bool GlDevice::prepareCopy(GLuint name, std::size_t size) const
 {
     if (bufferSize(name).value_or(0) < size)
         return false;
-    while (gl_.getError() != GL_NO_ERROR) {
+    while (fGl.getError() != GL_NO_ERROR) {
     }
     return true;
 }
 
 void GlDevice::bindStaging(GLenum target, std::size_t size)
 {
-    gl_.bindBuffer(target, staging_);
-    if (stagingSize_ < size) {
-        gl_.bufferData(target, static_cast<GLsizeiptr>(size), nullptr, GL_STREAM_COPY);
-        stagingSize_ = size;
+    fGl.bindBuffer(target, fStaging);
+    if (fStagingSize < size) {
+        fGl.bufferData(target, static_cast<GLsizeiptr>(size), nullptr, GL_STREAM_COPY);
+        fStagingSize = size;
     }
 }
 
@@ -111,28 +111,28 @@ bool GlDevice::read(GLuint name, void* to, std::size_t size)
     if (!prepareCopy(name, size))
         return false;
     const auto bytes = static_cast<GLsizeiptr>(size);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
-    if (gl_.getBufferSubData != nullptr) {
-        gl_.getBufferSubData(GL_COPY_READ_BUFFER, 0, bytes, to);
-        gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, name);
+    if (fGl.getBufferSubData != nullptr) {
+        fGl.getBufferSubData(GL_COPY_READ_BUFFER, 0, bytes, to);
+        fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
         return succeeded();
     }
     bindStaging(GL_COPY_WRITE_BUFFER, size);
-    gl_.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    fGl.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
     if (!succeeded())
         return false;
-    const void* mapped = gl_.mapBufferRange(GL_COPY_WRITE_BUFFER, 0, bytes, GL_MAP_READ_BIT);
+    const void* mapped = fGl.mapBufferRange(GL_COPY_WRITE_BUFFER, 0, bytes, GL_MAP_READ_BIT);
     if (mapped == nullptr)
         return false;
     std::memcpy(to, mapped, size);
-    gl_.unmapBuffer(GL_COPY_WRITE_BUFFER);
+    fGl.unmapBuffer(GL_COPY_WRITE_BUFFER);
     return true;
 }
 
 bool GlDevice::Writing::write(GLuint name, const void* from, std::size_t size)
 {
-    return device_.write(name, from, size);
+    return fDevice.write(name, from, size);
 }
 
 // Storage that the application has made immutable may refuse to be written from the host; OpenGL's
@@ -142,16 +142,16 @@ bool GlDevice::write(GLuint name, const void* from, std::size_t size)
     if (!prepareCopy(name, size))
         return false;
     const auto bytes = static_cast<GLsizeiptr>(size);
-    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, name);
-    gl_.bufferSubData(GL_COPY_WRITE_BUFFER, 0, bytes, from);
+    fGl.bindBuffer(GL_COPY_WRITE_BUFFER, name);
+    fGl.bufferSubData(GL_COPY_WRITE_BUFFER, 0, bytes, from);
     bool isWritten = succeeded();
     if (!isWritten) {
         bindStaging(GL_COPY_READ_BUFFER, size);
-        gl_.bufferSubData(GL_COPY_READ_BUFFER, 0, bytes, from);
-        gl_.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
+        fGl.bufferSubData(GL_COPY_READ_BUFFER, 0, bytes, from);
+        fGl.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
         isWritten = succeeded();
     }
-    gl_.bindBuffer(GL_COPY_WRITE_BUFFER, 0);
+    fGl.bindBuffer(GL_COPY_WRITE_BUFFER, 0);
     return isWritten;
 }
 
@@ -159,11 +159,11 @@ bool GlDevice::write(GLuint name, const void* from, std::size_t size)
 // the driver then forgets what it has cached of the contents.
 void* GlDevice::address(GLuint name, std::size_t size) const
 {
-    if (!keepsBuffersInMemory_ || gl_.isBuffer(name) != GL_TRUE)
+    if (!fKeepsBuffersInMemory || fGl.isBuffer(name) != GL_TRUE)
         return nullptr;
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, name);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, name);
     void* const mapped = addressOfBound(size);
-    gl_.bindBuffer(GL_COPY_READ_BUFFER, 0);
+    fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
     return mapped;
 }
 
@@ -172,60 +172,60 @@ void* GlDevice::addressOfBound(std::size_t size) const
     // Contexts that share one buffer look at it in turn.
     static std::mutex theMutex;
     const std::scoped_lock lock(theMutex);
-    void* mapped = gl_.mapBufferRange(GL_COPY_READ_BUFFER, 0, static_cast<GLsizeiptr>(size),
+    void* mapped = fGl.mapBufferRange(GL_COPY_READ_BUFFER, 0, static_cast<GLsizeiptr>(size),
                                       GL_MAP_WRITE_BIT | GL_MAP_UNSYNCHRONIZED_BIT);
     if (mapped != nullptr)
-        gl_.unmapBuffer(GL_COPY_READ_BUFFER);
+        fGl.unmapBuffer(GL_COPY_READ_BUFFER);
     return mapped;
 }
 
-GlDevice::CallerLook::CallerLook(const GlDevice& device) : device_(device)
+GlDevice::CallerLook::CallerLook(const GlDevice& device) : fDevice(device)
 {
-    device_.gl_.getIntegerv(GL_COPY_READ_BUFFER_BINDING, &bound_);
+    fDevice.fGl.getIntegerv(GL_COPY_READ_BUFFER_BINDING, &fBound);
 }
 
 GlDevice::CallerLook::~CallerLook()
 {
-    device_.gl_.bindBuffer(GL_COPY_READ_BUFFER, static_cast<GLuint>(bound_));
+    fDevice.fGl.bindBuffer(GL_COPY_READ_BUFFER, static_cast<GLuint>(fBound));
 }
 
 // Whatever could make the mapping fail is looked at before, as errors are the application's.
 // Immutable storage may not be mappable; such a buffer is new, and its storage another one.
 void* GlDevice::CallerLook::address(GLuint name, std::size_t size) const
 {
-    const GlFunctions& gl = device_.gl_;
-    if (!device_.reportsImmutable_ || gl.isBuffer(name) != GL_TRUE)
+    const GlFunctions& gl = fDevice.fGl;
+    if (!fDevice.fReportsImmutable || gl.isBuffer(name) != GL_TRUE)
         return nullptr;
     gl.bindBuffer(GL_COPY_READ_BUFFER, name);
-    const bool canBeMapped = device_.parameter(GL_BUFFER_SIZE) >= static_cast<GLint64>(size) &&
-                             device_.parameter(GL_BUFFER_MAPPED) == GL_FALSE &&
-                             device_.parameter(GL_BUFFER_IMMUTABLE_STORAGE) == GL_FALSE;
-    return canBeMapped ? device_.addressOfBound(size) : nullptr;
+    const bool canBeMapped = fDevice.parameter(GL_BUFFER_SIZE) >= static_cast<GLint64>(size) &&
+                             fDevice.parameter(GL_BUFFER_MAPPED) == GL_FALSE &&
+                             fDevice.parameter(GL_BUFFER_IMMUTABLE_STORAGE) == GL_FALSE;
+    return canBeMapped ? fDevice.addressOfBound(size) : nullptr;
 }
 
 // Pinning needs a program in use that could be captured from; nothing is ever drawn with it.
 bool GlDevice::buildPinProgram()
 {
     const std::array<const char*, 2> source{
-        isEs_ ? "#version 300 es\n" : "#version 150\n",
+        fIsEs ? "#version 300 es\n" : "#version 150\n",
         "out float captured; void main() { captured = 0.0; gl_Position = vec4(0.0); }"};
     const std::array<const char*, 2> fragment{source[0], "void main() {}"};
-    pinProgram_ = gl_.createProgram();
+    fPinProgram = fGl.createProgram();
     const auto attach = [&](GLenum stage, const std::array<const char*, 2>& text) {
-        const GLuint shader = gl_.createShader(stage);
-        gl_.shaderSource(shader, static_cast<GLsizei>(text.size()), text.data(), nullptr);
-        gl_.compileShader(shader);
-        gl_.attachShader(pinProgram_, shader);
-        gl_.deleteShader(shader); // goes with the program
+        const GLuint shader = fGl.createShader(stage);
+        fGl.shaderSource(shader, static_cast<GLsizei>(text.size()), text.data(), nullptr);
+        fGl.compileShader(shader);
+        fGl.attachShader(fPinProgram, shader);
+        fGl.deleteShader(shader); // goes with the program
     };
     attach(GL_VERTEX_SHADER, source);
     attach(GL_FRAGMENT_SHADER, fragment); // OpenGL ES links no program without one
     const char* captured = "captured";
-    gl_.transformFeedbackVaryings(pinProgram_, 1, &captured, GL_INTERLEAVED_ATTRIBS);
-    gl_.linkProgram(pinProgram_);
+    fGl.transformFeedbackVaryings(fPinProgram, 1, &captured, GL_INTERLEAVED_ATTRIBS);
+    fGl.linkProgram(fPinProgram);
     GLint linked = GL_FALSE;
-    gl_.getProgramiv(pinProgram_, GL_LINK_STATUS, &linked);
-    gl_.useProgram(linked == GL_TRUE ? pinProgram_ : 0);
+    fGl.getProgramiv(fPinProgram, GL_LINK_STATUS, &linked);
+    fGl.useProgram(linked == GL_TRUE ? fPinProgram : 0);
     return linked == GL_TRUE;
 }
 
@@ -234,39 +234,39 @@ bool GlDevice::buildPinProgram()
 // context.
 GLuint GlDevice::pin(GLuint name)
 {
-    if (keepsBuffersInMemory_ && pinProgram_ == 0)
-        keepsBuffersInMemory_ = buildPinProgram();
-    if (!keepsBuffersInMemory_)
+    if (fKeepsBuffersInMemory && fPinProgram == 0)
+        fKeepsBuffersInMemory = buildPinProgram();
+    if (!fKeepsBuffersInMemory)
         return 0;
     GLuint feedback = 0;
-    gl_.genTransformFeedbacks(1, &feedback);
-    gl_.bindTransformFeedback(GL_TRANSFORM_FEEDBACK, feedback);
-    gl_.bindBufferBase(GL_TRANSFORM_FEEDBACK_BUFFER, 0, name);
-    gl_.beginTransformFeedback(GL_POINTS);
-    gl_.endTransformFeedback();
-    gl_.bindTransformFeedback(GL_TRANSFORM_FEEDBACK, 0);
+    fGl.genTransformFeedbacks(1, &feedback);
+    fGl.bindTransformFeedback(GL_TRANSFORM_FEEDBACK, feedback);
+    fGl.bindBufferBase(GL_TRANSFORM_FEEDBACK_BUFFER, 0, name);
+    fGl.beginTransformFeedback(GL_POINTS);
+    fGl.endTransformFeedback();
+    fGl.bindTransformFeedback(GL_TRANSFORM_FEEDBACK, 0);
     return feedback;
 }
 
 void GlDevice::unpin(GLuint pinned) const
 {
-    gl_.deleteTransformFeedbacks(1, &pinned);
+    fGl.deleteTransformFeedbacks(1, &pinned);
 }
 
 bool GlDevice::isSync(GLsync sync) const
 {
-    return gl_.isSync(sync) == GL_TRUE;
+    return fGl.isSync(sync) == GL_TRUE;
 }
 
 bool GlDevice::isSignalled(GLsync sync) const
 {
-    const GLenum status = gl_.clientWaitSync(sync, 0, 0);
+    const GLenum status = fGl.clientWaitSync(sync, 0, 0);
     return status == GL_ALREADY_SIGNALED || status == GL_CONDITION_SATISFIED;
 }
 
 bool GlDevice::callerSharesObjects() const
 {
-    return gl_.isSync(mark_) == GL_TRUE;
+    return fGl.isSync(fMark) == GL_TRUE;
 }
 
 } // namespace glshare

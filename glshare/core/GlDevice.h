@@ -29,15 +29,15 @@ public:
     // written when this ends.
     class Writing {
     public:
-        explicit Writing(GlDevice& device) : device_(device) {}
-        ~Writing() { device_.gl_.finish(); }
+        explicit Writing(GlDevice& device) : fDevice(device) {}
+        ~Writing() { fDevice.fGl.finish(); }
         Writing(const Writing&) = delete;
         Writing& operator=(const Writing&) = delete;
 
         [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
 
     private:
-        GlDevice& device_;
+        GlDevice& fDevice;
     };
 
     // The host address of a buffer's storage, null if it has none that lasts, or if the buffer is
@@ -60,7 +60,7 @@ public:
     [[nodiscard]] bool callerSharesObjects() const;
 
     // On any thread: waits for what was drawn on the context that is current on it.
-    void finishCaller() const { gl_.finish(); }
+    void finishCaller() const { fGl.finish(); }
 
     // Looks at buffers on any thread, with the context of this share group that is current on it,
     // and leaves the state of that context and its errors as they were.
@@ -76,8 +76,8 @@ public:
         [[nodiscard]] void* address(GLuint name, std::size_t size) const;
 
     private:
-        const GlDevice& device_;
-        GLint bound_ = 0; // what the application has bound
+        const GlDevice& fDevice;
+        GLint fBound = 0; // what the application has bound
     };
 
 private:
@@ -93,17 +93,17 @@ private:
     [[nodiscard]] bool write(GLuint name, const void* from, std::size_t size);
     // Makes the staging buffer that large, and binds it.
     void bindStaging(GLenum target, std::size_t size);
-    [[nodiscard]] bool succeeded() const { return gl_.getError() == GL_NO_ERROR; }
+    [[nodiscard]] bool succeeded() const { return fGl.getError() == GL_NO_ERROR; }
 
-    GlFunctions gl_;
-    bool isEs_ = false;
-    bool reportsImmutable_ = false;     // whether buffers report immutable storage
-    bool keepsBuffersInMemory_ = false; // where they can be pinned
-    GLuint pinProgram_ = 0;             // made with the first pin
-    GLuint staging_ = 0;                // a buffer of our own, for copies that OpenGL has to make
-    std::size_t stagingSize_ = 0;       // bytes
+    GlFunctions fGl;
+    bool fIsEs = false;
+    bool fReportsImmutable = false;     // whether buffers report immutable storage
+    bool fKeepsBuffersInMemory = false; // where they can be pinned
+    GLuint fPinProgram = 0;             // made with the first pin
+    GLuint fStaging = 0;                // a buffer of our own, for copies that OpenGL has to make
+    std::size_t fStagingSize = 0;       // bytes
     // A sync object known to this share group alone, which tells its contexts from others.
-    GLsync mark_ = nullptr;
+    GLsync fMark = nullptr;
 };
 
 } // namespace glshare

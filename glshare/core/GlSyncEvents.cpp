@@ -14,14 +14,14 @@ namespace {
 class SyncWatch final : public GlTask {
 public:
     SyncWatch(std::shared_ptr<SharingContext> context, GLsync sync)
-        : context_(std::move(context)), sync_(sync)
+        : fContext(std::move(context)), fSync(sync)
     {
     }
 
     bool run(GlDevice* device) noexcept override
     {
-        const bool exists = device != nullptr && device->isSync(sync_);
-        if (exists && !device->isSignalled(sync_))
+        const bool exists = device != nullptr && device->isSync(fSync);
+        if (exists && !device->isSignalled(fSync))
             return false;
         runtime().clSetUserEventStatus(events.back(), exists ? CL_COMPLETE : CL_INVALID_GL_OBJECT);
         return true;
@@ -30,8 +30,8 @@ public:
     EventList events; // the one event
 
 private:
-    std::shared_ptr<SharingContext> context_;
-    GLsync sync_;
+    std::shared_ptr<SharingContext> fContext;
+    GLsync fSync;
 };
 
 } // namespace

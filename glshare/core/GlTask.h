@@ -31,7 +31,7 @@ public:
 
 private:
     friend class GlTaskQueue;
-    std::unique_ptr<GlTask, Drop> next_; // in the queue that owns the task
+    std::unique_ptr<GlTask, Drop> fNext; // in the queue that owns the task
 };
 
 using GlTaskPtr = std::unique_ptr<GlTask, GlTask::Drop>;
@@ -51,30 +51,30 @@ public:
 
     void swap(GlTaskQueue& other) noexcept
     {
-        std::swap(first_, other.first_);
-        std::swap(last_, other.last_);
+        std::swap(fFirst, other.fFirst);
+        std::swap(fLast, other.fLast);
     }
 
-    [[nodiscard]] bool empty() const { return first_ == nullptr; }
+    [[nodiscard]] bool empty() const { return fFirst == nullptr; }
 
     void push(GlTaskPtr task) noexcept
     {
         GlTask* const added = task.get();
-        (empty() ? first_ : last_->next_) = std::move(task);
-        last_ = added;
+        (empty() ? fFirst : fLast->fNext) = std::move(task);
+        fLast = added;
     }
 
     // Takes the first; the queue must not be empty.
     GlTaskPtr pop() noexcept
     {
-        GlTaskPtr task = std::move(first_);
-        first_ = std::move(task->next_);
+        GlTaskPtr task = std::move(fFirst);
+        fFirst = std::move(task->fNext);
         return task;
     }
 
 private:
-    GlTaskPtr first_;
-    GlTask* last_ = nullptr; // valid unless the queue is empty
+    GlTaskPtr fFirst;
+    GlTask* fLast = nullptr; // valid unless the queue is empty
 };
 
 } // namespace glshare

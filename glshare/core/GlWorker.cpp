@@ -16,7 +16,7 @@ std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
     std::promise<bool> started;
     std::future<bool> isRunning = started.get_future();
     std::unique_ptr<GlWorker> worker(new GlWorker(loop));
-    worker->thread_ = std::thread([loop = std::move(loop), promise = std::move(started)]() mutable {
+    worker->fThread = std::thread([loop = std::move(loop), promise = std::move(started)]() mutable {
         bool isUsable = false;
         try {
             isUsable = loop->begin();
@@ -29,12 +29,12 @@ std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
     });
     if (!isRunning.get())
         return nullptr;
-    Loop::listenForDisplay(worker->loop_);
-    Loop::listenForExit(worker->loop_);
+    Loop::listenForDisplay(worker->fLoop);
+    Loop::listenForExit(worker->fLoop);
     return worker;
 }
 
-GlWorker::GlWorker(std::shared_ptr<Loop> loop) : loop_(std::move(loop)) {}
+GlWorker::GlWorker(std::shared_ptr<Loop> loop) : fLoop(std::move(loop)) {}
 
 GlWorker::~GlWorker()
 {
@@ -43,26 +43,26 @@ GlWorker::~GlWorker()
 
 void GlWorker::stop()
 {
-    if (!thread_.joinable())
+    if (!fThread.joinable())
         return;
-    if (!loop_->requestStop()) {
-        thread_.detach();
-    } else if (thread_.get_id() == std::this_thread::get_id()) {
-        Loop::adopt(loop_, std::move(thread_));
+    if (!fLoop->requestStop()) {
+        fThread.detach();
+    } else if (fThread.get_id() == std::this_thread::get_id()) {
+        Loop::adopt(fLoop, std::move(fThread));
     } else {
-        thread_.join();
-        loop_->markGone();
+        fThread.join();
+        fLoop->markGone();
     }
 }
 
 void GlWorker::post(GlTaskPtr task) noexcept
 {
-    loop_->post(std::move(task));
+    fLoop->post(std::move(task));
 }
 
 void GlWorker::watch(GlTaskPtr task) noexcept
 {
-    loop_->watch(std::move(task));
+    fLoop->watch(std::move(task));
 }
 
 void GlWorker::lookNow() noexcept
@@ -87,26 +87,26 @@ void GlWorker::Call::drop() noexcept
 
 void GlWorker::run(Call& call)
 {
-    call.loop = loop_.get();
-    loop_->post(GlTaskPtr(&call));
-    loop_->waitForCall(call.hasRun);
+    call.loop = fLoop.get();
+    fLoop->post(GlTaskPtr(&call));
+    fLoop->waitForCall(call.hasRun);
     if (call.thrown)
         std::rethrow_exception(call.thrown);
 }
 
 bool GlWorker::callerSharesObjects() const
 {
-    return loop_->callerSharesObjects();
+    return fLoop->callerSharesObjects();
 }
 
 void GlWorker::finishCaller() const
 {
-    loop_->finishCaller();
+    fLoop->finishCaller();
 }
 
 GlDevice::CallerLook GlWorker::lookFromCaller() const
 {
-    return loop_->lookFromCaller();
+    return fLoop->lookFromCaller();
 }
 
 } // namespace glshare

@@ -77,8 +77,8 @@ private:
     // Ends the loop; returns when the thread uses the context no more.
     void stop();
 
-    std::shared_ptr<Loop> loop_; // the thread's own; it holds a reference too
-    std::thread thread_;
+    std::shared_ptr<Loop> fLoop; // the thread's own; it holds a reference too
+    std::thread fThread;
 };
 
 } // namespace glshare

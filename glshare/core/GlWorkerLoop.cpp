@@ -42,119 +42,119 @@ struct GlWorker::Loop::Running {
     }
 };
 
-GlWorker::Loop::Loop(std::unique_ptr<GlContext> context) : context_(std::move(context)) {}
+GlWorker::Loop::Loop(std::unique_ptr<GlContext> context) : fContext(std::move(context)) {}
 
 bool GlWorker::Loop::begin()
 {
-    if (!context_->makeCurrent())
+    if (!fContext->makeCurrent())
         return false;
     try {
-        device_ = GlDevice::create(context_->resolver());
+        fDevice = GlDevice::create(fContext->resolver());
     } catch (...) {
-        context_->releaseCurrent();
+        fContext->releaseCurrent();
         throw;
     }
-    hasGl_ = device_.has_value();
-    if (!hasGl_)
-        context_->releaseCurrent();
-    return hasGl_;
+    fHasGl = fDevice.has_value();
+    if (!fHasGl)
+        fContext->releaseCurrent();
+    return fHasGl;
 }
 
 GlDevice* GlWorker::Loop::device()
 {
-    return hasGl_ ? &*device_ : nullptr;
+    return fHasGl ? &*fDevice : nullptr;
 }
 
 void GlWorker::Loop::run()
 {
-    Lock lock(mutex_);
+    Lock lock(fMutex);
     for (;;) {
-        if (isExiting_)
-            changed_.wait(lock, [] { return false; });
-        if (isDisplayClosing_ && hasGl_)
+        if (fIsExiting)
+            fChanged.wait(lock, [] { return false; });
+        if (fIsDisplayClosing && fHasGl)
             letGoOfDisplay(lock);
-        if (!tasks_.empty()) {
+        if (!fTasks.empty()) {
             runTask(lock);
-        } else if (isStopping_ && !isExiting_) {
+        } else if (fIsStopping && !fIsExiting) {
             break;
-        } else if (!watched_.empty()) {
+        } else if (!fWatched.empty()) {
             lookAtWatched(lock);
         } else {
-            changed_.wait(lock);
+            fChanged.wait(lock);
         }
     }
-    isEnding_ = true;
-    isBusy_ = true;
+    fIsEnding = true;
+    fIsBusy = true;
     lock.unlock();
-    if (hasGl_.exchange(false)) {
-        device_->destroy();
-        context_->releaseCurrent();
+    if (fHasGl.exchange(false)) {
+        fDevice->destroy();
+        fContext->releaseCurrent();
     }
-    while (!watched_.empty())
-        watched_.pop()->run(nullptr);
-    context_.reset();
+    while (!fWatched.empty())
+        fWatched.pop()->run(nullptr);
+    fContext.reset();
     lock.lock();
-    isBusy_ = false;
-    changed_.notify_all();
+    fIsBusy = false;
+    fChanged.notify_all();
 }
 
 // The task is dropped before the lock is taken again: it may be the last owner of its worker.
 void GlWorker::Loop::runTask(Lock& lock)
 {
-    current_ = tasks_.pop();
-    isBusy_ = true;
+    fCurrent = fTasks.pop();
+    fIsBusy = true;
     lock.unlock();
-    current_->run(device());
-    current_ = nullptr;
+    fCurrent->run(device());
+    fCurrent = nullptr;
     lock.lock();
-    isBusy_ = false;
-    changed_.notify_all();
+    fIsBusy = false;
+    fChanged.notify_all();
 }
 
 void GlWorker::Loop::lookAtWatched(Lock& lock)
 {
-    watched_.swap(unseen_);
-    mustLookNow_ = false;
-    isBusy_ = true;
+    fWatched.swap(fUnseen);
+    fMustLookNow = false;
+    fIsBusy = true;
     lock.unlock();
-    while (!unseen_.empty()) {
-        current_ = unseen_.pop();
-        if (current_->run(device()))
-            current_ = nullptr;
+    while (!fUnseen.empty()) {
+        fCurrent = fUnseen.pop();
+        if (fCurrent->run(device()))
+            fCurrent = nullptr;
         else
-            seen_.push(std::move(current_));
+            fSeen.push(std::move(fCurrent));
     }
     lock.lock();
-    isBusy_ = false;
-    changed_.notify_all();
+    fIsBusy = false;
+    fChanged.notify_all();
     // Those that came in the meantime stand behind.
-    watched_.swap(seen_);
-    while (!seen_.empty())
-        watched_.push(seen_.pop());
-    changed_.wait_for(lock, kWatchInterval, [this] {
-        return watched_.empty() || mustLookNow_ || !tasks_.empty() || isStopping_ || isExiting_ ||
-               (isDisplayClosing_ && hasGl_);
+    fWatched.swap(fSeen);
+    while (!fSeen.empty())
+        fWatched.push(fSeen.pop());
+    fChanged.wait_for(lock, kWatchInterval, [this] {
+        return fWatched.empty() || fMustLookNow || !fTasks.empty() || fIsStopping || fIsExiting ||
+               (fIsDisplayClosing && fHasGl);
     });
 }
 
 void GlWorker::Loop::letGoOfDisplay(Lock& lock)
 {
     lock.unlock();
-    device_->destroy();
-    context_->releaseCurrent();
-    context_->abandon();
+    fDevice->destroy();
+    fContext->releaseCurrent();
+    fContext->abandon();
     lock.lock();
-    hasGl_ = false;
-    changed_.notify_all();
+    fHasGl = false;
+    fChanged.notify_all();
 }
 
 void GlWorker::Loop::post(GlTaskPtr task) noexcept
 {
     {
-        const std::scoped_lock lock(mutex_);
-        if (!isExiting_) {
-            tasks_.push(std::move(task));
-            changed_.notify_all();
+        const std::scoped_lock lock(fMutex);
+        if (!fIsExiting) {
+            fTasks.push(std::move(task));
+            fChanged.notify_all();
             return;
         }
     }
@@ -163,10 +163,10 @@ void GlWorker::Loop::post(GlTaskPtr task) noexcept
 
 void GlWorker::Loop::watch(GlTaskPtr task) noexcept
 {
-    const std::scoped_lock lock(mutex_);
-    watched_.push(std::move(task));
-    mustLookNow_ = true;
-    changed_.notify_all();
+    const std::scoped_lock lock(fMutex);
+    fWatched.push(std::move(task));
+    fMustLookNow = true;
+    fChanged.notify_all();
 }
 
 // Nobody waits for the list of loops here, which may be held by a thread that waits for this one;
@@ -181,38 +181,38 @@ void GlWorker::Loop::lookNow() noexcept
         const std::shared_ptr<Loop> loop = entry.loop.lock();
         if (loop == nullptr)
             continue;
-        const std::scoped_lock loopLock(loop->mutex_);
-        loop->mustLookNow_ = true;
-        loop->changed_.notify_all();
+        const std::scoped_lock loopLock(loop->fMutex);
+        loop->fMustLookNow = true;
+        loop->fChanged.notify_all();
     }
 }
 
 void GlWorker::Loop::endCall(bool& hasRun) noexcept
 {
-    const std::scoped_lock lock(mutex_);
+    const std::scoped_lock lock(fMutex);
     hasRun = true;
-    changed_.notify_all();
+    fChanged.notify_all();
 }
 
 void GlWorker::Loop::waitForCall(const bool& hasRun)
 {
-    Lock lock(mutex_);
-    changed_.wait(lock, [&hasRun] { return hasRun; });
+    Lock lock(fMutex);
+    fChanged.wait(lock, [&hasRun] { return hasRun; });
 }
 
 bool GlWorker::Loop::requestStop()
 {
-    const std::scoped_lock lock(mutex_);
-    isStopping_ = true;
-    changed_.notify_all();
-    return !isExiting_;
+    const std::scoped_lock lock(fMutex);
+    fIsStopping = true;
+    fChanged.notify_all();
+    return !fIsExiting;
 }
 
 void GlWorker::Loop::markGone()
 {
-    const std::scoped_lock lock(mutex_);
-    isGone_ = true;
-    changed_.notify_all();
+    const std::scoped_lock lock(fMutex);
+    fIsGone = true;
+    fChanged.notify_all();
 }
 
 void GlWorker::Loop::Running::tidy()
@@ -220,8 +220,8 @@ void GlWorker::Loop::Running::tidy()
     std::erase_if(entries, [](Entry& entry) {
         if (entry.orphan == nullptr)
             return entry.loop.expired();
-        const std::scoped_lock lock(entry.orphan->mutex_);
-        const bool hasRun = entry.orphan->isEnding_ && !entry.orphan->isBusy_;
+        const std::scoped_lock lock(entry.orphan->fMutex);
+        const bool hasRun = entry.orphan->fIsEnding && !entry.orphan->fIsBusy;
         if (hasRun)
             entry.thread.join();
         return hasRun;
@@ -244,44 +244,44 @@ void GlWorker::Loop::adopt(std::shared_ptr<Loop> loop, std::thread thread) noexc
 
 bool GlWorker::Loop::callerSharesObjects() const
 {
-    return hasGl_ && context_->callerHasContext() && device_->callerSharesObjects();
+    return fHasGl && fContext->callerHasContext() && fDevice->callerSharesObjects();
 }
 
 void GlWorker::Loop::finishCaller() const
 {
-    device_->finishCaller();
+    fDevice->finishCaller();
 }
 
 GlDevice::CallerLook GlWorker::Loop::lookFromCaller() const
 {
-    return GlDevice::CallerLook(*device_);
+    return GlDevice::CallerLook(*fDevice);
 }
 
 void GlWorker::Loop::leaveDisplay()
 {
-    Lock lock(mutex_);
-    isDisplayClosing_ = true;
-    changed_.notify_all();
-    changed_.wait(lock, [this] { return (!hasGl_ && !isBusy_) || isExiting_; });
+    Lock lock(fMutex);
+    fIsDisplayClosing = true;
+    fChanged.notify_all();
+    fChanged.wait(lock, [this] { return (!fHasGl && !fIsBusy) || fIsExiting; });
 }
 
 // A thread that is ending is waited for until it is gone; any other stays where it is.
 void GlWorker::Loop::park(std::thread* orphan)
 {
-    Lock lock(mutex_);
-    isExiting_ = true;
-    changed_.notify_all();
-    if (orphan != nullptr && isEnding_) {
+    Lock lock(fMutex);
+    fIsExiting = true;
+    fChanged.notify_all();
+    if (orphan != nullptr && fIsEnding) {
         lock.unlock();
         orphan->join();
         return;
     }
-    changed_.wait_for(lock, kExitPatience, [this] { return !isBusy_ && (!isEnding_ || isGone_); });
+    fChanged.wait_for(lock, kExitPatience, [this] { return !fIsBusy && (!fIsEnding || fIsGone); });
 }
 
 void GlWorker::Loop::listenForDisplay(const std::shared_ptr<Loop>& loop)
 {
-    loop->context_->onDisplayClosing([weak = std::weak_ptr<Loop>(loop)] {
+    loop->fContext->onDisplayClosing([weak = std::weak_ptr<Loop>(loop)] {
         if (const std::shared_ptr<Loop> open = weak.lock())
             open->leaveDisplay();
     });

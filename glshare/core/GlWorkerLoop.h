@@ -65,27 +65,27 @@ private:
     void letGoOfDisplay(Lock& lock);
     [[nodiscard]] GlDevice* device();
 
-    std::unique_ptr<GlContext> context_;
-    std::optional<GlDevice> device_; // unchanged once begin has returned
-    std::atomic<bool> hasGl_{false};
+    std::unique_ptr<GlContext> fContext;
+    std::optional<GlDevice> fDevice; // unchanged once begin has returned
+    std::atomic<bool> fHasGl{false};
 
-    // The worker's thread alone: what it has taken from `watched_`, and the task that runs. No task
+    // The worker's thread alone: what it has taken from `fWatched`, and the task that runs. No task
     // is on the thread's stack, which a forked child does not have.
-    GlTaskQueue unseen_;
-    GlTaskQueue seen_;
-    GlTaskPtr current_;
+    GlTaskQueue fUnseen;
+    GlTaskQueue fSeen;
+    GlTaskPtr fCurrent;
 
-    std::mutex mutex_; // guards everything below
-    std::condition_variable changed_;
-    GlTaskQueue tasks_;
-    GlTaskQueue watched_;
-    bool mustLookNow_ = false;
-    bool isBusy_ = false;
-    bool isStopping_ = false;
-    bool isEnding_ = false; // run is over, or nearly
-    bool isGone_ = false;   // and the thread with it
-    bool isDisplayClosing_ = false;
-    bool isExiting_ = false;
+    std::mutex fMutex; // guards everything below
+    std::condition_variable fChanged;
+    GlTaskQueue fTasks;
+    GlTaskQueue fWatched;
+    bool fMustLookNow = false;
+    bool fIsBusy = false;
+    bool fIsStopping = false;
+    bool fIsEnding = false; // run is over, or nearly
+    bool fIsGone = false;   // and the thread with it
+    bool fIsDisplayClosing = false;
+    bool fIsExiting = false;
 };
 
 } // namespace glshare

@@ -46,9 +46,9 @@ private:
     // Xlib's hook: runs in XCloseDisplay, before GLX's own, since the newest extension comes first.
     static int closing(Display* display, XExtCodes* codes);
 
-    std::mutex mutex_; // guards the rest
-    std::map<Display*, std::map<GLXContext, Listener>> listeners_;
-    std::vector<GLXContext> kept_;
+    std::mutex fMutex; // guards the rest
+    std::map<Display*, std::map<GLXContext, Listener>> fListeners;
+    std::vector<GLXContext> fKept;
 };
 
 OpenDisplays& openDisplays()
@@ -60,8 +60,8 @@ OpenDisplays& openDisplays()
 
 void OpenDisplays::open(Display* display)
 {
-    const std::scoped_lock lock(mutex_);
-    if (!listeners_.try_emplace(display).second)
+    const std::scoped_lock lock(fMutex);
+    if (!fListeners.try_emplace(display).second)
         return;
     if (const XExtCodes* codes = glx().addExtension(display); codes != nullptr)
         glx().setCloseDisplay(display, codes->extension, closing);
@@ -69,17 +69,17 @@ void OpenDisplays::open(Display* display)
 
 void OpenDisplays::listen(Display* display, GLXContext context, Listener listener)
 {
-    const std::scoped_lock lock(mutex_);
-    listeners_[display].insert_or_assign(context, std::move(listener));
+    const std::scoped_lock lock(fMutex);
+    fListeners[display].insert_or_assign(context, std::move(listener));
 }
 
 // The lock is held throughout, so that the display cannot go in the meantime. An entry without
 // listeners stays as long as its display: it says that the hook is set.
 void OpenDisplays::destroy(Display* display, GLXContext context)
 {
-    const std::scoped_lock lock(mutex_);
-    const auto entry = listeners_.find(display);
-    if (entry == listeners_.end())
+    const std::scoped_lock lock(fMutex);
+    const auto entry = fListeners.find(display);
+    if (entry == fListeners.end())
         return;
     entry->second.erase(context);
     glx().destroyContext(display, context);
@@ -87,9 +87,9 @@ void OpenDisplays::destroy(Display* display, GLXContext context)
 
 void OpenDisplays::keep(GLXContext context) noexcept
 {
-    const std::scoped_lock lock(mutex_);
+    const std::scoped_lock lock(fMutex);
     try {
-        kept_.push_back(context);
+        fKept.push_back(context);
     } catch (const std::bad_alloc&) {
         // It looks lost, and nothing else follows from that.
     }
@@ -100,8 +100,8 @@ int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
     OpenDisplays& displays = openDisplays();
     std::map<GLXContext, Listener> listeners;
     {
-        const std::scoped_lock lock(displays.mutex_);
-        if (auto entry = displays.listeners_.extract(display))
+        const std::scoped_lock lock(displays.fMutex);
+        if (auto entry = displays.fListeners.extract(display))
             listeners = std::move(entry.mapped());
     }
     for (const auto& [context, listener] : listeners)
@@ -112,24 +112,24 @@ int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
 class GlxContext final : public GlContext {
 public:
     // Owns no context yet.
-    explicit GlxContext(Display* display) : display_(display) { openDisplays().open(display); }
+    explicit GlxContext(Display* display) : fDisplay(display) { openDisplays().open(display); }
 
     ~GlxContext() override
     {
-        if (context_ != nullptr)
-            openDisplays().destroy(display_, context_);
+        if (fContext != nullptr)
+            openDisplays().destroy(fDisplay, fContext);
     }
 
-    void own(GLXContext context) { context_ = context; }
+    void own(GLXContext context) { fContext = context; }
 
     bool makeCurrent() override
     {
-        return glx().makeContextCurrent(display_, None, None, context_) == True;
+        return glx().makeContextCurrent(fDisplay, None, None, fContext) == True;
     }
 
-    void releaseCurrent() override { glx().makeContextCurrent(display_, None, None, nullptr); }
+    void releaseCurrent() override { glx().makeContextCurrent(fDisplay, None, None, nullptr); }
 
-    void abandon() override { openDisplays().keep(std::exchange(context_, nullptr)); }
+    void abandon() override { openDisplays().keep(std::exchange(fContext, nullptr)); }
 
     bool callerHasContext() const override { return glx().getCurrentContext() != nullptr; }
 
@@ -137,34 +137,34 @@ public:
 
     void onDisplayClosing(std::function<void()> closing) override
     {
-        openDisplays().listen(display_, context_, std::move(closing));
+        openDisplays().listen(fDisplay, fContext, std::move(closing));
     }
 
 private:
-    Display* display_;
-    GLXContext context_ = nullptr;
+    Display* fDisplay;
+    GLXContext fContext = nullptr;
 };
 
 // Xlib ends the process on an error that nobody handles, and has one handler for all threads. This
 // one takes its place while a context is created, which is the only request that can be refused.
 class ErrorTrap {
 public:
-    explicit ErrorTrap(Display* display) : display_(display)
+    explicit ErrorTrap(Display* display) : fDisplay(display)
     {
-        glx().sync(display_, False);
-        previous_ = glx().setErrorHandler([](Display*, XErrorEvent*) { return 0; });
+        glx().sync(fDisplay, False);
+        fPrevious = glx().setErrorHandler([](Display*, XErrorEvent*) { return 0; });
     }
     ~ErrorTrap()
     {
-        glx().sync(display_, False);
-        glx().setErrorHandler(previous_);
+        glx().sync(fDisplay, False);
+        glx().setErrorHandler(fPrevious);
     }
     ErrorTrap(const ErrorTrap&) = delete;
     ErrorTrap& operator=(const ErrorTrap&) = delete;
 
 private:
-    Display* display_;
-    XErrorHandler previous_ = nullptr;
+    Display* fDisplay;
+    XErrorHandler fPrevious = nullptr;
 };
 
 // The configuration of the application's context. It is searched for by hand, since

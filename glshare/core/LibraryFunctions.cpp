@@ -7,11 +7,11 @@
 
 namespace glshare {
 
-LibraryFunctions::LibraryFunctions(const char* fileName) : library_(dlopen(fileName, RTLD_LAZY)) {}
+LibraryFunctions::LibraryFunctions(const char* fileName) : fLibrary(dlopen(fileName, RTLD_LAZY)) {}
 
 void* LibraryFunctions::address(const char* name) const
 {
-    return library_ == nullptr ? nullptr : dlsym(library_, name);
+    return fLibrary == nullptr ? nullptr : dlsym(fLibrary, name);
 }
 
 void callAtExit(void (*call)())

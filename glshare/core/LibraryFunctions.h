@@ -19,7 +19,7 @@ public:
 private:
     [[nodiscard]] void* address(const char* name) const;
 
-    void* library_;
+    void* fLibrary;
 };
 
 // Has `call` called when the process exits, while threads that use the libraries still run; never

@@ -28,33 +28,33 @@ PinnedStorage::PinnedStorage(std::shared_ptr<SharingContext> context, GlDevice& 
 {
     auto unpin = std::make_unique<Unpin>();
     unpin->pin = device.pin(name);
-    address_ = unpin->pin == 0 ? nullptr : device.address(name, size);
-    if (address_ == nullptr) {
+    fAddress = unpin->pin == 0 ? nullptr : device.address(name, size);
+    if (fAddress == nullptr) {
         unpin->run(&device);
         return;
     }
-    release_.reset(unpin.release());
-    context_ = std::move(context);
+    fRelease.reset(unpin.release());
+    fContext = std::move(context);
 }
 
 PinnedStorage::~PinnedStorage()
 {
-    if (release_ != nullptr)
-        context_->worker().post(std::move(release_));
+    if (fRelease != nullptr)
+        fContext->worker().post(std::move(fRelease));
 }
 
 PinnedStorage::PinnedStorage(PinnedStorage&& other) noexcept
-    : context_(std::move(other.context_)), address_(std::exchange(other.address_, nullptr)),
-      release_(std::move(other.release_))
+    : fContext(std::move(other.fContext)), fAddress(std::exchange(other.fAddress, nullptr)),
+      fRelease(std::move(other.fRelease))
 {
 }
 
 PinnedStorage& PinnedStorage::operator=(PinnedStorage&& other) noexcept
 {
     PinnedStorage taken(std::move(other));
-    std::swap(context_, taken.context_);
-    std::swap(address_, taken.address_);
-    std::swap(release_, taken.release_);
+    std::swap(fContext, taken.fContext);
+    std::swap(fAddress, taken.fAddress);
+    std::swap(fRelease, taken.fRelease);
     return *this;
 }
 

@@ -32,14 +32,14 @@ public:
     PinnedStorage& operator=(const PinnedStorage&) = delete;
 
     // Null if nothing is held.
-    [[nodiscard]] void* address() const { return address_; }
+    [[nodiscard]] void* address() const { return fAddress; }
 
 private:
-    std::shared_ptr<SharingContext> context_;
-    void* address_ = nullptr;
+    std::shared_ptr<SharingContext> fContext;
+    void* fAddress = nullptr;
     // Unpins the storage; null if nothing is held. Made in advance, since a destructor that found
     // no memory could not report it.
-    GlTaskPtr release_;
+    GlTaskPtr fRelease;
 };
 
 } // namespace glshare

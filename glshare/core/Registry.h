@@ -53,9 +53,9 @@ private:
     // the lock, as that ends a thread.
     [[nodiscard]] std::shared_ptr<SharingContext> takeUnused(cl_context handle);
 
-    std::mutex mutex_; // guards both maps
-    std::unordered_map<cl_context, ContextEntry> contexts_;
-    std::unordered_map<cl_mem, BufferEntry> buffers_;
+    std::mutex fMutex; // guards both maps
+    std::unordered_map<cl_context, ContextEntry> fContexts;
+    std::unordered_map<cl_mem, BufferEntry> fBuffers;
 };
 
 } // namespace glshare

@@ -67,7 +67,7 @@ bool areAllInPlace(const SharingContext& context, const CopyBatch& batch)
 
 cl_int prepareAcquire(const SharingContext& context, bool isOrdered, CopyBatch& batch)
 {
-    batch.direction = CopyDirection::FromGl;
+    batch.direction = CopyDirection::kFromGl;
     if (isOrdered && areAllInPlace(context, batch)) {
         for (const auto& buffer : batch.buffers)
             buffer->isCopied = false;
@@ -84,7 +84,7 @@ cl_int prepareAcquire(const SharingContext& context, bool isOrdered, CopyBatch& 
 // What was copied on the way in is copied on the way out.
 void prepareRelease(CopyBatch& batch)
 {
-    batch.direction = CopyDirection::ToGl;
+    batch.direction = CopyDirection::kToGl;
     for (const auto& buffer : batch.buffers) {
         if (buffer->isCopied)
             batch.items.push_back({buffer.get(), buffer->hostAddress()});
@@ -93,7 +93,7 @@ void prepareRelease(CopyBatch& batch)
 
 void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
 {
-    if (command == SharingCommand::Acquire) {
+    if (command == SharingCommand::kAcquire) {
         counters().acquiredByCopy += copied;
         counters().acquiredInPlace += inPlace;
     } else {
@@ -113,8 +113,8 @@ cl_int enqueue(const SharingRequest& request, CopyBatch::Ptr& batch, cl_event* d
 
 cl_command_type typeOf(SharingCommand command)
 {
-    return command == SharingCommand::Acquire ? CL_COMMAND_ACQUIRE_GL_OBJECTS
-                                              : CL_COMMAND_RELEASE_GL_OBJECTS;
+    return command == SharingCommand::kAcquire ? CL_COMMAND_ACQUIRE_GL_OBJECTS
+                                               : CL_COMMAND_RELEASE_GL_OBJECTS;
 }
 
 // Hands the event to the application, or gives it back if it is not wanted.
@@ -136,7 +136,7 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
     EventTypes::Prepared type;
     if (request.event != nullptr)
         type = EventTypes::get().prepare(typeOf(command));
-    if (command == SharingCommand::Acquire) {
+    if (command == SharingCommand::kAcquire) {
         if (isOrdered)
             context.worker().finishCaller();
         if (const cl_int error = prepareAcquire(context, isOrdered, *batch); error != CL_SUCCESS)
@@ -151,7 +151,7 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
         return error;
     count(command, copied, inPlace);
     // A wait that fails tells of a command before this one, and so will the event.
-    if (command == SharingCommand::Release && isOrdered)
+    if (command == SharingCommand::kRelease && isOrdered)
         static_cast<void>(runtime().clWaitForEvents(1, &done));
     handOver(done, std::move(type), request.event);
     return CL_SUCCESS;
@@ -166,7 +166,7 @@ cl_int enqueueSharing(SharingCommand command, const std::shared_ptr<SharingConte
     if (const cl_int error = findAll(request, context, batch->buffers); error != CL_SUCCESS)
         return error;
 
-    const bool acquired = command == SharingCommand::Acquire;
+    const bool acquired = command == SharingCommand::kAcquire;
     if (!context->setAcquired(batch->buffers, acquired))
         return CL_INVALID_GL_OBJECT;
     cl_int error = CL_OUT_OF_HOST_MEMORY;

@@ -8,7 +8,7 @@
 
 namespace glshare {
 
-enum class SharingCommand { Acquire, Release };
+enum class SharingCommand { kAcquire, kRelease };
 
 // The arguments of both.
 struct SharingRequest {

@@ -16,8 +16,8 @@ constexpr std::size_t kKeptBatches = 16;
 
 SharingContext::SharingContext(std::unique_ptr<GlWorker> worker, ContextProperties properties,
                                bool canUseHostMemory)
-    : worker_(std::move(worker)), properties_(std::move(properties)),
-      canUseHostMemory_(canUseHostMemory)
+    : fWorker(std::move(worker)), fProperties(std::move(properties)),
+      fCanUseHostMemory(canUseHostMemory)
 {
 }
 
@@ -25,12 +25,12 @@ SharingContext::~SharingContext() = default;
 
 bool SharingContext::isOrderedWithCaller() const
 {
-    return switches().glEvent && !properties_.userSynchronises && worker_->callerSharesObjects();
+    return switches().glEvent && !fProperties.userSynchronises && fWorker->callerSharesObjects();
 }
 
 bool SharingContext::setAcquired(const SharedBuffers& buffers, bool acquired)
 {
-    const std::scoped_lock lock(mutex_);
+    const std::scoped_lock lock(fMutex);
     for (std::size_t i = 0; i < buffers.size(); ++i) {
         if (buffers[i]->isAcquired == acquired) {
             while (i-- > 0)
@@ -45,11 +45,11 @@ bool SharingContext::setAcquired(const SharedBuffers& buffers, bool acquired)
 std::unique_ptr<CopyBatch> SharingContext::takeBatch()
 {
     {
-        const std::scoped_lock lock(mutex_);
-        batches_.reserve(kKeptBatches); // so that keepBatch allocates nothing
-        if (!batches_.empty()) {
-            std::unique_ptr<CopyBatch> batch = std::move(batches_.back());
-            batches_.pop_back();
+        const std::scoped_lock lock(fMutex);
+        fBatches.reserve(kKeptBatches); // so that keepBatch allocates nothing
+        if (!fBatches.empty()) {
+            std::unique_ptr<CopyBatch> batch = std::move(fBatches.back());
+            fBatches.pop_back();
             return batch;
         }
     }
@@ -58,9 +58,9 @@ std::unique_ptr<CopyBatch> SharingContext::takeBatch()
 
 void SharingContext::keepBatch(std::unique_ptr<CopyBatch> batch) noexcept
 {
-    const std::scoped_lock lock(mutex_);
-    if (batches_.size() < batches_.capacity())
-        batches_.push_back(std::move(batch));
+    const std::scoped_lock lock(fMutex);
+    if (fBatches.size() < fBatches.capacity())
+        fBatches.push_back(std::move(batch));
 }
 
 } // namespace glshare

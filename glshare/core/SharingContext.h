@@ -27,9 +27,9 @@ public:
     SharingContext(const SharingContext&) = delete;
     SharingContext& operator=(const SharingContext&) = delete;
 
-    [[nodiscard]] const ContextProperties& properties() const { return properties_; }
-    [[nodiscard]] bool canUseHostMemory() const { return canUseHostMemory_; }
-    [[nodiscard]] GlWorker& worker() const { return *worker_; }
+    [[nodiscard]] const ContextProperties& properties() const { return fProperties; }
+    [[nodiscard]] bool canUseHostMemory() const { return fCanUseHostMemory; }
+    [[nodiscard]] GlWorker& worker() const { return *fWorker; }
 
     // Whether a command given on the calling thread must be ordered against the OpenGL context that
     // is current there.
@@ -44,11 +44,11 @@ public:
     void keepBatch(std::unique_ptr<CopyBatch> batch) noexcept;
 
 private:
-    std::unique_ptr<GlWorker> worker_;
-    ContextProperties properties_;
-    bool canUseHostMemory_;
-    std::mutex mutex_; // guards SharedBuffer::isAcquired and the following
-    std::vector<std::unique_ptr<CopyBatch>> batches_; // not in use
+    std::unique_ptr<GlWorker> fWorker;
+    ContextProperties fProperties;
+    bool fCanUseHostMemory;
+    std::mutex fMutex; // guards SharedBuffer::isAcquired and the following
+    std::vector<std::unique_ptr<CopyBatch>> fBatches; // not in use
 };
 
 } // namespace glshare

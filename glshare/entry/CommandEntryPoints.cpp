@@ -60,7 +60,7 @@ cl_int CL_API_CALL enqueueAcquireGlObjects(cl_command_queue queue, cl_uint count
                                            const cl_mem* memory, cl_uint waitCount,
                                            const cl_event* waitList, cl_event* event)
 {
-    return share(SharingCommand::Acquire, {queue, count, memory, waitCount, waitList, event}, [&] {
+    return share(SharingCommand::kAcquire, {queue, count, memory, waitCount, waitList, event}, [&] {
         return runtime().clEnqueueAcquireGLObjects(queue, count, memory, waitCount, waitList,
                                                    event);
     });
@@ -70,7 +70,7 @@ cl_int CL_API_CALL enqueueReleaseGlObjects(cl_command_queue queue, cl_uint count
                                            const cl_mem* memory, cl_uint waitCount,
                                            const cl_event* waitList, cl_event* event)
 {
-    return share(SharingCommand::Release, {queue, count, memory, waitCount, waitList, event}, [&] {
+    return share(SharingCommand::kRelease, {queue, count, memory, waitCount, waitList, event}, [&] {
         return runtime().clEnqueueReleaseGLObjects(queue, count, memory, waitCount, waitList,
                                                    event);
     });

@@ -28,9 +28,9 @@ Result failWith(cl_int error, Arguments... arguments)
 }
 
 // Whether a function works in a forked child: true of those that only query platforms and devices.
-enum class InForkedChild { Fails, Works };
+enum class InForkedChild { kFails, kWorks };
 
-template <auto function, InForkedChild inForkedChild = InForkedChild::Fails>
+template <auto function, InForkedChild inForkedChild = InForkedChild::kFails>
 struct EntryPoint;
 
 template <typename Result, typename... Arguments, Result(CL_API_CALL* function)(Arguments...),
@@ -40,7 +40,7 @@ struct EntryPoint<function, inForkedChild> {
     // Each means that the host has no memory or no thread to give.
     static Result CL_API_CALL call(Arguments... arguments)
     {
-        if (inForkedChild == InForkedChild::Fails && isForkedChild())
+        if (inForkedChild == InForkedChild::kFails && isForkedChild())
             return failWith<Result>(CL_OUT_OF_RESOURCES, arguments...);
         try {
             return function(arguments...);
@@ -54,6 +54,6 @@ template <auto function>
 inline constexpr auto entryPoint = &EntryPoint<function>::call;
 
 template <auto function>
-inline constexpr auto entryPointOfDescription = &EntryPoint<function, InForkedChild::Works>::call;
+inline constexpr auto entryPointOfDescription = &EntryPoint<function, InForkedChild::kWorks>::call;
 
 } // namespace glshare

@@ -35,7 +35,7 @@ std::optional<Direct3D11Buffer> Direct3D11Buffer::create(ID3D11Device* device,
         return std::nullopt;
 
     Direct3D11Buffer buffer;
-    buffer.size_ = description.ByteWidth;
+    buffer.fSize = description.ByteWidth;
     D3D11_BUFFER_DESC wanted{};
     wanted.ByteWidth = description.ByteWidth;
     wanted.Usage = D3D11_USAGE_STAGING;
@@ -43,36 +43,36 @@ std::optional<Direct3D11Buffer> Direct3D11Buffer::create(ID3D11Device* device,
     ID3D11Buffer* staging = nullptr;
     if (FAILED(device->CreateBuffer(&wanted, nullptr, &staging)))
         return std::nullopt;
-    buffer.staging_.reset(staging);
+    buffer.fStaging.reset(staging);
     ID3D11DeviceContext* commands = nullptr;
     device->GetImmediateContext(&commands);
-    buffer.commands_.reset(commands);
+    buffer.fCommands.reset(commands);
     protect(commands);
     resource->AddRef();
-    buffer.resource_.reset(resource);
+    buffer.fResource.reset(resource);
     return buffer;
 }
 
 // The mapping waits for the copy.
 bool Direct3D11Buffer::read(std::span<std::byte> to)
 {
-    commands_->CopyResource(staging_.get(), resource_.get());
+    fCommands->CopyResource(fStaging.get(), fResource.get());
     D3D11_MAPPED_SUBRESOURCE mapped{};
-    if (FAILED(commands_->Map(staging_.get(), 0, D3D11_MAP_READ, 0, &mapped)))
+    if (FAILED(fCommands->Map(fStaging.get(), 0, D3D11_MAP_READ, 0, &mapped)))
         return false;
     std::memcpy(to.data(), mapped.pData, to.size());
-    commands_->Unmap(staging_.get(), 0);
+    fCommands->Unmap(fStaging.get(), 0);
     return true;
 }
 
 bool Direct3D11Buffer::write(std::span<const std::byte> from)
 {
     D3D11_MAPPED_SUBRESOURCE mapped{};
-    if (FAILED(commands_->Map(staging_.get(), 0, D3D11_MAP_WRITE, 0, &mapped)))
+    if (FAILED(fCommands->Map(fStaging.get(), 0, D3D11_MAP_WRITE, 0, &mapped)))
         return false;
     std::memcpy(mapped.pData, from.data(), from.size());
-    commands_->Unmap(staging_.get(), 0);
-    commands_->CopyResource(resource_.get(), staging_.get());
+    fCommands->Unmap(fStaging.get(), 0);
+    fCommands->CopyResource(fResource.get(), fStaging.get());
     return true;
 }
 

@@ -24,17 +24,17 @@ public:
     // cannot be copied to.
     static std::optional<Direct3D11Buffer> create(ID3D11Device* device, ID3D11Buffer* resource);
 
-    [[nodiscard]] std::size_t size() const { return size_; }
+    [[nodiscard]] std::size_t size() const { return fSize; }
 
     // All bytes of the buffer; false if Direct3D fails.
     [[nodiscard]] bool read(std::span<std::byte> to);
     [[nodiscard]] bool write(std::span<const std::byte> from);
 
 private:
-    ComPointer<ID3D11Buffer> resource_;
-    ComPointer<ID3D11Buffer> staging_;
-    ComPointer<ID3D11DeviceContext> commands_;
-    std::size_t size_ = 0;
+    ComPointer<ID3D11Buffer> fResource;
+    ComPointer<ID3D11Buffer> fStaging;
+    ComPointer<ID3D11DeviceContext> fCommands;
+    std::size_t fSize = 0;
 };
 
 } // namespace glshare

@@ -5,13 +5,13 @@
 
 namespace glshare {
 
-LibraryFunctions::LibraryFunctions(const char* fileName) : library_(LoadLibraryA(fileName)) {}
+LibraryFunctions::LibraryFunctions(const char* fileName) : fLibrary(LoadLibraryA(fileName)) {}
 
 void* LibraryFunctions::address(const char* name) const
 {
-    if (library_ == nullptr)
+    if (fLibrary == nullptr)
         return nullptr;
-    return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(library_), name));
+    return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(fLibrary), name));
 }
 
 void callAtExit(void (* /*call*/)()) {}

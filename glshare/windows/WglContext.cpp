@@ -63,27 +63,27 @@ void* resolveGl(const char* name)
 
 class WglContext final : public GlContext {
 public:
-    WglContext(HGLRC context, int pixelFormat) : context_(context), pixelFormat_(pixelFormat) {}
+    WglContext(HGLRC context, int pixelFormat) : fContext(context), fPixelFormat(pixelFormat) {}
 
-    ~WglContext() override { wgl().deleteContext(context_); }
+    ~WglContext() override { wgl().deleteContext(fContext); }
 
     bool makeCurrent() override
     {
-        window_ = CreateWindowExW(0, L"STATIC", L"glshare", WS_POPUP, 0, 0, 1, 1, nullptr, nullptr,
+        fWindow = CreateWindowExW(0, L"STATIC", L"glshare", WS_POPUP, 0, 0, 1, 1, nullptr, nullptr,
                                   nullptr, nullptr);
-        device_ = GetDC(window_);
+        fDevice = GetDC(fWindow);
         PIXELFORMATDESCRIPTOR description{};
-        wgl().describePixelFormat(device_, pixelFormat_, sizeof description, &description);
-        return wgl().setPixelFormat(device_, pixelFormat_, &description) &&
-               wgl().makeCurrent(device_, context_);
+        wgl().describePixelFormat(fDevice, fPixelFormat, sizeof description, &description);
+        return wgl().setPixelFormat(fDevice, fPixelFormat, &description) &&
+               wgl().makeCurrent(fDevice, fContext);
     }
 
     // On the thread that has made the context current, whose the window is.
     void releaseCurrent() override
     {
         wgl().makeCurrent(nullptr, nullptr);
-        ReleaseDC(window_, device_);
-        DestroyWindow(window_);
+        ReleaseDC(fWindow, fDevice);
+        DestroyWindow(fWindow);
     }
 
     void abandon() override {}
@@ -95,17 +95,17 @@ public:
     void onDisplayClosing(std::function<void()>) override {}
 
 private:
-    HGLRC context_;
-    int pixelFormat_;
-    HWND window_ = nullptr;
-    HDC device_ = nullptr;
+    HGLRC fContext;
+    int fPixelFormat;
+    HWND fWindow = nullptr;
+    HDC fDevice = nullptr;
 };
 
 } // namespace
 
 bool isSupported(WindowSystem windowSystem)
 {
-    return windowSystem == WindowSystem::Wgl;
+    return windowSystem == WindowSystem::kWgl;
 }
 
 bool isShareable(const GlBinding& binding)

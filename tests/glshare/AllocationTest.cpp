@@ -73,19 +73,19 @@ protected:
     void TearDown() override { endShortage(); }
 
     // Around the call itself.
-    void beginShortage() const { allocationsLeft = failing_; }
+    void beginShortage() const { allocationsLeft = fFailing; }
     cl_int endShortage(cl_int status = CL_SUCCESS)
     {
-        hasFailed_ = failing_ > 0 && allocationsLeft <= 0;
+        fHasFailed = fFailing > 0 && allocationsLeft <= 0;
         allocationsLeft = 0;
         return status;
     }
 
     [[nodiscard]] InUse inUse() const
     {
-        return {infoOf<cl_uint>(clGetContextInfo, context_, CL_CONTEXT_REFERENCE_COUNT),
-                infoOf<cl_uint>(clGetCommandQueueInfo, queue_, CL_QUEUE_REFERENCE_COUNT),
-                infoOf<cl_uint>(clGetMemObjectInfo, memory_, CL_MEM_REFERENCE_COUNT),
+        return {infoOf<cl_uint>(clGetContextInfo, fContext, CL_CONTEXT_REFERENCE_COUNT),
+                infoOf<cl_uint>(clGetCommandQueueInfo, fQueue, CL_QUEUE_REFERENCE_COUNT),
+                infoOf<cl_uint>(clGetMemObjectInfo, fMemory, CL_MEM_REFERENCE_COUNT),
                 threadsOfProcess()};
     }
 
@@ -107,16 +107,16 @@ protected:
         EXPECT_EQ(call(), expected);
         std::this_thread::sleep_for(kSettled);
         const InUse before = inUse();
-        for (failing_ = 1;; ++failing_) {
+        for (fFailing = 1;; ++fFailing) {
             const cl_int status = call();
             if (!maySucceed || status != expected) {
-                EXPECT_EQ(status, hasFailed_ ? CL_OUT_OF_HOST_MEMORY : expected) << failing_;
+                EXPECT_EQ(status, fHasFailed ? CL_OUT_OF_HOST_MEMORY : expected) << fFailing;
             }
             expectNothingLost(before);
-            if (!hasFailed_)
+            if (!fHasFailed)
                 break;
         }
-        EXPECT_GT(std::exchange(failing_, 0), 1) << "nothing was allocated";
+        EXPECT_GT(std::exchange(fFailing, 0), 1) << "nothing was allocated";
     }
 
     // A query whose answer is a Value at most.
@@ -145,21 +145,21 @@ protected:
         };
     }
 
-    int failing_ = 0; // the allocation that fails, from 1 on; 0: none
-    bool hasFailed_ = false;
+    int fFailing = 0; // the allocation that fails, from 1 on; 0: none
+    bool fHasFailed = false;
 };
 
 TEST_F(AllocationTest, QueriesReportThatMemoryIsShort)
 {
     using Text = std::array<char, 16384>;
-    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
+    const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
     const Properties list = properties();
     for (const cl_uint name :
          {cl_uint{CL_DEVICE_EXTENSIONS}, cl_uint{CL_DEVICE_EXTENSIONS_WITH_VERSION}})
-        failEachAllocation("device", query<Text>(clGetDeviceInfo, device_, name));
+        failEachAllocation("device", query<Text>(clGetDeviceInfo, fDevice, name));
     for (const cl_uint name :
          {cl_uint{CL_PLATFORM_EXTENSIONS}, cl_uint{CL_PLATFORM_EXTENSIONS_WITH_VERSION}})
-        failEachAllocation("platform", query<Text>(clGetPlatformInfo, platform_, name));
+        failEachAllocation("platform", query<Text>(clGetPlatformInfo, fPlatform, name));
     failEachAllocation("OpenGL context", query<cl_device_id>(clGetGLContextInfoKHR, list.data(),
                                                              CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR));
     failEachAllocation("texture",
@@ -172,7 +172,7 @@ TEST_F(AllocationTest, CreationsReportThatMemoryIsShort)
     const Context plain = makeContext({0});
     const Properties list = properties();
     failEachAllocation("context", creation<Context>([&](cl_int* error) {
-                           return clCreateContext(list.data(), 1, &device_, nullptr, nullptr,
+                           return clCreateContext(list.data(), 1, &fDevice, nullptr, nullptr,
                                                   error);
                        }));
     failEachAllocation("context from type", creation<Context>([&](cl_int* error) {
@@ -180,7 +180,7 @@ TEST_F(AllocationTest, CreationsReportThatMemoryIsShort)
                                                           nullptr, error);
                        }));
     failEachAllocation("buffer", creation<Memory>([&](cl_int* error) {
-                           return clCreateFromGLBuffer(context_, CL_MEM_READ_WRITE, buffer_, error);
+                           return clCreateFromGLBuffer(fContext, CL_MEM_READ_WRITE, fBuffer, error);
                        }));
     failEachAllocation("renderbuffer", creation<Memory>([&](cl_int* error) {
                            return clCreateFromGLRenderbuffer(plain, CL_MEM_READ_WRITE, 1, error);
@@ -213,8 +213,8 @@ TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
             break; // allocates nothing
         const auto call = [&] {
             Pair pair{makeContext(), {}, {}};
-            pair.queue = Queue(pair.context, device_);
-            pair.owners = {share(pair.context, buffer_), share(pair.context, other)};
+            pair.queue = Queue(pair.context, fDevice);
+            pair.owners = {share(pair.context, fBuffer), share(pair.context, other)};
             if (isRelease) {
                 EXPECT_EQ(pair.enqueue(false), CL_SUCCESS);
             }
@@ -224,12 +224,12 @@ TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
             EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
             if (isRelease != (error == CL_SUCCESS)) // acquired
             {
-                EXPECT_EQ(pair.queue.read(pair.owners[0], count_), from(value));
+                EXPECT_EQ(pair.queue.read(pair.owners[0], fCount), from(value));
                 pair.queue.write(pair.owners[0], from(++value));
                 EXPECT_EQ(pair.enqueue(true), CL_SUCCESS);
             }
             clFinish(pair.queue);
-            EXPECT_EQ(readGl(buffer_, count_), from(value));
+            EXPECT_EQ(readGl(fBuffer, fCount), from(value));
             return error;
         };
         failEachAllocation(isRelease ? "release" : "acquire", call, CL_SUCCESS, true);
@@ -245,23 +245,23 @@ TEST_F(AllocationTest, CommandsAllocateNothingAfterTheFirst)
     EglTestContext::releaseCurrent(); // or each release waits for its end
     const Event gate = makeUserEvent();
     const auto runFrame = [&] {
-        for (cl_mem memory : {cl_mem(memory_), cl_mem(second)}) {
+        for (cl_mem memory : {cl_mem(fMemory), cl_mem(second)}) {
             Event acquired;
             Event released;
-            EXPECT_EQ(queue_.acquire(memory, {gate}, &acquired), CL_SUCCESS);
-            EXPECT_EQ(queue_.release(memory, {acquired}, &released), CL_SUCCESS);
+            EXPECT_EQ(fQueue.acquire(memory, {gate}, &acquired), CL_SUCCESS);
+            EXPECT_EQ(fQueue.release(memory, {acquired}, &released), CL_SUCCESS);
         }
     };
     for (int frame = 0; frame < 10; ++frame)
         runFrame();
     clSetUserEventStatus(gate, CL_COMPLETE);
-    clFinish(queue_);
+    clFinish(fQueue);
     std::this_thread::sleep_for(kSettled);
-    gl_->makeCurrent();
+    fGl->makeCurrent();
     allocationsLeft = kMany;
     for (int frame = 0; frame < 10; ++frame) {
         runFrame();
-        clFinish(queue_);
+        clFinish(fQueue);
     }
     EXPECT_EQ(allocationsLeft, kMany);
 }
@@ -269,14 +269,14 @@ TEST_F(AllocationTest, CommandsAllocateNothingAfterTheFirst)
 TEST_F(AllocationTest, EventsOfSyncObjectsReportThatMemoryIsShort)
 {
     const auto create = reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
-        clGetExtensionFunctionAddressForPlatform(platform_, "clCreateEventFromGLsyncKHR"));
+        clGetExtensionFunctionAddressForPlatform(fPlatform, "clCreateEventFromGLsyncKHR"));
     if (create == nullptr)
         GTEST_SKIP() << "switched off";
     failEachAllocation("event", [&] {
         GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
         cl_int error = CL_INVALID_VALUE;
         beginShortage();
-        Event event = create(context_, reinterpret_cast<cl_GLsync>(sync), &error);
+        Event event = create(fContext, reinterpret_cast<cl_GLsync>(sync), &error);
         endShortage(error == CL_SUCCESS ? clWaitForEvents(1, event.place()) : error);
         glDeleteSync(sync);
         EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
@@ -295,10 +295,10 @@ TEST_F(AllocationTest, ThreadsThatCannotBeCreatedAreReported)
     ASSERT_EQ(pthread_attr_setstacksize(&impossible, std::size_t{1} << 48), 0);
     ASSERT_EQ(pthread_setattr_default_np(&impossible), 0);
     cl_int error = CL_SUCCESS;
-    EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
+    EXPECT_EQ(clCreateContext(list.data(), 1, &fDevice, nullptr, nullptr, &error), nullptr);
     EXPECT_EQ(error, CL_OUT_OF_HOST_MEMORY);
     pthread_setattr_default_np(&usual);
-    share(makeContext(), buffer_);
+    share(makeContext(), fBuffer);
 }
 
 } // namespace

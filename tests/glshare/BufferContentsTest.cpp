@@ -14,31 +14,31 @@ protected:
     // Rewrites through OpenCL and checks what OpenGL sees.
     void roundTrip(GLuint buffer, cl_mem memory, const Numbers& before, const Numbers& after)
     {
-        ASSERT_NO_FATAL_FAILURE(queue_.rewrite(memory, before, after));
+        ASSERT_NO_FATAL_FAILURE(fQueue.rewrite(memory, before, after));
         EXPECT_EQ(readGl(buffer, after.size()), after);
     }
 };
 
 TEST_F(BufferContentsTest, WritesCrossInBothDirections)
 {
-    roundTrip(buffer_, memory_, from(1), from(100));
-    redraw(buffer_, from(-7));
+    roundTrip(fBuffer, fMemory, from(1), from(100));
+    redraw(fBuffer, from(-7));
     glFinish();
-    roundTrip(buffer_, memory_, from(-7), from(3));
+    roundTrip(fBuffer, fMemory, from(-7), from(3));
 }
 
 TEST_F(BufferContentsTest, BytesAreCopiedOnlyWithoutZeroCopy)
 {
     const auto getCounters = reinterpret_cast<glshare_get_counters_fn>(
-        clGetExtensionFunctionAddressForPlatform(platform_, GLSHARE_GET_COUNTERS_NAME));
+        clGetExtensionFunctionAddressForPlatform(fPlatform, GLSHARE_GET_COUNTERS_NAME));
     ASSERT_NE(getCounters, nullptr);
     glshare_counters before{};
     glshare_counters after{};
     getCounters(&before);
-    roundTrip(buffer_, memory_, from(1), from(2));
+    roundTrip(fBuffer, fMemory, from(1), from(2));
     getCounters(&after);
     EXPECT_EQ(after.bytes_copied - before.bytes_copied,
-              isZeroCopy() ? 0 : 2 * count_ * sizeof(cl_int));
+              isZeroCopy() ? 0 : 2 * fCount * sizeof(cl_int));
     EXPECT_EQ(after.acquired_in_place - before.acquired_in_place, isZeroCopy() ? 1 : 0);
     EXPECT_EQ(after.acquired_by_copy - before.acquired_by_copy, isZeroCopy() ? 0 : 1);
     EXPECT_EQ(after.released_by_copy - before.released_by_copy, isZeroCopy() ? 0 : 1);
@@ -48,37 +48,37 @@ TEST_F(BufferContentsTest, BytesAreCopiedOnlyWithoutZeroCopy)
 // The storage moves away from under the memory object, which stays the same.
 TEST_F(BufferContentsTest, ReallocatedBuffersKeepSharing)
 {
-    roundTrip(buffer_, memory_, from(1), from(2));
+    roundTrip(fBuffer, fMemory, from(1), from(2));
     for (const cl_int factor : {3, 200, 1}) {
         SCOPED_TRACE(factor);
-        refill(buffer_, numbersFrom(factor, count_ * static_cast<std::size_t>(factor)));
+        refill(fBuffer, numbersFrom(factor, fCount * static_cast<std::size_t>(factor)));
         glFinish();
-        roundTrip(buffer_, memory_, from(factor), from(77));
+        roundTrip(fBuffer, fMemory, from(factor), from(77));
     }
 }
 
 // OpenCL still uses the old storage when OpenGL replaces it.
 TEST_F(BufferContentsTest, ReallocationWhileAcquiredIsHarmless)
 {
-    ASSERT_EQ(queue_.acquire(memory_), CL_SUCCESS);
-    refill(buffer_, numbersFrom(9, count_ * 50));
-    queue_.write(memory_, from(5));
-    EXPECT_EQ(queue_.read(memory_, count_), from(5));
-    EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
-    clFinish(queue_);
+    ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
+    refill(fBuffer, numbersFrom(9, fCount * 50));
+    fQueue.write(fMemory, from(5));
+    EXPECT_EQ(fQueue.read(fMemory, fCount), from(5));
+    EXPECT_EQ(fQueue.release(fMemory), CL_SUCCESS);
+    clFinish(fQueue);
 
-    redraw(buffer_, from(21));
+    redraw(fBuffer, from(21));
     glFinish();
-    roundTrip(buffer_, memory_, from(21), from(31));
+    roundTrip(fBuffer, fMemory, from(21), from(31));
 }
 
 // Acquires look at buffers with the context that is current on the calling thread.
 TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndTheErrorsOfTheCaller)
 {
     const GLuint bound = makeGlBuffer(from(4));
-    const auto bytes = static_cast<GLsizeiptr>(count_ * sizeof(cl_int));
+    const auto bytes = static_cast<GLsizeiptr>(fCount * sizeof(cl_int));
     const std::function<void()> changes[] = {
-        [] {}, [this] { refill(buffer_, numbersFrom(2, 2 * count_)); },
+        [] {}, [this] { refill(fBuffer, numbersFrom(2, 2 * fCount)); },
         [this] { glMapBuffer(GL_ARRAY_BUFFER, GL_READ_ONLY); },
         [bytes] {
             glUnmapBuffer(GL_ARRAY_BUFFER);
@@ -86,12 +86,12 @@ TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndTheErrorsOfTheCaller)
         }};
     for (const auto& change : changes) {
         SCOPED_TRACE(&change - changes);
-        glBindBuffer(GL_ARRAY_BUFFER, buffer_);
+        glBindBuffer(GL_ARRAY_BUFFER, fBuffer);
         change();
         glBindBuffer(GL_COPY_READ_BUFFER, bound);
-        EXPECT_EQ(queue_.acquire(memory_), CL_SUCCESS);
-        EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
-        clFinish(queue_);
+        EXPECT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
+        EXPECT_EQ(fQueue.release(fMemory), CL_SUCCESS);
+        clFinish(fQueue);
         GLint now = 0;
         glGetIntegerv(GL_COPY_READ_BUFFER_BINDING, &now);
         EXPECT_EQ(static_cast<GLuint>(now), bound);
@@ -108,7 +108,7 @@ TEST_F(BufferContentsTest, ImmutableBuffersAreShared)
         GLuint buffer = 0;
         glGenBuffers(1, &buffer);
         glBindBuffer(GL_ARRAY_BUFFER, buffer);
-        const auto size = static_cast<GLsizeiptr>(count_ * sizeof(cl_int));
+        const auto size = static_cast<GLsizeiptr>(fCount * sizeof(cl_int));
         glBufferStorage(GL_ARRAY_BUFFER, size, from(1).data(), access);
         ASSERT_EQ(glMapBufferRange(GL_ARRAY_BUFFER, 0, size, access) != nullptr, access != 0);
         EXPECT_EQ(glGetError() != GL_NO_ERROR, access == 0);
@@ -124,12 +124,12 @@ TEST_F(BufferContentsTest, BuffersOfOpenGlEsAreShared)
     es.makeCurrent();
     const GLuint buffer = makeGlBuffer(from(1));
     const Context context = makeContext(properties(es.entries()));
-    const Queue queue(context, device_);
+    const Queue queue(context, fDevice);
     queue.rewrite(share(context, buffer), from(1), from(50));
     const auto* numbers = static_cast<const cl_int*>(glMapBufferRange(
-        GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(count_ * sizeof(cl_int)), GL_MAP_READ_BIT));
+        GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(fCount * sizeof(cl_int)), GL_MAP_READ_BIT));
     ASSERT_NE(numbers, nullptr);
-    EXPECT_EQ(Numbers(numbers, numbers + count_), from(50));
+    EXPECT_EQ(Numbers(numbers, numbers + fCount), from(50));
     EXPECT_EQ(glGetError(), GLenum{GL_NO_ERROR});
     EglTestContext::releaseCurrent();
 }
@@ -144,21 +144,21 @@ TEST_F(BufferContentsTest, OneCommandCarriesManyBuffers)
         buffers.push_back(makeGlBuffer(from(i)));
         owners.push_back(share(buffers.back()));
         if (i % 3 == 0)
-            refill(buffers.back(), numbersFrom(i, count_ * 2));
+            refill(buffers.back(), numbersFrom(i, fCount * 2));
     }
     glFinish();
     const std::vector<cl_mem> memory(owners.begin(), owners.end());
-    ASSERT_EQ(clEnqueueAcquireGLObjects(queue_, kBuffers, memory.data(), 0, nullptr, nullptr),
+    ASSERT_EQ(clEnqueueAcquireGLObjects(fQueue, kBuffers, memory.data(), 0, nullptr, nullptr),
               CL_SUCCESS);
     for (cl_int i = 0; cl_mem each : memory) {
-        EXPECT_EQ(queue_.read(each, count_), from(i)) << i;
-        queue_.write(each, from(1000 + i++));
+        EXPECT_EQ(fQueue.read(each, fCount), from(i)) << i;
+        fQueue.write(each, from(1000 + i++));
     }
-    ASSERT_EQ(clEnqueueReleaseGLObjects(queue_, kBuffers, memory.data(), 0, nullptr, nullptr),
+    ASSERT_EQ(clEnqueueReleaseGLObjects(fQueue, kBuffers, memory.data(), 0, nullptr, nullptr),
               CL_SUCCESS);
-    clFinish(queue_);
+    clFinish(fQueue);
     for (cl_int i = 1000; const GLuint buffer : buffers)
-        EXPECT_EQ(readGl(buffer, count_), from(i++));
+        EXPECT_EQ(readGl(buffer, fCount), from(i++));
 }
 
 // Threads without an OpenGL context, each with a queue and a buffer of its own.
@@ -169,10 +169,10 @@ TEST_F(BufferContentsTest, ThreadsShareAtTheSameTime)
     std::array<GLuint, kThreads> buffers{};
     std::vector<std::jthread> threads;
     for (cl_int first = 0; GLuint & buffer : buffers) {
-        buffer = makeGlBuffer(Numbers(count_, 0));
+        buffer = makeGlBuffer(Numbers(fCount, 0));
         glFinish();
         threads.emplace_back([this, first, memory = share(buffer)] {
-            const Queue queue(context_, device_);
+            const Queue queue(fContext, fDevice);
             for (cl_int value = first; value < first + kRounds; ++value) {
                 EXPECT_EQ(queue.acquire(memory), CL_SUCCESS);
                 queue.fill(memory, value);
@@ -184,7 +184,7 @@ TEST_F(BufferContentsTest, ThreadsShareAtTheSameTime)
     }
     threads.clear();
     for (cl_int last = kRounds - 1; const GLuint buffer : buffers)
-        EXPECT_EQ(readGl(buffer, count_), Numbers(count_, last++));
+        EXPECT_EQ(readGl(buffer, fCount), Numbers(fCount, last++));
 }
 
 } // namespace

@@ -26,29 +26,29 @@ TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackWhatFollows)
 {
     for (cl_int value = 5; const cl_command_queue_properties kind : kQueueKinds) {
         SCOPED_TRACE(kind);
-        const Queue queue(context_, device_, kind);
+        const Queue queue(fContext, fDevice, kind);
         const Event gate = makeUserEvent();
         std::array<Event, 3> events;
         const auto after = [&](const Event& event) {
             return kind == 0 ? WaitList{} : WaitList{event};
         };
-        const Numbers before = readGl(buffer_, count_);
+        const Numbers before = readGl(fBuffer, fCount);
         onOtherThread([&] {
-            EXPECT_EQ(queue.acquire(memory_, {gate}, &events[0]), CL_SUCCESS);
-            queue.fill(memory_, ++value, after(events[0]), &events[1]);
-            EXPECT_EQ(queue.release(memory_, after(events[1]), &events[2]), CL_SUCCESS);
+            EXPECT_EQ(queue.acquire(fMemory, {gate}, &events[0]), CL_SUCCESS);
+            queue.fill(fMemory, ++value, after(events[0]), &events[1]);
+            EXPECT_EQ(queue.release(fMemory, after(events[1]), &events[2]), CL_SUCCESS);
             clFlush(queue);
         });
         std::this_thread::sleep_for(kSettled);
         for (const Event& event : events)
             EXPECT_GT(statusOf(event), CL_COMPLETE);
-        EXPECT_EQ(readGl(buffer_, count_), before);
+        EXPECT_EQ(readGl(fBuffer, fCount), before);
 
         clSetUserEventStatus(gate, CL_COMPLETE);
         EXPECT_EQ(clWaitForEvents(1, events[2].place()), CL_SUCCESS);
         for (const Event& event : events)
             EXPECT_EQ(statusOf(event), CL_COMPLETE);
-        EXPECT_EQ(readGl(buffer_, count_), Numbers(count_, value));
+        EXPECT_EQ(readGl(fBuffer, fCount), Numbers(fCount, value));
     }
 }
 
@@ -57,8 +57,8 @@ TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackWhatFollows)
 TEST_F(CommandOrderTest, ReleaseReturnsWhenDoneOnlyWithGlContextAndGlEvent)
 {
     const Event gate = makeUserEvent();
-    ASSERT_EQ(queue_.acquire(memory_), CL_SUCCESS);
-    queue_.fill(memory_, 6, {gate});
+    ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
+    fQueue.fill(fMemory, 6, {gate});
     std::jthread opener;
     if (offersGlEvent())
         opener = std::jthread([&] {
@@ -66,7 +66,7 @@ TEST_F(CommandOrderTest, ReleaseReturnsWhenDoneOnlyWithGlContextAndGlEvent)
             clSetUserEventStatus(gate, CL_COMPLETE);
         });
     Event event;
-    EXPECT_EQ(queue_.release(memory_, {}, &event), CL_SUCCESS);
+    EXPECT_EQ(fQueue.release(fMemory, {}, &event), CL_SUCCESS);
     if (offersGlEvent()) {
         EXPECT_EQ(statusOf(event), CL_COMPLETE);
     } else {
@@ -74,34 +74,34 @@ TEST_F(CommandOrderTest, ReleaseReturnsWhenDoneOnlyWithGlContextAndGlEvent)
         clSetUserEventStatus(gate, CL_COMPLETE);
         clWaitForEvents(1, event.place());
     }
-    EXPECT_EQ(readGl(buffer_, count_), Numbers(count_, 6));
+    EXPECT_EQ(readGl(fBuffer, fCount), Numbers(fCount, 6));
 }
 
 // The other OpenGL contexts of the process are none of the layer's business.
 TEST_F(CommandOrderTest, ContextsOfOtherShareGroupsAreNotWaitedFor)
 {
     const Event gate = makeUserEvent();
-    ASSERT_EQ(queue_.acquire(memory_), CL_SUCCESS);
+    ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
     const EglTestContext stranger;
     ASSERT_TRUE(stranger.valid());
     onOtherThread([&] {
         stranger.makeCurrent();
-        queue_.fill(memory_, 6, {gate});
+        fQueue.fill(fMemory, 6, {gate});
         Event event;
-        EXPECT_EQ(queue_.release(memory_, {}, &event), CL_SUCCESS);
+        EXPECT_EQ(fQueue.release(fMemory, {}, &event), CL_SUCCESS);
         EXPECT_GT(statusOf(event), CL_COMPLETE);
         EglTestContext::releaseCurrent();
     });
     clSetUserEventStatus(gate, CL_COMPLETE);
-    clFinish(queue_);
+    clFinish(fQueue);
 }
 
 TEST_F(CommandOrderTest, UserSynchronisationSwitchesTheImpliedOrderOff)
 {
-    glEntries_.insert(glEntries_.end(), {CL_CONTEXT_INTEROP_USER_SYNC, CL_TRUE});
+    fGlEntries.insert(fGlEntries.end(), {CL_CONTEXT_INTEROP_USER_SYNC, CL_TRUE});
     const Context context = makeContext();
-    const Queue queue(context, device_);
-    const Memory memory = share(context, buffer_);
+    const Queue queue(context, fDevice);
+    const Memory memory = share(context, fBuffer);
     const Event gate = clCreateUserEvent(context, nullptr);
     Event event;
     EXPECT_EQ(queue.acquire(memory, {gate}), CL_SUCCESS);
@@ -159,9 +159,9 @@ TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
     const Memory memory = share(pixels);
     drawIntoBuffer(pixels, 1);
 
-    EXPECT_EQ(queue_.acquire(memory), CL_SUCCESS);
-    EXPECT_TRUE(queue_.read(memory, kPixels) == Numbers(kPixels, -1));
-    EXPECT_EQ(queue_.release(memory), CL_SUCCESS);
+    EXPECT_EQ(fQueue.acquire(memory), CL_SUCCESS);
+    EXPECT_TRUE(fQueue.read(memory, kPixels) == Numbers(kPixels, -1));
+    EXPECT_EQ(fQueue.release(memory), CL_SUCCESS);
 }
 
 // The failure of what it waits for is the command's own, in a queue of either kind.
@@ -169,8 +169,8 @@ TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
 {
     for (const cl_command_queue_properties kind : kQueueKinds) {
         SCOPED_TRACE(kind);
-        const Queue queue(context_, device_, kind);
-        const Memory memory = share(buffer_);
+        const Queue queue(fContext, fDevice, kind);
+        const Memory memory = share(fBuffer);
         const Event gate = makeUserEvent();
         const Event other = makeUserEvent();
         Event event;
@@ -200,7 +200,7 @@ TEST_F(GlEventTest, EventsOfGlSyncObjectsKeepTheirContext)
     drawIntoBuffer(makeGlBuffer(Numbers(kPixels, 0)), 20);
     GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
     glFlush();
-    Event event = findCreateEvent(platform_)(context, reinterpret_cast<cl_GLsync>(sync), nullptr);
+    Event event = findCreateEvent(fPlatform)(context, reinterpret_cast<cl_GLsync>(sync), nullptr);
     context = nullptr;
     EXPECT_EQ(clWaitForEvents(1, event.place()), CL_SUCCESS);
     EXPECT_EQ(statusOf(event), CL_COMPLETE);
@@ -209,25 +209,25 @@ TEST_F(GlEventTest, EventsOfGlSyncObjectsKeepTheirContext)
 
 TEST_F(GlEventTest, EventsFollowGlSyncObjects)
 {
-    const auto createEvent = findCreateEvent(platform_);
+    const auto createEvent = findCreateEvent(fPlatform);
     ASSERT_NE(createEvent, nullptr);
-    redraw(buffer_, from(40));
+    redraw(fBuffer, from(40));
     GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
     glFlush();
     cl_int error = CL_INVALID_VALUE;
-    const Event event = createEvent(context_, reinterpret_cast<cl_GLsync>(sync), &error);
+    const Event event = createEvent(fContext, reinterpret_cast<cl_GLsync>(sync), &error);
     ASSERT_EQ(error, CL_SUCCESS);
     EXPECT_EQ(infoOf<cl_command_type>(clGetEventInfo, event, CL_EVENT_COMMAND_TYPE),
               cl_command_type{CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR});
     EXPECT_EQ(clSetUserEventStatus(event, CL_COMPLETE), CL_INVALID_EVENT);
 
     onOtherThread([&] {
-        EXPECT_EQ(queue_.acquire(memory_, {event}), CL_SUCCESS);
-        EXPECT_EQ(queue_.read(memory_, count_), from(40));
-        EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
+        EXPECT_EQ(fQueue.acquire(fMemory, {event}), CL_SUCCESS);
+        EXPECT_EQ(fQueue.read(fMemory, fCount), from(40));
+        EXPECT_EQ(fQueue.release(fMemory), CL_SUCCESS);
     });
     glDeleteSync(sync);
-    EXPECT_EQ(createEvent(context_, reinterpret_cast<cl_GLsync>(this), &error), nullptr);
+    EXPECT_EQ(createEvent(fContext, reinterpret_cast<cl_GLsync>(this), &error), nullptr);
     EXPECT_EQ(error, CL_INVALID_GL_OBJECT);
 }
 

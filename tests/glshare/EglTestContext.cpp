@@ -18,7 +18,7 @@ EGLDisplay EglTestContext::display()
     return theDisplay;
 }
 
-EglTestContext::EglTestContext(const EglTestContext* share, EGLenum api) : api_(api)
+EglTestContext::EglTestContext(const EglTestContext* share, EGLenum api) : fApi(api)
 {
     eglBindAPI(api);
     const bool isEs = api == EGL_OPENGL_ES_API;
@@ -31,8 +31,8 @@ EglTestContext::EglTestContext(const EglTestContext* share, EGLenum api) : api_(
         return;
     const std::array<EGLint, 5> attributes{EGL_CONTEXT_MAJOR_VERSION, isEs ? 3 : 4,
                                            EGL_CONTEXT_MINOR_VERSION, isEs ? 0 : 5, EGL_NONE};
-    context_ = eglCreateContext(
-        display(), config, share == nullptr ? EGL_NO_CONTEXT : share->context_, attributes.data());
+    fContext = eglCreateContext(
+        display(), config, share == nullptr ? EGL_NO_CONTEXT : share->fContext, attributes.data());
 }
 
 EglTestContext::~EglTestContext()
@@ -42,14 +42,14 @@ EglTestContext::~EglTestContext()
 
 std::vector<cl_context_properties> EglTestContext::entries() const
 {
-    return {CL_GL_CONTEXT_KHR, reinterpret_cast<cl_context_properties>(context_),
+    return {CL_GL_CONTEXT_KHR, reinterpret_cast<cl_context_properties>(fContext),
             CL_EGL_DISPLAY_KHR, reinterpret_cast<cl_context_properties>(display())};
 }
 
 void EglTestContext::makeCurrent() const
 {
-    eglBindAPI(api_);
-    eglMakeCurrent(display(), EGL_NO_SURFACE, EGL_NO_SURFACE, context_);
+    eglBindAPI(fApi);
+    eglMakeCurrent(display(), EGL_NO_SURFACE, EGL_NO_SURFACE, fContext);
 }
 
 void EglTestContext::releaseCurrent()
@@ -59,10 +59,10 @@ void EglTestContext::releaseCurrent()
 
 void EglTestContext::destroy()
 {
-    if (context_ == EGL_NO_CONTEXT)
+    if (fContext == EGL_NO_CONTEXT)
         return;
-    if (eglGetCurrentContext() == context_)
+    if (eglGetCurrentContext() == fContext)
         releaseCurrent();
-    eglDestroyContext(display(), context_);
-    context_ = EGL_NO_CONTEXT;
+    eglDestroyContext(display(), fContext);
+    fContext = EGL_NO_CONTEXT;
 }

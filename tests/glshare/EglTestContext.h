@@ -19,7 +19,7 @@ public:
     EglTestContext(const EglTestContext&) = delete;
     EglTestContext& operator=(const EglTestContext&) = delete;
 
-    [[nodiscard]] bool valid() const { return context_ != EGL_NO_CONTEXT; }
+    [[nodiscard]] bool valid() const { return fContext != EGL_NO_CONTEXT; }
 
     // What the properties of an OpenCL context say of it.
     [[nodiscard]] std::vector<cl_context_properties> entries() const;
@@ -32,6 +32,6 @@ public:
     void destroy();
 
 private:
-    EGLenum api_;
-    EGLContext context_ = EGL_NO_CONTEXT;
+    EGLenum fApi;
+    EGLContext fContext = EGL_NO_CONTEXT;
 };

@@ -55,8 +55,8 @@ protected:
         ASSERT_NO_FATAL_FAILURE(SharingTest::SetUp());
         if (IsSkipped())
             return;
-        ASSERT_NO_FATAL_FAILURE(queue_.rewrite(memory_, from(1), from(2)));
-        theRest() = {std::move(gl_), std::move(context_), std::move(queue_), std::move(memory_)};
+        ASSERT_NO_FATAL_FAILURE(fQueue.rewrite(fMemory, from(1), from(2)));
+        theRest() = {std::move(fGl), std::move(fContext), std::move(fQueue), std::move(fMemory)};
     }
 };
 
@@ -160,7 +160,7 @@ TEST_F(ExitOrder, ForkedChildrenFailToShareAndCanExit)
         if (child == 0) {
             alarm(kPatience);
             if (i % 2 != 0)
-                useInChild(device_, properties());
+                useInChild(fDevice, properties());
             std::exit(HasFailure() ? 1 : 0);
         }
         int status = 0;

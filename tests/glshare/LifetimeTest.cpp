@@ -35,13 +35,13 @@ TEST_F(LifetimeTest, ContextsTakeTheirWorkerAlong)
 // Names are given again from the lowest free one on.
 TEST_F(LifetimeTest, ContextsLeaveNoObjectsInTheShareGroup)
 {
-    queue_.rewrite(memory_, from(1), from(2));
-    memory_ = nullptr;
-    queue_ = Queue();
-    context_ = nullptr;
+    fQueue.rewrite(fMemory, from(1), from(2));
+    fMemory = nullptr;
+    fQueue = Queue();
+    fContext = nullptr;
     for (GLuint name = 1; name < 20; ++name) {
         EXPECT_FALSE(glIsProgram(name) || glIsShader(name)) << name;
-        EXPECT_EQ(glIsBuffer(name) == GL_TRUE, name == buffer_) << name;
+        EXPECT_EQ(glIsBuffer(name) == GL_TRUE, name == fBuffer) << name;
     }
 }
 
@@ -49,11 +49,11 @@ TEST_F(LifetimeTest, ContextsLeaveNoObjectsInTheShareGroup)
 TEST_F(LifetimeTest, CommandsThatFailLeaveNothing)
 {
     EglTestContext::releaseCurrent();
-    const Queue queue(context_, device_, CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE);
+    const Queue queue(fContext, fDevice, CL_QUEUE_OUT_OF_ORDER_EXEC_MODE_ENABLE);
     const auto failOften = [&](int times) {
         for (int i = 0; i < times; ++i) {
             const Event gate = makeUserEvent();
-            const Memory memory = share(buffer_);
+            const Memory memory = share(fBuffer);
             Event event;
             EXPECT_EQ(queue.acquire(memory, {gate}, &event), CL_SUCCESS);
             clSetUserEventStatus(gate, -5);
@@ -70,9 +70,9 @@ TEST_F(LifetimeTest, CommandsThatFailLeaveNothing)
 // The application's last reference to the context is not the last one.
 TEST_F(LifetimeTest, ObjectsOutliveTheReferenceToTheirContext)
 {
-    context_ = nullptr;
-    ASSERT_NO_FATAL_FAILURE(queue_.rewrite(memory_, from(1), from(4)));
-    EXPECT_EQ(readGl(buffer_, count_), from(4));
+    fContext = nullptr;
+    ASSERT_NO_FATAL_FAILURE(fQueue.rewrite(fMemory, from(1), from(4)));
+    EXPECT_EQ(readGl(fBuffer, fCount), from(4));
 }
 
 // Any object in a context keeps it, and the context shares as long as it is kept. An older runtime
@@ -80,7 +80,7 @@ TEST_F(LifetimeTest, ObjectsOutliveTheReferenceToTheirContext)
 TEST_F(LifetimeTest, AContextSharesAsLongAsAnyObjectKeepsIt)
 {
     cl_version version = 0;
-    if (clGetPlatformInfo(platform_, CL_PLATFORM_NUMERIC_VERSION, sizeof version, &version,
+    if (clGetPlatformInfo(fPlatform, CL_PLATFORM_NUMERIC_VERSION, sizeof version, &version,
                           nullptr) != CL_SUCCESS)
         GTEST_SKIP() << "the runtime is older than OpenCL 3.0";
     const char* source = "kernel void nothing() {}";
@@ -89,16 +89,16 @@ TEST_F(LifetimeTest, AContextSharesAsLongAsAnyObjectKeepsIt)
         SCOPED_TRACE(kind);
         Context context = makeContext();
         cl_context handle = context;
-        const Queue queue = kind == 0 ? Queue(handle, device_) : Queue();
+        const Queue queue = kind == 0 ? Queue(handle, fDevice) : Queue();
         const Event event = kind == 1 ? clCreateUserEvent(handle, nullptr) : nullptr;
         const Memory plain =
             kind == 2 ? clCreateBuffer(handle, CL_MEM_READ_WRITE, 64, nullptr, nullptr) : nullptr;
         const Owned<cl_program, clReleaseProgram> program =
             kind == 3 ? clCreateProgramWithSource(handle, 1, &source, nullptr, nullptr) : nullptr;
-        const Memory shared = kind == 4 ? share(handle, buffer_) : nullptr;
+        const Memory shared = kind == 4 ? share(handle, fBuffer) : nullptr;
         context = nullptr;
-        const Memory memory = share(handle, buffer_);
-        ASSERT_NO_FATAL_FAILURE(Queue(handle, device_).rewrite(memory, from(1), from(1)));
+        const Memory memory = share(handle, fBuffer);
+        ASSERT_NO_FATAL_FAILURE(Queue(handle, fDevice).rewrite(memory, from(1), from(1)));
     }
     EXPECT_TRUE(isSoon([&] { return threadsOfProcess() <= threads; })) << "a context is kept";
 }
@@ -107,15 +107,15 @@ TEST_F(LifetimeTest, ReleasedObjectsFinishTheirCommandsFirst)
 {
     const Event gate = makeUserEvent();
     onOtherThread([&] {
-        EXPECT_EQ(queue_.acquire(memory_, {gate}), CL_SUCCESS);
-        queue_.fill(memory_, 9);
-        EXPECT_EQ(queue_.release(memory_), CL_SUCCESS);
-        memory_ = nullptr;
-        clFlush(queue_);
+        EXPECT_EQ(fQueue.acquire(fMemory, {gate}), CL_SUCCESS);
+        fQueue.fill(fMemory, 9);
+        EXPECT_EQ(fQueue.release(fMemory), CL_SUCCESS);
+        fMemory = nullptr;
+        clFlush(fQueue);
     });
     clSetUserEventStatus(gate, CL_COMPLETE);
-    clFinish(queue_);
-    EXPECT_EQ(readGl(buffer_, count_), Numbers(count_, 9));
+    clFinish(fQueue);
+    EXPECT_EQ(readGl(fBuffer, fCount), Numbers(fCount, 9));
 }
 
 // Storage is held as long as the object that lies over it, and no longer.
@@ -149,18 +149,18 @@ TEST_F(LifetimeTest, StorageGoesWithTheObject)
 
 TEST_F(LifetimeTest, SharingGoesOnWithoutTheApplicationsGlContext)
 {
-    const EglTestContext second(gl_.get());
+    const EglTestContext second(fGl.get());
     ASSERT_TRUE(second.valid());
-    gl_->destroy();
-    queue_.rewrite(memory_, from(1), from(11));
+    fGl->destroy();
+    fQueue.rewrite(fMemory, from(1), from(11));
     second.makeCurrent();
-    EXPECT_EQ(readGl(buffer_, count_), from(11));
+    EXPECT_EQ(readGl(fBuffer, fCount), from(11));
     EglTestContext::releaseCurrent();
 }
 
 TEST_F(LifetimeTest, AContextCurrentElsewhereCanBeSharedWith)
 {
-    onOtherThread([&] { share(makeContext(), buffer_); });
+    onOtherThread([&] { share(makeContext(), fBuffer); });
 }
 
 } // namespace

@@ -11,17 +11,17 @@ using MisuseTest = SharingTest;
 
 TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
 {
-    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
-    const Queue unshared(makeContext({0}), device_);
+    const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
+    const Queue unshared(makeContext({0}), fDevice);
     const Context other = makeContext();
-    const Queue elsewhere(other, device_);
+    const Queue elsewhere(other, fDevice);
     const Event ended = makeUserEvent();
     clSetUserEventStatus(ended, CL_COMPLETE);
-    const std::array<cl_mem, 2> withNull{memory_, nullptr};
-    const std::array<cl_mem, 2> withPlain{memory_, plain};
-    const std::array<cl_mem, 2> twice{memory_, memory_};
+    const std::array<cl_mem, 2> withNull{fMemory, nullptr};
+    const std::array<cl_mem, 2> withPlain{fMemory, plain};
+    const std::array<cl_mem, 2> twice{fMemory, fMemory};
     const cl_buffer_region region{0, 64};
-    Memory part = clCreateSubBuffer(memory_, CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION,
+    Memory part = clCreateSubBuffer(fMemory, CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION,
                                     &region, nullptr);
     const cl_mem* const good = twice.data();
     const std::array<cl_event, 2> events{ended, nullptr};
@@ -36,26 +36,26 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
         cl_int error;
     };
     const Row rows[] = {
-        {"nothing at all", queue_, 0, nullptr, 0, nullptr, CL_SUCCESS},
+        {"nothing at all", fQueue, 0, nullptr, 0, nullptr, CL_SUCCESS},
         {"no queue", nullptr, 1, good, 0, nullptr, CL_INVALID_COMMAND_QUEUE},
         {"a queue that does not share", unshared, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
         {"a queue that shares elsewhere", elsewhere, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
-        {"a count without a list", queue_, 1, nullptr, 0, nullptr, CL_INVALID_VALUE},
-        {"a list without a count", queue_, 0, good, 0, nullptr, CL_INVALID_VALUE},
-        {"a null object", queue_, 2, withNull.data(), 0, nullptr, CL_INVALID_MEM_OBJECT},
-        {"one not from OpenGL", queue_, 2, withPlain.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
-        {"a part of one", queue_, 1, part.place(), 0, nullptr, CL_INVALID_GL_OBJECT},
-        {"a count that no list has", queue_, ~0U, good, 0, nullptr, CL_INVALID_VALUE},
-        {"an object twice", queue_, 2, twice.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
-        {"a wait count without a list", queue_, 1, good, 1, nullptr, CL_INVALID_EVENT_WAIT_LIST},
-        {"a wait list without a count", queue_, 1, good, 0, &events[0], CL_INVALID_EVENT_WAIT_LIST},
-        {"a null event", queue_, 1, good, 1, &events[1], CL_INVALID_EVENT_WAIT_LIST},
-        {"a wait count that no list has", queue_, 1, good, ~0U, &events[0],
+        {"a count without a list", fQueue, 1, nullptr, 0, nullptr, CL_INVALID_VALUE},
+        {"a list without a count", fQueue, 0, good, 0, nullptr, CL_INVALID_VALUE},
+        {"a null object", fQueue, 2, withNull.data(), 0, nullptr, CL_INVALID_MEM_OBJECT},
+        {"one not from OpenGL", fQueue, 2, withPlain.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a part of one", fQueue, 1, part.place(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a count that no list has", fQueue, ~0U, good, 0, nullptr, CL_INVALID_VALUE},
+        {"an object twice", fQueue, 2, twice.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a wait count without a list", fQueue, 1, good, 1, nullptr, CL_INVALID_EVENT_WAIT_LIST},
+        {"a wait list without a count", fQueue, 1, good, 0, &events[0], CL_INVALID_EVENT_WAIT_LIST},
+        {"a null event", fQueue, 1, good, 1, &events[1], CL_INVALID_EVENT_WAIT_LIST},
+        {"a wait count that no list has", fQueue, 1, good, ~0U, &events[0],
          CL_INVALID_EVENT_WAIT_LIST},
-        {"an event of elsewhere", queue_, 1, good, 1, foreign.place(), CL_INVALID_CONTEXT},
+        {"an event of elsewhere", fQueue, 1, good, 1, foreign.place(), CL_INVALID_CONTEXT},
     };
     const auto enqueue = [&](bool isRelease) {
-        return isRelease ? queue_.release(memory_) : queue_.acquire(memory_);
+        return isRelease ? fQueue.release(fMemory) : fQueue.acquire(fMemory);
     };
     // For release the objects are acquired, so that nothing but the fault in the row can count.
     for (const bool isRelease : {false, true}) {
@@ -72,7 +72,7 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
         EXPECT_EQ(enqueue(isRelease), CL_SUCCESS);
     }
     EXPECT_EQ(enqueue(true), CL_INVALID_GL_OBJECT) << "it is released";
-    clFinish(queue_);
+    clFinish(fQueue);
 }
 
 // Calls that make an object, each with one fault.
@@ -99,30 +99,30 @@ TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
     const auto flat = clCreateFromGLTexture2D;
     const auto solid = clCreateFromGLTexture3D;
     const std::tuple<const char*, cl_int, std::function<cl_mem(cl_int*)>> rows[] = {
-        {"no context", CL_INVALID_CONTEXT, buffer(nullptr, kUse, buffer_)},
-        {"a context that does not share", CL_INVALID_CONTEXT, buffer(plain, kUse, buffer_)},
-        {"flags without use", CL_INVALID_VALUE, buffer(context_, CL_MEM_ALLOC_HOST_PTR, buffer_)},
+        {"no context", CL_INVALID_CONTEXT, buffer(nullptr, kUse, fBuffer)},
+        {"a context that does not share", CL_INVALID_CONTEXT, buffer(plain, kUse, fBuffer)},
+        {"flags without use", CL_INVALID_VALUE, buffer(fContext, CL_MEM_ALLOC_HOST_PTR, fBuffer)},
         {"two uses", CL_INVALID_VALUE,
-         buffer(context_, CL_MEM_READ_ONLY | CL_MEM_WRITE_ONLY, buffer_)},
-        {"an unknown name", CL_INVALID_GL_OBJECT, buffer(context_, kUse, kUnknown)},
-        {"a name without a buffer", CL_INVALID_GL_OBJECT, buffer(context_, kUse, empty)},
-        {"no storage", CL_INVALID_GL_OBJECT, buffer(context_, kUse, withoutStorage)},
-        {"a renderbuffer", CL_INVALID_GL_OBJECT, renderbuffer(context_, kUse)},
-        {"its flags", CL_INVALID_VALUE, renderbuffer(context_, CL_MEM_USE_HOST_PTR)},
+         buffer(fContext, CL_MEM_READ_ONLY | CL_MEM_WRITE_ONLY, fBuffer)},
+        {"an unknown name", CL_INVALID_GL_OBJECT, buffer(fContext, kUse, kUnknown)},
+        {"a name without a buffer", CL_INVALID_GL_OBJECT, buffer(fContext, kUse, empty)},
+        {"no storage", CL_INVALID_GL_OBJECT, buffer(fContext, kUse, withoutStorage)},
+        {"a renderbuffer", CL_INVALID_GL_OBJECT, renderbuffer(fContext, kUse)},
+        {"its flags", CL_INVALID_VALUE, renderbuffer(fContext, CL_MEM_USE_HOST_PTR)},
         {"its context", CL_INVALID_CONTEXT, renderbuffer(plain, CL_MEM_USE_HOST_PTR)},
-        {"a texture", CL_INVALID_GL_OBJECT, texture(any, context_, 0, GL_TEXTURE_2D_ARRAY, 0)},
+        {"a texture", CL_INVALID_GL_OBJECT, texture(any, fContext, 0, GL_TEXTURE_2D_ARRAY, 0)},
         {"a part of a cube", CL_INVALID_GL_OBJECT,
-         texture(any, context_, kUse, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z, 0)},
+         texture(any, fContext, kUse, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z, 0)},
         {"its context", CL_INVALID_CONTEXT, texture(any, plain, kUse, GL_TEXTURE_CUBE_MAP, -1)},
         {"its flags", CL_INVALID_VALUE,
-         texture(any, context_, CL_MEM_COPY_HOST_PTR, GL_TEXTURE_2D, 0)},
-        {"a whole cube", CL_INVALID_VALUE, texture(any, context_, kUse, GL_TEXTURE_CUBE_MAP, 0)},
-        {"no target", CL_INVALID_VALUE, texture(any, context_, kUse, GL_ARRAY_BUFFER, 0)},
-        {"its level", CL_INVALID_MIP_LEVEL, texture(any, context_, kUse, GL_TEXTURE_1D, -1)},
-        {"2D", CL_INVALID_GL_OBJECT, texture(flat, context_, kUse, GL_TEXTURE_RECTANGLE, 0)},
-        {"2D of three", CL_INVALID_VALUE, texture(flat, context_, kUse, GL_TEXTURE_3D, 0)},
-        {"3D", CL_INVALID_GL_OBJECT, texture(solid, context_, kUse, GL_TEXTURE_3D, 0)},
-        {"3D of two", CL_INVALID_VALUE, texture(solid, context_, kUse, GL_TEXTURE_2D, 0)},
+         texture(any, fContext, CL_MEM_COPY_HOST_PTR, GL_TEXTURE_2D, 0)},
+        {"a whole cube", CL_INVALID_VALUE, texture(any, fContext, kUse, GL_TEXTURE_CUBE_MAP, 0)},
+        {"no target", CL_INVALID_VALUE, texture(any, fContext, kUse, GL_ARRAY_BUFFER, 0)},
+        {"its level", CL_INVALID_MIP_LEVEL, texture(any, fContext, kUse, GL_TEXTURE_1D, -1)},
+        {"2D", CL_INVALID_GL_OBJECT, texture(flat, fContext, kUse, GL_TEXTURE_RECTANGLE, 0)},
+        {"2D of three", CL_INVALID_VALUE, texture(flat, fContext, kUse, GL_TEXTURE_3D, 0)},
+        {"3D", CL_INVALID_GL_OBJECT, texture(solid, fContext, kUse, GL_TEXTURE_3D, 0)},
+        {"3D of two", CL_INVALID_VALUE, texture(solid, fContext, kUse, GL_TEXTURE_2D, 0)},
     };
     for (const auto& [what, expected, create] : rows) {
         SCOPED_TRACE(what);
@@ -136,12 +136,12 @@ TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
 
 TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
 {
-    const cl_context_properties gl = glEntries_.at(1);
-    const cl_context_properties display = glEntries_.at(3);
+    const cl_context_properties gl = fGlEntries.at(1);
+    const cl_context_properties display = fGlEntries.at(3);
     constexpr cl_context_properties kEgl = CL_EGL_DISPLAY_KHR;
     constexpr cl_context_properties kNonsense = 0x5eed;
     constexpr cl_int kNoShareGroup = CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    const cl_context_properties platform = reinterpret_cast<cl_context_properties>(platform_);
+    const cl_context_properties platform = reinterpret_cast<cl_context_properties>(fPlatform);
     const std::ptrdiff_t threads = threadsOfProcess();
     const auto check = [&](const char* what, cl_int expected, Properties others,
                            cl_context_properties context = 0, cl_int ofQuery = CL_SUCCESS) {
@@ -149,7 +149,7 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
         others.insert(others.begin(), {CL_GL_CONTEXT_KHR, context == 0 ? gl : context});
         const Properties list = properties(others);
         cl_int error = CL_SUCCESS;
-        EXPECT_EQ(clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error), nullptr);
+        EXPECT_EQ(clCreateContext(list.data(), 1, &fDevice, nullptr, nullptr, &error), nullptr);
         EXPECT_EQ(error, expected);
         EXPECT_EQ(
             clCreateContextFromType(list.data(), CL_DEVICE_TYPE_ALL, nullptr, nullptr, &error),
@@ -178,7 +178,7 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
 TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
 {
     const Properties list = properties();
-    const std::array<cl_device_id, 2> devices{device_, nullptr};
+    const std::array<cl_device_id, 2> devices{fDevice, nullptr};
     int user = 0;
     const std::tuple<const char*, cl_uint, const cl_device_id*, void*, cl_int> rows[] = {
         {"no devices", 0, nullptr, nullptr, CL_INVALID_VALUE},
@@ -205,15 +205,15 @@ TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
     const cl_int ofNullPlatform = clGetDeviceIDs(nullptr, CL_DEVICE_TYPE_ALL, 1, &device, nullptr);
     const std::tuple<const char*, cl_platform_id, cl_uint, cl_device_id*, cl_uint*, cl_int> rows[] =
         {
-            {"nothing wrong", platform_, 1, &device, &count, CL_SUCCESS},
-            {"count alone", platform_, 0, nullptr, &count, CL_SUCCESS},
+            {"nothing wrong", fPlatform, 1, &device, &count, CL_SUCCESS},
+            {"count alone", fPlatform, 0, nullptr, &count, CL_SUCCESS},
             {"null platform", nullptr, 1, &device, nullptr, ofNullPlatform},
-            {"no entries", platform_, 0, &device, &count, CL_INVALID_VALUE},
-            {"nowhere to answer", platform_, 1, nullptr, nullptr, CL_INVALID_VALUE},
+            {"no entries", fPlatform, 0, &device, &count, CL_INVALID_VALUE},
+            {"nowhere to answer", fPlatform, 1, nullptr, nullptr, CL_INVALID_VALUE},
         };
     for (const cl_device_type type :
          {cl_device_type{CL_DEVICE_TYPE_CPU}, cl_device_type{CL_DEVICE_TYPE_GPU}}) {
-        const cl_int found = clGetDeviceIDs(platform_, type, 1, &device, nullptr);
+        const cl_int found = clGetDeviceIDs(fPlatform, type, 1, &device, nullptr);
         cl_int error = CL_SUCCESS;
         EXPECT_EQ(clCreateContextFromType(list.data(), type, nullptr, &count, &error), nullptr);
         EXPECT_EQ(error, CL_INVALID_VALUE) << "data for no callback";
@@ -228,11 +228,11 @@ TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
 
 TEST_F(MisuseTest, FunctionsRefuseObjectsThatAreNotTheirs)
 {
-    const Memory plain = clCreateBuffer(context_, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
+    const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
     Event acquired;
-    ASSERT_EQ(queue_.acquire(memory_, {}, &acquired), CL_SUCCESS);
-    ASSERT_EQ(queue_.release(memory_), CL_SUCCESS);
-    clFinish(queue_);
+    ASSERT_EQ(fQueue.acquire(fMemory, {}, &acquired), CL_SUCCESS);
+    ASSERT_EQ(fQueue.release(fMemory), CL_SUCCESS);
+    clFinish(fQueue);
     cl_gl_object_type type = 0;
     std::array<char, 64> value{};
     const auto info = [&](auto get, auto handle, cl_uint name) {
@@ -245,7 +245,7 @@ TEST_F(MisuseTest, FunctionsRefuseObjectsThatAreNotTheirs)
          CL_INVALID_MEM_OBJECT},
         {"texture: not shared", info(clGetGLTextureInfo, cl_mem(plain), CL_GL_TEXTURE_TARGET),
          CL_INVALID_GL_OBJECT},
-        {"texture: a buffer", info(clGetGLTextureInfo, cl_mem(memory_), CL_GL_TEXTURE_TARGET),
+        {"texture: a buffer", info(clGetGLTextureInfo, cl_mem(fMemory), CL_GL_TEXTURE_TARGET),
          CL_INVALID_GL_OBJECT},
         {"memory: null", info(clGetMemObjectInfo, cl_mem(), CL_MEM_FLAGS), CL_INVALID_MEM_OBJECT},
         {"context: null", info(clGetContextInfo, cl_context(), CL_CONTEXT_PROPERTIES),
@@ -269,20 +269,20 @@ TEST_F(MisuseTest, BuffersThatOpenGlTookAwayAreRefusedAndHarmless)
     const GLuint shrunk = makeGlBuffer(numbersFrom(1, kLarge));
     const Memory small = share(shrunk);
     refill(shrunk, numbersFrom(1, 4));
-    EXPECT_EQ(queue_.acquire(small), CL_INVALID_GL_OBJECT);
-    EXPECT_EQ(queue_.release(small), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(fQueue.acquire(small), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(fQueue.release(small), CL_INVALID_GL_OBJECT);
 
     const GLuint deleted = makeGlBuffer(numbersFrom(1, kLarge));
     const Memory orphan = share(deleted);
-    ASSERT_EQ(queue_.acquire(orphan), CL_SUCCESS);
+    ASSERT_EQ(fQueue.acquire(orphan), CL_SUCCESS);
     glDeleteBuffers(1, &deleted);
-    EXPECT_EQ(queue_.release(orphan), CL_SUCCESS);
-    EXPECT_EQ(queue_.acquire(orphan), CL_INVALID_GL_OBJECT);
+    EXPECT_EQ(fQueue.release(orphan), CL_SUCCESS);
+    EXPECT_EQ(fQueue.acquire(orphan), CL_INVALID_GL_OBJECT);
     EXPECT_EQ(glIsBuffer(deleted), GL_FALSE);
 
     for (cl_mem memory : {cl_mem(small), cl_mem(orphan)}) {
-        queue_.write(memory, numbersFrom(3, kLarge));
-        EXPECT_EQ(queue_.read(memory, kLarge), numbersFrom(3, kLarge));
+        fQueue.write(memory, numbersFrom(3, kLarge));
+        EXPECT_EQ(fQueue.read(memory, kLarge), numbersFrom(3, kLarge));
     }
 }
 

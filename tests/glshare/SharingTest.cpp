@@ -58,22 +58,22 @@ cl_event* placeOf(Event* event)
 } // namespace
 
 Queue::Queue(cl_context context, cl_device_id device, cl_command_queue_properties kind)
-    : queue_(clCreateCommandQueue(context, device, kind, nullptr))
+    : fQueue(clCreateCommandQueue(context, device, kind, nullptr))
 {
-    EXPECT_NE(queue_, nullptr);
+    EXPECT_NE(fQueue, nullptr);
 }
 
 cl_int Queue::share(decltype(&clEnqueueAcquireGLObjects) call, cl_mem memory,
                     const WaitList& waitList, Event* event) const
 {
-    return call(queue_, 1, &memory, static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
+    return call(fQueue, 1, &memory, static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
                 placeOf(event));
 }
 
 void Queue::fill(cl_mem memory, cl_int value, const WaitList& waitList, Event* event) const
 {
     const auto size = infoOf<std::size_t>(clGetMemObjectInfo, memory, CL_MEM_SIZE);
-    EXPECT_EQ(clEnqueueFillBuffer(queue_, memory, &value, sizeof value, 0, size,
+    EXPECT_EQ(clEnqueueFillBuffer(fQueue, memory, &value, sizeof value, 0, size,
                                   static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
                                   placeOf(event)),
               CL_SUCCESS);
@@ -82,7 +82,7 @@ void Queue::fill(cl_mem memory, cl_int value, const WaitList& waitList, Event* e
 Numbers Queue::read(cl_mem memory, std::size_t count) const
 {
     Numbers numbers(count);
-    EXPECT_EQ(clEnqueueReadBuffer(queue_, memory, CL_TRUE, 0, count * sizeof(cl_int),
+    EXPECT_EQ(clEnqueueReadBuffer(fQueue, memory, CL_TRUE, 0, count * sizeof(cl_int),
                                   numbers.data(), 0, nullptr, nullptr),
               CL_SUCCESS);
     return numbers;
@@ -90,7 +90,7 @@ Numbers Queue::read(cl_mem memory, std::size_t count) const
 
 void Queue::write(cl_mem memory, const Numbers& numbers) const
 {
-    EXPECT_EQ(clEnqueueWriteBuffer(queue_, memory, CL_TRUE, 0, numbers.size() * sizeof(cl_int),
+    EXPECT_EQ(clEnqueueWriteBuffer(fQueue, memory, CL_TRUE, 0, numbers.size() * sizeof(cl_int),
                                    numbers.data(), 0, nullptr, nullptr),
               CL_SUCCESS);
 }
@@ -101,7 +101,7 @@ void Queue::rewrite(cl_mem memory, const Numbers& before, const Numbers& after) 
     EXPECT_EQ(read(memory, before.size()), before);
     write(memory, after);
     ASSERT_EQ(release(memory), CL_SUCCESS);
-    clFinish(queue_);
+    clFinish(fQueue);
 }
 
 void SharingTest::SetUp()
@@ -110,28 +110,28 @@ void SharingTest::SetUp()
     if (IsSkipped() || HasFatalFailure())
         return;
     keepModulesLoaded();
-    if (clGetPlatformIDs(1, &platform_, nullptr) != CL_SUCCESS)
+    if (clGetPlatformIDs(1, &fPlatform, nullptr) != CL_SUCCESS)
         GTEST_SKIP() << "no OpenCL runtime here";
-    ASSERT_NE(extensionsOf(platform_).find("cl_khr_gl_sharing"), std::string::npos)
+    ASSERT_NE(extensionsOf(fPlatform).find("cl_khr_gl_sharing"), std::string::npos)
         << "the layer is not active";
-    ASSERT_EQ(clGetDeviceIDs(platform_, CL_DEVICE_TYPE_ALL, 1, &device_, nullptr), CL_SUCCESS);
-    context_ = makeContext();
-    ASSERT_NE(context_, nullptr);
-    queue_ = Queue(context_, device_);
-    buffer_ = makeGlBuffer(from(1));
+    ASSERT_EQ(clGetDeviceIDs(fPlatform, CL_DEVICE_TYPE_ALL, 1, &fDevice, nullptr), CL_SUCCESS);
+    fContext = makeContext();
+    ASSERT_NE(fContext, nullptr);
+    fQueue = Queue(fContext, fDevice);
+    fBuffer = makeGlBuffer(from(1));
     glFinish();
-    memory_ = share(buffer_);
+    fMemory = share(fBuffer);
 }
 
 void SharingTest::openGl()
 {
     if (EglTestContext::display() == EGL_NO_DISPLAY)
         GTEST_SKIP() << "EGL has no display without a window system here";
-    gl_ = std::make_unique<EglTestContext>();
-    if (!gl_->valid())
+    fGl = std::make_unique<EglTestContext>();
+    if (!fGl->valid())
         GTEST_SKIP() << "no OpenGL 4.5 here";
-    gl_->makeCurrent();
-    glEntries_ = gl_->entries();
+    fGl->makeCurrent();
+    fGlEntries = fGl->entries();
 }
 
 bool SharingTest::isOn(const char* variable)
@@ -157,7 +157,7 @@ std::string SharingTest::extensionsOf(cl_platform_id platform)
 
 Properties SharingTest::properties(const Properties& entries) const
 {
-    Properties list{CL_CONTEXT_PLATFORM, reinterpret_cast<cl_context_properties>(platform_)};
+    Properties list{CL_CONTEXT_PLATFORM, reinterpret_cast<cl_context_properties>(fPlatform)};
     list.insert(list.end(), entries.begin(), entries.end());
     list.push_back(0);
     return list;
@@ -166,7 +166,7 @@ Properties SharingTest::properties(const Properties& entries) const
 Context SharingTest::makeContext(const Properties& list) const
 {
     cl_int error = CL_INVALID_VALUE;
-    Context context = clCreateContext(list.data(), 1, &device_, nullptr, nullptr, &error);
+    Context context = clCreateContext(list.data(), 1, &fDevice, nullptr, nullptr, &error);
     EXPECT_EQ(error, CL_SUCCESS);
     return context;
 }

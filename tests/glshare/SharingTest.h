@@ -31,25 +31,25 @@ Numbers numbersFrom(cl_int first, std::size_t count);
 template <typename Handle, cl_int (*giveBack)(Handle)>
 class Owned {
 public:
-    Owned(Handle handle = nullptr) : handle_(handle) {}
+    Owned(Handle handle = nullptr) : fHandle(handle) {}
     ~Owned()
     {
-        if (handle_ != nullptr)
-            giveBack(handle_);
+        if (fHandle != nullptr)
+            giveBack(fHandle);
     }
-    Owned(Owned&& other) noexcept : handle_(std::exchange(other.handle_, nullptr)) {}
+    Owned(Owned&& other) noexcept : fHandle(std::exchange(other.fHandle, nullptr)) {}
     Owned& operator=(Owned other) noexcept
     {
-        std::swap(handle_, other.handle_);
+        std::swap(fHandle, other.fHandle);
         return *this;
     }
-    operator Handle() const { return handle_; }
+    operator Handle() const { return fHandle; }
 
     // Where calls read the handle, or put a new one if there is none yet.
-    Handle* place() { return &handle_; }
+    Handle* place() { return &fHandle; }
 
 private:
-    Handle handle_;
+    Handle fHandle;
 };
 
 using Context = Owned<cl_context, clReleaseContext>;
@@ -61,7 +61,7 @@ class Queue {
 public:
     Queue() = default;
     Queue(cl_context context, cl_device_id device, cl_command_queue_properties kind = 0);
-    operator cl_command_queue() const { return queue_; }
+    operator cl_command_queue() const { return fQueue; }
 
     cl_int acquire(cl_mem memory, const WaitList& waitList = {}, Event* event = nullptr) const
     {
@@ -87,7 +87,7 @@ private:
     cl_int share(decltype(&clEnqueueAcquireGLObjects) call, cl_mem memory, const WaitList& waitList,
                  Event* event) const;
 
-    Owned<cl_command_queue, clReleaseCommandQueue> queue_;
+    Owned<cl_command_queue, clReleaseCommandQueue> fQueue;
 };
 
 // One fact about an OpenCL object, asked with `get`.
@@ -112,11 +112,11 @@ void onOtherThread(const std::function<void()>& work);
 class SharingTest : public testing::Test {
 protected:
     // The buffer has `count` numbers from 1 on.
-    explicit SharingTest(std::size_t count = 5000) : count_(count) {}
+    explicit SharingTest(std::size_t count = 5000) : fCount(count) {}
 
     void SetUp() override;
 
-    // Makes an OpenGL context current and fills in `glEntries_`.
+    // Makes an OpenGL context current and fills in `fGlEntries`.
     virtual void openGl();
 
     // Whether a switch of the layer is on, which is so unless it is 0.
@@ -128,30 +128,30 @@ protected:
 
     // Properties of contexts on the platform, which share if nothing else is said.
     [[nodiscard]] Properties properties(const Properties& entries) const;
-    [[nodiscard]] Properties properties() const { return properties(glEntries_); }
+    [[nodiscard]] Properties properties() const { return properties(fGlEntries); }
     [[nodiscard]] Context makeContext(const Properties& list) const;
     [[nodiscard]] Context makeContext() const { return makeContext(properties()); }
-    [[nodiscard]] Event makeUserEvent() const { return clCreateUserEvent(context_, nullptr); }
+    [[nodiscard]] Event makeUserEvent() const { return clCreateUserEvent(fContext, nullptr); }
 
     // A GL buffer with these numbers, bound, and an OpenCL object over one.
     static GLuint makeGlBuffer(const Numbers& numbers);
     static Memory share(cl_context context, GLuint buffer, cl_mem_flags flags = CL_MEM_READ_WRITE);
-    Memory share(GLuint buffer) const { return share(context_, buffer); }
+    Memory share(GLuint buffer) const { return share(fContext, buffer); }
 
     // Binds the buffer and gives it new storage, or new contents.
     static void refill(GLuint buffer, const Numbers& numbers);
     static void redraw(GLuint buffer, const Numbers& numbers);
     static Numbers readGl(GLuint buffer, std::size_t count);
 
-    [[nodiscard]] Numbers from(cl_int first) const { return numbersFrom(first, count_); }
+    [[nodiscard]] Numbers from(cl_int first) const { return numbersFrom(first, fCount); }
 
-    const std::size_t count_;
-    std::unique_ptr<EglTestContext> gl_;
-    Properties glEntries_;
-    cl_platform_id platform_ = nullptr;
-    cl_device_id device_ = nullptr;
-    Context context_;
-    Queue queue_;
-    GLuint buffer_ = 0;
-    Memory memory_;
+    const std::size_t fCount;
+    std::unique_ptr<EglTestContext> fGl;
+    Properties fGlEntries;
+    cl_platform_id fPlatform = nullptr;
+    cl_device_id fDevice = nullptr;
+    Context fContext;
+    Queue fQueue;
+    GLuint fBuffer = 0;
+    Memory fMemory;
 };

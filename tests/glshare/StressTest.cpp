@@ -38,7 +38,7 @@ protected:
         GLuint vertices = 0;
         glGenVertexArrays(1, &vertices);
         glBindVertexArray(vertices);
-        glBindBuffer(GL_ARRAY_BUFFER, buffer_);
+        glBindBuffer(GL_ARRAY_BUFFER, fBuffer);
         glVertexAttribIPointer(0, 1, GL_INT, 0, nullptr);
         glEnableVertexAttribArray(0);
         glEnable(GL_RASTERIZER_DISCARD);
@@ -48,12 +48,12 @@ protected:
     // Creates and releases objects of the buffer, and uses every tenth.
     void createObjects(cl_context context)
     {
-        const Queue queue(context, device_);
+        const Queue queue(context, fDevice);
         for (int i = 0; i < 100; ++i) {
-            std::shared_lock promised(turn_, std::defer_lock);
+            std::shared_lock promised(fTurn, std::defer_lock);
             if (isZeroCopy())
                 promised.lock(); // that OpenGL leaves the buffer alone meanwhile
-            const Memory memory = share(context, buffer_);
+            const Memory memory = share(context, fBuffer);
             if (promised)
                 promised.unlock();
             if (i % 10 == 0)
@@ -64,10 +64,10 @@ protected:
     // From the acquire to the release nobody else uses the buffer.
     void useObject(const Queue& queue, cl_mem memory)
     {
-        const std::scoped_lock turn(turn_);
+        const std::scoped_lock turn(fTurn);
         ASSERT_EQ(queue.acquire(memory), CL_SUCCESS);
-        EXPECT_EQ(queue.read(memory, count_), from(first_));
-        queue.write(memory, from(++first_));
+        EXPECT_EQ(queue.read(memory, fCount), from(fFirst));
+        queue.write(memory, from(++fFirst));
         ASSERT_EQ(queue.release(memory), CL_SUCCESS);
         clFinish(queue);
     }
@@ -75,15 +75,15 @@ protected:
     // Maps, writes and draws the buffer. Objects may be created from it meanwhile.
     void useGl()
     {
-        const std::scoped_lock turn(turn_);
-        glBindBuffer(GL_ARRAY_BUFFER, buffer_);
+        const std::scoped_lock turn(fTurn);
+        glBindBuffer(GL_ARRAY_BUFFER, fBuffer);
         auto* const numbers = static_cast<cl_int*>(glMapBuffer(GL_ARRAY_BUFFER, GL_READ_WRITE));
         ASSERT_NE(numbers, nullptr);
-        EXPECT_EQ(Numbers(numbers, numbers + count_), from(first_));
-        std::ranges::copy(from(++first_), numbers);
+        EXPECT_EQ(Numbers(numbers, numbers + fCount), from(fFirst));
+        std::ranges::copy(from(++fFirst), numbers);
         ASSERT_EQ(glUnmapBuffer(GL_ARRAY_BUFFER), GL_TRUE);
-        glDrawArrays(GL_POINTS, 0, static_cast<GLsizei>(count_));
-        redraw(buffer_, from(++first_));
+        glDrawArrays(GL_POINTS, 0, static_cast<GLsizei>(fCount));
+        redraw(fBuffer, from(++fFirst));
         glFinish();
         ASSERT_EQ(glGetError(), GLenum{GL_NO_ERROR});
     }
@@ -96,10 +96,10 @@ protected:
         std::vector<std::jthread> creators;
         for (std::size_t i = 0; i < threads; ++i) {
             creators.emplace_back([&, this] {
-                const EglTestContext own(haveGl ? gl_.get() : nullptr);
+                const EglTestContext own(haveGl ? fGl.get() : nullptr);
                 if (haveGl)
                     own.makeCurrent();
-                createObjects(makeContext(properties(haveGl ? own.entries() : glEntries_)));
+                createObjects(makeContext(properties(haveGl ? own.entries() : fGlEntries)));
                 EglTestContext::releaseCurrent();
                 --running;
             });
@@ -108,8 +108,8 @@ protected:
             useGl();
     }
 
-    std::shared_mutex turn_; // guards the buffer's contents, and:
-    cl_int first_ = 1;       // its first number
+    std::shared_mutex fTurn; // guards the buffer's contents, and:
+    cl_int fFirst = 1;       // its first number
 };
 
 TEST_F(StressTest, ContextsCreateObjectsOfABufferThatOpenGlMapsAndDraws)
