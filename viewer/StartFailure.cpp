@@ -65,7 +65,7 @@ Reason reasonOfPlatform(const StartFacts& facts)
     return {};
 }
 
-// The renderer tells no vendor.
+// The renderer's texts name no vendor.
 Reason reasonOfPlatforms(const StartFacts& facts)
 {
     const std::vector<OpenCLPlatform> sharing = thatShare(facts.platforms);

@@ -14,7 +14,7 @@ class Player;
 class Session;
 
 // Without a session it stays empty. With one it draws frame after frame; the mouse orbits and
-// pans, the wheel zooms, the keys do what Controls.h tells.
+// pans, the wheel zooms; Controls.h lists the keys.
 class ViewerWindow : public QOpenGLWindow {
 public:
     ViewerWindow();

@@ -127,7 +127,7 @@ void GlWorker::Loop::lookAtWatched(Lock& lock)
     lock.lock();
     fIsBusy = false;
     fChanged.notify_all();
-    // Those that came in the meantime stand behind.
+    // Tasks that were added during the look follow after the earlier ones.
     fWatched.swap(fSeen);
     while (!fSeen.empty())
         fWatched.push(fSeen.pop());

@@ -14,7 +14,7 @@ namespace {
 class EvaluatorAllocationTest : public EvaluatorTest {
 protected:
     // Runs the operation with each of its allocations failing in turn, until none does, on a
-    // subject that `prepare` makes anew. Returns how many allocations failed.
+    // subject that `prepare` creates. Returns how many allocations failed.
     template <typename Prepare, typename Operation>
     unsigned failEach(const Prepare& prepare, const Operation& operation)
     {

@@ -1,5 +1,5 @@
-// The GL side on an OpenGL that executes what it is given only when it is told to finish, as that
-// of a GPU may. Mesa's software renderers execute at once, so that they show no missing finish.
+// GlDevice on a scripted OpenGL that executes commands only in glFinish, as a GPU's driver may.
+// Mesa's software renderers execute at once, so that they do not show a missing glFinish.
 #include "core/GlDevice.h"
 
 #include <gtest/gtest.h>

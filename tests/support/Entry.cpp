@@ -188,7 +188,7 @@ std::string Entry::text(const PropertyList& list) const
     for (const cl_context_properties* item = list.items; *item != 0; item += 2) {
         std::ostringstream pair;
         pair << (pairs.empty() ? "" : ", ") << "0x" << std::hex << item[0] << std::dec << ": ";
-        // NOLINTNEXTLINE(performance-no-int-to-ptr): a handle is opaque, nobody looks behind it.
+        // NOLINTNEXTLINE(performance-no-int-to-ptr): a handle is never dereferenced.
         const std::string name = fRuntime.name(reinterpret_cast<const void*>(item[1]));
         pairs += pair.str() + (name == "ptr" || name == "null" ? std::to_string(item[1]) : name);
     }

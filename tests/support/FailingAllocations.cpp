@@ -30,8 +30,8 @@ bool nextAllocationFails()
 }
 
 #ifndef _WIN32
-// What the allocators of TBB's containers call. A program's own goes before TBB's; on Windows that
-// is not so, and there the tests of such containers are left out.
+// The functions that the allocators of TBB's containers call. A program's definition takes
+// precedence over TBB's, except on Windows, where the tests of such containers are left out.
 namespace tbb::detail::r1 {
 
 void* allocate_memory(std::size_t size)

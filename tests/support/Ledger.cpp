@@ -16,7 +16,7 @@ constexpr std::uintptr_t kHandleSpacing = 16;
 
 void* scatteredHandle(unsigned serial)
 {
-    // NOLINTNEXTLINE(performance-no-int-to-ptr): a handle is opaque, nobody looks behind it.
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): a handle is never dereferenced.
     return reinterpret_cast<void*>((serial * kScatter & kHandleMask) * kHandleSpacing);
 }
 
