@@ -172,7 +172,8 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
           {kEgl, display, CL_CONTEXT_INTEROP_USER_SYNC, 2});
     check("an unknown name", CL_INVALID_PROPERTY, {kEgl, display, kNonsense, 1}, 0,
           CL_INVALID_VALUE);
-    EXPECT_LE(threadsOfProcess(), threads);
+    // The system lists a thread for a moment after it was joined.
+    EXPECT_TRUE(isSoon([&] { return threadsOfProcess() <= threads; }));
 }
 
 TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
