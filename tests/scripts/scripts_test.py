@@ -27,7 +27,7 @@ WRONG_USE = [
     ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "--fuzz", "--bogus"),
     ("test", "KernelStore"), ("test", "-R"), ("test-debian", "--bogus"),
     ("test-debian", "buster"), ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"),
-    ("test-windows", "-j"), ("tidy", "--bogus", "build"), ("tidy", "bogus"), ("trace-picture", "--bogus", "a", "b"),
+    ("test-windows", "--timeout"), ("tidy", "--bogus", "build"), ("tidy", "bogus"), ("trace-picture", "--bogus", "a", "b"),
 ]
 
 
