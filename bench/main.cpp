@@ -1,9 +1,9 @@
 // Measures the library beside the bare OpenCL calls that it must make.
-#include "Runtime.h"
-#include "Startup.h"
 #include "cases/Cases.h"
+#include "fixtures/Runtime.h"
 #include "harness/InstructionCount.h"
 #include "harness/Report.h"
+#include "startup/Startup.h"
 
 #include <cstdio>
 #include <exception>

@@ -21,7 +21,7 @@ EXAMPLES_FOLDER = "share/doc/libvyra-opencl-dev/examples"
 OTHER_PLACES = {
     "glshare/README.md": "share/doc/glshare/README.md",
     "glshare/glshare.h": "include/glshare.h",
-    "tools/info.schema.json": "share/vyra-opencl/info.schema.json",
+    "tools/info/report/info.schema.json": "share/vyra-opencl/info.schema.json",
     "evaluator/kernels/deformers.clh": "share/vyra-opencl/kernels/deformers.clh",
 }
 

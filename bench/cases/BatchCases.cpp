@@ -1,8 +1,8 @@
 // The shared-buffer manager: whole evaluations, rebuilding the batch, and the calls of evaluators.
-#include "Runtime.h"
 #include "cases/Cases.h"
-#include "cases/InteropStub.h"
-#include "cases/SharedBuffers.h"
+#include "fixtures/GLBuffers.h"
+#include "fixtures/InteropStub.h"
+#include "fixtures/Runtime.h"
 #include "harness/TwoThreads.h"
 #include "host/EvaluationId.h"
 #include "interop/TopenCLSharedBufferMgr.h"

@@ -1,7 +1,7 @@
 // The evaluation's data map beside the concurrent map that it is made of.
-#include "Runtime.h"
 #include "buffers/TopenCLData.h"
 #include "cases/Cases.h"
+#include "fixtures/Runtime.h"
 #include "harness/TwoThreads.h"
 
 #include <algorithm>

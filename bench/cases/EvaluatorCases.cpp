@@ -1,11 +1,11 @@
 // The evaluator: what its kernels cost, and what it adds to the direct calls of a frame.
-#include "Runtime.h"
 #include "cases/Cases.h"
-#include "cases/SharedBuffers.h"
 #include "evaluator/Evaluator.h"
 #include "evaluator/SkinDeformer.h"
 #include "evaluator/TwistDeformer.h"
-#include "frames/DirectKernel.h"
+#include "fixtures/DirectKernel.h"
+#include "fixtures/GLBuffers.h"
+#include "fixtures/Runtime.h"
 #include "host/EvaluationId.h"
 #include "runtime/TopenCLInfo.h"
 

@@ -1,8 +1,8 @@
 // Wait lists and the state of events.
-#include "Runtime.h"
+#include "baselines/ThirdPartyBaseline.h"
 #include "cases/Cases.h"
 #include "diagnostics/AutoCLEventList.h"
-#include "peers/Peer.h"
+#include "fixtures/Runtime.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>

@@ -1,10 +1,10 @@
 // The kernel store: cache hits, and giving kernels back.
+#include "baselines/ThirdPartyBaseline.h"
 #include "cases/Cases.h"
-#include "cases/Programs.h"
 #include "diagnostics/AutoCLObject.h"
+#include "fixtures/Programs.h"
 #include "harness/TwoThreads.h"
 #include "kernels/TopenCLKernelStore.h"
-#include "peers/Peer.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>

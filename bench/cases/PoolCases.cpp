@@ -1,9 +1,9 @@
 // The buffer pool beside creating and releasing memory each time.
-#include "Runtime.h"
+#include "baselines/ThirdPartyBaseline.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
 #include "cases/Cases.h"
-#include "peers/Peer.h"
+#include "fixtures/Runtime.h"
 
 #include <algorithm>
 #include <array>

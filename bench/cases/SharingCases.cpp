@@ -1,7 +1,7 @@
 // The software sharing layer: acquire and release beside a marker with the same wait list.
-#include "Runtime.h"
 #include "cases/Cases.h"
-#include "cases/SharedBuffers.h"
+#include "fixtures/GLBuffers.h"
+#include "fixtures/Runtime.h"
 #include "glshare.h"
 
 #include <memory>

@@ -1,8 +1,8 @@
 // Uploads, read-backs and growth of the growable buffer.
-#include "Runtime.h"
+#include "baselines/ThirdPartyBaseline.h"
 #include "buffers/TopenCLBuffer.h"
 #include "cases/Cases.h"
-#include "peers/Peer.h"
+#include "fixtures/Runtime.h"
 
 #include <memory>
 

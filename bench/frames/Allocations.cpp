@@ -1,4 +1,4 @@
-#include "Allocations.h"
+#include "frames/Allocations.h"
 
 #include <algorithm>
 #include <atomic>

@@ -1,4 +1,4 @@
-#include "Content.h"
+#include "frames/Content.h"
 
 #include "viewer/Verification.h"
 

@@ -1,7 +1,7 @@
 // What the characters of a crowd go through in each frame.
 #pragma once
 
-#include "CpuDeformation.h"
+#include "frames/CpuDeformation.h"
 #include "viewer/Model.h"
 
 #include <memory>

@@ -1,4 +1,4 @@
-#include "FrameReport.h"
+#include "frames/FrameReport.h"
 
 #include "harness/Goal.h"
 #include "harness/Table.h"

@@ -1,7 +1,7 @@
 // The times of whole frames as tables and as JSON, with the goals.
 #pragma once
 
-#include "Stage.h"
+#include "frames/Stage.h"
 
 #include <ostream>
 #include <vector>

@@ -1,4 +1,4 @@
-#include "CpuDeformation.h"
+#include "frames/CpuDeformation.h"
 
 #include "evaluator/MorphDeformer.h"
 #include "evaluator/SmoothDeformer.h"

@@ -1,8 +1,8 @@
 // The paths on which an application can bring deformed meshes into vertex buffers.
 #pragma once
 
-#include "CpuDeformation.h"
 #include "evaluator/Evaluator.h"
+#include "frames/CpuDeformation.h"
 #include "viewer/Scene.h"
 
 #include <cstddef>

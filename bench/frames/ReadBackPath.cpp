@@ -1,5 +1,5 @@
-#include "DirectKernel.h"
-#include "Path.h"
+#include "fixtures/DirectKernel.h"
+#include "frames/Path.h"
 
 #include "runtime/TopenCLInfo.h"
 

@@ -1,4 +1,4 @@
-#include "Path.h"
+#include "frames/Path.h"
 
 #include "host/EvaluationId.h"
 

@@ -1,5 +1,5 @@
-#include "CpuDeformation.h"
-#include "SkinTwistPose.h"
+#include "frames/CpuDeformation.h"
+#include "frames/SkinTwistPose.h"
 
 #include <algorithm>
 #include <array>

@@ -1,4 +1,4 @@
-#include "SkinTwistPose.h"
+#include "frames/SkinTwistPose.h"
 
 #include "evaluator/TwistDeformer.h"
 #include "viewer/Pose.h"

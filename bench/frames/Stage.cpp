@@ -1,4 +1,4 @@
-#include "Stage.h"
+#include "frames/Stage.h"
 
 #include "harness/Timing.h"
 #include "runtime/TopenCLInfo.h"

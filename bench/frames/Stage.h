@@ -1,9 +1,9 @@
 // Crowds that go through all paths, frame after frame.
 #pragma once
 
-#include "Allocations.h"
-#include "Content.h"
-#include "Path.h"
+#include "frames/Allocations.h"
+#include "frames/Content.h"
+#include "frames/Path.h"
 #include "harness/Statistics.h"
 
 #include <memory>

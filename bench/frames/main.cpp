@@ -1,9 +1,9 @@
 // Measures whole frames of the library and of what an application would do without it.
-#include "Allocations.h"
-#include "Content.h"
-#include "FrameReport.h"
-#include "Runtime.h"
-#include "Stage.h"
+#include "fixtures/Runtime.h"
+#include "frames/Allocations.h"
+#include "frames/Content.h"
+#include "frames/FrameReport.h"
+#include "frames/Stage.h"
 #include "harness/Report.h"
 #include "viewer/ModelImport.h"
 

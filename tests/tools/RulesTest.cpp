@@ -1,10 +1,10 @@
 // Stops, verdicts, decisions and what became of each environment variable, on made-up facts.
 #include "runtime/PlatformSelection.h"
-#include "tools/Decisions.h"
-#include "tools/Stop.h"
-#include "tools/SyncDecisions.h"
-#include "tools/Variables.h"
-#include "tools/Verdicts.h"
+#include "tools/info/rules/Decisions.h"
+#include "tools/info/rules/StartUpFailure.h"
+#include "tools/info/rules/SyncDecisions.h"
+#include "tools/info/rules/Variables.h"
+#include "tools/info/rules/Verdicts.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

@@ -1,9 +1,9 @@
 // What people type, and statuses and pages as they read them.
-#include "tools/CapturedOutput.h"
-#include "tools/Options.h"
-#include "tools/Sheet.h"
-#include "tools/StatusCodes.h"
-#include "tools/WarningLog.h"
+#include "tools/info/Options.h"
+#include "tools/info/diagnostics/CapturedOutput.h"
+#include "tools/info/diagnostics/WarningLog.h"
+#include "tools/info/report/ReportWriter.h"
+#include "tools/info/text/StatusCodes.h"
 
 #include "diagnostics/CLInternalWarning.h"
 #include "diagnostics/CLWarningSink.h"

@@ -1,8 +1,0 @@
-// The list for a build without peers.
-#include "peers/Peer.h"
-
-const std::vector<const Peer*>& peers()
-{
-    static const std::vector<const Peer*> none;
-    return none;
-}
