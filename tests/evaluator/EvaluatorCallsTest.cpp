@@ -1,7 +1,7 @@
 // The calls of evaluations without faults: how many there are, in which order, and which memory
 // each deformer reads and writes.
-#include "FakeHost.h"
 #include "ScriptedEvaluator.h"
+#include "fake/FakeHost.h"
 
 #include <map>
 

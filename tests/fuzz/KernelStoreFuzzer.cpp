@@ -1,8 +1,8 @@
 // Fuzzes sequences of requests to the kernel store, with build options, and of kernel files that
 // are edited while the viewer runs. Each kernel must come from the text and the options that were
 // requested, and nothing is left in the end. Some OpenCL calls fail.
-#include "FakeRuntime.h"
 #include "Require.h"
+#include "fake/FakeRuntime.h"
 
 #include "evaluator/KernelLibrary.h"
 #include "host/TstringArray.h"

@@ -1,7 +1,7 @@
 // The library itself, loaded and unloaded: in which order its static objects come and go.
-#include "FakeRuntime.h"
 #include "Platform.h"
 #include "buffers/TopenCLDataBuffer.h"
+#include "fake/FakeRuntime.h"
 
 #include <gtest/gtest.h>
 

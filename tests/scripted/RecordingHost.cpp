@@ -1,6 +1,6 @@
 // The part of the host that the library's static objects call, writing down who calls: the order in
 // which they are built and destroyed. In the place of the stand-in's own.
-#include "FakeRuntime.h"
+#include "fake/FakeRuntime.h"
 #include "host/Profiler.h"
 #include "host/Trace.h"
 #include "host/TuniqueString.h"

@@ -1,8 +1,8 @@
 // Decides which allocations fail, and replaces what oneTBB's containers call.
 #include "FailingAllocations.h"
 
-#include "FakeRuntime.h"
 #include "ReplacedOperators.h"
+#include "fake/FakeRuntime.h"
 
 #include <cstdlib>
 #include <new>

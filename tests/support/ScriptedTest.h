@@ -4,9 +4,9 @@
 // A test ends with every object accounted for, every wrong use declared and every warning read.
 #pragma once
 
-#include "FakeHost.h"
-#include "FakeRuntime.h"
 #include "Platform.h"
+#include "fake/FakeHost.h"
+#include "fake/FakeRuntime.h"
 
 #include <ostream>
 #include <string>

@@ -1,5 +1,5 @@
 // Gives the scripted runtime its world when it is loaded (INFO_WORLD names it).
-#include "FakeRuntime.h"
+#include "fake/FakeRuntime.h"
 
 #include <cstdlib>
 #include <map>

@@ -1,0 +1,31 @@
+// The profiler's categories and event types, which do not depend on the profiler.
+#include "host/Profiler.h"
+
+#include "standalone/profiler/ProfileLog.h"
+
+namespace {
+
+constinit const profiler::Category mainCategory{vyra::host::mainCategoryId};
+constinit const profiler::Categories allCategories{};
+
+} // namespace
+
+namespace profiler {
+
+const Category& Categories::main() const
+{
+    return mainCategory;
+}
+
+const Categories& categories()
+{
+    return allCategories;
+}
+
+EventType::EventType(const Category& category, Color color, const char* name,
+                     const char* description)
+    : fCategoryId(category.id()), fColor(color), fName(name), fDescription(description)
+{
+}
+
+} // namespace profiler
