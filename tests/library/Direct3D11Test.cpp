@@ -27,7 +27,7 @@ protected:
     void SetUp() override
     {
         makeDevice();
-        setEnvironment("VYRA_OPENCL_PLATFORM", "The pocl project");
+        ASSERT_NO_FATAL_FAILURE(chooseFirstPlatform());
         setEnvironment("GLSHARE_D3D11", GetParam());
         ASSERT_TRUE(TopenCLInfo::initialize(nullptr, fDevice.get(), nullptr, true, false, 0));
         ASSERT_TRUE(TopenCLInfo::theOne().usingDX());

@@ -25,7 +25,7 @@ WRONG_USE = [
     ("check", "tests", "bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
     ("docs", "one", "two"), ("format", "--bogus"), ("gpu-check", "--bogus"), ("package", "--bogus"),
     ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "--fuzz", "--bogus"),
-    ("test", "KernelStore"), ("test", "-R"), ("test-debian", "--bogus"),
+    ("test", "KernelStore"), ("test", "-R"), ("test", "--runtime"), ("test-debian", "--bogus"),
     ("test-debian", "buster"), ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"),
     ("test-windows", "--timeout"), ("tidy", "--bogus", "build"), ("tidy", "bogus"), ("trace-picture", "--bogus", "a", "b"),
 ]
