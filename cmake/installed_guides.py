@@ -12,8 +12,8 @@ import shutil
 import sys
 
 # Of docs/. The others are about building the library, or are its benchmarks.
-GUIDES = ["README", "deformers", "evaluation", "evaluator", "glshare", "hazards", "messages", "own-evaluator",
-          "synchronisation", "timing", "trouble"]
+GUIDES = ["README", "deformers", "evaluation", "evaluator", "glshare", "messages", "own-evaluator", "pitfalls",
+          "profiling", "synchronisation", "troubleshooting"]
 # Below the installation's prefix.
 GUIDES_FOLDER = "share/doc/libvyra-opencl-dev/guides"
 HEADERS_FOLDER = "include/vyra-opencl"
