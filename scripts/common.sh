@@ -1,4 +1,4 @@
-# What the project's commands have in common. Sourced, not run; expects `set -euo pipefail`.
+# Functions shared by the project's commands. Sourced, not run; expects `set -euo pipefail`.
 
 project_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 # ccache compares names of files relative to the project, so that clones in different directories share
@@ -10,13 +10,13 @@ fail() {
     exit "${2:-1}"
 }
 
-# Whether a package is installed, or another one that provides it, as in a later release.
+# Returns 0 if a package is installed, or another one that provides it, as in a later release.
 installed() {
     [[ $(dpkg-query -W -f='${db:Status-Status}' "$1" 2>/dev/null) == installed ]] ||
         dpkg-query -W -f='${db:Status-Status} ${Provides}\n' | grep -qE "^installed (.*, )?${1//+/\\+}( \(|,|\$)"
 }
 
-# Installs what scripts/packages.txt and the arguments name and the machine lacks. Needs root only then.
+# Installs the missing packages of scripts/packages.txt and of the arguments. Needs root only if some are missing.
 install_packages() {
     local wanted missing=() package
     mapfile -t wanted < <(grep -vE '^[[:space:]]*(#|$)' "$project_dir/scripts/packages.txt")
@@ -39,7 +39,7 @@ install_packages() {
         apt-get install --yes --no-install-recommends "${missing[@]}"
 }
 
-# Runs a command with its output in a log, which is shown only when the command fails.
+# Runs a command with its output in a log, which is shown only if the command fails.
 run_quietly() {
     local log=$1
     shift
@@ -55,7 +55,7 @@ build_preset() {
     shift
     mkdir -p "$build_dir"
     printf 'Building (%s) ...\n' "$preset"
-    # Presets are looked up in the current folder; the caller's paths refer to the caller's folder.
+    # CMake searches presets in the current folder; the caller's relative paths refer to the caller's folder.
     (
         cd "$project_dir"
         run_quietly "$build_dir/configure.log" cmake --preset "$preset" "$@"
@@ -90,15 +90,15 @@ read_ctest_arguments() {
     if [[ -n $option ]] && grep -qxFe "$option" <<<"$values"; then fail "$option needs a value" 2; fi
 }
 
-# Runs the tests of a preset with `ctest_arguments`, in an environment that the arguments make. Tests
-# that pass are not listed.
+# Runs the tests of a preset with `ctest_arguments`, in the environment that the arguments set up.
+# Tests that pass are not listed.
 run_tests() {
     local preset=$1 status=0
     shift
     echo "Testing ..."
     (
         cd "$project_dir"
-        # One virtual display for all tests if there is no real one.
+        # All tests share one virtual display if there is no real one.
         "$project_dir/tests/support/with-display" "$@" \
             ctest --preset "$preset" --parallel "$(nproc)" "${ctest_arguments[@]}" |
             { grep -vE '^ *Start +[0-9]+:|^ *[0-9]+/[0-9]+ Test .*   Passed +[0-9.]+ sec' || true; }
@@ -106,13 +106,13 @@ run_tests() {
     return $status
 }
 
-# A display, a GPU to draw with, and an OpenCL runtime that is not the CPU's.
+# Returns 0 if there are a display, a GPU that draws, and an OpenCL runtime other than the CPU's.
 has_display_and_gpu() {
     [[ -n ${DISPLAY:-}${WAYLAND_DISPLAY:-} ]] && compgen -G '/dev/dri/renderD*' >/dev/null &&
         compgen -G '/etc/OpenCL/vendors/*.icd' | grep -qv pocl
 }
 
-# The viewer, on what this machine has.
+# Runs the viewer, with glshare on a virtual display if the machine has no display or GPU.
 viewer() {
     local program=$project_dir/build/release/bin/vyra-viewer
     if has_display_and_gpu; then
