@@ -1,6 +1,6 @@
 #include "frames/Content.h"
 
-#include "viewer/Verification.h"
+#include "viewer/opencl/Verification.h"
 
 #include <stdexcept>
 #include <utility>

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "frames/CpuDeformation.h"
-#include "viewer/Model.h"
+#include "viewer/model/Model.h"
 
 #include <memory>
 #include <string>

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "evaluator/Geometry.h"
-#include "viewer/Scene.h"
+#include "viewer/render/Scene.h"
 
 #include <cstddef>
 #include <memory>

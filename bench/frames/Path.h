@@ -3,7 +3,7 @@
 
 #include "evaluator/Evaluator.h"
 #include "frames/CpuDeformation.h"
-#include "viewer/Scene.h"
+#include "viewer/render/Scene.h"
 
 #include <cstddef>
 #include <memory>

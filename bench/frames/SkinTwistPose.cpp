@@ -1,7 +1,7 @@
 #include "frames/SkinTwistPose.h"
 
 #include "evaluator/TwistDeformer.h"
-#include "viewer/Pose.h"
+#include "viewer/model/Pose.h"
 
 TwistPose twistPoseOf(const viewer::CharacterMesh& mesh)
 {

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "evaluator/Geometry.h"
-#include "viewer/Scene.h"
+#include "viewer/render/Scene.h"
 
 struct TwistPose {
     vyra::MatrixRows toTwist{}; // from the space after skinning

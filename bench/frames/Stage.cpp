@@ -2,8 +2,8 @@
 
 #include "harness/Timing.h"
 #include "runtime/TopenCLInfo.h"
-#include "viewer/DeformerChain.h"
-#include "viewer/Verification.h"
+#include "viewer/model/DeformerChain.h"
+#include "viewer/opencl/Verification.h"
 
 #include <algorithm>
 #include <climits>

@@ -5,7 +5,7 @@
 #include "frames/FrameReport.h"
 #include "frames/Stage.h"
 #include "harness/Report.h"
-#include "viewer/ModelImport.h"
+#include "viewer/model/import/ModelImport.h"
 
 #include <cstdio>
 #include <iostream>

@@ -5,11 +5,11 @@
 // a material for each mesh, triangles. Names, numbers, and the order of keys are arbitrary. The
 // numbers are small, and then all results must be finite, or any bit pattern.
 #include "Require.h"
-#include "viewer/CharacterSpace.h"
-#include "viewer/DetailLevel.h"
-#include "viewer/ModelImport.h"
-#include "viewer/Pose.h"
-#include "viewer/SceneRepair.h"
+#include "viewer/model/CharacterSpace.h"
+#include "viewer/model/DetailLevel.h"
+#include "viewer/model/Pose.h"
+#include "viewer/model/import/ModelImport.h"
+#include "viewer/model/import/SceneRepair.h"
 
 #include <algorithm>
 #include <bit>

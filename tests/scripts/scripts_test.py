@@ -41,7 +41,7 @@ class Scripts(unittest.TestCase):
         self.elsewhere.mkdir()
         project = self.root / "project"
         shutil.copytree(SOURCE / "scripts", project / "scripts")
-        for file in ("viewer/Options.cpp", "tests/support/with-display"):
+        for file in ("viewer/app/Options.cpp", "tests/support/with-display"):
             (project / file).parent.mkdir(parents=True)
             shutil.copy(SOURCE / file, project / file)
         self.stand_in(project / "build/release/bin/vyra-viewer", STAND_IN_VIEWER)
@@ -138,7 +138,7 @@ class Scripts(unittest.TestCase):
         self.assertEqual(tidied(), {"Options", "no_repository", "young"}, "no commit is old enough: all files")
         git("commit", "--amend", "-m", "old", date="2024-03-01T12:00:00Z")
         (project / "no_repository.cpp").unlink()
-        (project / "viewer/Options.cpp").unlink()
+        (project / "viewer/app/Options.cpp").unlink()
         commit("recent.cpp", date="2024-03-03T08:00:00Z")
         commit("head.cpp")
         self.assertEqual(tidied(), {"recent", "head"})

@@ -1,8 +1,8 @@
 // Command line, and small decisions: vendor, platform, figures, texts.
-#include "viewer/Options.h"
-#include "viewer/OverlayText.h"
-#include "viewer/Report.h"
-#include "viewer/StartFailure.h"
+#include "viewer/app/Options.h"
+#include "viewer/app/Report.h"
+#include "viewer/opencl/StartFailure.h"
+#include "viewer/overlay/OverlayText.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

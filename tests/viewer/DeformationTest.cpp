@@ -1,8 +1,8 @@
 // From the keys of an animation to matrices, the chain of deformers, and the comparison with the
 // CPU.
-#include "viewer/DeformerChain.h"
-#include "viewer/Pose.h"
-#include "viewer/Verification.h"
+#include "viewer/model/DeformerChain.h"
+#include "viewer/model/Pose.h"
+#include "viewer/opencl/Verification.h"
 
 #include <cmath>
 #include <limits>

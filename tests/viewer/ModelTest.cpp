@@ -1,10 +1,10 @@
 // From files to meshes, what is derived from a mesh, and the camera that frames it.
-#include "viewer/Camera.h"
-#include "viewer/CharacterSpace.h"
-#include "viewer/DetailLevel.h"
-#include "viewer/ImportProcess.h"
-#include "viewer/ModelImport.h"
-#include "viewer/ModelStream.h"
+#include "viewer/model/CharacterSpace.h"
+#include "viewer/model/DetailLevel.h"
+#include "viewer/model/import/ImportProcess.h"
+#include "viewer/model/import/ModelImport.h"
+#include "viewer/model/import/ModelStream.h"
+#include "viewer/render/Camera.h"
 
 #include <algorithm>
 #include <cmath>

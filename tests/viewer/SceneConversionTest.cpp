@@ -1,7 +1,7 @@
 // What the conversion of Assimp's scenes makes of numbers that a valid file may hold.
-#include "viewer/ModelImport.h"
+#include "viewer/model/import/ModelImport.h"
 
-#include "viewer/Pose.h"
+#include "viewer/model/Pose.h"
 
 #include <array>
 #include <cmath>

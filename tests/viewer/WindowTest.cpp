@@ -1,12 +1,12 @@
 // The playing window, driven by the events that a user causes and by kernels that change on the
 // disk meanwhile: every frame is right, and Escape ends it.
 #include "tests/support/KeepModulesLoaded.h"
-#include "viewer/Player.h"
+#include "viewer/app/Player.h"
 
 #include "runtime/TopenCLInfo.h"
-#include "viewer/LoadProgress.h"
-#include "viewer/Session.h"
-#include "viewer/ViewerWindow.h"
+#include "viewer/app/LoadProgress.h"
+#include "viewer/app/Session.h"
+#include "viewer/app/ViewerWindow.h"
 
 #include <filesystem>
 #include <functional>
