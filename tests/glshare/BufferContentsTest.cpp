@@ -79,7 +79,7 @@ TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndTheErrorsOfTheCaller)
     const auto bytes = static_cast<GLsizeiptr>(fCount * sizeof(cl_int));
     const std::function<void()> changes[] = {
         [] {}, [this] { refill(fBuffer, numbersFrom(2, 2 * fCount)); },
-        [this] { glMapBuffer(GL_ARRAY_BUFFER, GL_READ_ONLY); },
+        [] { glMapBuffer(GL_ARRAY_BUFFER, GL_READ_ONLY); },
         [bytes] {
             glUnmapBuffer(GL_ARRAY_BUFFER);
             glBufferStorage(GL_ARRAY_BUFFER, bytes, nullptr, 0);
