@@ -203,7 +203,7 @@ TEST_F(BufferTest, AReadBackChecksNeitherPermissionsNorCapacity)
     buffer.ensureBufferCapacity(8);
     buffer.openCLDataBuffer().descriptor().setPermissions(Descriptor::kReadOnly);
     // The checks of the runtime decide.
-    for (const std::size_t size : {8, 0})
+    for (const std::size_t size : {std::size_t{8}, std::size_t{0}})
         EXPECT_EQ(buffer.readBackDataFromGPU(queue(), CL_TRUE, 0, size, fBytes.data(), 0, nullptr),
                   0);
     for (const std::size_t offset : {std::size_t{4}, kLimit}) {

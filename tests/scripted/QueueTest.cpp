@@ -134,7 +134,7 @@ TEST_P(WorkGroupSize, OfTheKernelOr256AndItsSmallestMultiple)
     ASSERT_TRUE(start());
     const cl_kernel kernel = makeKernel();
     const std::size_t size = GetParam().expected;
-    for (const std::size_t groups : {1, 2, 16}) {
+    for (const std::size_t groups : {std::size_t{1}, std::size_t{2}, std::size_t{16}}) {
         for (const std::size_t count :
              {size * groups - size + 1, size * groups - 1, size * groups}) {
             std::size_t global = 1;
