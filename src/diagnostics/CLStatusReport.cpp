@@ -4,14 +4,32 @@
 #include "diagnostics/CLInternalWarning.h"
 #include "loader/OpenCLLoader.h"
 
-void reportFailure(cl_int status, CLReportStyle style)
+namespace {
+
+constinit thread_local cl_int sfReportedStatus = CL_SUCCESS;
+
+// Not inlined, to keep the path of a success short.
+[[gnu::noinline]] void report(cl_int status, CLReportStyle style)
 {
-    if (status == CL_SUCCESS)
-        return;
+    sfReportedStatus = status;
     if (style == CLReportStyle::kWithLineBreak)
         CLInternalWarning("OpenCL error: %s\n", CLErrorCodeStr(status));
     else
         CLInternalWarning("OpenCL error: %s", CLErrorCodeStr(status));
+    sfReportedStatus = CL_SUCCESS;
+}
+
+} // namespace
+
+cl_int reportedStatus() noexcept
+{
+    return sfReportedStatus;
+}
+
+void reportFailure(cl_int status, CLReportStyle style)
+{
+    if (status != CL_SUCCESS)
+        report(status, style);
 }
 
 bool checkStatus(cl_int status, CLReportStyle style)

@@ -8,6 +8,7 @@
 #include "runtime/DriverVersion.h"
 #include "runtime/InteropFunctions.h"
 #include "runtime/PlatformSelection.h"
+#include "runtime/StartUpStep.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
@@ -146,12 +147,14 @@ ContextProperties d3d11ContextProperties(void* d3dDevice, cl_platform_id platfor
 bool chooseDevice(bool usingDX, void* graphicsContext, cl_platform_id platform,
                   const ContextProperties& properties, cl_device_id& device)
 {
+    enterStartUpStep(StartUpStep::kDevice);
     return usingDX ? chooseDeviceForD3D11(graphicsContext, platform, device)
                    : chooseDeviceForOpenGL(properties, device);
 }
 
 bool reportDevice(cl_device_id device)
 {
+    enterStartUpStep(StartUpStep::kAvailability);
     InfoText name{};
     if (!readDeviceInfo(device, CL_DEVICE_NAME, name))
         return false;
@@ -175,6 +178,7 @@ bool reportDevice(cl_device_id device)
 
 bool TopenCLInfo::decideAsyncReadback()
 {
+    enterStartUpStep(StartUpStep::kDriver);
     if (fProvider == kNVIDIAProvider)
         return judgeNVIDIADriver();
     fSupportsAsyncReadback = fProvider == kIntelProvider || fProvider == kAMDProvider;
@@ -209,6 +213,7 @@ bool TopenCLInfo::judgeNVIDIADriver()
 
 bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
 {
+    enterStartUpStep(StartUpStep::kDoublePrecision);
     InfoText version{};
     if (!checkStatus(ocl.clGetPlatformInfo(platform, CL_PLATFORM_VERSION, sizeof version,
                                            version.data(), nullptr),

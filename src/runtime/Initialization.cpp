@@ -6,6 +6,7 @@
 #include "loader/OpenCLLoader.h"
 #include "runtime/DeviceSelection.h"
 #include "runtime/PlatformSelection.h"
+#include "runtime/StartUpStep.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <cstdio>
@@ -17,6 +18,7 @@ namespace {
 
 bool disabledByUser()
 {
+    enterStartUpStep(StartUpStep::kSwitch);
     if (!std::getenv("VYRA_DISABLE_OPENCL"))
         return false;
     std::fprintf(stderr, "OpenCL initialization has been disabled by user\n");
@@ -25,6 +27,7 @@ bool disabledByUser()
 
 bool loadRuntime()
 {
+    enterStartUpStep(StartUpStep::kLoader);
     try {
         if (loadOpenCL() == OpenCLLoadStatus::kLoaded)
             return true;
@@ -71,6 +74,7 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
     if (disabledByUser() || !loadRuntime())
         return;
 
+    enterStartUpStep(StartUpStep::kVendor);
     const std::optional<Tstring> vendor = chooseVendor(vendorId);
     if (!vendor)
         return;
@@ -96,8 +100,12 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
         return;
     finalizeExtensionFunctions();
 
-    if (!reportDevice(fDevice) || !decideDoublePrecision(platform) || !fContext)
+    if (!reportDevice(fDevice) || !decideDoublePrecision(platform))
         return;
+    if (!fContext) { // created without an error, and null all the same
+        enterStartUpStep(StartUpStep::kContext);
+        return;
+    }
     createQueuesAndKernelStore();
     std::fprintf(stderr, "\n");
     if (!readComputeUnitCount())
@@ -107,6 +115,7 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
 
 bool TopenCLInfo::createContext(const cl_context_properties* properties)
 {
+    enterStartUpStep(StartUpStep::kContext);
     cl_int status = CL_SUCCESS;
     fContext = ocl.clCreateContext(properties, 1, &fDevice, contextErrorCallback, nullptr, &status);
     return checkStatus(status, CLReportStyle::kWithLineBreak);
@@ -114,6 +123,7 @@ bool TopenCLInfo::createContext(const cl_context_properties* properties)
 
 void TopenCLInfo::createQueuesAndKernelStore()
 {
+    enterStartUpStep(StartUpStep::kQueue);
     fCommandQueue = createOpenCLCommandQueue(&fUsingOutOfOrderExecution);
     fSecondaryCommandQueue = createOpenCLCommandQueue(&fUsingOutOfOrderExecution);
     fKernelStore = new TopenCLKernelStore;

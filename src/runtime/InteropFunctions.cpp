@@ -3,6 +3,7 @@
 
 #include "host/Environment.h"
 #include "host/GLFunctionTable.h"
+#include "runtime/StartUpStep.h"
 #include "runtime/SyncModes.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -77,6 +78,7 @@ bool listsExtension(const Tstring& extensions, const char* name)
 
 bool TopenCLInfo::setupDirectXExtensionFunctions(Tstring* extensions)
 {
+    enterStartUpStep(StartUpStep::kD3D11Sharing);
     if (!fUsingDX)
         return true;
     // Both extensions order Direct3D and OpenCL themselves; no variable changes that.
@@ -107,6 +109,7 @@ bool TopenCLInfo::setupDirectXExtensionFunctions(Tstring* extensions)
 
 bool TopenCLInfo::setupExtensionFunctions(Tstring* extensions)
 {
+    enterStartUpStep(StartUpStep::kSharingFunctions);
     if (fUsingDX)
         return true;
     const SyncModeVariables variables = readSyncModeVariables();

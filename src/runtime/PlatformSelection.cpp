@@ -3,6 +3,7 @@
 
 #include "diagnostics/CLStatusReport.h"
 #include "loader/OpenCLLoader.h"
+#include "runtime/StartUpStep.h"
 #include "runtime/TopenCLInfo.h"
 
 #include <algorithm>
@@ -107,6 +108,7 @@ Tstring platformText(const std::vector<char>& value)
 bool TopenCLInfo::findPlatformByVendor(const Tstring& vendor, cl_platform_id& platform,
                                        Tstring& extensions)
 {
+    enterStartUpStep(StartUpStep::kPlatform);
     cl_uint count = 0;
     if (ocl.clGetPlatformIDs(0, nullptr, &count) != CL_SUCCESS || count == 0)
         return false;
