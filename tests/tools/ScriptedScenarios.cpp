@@ -1,4 +1,4 @@
-// Gives the scripted runtime its world when it is loaded (INFO_WORLD names it).
+// Describes the scenario named by INFO_SCENARIO to the scripted runtime when it is loaded.
 #include "fake/FakeRuntime.h"
 
 #include <cstdlib>
@@ -9,11 +9,11 @@ namespace {
 
 using scripted::World;
 
-struct Change {
-    void (*world)(World& world);
+struct Scenario {
+    void (*describe)(World& world);
     const char* failing = nullptr; // the function that fails
     cl_int status = CL_SUCCESS;
-    unsigned nth = 1; // the first call that fails, all later ones do, too
+    unsigned nth = 1; // the first call that fails; all later ones fail as well
 };
 
 void nothing(World&) {}
@@ -24,7 +24,7 @@ void makeNVIDIA(World& world, const char* driver)
     world.platforms[0].devices[0].driverVersion = driver;
 }
 
-const std::map<std::string_view, Change> kChanges = {
+const std::map<std::string_view, Scenario> kScenarios = {
     {"ordinary", {nothing}},
     {"no-platform", {[](World& world) { world.platforms.clear(); }}},
     {"two-platforms", {[](World& world) { world.platforms.resize(2); }}},
@@ -46,15 +46,15 @@ const std::map<std::string_view, Change> kChanges = {
 };
 
 const bool kDescribed = [] {
-    const char* name = std::getenv("INFO_WORLD");
-    const Change& change = kChanges.at(name ? name : ""); // throws: it would test nothing
+    const char* name = std::getenv("INFO_SCENARIO");
+    const Scenario& scenario = kScenarios.at(name ? name : ""); // throws for an unknown name
     World world;
-    change.world(world);
+    scenario.describe(world);
     scripted::runtime().describe(world);
-    if (change.failing)
-        scripted::runtime().plan({.function = change.failing,
-                                  .status = change.status,
-                                  .nth = change.nth,
+    if (scenario.failing)
+        scripted::runtime().plan({.function = scenario.failing,
+                                  .status = scenario.status,
+                                  .nth = scenario.nth,
                                   .onwards = true});
     return true;
 }();

@@ -1,4 +1,4 @@
-// What people type, and statuses and pages as they read them.
+// Options, texts of the reports, and the capture of output and warnings.
 #include "tools/info/Options.h"
 #include "tools/info/diagnostics/CapturedOutput.h"
 #include "tools/info/diagnostics/WarningLog.h"
@@ -6,6 +6,7 @@
 #include "tools/info/text/StatusCodes.h"
 
 #include "diagnostics/CLInternalWarning.h"
+#include "diagnostics/CLStatusReport.h"
 #include "diagnostics/CLWarningSink.h"
 
 #include <algorithm>
@@ -18,45 +19,31 @@
 
 namespace {
 
-TEST(Options, AreReadInBothForms)
+TEST(Options, ParseOptionsAcceptsBothFormsOfValues)
 {
     std::string problem;
     const auto options = info::parseOptions(
-        {"--platform=Some Vendor", "--device-vendor", "0X10DE", "--json"}, problem);
+        {"info", "--platform=Some Vendor", "--device-vendor", "0X10DE", "--json"}, problem);
     ASSERT_TRUE(options) << problem;
     EXPECT_EQ(options->platform, "Some Vendor");
     EXPECT_EQ(options->deviceVendor, 0x10DEU);
     EXPECT_TRUE(options->json);
-    EXPECT_EQ(info::parseOptions({"--device-vendor=0123"}, problem)->deviceVendor, 123U);
+    EXPECT_EQ(info::parseOptions({"info", "--device-vendor=0123"}, problem)->deviceVendor, 123U);
 }
 
-TEST(Options, WrongOnesAreRefusedWithAReason)
+TEST(Options, ParseOptionsRejectsWrongArgumentsWithReason)
 {
     for (const char* wrong :
          {"--platform", "--platform=", "--device-vendor", "--device-vendor=10de",
           "--device-vendor=", "--device-vendor=0x", "--device-vendor=-1",
           "--device-vendor=99999999999", "--json=1", "report", "--verbose"}) {
         std::string problem;
-        EXPECT_FALSE(info::parseOptions({"--json", wrong}, problem)) << wrong;
+        EXPECT_FALSE(info::parseOptions({"info", "--json", wrong}, problem)) << wrong;
         EXPECT_FALSE(problem.empty()) << wrong;
     }
 }
 
-TEST(Statuses, AreReadBackFromWarnings)
-{
-    const std::pair<const char*, std::optional<int>> rows[] = {
-        {"OpenCL error: CL_OUT_OF_RESOURCES\n", -5},
-        {"OpenCL error: CL_D3D11_RESOURCE_NOT_ACQUIRED", -1009},
-        {"OpenCL error: -9999\n", -9999},
-        {"OpenCL error: -1001", -1001},
-        {"OpenCL error: no name", std::nullopt},
-        {"a build log of CL_OUT_OF_RESOURCES", std::nullopt},
-    };
-    for (const auto& [warning, status] : rows)
-        EXPECT_EQ(info::statusInWarning(warning), status) << warning;
-}
-
-TEST(Statuses, ShowNumberAndName)
+TEST(StatusCodes, DescribeStatusReturnsNameNumberAndMeaning)
 {
     EXPECT_THAT(info::describeStatus(-1001),
                 testing::StartsWith("CL_PLATFORM_NOT_FOUND_KHR (-1001): "));
@@ -64,23 +51,23 @@ TEST(Statuses, ShowNumberAndName)
     EXPECT_EQ(info::describeStatus(-62), "CL_INVALID_MIP_LEVEL (-62)");
 }
 
-TEST(Sheet, BreaksLongValuesBetweenWords)
+TEST(ReportWriter, LongValueIsWrappedBetweenWords)
 {
-    info::Sheet sheet;
+    info::ReportWriter writer;
     std::string words;
     for (int i = 0; i < 60; ++i)
         words += "word ";
-    sheet.row("Label", words);
-    sheet.row("Empty", "");
-    std::istringstream lines(sheet.text());
+    writer.row("Label", words);
+    writer.row("Empty", "");
+    std::istringstream lines(writer.text());
     for (std::string line; std::getline(lines, line);)
         EXPECT_LE(line.size(), 110U);
-    std::istringstream read(sheet.text());
+    std::istringstream read(writer.text());
     EXPECT_EQ(std::count(std::istream_iterator<std::string>(read), {}, "word"), 60);
-    EXPECT_TRUE(sheet.text().ends_with("\n  Empty\n"));
+    EXPECT_TRUE(writer.text().ends_with("\n  Empty\n"));
 }
 
-TEST(CapturedOutput, KeepsTheOrderOfBothStreamsAndPutsThemBack)
+TEST(CapturedOutput, FinishReturnsBothStreamsInOrderAndRestoresThem)
 {
     info::CapturedOutput outer;
     {
@@ -96,15 +83,22 @@ TEST(CapturedOutput, KeepsTheOrderOfBothStreamsAndPutsThemBack)
     EXPECT_EQ(outer.finish(), "back");
 }
 
-TEST(WarningLog, KeepsTextsWithoutLineBreaksAndRestoresTheSinkBefore)
+TEST(WarningLog, TakeReturnsTextsAndStatusesAndDestructionRestoresSink)
 {
     const CLWarningSink before = [](const char*) {};
     setCLWarningSink(before);
     {
         info::WarningLog log;
-        CLInternalWarning("one\n");
+        enterStartUpStep(StartUpStep::kContext);
+        reportFailure(-9999, CLReportStyle::kWithLineBreak);
         CLInternalWarning("two");
-        EXPECT_EQ(log.take(), (std::vector<std::string>{"one", "two"}));
+        const std::vector<info::Warning> warnings = log.take();
+        ASSERT_EQ(warnings.size(), 2U);
+        EXPECT_EQ(warnings[0].text, "OpenCL error: -9999");
+        EXPECT_EQ(warnings[0].status, -9999);
+        EXPECT_EQ(warnings[0].step, StartUpStep::kContext);
+        EXPECT_EQ(warnings[1].text, "two");
+        EXPECT_EQ(warnings[1].status, CL_SUCCESS);
         EXPECT_TRUE(log.take().empty());
     }
     EXPECT_EQ(setCLWarningSink(nullptr), before);

@@ -1,6 +1,6 @@
-"""vyra-opencl-info in worlds of all kinds: what it answers, and that its JSON keeps to its description.
+"""Runs vyra-opencl-info in many scenarios, and checks its exit code and its JSON.
 
-The environment variables TEST_... name the program, its schema, and what a world is made of.
+The environment variables TEST_... name the program, its schema, and the parts of the scenarios.
 """
 import json
 import os
@@ -10,7 +10,7 @@ import unittest
 import jsonschema
 
 PROGRAM = os.environ["TEST_PROGRAM"]
-OTHER_OPENCL = os.environ["TEST_OTHER_OPENCL"]  # folders with OpenCL libraries that cannot be used
+OTHER_OPENCL = os.environ["TEST_OTHER_OPENCL"]  # directories with unusable OpenCL libraries
 NO_GRAPHICS = 4
 POCL = "The pocl project"
 LAYER = {"OPENCL_LAYERS": os.environ["TEST_LAYER"]}
@@ -20,7 +20,7 @@ ABSENT = object()
 
 
 class Part(str):
-    """Equal to every text that it is a part of."""
+    """Equals every text that contains it."""
 
     __hash__ = str.__hash__
 
@@ -28,8 +28,8 @@ class Part(str):
         return isinstance(text, str) and str(self) in text
 
 
-# What is set (None: removed) and the options; the exit code; values in the JSON, by path.
-ON_THIS_MACHINE = {
+# Variables to set (None: to remove), options, exit code, values in the JSON by path.
+REAL = {
     "a working machine": (LAYER | {"VYRA_OPENCL_PLATFORM": POCL}, [], 0, {
         "stop": None, "selfTest.passed": True, "selfTest.evaluations": 30, "platforms.0.accepted": True,
         "platforms.0.devices.0.accepted": True, "variables.1.effect": "changed"}),
@@ -70,7 +70,7 @@ ON_THIS_MACHINE = {
         "summary": "OpenCL is off: this machine has no OpenCL platform.", "stop.step": "platform",
         "stop.reason": Part("This machine has no OpenCL platform: the loader found no driver."),
         "stop.remedy": Part("Install")}),
-    "names are written in other ways": (
+    "names are misspelt": (
         {"vyra_disable_opencl": "1", "GLSHARE_ZERO_COPIES": "1"}, ["--platform=" + POCL], 1, {
             "variables.0.name": "GLSHARE_ZERO_COPIES", "variables.0.suggestion": "GLSHARE_ZERO_COPY",
             "variables.2.effect": "unknown", "variables.2.suggestion": "VYRA_DISABLE_OPENCL"}),
@@ -86,9 +86,9 @@ ON_THIS_MACHINE = {
     "the display does not exist": ({"DISPLAY": ":4711", "QT_QPA_PLATFORM": "xcb"}, [], NO_GRAPHICS, {
         "stop.step": "renderer", "stop.reason": Part("could not connect to display")}),
 }
-# The same in scripted worlds, which are named first; the platform is Intel's unless the world says otherwise.
+# The same for scripted scenarios, by name; the platform is Intel's except in the scenarios of NVIDIA.
 SCRIPTED = [
-    # Its kernels do nothing.
+    # Kernels of the scripted runtime do nothing.
     ("ordinary", {}, INTEL, 3, {
         "on": True, "selfTest.milliseconds": None,
         "selfTest.problem": "60000 of 60000 numbers in OpenGL's memory are wrong in evaluation 1"}),
@@ -99,7 +99,7 @@ SCRIPTED = [
     ("two-platforms", {}, INTEL, 3, {
         "platforms.0.accepted": True,
         "platforms.1.rejection": "another platform of the same vendor comes first"}),
-    ("cpu", {}, INTEL, 1, {"stop.step": "device", "stop.reason": Part("no GPUs: Scripted GPU (CPU)")}),
+    ("cpu", {}, INTEL, 1, {"stop.step": "device", "stop.reason": Part("not GPUs: Scripted GPU (CPU)")}),
     ("context-unknown", {}, INTEL, 1, {
         "stop.step": "device", "stop.status.code": -1000,
         "stop.reason": Part("CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR (-1000)")}),
@@ -114,17 +114,17 @@ SCRIPTED = [
     ("old-driver", {}, NVIDIA, 3, {
         "decisions.3.value": "no", "decisions.8.id": "opencl-to-graphics",
         "decisions.8.value": "event query (2)"}),
-    # With a status of no header.
+    # A status that no header names.
     ("no-context", {}, NVIDIA, 1, {
         "stop.step": "context", "stop.status.code": -9999, "stop.status.name": None,
         "stop.reason": Part("-9999"), "startUp.warnings.0.status.code": -9999}),
-    # Questions to the device fail, which stops start-up without a message.
+    # Queries of the device fail, which stops start-up without a message.
     ("no-driver-version", {}, NVIDIA, 1, {
         "stop.step": "driver", "stop.reason": Part("CL_INVALID_VALUE (-30)"), "stop.remedy": Part("update it")}),
     ("no-device-type", {}, INTEL, 1, {
-        "stop.step": "availability", "stop.status.code": -30, "stop.reason": Part("does not answer")}),
+        "stop.step": "availability", "stop.status.code": -30, "stop.reason": Part("A query of the device failed")}),
     ("no-float-config", {}, INTEL, 1, {
-        "stop.step": "double-precision", "stop.status.code": -30, "stop.reason": Part("does not tell")}),
+        "stop.step": "double-precision", "stop.status.code": -30, "stop.reason": Part("query for the device's double precision")}),
     ("no-acquire", {}, INTEL, 1, {
         "stop.step": "sharing-functions", "stop.reason": Part("clEnqueueAcquireGLObjects"),
         "loader.missingSharing.0": "clEnqueueAcquireGLObjects"}),
@@ -134,7 +134,7 @@ SCRIPTED = [
         "stop.step": "double-precision", "variables.0.effect": "changed"}),
     # A forced mode is overridden.
     ("no-gl-event", {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE": "1"}, INTEL, 3, {
-        "variables.0.effect": "none", "variables.0.explanation": Part("lacks the means"),
+        "variables.0.effect": "none", "variables.0.explanation": Part("does not support"),
         "decisions.8.value": "event query (2)"}),
     ("no-queue", {}, INTEL, 1, {
         "stop.step": "queue", "stop.status.name": "CL_INVALID_QUEUE_PROPERTIES"}),
@@ -142,19 +142,19 @@ SCRIPTED = [
 
 
 def run_info(environment, options):
-    """Runs the program without the variables of outside that steer the library or its OpenCL."""
-    steering = ("VYRA_", "GLSHARE_", "OPENCL_LAYERS")
-    variables = {name: value for name, value in os.environ.items() if not name.startswith(steering)} | environment
+    """Runs the program without inherited variables that affect the library or its OpenCL."""
+    affecting = ("VYRA_", "GLSHARE_", "OPENCL_LAYERS")
+    variables = {name: value for name, value in os.environ.items() if not name.startswith(affecting)} | environment
     variables = {name: value for name, value in variables.items() if value is not None}
     return subprocess.run([PROGRAM, *options], env=variables, capture_output=True, text=True, check=False)
 
 
-def scripted(world):
-    return {"LD_LIBRARY_PATH": os.environ["TEST_WORLDS"], "INFO_WORLD": world}
+def scripted(scenario):
+    return {"LD_LIBRARY_PATH": os.environ["TEST_SCENARIOS"], "INFO_SCENARIO": scenario}
 
 
 def at(path, value):
-    """The value at a path such as "platforms.0.vendor"."""
+    """Returns the value at a path such as "platforms.0.vendor"."""
     for part in path.split("."):
         try:
             value = value[int(part)] if isinstance(value, list) else value[part]
@@ -164,7 +164,7 @@ def at(path, value):
 
 
 def closed(schema):
-    """The schema, refusing what it does not describe: nothing goes undocumented."""
+    """Returns the schema, changed to reject members that it does not describe."""
     if isinstance(schema, list):
         return [closed(part) for part in schema]
     if not isinstance(schema, dict):
@@ -184,39 +184,45 @@ class Info(unittest.TestCase):
         with open(os.environ["TEST_SCHEMA"], encoding="utf-8") as file:
             cls.schema = jsonschema.Draft202012Validator(closed(json.load(file)))
 
-    def explain(self, environment, options, exit_code, expected):
+    def check(self, environment, options, exit_code, expected):
         run = run_info(environment, [*options, "--json"])
-        facts = json.loads(run.stdout)
+        report = json.loads(run.stdout)
         if run.returncode == NO_GRAPHICS != exit_code:
-            self.skipTest("no OpenGL: " + at("renderer.problem", facts))
-        self.assertEqual((run.returncode, facts["exitCode"], run.stderr), (exit_code, exit_code, ""), run.stdout)
-        self.assertEqual([], [f"{error.json_path}: {error.message}" for error in self.schema.iter_errors(facts)])
-        times = at("selfTest.milliseconds", facts)
+            self.skipTest("no OpenGL: " + at("renderer.problem", report))
+        self.assertEqual((run.returncode, report["exitCode"], run.stderr), (exit_code, exit_code, ""), run.stdout)
+        self.assertEqual([], [f"{error.json_path}: {error.message}" for error in self.schema.iter_errors(report)])
+        times = at("selfTest.milliseconds", report)
         for milliseconds in times.values() if isinstance(times, dict) else ():
             self.assertGreater(milliseconds, 0)
         for path, value in expected.items():
-            self.assertEqual(value, at(path, facts), path)
+            self.assertEqual(value, at(path, report), path)
 
-    def test_this_machines_opencl_is_explained(self):
-        for name, row in ON_THIS_MACHINE.items():
+    def test_real_opencl_matches_expected_report(self):
+        for name, row in REAL.items():
             with self.subTest(name):
-                self.explain(*row)
+                self.check(*row)
 
-    def test_scripted_worlds_are_explained(self):
-        for world, environment, *rest in SCRIPTED:
-            with self.subTest(world, **environment):
-                self.explain(scripted(world) | environment, *rest)
+    def test_scripted_scenario_matches_expected_report(self):
+        for scenario, environment, *rest in SCRIPTED:
+            with self.subTest(scenario, **environment):
+                self.check(scripted(scenario) | environment, *rest)
 
-    def test_the_same_is_told_twice(self):
-        """Nothing is changed on the machine, and nothing depends on chance; no times are told here."""
+    def test_second_run_prints_same_report(self):
+        """A run leaves no state behind. This scenario reports no times."""
         first, second = (run_info(scripted("ordinary"), [*INTEL, "--json"]).stdout for _ in range(2))
         self.assertEqual(first, second)
         self.assertTrue(first)
 
-    def test_wrong_options_get_a_sentence(self):
+    def test_help_lists_options_and_returns_0(self):
+        run = run_info({}, ["--help"])
+        self.assertEqual((run.returncode, run.stderr), (0, ""))
+        for option in ("--platform", "--device-vendor", "--json", "--version", "--help"):
+            self.assertIn(option, run.stdout)
+
+    def test_wrong_option_prints_error_and_returns_2(self):
         run = run_info({}, ["--jsn"])
-        said = "vyra-opencl-info: there is no option '--jsn'; see vyra-opencl-info --help\n"
-        self.assertEqual((run.returncode, run.stdout, run.stderr), (2, "", said))
+        error = "vyra-opencl-info: there is no option '--jsn'; see vyra-opencl-info --help\n"
+        self.assertEqual((run.returncode, run.stdout, run.stderr), (2, "", error))
 
 
 if __name__ == "__main__":

@@ -5,32 +5,46 @@
 #include <charconv>
 #include <string_view>
 
+#include <QCommandLineParser>
+
 namespace info {
 namespace {
 
-constexpr char kHelp[] =
-    R"(Usage: vyra-opencl-info [OPTION...]
-
-Tells whether the library's OpenCL is on, and why: what it finds on this machine, what it decides
-and which environment variables had a say. A self-test deforms one shared buffer and checks it in
-OpenGL's memory. Nothing is shown on the screen, and nothing on the machine is changed.
-
-  --platform NAME     use the OpenCL platform of this vendor, as VYRA_OPENCL_PLATFORM does
-  --device-vendor ID  the PCI vendor id of the GPU that draws, such as 0x10de; by default it
-                      follows from OpenGL's own texts
-  --json              print one JSON object, described by info.schema.json
-  --version           print the version
-  --help              print this text
+constexpr char kDescription[] =
+    R"(Reports whether the library's OpenCL is on, and why: the OpenCL of this machine, the decisions
+of start-up, and the environment variables that affect them. A self-test deforms one shared buffer
+and checks the result in OpenGL's memory. Nothing is shown on the screen, and nothing on the machine
+is changed.
 
 Exit codes:
-  0  OpenCL is on and the self-test is right
-  1  OpenCL is off; the report says why and what helps
+  0  OpenCL is on and the self-test passed
+  1  OpenCL is off; the report gives the reason and a remedy
   2  wrong options
   3  OpenCL is on and the self-test failed
-  4  no display, or no OpenGL on it
-)";
+  4  no display, or no OpenGL on it)";
 
-// Decimal, or hexadecimal behind "0x".
+constexpr char kPlatform[] = "platform";
+constexpr char kDeviceVendor[] = "device-vendor";
+constexpr char kJson[] = "json";
+constexpr char kVersion[] = "version";
+constexpr char kHelp[] = "help";
+
+void addOptions(QCommandLineParser& parser)
+{
+    parser.setApplicationDescription(kDescription);
+    parser.addOptions({
+        {kPlatform, "Use the OpenCL platform of this vendor, like VYRA_OPENCL_PLATFORM.", "NAME"},
+        {kDeviceVendor,
+         "PCI vendor id of the GPU that draws, such as 0x10de. By default it is derived from "
+         "OpenGL's texts.",
+         "ID"},
+        {kJson, "Print one JSON object, described by info.schema.json."},
+        {kVersion, "Print the version."},
+        {{"h", kHelp}, "Print this text."},
+    });
+}
+
+// Parses a decimal number, or a hexadecimal one after "0x".
 std::optional<unsigned> parseId(std::string_view text)
 {
     int base = 10;
@@ -44,91 +58,48 @@ std::optional<unsigned> parseId(std::string_view text)
     return error == std::errc() && parsed == end ? std::optional<unsigned>(value) : std::nullopt;
 }
 
-// Reads the arguments from first to last and stops at the first problem.
-class Reader {
-public:
-    Reader(const std::vector<std::string>& arguments, std::string& problem)
-        : fArguments(arguments), fProblem(problem)
-    {
-    }
-
-    std::optional<Options> read()
-    {
-        while (fNext < fArguments.size()) {
-            if (!readOne(fArguments[fNext++]))
-                return std::nullopt;
-        }
-        return fOptions;
-    }
-
-private:
-    bool readOne(const std::string& argument)
-    {
-        const std::size_t equals = argument.find('=');
-        const std::string name = argument.substr(0, equals);
-        if (name == "--platform")
-            return readPlatform(name, argument, equals);
-        if (name == "--device-vendor")
-            return readDeviceVendor(name, argument, equals);
-        if (argument == "--json")
-            return fOptions.json = true;
-        if (argument == "--help" || argument == "-h")
-            return fOptions.help = true;
-        if (argument == "--version")
-            return fOptions.version = true;
-        fProblem = "there is no option " + quoted(argument);
-        return false;
-    }
-
-    // The text behind "=", or the next argument.
-    std::optional<std::string> value(const std::string& name, const std::string& argument,
-                                     std::size_t equals)
-    {
-        if (equals != std::string::npos)
-            return argument.substr(equals + 1);
-        if (fNext < fArguments.size())
-            return fArguments[fNext++];
-        fProblem = name + " needs a value";
-        return std::nullopt;
-    }
-
-    bool readPlatform(const std::string& name, const std::string& argument, std::size_t equals)
-    {
-        fOptions.platform = value(name, argument, equals);
-        if (fOptions.platform && fOptions.platform->empty()) {
-            fProblem = name + " takes a value that is not empty";
-            return false;
-        }
-        return fOptions.platform.has_value();
-    }
-
-    bool readDeviceVendor(const std::string& name, const std::string& argument, std::size_t equals)
-    {
-        const std::optional<std::string> text = value(name, argument, equals);
-        if (!text)
-            return false;
-        fOptions.deviceVendor = parseId(*text);
-        if (!fOptions.deviceVendor)
-            fProblem = name + " takes a number such as 0x10de, not " + quoted(*text);
-        return fOptions.deviceVendor.has_value();
-    }
-
-    const std::vector<std::string>& fArguments;
-    std::string& fProblem;
-    std::size_t fNext = 0;
-    Options fOptions;
-};
+// Returns the reason why parsing failed. Empty if it succeeded and there are only options.
+std::string problemOf(const QCommandLineParser& parser)
+{
+    const QStringList unknown = parser.unknownOptionNames();
+    if (!unknown.isEmpty())
+        return "there is no option " + quoted("--" + unknown.first().toStdString());
+    if (!parser.positionalArguments().isEmpty())
+        return "unexpected argument " + quoted(parser.positionalArguments().first().toStdString());
+    return parser.errorText().toStdString();
+}
 
 } // namespace
 
-std::optional<Options> parseOptions(const std::vector<std::string>& arguments, std::string& problem)
+std::optional<Options> parseOptions(const QStringList& arguments, std::string& problem)
 {
-    return Reader(arguments, problem).read();
+    QCommandLineParser parser;
+    parser.setSingleDashWordOptionMode(QCommandLineParser::ParseAsLongOptions);
+    addOptions(parser);
+    parser.parse(arguments);
+    problem = problemOf(parser);
+    Options options{.help = parser.isSet(kHelp),
+                    .version = parser.isSet(kVersion),
+                    .json = parser.isSet(kJson)};
+    if (problem.empty() && parser.isSet(kPlatform)) {
+        options.platform = parser.value(kPlatform).toStdString();
+        if (options.platform->empty())
+            problem = "--platform requires a value that is not empty";
+    }
+    if (problem.empty() && parser.isSet(kDeviceVendor)) {
+        const std::string id = parser.value(kDeviceVendor).toStdString();
+        options.deviceVendor = parseId(id);
+        if (!options.deviceVendor)
+            problem = "--device-vendor requires a number such as 0x10de, not " + quoted(id);
+    }
+    return problem.empty() ? std::optional<Options>(options) : std::nullopt;
 }
 
-const char* helpText()
+std::string helpText()
 {
-    return kHelp;
+    QCommandLineParser parser;
+    addOptions(parser);
+    return parser.helpText().toStdString();
 }
 
 } // namespace info

@@ -3,7 +3,8 @@
 
 #include <optional>
 #include <string>
-#include <vector>
+
+#include <QStringList>
 
 namespace info {
 
@@ -15,12 +16,12 @@ struct Options {
     std::optional<unsigned> deviceVendor; // PCI vendor id
 };
 
-// `arguments` are those behind the program's name. Empty when they are wrong; `problem` then says
-// how, in one sentence.
-std::optional<Options> parseOptions(const std::vector<std::string>& arguments,
-                                    std::string& problem);
+// Parses `arguments`, which begin with the program's name. Empty if they are wrong; `problem` then
+// receives the reason.
+[[nodiscard]] std::optional<Options> parseOptions(const QStringList& arguments,
+                                                  std::string& problem);
 
-// The text of --help.
-const char* helpText();
+// Returns the text of --help. Requires an application object.
+[[nodiscard]] std::string helpText();
 
 } // namespace info

@@ -1,38 +1,54 @@
-// vyra-opencl-info: tells whether the library's OpenCL is on, and why.
+// vyra-opencl-info: reports whether the library's OpenCL is on, and why.
 #include "tools/info/Options.h"
 #include "tools/info/diagnostics/DiagnosticsCollection.h"
+#include "tools/info/diagnostics/RenderWindow.h"
+#include "tools/info/diagnostics/WarningLog.h"
 #include "tools/info/report/JsonReport.h"
 #include "tools/info/report/TextReport.h"
+#include "tools/info/selftest/SelfTestRun.h"
 
 #include <cstdio>
 
+#include <QCoreApplication>
+
 namespace {
 
-int answer(info::ExitCode code)
+info::Diagnostics examineMachine(const info::Options& options)
 {
-    return static_cast<int>(code);
+    info::WarningLog warnings;
+    info::RenderWindow window;
+    info::Diagnostics diagnostics = info::collectDiagnostics(options, window, warnings);
+    if (diagnostics.startUp.valid)
+        diagnostics.selfTest = info::runSelfTest(window, warnings);
+    return diagnostics;
 }
 
 } // namespace
 
 int main(int argc, char* argv[])
 {
+    QStringList arguments;
+    for (int i = 0; i < argc; ++i)
+        arguments.append(QString::fromLocal8Bit(argv[i]));
     std::string problem;
-    const std::optional<info::Options> options =
-        info::parseOptions(std::vector<std::string>(argv + 1, argv + argc), problem);
+    const std::optional<info::Options> options = info::parseOptions(arguments, problem);
     if (!options) {
         std::fprintf(stderr, "vyra-opencl-info: %s; see vyra-opencl-info --help\n",
                      problem.c_str());
-        return answer(info::ExitCode::kUsage);
+        return static_cast<int>(info::ExitCode::kUsage);
     }
-    if (options->help || options->version) {
-        std::fputs(options->help ? info::helpText() : "vyra-opencl-info " VYRA_VERSION "\n",
-                   stdout);
-        return answer(info::ExitCode::kOn);
+    if (options->version) {
+        std::puts("vyra-opencl-info " VYRA_VERSION);
+        return 0;
     }
-    const info::Explanation explanation = info::explain(info::gatherFacts(*options));
+    if (options->help) {
+        const QCoreApplication application(argc, argv);
+        std::fputs(info::helpText().c_str(), stdout);
+        return 0;
+    }
+    const info::Explanation explanation = info::explain(examineMachine(*options));
     const std::string report =
         options->json ? info::jsonReport(explanation) : info::textReport(explanation);
     std::fputs(report.c_str(), stdout);
-    return answer(explanation.exitCode);
+    return static_cast<int>(explanation.exitCode);
 }

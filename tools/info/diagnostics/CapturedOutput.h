@@ -1,4 +1,4 @@
-// What the process writes to its two standard streams for a while.
+// Capture of the standard streams.
 #pragma once
 
 #include <cstdio>
@@ -6,11 +6,11 @@
 
 namespace info {
 
-// From construction to finish() (or the end of the object) standard output and standard error go,
-// in one order, into a nameless temporary file, whichever code writes them. A file, since nobody
-// reads meanwhile and a pipe would fill up. Where none can be made the streams stay as they are.
+// Redirects standard output and standard error of the process, in one order, into a temporary file,
+// from construction to finish() or destruction. A file, since nothing reads in the meantime and a
+// pipe would fill up. If no file can be created, the streams stay as they are.
 //
-// One object at a time, while no other thread uses the streams.
+// No other thread may use the streams meanwhile. Objects may be nested.
 class CapturedOutput {
 public:
     CapturedOutput();
@@ -18,14 +18,14 @@ public:
     CapturedOutput(const CapturedOutput&) = delete;
     CapturedOutput& operator=(const CapturedOutput&) = delete;
 
-    // Puts the streams back and returns what was written.
-    std::string finish();
+    // Restores the streams and returns the text written to them.
+    [[nodiscard]] std::string finish();
 
 private:
     void restore();
 
     std::FILE* fFile = nullptr;
-    int fOutput = -1; // the streams that were there before
+    int fOutput = -1; // duplicates of the original streams; -1 if not redirected
     int fError = -1;
 };
 

@@ -1,9 +1,10 @@
 #include "tools/info/diagnostics/DeviceSurvey.h"
 
+#include "loader/OpenCLLibraryName.h"
 #include "loader/OpenCLLoader.h"
+#include "loader/SharedLibrary.h"
 #include "runtime/DeviceSelection.h"
 #include "runtime/TopenCLInfo.h"
-#include "tools/info/diagnostics/OpenCLCalls.h"
 #include "tools/info/diagnostics/RenderWindow.h"
 
 #include <algorithm>
@@ -12,10 +13,10 @@
 namespace info {
 namespace {
 
-// Only Windows looks at the native window.
+// The native window counts only on Windows.
 constexpr void* kNoWindow = nullptr;
 
-// More than any machine has on one platform.
+// Above the number of devices on one platform of any machine.
 constexpr std::size_t kMaximumDevices = 64;
 
 // The ids of a platform's devices, and those of them that share with the OpenGL context.
@@ -30,23 +31,32 @@ bool contains(const std::vector<cl_device_id>& ids, cl_device_id id)
     return std::find(ids.begin(), ids.end(), id) != ids.end();
 }
 
+// The library does not call clGetDeviceIDs, so its table has no entry for it.
+decltype(&::clGetDeviceIDs) findGetDeviceIDs()
+{
+    void* library = openSharedLibrary(kOpenCLLibraryName);
+    return library ? reinterpret_cast<decltype(&::clGetDeviceIDs)>(
+                         findSymbol(library, "clGetDeviceIDs"))
+                   : nullptr;
+}
+
 std::vector<cl_device_id> allDevices(cl_platform_id platform)
 {
-    const OpenCLCalls calls = findOpenCLCalls();
+    const auto getDeviceIDs = findGetDeviceIDs();
     cl_uint count = 0;
-    if (!calls.clGetDeviceIDs ||
-        calls.clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 0, nullptr, &count) != CL_SUCCESS)
+    if (!getDeviceIDs ||
+        getDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 0, nullptr, &count) != CL_SUCCESS)
         return {};
     std::vector<cl_device_id> ids(count);
     if (count > 0)
-        calls.clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, count, ids.data(), nullptr);
+        getDeviceIDs(platform, CL_DEVICE_TYPE_ALL, count, ids.data(), nullptr);
     return ids;
 }
 
-// The questions that start-up asks to find the device, with the status of the first that failed.
-int askForSharingDevices(cl_platform_id platform, RenderWindow& window, DeviceIds& ids)
+// Makes the queries by which start-up finds the device. Returns the status of the first that fails.
+int querySharingDevices(cl_platform_id platform, RenderWindow& window, DeviceIds& ids)
 {
-    if (!ocl.clGetGLContextInfoKHR || !window.facts().usable)
+    if (!ocl.clGetGLContextInfoKHR || !window.renderer().usable)
         return CL_SUCCESS;
     const ContextProperties properties =
         openGLContextProperties(kNoWindow, window.nativeContext(), platform);
@@ -105,9 +115,10 @@ void surveyDevices(cl_platform_id id, RenderWindow& window, Platform& platform)
 {
     DeviceIds ids;
     ids.all = allDevices(id);
-    // A runtime without the extension need not bear the question; start-up asks all the same.
+    // Only on platforms with the extension, since others need not handle the query, and on the
+    // chosen one, where start-up has made it.
     if (platform.chosen || listsExtension(platform.extensions, "cl_khr_gl_sharing"))
-        platform.sharingStatus = askForSharingDevices(id, window, ids);
+        platform.sharingStatus = querySharingDevices(id, window, ids);
     for (cl_device_id sharing : ids.sharing) {
         if (!contains(ids.all, sharing))
             ids.all.push_back(sharing);

@@ -9,7 +9,8 @@ namespace info {
 
 class RenderWindow;
 
-// Fills the devices of `platform`, whose id is `id`, and how they stand to the renderer's context.
+// Fills the devices of `platform`, which has the id `id`, and their relation to the OpenGL context
+// of `window`, which is current.
 void surveyDevices(cl_platform_id id, RenderWindow& window, Platform& platform);
 
 } // namespace info

@@ -13,16 +13,16 @@ const std::string* Environment::find(const std::string& name) const
     return nullptr;
 }
 
-const Platform* chosenPlatform(const Facts& facts)
+const Platform* chosenPlatform(const Diagnostics& diagnostics)
 {
-    const auto found = std::find_if(facts.platforms.begin(), facts.platforms.end(),
+    const auto found = std::find_if(diagnostics.platforms.begin(), diagnostics.platforms.end(),
                                     [](const Platform& platform) { return platform.chosen; });
-    return found != facts.platforms.end() ? &*found : nullptr;
+    return found != diagnostics.platforms.end() ? &*found : nullptr;
 }
 
-const Device* chosenDevice(const Facts& facts)
+const Device* chosenDevice(const Diagnostics& diagnostics)
 {
-    const Platform* platform = chosenPlatform(facts);
+    const Platform* platform = chosenPlatform(diagnostics);
     if (!platform)
         return nullptr;
     const auto found = std::find_if(platform->devices.begin(), platform->devices.end(),

@@ -1,8 +1,9 @@
-// What vyra-opencl-info found, as plain data: the rules that explain it, and the tests of those
-// rules, need no OpenCL and no display.
+// The diagnostics that vyra-opencl-info collects, as plain data. The rules that explain them, and
+// the tests of those rules, need neither OpenCL nor a display.
 #pragma once
 
 #include "runtime/OpenCLProvider.h"
+#include "runtime/StartUpStep.h"
 #include "runtime/SyncModes.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -22,17 +23,17 @@ struct Renderer {
     std::string vendor;
     std::string renderer;
     std::string version;
-    std::string windowSystem;                // as Qt names it, such as "xcb"
-    std::optional<unsigned> adapterVendorId; // PCI vendor id that follows from the texts
-    bool syncObjects = false;                // GL_ARB_sync, on every thread
+    std::string windowSystem;                // Qt's name for it, such as "xcb"
+    std::optional<unsigned> adapterVendorId; // PCI vendor id, derived from the texts
+    bool syncObjects = false;                // GL_ARB_sync, usable on every thread
 };
 
 // The OpenCL loader library.
 struct Loader {
     bool loaded = false;
-    std::string file;                       // where the library was found
-    std::string problem;                    // the system's words when it cannot be opened
-    std::vector<std::string> missingLayers; // of OPENCL_LAYERS: no such file
+    std::string file;                       // path of the library
+    std::string problem;                    // the system's message if it cannot be opened
+    std::vector<std::string> missingLayers; // entries of OPENCL_LAYERS that are not files
     std::vector<std::string> missingCore;
     std::vector<std::string> missingSharing;
 };
@@ -48,9 +49,9 @@ struct Device {
     bool available = false;
     bool doublePrecision = false;
     unsigned computeUnits = 0;
-    bool sharesWithRenderer = false; // is in the runtime's list for the OpenGL context
-    bool drivesRenderer = false;     // is the OpenGL context's current device
-    bool chosen = false;
+    bool sharesWithRenderer = false; // in the runtime's list for the OpenGL context
+    bool drivesRenderer = false;     // the current device of the OpenGL context
+    bool chosen = false;             // by start-up
 };
 
 struct Platform {
@@ -59,21 +60,26 @@ struct Platform {
     std::string version;
     std::string extensions;
     int status = CL_SUCCESS;        // of the first query that failed
-    bool chosen = false;            // start-up took it
+    bool chosen = false;            // by start-up
     int sharingStatus = CL_SUCCESS; // of the query for the devices of the OpenGL context
     std::vector<Device> devices;
 };
 
-// What the library's start-up said and left behind.
+// A warning of the library: a failing OpenCL call, or a build log.
+struct Warning {
+    std::string text;
+    int status = CL_SUCCESS;                     // of the call; CL_SUCCESS for a build log
+    StartUpStep step = StartUpStep::kNotStarted; // the last step that start-up had begun
+};
+
+// The output and the result of the library's start-up.
 struct StartUp {
     bool attempted = false;
-    unsigned vendorId = 0;             // what it was told
-    std::string output;                // standard output and standard error
-    std::vector<std::string> warnings; // failing OpenCL calls, as the warning sink got them
+    unsigned vendorId = 0; // the argument of TopenCLInfo::initialize
+    std::string output;    // standard output and standard error
+    std::vector<Warning> warnings;
+    StartUpStep lastStep = StartUpStep::kNotStarted; // the step that stopped it, unless valid
     bool valid = false;
-    bool hasDevice = false;
-    bool hasContext = false;
-    bool hasQueue = false;
     OpenCLProvider provider = kUnknownProvider;
     TopenCLInfo::GraphicsToCLSyncMode graphicsToCL = TopenCLInfo::kGraphicsToCLFinish;
     TopenCLInfo::CLToGraphicsSyncMode clToGraphics = TopenCLInfo::kCLToGraphicsFinish;
@@ -88,24 +94,24 @@ struct Variable {
     std::string value;
 };
 
-// The environment, and what the library reads in it.
+// The environment, and the values that the library reads from it.
 struct Environment {
-    std::vector<Variable> variables; // whatever begins with VYRA_, and what steers the loader
+    std::vector<Variable> variables; // of the library, of glshare and of the OpenCL loader
     bool platformFromOption = false; // --platform set VYRA_OPENCL_PLATFORM
-    bool platformWasChosen = false;  // as the only one that shares with an unknown renderer
+    bool platformWasChosen = false;  // the only one that shares with a renderer of unknown vendor
     SyncModeVariables syncModes;
     std::optional<int> ignoreDriverVersion;
-    int doubleDemanded = 0;
+    int requireDoublePrecision = 0;
 
-    // The value of a variable, or null when it is not set.
+    // Returns the value of a variable. Null if it is not set.
     const std::string* find(const std::string& name) const;
 };
 
-// Medians of several evaluations, in milliseconds.
+// In milliseconds; medians of several evaluations, except for the first two.
 struct SelfTestTimes {
-    double kernelBuild = 0; // once
+    double kernelBuild = 0;
     double firstEvaluation = 0;
-    double evaluation = 0; // until OpenGL has read the result, not held up in between
+    double evaluation = 0; // until OpenGL has read the result, without waits between the stages
     double acquire = 0;
     double kernel = 0;
     double release = 0;
@@ -114,30 +120,30 @@ struct SelfTestTimes {
 
 struct SelfTest {
     bool passed = false;
-    std::string problem;     // what went wrong
+    std::string problem;     // the first error
     int status = CL_SUCCESS; // of the OpenCL call that failed
     std::size_t vertices = 0;
-    int evaluations = 0; // checked
+    int evaluations = 0; // the number of evaluations whose result was checked
     SelfTestTimes times;
-    std::vector<std::string> warnings; // while it ran
+    std::vector<Warning> warnings;
 };
 
-struct Facts {
+struct Diagnostics {
     Environment environment;
     Renderer renderer;
     Loader loader;
     int platformStatus = CL_SUCCESS; // of the query for the platforms
     std::vector<Platform> platforms;
-    std::optional<std::string> wantedVendor; // of the platform that start-up looks for
+    std::optional<std::string> wantedVendor; // the vendor whose platform start-up looks for
     StartUp startUp;
-    std::optional<SelfTest> selfTest; // where OpenCL is on
+    std::optional<SelfTest> selfTest; // empty if OpenCL is off
 };
 
-// What start-up chose; null where it got no further.
-const Platform* chosenPlatform(const Facts& facts);
-const Device* chosenDevice(const Facts& facts);
+// Return the platform and the device that start-up chose. Null if it stopped before that.
+const Platform* chosenPlatform(const Diagnostics& diagnostics);
+const Device* chosenDevice(const Diagnostics& diagnostics);
 
-// Whether the extension string has `name` in it: a plain search, as the library makes it.
-bool listsExtension(const std::string& extensions, const char* name);
+// Returns whether the extension string contains `name`: a plain search, as in the library.
+[[nodiscard]] bool listsExtension(const std::string& extensions, const char* name);
 
 } // namespace info

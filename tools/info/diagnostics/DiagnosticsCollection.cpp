@@ -6,7 +6,6 @@
 #include "tools/info/diagnostics/RenderWindow.h"
 #include "tools/info/diagnostics/StartUpRun.h"
 #include "tools/info/diagnostics/WarningLog.h"
-#include "tools/info/selftest/SelfTestRun.h"
 
 #include <algorithm>
 #include <cctype>
@@ -20,8 +19,9 @@ namespace {
 
 constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
 
-// Not the library's variables: they decide which OpenCL and which OpenGL it meets.
-constexpr std::string_view kSteering[] = {
+// Variables of other components that select the OpenCL and the OpenGL in use. A name without "=" is
+// a prefix.
+constexpr std::string_view kSelectingVariables[] = {
     "OCL_ICD_",
     "OPENCL_LAYERS=",
     "OPENCL_VENDOR_PATH=",
@@ -33,19 +33,20 @@ constexpr std::string_view kSteering[] = {
     "CUDA_VISIBLE_DEVICES=",
 };
 
-// In any case, since one that is written in the wrong case has no effect.
+// Compares without regard to case, since a name in the wrong case is worth a report. `prefix` is in
+// upper case.
 bool startsWith(std::string_view entry, std::string_view prefix)
 {
     return entry.size() >= prefix.size() &&
-           std::equal(prefix.begin(), prefix.end(), entry.begin(), [](char wanted, char found) {
-               return std::toupper(static_cast<unsigned char>(found)) == wanted;
+           std::equal(prefix.begin(), prefix.end(), entry.begin(), [](char expected, char found) {
+               return std::toupper(static_cast<unsigned char>(found)) == expected;
            });
 }
 
 bool isOfInterest(std::string_view entry)
 {
     return startsWith(entry, "VYRA_") || startsWith(entry, "GLSHARE_") ||
-           std::any_of(std::begin(kSteering), std::end(kSteering),
+           std::any_of(std::begin(kSelectingVariables), std::end(kSelectingVariables),
                        [entry](std::string_view prefix) { return entry.starts_with(prefix); });
 }
 
@@ -65,7 +66,7 @@ std::vector<Variable> variablesOfInterest()
     return variables;
 }
 
-// As the library reads it.
+// Reads the variable as the library does.
 std::optional<int> readIgnoreDriverVersion()
 {
     const char* value = std::getenv("VYRA_OPENCL_IGNORE_DRIVER_VERSION");
@@ -79,40 +80,33 @@ Environment readEnvironment(bool platformFromOption)
     environment.platformFromOption = platformFromOption;
     environment.syncModes = readSyncModeVariables();
     environment.ignoreDriverVersion = readIgnoreDriverVersion();
-    environment.doubleDemanded =
+    environment.requireDoublePrecision =
         TenvironmentVariable("VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT").asInt32(0);
     return environment;
 }
 
 } // namespace
 
-Facts gatherFacts(const Options& options)
+Diagnostics collectDiagnostics(const Options& options, RenderWindow& window, WarningLog& warnings)
 {
-    // The variable is how a host's user names a platform, too: there is one way to start the
-    // library.
     if (options.platform)
         setenv(kPlatformVariable, options.platform->c_str(), 1);
-    Facts facts;
-    facts.environment = readEnvironment(options.platform.has_value());
-
-    WarningLog warnings;
-    RenderWindow window;
-    facts.renderer = window.facts();
-    const bool isOpen = !options.deviceVendor && !facts.environment.find(kPlatformVariable);
-    if (facts.renderer.usable && isOpen) {
+    Diagnostics diagnostics;
+    diagnostics.environment = readEnvironment(options.platform.has_value());
+    diagnostics.renderer = window.renderer();
+    const bool isOpen = !options.deviceVendor && !diagnostics.environment.find(kPlatformVariable);
+    if (diagnostics.renderer.usable && isOpen) {
         chooseOpenCLPlatform(window.context());
-        facts.environment.platformWasChosen = std::getenv(kPlatformVariable) != nullptr;
+        diagnostics.environment.platformWasChosen = std::getenv(kPlatformVariable) != nullptr;
     }
-    const unsigned adapter = facts.renderer.adapterVendorId.value_or(0);
+    const unsigned adapter = diagnostics.renderer.adapterVendorId.value_or(0);
     const unsigned vendorId = options.deviceVendor.value_or(adapter);
-    facts.startUp = runStartUp(window, vendorId, warnings);
-    facts.wantedVendor = wantedVendor(vendorId);
-    facts.loader = surveyLoader();
-    facts.loader.missingLayers = missingOpenCLLayers();
-    surveyPlatforms(window, facts);
-    if (facts.startUp.valid)
-        facts.selfTest = runSelfTest(window, warnings);
-    return facts;
+    diagnostics.startUp = runStartUp(window, vendorId, warnings);
+    diagnostics.wantedVendor = wantedVendor(vendorId);
+    diagnostics.loader = surveyLoader();
+    diagnostics.loader.missingLayers = missingOpenCLLayers();
+    surveyPlatforms(window, diagnostics);
+    return diagnostics;
 }
 
 } // namespace info

@@ -1,4 +1,4 @@
-// One look at this machine, from the environment to the self-test.
+// The collection of all diagnostics except the self-test.
 #pragma once
 
 #include "tools/info/Options.h"
@@ -6,7 +6,13 @@
 
 namespace info {
 
-// Once in a process, on the main thread.
-Facts gatherFacts(const Options& options);
+class RenderWindow;
+class WarningLog;
+
+// Reads the environment, starts the library for `window`, and queries platforms and devices. Sets
+// VYRA_OPENCL_PLATFORM for --platform, as the user of a host application would. Once in a process,
+// on the main thread.
+[[nodiscard]] Diagnostics collectDiagnostics(const Options& options, RenderWindow& window,
+                                             WarningLog& warnings);
 
 } // namespace info

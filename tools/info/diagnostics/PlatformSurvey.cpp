@@ -33,7 +33,7 @@ std::string fileOf(void* function)
     return function && dladdr(function, &where) && where.dli_fname ? where.dli_fname : "";
 }
 
-// Notes the status of the first question that fails.
+// Returns a text of the platform. `status` keeps the first failure of several queries.
 std::string platformInfo(cl_platform_id platform, cl_platform_info name, int& status)
 {
     std::vector<char> value;
@@ -53,12 +53,11 @@ Platform describePlatform(cl_platform_id id)
     return platform;
 }
 
-// Start-up takes the first platform of the vendor.
-bool isChosen(const Facts& facts, const Platform& platform)
+// Start-up chooses the first platform of the vendor.
+bool isChosen(const Diagnostics& diagnostics, const Platform& platform)
 {
-    const bool looked =
-        facts.startUp.output.find("OpenCL evaluator choosing OpenCL platform") != std::string::npos;
-    return looked && !chosenPlatform(facts) && facts.wantedVendor == platform.vendor;
+    return diagnostics.startUp.lastStep > StartUpStep::kPlatform && !chosenPlatform(diagnostics) &&
+           diagnostics.wantedVendor == platform.vendor;
 }
 
 } // namespace
@@ -67,19 +66,19 @@ Loader surveyLoader()
 {
     Loader loader;
     try {
-        dlerror(); // forgets earlier problems
+        dlerror(); // clears earlier errors
         const OpenCLLoadStatus status = loadOpenCL();
         loader.loaded = status == OpenCLLoadStatus::kLoaded;
         if (status == OpenCLLoadStatus::kNoLibrary) {
             const char* problem = dlerror();
-            loader.problem = problem ? problem : "the system does not say why";
+            loader.problem = problem ? problem : "the system reports no reason";
             return loader;
         }
     } catch (const std::exception& error) {
         loader.problem = error.what();
         return loader;
     } catch (...) {
-        loader.problem = "loading it raised an exception";
+        loader.problem = "loading it threw an exception";
         return loader;
     }
     loader.file = fileOf(reinterpret_cast<void*>(ocl.clGetPlatformIDs));
@@ -90,22 +89,22 @@ Loader surveyLoader()
     return loader;
 }
 
-void surveyPlatforms(RenderWindow& window, Facts& facts)
+void surveyPlatforms(RenderWindow& window, Diagnostics& diagnostics)
 {
-    if (!facts.loader.loaded)
+    if (!diagnostics.loader.loaded)
         return;
     cl_uint count = 0;
-    facts.platformStatus = ocl.clGetPlatformIDs(0, nullptr, &count);
-    std::vector<cl_platform_id> ids(facts.platformStatus == CL_SUCCESS ? count : 0);
+    diagnostics.platformStatus = ocl.clGetPlatformIDs(0, nullptr, &count);
+    std::vector<cl_platform_id> ids(diagnostics.platformStatus == CL_SUCCESS ? count : 0);
     if (!ids.empty())
-        facts.platformStatus = ocl.clGetPlatformIDs(count, ids.data(), nullptr);
-    if (facts.platformStatus != CL_SUCCESS)
+        diagnostics.platformStatus = ocl.clGetPlatformIDs(count, ids.data(), nullptr);
+    if (diagnostics.platformStatus != CL_SUCCESS)
         return;
     for (cl_platform_id id : ids) {
         Platform platform = describePlatform(id);
-        platform.chosen = isChosen(facts, platform);
+        platform.chosen = isChosen(diagnostics, platform);
         surveyDevices(id, window, platform);
-        facts.platforms.push_back(std::move(platform));
+        diagnostics.platforms.push_back(std::move(platform));
     }
 }
 

@@ -1,4 +1,4 @@
-// What OpenCL there is on this machine. Asks only; makes nothing.
+// The OpenCL library, the platforms and the devices of this machine. Queries only.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -7,11 +7,11 @@ namespace info {
 
 class RenderWindow;
 
-// The OpenCL library, loaded as start-up loads it.
-Loader surveyLoader();
+// Loads the OpenCL library as start-up does.
+[[nodiscard]] Loader surveyLoader();
 
-// Fills the platforms and devices of `facts`, and marks what start-up chose: loader, wanted vendor
-// and start-up are known, the window's context is current.
-void surveyPlatforms(RenderWindow& window, Facts& facts);
+// Fills the platforms and devices of `diagnostics`, and marks the chosen ones. Requires the members
+// loader, wantedVendor and startUp, and the window's context to be current.
+void surveyPlatforms(RenderWindow& window, Diagnostics& diagnostics);
 
 } // namespace info

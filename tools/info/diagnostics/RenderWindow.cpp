@@ -12,20 +12,22 @@ namespace {
 
 constexpr char kPlatformVariable[] = "QT_QPA_PLATFORM";
 
-// Qt's own words while it looks for a display; the last ones are the reason when there is none.
-std::string sfComplaints;
+// Qt's warnings during the search for a display: the reason if there is none.
+std::string sfWindowSystemErrors;
 
-void keepComplaint(QtMsgType type, const QMessageLogContext& context, const QString& message)
+void keepWindowSystemError(QtMsgType type, const QMessageLogContext& context,
+                           const QString& message)
 {
     constexpr std::string_view kWindowSystem = "qt.qpa";
     if (type != QtWarningMsg || !std::string_view(context.category).starts_with(kWindowSystem))
         return;
-    sfComplaints += (sfComplaints.empty() ? "" : "; ") + message.trimmed().toStdString();
+    sfWindowSystemErrors +=
+        (sfWindowSystemErrors.empty() ? "" : "; ") + message.trimmed().toStdString();
 }
 
-// Names the window systems to try. The last one always works and has no OpenGL; without it Qt would
-// end the process where there is no display.
-void nameWindowSystems()
+// Sets the window systems that Qt tries. The last one always works and has no OpenGL; without it Qt
+// would end the process if there is no display.
+void setWindowSystems()
 {
     constexpr char kLastResort[] = "offscreen";
     QByteArray systems = qgetenv(kPlatformVariable);
@@ -39,7 +41,7 @@ std::unique_ptr<QGuiApplication> makeApplication()
     static int argumentCount = 1;
     static char programName[] = "vyra-opencl-info";
     static char* arguments[] = {programName, nullptr};
-    nameWindowSystems();
+    setWindowSystems();
     return std::make_unique<QGuiApplication>(argumentCount, arguments);
 }
 
@@ -53,12 +55,12 @@ std::string glText(QOpenGLContext& context, unsigned name)
 
 RenderWindow::RenderWindow()
 {
-    sfComplaints.clear();
-    const QtMessageHandler former = qInstallMessageHandler(keepComplaint);
+    sfWindowSystemErrors.clear();
+    const QtMessageHandler previousHandler = qInstallMessageHandler(keepWindowSystemError);
     fApplication = makeApplication();
-    fFacts.windowSystem = QGuiApplication::platformName().toStdString();
+    fRenderer.windowSystem = QGuiApplication::platformName().toStdString();
     open();
-    qInstallMessageHandler(former);
+    qInstallMessageHandler(previousHandler);
 }
 
 RenderWindow::~RenderWindow() = default;
@@ -67,29 +69,29 @@ void RenderWindow::open()
 {
     fContext = std::make_unique<QOpenGLContext>();
     if (!fContext->create()) {
-        fFacts.problem =
-            "no context can be made" + (sfComplaints.empty() ? "" : " (" + sfComplaints + ")");
+        fRenderer.problem = "no context can be created" +
+                            (sfWindowSystemErrors.empty() ? "" : " (" + sfWindowSystemErrors + ")");
         return;
     }
     fWindow = std::make_unique<QWindow>();
     fWindow->setSurfaceType(QSurface::OpenGLSurface);
     fWindow->create();
     if (!fContext->makeCurrent(fWindow.get())) {
-        fFacts.problem = "the context cannot draw into a window";
+        fRenderer.problem = "the context cannot draw into a window";
         return;
     }
     fHost = std::make_unique<GLHost>(*fContext);
-    fFacts.usable = true;
-    fFacts.vendor = glText(*fContext, GL_VENDOR);
-    fFacts.renderer = glText(*fContext, GL_RENDERER);
-    fFacts.version = glText(*fContext, GL_VERSION);
-    fFacts.adapterVendorId = ::adapterVendorId(fFacts.vendor, fFacts.renderer);
-    fFacts.syncObjects = fHost->syncObjectsUsable();
+    fRenderer.usable = true;
+    fRenderer.vendor = glText(*fContext, GL_VENDOR);
+    fRenderer.renderer = glText(*fContext, GL_RENDERER);
+    fRenderer.version = glText(*fContext, GL_VERSION);
+    fRenderer.adapterVendorId = ::adapterVendorId(fRenderer.vendor, fRenderer.renderer);
+    fRenderer.syncObjects = fHost->syncObjectsUsable();
 }
 
 void* RenderWindow::nativeContext() const
 {
-    return fFacts.usable ? ::nativeContext(*fContext) : nullptr;
+    return fRenderer.usable ? ::nativeContext(*fContext) : nullptr;
 }
 
 } // namespace info

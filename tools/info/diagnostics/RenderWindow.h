@@ -1,4 +1,4 @@
-// The OpenGL side of the host: a window that is never shown, with a context.
+// The window and the OpenGL context that stand for the host application.
 #pragma once
 
 #include "standalone/GLHost.h"
@@ -13,11 +13,11 @@
 
 namespace info {
 
-// Makes the application object, the window and the context, and makes the context current. What is
-// missing on this machine is told by facts(), never fatal: without a display Qt falls back to a
-// window system that has no OpenGL.
+// A window that is never shown, with an OpenGL context that is current on the main thread. Owns the
+// application object of Qt. A part that is missing on this machine is reported by renderer() and is
+// not an error: without a display Qt falls back to a window system that has no OpenGL.
 //
-// On the main thread, once.
+// One object in a process, on the main thread.
 class RenderWindow {
 public:
     RenderWindow();
@@ -25,18 +25,18 @@ public:
     RenderWindow(const RenderWindow&) = delete;
     RenderWindow& operator=(const RenderWindow&) = delete;
 
-    const Renderer& facts() const { return fFacts; }
-    // The window system's own handle, as the library's start-up takes it; null where the renderer
-    // is not usable.
+    const Renderer& renderer() const noexcept { return fRenderer; }
+    // Returns the window system's handle of the context, as TopenCLInfo::initialize takes it. Null
+    // if the renderer is not usable.
     void* nativeContext() const;
 
-    QOpenGLContext& context() { return *fContext; }
+    QOpenGLContext& context() noexcept { return *fContext; }
 
 private:
     void open();
 
-    Renderer fFacts;
-    // The first members go last: the application outlives everything of Qt's.
+    Renderer fRenderer;
+    // Destroyed last, since it must outlive all other objects of Qt.
     std::unique_ptr<QGuiApplication> fApplication;
     std::unique_ptr<QWindow> fWindow;
     std::unique_ptr<QOpenGLContext> fContext;

@@ -8,18 +8,15 @@
 namespace info {
 namespace {
 
-// Only Windows looks at the native window.
+// The native window counts only on Windows.
 constexpr void* kNoWindow = nullptr;
 
-// The answer does not reach the decisions here: the library only keeps it for the host.
+// No decision depends on it: the library only stores it for the host.
 constexpr bool kUsingCoreProfile = false;
 
-void readOutcome(StartUp& startUp)
+void readResult(StartUp& startUp)
 {
     const TopenCLInfo& library = TopenCLInfo::theOne();
-    startUp.hasDevice = library.openCLDevice() != nullptr;
-    startUp.hasContext = library.openCLContext() != nullptr;
-    startUp.hasQueue = library.openCLCommandQueue() != nullptr;
     startUp.provider = library.openCLProvider();
     startUp.graphicsToCL = library.graphicsToCLSyncMode();
     startUp.clToGraphics = library.clToGraphicsSyncMode();
@@ -35,21 +32,22 @@ StartUp runStartUp(const RenderWindow& window, unsigned vendorId, WarningLog& wa
 {
     StartUp startUp;
     startUp.vendorId = vendorId;
-    if (!window.facts().usable)
+    if (!window.renderer().usable)
         return startUp;
     startUp.attempted = true;
     CapturedOutput output;
     startUp.valid = TopenCLInfo::initialize(kNoWindow, window.nativeContext(), nullptr, false,
                                             kUsingCoreProfile, vendorId);
+    startUp.lastStep = startUpStep();
     startUp.output = output.finish();
     startUp.warnings = warnings.take();
-    readOutcome(startUp);
+    readResult(startUp);
     return startUp;
 }
 
 std::optional<std::string> wantedVendor(unsigned vendorId)
 {
-    // The rule says on standard error when it knows no vendor; start-up has said so already.
+    // The function prints a message for an unknown id; start-up has printed it already.
     const CapturedOutput silence;
     const std::optional<Tstring> vendor = chooseVendor(vendorId);
     return vendor ? std::optional<std::string>(vendor->asChar()) : std::nullopt;

@@ -1,4 +1,4 @@
-// The library's start-up, listened to.
+// The library's start-up, with a record of its output.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -11,11 +11,12 @@ namespace info {
 class RenderWindow;
 class WarningLog;
 
-// Initialises the library for the window and notes what it said and left behind. Once in a process.
-// Nothing is attempted where there is no renderer.
-StartUp runStartUp(const RenderWindow& window, unsigned vendorId, WarningLog& warnings);
+// Initialises the library for `window`, and records its output, its warnings and its result. Does
+// nothing if the renderer is not usable. Once in a process.
+[[nodiscard]] StartUp runStartUp(const RenderWindow& window, unsigned vendorId,
+                                 WarningLog& warnings);
 
-// The vendor whose platform start-up looks for; empty when the id belongs to none that it knows.
-std::optional<std::string> wantedVendor(unsigned vendorId);
+// Returns the vendor whose platform start-up looks for. Empty if the vendor id is unknown.
+[[nodiscard]] std::optional<std::string> wantedVendor(unsigned vendorId);
 
 } // namespace info

@@ -1,36 +1,38 @@
 #include "tools/info/diagnostics/WarningLog.h"
 
+#include "diagnostics/CLStatusReport.h"
+
 #include <utility>
 
 namespace info {
 
-constinit WarningLog* WarningLog::sfReceiver = nullptr;
+constinit WarningLog* WarningLog::sfCurrent = nullptr;
 
 WarningLog::WarningLog()
 {
-    sfReceiver = this;
-    fSinkBefore = setCLWarningSink(keep);
+    sfCurrent = this;
+    fSinkBefore = setCLWarningSink(add);
 }
 
 WarningLog::~WarningLog()
 {
     setCLWarningSink(fSinkBefore);
-    sfReceiver = nullptr;
+    sfCurrent = nullptr;
 }
 
-std::vector<std::string> WarningLog::take()
+std::vector<Warning> WarningLog::take()
 {
     const std::scoped_lock lock(fMutex);
-    return std::exchange(fTexts, {});
+    return std::exchange(fWarnings, {});
 }
 
-void WarningLog::keep(const char* text)
+void WarningLog::add(const char* text)
 {
-    std::string warning = text;
-    while (warning.ends_with('\n'))
-        warning.pop_back();
-    const std::scoped_lock lock(sfReceiver->fMutex);
-    sfReceiver->fTexts.push_back(std::move(warning));
+    Warning warning{text, reportedStatus(), startUpStep()};
+    while (warning.text.ends_with('\n'))
+        warning.text.pop_back();
+    const std::scoped_lock lock(sfCurrent->fMutex);
+    sfCurrent->fWarnings.push_back(std::move(warning));
 }
 
 } // namespace info

@@ -2,15 +2,15 @@
 #pragma once
 
 #include "diagnostics/CLWarningSink.h"
+#include "tools/info/diagnostics/Diagnostics.h"
 
 #include <mutex>
-#include <string>
 #include <vector>
 
 namespace info {
 
-// Replaces the library's warning sink while an object lives, and keeps the texts of all threads.
-// One object at a time.
+// Collects the warnings of all threads: the library's warning sink from construction to
+// destruction, which restores the sink before. One object at a time.
 class WarningLog {
 public:
     WarningLog();
@@ -18,17 +18,17 @@ public:
     WarningLog(const WarningLog&) = delete;
     WarningLog& operator=(const WarningLog&) = delete;
 
-    // The warnings since the last take, each without the line break at its end.
-    std::vector<std::string> take();
+    // Returns the warnings since the last call, each without the line break at its end.
+    [[nodiscard]] std::vector<Warning> take();
 
 private:
-    static void keep(const char* text);
+    static void add(const char* text);
 
-    static WarningLog* sfReceiver;
+    static WarningLog* sfCurrent;
 
     CLWarningSink fSinkBefore;
     std::mutex fMutex;
-    std::vector<std::string> fTexts; // guarded by fMutex
+    std::vector<Warning> fWarnings; // guarded by fMutex
 };
 
 } // namespace info

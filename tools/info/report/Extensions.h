@@ -1,7 +1,5 @@
-// The OpenCL extensions that the library's decisions depend on.
+// The OpenCL extensions that affect the library's decisions.
 #pragma once
-
-#include <span>
 
 namespace info {
 
@@ -10,6 +8,10 @@ struct Extension {
     const char* purpose;
 };
 
-std::span<const Extension> relevantExtensions();
+inline constexpr Extension kRelevantExtensions[] = {
+    {"cl_khr_gl_sharing", "buffers shared with OpenGL"},
+    {"cl_khr_gl_event", "implicit ordering of OpenCL and OpenGL"},
+    {"cl_khr_fp64", "double precision"},
+};
 
 } // namespace info

@@ -45,19 +45,19 @@ QJsonValue statusObject(std::optional<int> code)
                        {"meaning", orNull(statusMeaning(*code))}};
 }
 
-QJsonObject warningObject(const std::string& warning)
+QJsonObject warningObject(const Warning& warning)
 {
-    return {{"text", text(warning)}, {"status", statusObject(statusInWarning(warning))}};
+    return {{"text", text(warning.text)}, {"status", statusObject(warning.status)}};
 }
 
-QJsonValue stopObject(const std::optional<Stop>& stop)
+QJsonValue failureObject(const std::optional<StartUpFailure>& failure)
 {
-    if (!stop)
+    if (!failure)
         return {};
-    return QJsonObject{{"step", stepName(stop->step).id},
-                       {"reason", text(stop->reason)},
-                       {"remedy", text(stop->remedy)},
-                       {"status", statusObject(stop->status)}};
+    return QJsonObject{{"step", stepText(failure->step).id},
+                       {"reason", text(failure->reason)},
+                       {"remedy", text(failure->remedy)},
+                       {"status", statusObject(failure->status)}};
 }
 
 QJsonObject rendererObject(const Renderer& renderer)
@@ -85,14 +85,15 @@ QJsonObject loaderObject(const Loader& loader)
 QJsonObject extensionsObject(const std::string& extensions)
 {
     QJsonObject object;
-    for (const Extension& extension : relevantExtensions())
+    for (const Extension& extension : kRelevantExtensions)
         object.insert(extension.name, listsExtension(extensions, extension.name));
     return object;
 }
 
-QJsonObject deviceObject(const Facts& facts, const Platform& platform, const Device& device)
+QJsonObject deviceObject(const Diagnostics& diagnostics, const Platform& platform,
+                         const Device& device)
 {
-    const std::string rejection = deviceRejection(facts, platform, device);
+    const std::string rejection = deviceRejection(diagnostics, platform, device);
     return {{"accepted", rejection.empty()},
             {"rejection", orNull(rejection)},
             {"name", text(device.name)},
@@ -109,9 +110,9 @@ QJsonObject deviceObject(const Facts& facts, const Platform& platform, const Dev
             {"extensions", extensionsObject(device.extensions)}};
 }
 
-QJsonObject platformObject(const Facts& facts, const Platform& platform)
+QJsonObject platformObject(const Diagnostics& diagnostics, const Platform& platform)
 {
-    const std::string rejection = platformRejection(facts, platform);
+    const std::string rejection = platformRejection(diagnostics, platform);
     return {{"accepted", rejection.empty()},
             {"rejection", orNull(rejection)},
             {"name", text(platform.name)},
@@ -119,7 +120,7 @@ QJsonObject platformObject(const Facts& facts, const Platform& platform)
             {"version", text(platform.version)},
             {"extensions", extensionsObject(platform.extensions)},
             {"devices", arrayOf(platform.devices, [&](const Device& device) {
-                 return deviceObject(facts, platform, device);
+                 return deviceObject(diagnostics, platform, device);
              })}};
 }
 
@@ -178,24 +179,24 @@ QJsonValue selfTestObject(const std::optional<SelfTest>& test)
 
 std::string jsonReport(const Explanation& explanation)
 {
-    const Facts& facts = explanation.facts;
+    const Diagnostics& diagnostics = explanation.diagnostics;
     const QJsonObject report{
         {"format", kJsonFormat},
         {"exitCode", static_cast<int>(explanation.exitCode)},
         {"summary", text(explanation.summary)},
-        {"on", !explanation.stop},
-        {"stop", stopObject(explanation.stop)},
-        {"renderer", rendererObject(facts.renderer)},
-        {"rendererBesideDevice", orNull(rendererBesideDevice(facts))},
-        {"loader", loaderObject(facts.loader)},
-        {"platformsStatus", statusObject(facts.platformStatus)},
+        {"on", !explanation.failure},
+        {"stop", failureObject(explanation.failure)},
+        {"renderer", rendererObject(diagnostics.renderer)},
+        {"rendererBesideDevice", orNull(rendererDeviceMismatch(diagnostics))},
+        {"loader", loaderObject(diagnostics.loader)},
+        {"platformsStatus", statusObject(diagnostics.platformStatus)},
         {"platforms",
-         arrayOf(facts.platforms,
-                 [&](const Platform& platform) { return platformObject(facts, platform); })},
+         arrayOf(diagnostics.platforms,
+                 [&](const Platform& platform) { return platformObject(diagnostics, platform); })},
         {"decisions", arrayOf(explanation.decisions, decisionObject)},
         {"variables", arrayOf(explanation.variables, variableObject)},
-        {"startUp", startUpObject(facts.startUp)},
-        {"selfTest", selfTestObject(facts.selfTest)},
+        {"startUp", startUpObject(diagnostics.startUp)},
+        {"selfTest", selfTestObject(diagnostics.selfTest)},
     };
     return QJsonDocument(report).toJson(QJsonDocument::Indented).toStdString();
 }

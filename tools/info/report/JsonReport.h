@@ -1,4 +1,4 @@
-// The report for machines.
+// The report as JSON.
 #pragma once
 
 #include "tools/info/rules/Explanation.h"
@@ -7,9 +7,10 @@
 
 namespace info {
 
-// One JSON object, described by info.schema.json, with a line break at its end. Members may be
-// added while kJsonFormat stays; it counts up when one changes or goes.
+// The version of the format. Adding a member keeps it; changing or removing one increments it.
 inline constexpr int kJsonFormat = 1;
-std::string jsonReport(const Explanation& explanation);
+
+// Returns one JSON object, described by info.schema.json, and a line break.
+[[nodiscard]] std::string jsonReport(const Explanation& explanation);
 
 } // namespace info

@@ -7,17 +7,17 @@ namespace info {
 namespace {
 
 constexpr std::size_t kIndent = 2;
-constexpr std::size_t kLabelWidth = 36; // the longest label, and a gap
-constexpr std::size_t kPageWidth = 110; // readable, and fits a terminal that somebody widened
+constexpr std::size_t kLabelWidth = 36; // the longest label and a gap
+constexpr std::size_t kPageWidth = 110; // columns
 
 } // namespace
 
-void Sheet::section(const std::string& title)
+void ReportWriter::section(const std::string& title)
 {
     fText += (fText.empty() ? "" : "\n") + title + "\n";
 }
 
-void Sheet::row(const std::string& label, const std::string& value)
+void ReportWriter::row(const std::string& label, const std::string& value)
 {
     std::string head(kIndent, ' ');
     head += label;
@@ -27,21 +27,21 @@ void Sheet::row(const std::string& label, const std::string& value)
     wrap(value, column);
 }
 
-void Sheet::paragraph(const std::string& text)
+void ReportWriter::paragraph(const std::string& text)
 {
     fText.append(kIndent, ' ');
     wrap(text, kIndent);
 }
 
-void Sheet::quote(const std::string& text)
+void ReportWriter::quote(const std::string& text)
 {
     std::istringstream lines(text);
     for (std::string line; std::getline(lines, line);)
         fText += "  | " + line + "\n";
 }
 
-// Continues the present line and ends it.
-void Sheet::wrap(const std::string& text, std::size_t indent)
+// Appends to the current line, and ends it.
+void ReportWriter::wrap(const std::string& text, std::size_t indent)
 {
     std::size_t width = indent;
     std::istringstream words(text);

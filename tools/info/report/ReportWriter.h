@@ -1,22 +1,23 @@
-// Plain text in sections of aligned rows.
+// Layout of the text report.
 #pragma once
 
 #include <string>
 
 namespace info {
 
-// Long values are broken between words and continue below their beginning.
-class Sheet {
+// Formats plain text in sections of aligned rows. Long values are wrapped between words and
+// continue below their first line.
+class ReportWriter {
 public:
     void section(const std::string& title);
-    // A label with its value.
+    // Adds a label with its value.
     void row(const std::string& label, const std::string& value);
-    // A sentence, or several.
+    // Adds wrapped text.
     void paragraph(const std::string& text);
-    // Lines as they are, marked as quoted.
+    // Adds lines unchanged, marked as quoted.
     void quote(const std::string& text);
 
-    const std::string& text() const { return fText; }
+    const std::string& text() const noexcept { return fText; }
 
 private:
     void wrap(const std::string& text, std::size_t indent);

@@ -13,10 +13,9 @@ namespace info {
 namespace {
 
 constexpr char kSelfTestRemedy[] =
-    "Run this again with VYRA_OPENCL_FORCE_FINISH=1. If the numbers are right then, the driver "
-    "does "
-    "not order OpenCL and OpenGL as it promises: let the host run with that variable, and update "
-    "the driver. If they stay wrong, the driver's sharing or its compiler fails.";
+    "Run this again with VYRA_OPENCL_FORCE_FINISH=1. If the numbers are right then, the driver does "
+    "not order OpenCL and OpenGL as it promises: run the host with that variable, and update the "
+    "driver. If they stay wrong, the driver's sharing or its compiler fails.";
 
 std::string milliseconds(double value)
 {
@@ -25,45 +24,46 @@ std::string milliseconds(double value)
     return text.data();
 }
 
-void addStop(Sheet& sheet, const Stop& stop)
+void addFailure(ReportWriter& writer, const StartUpFailure& failure)
 {
-    sheet.section("Why it is off");
-    sheet.paragraph(stop.reason);
-    sheet.section("What helps");
-    sheet.paragraph(stop.remedy);
-    sheet.section("Steps of start-up");
-    for (const StepName& name : stepNames()) {
-        const char* result = name.step < stop.step ? "passed" : "not reached";
-        sheet.row(name.title, name.step == stop.step ? "STOPPED HERE" : result);
+    writer.section("Why it is off");
+    writer.paragraph(failure.reason);
+    writer.section("What helps");
+    writer.paragraph(failure.remedy);
+    writer.section("Steps of start-up");
+    for (const StepText& text : stepTexts()) {
+        const char* result = text.step < failure.step ? "passed" : "not reached";
+        writer.row(text.title, text.step == failure.step ? "STOPPED HERE" : result);
     }
 }
 
-void addRenderer(Sheet& sheet, const Renderer& renderer)
+void addRenderer(ReportWriter& writer, const Renderer& renderer)
 {
-    sheet.section("OpenGL, which draws");
+    writer.section("OpenGL renderer");
     if (!renderer.usable) {
-        sheet.row("Usable", "no: " + renderer.problem);
+        writer.row("Usable", "no: " + renderer.problem);
         return;
     }
-    sheet.row("Renderer", renderer.renderer);
-    sheet.row("Vendor", renderer.vendor);
-    sheet.row("Version", renderer.version);
-    sheet.row("Window system", renderer.windowSystem);
-    sheet.row("Vendor id of the GPU", renderer.adapterVendorId ? hex(*renderer.adapterVendorId)
-                                                               : "none follows from these texts");
-    sheet.row("GL_ARB_sync", yesOrNo(renderer.syncObjects));
+    writer.row("Renderer", renderer.renderer);
+    writer.row("Vendor", renderer.vendor);
+    writer.row("Version", renderer.version);
+    writer.row("Window system", renderer.windowSystem);
+    writer.row("Vendor id of the GPU", renderer.adapterVendorId
+                                           ? hex(*renderer.adapterVendorId)
+                                           : "unknown; cannot be derived from these texts");
+    writer.row("GL_ARB_sync", yesOrNo(renderer.syncObjects));
 }
 
-void addLoader(Sheet& sheet, const Loader& loader)
+void addLoader(ReportWriter& writer, const Loader& loader)
 {
-    sheet.section("OpenCL library");
-    sheet.row("Loaded", loader.loaded ? loader.file : "no");
+    writer.section("OpenCL library");
+    writer.row("Loaded", loader.loaded ? loader.file : "no");
     if (!loader.problem.empty())
-        sheet.row("Problem", loader.problem);
+        writer.row("Problem", loader.problem);
     if (!loader.missingCore.empty())
-        sheet.row("Missing, needed always", commaList(loader.missingCore));
+        writer.row("Missing, always required", commaList(loader.missingCore));
     if (loader.loaded && !loader.missingSharing.empty())
-        sheet.row("Missing, needed for sharing", commaList(loader.missingSharing));
+        writer.row("Missing, required for sharing", commaList(loader.missingSharing));
 }
 
 std::string verdict(const std::string& rejection)
@@ -71,51 +71,53 @@ std::string verdict(const std::string& rejection)
     return rejection.empty() ? "accepted" : "not accepted: " + rejection;
 }
 
-void addDevice(Sheet& sheet, const Facts& facts, const Platform& platform, const Device& device)
+void addDevice(ReportWriter& writer, const Diagnostics& diagnostics, const Platform& platform,
+               const Device& device)
 {
-    sheet.section("  Device: " + device.name);
-    sheet.row("Verdict", verdict(deviceRejection(facts, platform, device)));
-    sheet.row("Type", deviceTypeName(device.type));
-    sheet.row("Vendor", device.vendor + (device.vendorId ? ", id " + hex(*device.vendorId) : ""));
-    sheet.row("Version, driver", device.version + ", " + device.driverVersion);
-    sheet.row("Compute units", std::to_string(device.computeUnits));
-    sheet.row("Shares with the OpenGL context", yesOrNo(device.sharesWithRenderer));
-    sheet.row("Drives the OpenGL context", yesOrNo(device.drivesRenderer));
-    sheet.row("Available", yesOrNo(device.available));
-    sheet.row("Double precision", yesOrNo(device.doublePrecision));
-    for (const Extension& extension : relevantExtensions())
-        sheet.row(extension.name, yesOrNo(listsExtension(device.extensions, extension.name)));
+    writer.section("  Device: " + device.name);
+    writer.row("Verdict", verdict(deviceRejection(diagnostics, platform, device)));
+    writer.row("Type", deviceTypeName(device.type));
+    writer.row("Vendor", device.vendor + (device.vendorId ? ", id " + hex(*device.vendorId) : ""));
+    writer.row("Version, driver", device.version + ", " + device.driverVersion);
+    writer.row("Compute units", std::to_string(device.computeUnits));
+    writer.row("Shares with the OpenGL context", yesOrNo(device.sharesWithRenderer));
+    writer.row("Drives the OpenGL context", yesOrNo(device.drivesRenderer));
+    writer.row("Available", yesOrNo(device.available));
+    writer.row("Double precision", yesOrNo(device.doublePrecision));
+    for (const Extension& extension : kRelevantExtensions)
+        writer.row(extension.name, yesOrNo(listsExtension(device.extensions, extension.name)));
 }
 
-void addPlatforms(Sheet& sheet, const Facts& facts)
+void addPlatforms(ReportWriter& writer, const Diagnostics& diagnostics)
 {
-    if (facts.loader.loaded && facts.platforms.empty()) {
-        sheet.section("Platforms");
-        sheet.paragraph("There is none: " + describeStatus(facts.platformStatus) + ".");
+    if (diagnostics.loader.loaded && diagnostics.platforms.empty()) {
+        writer.section("Platforms");
+        writer.paragraph("There is none: " + describeStatus(diagnostics.platformStatus) + ".");
     }
-    for (const Platform& platform : facts.platforms) {
-        sheet.section("Platform: " + platform.name);
-        sheet.row("Verdict", verdict(platformRejection(facts, platform)));
-        sheet.row("Vendor", platform.vendor);
-        sheet.row("Version", platform.version);
-        for (const Extension& extension : relevantExtensions())
-            sheet.row(extension.name, yesOrNo(listsExtension(platform.extensions, extension.name)) +
-                                          " (" + extension.purpose + ")");
+    for (const Platform& platform : diagnostics.platforms) {
+        writer.section("Platform: " + platform.name);
+        writer.row("Verdict", verdict(platformRejection(diagnostics, platform)));
+        writer.row("Vendor", platform.vendor);
+        writer.row("Version", platform.version);
+        for (const Extension& extension : kRelevantExtensions)
+            writer.row(extension.name,
+                       yesOrNo(listsExtension(platform.extensions, extension.name)) + " (" +
+                           extension.purpose + ")");
         for (const Device& device : platform.devices)
-            addDevice(sheet, facts, platform, device);
+            addDevice(writer, diagnostics, platform, device);
     }
 }
 
-void addDecisions(Sheet& sheet, const Explanation& explanation)
+void addDecisions(ReportWriter& writer, const Explanation& explanation)
 {
     if (explanation.decisions.empty())
         return;
-    sheet.section("What was decided, and why");
+    writer.section("Decisions of start-up");
     for (const Decision& decision : explanation.decisions)
-        sheet.row(decision.title, decision.value + ", because " + decision.reason + ".");
-    const std::string pair = rendererBesideDevice(explanation.facts);
+        writer.row(decision.title, decision.value + ", because " + decision.reason + ".");
+    const std::string pair = rendererDeviceMismatch(explanation.diagnostics);
     if (!pair.empty())
-        sheet.row("Note", pair + ".");
+        writer.row("Note", pair + ".");
 }
 
 const char* effectText(Effect effect)
@@ -133,52 +135,52 @@ const char* effectText(Effect effect)
     return "";
 }
 
-void addVariables(Sheet& sheet, const Explanation& explanation)
+void addVariables(ReportWriter& writer, const Explanation& explanation)
 {
-    sheet.section("Environment variables that are set");
+    writer.section("Environment variables that are set");
     if (explanation.variables.empty())
-        sheet.paragraph("None that matters.");
+        writer.paragraph("None that is relevant.");
     for (const VariableReport& report : explanation.variables) {
         std::string text = effectText(report.effect) + report.explanation + ".";
         if (!report.suggestion.empty())
             text += " Probably " + report.suggestion + " is meant.";
-        sheet.paragraph(report.name + "=" + report.value);
-        sheet.row("", text);
+        writer.paragraph(report.name + "=" + report.value);
+        writer.row("", text);
     }
 }
 
-void addSelfTest(Sheet& sheet, const SelfTest& test)
+void addSelfTest(ReportWriter& writer, const SelfTest& test)
 {
-    sheet.section("Self-test: a shared buffer of " + std::to_string(test.vertices) + " vertices");
-    sheet.row("Result", test.passed
-                            ? "right in " + std::to_string(test.evaluations) + " evaluations"
-                            : "FAILED: " + test.problem);
+    writer.section("Self-test: a shared buffer of " + std::to_string(test.vertices) + " vertices");
+    writer.row("Result", test.passed
+                             ? "passed in " + std::to_string(test.evaluations) + " evaluations"
+                             : "FAILED: " + test.problem);
     if (test.status != CL_SUCCESS)
-        sheet.row("Status", describeStatus(test.status));
+        writer.row("Status", describeStatus(test.status));
     if (!test.passed) {
-        sheet.row("What helps", kSelfTestRemedy);
+        writer.row("What helps", kSelfTestRemedy);
         return;
     }
-    sheet.row("Building the kernel", milliseconds(test.times.kernelBuild));
-    sheet.row("First evaluation", milliseconds(test.times.firstEvaluation));
-    sheet.row("Evaluation, median", milliseconds(test.times.evaluation));
-    sheet.row("Acquire, waited for", milliseconds(test.times.acquire));
-    sheet.row("Kernel, waited for", milliseconds(test.times.kernel));
-    sheet.row("Release, waited for", milliseconds(test.times.release));
-    sheet.row("OpenGL reads the result", milliseconds(test.times.read));
+    writer.row("Building the kernel", milliseconds(test.times.kernelBuild));
+    writer.row("First evaluation", milliseconds(test.times.firstEvaluation));
+    writer.row("Evaluation, median", milliseconds(test.times.evaluation));
+    writer.row("Acquire, waited for", milliseconds(test.times.acquire));
+    writer.row("Kernel, waited for", milliseconds(test.times.kernel));
+    writer.row("Release, waited for", milliseconds(test.times.release));
+    writer.row("OpenGL reads the result", milliseconds(test.times.read));
 }
 
-void addWarnings(Sheet& sheet, const std::string& title, const std::vector<std::string>& warnings)
+void addWarnings(ReportWriter& writer, const std::string& title,
+                 const std::vector<Warning>& warnings)
 {
     if (warnings.empty())
         return;
-    sheet.section(title);
-    for (const std::string& warning : warnings) {
-        const std::optional<int> status = statusInWarning(warning);
-        if (status)
-            sheet.row("OpenCL error", describeStatus(*status));
+    writer.section(title);
+    for (const Warning& warning : warnings) {
+        if (warning.status != CL_SUCCESS)
+            writer.row("OpenCL error", describeStatus(warning.status));
         else
-            sheet.quote(warning);
+            writer.quote(warning.text);
     }
 }
 
@@ -186,26 +188,27 @@ void addWarnings(Sheet& sheet, const std::string& title, const std::vector<std::
 
 std::string textReport(const Explanation& explanation)
 {
-    const Facts& facts = explanation.facts;
-    Sheet sheet;
-    sheet.section(explanation.summary);
-    if (explanation.stop)
-        addStop(sheet, *explanation.stop);
-    addRenderer(sheet, facts.renderer);
-    addLoader(sheet, facts.loader);
-    addPlatforms(sheet, facts);
-    addDecisions(sheet, explanation);
-    addVariables(sheet, explanation);
-    if (facts.selfTest)
-        addSelfTest(sheet, *facts.selfTest);
-    addWarnings(sheet, "Failing OpenCL calls during start-up", facts.startUp.warnings);
-    if (facts.selfTest)
-        addWarnings(sheet, "Failing OpenCL calls during the self-test", facts.selfTest->warnings);
-    if (facts.startUp.attempted) {
-        sheet.section("What start-up printed");
-        sheet.quote(facts.startUp.output);
+    const Diagnostics& diagnostics = explanation.diagnostics;
+    ReportWriter writer;
+    writer.section(explanation.summary);
+    if (explanation.failure)
+        addFailure(writer, *explanation.failure);
+    addRenderer(writer, diagnostics.renderer);
+    addLoader(writer, diagnostics.loader);
+    addPlatforms(writer, diagnostics);
+    addDecisions(writer, explanation);
+    addVariables(writer, explanation);
+    if (diagnostics.selfTest)
+        addSelfTest(writer, *diagnostics.selfTest);
+    addWarnings(writer, "Failing OpenCL calls during start-up", diagnostics.startUp.warnings);
+    if (diagnostics.selfTest)
+        addWarnings(writer, "Failing OpenCL calls during the self-test",
+                    diagnostics.selfTest->warnings);
+    if (diagnostics.startUp.attempted) {
+        writer.section("Output of start-up");
+        writer.quote(diagnostics.startUp.output);
     }
-    return sheet.text();
+    return writer.text();
 }
 
 } // namespace info

@@ -1,4 +1,4 @@
-// The report for people.
+// The report as text.
 #pragma once
 
 #include "tools/info/rules/Explanation.h"
@@ -7,6 +7,6 @@
 
 namespace info {
 
-std::string textReport(const Explanation& explanation);
+[[nodiscard]] std::string textReport(const Explanation& explanation);
 
 } // namespace info

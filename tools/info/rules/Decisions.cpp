@@ -10,20 +10,22 @@
 namespace info {
 namespace {
 
-Decision decidePlatform(const Facts& facts, const Platform& platform)
+Decision decidePlatform(const Diagnostics& diagnostics, const Platform& platform)
 {
     Decision decision{"platform", "Platform", platform.name + " of " + platform.vendor, "", ""};
-    if (facts.environment.platformWasChosen) {
-        decision.reason = "no GPU vendor follows from the renderer, and this platform alone shares "
-                          "with OpenGL";
-    } else if (facts.environment.find("VYRA_OPENCL_PLATFORM")) {
-        decision.reason = facts.environment.platformFromOption
+    if (diagnostics.environment.platformWasChosen) {
+        decision.reason = "no GPU vendor can be derived from the renderer, and this platform alone "
+                          "shares with OpenGL";
+    } else if (diagnostics.environment.find("VYRA_OPENCL_PLATFORM")) {
+        decision.reason = diagnostics.environment.platformFromOption
                               ? "--platform names its vendor"
                               : "VYRA_OPENCL_PLATFORM names its vendor";
         decision.variable = "VYRA_OPENCL_PLATFORM";
     } else {
-        const bool fromRenderer = facts.renderer.adapterVendorId == facts.startUp.vendorId;
-        decision.reason = "its vendor goes with the vendor id " + hex(facts.startUp.vendorId) +
+        const bool fromRenderer =
+            diagnostics.renderer.adapterVendorId == diagnostics.startUp.vendorId;
+        decision.reason = "its vendor belongs to the vendor id " +
+                          hex(diagnostics.startUp.vendorId) +
                           (fromRenderer ? " of the GPU that draws" : " given with --device-vendor");
     }
     return decision;
@@ -37,16 +39,16 @@ Decision decideDevice(const Device& device)
             ""};
 }
 
-Decision decideDriver(const Facts& facts, const Device& device)
+Decision decideDriver(const Diagnostics& diagnostics, const Device& device)
 {
     Decision decision{"driver", "Driver", "accepted (" + device.driverVersion + ")", "", ""};
-    if (facts.startUp.provider != kNVIDIAProvider) {
+    if (diagnostics.startUp.provider != kNVIDIAProvider) {
         decision.reason = "rules exist for NVIDIA's drivers only";
         return decision;
     }
-    const std::optional<DriverVerdict> verdict = judgeChosenDriver(facts, std::nullopt);
+    const std::optional<DriverVerdict> verdict = judgeChosenDriver(diagnostics, std::nullopt);
     if (!verdict) {
-        decision.reason = "its version cannot be read as NVIDIA writes it";
+        decision.reason = "its version does not have the form of NVIDIA's versions";
     } else if (verdict->usable) {
         decision.reason = "it is outside the range 361.92 to 368.85, whose OpenCL fails";
     } else {
@@ -57,11 +59,11 @@ Decision decideDriver(const Facts& facts, const Device& device)
     return decision;
 }
 
-Decision decideReadback(const Facts& facts)
+Decision decideReadback(const Diagnostics& diagnostics)
 {
     Decision decision{"async-readback", "Asynchronous read-back",
-                      yesOrNo(facts.startUp.asyncReadback), "", ""};
-    switch (facts.startUp.provider) {
+                      yesOrNo(diagnostics.startUp.asyncReadback), "", ""};
+    switch (diagnostics.startUp.provider) {
     case kNVIDIAProvider:
         decision.reason = "NVIDIA's drivers have it from 359.91 on";
         break;
@@ -70,34 +72,34 @@ Decision decideReadback(const Facts& facts)
         decision.reason = "all drivers of this vendor have it";
         break;
     default:
-        decision.reason = "only drivers of NVIDIA, AMD and Intel are trusted with it";
+        decision.reason = "only drivers of NVIDIA, AMD and Intel are known to have it";
     }
     return decision;
 }
 
-Decision decideDoublePrecision(const Facts& facts, const Platform& platform)
+Decision decideDoublePrecision(const Diagnostics& diagnostics, const Platform& platform)
 {
-    const bool supported = facts.startUp.doublePrecision;
+    const bool supported = diagnostics.startUp.doublePrecision;
     const bool old =
         platform.version.starts_with("OpenCL 1.0") || platform.version.starts_with("OpenCL 1.1");
     const std::string verb = supported ? "lists" : "does not list";
     return {"double-precision", "Double precision", yesOrNo(supported),
             old ? "the platform (" + platform.version.substr(0, 10) + ") " + verb + " cl_khr_fp64"
                 : std::string("the device reports that it ") +
-                      (supported ? "computes" : "cannot compute") + " with it",
+                      (supported ? "supports" : "does not support") + " it",
             ""};
 }
 
-Decision decideMinimumVertices(const Facts& facts)
+Decision decideMinimumVertices(const Diagnostics& diagnostics)
 {
     constexpr char kVariable[] = "VYRA_OPENCL_DEFORMER_MIN_VERTS";
-    Decision decision{"minimum-vertices", "Vertices that a mesh needs",
-                      std::to_string(facts.startUp.minimumVertices), "", ""};
-    if (facts.environment.find(kVariable)) {
+    Decision decision{"minimum-vertices", "Minimum vertices of a mesh",
+                      std::to_string(diagnostics.startUp.minimumVertices), "", ""};
+    if (diagnostics.environment.find(kVariable)) {
         decision.reason = std::string(kVariable) + " sets it";
         decision.variable = kVariable;
     } else {
-        decision.reason = facts.startUp.provider == kNVIDIAProvider
+        decision.reason = diagnostics.startUp.provider == kNVIDIAProvider
                               ? "it is the default with NVIDIA"
                               : "it is the default";
     }
@@ -106,33 +108,33 @@ Decision decideMinimumVertices(const Facts& facts)
 
 } // namespace
 
-std::vector<Decision> explainDecisions(const Facts& facts)
+std::vector<Decision> explainDecisions(const Diagnostics& diagnostics)
 {
-    const std::optional<Stop> stop = findStop(facts);
-    const auto passed = [&stop](Step step) { return !stop || stop->step > step; };
+    const std::optional<StartUpFailure> failure = findStartUpFailure(diagnostics);
+    const auto passed = [&](StartUpStep step) { return !failure || failure->step > step; };
     std::vector<Decision> decisions;
-    const Platform* platform = chosenPlatform(facts);
-    if (!platform || !passed(Step::kPlatform))
+    const Platform* platform = chosenPlatform(diagnostics);
+    if (!platform || !passed(StartUpStep::kPlatform))
         return decisions;
-    decisions.push_back(decidePlatform(facts, *platform));
-    decisions.push_back(decideMinimumVertices(facts));
-    decisions.push_back(decideBatching(facts));
-    decisions.push_back(decideThreadedSharing(facts));
-    const Device* device = chosenDevice(facts);
+    decisions.push_back(decidePlatform(diagnostics, *platform));
+    decisions.push_back(decideMinimumVertices(diagnostics));
+    decisions.push_back(decideBatching(diagnostics));
+    decisions.push_back(decideThreadedSharing(diagnostics));
+    const Device* device = chosenDevice(diagnostics);
     if (!device)
         return decisions;
     decisions.push_back(decideDevice(*device));
-    if (passed(Step::kDriver)) {
-        decisions.push_back(decideDriver(facts, *device));
-        decisions.push_back(decideReadback(facts));
+    if (passed(StartUpStep::kDriver)) {
+        decisions.push_back(decideDriver(diagnostics, *device));
+        decisions.push_back(decideReadback(diagnostics));
     }
-    if (passed(Step::kContext)) {
-        decisions.push_back(decideGraphicsToCL(facts));
-        decisions.push_back(decideCLToGraphics(facts));
+    if (passed(StartUpStep::kContext)) {
+        decisions.push_back(decideGraphicsToCL(diagnostics));
+        decisions.push_back(decideCLToGraphics(diagnostics));
     }
-    if (passed(Step::kAvailability) &&
-        !(stop && stop->status && stop->step == Step::kDoublePrecision))
-        decisions.push_back(decideDoublePrecision(facts, *platform));
+    if (passed(StartUpStep::kAvailability) &&
+        !(failure && failure->status && failure->step == StartUpStep::kDoublePrecision))
+        decisions.push_back(decideDoublePrecision(diagnostics, *platform));
     return decisions;
 }
 

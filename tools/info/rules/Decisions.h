@@ -1,4 +1,4 @@
-// What start-up decided, and why.
+// The decisions of start-up, with their reasons.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -13,10 +13,10 @@ struct Decision {
     std::string title;
     std::string value;
     std::string reason;
-    std::string variable; // the environment variable that made the difference; empty: none did
+    std::string variable; // the environment variable that changed it; empty if none did
 };
 
-// All that start-up came to, in its order.
-std::vector<Decision> explainDecisions(const Facts& facts);
+// Returns the decisions that start-up reached, in its order.
+[[nodiscard]] std::vector<Decision> explainDecisions(const Diagnostics& diagnostics);
 
 } // namespace info

@@ -4,10 +4,11 @@
 
 namespace info {
 
-std::optional<DriverVerdict> judgeChosenDriver(const Facts& facts, std::optional<int> ignoreVersion)
+std::optional<DriverVerdict> judgeChosenDriver(const Diagnostics& diagnostics,
+                                               std::optional<int> ignoreVersion)
 {
-    const Device* device = chosenDevice(facts);
-    if (facts.startUp.provider != kNVIDIAProvider || !device)
+    const Device* device = chosenDevice(diagnostics);
+    if (diagnostics.startUp.provider != kNVIDIAProvider || !device)
         return std::nullopt;
     try {
         return judgeDriver(parseDriverVersion(device->driverVersion), ignoreVersion);

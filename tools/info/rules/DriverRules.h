@@ -8,10 +8,10 @@
 
 namespace info {
 
-// What the library holds of the device's driver with this value of
-// VYRA_OPENCL_IGNORE_DRIVER_VERSION. Empty where no rule applies: another vendor, no device, or a
-// version text that cannot be read.
-std::optional<DriverVerdict> judgeChosenDriver(const Facts& facts,
-                                               std::optional<int> ignoreVersion);
+// Returns the library's verdict on the driver of the chosen device, for this value of
+// VYRA_OPENCL_IGNORE_DRIVER_VERSION. Empty if no rule applies: another vendor, no device, or a
+// version text that cannot be parsed.
+[[nodiscard]] std::optional<DriverVerdict> judgeChosenDriver(const Diagnostics& diagnostics,
+                                                             std::optional<int> ignoreVersion);
 
 } // namespace info

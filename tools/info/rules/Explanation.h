@@ -1,4 +1,4 @@
-// Everything that the reports tell: the facts, and the rules' reading of them.
+// The contents of the reports: the diagnostics, and the results of all rules.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -12,7 +12,7 @@
 
 namespace info {
 
-// What the process answers to the shell. Documented in --help.
+// The exit codes of the process, documented in --help.
 enum class ExitCode {
     kOn = 0,
     kOff = 1,
@@ -22,14 +22,14 @@ enum class ExitCode {
 };
 
 struct Explanation {
-    Facts facts;
-    std::optional<Stop> stop;
+    Diagnostics diagnostics;
+    std::optional<StartUpFailure> failure;
     std::vector<Decision> decisions;
     std::vector<VariableReport> variables;
     ExitCode exitCode = ExitCode::kOff;
     std::string summary; // one sentence
 };
 
-Explanation explain(Facts facts);
+[[nodiscard]] Explanation explain(Diagnostics diagnostics);
 
 } // namespace info

@@ -1,12 +1,11 @@
-// The sentences that go with each step at which start-up can stop.
+// The sentences for each step at which start-up can stop.
 #pragma once
 
-#include "tools/info/diagnostics/Diagnostics.h"
 #include "tools/info/rules/StartUpFailure.h"
 
 namespace info {
 
-// Fills reason and remedy of `stop`, whose step and status are known.
-void explainStop(const Facts& facts, Stop& stop);
+// Sets reason and remedy of `failure`, whose step and status are set.
+void explainFailure(const Diagnostics& diagnostics, StartUpFailure& failure);
 
 } // namespace info

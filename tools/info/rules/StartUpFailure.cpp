@@ -8,113 +8,67 @@
 namespace info {
 namespace {
 
-constexpr StepName kStepNames[] = {
-    {Step::kRenderer, "renderer", "an OpenGL renderer", "there is no OpenGL renderer"},
-    {Step::kSwitch, "switch", "OpenCL is not switched off", "it is switched off"},
-    {Step::kLoader, "loader", "the OpenCL library", "the OpenCL library cannot be loaded"},
-    {Step::kVendor, "vendor", "a vendor to look for", "the vendor to look for is not known"},
-    {Step::kPlatform, "platform", "a platform of that vendor",
+constexpr StepText kStepTexts[] = {
+    {StartUpStep::kNotStarted, "renderer", "an OpenGL renderer", "there is no OpenGL renderer"},
+    {StartUpStep::kSwitch, "switch", "OpenCL is not switched off", "it is switched off"},
+    {StartUpStep::kLoader, "loader", "the OpenCL library", "the OpenCL library cannot be loaded"},
+    {StartUpStep::kVendor, "vendor", "a vendor to look for", "the vendor to look for is unknown"},
+    {StartUpStep::kPlatform, "platform", "a platform of that vendor",
      "no platform has the vendor that is looked for"},
-    {Step::kDevice, "device", "a GPU that shares with OpenGL", "no GPU shares buffers with OpenGL"},
-    {Step::kDriver, "driver", "a driver whose OpenCL works", "the GPU's driver is refused"},
-    {Step::kContext, "context", "a context on the device", "no context can be made on the device"},
-    {Step::kSharingFunctions, "sharing-functions", "the functions for shared buffers",
+    {StartUpStep::kDevice, "device", "a GPU that shares with OpenGL",
+     "no GPU shares buffers with OpenGL"},
+    {StartUpStep::kDriver, "driver", "a driver whose OpenCL works", "the GPU's driver is refused"},
+    {StartUpStep::kContext, "context", "a context on the device",
+     "no context can be created on the device"},
+    {StartUpStep::kSharingFunctions, "sharing-functions", "the functions for shared buffers",
      "functions for shared buffers are missing"},
-    {Step::kAvailability, "availability", "the device is available", "the device is not available"},
-    {Step::kDoublePrecision, "double-precision", "double precision, where demanded",
-     "double precision is demanded and missing"},
-    {Step::kQueue, "queue", "a command queue", "no command queue can be made"},
+    {StartUpStep::kAvailability, "availability", "the device is available",
+     "the device is not available"},
+    {StartUpStep::kDoublePrecision, "double-precision", "double precision, if required",
+     "double precision is required and missing"},
+    {StartUpStep::kQueue, "queue", "a command queue", "no command queue can be created"},
 };
 
-// What start-up prints when it stops at a step.
-struct StopMessage {
-    Step step;
-    const char* text;
-};
-
-constexpr StopMessage kStopMessages[] = {
-    {Step::kSwitch, "OpenCL initialization has been disabled by user"},
-    {Step::kLoader, "OpenCL evaluator failed to initialize clew."},
-    {Step::kLoader, "CLEW failed to initialize"},
-    {Step::kVendor, "OpenCL evaluator encountered an unknown vendor id"},
-    {Step::kPlatform, "OpenCL evaluator failed to find OpenCL device with vendor"},
-    {Step::kDevice, "OpenCL evaluator is unable to find a GPU device"},
-    {Step::kDriver, "OpenCL is not supported by NVidia drivers between version"},
-    {Step::kSharingFunctions, "Error: found cl_khr_gl_sharing but failed to get function"},
-    {Step::kAvailability, "GL shared device is not available"},
-    {Step::kDoublePrecision, "Vyra OpenCL is not supported on device because double precision"},
-};
-
-// The last two things that start-up prints when all goes well.
-constexpr char kDeviceReported[] = "Device is available.\n";
-constexpr char kQueuesMade[] = "Device is available.\n\n";
-
-bool says(const StartUp& startUp, const char* text)
+StartUpStep failedStep(const Diagnostics& diagnostics)
 {
-    return startUp.output.find(text) != std::string::npos;
+    const StartUpStep step = diagnostics.startUp.lastStep;
+    // On a machine without a platform, every vendor would have failed.
+    const bool noPlatform = diagnostics.loader.loaded && diagnostics.platforms.empty();
+    return step == StartUpStep::kVendor && noPlatform ? StartUpStep::kPlatform : step;
 }
 
-// A failing query stops without a message: what is there tells how far start-up came.
-Step stepOfSilentStop(const Facts& facts)
+// Returns the status of the first call that failed in the step that stopped.
+std::optional<int> failedStatus(const StartUp& startUp)
 {
-    const StartUp& startUp = facts.startUp;
-    if (!startUp.hasDevice)
-        return Step::kDevice;
-    const Device* device = chosenDevice(facts);
-    if (!startUp.hasContext) {
-        const bool asksDriver = startUp.provider == kNVIDIAProvider;
-        return asksDriver && device && device->driverVersion.empty() ? Step::kDriver
-                                                                     : Step::kContext;
-    }
-    if (says(startUp, kQueuesMade))
-        return Step::kQueue;
-    return says(startUp, kDeviceReported) ? Step::kDoublePrecision : Step::kAvailability;
-}
-
-Step stepOfStop(const Facts& facts)
-{
-    if (!facts.renderer.usable)
-        return Step::kRenderer;
-    for (const StopMessage& message : kStopMessages) {
-        if (!says(facts.startUp, message.text))
-            continue;
-        // Without a platform no vendor would have helped.
-        const bool noPlatform = facts.loader.loaded && facts.platforms.empty();
-        return message.step == Step::kVendor && noPlatform ? Step::kPlatform : message.step;
-    }
-    return stepOfSilentStop(facts);
-}
-
-// The call that failed last is the one that start-up stopped at.
-std::optional<int> statusOfStop(const StartUp& startUp)
-{
-    const auto failed = std::find_if(
-        startUp.warnings.rbegin(), startUp.warnings.rend(),
-        [](const std::string& warning) { return statusInWarning(warning).has_value(); });
-    return failed != startUp.warnings.rend() ? statusInWarning(*failed) : std::nullopt;
+    const auto failed =
+        std::find_if(startUp.warnings.begin(), startUp.warnings.end(), [&](const Warning& warning) {
+            return warning.status != CL_SUCCESS && warning.step == startUp.lastStep;
+        });
+    return failed != startUp.warnings.end() ? std::optional<int>(failed->status) : std::nullopt;
 }
 
 } // namespace
 
-std::span<const StepName> stepNames()
+std::span<const StepText> stepTexts() noexcept
 {
-    return kStepNames;
+    return kStepTexts;
 }
 
-const StepName& stepName(Step step)
+const StepText& stepText(StartUpStep step) noexcept
 {
-    return kStepNames[static_cast<std::size_t>(step)];
+    return *std::find_if(std::begin(kStepTexts), std::end(kStepTexts) - 1,
+                         [step](const StepText& text) { return text.step == step; });
 }
 
-std::optional<Stop> findStop(const Facts& facts)
+std::optional<StartUpFailure> findStartUpFailure(const Diagnostics& diagnostics)
 {
-    if (facts.startUp.valid)
+    if (diagnostics.startUp.valid)
         return std::nullopt;
-    Stop stop{stepOfStop(facts), statusOfStop(facts.startUp), "", ""};
-    explainStop(facts, stop);
-    if (stop.status)
-        stop.reason += " The call that failed returned " + describeStatus(*stop.status) + ".";
-    return stop;
+    StartUpFailure failure{failedStep(diagnostics), failedStatus(diagnostics.startUp), "", ""};
+    explainFailure(diagnostics, failure);
+    if (failure.status)
+        failure.reason += " The call that failed returned " + describeStatus(*failure.status) + ".";
+    return failure;
 }
 
 } // namespace info

@@ -1,4 +1,4 @@
-// Why OpenCL is off: the first step of start-up that stopped, and what would make it go on.
+// The step that stopped start-up, with reason and remedy.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -9,41 +9,27 @@
 
 namespace info {
 
-// In the order in which start-up takes them.
-enum class Step {
-    kRenderer,
-    kSwitch,
-    kLoader,
-    kVendor,
-    kPlatform,
-    kDevice,
-    kDriver,
-    kContext,
-    kSharingFunctions,
-    kAvailability,
-    kDoublePrecision,
-    kQueue,
-};
-
-struct StepName {
-    Step step;
+// The texts of a step. StartUpStep::kNotStarted stands for the renderer, without which start-up is
+// not attempted.
+struct StepText {
+    StartUpStep step;
     const char* id;      // in JSON
-    const char* title;   // what the step needs to go on
-    const char* failure; // what is wrong when it stops
+    const char* title;   // the requirement of the step
+    const char* failure; // the summary if the step fails
 };
 
-// All steps, in order.
-std::span<const StepName> stepNames();
-const StepName& stepName(Step step);
+// Returns the steps of a start-up with OpenGL, in order.
+std::span<const StepText> stepTexts() noexcept;
+const StepText& stepText(StartUpStep step) noexcept;
 
-struct Stop {
-    Step step;
+struct StartUpFailure {
+    StartUpStep step;
     std::optional<int> status; // of the OpenCL call that failed
     std::string reason;        // whole sentences
     std::string remedy;        // whole sentences
 };
 
-// Empty when OpenCL is on.
-std::optional<Stop> findStop(const Facts& facts);
+// Returns the failure. Empty if OpenCL is on.
+[[nodiscard]] std::optional<StartUpFailure> findStartUpFailure(const Diagnostics& diagnostics);
 
 } // namespace info

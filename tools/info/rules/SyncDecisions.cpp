@@ -8,31 +8,31 @@ namespace {
 constexpr char kForceFinish[] = "VYRA_OPENCL_FORCE_FINISH";
 constexpr char kForceThreading[] = "VYRA_OPENCL_FORCE_THREADING";
 
-// What the library weighs, from what was found.
-SyncAbilities abilitiesOf(const Facts& facts)
+// Returns the inputs of the library's choice.
+SyncAbilities abilitiesOf(const Diagnostics& diagnostics)
 {
-    const Platform* platform = chosenPlatform(facts);
+    const Platform* platform = chosenPlatform(diagnostics);
     const std::optional<DriverVerdict> driver =
-        judgeChosenDriver(facts, facts.environment.ignoreDriverVersion);
+        judgeChosenDriver(diagnostics, diagnostics.environment.ignoreDriverVersion);
     return {
         .glEvent = platform && listsExtension(platform->extensions, "cl_khr_gl_event"),
-        .arbSync = facts.renderer.syncObjects,
+        .arbSync = diagnostics.renderer.syncObjects,
         .implicitSyncTrusted =
-            facts.startUp.provider != kNVIDIAProvider || (driver && driver->implicitSync),
+            diagnostics.startUp.provider != kNVIDIAProvider || (driver && driver->implicitSync),
     };
 }
 
-// The sentence for a mode that a variable forces, with what became of the wish.
-std::string forcedReason(const std::string& variable, int wish, int mode, bool glEvent)
+// Returns the reason for a mode if a variable requests the mode `requested`.
+std::string forcedReason(const std::string& variable, int requested, int mode, bool glEvent)
 {
-    const std::string assignment = variable + "=" + std::to_string(wish);
-    if (mode != wish)
+    const std::string assignment = variable + "=" + std::to_string(requested);
+    if (mode != requested)
+        return assignment + " requests a mode that this machine does not support, so the library "
+                            "uses this one";
+    if (requested == TopenCLInfo::kGraphicsToCLImplicit && !glEvent)
         return assignment +
-               " asks for a mode that this machine lacks the means for, so the library "
-               "takes this one";
-    if (wish == TopenCLInfo::kGraphicsToCLImplicit && !glEvent)
-        return assignment + " forces it, though the platform does not list cl_khr_gl_event: expect "
-                            "wrong pictures";
+               " forces it, although the platform does not list cl_khr_gl_event: expect "
+               "wrong pictures";
     return assignment + " forces it";
 }
 
@@ -66,31 +66,31 @@ std::string clToGraphicsModeName(TopenCLInfo::CLToGraphicsSyncMode mode)
     return "unknown";
 }
 
-TopenCLInfo::GraphicsToCLSyncMode automaticGraphicsToCLMode(const Facts& facts)
+TopenCLInfo::GraphicsToCLSyncMode automaticGraphicsToCLMode(const Diagnostics& diagnostics)
 {
-    return chooseGraphicsToCLSyncMode(0, abilitiesOf(facts)).mode;
+    return chooseGraphicsToCLSyncMode(0, abilitiesOf(diagnostics)).mode;
 }
 
-TopenCLInfo::CLToGraphicsSyncMode automaticCLToGraphicsMode(const Facts& facts)
+TopenCLInfo::CLToGraphicsSyncMode automaticCLToGraphicsMode(const Diagnostics& diagnostics)
 {
-    return chooseCLToGraphicsSyncMode(0, abilitiesOf(facts)).mode;
+    return chooseCLToGraphicsSyncMode(0, abilitiesOf(diagnostics)).mode;
 }
 
-Decision decideGraphicsToCL(const Facts& facts)
+Decision decideGraphicsToCL(const Diagnostics& diagnostics)
 {
     constexpr char kVariable[] = "VYRA_GRAPHICSTOOPENCL_SYNC_MODE";
-    const SyncModeVariables& wishes = facts.environment.syncModes;
-    const SyncAbilities abilities = abilitiesOf(facts);
-    const TopenCLInfo::GraphicsToCLSyncMode mode = facts.startUp.graphicsToCL;
+    const SyncModeVariables& requested = diagnostics.environment.syncModes;
+    const SyncAbilities abilities = abilitiesOf(diagnostics);
+    const TopenCLInfo::GraphicsToCLSyncMode mode = diagnostics.startUp.graphicsToCL;
     Decision decision{"graphics-to-opencl", "OpenCL waits for OpenGL by",
                       graphicsToCLModeName(mode), "", ""};
-    if (wishes.forceFinish != 0) {
+    if (requested.forceFinish != 0) {
         decision.reason = std::string(kForceFinish) + " forces it";
         decision.variable = kForceFinish;
-    } else if (wishes.graphicsToCL >= TopenCLInfo::kGraphicsToCLImplicit &&
-               wishes.graphicsToCL <= TopenCLInfo::kGraphicsToCLFinish) {
-        decision.reason = forcedReason(kVariable, wishes.graphicsToCL, mode, abilities.glEvent);
-        if (mode != automaticGraphicsToCLMode(facts))
+    } else if (requested.graphicsToCL >= TopenCLInfo::kGraphicsToCLImplicit &&
+               requested.graphicsToCL <= TopenCLInfo::kGraphicsToCLFinish) {
+        decision.reason = forcedReason(kVariable, requested.graphicsToCL, mode, abilities.glEvent);
+        if (mode != automaticGraphicsToCLMode(diagnostics))
             decision.variable = kVariable;
     } else if (abilities.glEvent) {
         decision.reason = "the platform lists cl_khr_gl_event";
@@ -101,21 +101,21 @@ Decision decideGraphicsToCL(const Facts& facts)
     return decision;
 }
 
-Decision decideCLToGraphics(const Facts& facts)
+Decision decideCLToGraphics(const Diagnostics& diagnostics)
 {
     constexpr char kVariable[] = "VYRA_OPENCLTOGRAPHICS_SYNC_MODE";
-    const SyncModeVariables& wishes = facts.environment.syncModes;
-    const SyncAbilities abilities = abilitiesOf(facts);
-    const TopenCLInfo::CLToGraphicsSyncMode mode = facts.startUp.clToGraphics;
+    const SyncModeVariables& requested = diagnostics.environment.syncModes;
+    const SyncAbilities abilities = abilitiesOf(diagnostics);
+    const TopenCLInfo::CLToGraphicsSyncMode mode = diagnostics.startUp.clToGraphics;
     Decision decision{"opencl-to-graphics", "OpenGL waits for OpenCL by",
                       clToGraphicsModeName(mode), "", ""};
-    if (wishes.forceFinish != 0) {
+    if (requested.forceFinish != 0) {
         decision.reason = std::string(kForceFinish) + " forces it";
         decision.variable = kForceFinish;
-    } else if (wishes.clToGraphics >= TopenCLInfo::kCLToGraphicsImplicit &&
-               wishes.clToGraphics <= TopenCLInfo::kCLToGraphicsFinish) {
-        decision.reason = forcedReason(kVariable, wishes.clToGraphics, mode, true);
-        if (mode != automaticCLToGraphicsMode(facts))
+    } else if (requested.clToGraphics >= TopenCLInfo::kCLToGraphicsImplicit &&
+               requested.clToGraphics <= TopenCLInfo::kCLToGraphicsFinish) {
+        decision.reason = forcedReason(kVariable, requested.clToGraphics, mode, true);
+        if (mode != automaticCLToGraphicsMode(diagnostics))
             decision.variable = kVariable;
     } else if (!abilities.glEvent) {
         decision.reason = "the platform does not list cl_khr_gl_event";
@@ -124,20 +124,20 @@ Decision decideCLToGraphics(const Facts& facts)
     } else {
         decision.reason = "the platform lists cl_khr_gl_event";
         const bool trusted =
-            judgeChosenDriver(facts, std::nullopt).value_or(DriverVerdict{}).implicitSync;
-        if (facts.startUp.provider == kNVIDIAProvider && !trusted)
+            judgeChosenDriver(diagnostics, std::nullopt).value_or(DriverVerdict{}).implicitSync;
+        if (diagnostics.startUp.provider == kNVIDIAProvider && !trusted)
             decision.variable = "VYRA_OPENCL_IGNORE_DRIVER_VERSION";
     }
     return decision;
 }
 
-Decision decideThreadedSharing(const Facts& facts)
+Decision decideThreadedSharing(const Diagnostics& diagnostics)
 {
     Decision decision{"threaded-sharing", "Sharing from several threads",
-                      facts.startUp.threadedSharing ? "yes" : "no", "", ""};
-    if (facts.startUp.provider != kNVIDIAProvider) {
+                      diagnostics.startUp.threadedSharing ? "yes" : "no", "", ""};
+    if (diagnostics.startUp.provider != kNVIDIAProvider) {
         decision.reason = "only NVIDIA's OpenGL sharing does not allow it";
-    } else if (facts.environment.find(kForceThreading)) {
+    } else if (diagnostics.environment.find(kForceThreading)) {
         decision.reason = std::string(kForceThreading) + " is set";
         decision.variable = kForceThreading;
     } else {
@@ -146,15 +146,15 @@ Decision decideThreadedSharing(const Facts& facts)
     return decision;
 }
 
-Decision decideBatching(const Facts& facts)
+Decision decideBatching(const Diagnostics& diagnostics)
 {
-    const bool forced = facts.environment.find(kForceThreading) != nullptr;
+    const bool forced = diagnostics.environment.find(kForceThreading) != nullptr;
     if (forced)
         return {"batching", "Shared buffers in one batch", "no",
                 std::string(kForceThreading) + " is set: each buffer is acquired on its own",
                 kForceThreading};
     return {"batching", "Shared buffers in one batch", "yes",
-            "one acquire and one release serve all buffers", ""};
+            "one acquire and one release cover all buffers", ""};
 }
 
 } // namespace info

@@ -1,4 +1,4 @@
-// How the library orders the work of OpenCL and of the renderer, and why.
+// The decisions on how OpenCL and the renderer wait for each other.
 #pragma once
 
 #include "tools/info/rules/Decisions.h"
@@ -7,17 +7,17 @@
 
 namespace info {
 
-// "implicit (1)"
+// Return a mode's name with its number: "implicit (1)".
 std::string graphicsToCLModeName(TopenCLInfo::GraphicsToCLSyncMode mode);
 std::string clToGraphicsModeName(TopenCLInfo::CLToGraphicsSyncMode mode);
 
-// What the library would choose if no variable forced a mode.
-TopenCLInfo::GraphicsToCLSyncMode automaticGraphicsToCLMode(const Facts& facts);
-TopenCLInfo::CLToGraphicsSyncMode automaticCLToGraphicsMode(const Facts& facts);
+// Return the mode that the library would choose without a variable that forces one.
+TopenCLInfo::GraphicsToCLSyncMode automaticGraphicsToCLMode(const Diagnostics& diagnostics);
+TopenCLInfo::CLToGraphicsSyncMode automaticCLToGraphicsMode(const Diagnostics& diagnostics);
 
-Decision decideGraphicsToCL(const Facts& facts);
-Decision decideCLToGraphics(const Facts& facts);
-Decision decideThreadedSharing(const Facts& facts);
-Decision decideBatching(const Facts& facts);
+Decision decideGraphicsToCL(const Diagnostics& diagnostics);
+Decision decideCLToGraphics(const Diagnostics& diagnostics);
+Decision decideThreadedSharing(const Diagnostics& diagnostics);
+Decision decideBatching(const Diagnostics& diagnostics);
 
 } // namespace info

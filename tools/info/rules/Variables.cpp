@@ -30,22 +30,22 @@ Finding withoutEffect(std::string explanation)
     return {Effect::kNone, std::move(explanation)};
 }
 
-Finding explainDisable(const Facts&)
+Finding explainDisable(const Diagnostics&)
 {
     return changed("switched OpenCL off: its presence alone counts, whatever the value");
 }
 
-Finding explainPlatform(const Facts& facts)
+Finding explainPlatform(const Diagnostics& diagnostics)
 {
-    return changed("named the vendor of the platform to look for, in place of the vendor id " +
-                   hex(facts.startUp.vendorId));
+    return changed("set the vendor of the platform to look for, in place of the vendor id " +
+                   hex(diagnostics.startUp.vendorId));
 }
 
-Finding explainMinimumVertices(const Facts& facts)
+Finding explainMinimumVertices(const Diagnostics& diagnostics)
 {
     return changed("set the number of vertices to " +
-                   std::to_string(facts.startUp.minimumVertices) +
-                   " (what is no number reads as 0, and so does a negative one)");
+                   std::to_string(diagnostics.startUp.minimumVertices) +
+                   " (a value that is negative or not a number reads as 0)");
 }
 
 bool sameVerdict(const DriverVerdict& one, const DriverVerdict& other)
@@ -53,91 +53,90 @@ bool sameVerdict(const DriverVerdict& one, const DriverVerdict& other)
     return one.usable == other.usable && one.implicitSync == other.implicitSync;
 }
 
-Finding explainIgnoreDriver(const Facts& facts)
+Finding explainIgnoreDriver(const Diagnostics& diagnostics)
 {
-    if (facts.startUp.provider != kNVIDIAProvider)
+    if (diagnostics.startUp.provider != kNVIDIAProvider)
         return withoutEffect("the platform is not NVIDIA's");
-    const auto with = judgeChosenDriver(facts, facts.environment.ignoreDriverVersion);
-    const auto without = judgeChosenDriver(facts, std::nullopt);
+    const auto with = judgeChosenDriver(diagnostics, diagnostics.environment.ignoreDriverVersion);
+    const auto without = judgeChosenDriver(diagnostics, std::nullopt);
     if (!with || !without)
-        return withoutEffect("the driver's version cannot be read");
+        return withoutEffect("the driver's version cannot be parsed");
     if (sameVerdict(*with, *without))
-        return withoutEffect("the driver would be judged the same without it");
-    return changed(with->usable == without->usable
-                       ? "trusted the driver's implicit synchronisation"
-                       : "accepted a driver of the range that is refused otherwise");
+        return withoutEffect("the verdict on the driver is the same without it");
+    return changed(with->usable == without->usable ? "trusted the driver's implicit synchronisation"
+                                                   : "accepted a driver of the refused range");
 }
 
-Finding explainDoubleDemand(const Facts& facts)
+Finding explainDoubleDemand(const Diagnostics& diagnostics)
 {
-    if (facts.environment.doubleDemanded == 0)
-        return withoutEffect("only a whole number other than 0 demands double precision");
-    if (facts.startUp.doublePrecision)
+    if (diagnostics.environment.requireDoublePrecision == 0)
+        return withoutEffect("only a whole number other than 0 requires double precision");
+    if (diagnostics.startUp.doublePrecision)
         return withoutEffect("the device has double precision");
     return changed("switched OpenCL off, since the device has no double precision");
 }
 
-Finding explainForceFinish(const Facts& facts)
+Finding explainForceFinish(const Diagnostics& diagnostics)
 {
-    if (facts.environment.syncModes.forceFinish == 0)
+    if (diagnostics.environment.syncModes.forceFinish == 0)
         return withoutEffect("only a whole number other than 0 forces finish calls");
     return changed("made both sides wait with finish calls");
 }
 
-// What became of a variable that forces a mode. Modes and wishes are the numbers of the modes.
-Finding explainForcedMode(const Facts& facts, int wish, int highest, int mode, int automatic)
+// Explains a variable that forces a mode. `requested`, `mode` and `automatic` are numbers of modes.
+Finding explainForcedMode(const Diagnostics& diagnostics, int requested, int highest, int mode,
+                          int automatic)
 {
-    if (facts.environment.syncModes.forceFinish != 0)
-        return withoutEffect("VYRA_OPENCL_FORCE_FINISH goes before it");
-    if (wish < 1 || wish > highest)
+    if (diagnostics.environment.syncModes.forceFinish != 0)
+        return withoutEffect("VYRA_OPENCL_FORCE_FINISH takes precedence");
+    if (requested < 1 || requested > highest)
         return withoutEffect("only the whole numbers 1 to " + std::to_string(highest) +
                              " force a mode");
-    if (mode != wish)
-        return withoutEffect("this machine lacks the means for that mode; the library says so at "
-                             "start-up");
+    if (mode != requested)
+        return withoutEffect("this machine does not support that mode; start-up prints a message");
     if (mode == automatic)
         return withoutEffect("the library chooses the same mode without it");
     return changed("forced this mode in place of mode " + std::to_string(automatic));
 }
 
-Finding explainGraphicsToCL(const Facts& facts)
+Finding explainGraphicsToCL(const Diagnostics& diagnostics)
 {
-    return explainForcedMode(facts, facts.environment.syncModes.graphicsToCL,
-                             TopenCLInfo::kGraphicsToCLFinish, facts.startUp.graphicsToCL,
-                             automaticGraphicsToCLMode(facts));
+    return explainForcedMode(diagnostics, diagnostics.environment.syncModes.graphicsToCL,
+                             TopenCLInfo::kGraphicsToCLFinish, diagnostics.startUp.graphicsToCL,
+                             automaticGraphicsToCLMode(diagnostics));
 }
 
-Finding explainCLToGraphics(const Facts& facts)
+Finding explainCLToGraphics(const Diagnostics& diagnostics)
 {
-    return explainForcedMode(facts, facts.environment.syncModes.clToGraphics,
-                             TopenCLInfo::kCLToGraphicsFinish, facts.startUp.clToGraphics,
-                             automaticCLToGraphicsMode(facts));
+    return explainForcedMode(diagnostics, diagnostics.environment.syncModes.clToGraphics,
+                             TopenCLInfo::kCLToGraphicsFinish, diagnostics.startUp.clToGraphics,
+                             automaticCLToGraphicsMode(diagnostics));
 }
 
-Finding explainForceThreading(const Facts& facts)
+Finding explainForceThreading(const Diagnostics& diagnostics)
 {
     std::string text = "switched batching off: each buffer is acquired and released on its own";
-    if (facts.startUp.provider == kNVIDIAProvider)
+    if (diagnostics.startUp.provider == kNVIDIAProvider)
         text += "; sharing from several threads is reported";
     return changed(text);
 }
 
 struct KnownVariable {
     const char* name;
-    Step readAt; // the step of start-up that reads it, or the one behind
-    Finding (*explain)(const Facts&);
+    StartUpStep readAt; // the step that reads it, or the next one
+    Finding (*explain)(const Diagnostics&);
 };
 
 constexpr KnownVariable kKnownVariables[] = {
-    {"VYRA_DISABLE_OPENCL", Step::kSwitch, explainDisable},
-    {"VYRA_OPENCL_PLATFORM", Step::kVendor, explainPlatform},
-    {"VYRA_OPENCL_DEFORMER_MIN_VERTS", Step::kDevice, explainMinimumVertices},
-    {"VYRA_OPENCL_IGNORE_DRIVER_VERSION", Step::kDriver, explainIgnoreDriver},
-    {"VYRA_OPENCL_FORCE_FINISH", Step::kSharingFunctions, explainForceFinish},
-    {"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", Step::kSharingFunctions, explainGraphicsToCL},
-    {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", Step::kSharingFunctions, explainCLToGraphics},
-    {"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", Step::kDoublePrecision, explainDoubleDemand},
-    {"VYRA_OPENCL_FORCE_THREADING", Step::kSwitch, explainForceThreading},
+    {"VYRA_DISABLE_OPENCL", StartUpStep::kSwitch, explainDisable},
+    {"VYRA_OPENCL_PLATFORM", StartUpStep::kVendor, explainPlatform},
+    {"VYRA_OPENCL_DEFORMER_MIN_VERTS", StartUpStep::kDevice, explainMinimumVertices},
+    {"VYRA_OPENCL_IGNORE_DRIVER_VERSION", StartUpStep::kDriver, explainIgnoreDriver},
+    {"VYRA_OPENCL_FORCE_FINISH", StartUpStep::kSharingFunctions, explainForceFinish},
+    {"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", StartUpStep::kSharingFunctions, explainGraphicsToCL},
+    {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", StartUpStep::kSharingFunctions, explainCLToGraphics},
+    {"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", StartUpStep::kDoublePrecision, explainDoubleDemand},
+    {"VYRA_OPENCL_FORCE_THREADING", StartUpStep::kSwitch, explainForceThreading},
 };
 
 const KnownVariable* findKnown(const std::string& name)
@@ -149,7 +148,7 @@ const KnownVariable* findKnown(const std::string& name)
     return nullptr;
 }
 
-// What glshare reads; D3D11 only on Windows.
+// The variables of glshare; D3D11 only on Windows.
 constexpr const char* kGlshareVariables[] = {"GLSHARE_GL_EVENT", "GLSHARE_CPU_AS_GPU",
                                              "GLSHARE_ZERO_COPY", "GLSHARE_D3D11"};
 
@@ -159,54 +158,55 @@ bool isKnownToGlshare(const std::string& name)
            std::end(kGlshareVariables);
 }
 
-// Whether the name begins with the upper-case prefix, in any case.
+// Returns whether the name begins with the prefix, which is in upper case, in any case.
 bool resembles(const std::string& name, std::string_view prefix)
 {
     return name.size() >= prefix.size() &&
-           std::equal(prefix.begin(), prefix.end(), name.begin(), [](char wanted, char found) {
-               return std::toupper(static_cast<unsigned char>(found)) == wanted;
+           std::equal(prefix.begin(), prefix.end(), name.begin(), [](char expected, char found) {
+               return std::toupper(static_cast<unsigned char>(found)) == expected;
            });
 }
 
-VariableReport explainStranger(const Variable& variable, const char* owner)
+VariableReport reportUnknown(const Variable& variable, const char* owner)
 {
     std::vector<std::string> names(std::begin(kGlshareVariables), std::end(kGlshareVariables));
     for (const KnownVariable& known : kKnownVariables)
         names.emplace_back(known.name);
     const std::string* nearest = nearestName(variable.name, names);
     return {variable.name, variable.value, Effect::kUnknown,
-            owner + std::string(" knows no variable of this name"), nearest ? *nearest : ""};
+            owner + std::string(" has no variable of this name"), nearest ? *nearest : ""};
 }
 
-VariableReport explainVariable(const Facts& facts, const std::optional<Stop>& stop,
+VariableReport explainVariable(const Diagnostics& diagnostics,
+                               const std::optional<StartUpFailure>& failure,
                                const Variable& variable)
 {
     const KnownVariable* known = findKnown(variable.name);
     if (!known && resembles(variable.name, "VYRA_"))
-        return explainStranger(variable, "the library");
+        return reportUnknown(variable, "the library");
     if (resembles(variable.name, "GLSHARE_") && !isKnownToGlshare(variable.name))
-        return explainStranger(variable, "glshare");
+        return reportUnknown(variable, "glshare");
     if (!known)
         return {variable.name, variable.value, Effect::kNoted,
-                "not the library's, but it steers what the library finds", ""};
-    const Finding finding = stop && stop->step < known->readAt
+                "not read by the library; selects the OpenCL or the OpenGL in use", ""};
+    const Finding finding = failure && failure->step < known->readAt
                                 ? withoutEffect("start-up stopped before it made a difference")
-                                : known->explain(facts);
+                                : known->explain(diagnostics);
     return {variable.name, variable.value, finding.effect, finding.explanation, ""};
 }
 
 } // namespace
 
-std::vector<VariableReport> explainVariables(const Facts& facts)
+std::vector<VariableReport> explainVariables(const Diagnostics& diagnostics)
 {
-    const std::optional<Stop> stop = findStop(facts);
+    const std::optional<StartUpFailure> failure = findStartUpFailure(diagnostics);
     std::vector<VariableReport> reports;
-    for (const Variable& variable : facts.environment.variables)
-        reports.push_back(explainVariable(facts, stop, variable));
+    for (const Variable& variable : diagnostics.environment.variables)
+        reports.push_back(explainVariable(diagnostics, failure, variable));
     return reports;
 }
 
-const char* effectId(Effect effect)
+const char* effectId(Effect effect) noexcept
 {
     switch (effect) {
     case Effect::kChanged:

@@ -1,4 +1,4 @@
-// The environment variables that are set, and what each of them did.
+// The effects of the environment variables that are set.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -9,10 +9,10 @@
 namespace info {
 
 enum class Effect {
-    kChanged, // start-up decided otherwise because of it
-    kNone,    // the library knows it, and it made no difference
-    kUnknown, // no variable of the library's, probably misspelt
-    kNoted,   // not the library's, but it steers what the library finds
+    kChanged, // it changed a decision of start-up
+    kNone,    // a variable of the library that made no difference
+    kUnknown, // begins with a prefix of this project and is not a variable: probably misspelt
+    kNoted,   // of another component; selects the OpenCL or the OpenGL in use
 };
 
 struct VariableReport {
@@ -20,12 +20,12 @@ struct VariableReport {
     std::string value;
     Effect effect;
     std::string explanation;
-    std::string suggestion; // the known name that is probably meant; empty: none
+    std::string suggestion; // the nearest known name; empty if none is near
 };
 
-std::vector<VariableReport> explainVariables(const Facts& facts);
+[[nodiscard]] std::vector<VariableReport> explainVariables(const Diagnostics& diagnostics);
 
-// "changed", "none", "unknown", "noted": as in JSON.
-const char* effectId(Effect effect);
+// Returns the name in JSON: "changed", "none", "unknown" or "noted".
+const char* effectId(Effect effect) noexcept;
 
 } // namespace info

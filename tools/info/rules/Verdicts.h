@@ -1,4 +1,4 @@
-// Which of the machine's platforms and devices start-up accepts, and why not the others.
+// The reasons why start-up rejects platforms and devices.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -7,12 +7,14 @@
 
 namespace info {
 
-// The first test that failed; empty for the one that was accepted.
-std::string platformRejection(const Facts& facts, const Platform& platform);
-// `device` is one of `platform`.
-std::string deviceRejection(const Facts& facts, const Platform& platform, const Device& device);
+// Return the first test that failed. Empty if the platform or device was chosen.
+[[nodiscard]] std::string platformRejection(const Diagnostics& diagnostics,
+                                            const Platform& platform);
+// `device` belongs to `platform`.
+[[nodiscard]] std::string deviceRejection(const Diagnostics& diagnostics, const Platform& platform,
+                                          const Device& device);
 
-// What to know about the renderer's GPU beside the device's: empty when they are of one maker.
-std::string rendererBesideDevice(const Facts& facts);
+// Describes how the renderer's GPU and the chosen device differ. Empty if they are the same GPU.
+[[nodiscard]] std::string rendererDeviceMismatch(const Diagnostics& diagnostics);
 
 } // namespace info

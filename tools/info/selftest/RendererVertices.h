@@ -1,4 +1,4 @@
-// A vertex buffer of the renderer.
+// A vertex buffer of the renderer, with the class that owns it.
 #pragma once
 
 #include "evaluator/Geometry.h"
@@ -18,10 +18,11 @@ public:
     RendererVertices(const RendererVertices&) = delete;
     RendererVertices& operator=(const RendererVertices&) = delete;
 
-    unsigned name() const { return fName; }
-    // Replace and return the whole contents. Empty if OpenGL does not let the buffer be read.
+    unsigned name() const noexcept { return fName; }
+    // Replace and return the whole contents. read() returns an empty vector if the buffer cannot be
+    // mapped.
     void write(const std::vector<vyra::Vector3>& values);
-    std::vector<vyra::Vector3> read();
+    [[nodiscard]] std::vector<vyra::Vector3> read();
 
 private:
     QOpenGLExtraFunctions& fGL;

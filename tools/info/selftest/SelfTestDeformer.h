@@ -7,8 +7,8 @@
 
 namespace info {
 
-// Doubles the numbers in the vertex buffers and adds an offset, so that the result shows that
-// OpenCL read what OpenGL wrote.
+// Doubles the numbers in the vertex buffers and adds an offset: the result depends on the numbers
+// that OpenGL wrote.
 class SelfTestDeformer : public vyra::Deformer {
 public:
     explicit SelfTestDeformer(std::string kernelText) : fKernelText(std::move(kernelText)) {}
@@ -26,7 +26,7 @@ public:
     {
         arguments.value(offset);
     }
-    // Never used: the self-test runs on OpenCL alone.
+    // Never called: the self-test runs on OpenCL only.
     void deform(const vyra::MeshGeometry& /*geometry*/, vyra::Surface& /*surface*/) const override
     {
     }

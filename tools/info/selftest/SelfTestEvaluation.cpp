@@ -11,7 +11,7 @@
 namespace info {
 namespace {
 
-// Small whole numbers, which floats hold exactly, different ones in each evaluation.
+// Returns small whole numbers, which floats represent exactly, different in each evaluation.
 std::vector<vyra::Vector3> inputOf(int index, std::size_t vertexCount)
 {
     constexpr std::size_t kDifferent = 1000;
@@ -99,7 +99,7 @@ EvaluationTimes SelfTestEvaluation::run(int index, bool inStages)
     return times;
 }
 
-// The same as Evaluator::evaluate, with a wait after each stage.
+// Makes the calls of Evaluator::evaluate, with a wait after each stage.
 void SelfTestEvaluation::evaluateInStages(EvaluationTimes& times)
 {
     TopenCLSharedBufferMgr& manager = TopenCLInfo::theOne().sharedBufferMgr();
@@ -135,7 +135,7 @@ void SelfTestEvaluation::compare(const std::vector<vyra::Vector3>& input,
                                  const std::vector<vyra::Vector3>& normals)
 {
     if (positions.empty() || normals.empty()) {
-        fProblem = "OpenGL does not let the vertex buffer be read";
+        fProblem = "OpenGL cannot map the vertex buffer for reading";
         return;
     }
     const std::size_t wrong = countWrong(input, positions, fDeformer->offset) +

@@ -1,4 +1,4 @@
-// One evaluation of the self-test.
+// The evaluations of the self-test.
 #pragma once
 
 #include "evaluator/Evaluator.h"
@@ -15,10 +15,10 @@ class QOpenGLExtraFunctions;
 
 namespace info {
 
-// Runs from its construction on.
+// Measures the time since its construction.
 class Stopwatch {
 public:
-    double milliseconds() const
+    double milliseconds() const noexcept
     {
         return std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - fStart)
             .count();
@@ -28,7 +28,7 @@ private:
     std::chrono::steady_clock::time_point fStart = std::chrono::steady_clock::now();
 };
 
-// In milliseconds. The stages are measured only if each is waited for.
+// In milliseconds. The times of the stages are 0 unless each stage is waited for.
 struct EvaluationTimes {
     double whole = 0; // until OpenGL has read the result
     double acquire = 0;
@@ -37,8 +37,8 @@ struct EvaluationTimes {
     double read = 0;
 };
 
-// A mesh with two vertex buffers that OpenGL writes, OpenCL deforms and OpenGL reads. The first
-// problem stays; nothing is to be run after it. The renderer's context is current during each
+// A mesh with two vertex buffers that OpenGL writes, OpenCL deforms and OpenGL reads. Keeps the
+// first problem; run() must not be called after one. The OpenGL context is current during each
 // operation.
 class SelfTestEvaluation {
 public:
@@ -47,13 +47,13 @@ public:
     // Builds the kernel and shares the vertex buffers.
     void prepare();
 
-    // OpenGL writes numbers that depend on `index`, OpenCL deforms them, OpenGL reads and compares
-    // them. `inStages` waits for each stage.
+    // Runs one evaluation on numbers that depend on `index`, and compares the result. Waits after
+    // each stage if `inStages` is set.
     EvaluationTimes run(int index, bool inStages);
 
-    // Empty as long as all is right.
-    const std::string& problem() const { return fProblem; }
-    int status() const { return fStatus; }
+    // Returns the first problem. Empty if there is none.
+    const std::string& problem() const noexcept { return fProblem; }
+    int status() const noexcept { return fStatus; }
 
 private:
     void evaluateInStages(EvaluationTimes& times);

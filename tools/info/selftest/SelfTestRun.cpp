@@ -14,7 +14,7 @@ namespace info {
 namespace {
 
 constexpr std::size_t kVertices = 10000; // a character's face; above every default minimum
-// Enough for a median; the whole test stays well under a second on a processor.
+// Enough for a median; the whole test takes well under a second on a CPU.
 constexpr int kEvaluations = 15;
 
 double median(std::vector<double> values)
@@ -30,8 +30,8 @@ std::string kernelText()
     return file.open(QIODevice::ReadOnly) ? file.readAll().toStdString() : std::string();
 }
 
-// The evaluations run free, as a host's do, and then once more with a wait behind each stage, so
-// that the stages can be told apart.
+// Runs the evaluations without waits, as a host does, and then again with a wait after each stage,
+// to measure the stages.
 void runEvaluations(SelfTestEvaluation& evaluation, SelfTest& test)
 {
     std::vector<double> whole, acquire, kernel, release, read;
@@ -70,7 +70,7 @@ SelfTest runSelfTest(RenderWindow& window, WarningLog& warnings)
     SelfTest test;
     test.vertices = kVertices;
     {
-        // The number of vertices does not decide here whether OpenCL is used.
+        // The self-test uses OpenCL whatever the minimum number of vertices.
         TopenCLInfo::theOne().setUseMinimumBufferSize(false);
         SelfTestEvaluation evaluation(*window.context().extraFunctions(), kVertices, kernelText());
         const Stopwatch building;

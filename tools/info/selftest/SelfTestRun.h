@@ -1,4 +1,4 @@
-// The library at work: one shared buffer through whole evaluations.
+// The self-test of buffer sharing.
 #pragma once
 
 #include "tools/info/diagnostics/Diagnostics.h"
@@ -8,9 +8,9 @@ namespace info {
 class RenderWindow;
 class WarningLog;
 
-// OpenGL writes vertices, OpenCL deforms them in the modes that start-up chose, OpenGL reads them,
-// and every number is compared. After start-up succeeded, the window's context current. What it
-// makes is gone afterwards.
-SelfTest runSelfTest(RenderWindow& window, WarningLog& warnings);
+// Runs whole evaluations of shared buffers: OpenGL writes vertices, OpenCL deforms them in the
+// modes that start-up chose, OpenGL reads them, and every number is compared. Requires that
+// start-up has succeeded and that the context of `window` is current. Releases all that it creates.
+[[nodiscard]] SelfTest runSelfTest(RenderWindow& window, WarningLog& warnings);
 
 } // namespace info

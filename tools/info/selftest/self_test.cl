@@ -1,4 +1,4 @@
-// Reads what OpenGL wrote into the vertex buffers, and writes a result that depends on it.
+// Replaces each number n in the vertex buffers with 2 n + offset.
 kernel void selfTest(const uint vertexCount, global const float* positions,
                      global const float* normals, global float* vertexPositions,
                      global float* vertexNormals, const float offset)

@@ -8,16 +8,16 @@
 namespace info {
 namespace {
 
-// Beyond one mistake in so many letters, two names have nothing to do with each other.
-constexpr std::size_t kLettersPerMistake = 3;
+// Two names are near with at most one edit in this many letters.
+constexpr std::size_t kLettersPerEdit = 3;
 
 char folded(char letter)
 {
     return static_cast<char>(std::tolower(static_cast<unsigned char>(letter)));
 }
 
-// Letters to insert, remove or replace, row by row of the usual table.
-std::size_t mistakes(const std::string& from, const std::string& to)
+// Returns the Levenshtein distance regardless of case.
+std::size_t editDistance(const std::string& from, const std::string& to)
 {
     std::vector<std::size_t> row(to.size() + 1);
     std::iota(row.begin(), row.end(), std::size_t{0});
@@ -40,8 +40,8 @@ const std::string* nearestName(const std::string& text, const std::vector<std::s
     const std::string* nearest = nullptr;
     std::size_t fewest = 0;
     for (const std::string& name : names) {
-        const std::size_t count = mistakes(text, name);
-        if (count * kLettersPerMistake > std::max(text.size(), name.size()))
+        const std::size_t count = editDistance(text, name);
+        if (count * kLettersPerEdit > std::max(text.size(), name.size()))
             continue;
         if (!nearest || count < fewest) {
             nearest = &name;

@@ -1,4 +1,4 @@
-// The name that somebody who mistyped probably meant.
+// Suggestions for misspelt names.
 #pragma once
 
 #include <string>
@@ -6,8 +6,8 @@
 
 namespace info {
 
-// The entry of `names` that is nearest to `text` in number of typing mistakes, upper and lower case
-// being alike. Null when all are too far away to be meant.
+// Returns the entry of `names` with the smallest edit distance to `text`, regardless of case. Null
+// if none is near.
 const std::string* nearestName(const std::string& text, const std::vector<std::string>& names);
 
 } // namespace info

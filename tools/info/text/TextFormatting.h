@@ -1,4 +1,4 @@
-// Small pieces of text that several reports share.
+// Formatting of values for the reports.
 #pragma once
 
 #include <string>
@@ -17,7 +17,7 @@ std::string quoted(const std::string& text);
 std::string quotedList(const std::vector<std::string>& texts);
 // "one, two"
 std::string commaList(const std::vector<std::string>& texts);
-// "GPU", "CPU", or "CPU and accelerator" for a device of both types.
+// "GPU", "CPU", or "CPU and accelerator" for a device with both bits.
 std::string deviceTypeName(cl_device_type type);
 
 } // namespace info
