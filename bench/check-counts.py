@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
-"""Compares instruction counts with those on record: check-counts.py RESULTS.json RECORD.json [--record]
+"""Compares instruction counts with the recorded ones: check-counts.py RESULTS.json RECORD.json [--record]
 
-What is compared is each operation's count over that of the bare OpenCL calls beside it, as vyra-opencl-bench
-counts them under valgrind. The same binary gives the same counts; compilers and runtimes differ a little, so that
-a tenth more passes. With --record the results become the record. The exit code is 1 where a ratio has grown.
+Compares the ratio of each operation's count to that of the direct OpenCL calls, as vyra-opencl-bench counts them
+under valgrind. The same binary gives the same counts; compilers and runtimes differ a little, so growth of up to
+a tenth is accepted. --record replaces the record with the results. The exit code is 1 if a ratio has grown more.
 """
 import json
 import sys
@@ -12,12 +12,12 @@ ALLOWED_GROWTH = 1.10
 
 
 def ratios(results):
-    """By group and case; without the bare calls themselves, and other libraries."""
+    """Returns the ratios by group and case, without the baselines and without third-party libraries."""
     return {
         f"{group['name']}: {case['name']}": round(case["instructionRatio"], 3)
         for group in results["groups"]
         for case in group["cases"][1:]
-        if "instructionRatio" in case and "peer" not in case
+        if "instructionRatio" in case and "thirdParty" not in case
     }
 
 
@@ -38,11 +38,11 @@ def main():
     grown = {name: (ratio, record[name]) for name, ratio in counted.items()
              if name in record and ratio > record[name] * ALLOWED_GROWTH}
     for name, (ratio, before) in grown.items():
-        print(f"{name}: {ratio} times the bare calls' instructions, {before} on record")
+        print(f"{name}: {ratio} times the instructions of the direct calls, {before} recorded")
     compared = len(counted.keys() & record.keys())
     if grown or not compared:
         sys.exit(f"{len(grown)} of {compared} operations take more instructions than bench/counts.json allows")
-    print(f"{compared} operations take no more instructions than on record.")
+    print(f"{compared} operations take no more instructions than recorded.")
 
 
 if __name__ == "__main__":

@@ -1,6 +1,7 @@
-// Measures the library beside the bare OpenCL calls that it must make.
+// Measures the library relative to the direct OpenCL calls that it must make.
 #include "cases/Cases.h"
 #include "fixtures/Runtime.h"
+#include "harness/CommandLine.h"
 #include "harness/InstructionCount.h"
 #include "harness/Report.h"
 #include "startup/Startup.h"
@@ -9,92 +10,74 @@
 #include <exception>
 #include <iostream>
 #include <regex>
-#include <string_view>
 
 namespace {
 
-constexpr const char* kUsage = R"(Usage: vyra-opencl-bench [OPTION...]
-
-Measures the library beside the bare OpenCL calls that it must make, and prints a table.
-
-  --only REGEX         the groups whose names match
-  --quick              fewer and shorter samples
-  --json FILE          also writes the results as JSON
-  --instructions DIR   also shows the instruction counts that callgrind wrote to DIR
-  --against FILE       also compares with the JSON of an earlier run
-  --start WHICH        only the milliseconds that a start takes, which is once per process: of the
-                       library, or of the bare OpenCL calls that it makes (bare)
-  --list               the names of the groups, and nothing else
-  --help               this text
-
-Under valgrind --tool=callgrind --instr-atstart=no --collect-atstart=no it counts instructions and
-takes no times.
-)";
+constexpr const char* kDescription =
+    R"(Measures the library relative to the direct OpenCL calls that each operation must make, and prints
+a table. Under valgrind --tool=callgrind --instr-atstart=no --collect-atstart=no it counts
+instructions instead.)";
 
 constexpr Effort kQuickEffort{7, std::chrono::milliseconds(1)};
 
 struct Options {
-    std::regex only{""};
+    std::regex only;
     Effort effort;
     std::filesystem::path json;
     std::filesystem::path instructions;
     std::filesystem::path against;
     std::string start;
     bool list = false;
-    bool help = false;
 };
 
-Options parse(int count, char** arguments)
+void addOptions(QCommandLineParser& parser)
 {
-    Options options;
-    for (int index = 1; index < count; ++index) {
-        const std::string_view argument = arguments[index];
-        const auto value = [&] {
-            if (++index == count)
-                throw std::runtime_error(std::string(argument) + " needs a value");
-            return arguments[index];
-        };
-        if (argument == "--only")
-            options.only = std::regex(value());
-        else if (argument == "--quick")
-            options.effort = kQuickEffort;
-        else if (argument == "--json")
-            options.json = value();
-        else if (argument == "--instructions")
-            options.instructions = value();
-        else if (argument == "--against")
-            options.against = value();
-        else if (argument == "--start")
-            options.start = value();
-        else if (argument == "--list")
-            options.list = true;
-        else if (argument == "--help")
-            options.help = true;
-        else
-            throw std::runtime_error("unknown argument " + std::string(argument) +
-                                     "; --help tells all");
-    }
-    return options;
+    parser.setApplicationDescription(kDescription);
+    parser.addOptions({
+        {"only", "Measure only the groups whose names match.", "REGEX"},
+        {"quick", "Take fewer and shorter samples."},
+        {"json", "Also write the results as JSON.", "FILE"},
+        {"instructions", "Also print the instruction counts that callgrind wrote to DIR.", "DIR"},
+        {"against", "Also compare with the JSON of an earlier run.", "FILE"},
+        {"start",
+         "Print only the milliseconds of a start, which is possible once per process: 'library', or "
+         "'direct' for the same OpenCL calls made directly.",
+         "WHICH"},
+        {"list", "Print only the names of the groups."},
+    });
 }
 
-std::vector<GroupMaker> chosenGroups(const std::regex& only, Runtime* runtime)
+Options readOptions(const QCommandLineParser& parser)
 {
-    std::vector<GroupMaker> chosen;
-    for (GroupMaker& maker : allGroups(runtime)) {
-        if (std::regex_search(maker.name, only))
-            chosen.push_back(std::move(maker));
+    const auto value = [&parser](const char* name) { return parser.value(name).toStdString(); };
+    return {std::regex(value("only")),
+            parser.isSet("quick") ? kQuickEffort : Effort{},
+            value("json"),
+            value("instructions"),
+            value("against"),
+            value("start"),
+            parser.isSet("list")};
+}
+
+std::vector<GroupFactory> chosenGroups(const std::regex& only, Runtime* runtime)
+{
+    std::vector<GroupFactory> chosen;
+    for (GroupFactory& factory : allGroups(runtime)) {
+        if (std::regex_search(factory.name, only))
+            chosen.push_back(std::move(factory));
     }
     return chosen;
 }
 
-std::vector<GroupResult> measureAll(const std::vector<GroupMaker>& makers, const Effort& effort)
+std::vector<GroupResult> measureAll(const std::vector<GroupFactory>& factories,
+                                    const Effort& effort)
 {
     std::mt19937 random(1); // the order of the cases is the same in every run
     std::vector<GroupResult> results;
-    for (const GroupMaker& maker : makers) {
-        std::fprintf(stderr, "[%zu/%zu] %s\n", results.size() + 1, makers.size(),
-                     maker.name.c_str());
-        results.push_back(compare(maker.make(), effort, random));
+    for (const GroupFactory& factory : factories) {
+        std::fprintf(stderr, "[%zu/%zu] %s\n", results.size() + 1, factories.size(),
+                     factory.name.c_str());
+        results.push_back(compare(factory.make(), effort, random));
     }
     return results;
 }
@@ -103,12 +86,12 @@ void report(const Options& options, std::vector<GroupResult> results)
 {
     if (!options.instructions.empty())
         addInstructionCounts(results, readInstructionCounts(options.instructions));
-    const RunDescription run{processorName(), Runtime::platformName(), Runtime::deviceName(),
+    const RunDescription run{cpuName(), Runtime::platformName(), Runtime::deviceName(),
                              options.effort};
-    std::cout << run.processor << "; " << run.platform << "; " << run.device << "\n\n";
+    std::cout << run.cpu << "; " << run.platform << "; " << run.device << "\n\n";
     writeTable(std::cout, results);
     if (!options.against.empty()) {
-        std::cout << "\nBeside " << options.against.string() << ":\n\n";
+        std::cout << "\nCompared with " << options.against.string() << ":\n\n";
         writeChanges(std::cout, results, readRatios(options.against));
     }
     if (!options.json.empty() && !writeJson(options.json, toJson(run, results)))
@@ -118,30 +101,30 @@ void report(const Options& options, std::vector<GroupResult> results)
 void run(const Options& options, int& argumentCount, char** arguments)
 {
     Runtime runtime(argumentCount, arguments);
-    const std::vector<GroupMaker> makers = chosenGroups(options.only, &runtime);
-    if (makers.empty())
-        throw std::runtime_error("no group has such a name; --list tells them");
+    const std::vector<GroupFactory> factories = chosenGroups(options.only, &runtime);
+    if (factories.empty())
+        throw std::runtime_error("no group has such a name; see --list");
     if (!countsInstructions()) {
-        report(options, measureAll(makers, options.effort));
+        report(options, measureAll(factories, options.effort));
         return;
     }
-    for (const GroupMaker& maker : makers) {
-        std::fprintf(stderr, "counting: %s\n", maker.name.c_str());
-        count(maker.make());
+    for (const GroupFactory& factory : factories) {
+        std::fprintf(stderr, "counting: %s\n", factory.name.c_str());
+        count(factory.make());
     }
 }
 
-void tellStart(const std::string& which, int& argumentCount, char** arguments)
+void printStartTime(const std::string& which, int& argumentCount, char** arguments)
 {
-    if (which != "library" && which != "bare")
-        throw std::runtime_error("--start takes library or bare");
-    Nanoseconds bare{0};
-    const Runtime::BeforeStart startBare = [&](void* graphicsContext) {
-        bare = startByHand(graphicsContext);
+    if (which != "library" && which != "direct")
+        throw std::runtime_error("--start requires library or direct");
+    Nanoseconds direct{0};
+    const Runtime::BeforeStart measureDirectStart = [&](void* graphicsContext) {
+        direct = startDirectly(graphicsContext);
     };
-    const bool isBare = which == "bare";
-    const Runtime runtime(argumentCount, arguments, isBare ? startBare : nullptr);
-    const std::chrono::duration<double, std::milli> time = isBare ? bare : runtime.startTime();
+    const bool isDirect = which == "direct";
+    const Runtime runtime(argumentCount, arguments, isDirect ? measureDirectStart : nullptr);
+    const std::chrono::duration<double, std::milli> time = isDirect ? direct : runtime.startTime();
     std::printf("%.3f\n", time.count());
 }
 
@@ -150,14 +133,17 @@ void tellStart(const std::string& which, int& argumentCount, char** arguments)
 int main(int argumentCount, char** arguments)
 {
     try {
-        const Options options = parse(argumentCount, arguments);
-        if (options.help) {
-            std::cout << kUsage;
-        } else if (options.list) {
-            for (const GroupMaker& maker : chosenGroups(options.only, nullptr))
-                std::cout << maker.name << '\n';
+        QCommandLineParser parser;
+        addOptions(parser);
+        parseCommandLine(parser, argumentCount, arguments);
+        if (printHelp(parser, argumentCount, arguments))
+            return 0;
+        const Options options = readOptions(parser);
+        if (options.list) {
+            for (const GroupFactory& factory : chosenGroups(options.only, nullptr))
+                std::cout << factory.name << '\n';
         } else if (!options.start.empty()) {
-            tellStart(options.start, argumentCount, arguments);
+            printStartTime(options.start, argumentCount, arguments);
         } else {
             run(options, argumentCount, arguments);
         }

@@ -1,8 +1,9 @@
-// The list for a build with peers.
+// The list for a build with third-party baselines.
 #include "baselines/AllBaselines.h"
 
-const std::vector<const Peer*>& peers()
+const std::vector<const ThirdPartyBaseline*>& thirdPartyBaselines()
 {
-    static const std::vector<const Peer*> all{&boostCompute(), &openCV(), &cppBindings()};
+    static const std::vector<const ThirdPartyBaseline*> all{&boostCompute(), &openCV(),
+                                                            &cppBindings()};
     return all;
 }

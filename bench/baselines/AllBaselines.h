@@ -1,8 +1,8 @@
-// One object for each peer, in the file of its name.
+// The third-party libraries; each is implemented in the file of its name.
 #pragma once
 
 #include "baselines/ThirdPartyBaseline.h"
 
-const Peer& boostCompute();
-const Peer& openCV();
-const Peer& cppBindings();
+const ThirdPartyBaseline& boostCompute();
+const ThirdPartyBaseline& openCV();
+const ThirdPartyBaseline& cppBindings();

@@ -1,4 +1,4 @@
-// Boost.Compute: a cache of programs, owners of OpenCL's objects, a list of events that it owns.
+// Boost.Compute: a program cache, owners of OpenCL objects, and a wait list that owns its events.
 #include "baselines/AllBaselines.h"
 #include "fixtures/Programs.h"
 #include "fixtures/Runtime.h"
@@ -18,8 +18,8 @@ namespace compute = boost::compute;
 
 namespace {
 
-// The path is the key. Include directories are options to this cache, so they are joined to them
-// beforehand.
+// The path is the key. The cache takes include directories as options, so they are joined in
+// advance.
 class CachedPrograms {
 public:
     explicit CachedPrograms(const Programs& programs)
@@ -51,7 +51,7 @@ private:
     std::string fKernelName;
 };
 
-class BoostCompute : public Peer {
+class BoostCompute : public ThirdPartyBaseline {
 public:
     std::string name() const override { return "Boost.Compute"; }
 
@@ -99,8 +99,8 @@ public:
 
 } // namespace
 
-const Peer& boostCompute()
+const ThirdPartyBaseline& boostCompute()
 {
-    static const BoostCompute peer;
-    return peer;
+    static const BoostCompute library;
+    return library;
 }

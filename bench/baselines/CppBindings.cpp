@@ -1,5 +1,4 @@
-// The C++ bindings of OpenCL: owners of its objects, which cost nothing beyond retain and release.
-// They have no cache and no pool.
+// The C++ bindings of OpenCL: owners of OpenCL objects, without a cache and without a pool.
 #define CL_HPP_TARGET_OPENCL_VERSION 120
 #define CL_HPP_MINIMUM_OPENCL_VERSION 120
 #define CL_HPP_ENABLE_EXCEPTIONS
@@ -15,7 +14,7 @@
 
 namespace {
 
-// Of the caller's, who keeps a reference.
+// The caller keeps its own reference.
 constexpr bool kRetain = true;
 
 template <typename Object, typename Handle>
@@ -28,7 +27,7 @@ std::vector<Object> holdersOf(const std::vector<Handle>& handles)
     return held;
 }
 
-class CppBindings : public Peer {
+class CppBindings : public ThirdPartyBaseline {
 public:
     std::string name() const override { return "OpenCL C++ bindings"; }
 
@@ -81,8 +80,8 @@ public:
 
 } // namespace
 
-const Peer& cppBindings()
+const ThirdPartyBaseline& cppBindings()
 {
-    static const CppBindings peer;
-    return peer;
+    static const CppBindings library;
+    return library;
 }

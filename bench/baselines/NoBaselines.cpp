@@ -1,8 +1,8 @@
-// The list for a build without peers.
+// The list for a build without third-party baselines.
 #include "baselines/ThirdPartyBaseline.h"
 
-const std::vector<const Peer*>& peers()
+const std::vector<const ThirdPartyBaseline*>& thirdPartyBaselines()
 {
-    static const std::vector<const Peer*> none;
+    static const std::vector<const ThirdPartyBaseline*> none;
     return none;
 }

@@ -1,4 +1,4 @@
-// OpenCV's `ocl` module: a cache of programs, and a pool behind UMat. It has no list of events.
+// The `ocl` module of OpenCV: a program cache, and a pool that UMat uses. It has no wait list.
 #include "baselines/AllBaselines.h"
 #include "fixtures/Programs.h"
 #include "fixtures/Runtime.h"
@@ -14,14 +14,14 @@ namespace ocl = cv::ocl;
 
 namespace {
 
-// OpenCV on the library's context and its only device, with a queue of its own; for the calling
-// thread and while the object lives.
+// Binds OpenCV on the calling thread to this library's context and its only device, with a queue of
+// OpenCV's own, until destruction.
 class Attachment {
 public:
     Attachment()
     {
         const ocl::Context context = ocl::Context::fromHandle(Runtime::context());
-        // Not Device::fromHandle: version 4.6 does not find that one in the context.
+        // Not Device::fromHandle, whose device version 4.6 does not find in the context.
         ocl::OpenCLExecutionContext::create(context, context.device(0)).bind();
         if (!ocl::useOpenCL())
             throw std::runtime_error("OpenCV does not use this OpenCL device");
@@ -31,8 +31,8 @@ public:
     Attachment& operator=(const Attachment&) = delete;
 };
 
-// Path, source and options are the key. Include directories are options to this cache, so they are
-// joined to them beforehand.
+// Path, source and options are the key. The cache takes include directories as options, so they are
+// joined in advance.
 class CachedPrograms {
 public:
     explicit CachedPrograms(const Programs& programs)
@@ -41,7 +41,7 @@ public:
             fSources.emplace_back("", request.path, Programs::source(), "");
             fOptions.emplace_back(Programs::buildOptions(request));
             if (ocl::Kernel(KernelRequest::kKernelName, fSources.back(), fOptions.back()).empty())
-                throw std::runtime_error("OpenCV gives no kernel of " + request.path);
+                throw std::runtime_error("OpenCV cannot create a kernel of " + request.path);
         }
     }
 
@@ -64,7 +64,8 @@ cv::UMat createMatrix(std::size_t bytes)
     return {1, static_cast<int>(bytes), CV_8UC1};
 }
 
-// The pool is off by default on most devices, and takes no buffer above one eighth of its size.
+// Enables the pool until destruction. It is disabled by default on most devices, and does not keep
+// buffers larger than one eighth of its size.
 class Pool {
 public:
     Pool() : fController(ocl::getOpenCLAllocator()->getBufferPoolController())
@@ -72,7 +73,7 @@ public:
         constexpr std::size_t kBytes = std::size_t{1} << 30;
         fController->setMaxReservedSize(kBytes);
     }
-    ~Pool() { fController->setMaxReservedSize(0); } // which gives all back
+    ~Pool() { fController->setMaxReservedSize(0); } // releases all buffers
     Pool(const Pool&) = delete;
     Pool& operator=(const Pool&) = delete;
 
@@ -83,7 +84,7 @@ private:
     cv::BufferPoolController* fController; // of the attached context
 };
 
-class OpenCV : public Peer {
+class OpenCV : public ThirdPartyBaseline {
 public:
     std::string name() const override { return "OpenCV"; }
 
@@ -132,8 +133,8 @@ public:
 
 } // namespace
 
-const Peer& openCV()
+const ThirdPartyBaseline& openCV()
 {
-    static const OpenCV peer;
-    return peer;
+    static const OpenCV library;
+    return library;
 }

@@ -2,15 +2,16 @@
 
 #include <utility>
 
-void addPeers(Group& group, const std::function<std::optional<Case>(const Peer&)>& make)
+void addThirdPartyBaselines(
+    Group& group, const std::function<std::optional<Case>(const ThirdPartyBaseline&)>& make)
 {
     const double operations = group.cases.front().operationsPerIteration;
-    for (const Peer* peer : peers()) {
-        std::optional<Case> subject = make(*peer);
+    for (const ThirdPartyBaseline* library : thirdPartyBaselines()) {
+        std::optional<Case> subject = make(*library);
         if (!subject)
             continue;
-        subject->peer = peer->name();
-        subject->name = subject->peer + ": " + subject->name;
+        subject->thirdParty = library->name();
+        subject->name = subject->thirdParty + ": " + subject->name;
         subject->goal = {};
         subject->operationsPerIteration = operations;
         group.cases.push_back(std::move(*subject));

@@ -1,5 +1,5 @@
-// Other libraries that do what ours does, as further cases of our groups. Which ones there are is
-// chosen when the project is configured (VYRA_BENCH_PEERS); by default there are none.
+// Third-party libraries with the same purpose, as additional cases of the groups. The build selects
+// them (VYRA_BENCH_BASELINES); by default there are none.
 #pragma once
 
 #include "harness/Group.h"
@@ -14,35 +14,35 @@
 
 class Programs;
 
-// One library. Each operation gives the case that belongs beside ours in the same group, or nothing
-// where the library has nothing like it. Peers work in the context and on the device of the
-// library, and may throw where they find those unusable. What a body works on goes with the body;
-// an argument that is borrowed outlives it.
-class Peer {
+// One third-party library, in the context and on the device of this library. Each operation returns
+// the corresponding case of a group, or nothing if the library has no such operation. The bodies
+// own their data and borrow the arguments, which must outlive them. May throw std::runtime_error if
+// the library cannot use the context or the device.
+class ThirdPartyBaseline {
 public:
-    virtual ~Peer() = default;
+    virtual ~ThirdPartyBaseline() = default;
 
     virtual std::string name() const = 0;
 
-    // A kernel of each program in turn, from the peer's program cache, made and released.
+    // Creates and releases a kernel of each program in turn, from the library's program cache.
     virtual std::optional<Case> kernelHits(const Programs& /*programs*/) const { return {}; }
-    // Buffers of these many bytes in turn, kBuffersTaken at a time, made and given back.
+    // Creates and releases buffers of these sizes in bytes in turn, kBuffersTaken at a time.
     virtual std::optional<Case> bufferReuse(const std::vector<std::size_t>& /*sizes*/) const
     {
         return {};
     }
-    // A buffer made, written and given back, where that differs from creating and releasing one.
+    // Creates, writes and releases a buffer; for libraries with a pool.
     virtual std::optional<Case> writtenReuse(std::size_t /*bytes*/,
                                              void (* /*write*/)(cl_mem, std::size_t bytes)) const
     {
         return {};
     }
-    // A list filled with the events, then dropped.
+    // Fills a wait list with the events and destroys it.
     virtual std::optional<Case> waitList(const std::vector<cl_event>& /*events*/) const
     {
         return {};
     }
-    // The contents written to the buffer, which is as large, and waited for.
+    // Uploads the contents to the buffer, which has the same size, and waits.
     virtual std::optional<Case> upload(cl_mem /*buffer*/,
                                        const std::vector<char>& /*contents*/) const
     {
@@ -50,18 +50,19 @@ public:
     }
 };
 
-// Those that the program was built with.
-const std::vector<const Peer*>& peers();
+// Returns the libraries that the program was built with.
+const std::vector<const ThirdPartyBaseline*>& thirdPartyBaselines();
 
-// Adds the case that `make` takes from each peer. It is per operation of the group's baseline,
-// under the peer's name, and has no goal.
-void addPeers(Group& group, const std::function<std::optional<Case>(const Peer&)>& make);
+// Adds the case that `make` creates for each library. It has the library's name, the number of
+// operations of the group's first case, and no goal.
+void addThirdPartyBaselines(
+    Group& group, const std::function<std::optional<Case>(const ThirdPartyBaseline&)>& make);
 
-// As many buffers at a time as an evaluation of ours takes.
+// The number of buffers that an evaluation takes from the pool.
 constexpr std::size_t kBuffersTaken = 8;
 
-// Takes buffers of the sizes in turn from `create`, which is given bytes and returns an owner. All
-// sizes are live at once before the first turn, so that a pool knows them.
+// Returns a body that creates buffers of these sizes in turn. `create` takes a size in bytes and
+// returns an owner. One buffer of each size is created beforehand, to fill the pool.
 template <typename Create>
 Body takingBuffers(const std::vector<std::size_t>& sizes, Create create)
 {

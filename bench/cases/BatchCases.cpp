@@ -1,4 +1,4 @@
-// The shared-buffer manager: whole evaluations, rebuilding the batch, and the calls of evaluators.
+// The shared-buffer manager: whole evaluations, rebuilds of the batch, and the calls of evaluators.
 #include "cases/Cases.h"
 #include "fixtures/GLBuffers.h"
 #include "fixtures/InteropStub.h"
@@ -45,12 +45,12 @@ public:
         clFinish(Runtime::queue());
     }
 
-    void evaluateByHand()
+    void evaluateDirectly()
     {
         const auto count = static_cast<cl_uint>(fMemory.size());
         cl_event acquired = nullptr;
         clEnqueueAcquireGLObjects(Runtime::queue(), count, fMemory.data(), 0, nullptr, &acquired);
-        clRetainEvent(acquired); // the manager keeps it for its readers and in the wait list
+        clRetainEvent(acquired); // the manager holds it for deformers and in the wait list
         cl_event released = nullptr;
         clEnqueueReleaseGLObjects(Runtime::queue(), count, fMemory.data(), 1, &acquired, &released);
         clReleaseEvent(acquired);
@@ -80,7 +80,7 @@ Group evaluation(const std::string& name, Runtime& runtime, std::size_t count)
     return {name,
             {{"acquire, release, finish",
               [evaluations](std::size_t frames) {
-                  return timedLoop(frames, [&] { evaluations->evaluateByHand(); });
+                  return timedLoop(frames, [&] { evaluations->evaluateDirectly(); });
               }},
              {"PreEvaluate, PostEvaluate, finish",
               [evaluations](std::size_t frames) {
@@ -89,11 +89,11 @@ Group evaluation(const std::string& name, Runtime& runtime, std::size_t count)
               count >= 16 ? Goal::ratio(kLimit) : Goal()}}};
 }
 
-// A manager of plain memory objects, with nothing behind its interop calls.
-class OwnShare {
+// A manager of plain memory objects, with stubs as its interop functions.
+class StubbedBatch {
 public:
-    explicit OwnShare(std::size_t count,
-                      std::shared_ptr<InteropStub> stub = std::make_shared<InteropStub>())
+    explicit StubbedBatch(std::size_t count,
+                          std::shared_ptr<InteropStub> stub = std::make_shared<InteropStub>())
         : fStub(std::move(stub))
     {
         constexpr std::size_t kBytes = 64;
@@ -108,8 +108,8 @@ public:
             share(memory.get());
         evaluate();
     }
-    OwnShare(const OwnShare&) = delete;
-    OwnShare& operator=(const OwnShare&) = delete;
+    StubbedBatch(const StubbedBatch&) = delete;
+    StubbedBatch& operator=(const StubbedBatch&) = delete;
 
     TopenCLSharedBufferMgr& manager() { return fManager; }
     const TopenCLSharedBuffer* record() const { return fLastRecord; }
@@ -122,12 +122,13 @@ public:
         end();
     }
 
-    // A change of the records that leaves them as they were, so that the next evaluation makes the
-    // batch anew.
+    // Marks the records as changed without a change, so that the next evaluation rebuilds the
+    // batch.
     void touch() { share(fMemory.front().get()); }
 
-    // The calls of a new batch: the references of the old one go, those of the new one come.
-    void rebuildByHand() const
+    // Makes the calls of a rebuild: releases the references of the old batch, retains those of the
+    // new.
+    void rebuildDirectly() const
     {
         for (const auto& memory : fMemory)
             clReleaseMemObject(memory.get());
@@ -151,12 +152,12 @@ private:
 
 Body evaluations(std::size_t buffers, const std::shared_ptr<InteropStub>& stub)
 {
-    const auto share = std::make_shared<OwnShare>(buffers, stub);
+    const auto share = std::make_shared<StubbedBatch>(buffers, stub);
     return [share](std::size_t frames) { return timedLoop(frames, [&] { share->evaluate(); }); };
 }
 
-// The baseline is a batch of one buffer: the cost must not grow with the batch.
-Group ownShare(const std::string& name, std::size_t count)
+// The baseline is a batch of one buffer, since the cost must not grow with the batch.
+Group withoutInterop(const std::string& name, std::size_t count)
 {
     constexpr double kFlat = 1.1;
     const auto stub = std::make_shared<InteropStub>();
@@ -168,19 +169,20 @@ Group ownShare(const std::string& name, std::size_t count)
 Group rebuild(const std::string& name, std::size_t count)
 {
     constexpr double kLimit = 1.5;
-    const auto share = std::make_shared<OwnShare>(count);
-    return {
-        name,
-        {{"releases, retains",
-          [share](std::size_t times) { return timedLoop(times, [&] { share->rebuildByHand(); }); }},
-         {"rebuilding evaluation",
-          [share](std::size_t times) {
-              return timedLoop(times, [&] {
-                  share->touch();
-                  share->evaluate();
-              });
-          },
-          Goal::ratio(kLimit)}}};
+    const auto share = std::make_shared<StubbedBatch>(count);
+    return {name,
+            {{"releases, retains",
+              [share](std::size_t times) {
+                  return timedLoop(times, [&] { share->rebuildDirectly(); });
+              }},
+             {"rebuilding evaluation",
+              [share](std::size_t times) {
+                  return timedLoop(times, [&] {
+                      share->touch();
+                      share->evaluate();
+                  });
+              },
+              Goal::ratio(kLimit)}}};
 }
 
 cl_event makeCompleteEvent()
@@ -191,11 +193,11 @@ cl_event makeCompleteEvent()
     return event;
 }
 
-// An evaluator asks for a batched buffer, and drops the event that it gets.
+// A deformer acquires a batched buffer, and releases the event.
 Group acquireBatched(const std::string& name)
 {
     constexpr double kLimit = 5;
-    const auto share = std::make_shared<OwnShare>(16);
+    const auto share = std::make_shared<StubbedBatch>(16);
     AutoCLObject<cl_event> event;
     event.adopt(makeCompleteEvent());
     return {name,
@@ -221,12 +223,12 @@ Group acquireBatched(const std::string& name)
               Goal::extraNanoseconds(kLimit)}}};
 }
 
-// Evaluators hand over their last events.
-class HandingOver {
+// Deformers report their last events.
+class EventReports {
 public:
     static constexpr std::size_t kEvents = 64; // of each thread in an evaluation
 
-    explicit HandingOver(std::size_t threads)
+    explicit EventReports(std::size_t threads)
         : fPair(threads == 2 ? std::make_unique<TwoThreads>() : nullptr)
     {
         fEvent.adopt(makeCompleteEvent());
@@ -242,7 +244,7 @@ public:
         return time;
     }
 
-    Nanoseconds evaluateByHand()
+    Nanoseconds evaluateDirectly()
     {
         const Nanoseconds time = onThreads([&] {
             clRetainEvent(fEvent.get());
@@ -265,36 +267,36 @@ private:
         return fPair ? fPair->timedTogether(work) : timed([&] { work(0); });
     }
 
-    OwnShare fShare{16};
+    StubbedBatch fShare{16};
     AutoCLObject<cl_event> fEvent;
     tbb::concurrent_vector<cl_event> fList;
     std::unique_ptr<TwoThreads> fPair; // null for one thread
 };
 
-Group handOver(const std::string& name, std::size_t threads)
+Group reportEvents(const std::string& name, std::size_t threads)
 {
     constexpr double kLimit = 1.2;
-    const auto handing = std::make_shared<HandingOver>(threads);
-    const auto repeat = [handing](Nanoseconds (HandingOver::*evaluate)()) {
-        return [handing, evaluate](std::size_t frames) {
+    const auto reports = std::make_shared<EventReports>(threads);
+    const auto repeat = [reports](Nanoseconds (EventReports::*evaluate)()) {
+        return [reports, evaluate](std::size_t frames) {
             Nanoseconds time{0};
             for (std::size_t frame = 0; frame < frames; ++frame)
-                time += (*handing.*evaluate)();
+                time += (*reports.*evaluate)();
             return time;
         };
     };
     return {name,
-            {{"retain, push", repeat(&HandingOver::evaluateByHand), {}, HandingOver::kEvents},
-             {"EnqueueReleaseBatchedSharedCLBuffer", repeat(&HandingOver::evaluate),
-              Goal::ratio(kLimit), HandingOver::kEvents}},
+            {{"retain, push", repeat(&EventReports::evaluateDirectly), {}, EventReports::kEvents},
+             {"EnqueueReleaseBatchedSharedCLBuffer", repeat(&EventReports::evaluate),
+              Goal::ratio(kLimit), EventReports::kEvents}},
             threads > 1};
 }
 
 } // namespace
 
-std::vector<GroupMaker> batchGroups(Runtime* runtime)
+std::vector<GroupFactory> batchGroups(Runtime* runtime)
 {
-    std::vector<GroupMaker> groups;
+    std::vector<GroupFactory> groups;
     const auto add = [&groups](const std::string& name, auto make, auto... arguments) {
         groups.push_back({name, [=] { return make(name, arguments...); }});
     };
@@ -303,10 +305,11 @@ std::vector<GroupMaker> batchGroups(Runtime* runtime)
         groups.push_back({name, [=] { return evaluation(name, *runtime, count); }});
     }
     for (const std::size_t count : {16u, 256u, 4096u})
-        add("evaluation without interop, " + std::to_string(count) + " buffers", ownShare, count);
+        add("evaluation without interop, " + std::to_string(count) + " buffers", withoutInterop,
+            count);
     add("batch rebuild, 4096 buffers", rebuild, std::size_t{4096});
     add("acquire of a batched buffer", acquireBatched);
-    add("handing events over, 1 thread", handOver, std::size_t{1});
-    add("handing events over, 2 threads", handOver, std::size_t{2});
+    add("reports events over, 1 thread", reportEvents, std::size_t{1});
+    add("reports events over, 2 threads", reportEvents, std::size_t{2});
     return groups;
 }

@@ -5,16 +5,16 @@
 
 namespace {
 
-void append(std::vector<GroupMaker>& all, std::vector<GroupMaker> groups)
+void append(std::vector<GroupFactory>& all, std::vector<GroupFactory> groups)
 {
     std::move(groups.begin(), groups.end(), std::back_inserter(all));
 }
 
 } // namespace
 
-std::vector<GroupMaker> allGroups(Runtime* runtime)
+std::vector<GroupFactory> allGroups(Runtime* runtime)
 {
-    std::vector<GroupMaker> all = kernelGroups();
+    std::vector<GroupFactory> all = kernelGroups();
     append(all, poolGroups());
     append(all, transferGroups());
     append(all, eventGroups());

@@ -1,18 +1,19 @@
-// All groups of cases, room by room.
+// All groups of cases, by module.
 #pragma once
 
 #include "harness/Group.h"
 
 class Runtime;
 
-std::vector<GroupMaker> kernelGroups();
-std::vector<GroupMaker> poolGroups();
-std::vector<GroupMaker> transferGroups();
-std::vector<GroupMaker> eventGroups();
-std::vector<GroupMaker> dataMapGroups();
-// These share buffers with the renderer; `runtime` is used when a group is made.
-std::vector<GroupMaker> batchGroups(Runtime* runtime);
-std::vector<GroupMaker> sharingGroups(Runtime* runtime);
-std::vector<GroupMaker> evaluatorGroups(Runtime* runtime);
+std::vector<GroupFactory> kernelGroups();
+std::vector<GroupFactory> poolGroups();
+std::vector<GroupFactory> transferGroups();
+std::vector<GroupFactory> eventGroups();
+std::vector<GroupFactory> dataMapGroups();
+// These share buffers with the renderer. Creating a group uses `runtime`, which may be null until
+// then.
+std::vector<GroupFactory> batchGroups(Runtime* runtime);
+std::vector<GroupFactory> sharingGroups(Runtime* runtime);
+std::vector<GroupFactory> evaluatorGroups(Runtime* runtime);
 
-std::vector<GroupMaker> allGroups(Runtime* runtime);
+std::vector<GroupFactory> allGroups(Runtime* runtime);

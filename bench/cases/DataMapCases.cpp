@@ -1,4 +1,4 @@
-// The evaluation's data map beside the concurrent map that it is made of.
+// The data map relative to the concurrent map that it uses.
 #include "buffers/TopenCLData.h"
 #include "cases/Cases.h"
 #include "fixtures/Runtime.h"
@@ -14,8 +14,8 @@ namespace {
 
 using Key = TopenCLData::Key;
 
-// The map alone: the same key and hash, and a value of one word.
-class BareMap {
+// The concurrent map with the same key and hash, and a value of one word.
+class PlainMap {
 public:
     void set(const Key& key)
     {
@@ -35,7 +35,7 @@ private:
         fMap;
 };
 
-// One buffer for all entries, with memory and no event, as the pool hands them out.
+// Returns one buffer for all entries: with memory and without an event, like those of the pool.
 const TopenCLDataBuffer& sharedBuffer()
 {
     static const TopenCLDataBuffer theBuffer = [] {
@@ -58,7 +58,7 @@ private:
     TopenCLData fData;
 };
 
-// A key per name and plug, in an order that has nothing to do with either.
+// Returns one key per name and plug, in random order.
 std::vector<Key> makeKeys(std::size_t count)
 {
     const std::array names{TopenCLData::sPositionsName(), TopenCLData::sNormalsName(),
@@ -71,12 +71,12 @@ std::vector<Key> makeKeys(std::size_t count)
     return keys;
 }
 
-struct Setting {
+struct Workload {
     std::vector<Key> keys;
     std::size_t threads = 1;
     std::unique_ptr<TwoThreads> pair; // null for one thread
 
-    // Hands every key to `use`; each of two threads takes one half.
+    // Calls `use` for every key; each of two threads handles one half.
     template <typename Use>
     Nanoseconds forEach(const Use& use) const
     {
@@ -89,54 +89,54 @@ struct Setting {
     }
 };
 
-using SettingPointer = std::shared_ptr<const Setting>;
+using WorkloadPointer = std::shared_ptr<const Workload>;
 
 template <typename Map>
-Body getting(const SettingPointer& setting)
+Body getting(const WorkloadPointer& workload)
 {
     const auto map = std::make_shared<Map>();
-    for (const Key& key : setting->keys)
+    for (const Key& key : workload->keys)
         map->set(key);
     return [=](std::size_t sweeps) {
         Nanoseconds time{0};
         for (std::size_t sweep = 0; sweep < sweeps; ++sweep)
-            time += setting->forEach([&](const Key& key) { map->get(key); });
+            time += workload->forEach([&](const Key& key) { map->get(key); });
         return time;
     };
 }
 
 template <typename Map>
-Body settingNew(const SettingPointer& setting)
+Body settingNew(const WorkloadPointer& workload)
 {
     return [=](std::size_t sweeps) {
         Nanoseconds time{0};
         for (std::size_t sweep = 0; sweep < sweeps; ++sweep) {
             Map map;
-            time += setting->forEach([&](const Key& key) { map.set(key); });
+            time += workload->forEach([&](const Key& key) { map.set(key); });
         }
         return time;
     };
 }
 
 template <typename Map>
-Body settingAgain(const SettingPointer& setting)
+Body settingAgain(const WorkloadPointer& workload)
 {
     const auto map = std::make_shared<Map>();
-    for (const Key& key : setting->keys)
+    for (const Key& key : workload->keys)
         map->set(key);
     return [=](std::size_t sweeps) {
         Nanoseconds time{0};
         for (std::size_t sweep = 0; sweep < sweeps; ++sweep)
-            time += setting->forEach([&](const Key& key) { map->set(key); });
+            time += workload->forEach([&](const Key& key) { map->set(key); });
         return time;
     };
 }
 
-// One of the map's operations, beside the bare map's.
+// One operation of both maps.
 struct Operation {
     const char* name;
-    Body (*bare)(const SettingPointer&);
-    Body (*library)(const SettingPointer&);
+    Body (*plain)(const WorkloadPointer&);
+    Body (*library)(const WorkloadPointer&);
     Goal goal;
 };
 
@@ -149,26 +149,26 @@ std::string nameOf(const Operation& operation, std::size_t entries, std::size_t 
 Group mapGroup(const Operation& operation, std::size_t entries, std::size_t threads)
 {
     auto pair = threads == 2 ? std::make_unique<TwoThreads>() : nullptr;
-    const auto setting =
-        std::make_shared<Setting>(Setting{makeKeys(entries), threads, std::move(pair)});
+    const auto workload =
+        std::make_shared<Workload>(Workload{makeKeys(entries), threads, std::move(pair)});
     const auto perEntry = static_cast<double>(entries);
     return {nameOf(operation, entries, threads),
-            {{"bare map", operation.bare(setting), {}, perEntry},
-             {"TopenCLData", operation.library(setting), operation.goal, perEntry}},
+            {{"TBB map", operation.plain(workload), {}, perEntry},
+             {"TopenCLData", operation.library(workload), operation.goal, perEntry}},
             threads > 1};
 }
 
 } // namespace
 
-std::vector<GroupMaker> dataMapGroups()
+std::vector<GroupFactory> dataMapGroups()
 {
     constexpr double kGetLimit = 1.3;
     const std::array operations{
-        Operation{"getData", getting<BareMap>, getting<LibraryMap>, Goal::ratio(kGetLimit)},
-        Operation{"setData, new", settingNew<BareMap>, settingNew<LibraryMap>, {}},
-        Operation{"setData, again", settingAgain<BareMap>, settingAgain<LibraryMap>, {}}};
+        Operation{"getData", getting<PlainMap>, getting<LibraryMap>, Goal::ratio(kGetLimit)},
+        Operation{"setData, new", settingNew<PlainMap>, settingNew<LibraryMap>, {}},
+        Operation{"setData, again", settingAgain<PlainMap>, settingAgain<LibraryMap>, {}}};
 
-    std::vector<GroupMaker> groups;
+    std::vector<GroupFactory> groups;
     for (const Operation& operation : operations) {
         for (const std::size_t entries : {256u, 4096u, 65536u}) {
             for (const std::size_t threads : {1u, 2u})

@@ -1,4 +1,4 @@
-// The evaluator: what its kernels cost, and what it adds to the direct calls of a frame.
+// The evaluator: the cost of its kernels, and its overhead relative to direct calls.
 #include "cases/Cases.h"
 #include "evaluator/Evaluator.h"
 #include "evaluator/SkinDeformer.h"
@@ -23,7 +23,7 @@
 namespace {
 
 constexpr std::uint32_t kBones = 32;
-// Vertices of a mesh whose kernels are measured, and of one whose commands are.
+// Vertices of a mesh for measuring kernels, and of one for measuring commands.
 constexpr std::size_t kManyVertices = 16384;
 constexpr std::size_t kFewVertices = GLBuffers::kBytes / sizeof(vyra::Vector3);
 constexpr std::size_t kMeshes = 64;
@@ -48,7 +48,7 @@ vyra::SkinWeights makeWeights(std::size_t vertexCount)
             std::vector<vyra::SkinWeights::BoneWeights>(vertexCount, {0.4F, 0.3F, 0.2F, 0.1F})};
 }
 
-// Copies the vertices: as few instructions as a kernel takes.
+// Copies the vertices: a minimal kernel.
 class CopyDeformer final : public vyra::Deformer {
 public:
     const char* name() const override { return "copy"; }
@@ -76,12 +76,12 @@ public:
     }
 };
 
-// An evaluator that works on the calling thread alone, so that counts repeat.
+// An evaluator limited to the calling thread, which makes instruction counts repeatable.
 class OneThreadEvaluator {
 public:
     explicit OneThreadEvaluator(Runtime& runtime)
     {
-        TopenCLInfo::theOne().setMinimumBufferSize(0); // small meshes, too
+        TopenCLInfo::theOne().setMinimumBufferSize(0); // also for small meshes
         vyra::EvaluatorSettings settings;
         settings.finishRenderer = [&runtime] { runtime.gl().glFinish(); };
         fEvaluator = std::make_unique<vyra::Evaluator>(std::move(settings));
@@ -107,7 +107,7 @@ private:
     std::uint16_t fFrame = 0;
 };
 
-// One large mesh, deformed by one deformer at a time.
+// One large mesh with several deformers, of which one is enabled at a time.
 class KernelsOfAMesh {
 public:
     explicit KernelsOfAMesh(Runtime& runtime)
@@ -126,7 +126,7 @@ public:
         fMesh.add<vyra::TwistDeformer>().angle = 1;
     }
 
-    // The case that runs the deformer with this index alone, per vertex.
+    // Returns the case that runs only the deformer with this index, per vertex.
     static Case caseOf(const char* name, const std::shared_ptr<KernelsOfAMesh>& mesh,
                        std::size_t index)
     {
@@ -147,13 +147,13 @@ private:
     vyra::DeformableMesh& fMesh;
 };
 
-// What changes from frame to frame.
+// Changes a bone, as an animation does in each frame.
 void move(vyra::SkinDeformer& skin)
 {
     skin.bones[0][3] = skin.bones[0][3] < 1 ? skin.bones[0][3] + 0.125F : 0;
 }
 
-// Many small meshes, through the evaluator.
+// Many small meshes, deformed by the evaluator.
 class EvaluatedMeshes {
 public:
     explicit EvaluatedMeshes(Runtime& runtime) : fBuffers(runtime, 2 * kMeshes), fEvaluator(runtime)
@@ -182,8 +182,8 @@ private:
     std::vector<vyra::SkinDeformer*> fSkins;
 };
 
-// The same meshes by direct calls: one acquire, for each mesh an upload and two kernels, one
-// release.
+// The same meshes, deformed by direct calls: one acquire; an upload and two kernels for each mesh;
+// one release.
 class DirectMeshes {
 public:
     explicit DirectMeshes(Runtime& runtime) : fRuntime(runtime), fBuffers(runtime, 2 * kMeshes)
@@ -301,7 +301,7 @@ Group frames(const std::string& name, Runtime& runtime)
 
 } // namespace
 
-std::vector<GroupMaker> evaluatorGroups(Runtime* runtime)
+std::vector<GroupFactory> evaluatorGroups(Runtime* runtime)
 {
     const std::string kernelsName = "deformer kernels, 16384 vertices";
     const std::string precisionName = "skin kernel in double precision";

@@ -1,4 +1,4 @@
-// Wait lists and the state of events.
+// Wait lists, and the status of events.
 #include "baselines/ThirdPartyBaseline.h"
 #include "cases/Cases.h"
 #include "diagnostics/AutoCLEventList.h"
@@ -21,7 +21,7 @@ Event completeEvent()
     return event;
 }
 
-// The least that borrows a list of events: a plain array of handles that grows by one half.
+// A minimal wait list: a plain array of handles that grows by one half.
 class HandleArray {
 public:
     void add(const Event& event)
@@ -73,7 +73,8 @@ Group waitList(const std::string& name, std::size_t size)
     std::vector<cl_event> handles;
     for (const Event& event : *events)
         handles.push_back(event.get());
-    addPeers(group, [&](const Peer& peer) { return peer.waitList(handles); });
+    addThirdPartyBaselines(
+        group, [&](const ThirdPartyBaseline& library) { return library.waitList(handles); });
     return group;
 }
 
@@ -101,9 +102,9 @@ Group completion(const std::string& name)
 
 } // namespace
 
-std::vector<GroupMaker> eventGroups()
+std::vector<GroupFactory> eventGroups()
 {
-    std::vector<GroupMaker> groups;
+    std::vector<GroupFactory> groups;
     for (const std::size_t size : {4u, 64u, 1024u}) {
         const std::string name = "wait list of " + std::to_string(size);
         groups.push_back({name, [=] { return waitList(name, size); }});

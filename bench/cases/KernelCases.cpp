@@ -1,4 +1,4 @@
-// The kernel store: cache hits, and giving kernels back.
+// The kernel store: cache hits, and the release of kernels.
 #include "baselines/ThirdPartyBaseline.h"
 #include "cases/Cases.h"
 #include "diagnostics/AutoCLObject.h"
@@ -45,11 +45,11 @@ bool sameTexts(const KernelRequest& one, const KernelRequest& other)
     return same;
 }
 
-// Programs that stay cached, since one kernel of each is never given back.
+// Programs that stay cached, since one kernel of each is held.
 struct CachedPrograms {
     Programs programs;
     std::vector<Kernel> held;
-    std::vector<cl_kernel> heldByHand;
+    std::vector<cl_kernel> heldDirectly;
     std::vector<KernelRequest> copies; // of the requests
 
     CachedPrograms(std::size_t count, Programs::Texts texts)
@@ -58,48 +58,48 @@ struct CachedPrograms {
         for (const KernelRequest& request : programs.requests()) {
             held.push_back(getKernel(request));
             if (!held.back().get())
-                throw std::runtime_error("the store gives no kernel of " + request.path);
+                throw std::runtime_error("the store has no kernel of " + request.path);
         }
         for (cl_program program : programs.built())
-            heldByHand.push_back(createKernel(program));
+            heldDirectly.push_back(createKernel(program));
     }
     ~CachedPrograms()
     {
         for (const Kernel& kernel : held)
             store().freeKernel(kernel);
-        for (cl_kernel kernel : heldByHand)
+        for (cl_kernel kernel : heldDirectly)
             clReleaseKernel(kernel);
     }
     CachedPrograms(const CachedPrograms&) = delete;
     CachedPrograms& operator=(const CachedPrograms&) = delete;
 
-    // One kernel of each program in turn, asked for and given back.
+    // Gets and frees a kernel of each program in turn.
     void takeTurns(std::size_t count) const
     {
         const auto& requests = programs.requests();
         for (std::size_t index = 0; index < count; ++index)
             store().freeKernel(getKernel(requests[index % requests.size()]));
     }
-    // The calls that this must make.
-    void takeTurnsByHand(std::size_t count) const
+    // Makes the OpenCL calls of takeTurns() directly.
+    void takeTurnsDirectly(std::size_t count) const
     {
         for (std::size_t index = 0; index < count; ++index)
-            takeTurnByHand(index % programs.built().size());
+            takeTurnDirectly(index % programs.built().size());
     }
-    // The same, and a look at every byte of what tells one program from another: the least that a
-    // cache can do, if it knew the right program beforehand.
+    // The same, with a comparison of every byte of the key: the minimum for a cache, which would
+    // have to find the right entry at once.
     void takeTurnsAndCompare(std::size_t count) const
     {
         const auto& requests = programs.requests();
         for (std::size_t index = 0; index < count; ++index) {
             const std::size_t turn = index % requests.size();
             keep(sameTexts(requests[turn], copies[turn]));
-            takeTurnByHand(turn);
+            takeTurnDirectly(turn);
         }
     }
 
 private:
-    void takeTurnByHand(std::size_t turn) const
+    void takeTurnDirectly(std::size_t turn) const
     {
         cl_kernel kernel = createKernel(programs.built()[turn]);
         clRetainKernel(kernel);
@@ -114,7 +114,7 @@ Group hits(const std::string& name, std::size_t keys, Programs::Texts texts, dou
     Group group{
         name,
         {{"create, retain, 2 releases",
-          [cached](std::size_t count) { return timed([&] { cached->takeTurnsByHand(count); }); }},
+          [cached](std::size_t count) { return timed([&] { cached->takeTurnsDirectly(count); }); }},
          {"the same, texts compared",
           [cached](std::size_t count) {
               return timed([&] { cached->takeTurnsAndCompare(count); });
@@ -122,7 +122,9 @@ Group hits(const std::string& name, std::size_t keys, Programs::Texts texts, dou
          {"getKernel, freeKernel",
           [cached](std::size_t count) { return timed([&] { cached->takeTurns(count); }); },
           Goal::ratio(limit)}}};
-    addPeers(group, [&](const Peer& peer) { return peer.kernelHits(cached->programs); });
+    addThirdPartyBaselines(group, [&](const ThirdPartyBaseline& library) {
+        return library.kernelHits(cached->programs);
+    });
     return group;
 }
 
@@ -140,42 +142,42 @@ Group hitsOnTwoThreads(const std::string& name)
                   return threads->timedTogether([&](std::size_t) { cached->takeTurns(count); });
               },
               Goal::ratio(kLimit)},
-             {"bare calls, two threads",
+             {"direct calls, two threads",
               [cached, threads](std::size_t count) {
                   return threads->timedTogether(
-                      [&](std::size_t) { cached->takeTurnsByHand(count); });
+                      [&](std::size_t) { cached->takeTurnsDirectly(count); });
               }}},
             true};
 }
 
-// A number of kernels outstanding, over programs that stay cached. Some are given back and replaced
-// by new ones, over and over, in an order that has nothing to do with that of their creation.
-class Outstanding {
+// A number of kernels in use, of programs that stay cached. Some are freed and replaced by new
+// ones, repeatedly and in random order.
+class OutstandingKernels {
 public:
     static constexpr std::size_t kPrograms = 64;
-    static constexpr std::size_t kBatch = 8; // given back between two looks at the clock
+    static constexpr std::size_t kBatch = 8; // freed in one timed part
 
-    explicit Outstanding(std::size_t count) : fCached(kPrograms, Programs::Texts::kShort)
+    explicit OutstandingKernels(std::size_t count) : fCached(kPrograms, Programs::Texts::kShort)
     {
         for (std::size_t index = 0; index < count; ++index) {
             fKernels.push_back(getKernel(request(index)));
-            fByHand.push_back(createByHand(index));
+            fDirectly.push_back(createDirectly(index));
         }
         fOrder.resize(count);
         std::iota(fOrder.begin(), fOrder.end(), 0);
         std::shuffle(fOrder.begin(), fOrder.end(), std::mt19937(1));
     }
-    ~Outstanding()
+    ~OutstandingKernels()
     {
         for (const Kernel& kernel : fKernels)
             store().freeKernel(kernel);
-        for (cl_kernel kernel : fByHand) {
+        for (cl_kernel kernel : fDirectly) {
             clReleaseKernel(kernel);
             clReleaseKernel(kernel);
         }
     }
-    Outstanding(const Outstanding&) = delete;
-    Outstanding& operator=(const Outstanding&) = delete;
+    OutstandingKernels(const OutstandingKernels&) = delete;
+    OutstandingKernels& operator=(const OutstandingKernels&) = delete;
 
     Nanoseconds replace()
     {
@@ -189,16 +191,16 @@ public:
         return time;
     }
 
-    // The store's release is the first of two.
-    Nanoseconds replaceByHand()
+    // Of the two references, the timed one is the store's.
+    Nanoseconds replaceDirectly()
     {
         const Nanoseconds time = timed([&] {
             for (std::size_t step = 0; step < kBatch; ++step)
-                clReleaseKernel(fByHand[at(step)]);
+                clReleaseKernel(fDirectly[at(step)]);
         });
         for (std::size_t step = 0; step < kBatch; ++step) {
-            clReleaseKernel(fByHand[at(step)]);
-            fByHand[at(step)] = createByHand(at(step));
+            clReleaseKernel(fDirectly[at(step)]);
+            fDirectly[at(step)] = createDirectly(at(step));
         }
         fNext += kBatch;
         return time;
@@ -210,7 +212,7 @@ private:
     {
         return fCached.programs.requests()[index % kPrograms];
     }
-    cl_kernel createByHand(std::size_t index) const
+    cl_kernel createDirectly(std::size_t index) const
     {
         cl_kernel kernel = createKernel(fCached.programs.built()[index % kPrograms]);
         clRetainKernel(kernel);
@@ -219,15 +221,15 @@ private:
 
     CachedPrograms fCached;
     std::vector<Kernel> fKernels;
-    std::vector<cl_kernel> fByHand;
+    std::vector<cl_kernel> fDirectly;
     std::vector<std::size_t> fOrder;
     std::size_t fNext = 0;
 };
 
-Group givingBack(const std::string& name, std::size_t count, Goal goal)
+Group releaseOutstanding(const std::string& name, std::size_t count, Goal goal)
 {
-    const auto outstanding = std::make_shared<Outstanding>(count);
-    const auto repeat = [outstanding](Nanoseconds (Outstanding::*replace)()) {
+    const auto outstanding = std::make_shared<OutstandingKernels>(count);
+    const auto repeat = [outstanding](Nanoseconds (OutstandingKernels::*replace)()) {
         return [outstanding, replace](std::size_t iterations) {
             Nanoseconds time{0};
             for (std::size_t index = 0; index < iterations; ++index)
@@ -235,28 +237,29 @@ Group givingBack(const std::string& name, std::size_t count, Goal goal)
             return time;
         };
     };
-    return {name,
-            {{"release", repeat(&Outstanding::replaceByHand), {}, Outstanding::kBatch},
-             {"freeKernel", repeat(&Outstanding::replace), goal, Outstanding::kBatch}}};
+    return {
+        name,
+        {{"release", repeat(&OutstandingKernels::replaceDirectly), {}, OutstandingKernels::kBatch},
+         {"freeKernel", repeat(&OutstandingKernels::replace), goal, OutstandingKernels::kBatch}}};
 }
 
 } // namespace
 
-std::vector<GroupMaker> kernelGroups()
+std::vector<GroupFactory> kernelGroups()
 {
     constexpr double kOneKey = 1.2;
     constexpr double kManyKeys = 1.35;
-    const auto maker = [](const std::string& name, auto make, auto... arguments) {
-        return GroupMaker{name, [=] { return make(name, arguments...); }};
+    const auto factory = [](const std::string& name, auto make, auto... arguments) {
+        return GroupFactory{name, [=] { return make(name, arguments...); }};
     };
-    std::vector<GroupMaker> groups{
-        maker("getKernel hit, 1 key", hits, 1u, Programs::Texts::kShort, kOneKey),
-        maker("getKernel hit, 32 keys, long texts", hits, 32u, Programs::Texts::kLong, kManyKeys),
-        maker("getKernel hit, two threads", hitsOnTwoThreads)};
+    std::vector<GroupFactory> groups{
+        factory("getKernel hit, 1 key", hits, 1u, Programs::Texts::kShort, kOneKey),
+        factory("getKernel hit, 32 keys, long texts", hits, 32u, Programs::Texts::kLong, kManyKeys),
+        factory("getKernel hit, two threads", hitsOnTwoThreads)};
     for (const std::size_t count : {16u, 64u, 256u, 1024u}) {
         const Goal goal = count == 256 ? Goal::extraNanoseconds(1000) : Goal();
-        groups.push_back(maker("freeKernel, " + std::to_string(count) + " outstanding", givingBack,
-                               count, goal));
+        groups.push_back(factory("freeKernel, " + std::to_string(count) + " outstanding",
+                                 releaseOutstanding, count, goal));
     }
     return groups;
 }

@@ -1,4 +1,4 @@
-// The buffer pool beside creating and releasing memory each time.
+// The buffer pool relative to creating and releasing memory each time.
 #include "baselines/ThirdPartyBaseline.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
@@ -26,8 +26,8 @@ cl_mem createMemory(std::size_t bytes)
     return clCreateBuffer(Runtime::context(), CL_MEM_READ_WRITE, bytes, nullptr, &status);
 }
 
-// A pool with a number of free entries, all of different sizes. An evaluation takes some of them,
-// in an order that has nothing to do with that of giving back, then gives all back.
+// A pool with a number of free entries of different sizes. An evaluation takes some of them in
+// random order, then releases all.
 class FreeEntries {
 public:
     explicit FreeEntries(std::size_t count)
@@ -53,7 +53,7 @@ public:
         fPool.releaseBuffers();
     }
 
-    void evaluateByHand()
+    void evaluateDirectly()
     {
         std::array<cl_mem, kBuffersTaken> taken;
         for (cl_mem& memory : taken)
@@ -62,7 +62,7 @@ public:
             clReleaseMemObject(memory);
     }
 
-    // In the order in which evaluations take them.
+    // Returns the sizes in bytes, in the order in which evaluations take the buffers.
     std::vector<std::size_t> sizes() const
     {
         std::vector<std::size_t> all;
@@ -90,7 +90,7 @@ Group reuse(const std::string& name, std::size_t count, Goal goal)
     Group group{name,
                 {{"create, release",
                   [entries](std::size_t evaluations) {
-                      return timedLoop(evaluations, [&] { entries->evaluateByHand(); });
+                      return timedLoop(evaluations, [&] { entries->evaluateDirectly(); });
                   },
                   {},
                   kBuffersTaken},
@@ -99,11 +99,13 @@ Group reuse(const std::string& name, std::size_t count, Goal goal)
                       return timedLoop(evaluations, [&] { entries->evaluate(); });
                   },
                   goal, kBuffersTaken}}};
-    addPeers(group, [&](const Peer& peer) { return peer.bufferReuse(entries->sizes()); });
+    addThirdPartyBaselines(group, [&](const ThirdPartyBaseline& library) {
+        return library.bufferReuse(entries->sizes());
+    });
     return group;
 }
 
-// Fills the whole buffer, as the output of a kernel is, and waits.
+// Fills the whole buffer, like a kernel its output, and waits.
 void write(cl_mem memory, std::size_t bytes)
 {
     constexpr cl_float4 kPattern{{1, 2, 3, 4}};
@@ -112,8 +114,8 @@ void write(cl_mem memory, std::size_t bytes)
     clFinish(Runtime::queue());
 }
 
-// Memory that is new must be mapped and cleared by the system on its first use, provided that the
-// allocator does not recycle what was released; see MALLOC_MMAP_THRESHOLD_ in scripts/bench.
+// The system must map and clear new memory on its first use, unless the allocator reuses released
+// memory; see MALLOC_MMAP_THRESHOLD_ in scripts/bench.
 struct WrittenBuffer {
     TopenCLDataBufferPool pool;
     std::size_t bytes;
@@ -135,10 +137,10 @@ struct WrittenBuffer {
         pool.releaseBuffers();
     }
 
-    // Into memory that was written before: what is left when making memory costs nothing.
+    // Writes into existing memory: the cost without the creation of memory.
     void rewrite() const { write(kept, bytes); }
 
-    void evaluateByHand() const
+    void evaluateDirectly() const
     {
         cl_mem memory = createMemory(bytes);
         write(memory, bytes);
@@ -153,22 +155,24 @@ Group reuseWritten(const std::string& name, std::size_t bytes, double limit)
         name,
         {{"create, write, release",
           [buffer](std::size_t count) {
-              return timedLoop(count, [&] { buffer->evaluateByHand(); });
+              return timedLoop(count, [&] { buffer->evaluateDirectly(); });
           }},
          {"the write alone",
           [buffer](std::size_t count) { return timedLoop(count, [&] { buffer->rewrite(); }); }},
          {"createBuffer, write, releaseBuffers",
           [buffer](std::size_t count) { return timedLoop(count, [&] { buffer->evaluate(); }); },
           Goal::ratio(limit)}}};
-    addPeers(group, [&](const Peer& peer) { return peer.writtenReuse(bytes, write); });
+    addThirdPartyBaselines(group, [&](const ThirdPartyBaseline& library) {
+        return library.writtenReuse(bytes, write);
+    });
     return group;
 }
 
 } // namespace
 
-std::vector<GroupMaker> poolGroups()
+std::vector<GroupFactory> poolGroups()
 {
-    std::vector<GroupMaker> groups;
+    std::vector<GroupFactory> groups;
     const auto add = [&groups](const std::string& name, auto make, auto... arguments) {
         groups.push_back({name, [=] { return make(name, arguments...); }});
     };

@@ -1,4 +1,4 @@
-// The software sharing layer: acquire and release beside a marker with the same wait list.
+// The software sharing layer: acquire and release relative to markers with the same wait lists.
 #include "cases/Cases.h"
 #include "fixtures/GLBuffers.h"
 #include "fixtures/Runtime.h"
@@ -11,7 +11,7 @@
 
 namespace {
 
-// The layer's counters; all zero where it is not active.
+// Returns the layer's counters; all are zero if it is not active.
 glshare_counters countersOfLayer()
 {
     glshare_counters counters{};
@@ -95,7 +95,7 @@ Group sharing(const std::string& name, Runtime& runtime, std::size_t count)
 
 } // namespace
 
-std::vector<GroupMaker> sharingGroups(Runtime* runtime)
+std::vector<GroupFactory> sharingGroups(Runtime* runtime)
 {
     const std::string name = "glshare, 256 buffers in place";
     return {{name, [=] { return sharing(name, *runtime, 256); }}};

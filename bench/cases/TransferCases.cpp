@@ -15,7 +15,7 @@ std::string sizeText(std::size_t bytes)
                                    std::to_string(bytes / 100'000 % 10) + " MB";
 }
 
-// Memory on both sides, the same for the library and for the bare calls.
+// Host and device memory, the same for the library and for the direct calls.
 struct Transfer {
     std::vector<char> contents;
     TopenCLBuffer buffer{Runtime::context(), CL_MEM_READ_WRITE};
@@ -24,7 +24,7 @@ struct Transfer {
     explicit Transfer(std::size_t bytes) : contents(bytes, 1)
     {
         buffer.ensureBufferCapacity(bytes);
-        uploadByHand();
+        uploadDirectly();
     }
 
     void upload()
@@ -32,7 +32,7 @@ struct Transfer {
         buffer.uploadDataToGPU(queue, CL_FALSE, 0, contents.size(), contents.data(), 0, nullptr);
         waitForReadyEvent();
     }
-    void uploadByHand()
+    void uploadDirectly()
     {
         cl_event done = nullptr;
         clEnqueueWriteBuffer(queue, buffer.buffer().get(), CL_FALSE, 0, contents.size(),
@@ -45,7 +45,7 @@ struct Transfer {
                                    nullptr);
         waitForReadyEvent();
     }
-    void readBackByHand()
+    void readBackDirectly()
     {
         cl_event done = nullptr;
         clEnqueueReadBuffer(queue, buffer.buffer().get(), CL_FALSE, 0, contents.size(),
@@ -57,7 +57,7 @@ struct Transfer {
         TopenCLBuffer growing(Runtime::context(), CL_MEM_READ_WRITE);
         growing.uploadDataToGPU(queue, CL_FALSE, 0, contents.size(), contents.data(), 0, nullptr);
     }
-    void growByHand()
+    void growDirectly()
     {
         cl_int status = CL_SUCCESS;
         cl_mem memory = clCreateBuffer(Runtime::context(), CL_MEM_READ_WRITE | CL_MEM_COPY_HOST_PTR,
@@ -82,13 +82,14 @@ private:
 using Operation = void (Transfer::*)();
 
 struct Pair {
-    const char* bareName;
-    Operation bare;
+    const char* directName;
+    Operation direct;
     const char* name;
     Operation operation;
     double limit;
-    // What peers have beside it; null where they have nothing.
-    std::optional<Case> (Peer::*peerCase)(cl_mem, const std::vector<char>&) const = nullptr;
+    // The case of a third-party library; null if there is none.
+    std::optional<Case> (ThirdPartyBaseline::*baselineCase)(
+        cl_mem, const std::vector<char>&) const = nullptr;
 };
 
 Group transfer(const std::string& name, const Pair& pair, std::size_t bytes)
@@ -100,27 +101,30 @@ Group transfer(const std::string& name, const Pair& pair, std::size_t bytes)
         };
     };
     Group group{name,
-                {{pair.bareName, repeat(pair.bare)},
+                {{pair.directName, repeat(pair.direct)},
                  {pair.name, repeat(pair.operation), Goal::ratio(pair.limit)}}};
-    if (pair.peerCase)
-        addPeers(group, [&](const Peer& peer) {
-            return (peer.*pair.peerCase)(shared->buffer.buffer().get(), shared->contents);
+    if (pair.baselineCase)
+        addThirdPartyBaselines(group, [&](const ThirdPartyBaseline& library) {
+            return (library.*pair.baselineCase)(shared->buffer.buffer().get(), shared->contents);
         });
     return group;
 }
 
 } // namespace
 
-std::vector<GroupMaker> transferGroups()
+std::vector<GroupFactory> transferGroups()
 {
-    constexpr Pair kUpload{
-        "enqueue write, wait", &Transfer::uploadByHand, "uploadDataToGPU", &Transfer::upload, 1.02,
-        &Peer::upload};
-    constexpr Pair kReadBack{"enqueue read, wait", &Transfer::readBackByHand, "readBackDataFromGPU",
-                             &Transfer::readBack, 1.02};
-    constexpr Pair kGrowth{"create with host pointer", &Transfer::growByHand,
+    constexpr Pair kUpload{"enqueue write, wait",
+                           &Transfer::uploadDirectly,
+                           "uploadDataToGPU",
+                           &Transfer::upload,
+                           1.02,
+                           &ThirdPartyBaseline::upload};
+    constexpr Pair kReadBack{"enqueue read, wait", &Transfer::readBackDirectly,
+                             "readBackDataFromGPU", &Transfer::readBack, 1.02};
+    constexpr Pair kGrowth{"create with host pointer", &Transfer::growDirectly,
                            "uploadDataToGPU, growing", &Transfer::grow, 1.05};
-    std::vector<GroupMaker> groups;
+    std::vector<GroupFactory> groups;
     const auto add = [&groups](const char* name, const Pair& pair, std::size_t bytes) {
         const std::string full = std::string(name) + ", " + sizeText(bytes);
         groups.push_back({full, [=] { return transfer(full, pair, bytes); }});

@@ -1,4 +1,4 @@
-// Counts what `new` allocates in the whole process: this program replaces the global operator.
+// Counts of allocations with `new` in the whole process: this program replaces the global operator.
 #pragma once
 
 #include <cstddef>
@@ -6,7 +6,7 @@
 // Calls of operator new so far.
 struct Allocations {
     std::size_t library = 0; // from the library's own code
-    std::size_t program = 0; // from this program's: the viewer's parts, and what they inline
+    std::size_t program = 0; // from this program, the viewer's parts and inlined code included
     std::size_t others = 0;  // OpenCL, oneTBB, Qt, OpenGL
 
     Allocations operator-(const Allocations& earlier) const
@@ -22,7 +22,7 @@ struct Allocations {
     }
 };
 
-// Since startCounting(), from all threads.
+// Returns the allocations of all threads since startCounting().
 Allocations allocationsSoFar();
-// Finds out where the library and the program lie. Before that nothing is counted.
+// Locates the code of the library and of the program, and starts counting.
 void startCounting();

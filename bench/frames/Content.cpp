@@ -8,14 +8,14 @@
 namespace {
 
 constexpr std::size_t kTargets = 8;
-constexpr float kSmallest = 0.01F; // share of a coordinate that a target adds
+constexpr float kSmallest = 0.01F; // the part of a coordinate that the first target adds
 
-// Ten iterations shrink small triangles, whose normals are then less exact.
+// Ten iterations shrink small triangles, which makes their normals less exact.
 constexpr double kSmoothedNormalBound = 1e-3;
 
 void addNothing(viewer::Model& /*model*/) {}
 
-// Targets of any shape do: what they cost does not depend on it. All have a weight in each frame.
+// The shape of the targets does not affect their cost. All have a weight in each frame.
 void addTargets(viewer::Model& model)
 {
     for (viewer::Mesh& mesh : model.meshes) {

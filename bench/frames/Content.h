@@ -1,4 +1,4 @@
-// What the characters of a crowd go through in each frame.
+// The deformers of the characters of a crowd.
 #pragma once
 
 #include "frames/CpuDeformation.h"
@@ -12,16 +12,16 @@ struct Content {
     using MakeDeformation = std::unique_ptr<CpuDeformation> (*)(const viewer::Scene&);
 
     const char* name;                // in options and tables
-    const char* deformers;           // as the viewer reads them
-    std::vector<int> crowds;         // numbers of characters that are measured by default
-    void (*prepare)(viewer::Model&); // adds to the model what the deformers need
+    const char* deformers;           // in the viewer's syntax
+    std::vector<int> crowds;         // default numbers of characters
+    void (*prepare)(viewer::Model&); // adds the data that the deformers require
     MakeDeformation deformOnCpu;
-    MakeDeformation deformOnCpuPlainly; // null: there is no such path
-    double normalBound;                 // how far a normal may deviate from the reference
+    MakeDeformation deformOnCpuPlainly; // null if there is no such path
+    double normalBound;                 // maximum deviation of a normal from the reference
 };
 
-// The first one is what most characters are made of, and little work for each byte. The others are
-// much work for each byte.
+// The first is typical of characters, with little work per byte. The others have much work per
+// byte.
 const std::vector<Content>& contents();
-// Throws std::runtime_error, which lists the names, if there is no such content.
+// Throws std::runtime_error, with the list of names, if there is no such content.
 const Content& contentOf(const std::string& name);

@@ -1,4 +1,4 @@
-// Deformers on the CPU without OpenCL, in single precision, with the CPU's vector instructions.
+// Deformers on the CPU without OpenCL, in single precision, with vector instructions.
 #pragma once
 
 #include "evaluator/Geometry.h"
@@ -15,17 +15,17 @@ public:
     CpuDeformation(const CpuDeformation&) = delete;
     CpuDeformation& operator=(const CpuDeformation&) = delete;
 
-    // Deforms the mesh with this index in Scene::meshes(), in its present pose, into two arrays of
-    // all its vertices. Divides large meshes among threads. Safe from any thread, for one mesh
-    // each.
+    // Deforms the mesh with this index in Scene::meshes(), in its current pose, into two arrays
+    // with one element per vertex. Divides large meshes among threads. Several threads may deform
+    // different meshes at the same time.
     virtual void deform(std::size_t mesh, vyra::Vector3* positions, vyra::Vector3* normals) = 0;
 };
 
-// Each borrows the scene, which has the named deformers.
+// These borrow the scene, whose meshes have the named deformers.
 
 // Skin and twist: sixteen vertices at a time, by component.
-std::unique_ptr<CpuDeformation> makeSkinTwist(const viewer::Scene& scene);
-// The same, as one would write it first: skinned one by one, twisted by component.
-std::unique_ptr<CpuDeformation> makePlainSkinTwist(const viewer::Scene& scene);
+[[nodiscard]] std::unique_ptr<CpuDeformation> makeSkinTwist(const viewer::Scene& scene);
+// The same without hand-written vector code: skinned vertex by vertex, twisted by component.
+[[nodiscard]] std::unique_ptr<CpuDeformation> makePlainSkinTwist(const viewer::Scene& scene);
 // Morph and smooth.
-std::unique_ptr<CpuDeformation> makeMorphSmooth(const viewer::Scene& scene);
+[[nodiscard]] std::unique_ptr<CpuDeformation> makeMorphSmooth(const viewer::Scene& scene);

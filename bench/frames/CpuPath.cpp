@@ -8,7 +8,7 @@
 
 namespace {
 
-// The whole frame before is finished, so the driver need not wait or copy.
+// The previous frame is finished, so the driver need not wait or copy.
 constexpr GLbitfield kMapAccess = GL_MAP_WRITE_BIT | GL_MAP_UNSYNCHRONIZED_BIT;
 
 class MappedCpuPath : public Path {
@@ -48,7 +48,7 @@ private:
         void* memory =
             fGL.glMapBufferRange(GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(bytes), kMapAccess);
         if (!memory)
-            throw std::runtime_error("OpenGL maps no vertex buffer");
+            throw std::runtime_error("a vertex buffer cannot be mapped");
         return static_cast<vyra::Vector3*>(memory);
     }
 

@@ -11,7 +11,7 @@
 
 namespace {
 
-// What a frame of the library may take, in times of other paths.
+// Goals for the time of the shared path, relative to other paths.
 struct FrameGoals {
     int characters;
     double toCpu;
@@ -21,7 +21,7 @@ constexpr const char* kContentOfGoals = "skin-twist";
 constexpr FrameGoals kGoals[] = {
     {1, 3, 0.95}, {16, 1.5, 0.85}, {156, 1.4, 0.7}, {500, 1.4, 0.85}, {1560, 1.4, 0.85}};
 
-// The time per character does not grow with the crowd.
+// Goal for the time per character in a large crowd, relative to a medium one.
 constexpr int kMediumCrowd = 156;
 constexpr int kLargeCrowd = 1560;
 constexpr double kGrowth = 1.05;

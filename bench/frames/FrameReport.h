@@ -1,4 +1,4 @@
-// The times of whole frames as tables and as JSON, with the goals.
+// The times of whole frames, with the goals, as tables and as JSON.
 #pragma once
 
 #include "frames/Stage.h"
@@ -8,9 +8,9 @@
 
 #include <QJsonObject>
 
-// One row for each crowd and path.
+// Writes one row for each crowd and path.
 void writeTimes(std::ostream& output, const std::vector<CrowdTimes>& crowds);
-// One row for each crowd and comparison of two paths: the ratio, its goal, and whether it is met.
+// Writes one row for each crowd and comparison of two paths: the ratio, the goal and the verdict.
 void writeGoals(std::ostream& output, const std::vector<CrowdTimes>& crowds);
-// Both.
+// Returns times and comparisons.
 QJsonObject toJson(const std::vector<CrowdTimes>& crowds);

@@ -9,7 +9,7 @@
 namespace {
 
 constexpr std::size_t kFloatsPerVertex = 6; // position and normal
-constexpr std::size_t kGrain = 16384;       // floats of a task
+constexpr std::size_t kGrain = 16384;       // floats per task
 
 class MemoryPath : public Path {
 public:
@@ -20,7 +20,7 @@ public:
 
     void deform() override
     {
-        fValue += 1; // not the same bytes as before
+        fValue += 1; // different bytes in each frame
         const auto write = [this](std::size_t begin, std::size_t end) {
             std::fill(fFloats.data() + begin, fFloats.data() + end, fValue);
         };

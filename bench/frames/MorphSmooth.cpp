@@ -14,9 +14,10 @@
 
 namespace {
 
-// Vertices of a task.
+// Vertices per task.
 constexpr std::size_t kGrain = 512;
-// The areas of a vertex's triangles cancel if their sum is smaller than this part of their sizes.
+// The areas of a vertex's triangles cancel if the length of their sum is below this part of the sum
+// of their lengths.
 constexpr float kCancelled = 1e-4F;
 
 using Float4 = float __attribute__((vector_size(16))); // x, y, z and 0
@@ -42,7 +43,7 @@ void forRanges(std::size_t count, const Body& body)
                       [&](const Range& range) { body(range.begin(), range.end()); });
 }
 
-// One mesh, and the memory between the iterations.
+// One mesh, with the memory between the iterations.
 class MeshMorphSmooth {
 public:
     explicit MeshMorphSmooth(const viewer::CharacterMesh& mesh)
@@ -78,7 +79,7 @@ private:
         return (fSmooth.topology().*array)().template values<T>();
     }
 
-    // All targets at once for one component of positions (0 to 2) or normals (3 to 5).
+    // Applies all targets to one component of positions (0 to 2) or normals (3 to 5).
     void addTargets(std::size_t component, std::size_t begin, std::size_t end, float* sums) const
     {
         const std::size_t count = fRest.vertexCount();
@@ -116,7 +117,7 @@ private:
                      fPositions[corner.last] - fPositions[vertex]);
     }
 
-    // Doubles the normals that lie on the other side of the surface.
+    // Doubles the normals on the other side of the surface.
     void markReversed(std::size_t begin, std::size_t end)
     {
         for (std::size_t i = begin; i < end; ++i) {

@@ -1,4 +1,4 @@
-// The paths on which an application can bring deformed meshes into vertex buffers.
+// The paths by which an application can get deformed meshes into vertex buffers.
 #pragma once
 
 #include "evaluator/Evaluator.h"
@@ -10,8 +10,8 @@
 
 #include <QOpenGLFunctions_3_3_Core>
 
-// One path, with a scene of its own. All functions are called with the renderer's context current;
-// a failure of OpenCL or OpenGL throws std::runtime_error.
+// One path, with its own scene. The OpenGL context is current during each operation. Operations
+// throw std::runtime_error if OpenCL or OpenGL fails.
 class Path {
 public:
     Path() = default;
@@ -19,25 +19,28 @@ public:
     Path(const Path&) = delete;
     Path& operator=(const Path&) = delete;
 
-    // Brings the poses of the scene into its vertex buffers; they may be drawn from after OpenGL
-    // has finished.
+    // Deforms the meshes of the scene, in their current poses, into its vertex buffers, which may
+    // be drawn after glFinish.
     virtual void deform() = 0;
-    // To be called after drawing.
+    // Called after drawing.
     virtual void drawn() {}
 };
 
-// The library: deformed on OpenCL in the vertex buffers themselves. The scene is attached to the
+// The library: deforms with OpenCL directly in the vertex buffers. The scene is attached to the
 // evaluator.
-std::unique_ptr<Path> makeSharedBufferPath(vyra::Evaluator& evaluator);
-// Deformed by the same kernels in memory of its own, read back, and uploaded with glBufferSubData.
-std::unique_ptr<Path> makeReadBackPath(QOpenGLFunctions_3_3_Core& gl, viewer::Scene& scene);
-// Deformed on all cores, straight into mapped vertex buffers.
-std::unique_ptr<Path> makeMappedCpuPath(QOpenGLFunctions_3_3_Core& gl, viewer::Scene& scene,
-                                        std::unique_ptr<CpuDeformation> deformation);
-// Deformed on all cores, and uploaded with glBufferSubData.
-std::unique_ptr<Path> makeUploadCpuPath(QOpenGLFunctions_3_3_Core& gl, viewer::Scene& scene,
-                                        std::unique_ptr<CpuDeformation> deformation);
-// The physical limit: only writes as many bytes as the vertex buffers of all meshes have, to memory
-// of its own, on one core or on all. What deformers read is shared by all characters and stays in
-// the caches.
-std::unique_ptr<Path> makeMemoryPath(std::size_t vertexCount, bool onAllCores);
+[[nodiscard]] std::unique_ptr<Path> makeSharedBufferPath(vyra::Evaluator& evaluator);
+// Deforms by the same kernels in separate memory, reads back, and uploads with glBufferSubData.
+[[nodiscard]] std::unique_ptr<Path> makeReadBackPath(QOpenGLFunctions_3_3_Core& gl,
+                                                     viewer::Scene& scene);
+// Deforms on all cores into mapped vertex buffers.
+[[nodiscard]] std::unique_ptr<Path> makeMappedCpuPath(QOpenGLFunctions_3_3_Core& gl,
+                                                      viewer::Scene& scene,
+                                                      std::unique_ptr<CpuDeformation> deformation);
+// Deforms on all cores, and uploads with glBufferSubData.
+[[nodiscard]] std::unique_ptr<Path> makeUploadCpuPath(QOpenGLFunctions_3_3_Core& gl,
+                                                      viewer::Scene& scene,
+                                                      std::unique_ptr<CpuDeformation> deformation);
+// The physical limit: writes as many bytes as the vertex buffers of all meshes have, to its own
+// memory, on one core or on all. It reads nothing, since the inputs of deformers are shared by all
+// characters and stay in the caches.
+[[nodiscard]] std::unique_ptr<Path> makeMemoryPath(std::size_t vertexCount, bool onAllCores);

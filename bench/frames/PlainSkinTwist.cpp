@@ -14,13 +14,13 @@ namespace {
 using viewer::Mesh;
 using vyra::MatrixRows;
 
-// Vertices of a task: enough to hide the cost of a task, few enough to divide a single mesh.
+// Vertices per task: enough to hide the cost of a task, few enough to divide a single mesh.
 constexpr std::size_t kGrain = 1024;
 
-using Float4 = float __attribute__((vector_size(16))); // x, y, z and one to spare
+using Float4 = float __attribute__((vector_size(16))); // x, y, z and one unused
 
-// The vertices of a block lie in arrays by component, so that a loop over them becomes vector
-// instructions; a block fits the first-level cache.
+// The vertices of a block are stored by component, so the compiler vectorises a loop over them. A
+// block fits the first-level cache.
 constexpr std::size_t kBlock = 128;
 
 struct Components {
@@ -75,7 +75,7 @@ void skinVertex(const Mesh& mesh, const std::vector<Columns>& bones, std::size_t
     const QVector3D& p = mesh.positions[vertex];
     block.positions.set(slot, p.x() * m.x + p.y() * m.y + p.z() * m.z + m.offset);
 
-    // The cofactors carry normals; the sign keeps them outside of a mirrored mesh.
+    // Normals are transformed by the cofactors, whose sign keeps them outside of a mirrored mesh.
     const Float4 first = cross(m.y, m.z);
     const Float4 volume = m.x * first;
     const float sign = volume[0] + volume[1] + volume[2] < 0 ? -1.0F : 1.0F;

@@ -24,7 +24,7 @@ AutoCLObject<cl_mem> createDeviceArray(std::size_t vertexCount)
     return memory;
 }
 
-// One mesh: its kernels, the memory between them, and where its vertices are read back to.
+// One mesh: its kernels, the device memory between them, and the host memory of the result.
 class ReadBackMesh {
 public:
     ReadBackMesh(CharacterMesh& mesh, ConstantCopies& constants, const DeviceSurface& rest)
@@ -71,7 +71,7 @@ private:
     vyra::Surface fResult;
 };
 
-// An in-order queue per thread; a mesh stays on its queue.
+// Uses one in-order queue per thread. A mesh always uses the same queue.
 class ReadBackPath : public Path {
 public:
     ReadBackPath(QOpenGLFunctions_3_3_Core& gl, viewer::Scene& scene) : fGL(gl)
@@ -80,11 +80,11 @@ public:
         for (cl_command_queue& queue : fQueues) {
             queue = TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr);
             if (!queue)
-                throw std::runtime_error("OpenCL creates no command queues");
+                throw std::runtime_error("no command queue can be created");
         }
         for (CharacterMesh* mesh : scene.meshes())
             fMeshes.push_back(std::make_unique<ReadBackMesh>(*mesh, fConstants, restOf(*mesh)));
-        // Makes the device copies of all constants, on one thread.
+        // Creates the device copies of all constants, on one thread.
         for (const auto& mesh : fMeshes)
             mesh->enqueue(fQueues.front());
         clFinish(fQueues.front());
@@ -112,7 +112,7 @@ public:
     }
 
 private:
-    // Meshes of one geometry share their rest pose, as with the evaluator.
+    // Meshes of the same geometry share their rest pose, as in the evaluator.
     const DeviceSurface& restOf(const CharacterMesh& mesh)
     {
         const vyra::MeshGeometry& geometry = *mesh.shape().geometry;

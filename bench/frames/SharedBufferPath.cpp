@@ -24,7 +24,7 @@ public:
     void drawn() override { fEvaluator.renderingComplete(); }
 
 private:
-    // Evaluations are numbered in 15 bits, which leaves out the number that names none.
+    // The ids of evaluations have 15 bits; the highest value means no evaluation.
     static constexpr std::uint16_t kEvaluationNumbers = 0x7fff;
 
     static void require(const vyra::Status& status)

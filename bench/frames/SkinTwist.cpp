@@ -19,7 +19,7 @@ using vyra::MatrixRows;
 
 // Vertices that are deformed together, one per lane of a vector of 64 bytes.
 constexpr std::size_t kLanes = 16;
-// Blocks of a task: enough to hide the cost of a task, few enough to divide a single mesh.
+// Blocks per task: enough to hide the cost of a task, few enough to divide a single mesh.
 constexpr std::size_t kGrain = 64;
 
 using Float16 = float __attribute__((vector_size(64)));
@@ -79,7 +79,7 @@ void exchangeRows(std::array<Float16, kLanes>& rows)
     }
 }
 
-// From one matrix per vertex to one vector per element.
+// Transposes one matrix per vertex into one vector per element.
 void transpose(std::array<Float16, kLanes>& rows)
 {
     exchangeRows<8>(rows);
@@ -91,7 +91,7 @@ void transpose(std::array<Float16, kLanes>& rows)
 // Element 4 * column + row of the matrices of all lanes.
 using Matrices = std::array<Lanes, kLanes>;
 
-// The blended matrix of each vertex.
+// Returns the blended matrix of each vertex.
 Matrices blend(const RestBlock& block, const std::vector<Float16>& bones)
 {
     std::array<Float16, kLanes> blended;
@@ -109,7 +109,7 @@ struct Vertices {
     Lanes x, y, z, nx, ny, nz;
 };
 
-// The cofactors carry normals; their sign keeps them outside of a mirrored mesh.
+// Normals are transformed by the cofactors, whose sign keeps them outside of a mirrored mesh.
 void skin(const RestBlock& block, const Matrices& matrices, Vertices& out)
 {
     for (std::size_t i = 0; i < kLanes; ++i) {
@@ -134,8 +134,8 @@ struct Turn {
     float sine, cosine;
 };
 
-// Polynomials on a quarter of a turn around the nearest multiple of it; without a call, the loop
-// over the lanes becomes vector instructions. The polynomials are those of the kernels.
+// Uses the polynomials of the kernels, on a quarter of a turn around its nearest multiple. There is
+// no call, so the compiler vectorises the loop over the lanes.
 inline Turn turnBy(float angle)
 {
     const float quarters = std::nearbyint(angle * 0.63661977F);
@@ -215,7 +215,8 @@ public:
         const std::size_t vertexCount = character.mesh().vertexCount();
         const TwistPose pose = twistPoseOf(character);
         std::vector<Float16>& bones = fBones[mesh];
-        bones.assign(1, columnsOf({1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0})); // of no bones
+        bones.assign(1,
+                     columnsOf({1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0})); // for meshes without bones
         bones.resize(std::max<std::size_t>(1, character.pose.bones.size()));
         std::transform(character.pose.bones.begin(), character.pose.bones.end(), bones.begin(),
                        columnsOf);

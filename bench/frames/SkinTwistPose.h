@@ -1,4 +1,4 @@
-// The twist of a mesh in its present pose, as CPU code takes it.
+// The twist of a mesh in its current pose, for CPU code.
 #pragma once
 
 #include "evaluator/Geometry.h"
@@ -10,5 +10,5 @@ struct TwistPose {
     float anglePerHeight = 0; // radians
 };
 
-// The mesh's last deformer is a twist.
+// Requires that the mesh's last deformer is a twist.
 TwistPose twistPoseOf(const viewer::CharacterMesh& mesh);

@@ -13,9 +13,9 @@
 
 namespace {
 
-// Frames until memory and kernels are there.
+// Frames in which memory is allocated and kernels are built.
 constexpr int kWarmUp = 5;
-// Frames of large crowds; small ones have more, since their frames vary more.
+// Small crowds have more frames than large ones, since their times vary more.
 constexpr int kLeastFrames = 25;
 constexpr int kMostFrames = 500;
 constexpr int kCharacterFrames = 8000; // frames times characters
@@ -40,7 +40,7 @@ public:
             throw std::runtime_error("there is no path '" + fOnly + "'; --help lists them");
     }
 
-    // The paths are in random order in each frame.
+    // Plays the paths in random order in each frame.
     void play(int frames)
     {
         std::vector<std::size_t> order(fCandidates.size());
@@ -83,14 +83,14 @@ private:
     {
         if (!fOnly.empty() && fOnly != name)
             return;
-        // Vertex buffers that a path does not share must not be in the batch.
+        // Excludes the vertex buffers of the other paths from the batch.
         TopenCLInfo::theOne().setMinimumBufferSize(shares ? 0 : INT_MAX);
         auto evaluator = std::make_unique<vyra::Evaluator>(settings());
         const viewer::Animation* animation =
             fModel.animations.empty() ? nullptr : &fModel.animations.front();
         auto scene = std::make_unique<viewer::Scene>(fGL, fModel, animation, fCharacters);
         scene->attach(*evaluator, viewer::parseDeformers(fContent.deformers).value());
-        scene->pose(kSecondsPerFrame); // at 0 the twist has no pass
+        scene->pose(kSecondsPerFrame); // at time 0 the twist has no pass
         auto path = make(*evaluator, *scene);
         fCandidates.push_back({std::move(evaluator), std::move(scene), std::move(path), {name}});
     }

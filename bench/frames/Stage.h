@@ -1,4 +1,4 @@
-// Crowds that go through all paths, frame after frame.
+// The measurement of crowds on all paths.
 #pragma once
 
 #include "frames/Allocations.h"
@@ -20,32 +20,34 @@ inline constexpr const char* kPlainCpu = "plain CPU";
 inline constexpr const char* kMemoryOneCore = "memory, 1 core";
 inline constexpr const char* kMemoryAllCores = "memory, all cores";
 
-// What was measured of one path.
+// The measurements of one path.
 struct PathTimes {
     std::string name;
-    std::vector<double> milliseconds{}; // of each frame that was timed
-    Allocations allocations{};          // in all of them
+    std::vector<double> milliseconds{}; // of each timed frame
+    Allocations allocations{};          // in all timed frames
 };
 
-// What was measured of one crowd.
+// The measurements of one crowd.
 struct CrowdTimes {
     const Content* content = nullptr;
     int characters = 0;
     std::size_t vertices = 0;
     std::vector<PathTimes> paths{};
 
-    // Null if the path was not measured.
+    // Returns null if the path was not measured.
     const PathTimes* find(const std::string& name) const;
-    // The times of one path over those of another in the same frames; all zero if one of them was
-    // not measured.
+    // Returns the ratio of the times of two paths in the same frames; zeros if one of them was not
+    // measured.
     Spread ratio(const std::string& name, const std::string& to) const;
 };
 
 struct StageSettings {
-    int frames = 0;   // of each path; 0: as many as the size of the crowd asks for
+    int frames = 0;   // of each path; 0: depends on the size of the crowd
     std::string only; // one path; empty: all
 };
 
-// Throws std::runtime_error if a path fails, or if its last frame deviates from the reference.
-CrowdTimes measure(QOpenGLFunctions_3_3_Core& gl, const viewer::Model& model,
-                   const Content& content, int characters, const StageSettings& settings);
+// Plays and measures all frames. Throws std::runtime_error if a path fails, or if its last frame
+// deviates from the reference.
+[[nodiscard]] CrowdTimes measure(QOpenGLFunctions_3_3_Core& gl, const viewer::Model& model,
+                                 const Content& content, int characters,
+                                 const StageSettings& settings);

@@ -1,23 +1,23 @@
 #!/usr/bin/env python3
-"""Shares the processor time of evaluations out: kernels, the OpenCL runtime, the library, the host.
+"""Attributes the CPU time of evaluations to modules: kernels, OpenCL runtime, library, evaluator, host.
 
-Reads what `perf script -F comm,tid,ip,sym,dso` prints for a run of vyra-opencl-bench-frames, and prints one
-JSON object: the samples by room. A sample belongs to the room of its innermost frame outside of the C and C++
-libraries and the system: what the library has the allocator do counts for the library.
+Reads the output of `perf script -F comm,tid,ip,sym,dso` for a run of vyra-opencl-bench-frames, and prints one
+JSON object: the number of samples per module. A sample counts for the module of its innermost frame outside of the
+C and C++ libraries and the system, so allocations by the library count for the library.
 """
 import json
 import re
 import sys
 
 NEUTRAL = re.compile(r"kernel|vdso|/ld-linux|/libc\.|/libm\.|/libstdc\+\+|/libgcc_s|^inlined$|^\[unknown\]$")
-ROOMS = [
+MODULES = [
     ("runtime", re.compile(r"libpocl|libOpenCL|libglshare|libLLVM|libhwloc")),
-    # PoCL links each kernel into a library of its own, in its cache.
+    # PoCL links each kernel into a separate library in its cache.
     ("kernels", re.compile(r"/pocl/kcache/")),
     ("library", re.compile(r"libvyra-opencl\.so")),
     ("evaluator", re.compile(r"libvyra-evaluator\.so")),
 ]
-# Outside of evaluations: poses of the next frame, start and end.
+# Outside of evaluations: the poses of the next frame, start and end.
 NOT_EVALUATION = re.compile(r"viewer::Scene::|viewer::verify|clBuildProgram|POclBuildProgram")
 EVALUATION = re.compile(r"SharedBufferPath::(deform|drawn)")
 
@@ -41,15 +41,15 @@ def samples(lines):
         yield header, frames
 
 
-def room_of(frames):
-    for symbol, module in frames:
-        if NEUTRAL.search(module):
+def module_of(frames):
+    for _, shared_object in frames:
+        if NEUTRAL.search(shared_object):
             continue
-        for room, pattern in ROOMS:
-            if pattern.search(module):
-                return room
+        for name, pattern in MODULES:
+            if pattern.search(shared_object):
+                return name
         return "host"
-    return "runtime"  # threads of the runtime's own, between two commands
+    return "runtime"  # a thread of the runtime between two commands
 
 
 def main():
@@ -64,7 +64,7 @@ def main():
             continue
         if thread == main_thread and not EVALUATION.search(symbols):
             continue
-        counts[room_of(frames)] += 1
+        counts[module_of(frames)] += 1
     json.dump(counts, sys.stdout)
     print()
 

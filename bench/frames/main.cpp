@@ -1,9 +1,10 @@
-// Measures whole frames of the library and of what an application would do without it.
+// Measures whole frames of the library, and of the alternatives without it.
 #include "fixtures/Runtime.h"
 #include "frames/Allocations.h"
 #include "frames/Content.h"
 #include "frames/FrameReport.h"
 #include "frames/Stage.h"
+#include "harness/CommandLine.h"
 #include "harness/Report.h"
 #include "viewer/model/import/ModelImport.h"
 
@@ -11,7 +12,6 @@
 #include <iostream>
 #include <sstream>
 #include <stdexcept>
-#include <string_view>
 
 #include <QJsonObject>
 #include <QOpenGLVersionFunctionsFactory>
@@ -19,31 +19,20 @@
 
 namespace {
 
-constexpr const char* kUsage = R"(Usage: vyra-opencl-bench-frames [OPTION...] [MODEL]
+constexpr const char* kDescription =
+    R"(Deforms crowds of a model, frame after frame, and compares the paths into the vertex buffers:
 
-Deforms crowds of a model (X/Testwuson.X), frame after frame, and compares the paths into the vertex
-buffers:
-
-  shared             through the library, on OpenCL in the vertex buffers themselves
-  read back          on OpenCL, read back, and uploaded by glBufferSubData
-  CPU                without OpenCL: all threads, vector instructions over sixteen vertices, written
-                     straight into mapped vertex buffers
-  plain CPU          the same as one would write it first: skinned vertex by vertex, and uploaded by
-                     glBufferSubData
-  memory, ...        no deformer: only writes as many bytes to memory as the vertex buffers have, the
-                     physical limit, on one core and on all
+  shared         the library: OpenCL works directly in the vertex buffers
+  read back      OpenCL, read back, and uploaded with glBufferSubData
+  CPU            without OpenCL: all threads, vector instructions over sixteen vertices, written
+                 into mapped vertex buffers
+  plain CPU      without OpenCL and without hand-written vector code: skinned vertex by vertex, and
+                 uploaded with glBufferSubData
+  memory, ...    the physical limit, without deformers: writes as many bytes to memory as the vertex
+                 buffers have, on one core and on all
 
 A time ends when OpenGL has finished. Nothing is drawn. At the end each path is compared with the
-reference of the deformers.
-
-  --content NAME     one content only: skin-twist; double-skin, with the skin in double precision;
-                     morph-smooth, eight targets and ten iterations
-  --crowds N,N,...   numbers of characters (skin-twist: 1,2,5,16,50,156,500,1560)
-  --frames N         frames per path after the first five (500 to 25, by the size of the crowd)
-  --only PATH        one path only
-  --json FILE        also writes the results as JSON
-  --help             this text
-)";
+reference of the deformers.)";
 
 struct Options {
     std::string model = "X/Testwuson.X";
@@ -51,8 +40,24 @@ struct Options {
     std::vector<int> crowds;
     StageSettings stage;
     std::string json;
-    bool help = false;
 };
+
+void addOptions(QCommandLineParser& parser)
+{
+    parser.setApplicationDescription(kDescription);
+    parser.addPositionalArgument("MODEL", "The model (default: X/Testwuson.X).", "[MODEL]");
+    parser.addOptions({
+        {"content",
+         "Measure one content only: skin-twist; double-skin, with the skin in double precision; "
+         "morph-smooth, eight targets and ten iterations.",
+         "NAME"},
+        {"crowds", "Numbers of characters (skin-twist: 1,2,5,16,50,156,500,1560).", "N,N,..."},
+        {"frames", "Frames per path after the first five (500 to 25, by the size of the crowd).",
+         "N"},
+        {"only", "Measure one path only.", "PATH"},
+        {"json", "Also write the results as JSON.", "FILE"},
+    });
+}
 
 int positive(const std::string& text)
 {
@@ -76,34 +81,19 @@ std::vector<int> crowdsOf(const std::string& list)
     return crowds;
 }
 
-Options parse(int count, char** arguments)
+Options readOptions(const QCommandLineParser& parser)
 {
+    const auto value = [&parser](const char* name) { return parser.value(name).toStdString(); };
     Options options;
-    for (int index = 1; index < count; ++index) {
-        const std::string_view argument = arguments[index];
-        const auto value = [&]() -> std::string {
-            if (++index == count)
-                throw std::runtime_error(std::string(argument) + " needs a value");
-            return arguments[index];
-        };
-        if (argument == "--content")
-            options.content = contentOf(value()).name;
-        else if (argument == "--crowds")
-            options.crowds = crowdsOf(value());
-        else if (argument == "--frames")
-            options.stage.frames = positive(value());
-        else if (argument == "--only")
-            options.stage.only = value();
-        else if (argument == "--json")
-            options.json = value();
-        else if (argument == "--help")
-            options.help = true;
-        else if (!argument.starts_with('-'))
-            options.model = argument;
-        else
-            throw std::runtime_error("unknown argument " + std::string(argument) +
-                                     "; --help lists all");
-    }
+    if (parser.isSet("content"))
+        options.content = contentOf(value("content")).name;
+    options.crowds = crowdsOf(value("crowds"));
+    if (parser.isSet("frames"))
+        options.stage.frames = positive(value("frames"));
+    options.stage.only = value("only");
+    options.json = value("json");
+    if (!parser.positionalArguments().isEmpty())
+        options.model = parser.positionalArguments().first().toStdString();
     return options;
 }
 
@@ -140,13 +130,13 @@ void run(const Options& options, int& argumentCount, char** arguments)
     startCounting();
     const std::vector<CrowdTimes> crowds = measureAll(options, *gl);
     const char* renderer = reinterpret_cast<const char*>(gl->glGetString(GL_RENDERER));
-    std::cout << processorName() << "; " << Runtime::platformName() << "; " << Runtime::deviceName()
+    std::cout << cpuName() << "; " << Runtime::platformName() << "; " << Runtime::deviceName()
               << "; " << renderer << "\n\n";
     writeTimes(std::cout, crowds);
     std::cout << '\n';
     writeGoals(std::cout, crowds);
     QJsonObject json = toJson(crowds);
-    json["processor"] = QString::fromStdString(processorName());
+    json["cpu"] = QString::fromStdString(cpuName());
     json["platform"] = QString::fromStdString(Runtime::platformName());
     json["device"] = QString::fromStdString(Runtime::deviceName());
     json["renderer"] = renderer;
@@ -160,11 +150,11 @@ void run(const Options& options, int& argumentCount, char** arguments)
 int main(int argumentCount, char** arguments)
 {
     try {
-        const Options options = parse(argumentCount, arguments);
-        if (options.help)
-            std::cout << kUsage;
-        else
-            run(options, argumentCount, arguments);
+        QCommandLineParser parser;
+        addOptions(parser);
+        parseCommandLine(parser, argumentCount, arguments, 1);
+        if (!printHelp(parser, argumentCount, arguments))
+            run(readOptions(parser), argumentCount, arguments);
         return 0;
     } catch (const std::exception& error) {
         std::fprintf(stderr, "vyra-opencl-bench-frames: %s\n", error.what());

@@ -6,7 +6,7 @@ import sys
 import matplotlib
 
 matplotlib.use("Agg")
-from matplotlib import pyplot  # noqa: E402: the backend comes first
+from matplotlib import pyplot  # noqa: E402: after the choice of the backend
 
 CONTENT = "skin-twist"
 PATHS = {
@@ -34,7 +34,7 @@ def main():
         axes.fill_between(vertices, [time["low"] for time in times], [time["high"] for time in times],
                           color=colour, alpha=0.15, linewidth=0)
     axes.set(xscale="log", yscale="log", xlabel="vertices", ylabel="ms a frame, until OpenGL has finished",
-             title=f"{run['processor']}, {run['renderer']}")
+             title=f"{run['cpu']}, {run['renderer']}")
     axes.title.set_fontsize(9)
     axes.grid(True, which="major", alpha=0.3)
     axes.legend(fontsize=8)

@@ -11,12 +11,12 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-// Iterations are doubled until a run of the case fills a sample; one whose unmeasured part takes
-// this many times longer is not made longer for its measured part's sake.
+// Iterations are doubled until the measured part of a run fills a sample, or the whole run takes
+// this many samples.
 constexpr double kMostUnmeasured = 8;
 
-// A counted case repeats some times, so that storage that grows now and then is shared among its
-// operations, but not for longer than the slow counting allows.
+// A counted case is repeated, so that occasional growth of storage is averaged over its operations;
+// limited, since counting is slow.
 constexpr double kMostCountedIterations = 64;
 constexpr double kMostCountedOperations = 4096;
 
@@ -40,16 +40,15 @@ std::size_t iterationsFor(const Body& body, Nanoseconds sample)
     }
 }
 
-// How often a thread of the program lost its processor to others.
-long preemptions()
+// Returns how often the system has preempted threads of this process.
+long preemptions() noexcept
 {
     rusage usage{};
     getrusage(RUSAGE_SELF, &usage);
     return usage.ru_nivcsw;
 }
 
-// Other programs that take the processor away in the middle of a sample spoil it: it is taken anew,
-// though not for ever.
+// A sample during which the process was preempted is repeated, up to this many attempts.
 constexpr int kMostAttempts = 10;
 
 Nanoseconds undisturbed(const Body& body, std::size_t iterations)
@@ -62,7 +61,7 @@ Nanoseconds undisturbed(const Body& body, std::size_t iterations)
     }
 }
 
-// One case on its way through the rounds: its nanoseconds per operation, round by round.
+// The samples of one case: nanoseconds per operation in each round.
 struct Series {
     const Case* subject;
     std::size_t iterations;
@@ -86,7 +85,7 @@ Spread pairwise(const Series& series, const Series& baseline, Operation operatio
 
 CaseResult resultOf(const Series& series, const Series& baseline)
 {
-    CaseResult result{series.subject->name, series.subject->goal, {}, series.subject->peer};
+    CaseResult result{series.subject->name, series.subject->goal, {}, series.subject->thirdParty};
     result.measurement.nanoseconds = spreadOf(series.nanoseconds);
     result.measurement.ratio = pairwise(series, baseline, std::divides<>());
     result.measurement.extraNanoseconds = pairwise(series, baseline, std::minus<>());

@@ -1,4 +1,4 @@
-// Runs the cases of a group beside each other.
+// The comparison of the cases of a group.
 #pragma once
 
 #include "harness/Group.h"
@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-// How much is measured.
+// The number and the length of samples.
 struct Effort {
     int rounds = 31;
     Nanoseconds sample = std::chrono::milliseconds(4); // of each case in each round
@@ -17,20 +17,20 @@ struct CaseResult {
     std::string name;
     Goal goal;
     Measurement measurement;
-    std::string peer = {}; // as the case has it
+    std::string thirdParty = {}; // as in Case
 };
 
 struct GroupResult {
     std::string name;
-    std::vector<CaseResult> cases; // the baseline first
-    Spread control;                // the ratio of the baseline to itself: the noise
+    std::vector<CaseResult> cases; // the baseline comes first
+    Spread control;                // the ratio of the baseline to itself, which is the noise
 };
 
-// Every case once a round, in random order, and ratios taken inside the round, so that what
-// disturbs the machine for longer than a round disturbs all cases alike. The baseline runs twice a
-// round; the two against each other are the control.
-GroupResult compare(const Group& group, const Effort& effort, std::mt19937& random);
+// Measures all cases. Each runs once per round, in random order, and ratios are computed within a
+// round: a disturbance that lasts longer than a round affects all cases alike. The baseline runs
+// twice per round; the ratio of the two runs is the control.
+[[nodiscard]] GroupResult compare(const Group& group, const Effort& effort, std::mt19937& random);
 
-// Runs each case under the tool that counts instructions; see InstructionCount.h. Leaves out groups
-// that use several threads, whose instructions depend on how they meet.
+// Runs each case under the tool that counts instructions; see InstructionCount.h. Skips groups that
+// use several threads, whose counts depend on timing.
 void count(const Group& group);

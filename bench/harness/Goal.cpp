@@ -4,7 +4,7 @@
 
 namespace {
 
-// The measured quantity that the goal limits.
+// Returns the quantity that the goal limits.
 const Spread& limited(const Goal& goal, const Measurement& measurement)
 {
     switch (goal.kind) {

@@ -1,4 +1,4 @@
-// What an operation may cost beside the runtime's own calls, and whether it stays within that.
+// Goals for the cost of operations, and the verdicts on them.
 #pragma once
 
 #include "harness/Statistics.h"
@@ -9,9 +9,9 @@
 struct Goal {
     enum class Kind {
         kReported,         // no limit
-        kRatio,            // times the baseline
-        kExtraNanoseconds, // beyond the baseline, per operation
-        kNanoseconds,      // per operation, whatever the baseline costs
+        kRatio,            // to the baseline
+        kExtraNanoseconds, // in addition to the baseline, per operation
+        kNanoseconds,      // per operation, independent of the baseline
     };
     Kind kind = Kind::kReported;
     double limit = 0;
@@ -21,11 +21,11 @@ struct Goal {
     static Goal nanoseconds(double limit) { return {Kind::kNanoseconds, limit}; }
 };
 
-// What was measured of one case, beside the baseline of its group.
+// The measurement of one case, and its relation to the baseline of the group.
 struct Measurement {
     Spread nanoseconds;                     // per operation
     Spread ratio;                           // to the baseline of the same round
-    Spread extraNanoseconds;                // the baseline of the same round taken off
+    Spread extraNanoseconds;                // minus the baseline of the same round
     std::optional<double> instructions;     // per operation
     std::optional<double> instructionRatio; // to the baseline
 };
@@ -33,14 +33,14 @@ struct Measurement {
 enum class Verdict {
     kReported,    // there is no limit
     kMet,         // the median is within the limit
-    kMetByCount,  // the times neither show nor refute it; the instruction counts are within it
-    kWithinNoise, // the times neither show nor refute it, and no count decides
-    kMissed,      // nine tenths of the rounds are beyond the limit, or the counts are as well
+    kMetByCount,  // undecided by the times; the instruction counts are within the limit
+    kWithinNoise, // undecided by the times, and there are no counts
+    kMissed, // the 10th percentile is above the limit, or undecided and the counts are above it
 };
 
-// A ratio whose times are undecided, which means that the limit lies between their percentiles, is
-// judged by the instruction counts.
-Verdict judge(const Goal& goal, const Measurement& measurement);
+// Returns the verdict. If the limit of a ratio lies between the 10th percentile and the median, the
+// instruction counts decide.
+[[nodiscard]] Verdict judge(const Goal& goal, const Measurement& measurement);
 
 std::string textOf(const Goal& goal);
 std::string textOf(Verdict verdict);

@@ -1,4 +1,4 @@
-// Cases that stand beside each other.
+// Groups of cases that are compared with each other.
 #pragma once
 
 #include "harness/Goal.h"
@@ -16,19 +16,19 @@ struct Case {
     Body body;
     Goal goal = {};
     double operationsPerIteration = 1;
-    std::string peer = {}; // the other library that this measures; empty for ours and bare calls
+    std::string thirdParty = {}; // name of the third-party library that is measured; else empty
 };
 
-// The first case is the baseline, as a rule the bare OpenCL calls that the others must make. What
-// the cases work on lives in their bodies, so it goes with the group.
+// The first case is the baseline: as a rule, the direct OpenCL calls that the others must make. The
+// bodies own the data of the cases.
 struct Group {
     std::string name;
     std::vector<Case> cases;
     bool usesThreads = false;
 };
 
-// Groups are made one at a time, when their turn comes, so that they do not disturb each other.
-struct GroupMaker {
+// Creates a group when it is its turn, so that groups do not affect each other.
+struct GroupFactory {
     std::string name;
     std::function<Group()> make;
 };

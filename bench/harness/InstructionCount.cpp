@@ -49,7 +49,7 @@ void readFile(const std::filesystem::path& path, std::map<std::string, double>& 
 
 } // namespace
 
-bool countsInstructions()
+bool countsInstructions() noexcept
 {
     return RUNNING_ON_VALGRIND != 0;
 }

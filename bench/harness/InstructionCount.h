@@ -1,6 +1,5 @@
-// Instruction counts, which repeat to the digit where times do not: the program runs under
-// callgrind
-// (--instr-atstart=no --collect-atstart=no), which counts what is enclosed here and writes one file
+// Instruction counts, which are exactly repeatable, unlike times. The program runs under callgrind
+// (--instr-atstart=no --collect-atstart=no), which counts the enclosed scopes and writes one file
 // per case.
 #pragma once
 
@@ -8,10 +7,12 @@
 #include <map>
 #include <string>
 
-// Whether the program runs under a tool that counts. Without the tool's header it never does.
-bool countsInstructions();
+// Returns whether the program runs under a tool that counts. False if it was built without the
+// tool's header.
+[[nodiscard]] bool countsInstructions() noexcept;
 
-// Counted from construction to destruction. Scopes do not nest, and only one thread opens them.
+// Counts instructions from construction to destruction. Scopes must not be nested, and only one
+// thread may open them.
 class CountedScope {
 public:
     CountedScope();
@@ -20,13 +21,12 @@ public:
     CountedScope& operator=(const CountedScope&) = delete;
 };
 
-// From here on the tool counts; before, the program runs faster under it. Forgets what was counted
-// so far.
+// Starts counting from 0. Before the start, the program runs faster under the tool.
 void startInstructionCount();
-// Writes what was counted since the start, as that of `operations` operations of the case `name`,
-// and counts no more.
+// Writes the count since the start for `operations` operations of the case `name`, and stops
+// counting.
 void writeInstructionCount(const std::string& name, double operations);
 
-// The instructions per operation, by the name of the case, from callgrind's files in `folder`.
-// Files that hold no case's count are skipped.
+// Returns the instructions per operation, by the name of the case, from callgrind's files in
+// `folder`. Skips files without a count.
 std::map<std::string, double> readInstructionCounts(const std::filesystem::path& folder);

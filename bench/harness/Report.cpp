@@ -13,7 +13,7 @@
 
 namespace {
 
-// The key of a case in files; the same for instruction counts and earlier runs.
+// The key of a case, in files of instruction counts and of results.
 std::string keyOf(const GroupResult& group, const CaseResult& subject)
 {
     return group.name + ": " + subject.name;
@@ -26,7 +26,7 @@ std::string number(double value, int decimals)
     return text;
 }
 
-// With the unit that keeps it short.
+// Formats a duration in the unit that fits.
 std::string duration(double nanoseconds)
 {
     if (nanoseconds >= 1e6)
@@ -46,10 +46,11 @@ std::string text(const std::optional<double>& value, int decimals)
     return value ? number(*value, decimals) : "";
 }
 
-// Other libraries stand beside ours, whose goals are not theirs.
+// The goals apply to this library only.
 std::string verdictText(const CaseResult& subject)
 {
-    return subject.peer.empty() ? textOf(judge(subject.goal, subject.measurement)) : "peer";
+    return subject.thirdParty.empty() ? textOf(judge(subject.goal, subject.measurement))
+                                      : "third party";
 }
 
 QJsonObject toJson(const Spread& spread)
@@ -65,8 +66,8 @@ QJsonObject toJson(const CaseResult& subject)
                      {"ratio", toJson(measured.ratio)},
                      {"goal", QString::fromStdString(textOf(subject.goal))},
                      {"verdict", QString::fromStdString(verdictText(subject))}};
-    if (!subject.peer.empty())
-        json["peer"] = QString::fromStdString(subject.peer);
+    if (!subject.thirdParty.empty())
+        json["thirdParty"] = QString::fromStdString(subject.thirdParty);
     if (measured.instructions)
         json["instructions"] = *measured.instructions;
     if (measured.instructionRatio)
@@ -76,7 +77,7 @@ QJsonObject toJson(const CaseResult& subject)
 
 } // namespace
 
-std::string processorName()
+std::string cpuName()
 {
     constexpr std::string_view kKey = "model name";
     std::ifstream file("/proc/cpuinfo");
@@ -84,7 +85,7 @@ std::string processorName()
         if (line.starts_with(kKey))
             return line.substr(line.find(':') + 2);
     }
-    return "unknown processor";
+    return "unknown CPU";
 }
 
 void addInstructionCounts(std::vector<GroupResult>& results,
@@ -135,7 +136,7 @@ QJsonObject toJson(const RunDescription& run, const std::vector<GroupResult>& re
                                   {"control", toJson(group.control)},
                                   {"cases", cases}});
     }
-    return {{"processor", QString::fromStdString(run.processor)},
+    return {{"cpu", QString::fromStdString(run.cpu)},
             {"platform", QString::fromStdString(run.platform)},
             {"device", QString::fromStdString(run.device)},
             {"rounds", run.effort.rounds},

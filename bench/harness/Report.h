@@ -1,4 +1,4 @@
-// Results as a table, as JSON, and beside those of another run.
+// The results as a table and as JSON, and their comparison with an earlier run.
 #pragma once
 
 #include "harness/Comparison.h"
@@ -11,33 +11,32 @@
 
 #include <QJsonObject>
 
-// Where and how the figures came to be.
+// The machine and the effort of a run.
 struct RunDescription {
-    std::string processor;
+    std::string cpu;
     std::string platform; // name and version of the OpenCL platform
     std::string device;
     Effort effort;
 };
 
-// The processor's name as the system tells it, or "unknown processor".
-std::string processorName();
+// Returns the CPU's name, or "unknown CPU".
+std::string cpuName();
 
-// Adds the counts of readInstructionCounts to the results of the same names.
+// Adds the counts of readInstructionCounts to the results with the same names.
 void addInstructionCounts(std::vector<GroupResult>& results,
                           const std::map<std::string, double>& counts);
 
-// A Markdown table, its columns aligned.
+// Writes a Markdown table with aligned columns.
 void writeTable(std::ostream& output, const std::vector<GroupResult>& results);
 
 QJsonObject toJson(const RunDescription& run, const std::vector<GroupResult>& results);
-// False when the file cannot be written.
-bool writeJson(const std::filesystem::path& path, const QJsonObject& json);
+// Returns false if the file cannot be written.
+[[nodiscard]] bool writeJson(const std::filesystem::path& path, const QJsonObject& json);
 
-// The ratios of each case in an earlier run, read from its JSON; by the name of group and case.
-// Throws std::runtime_error when the file is not the JSON of a run.
+// Returns the ratio of each case of an earlier run, by group and case, from its JSON file. Throws
+// std::runtime_error if the file is not the JSON of a run.
 std::map<std::string, double> readRatios(const std::filesystem::path& path);
 
-// The cases of both runs, with the change of the ratio; what changed by more than the noise is
-// marked.
+// Writes the change of the ratio for each case of both runs. Marks changes beyond the noise.
 void writeChanges(std::ostream& output, const std::vector<GroupResult>& results,
                   const std::map<std::string, double>& earlier);

@@ -1,4 +1,4 @@
-// What the samples of one quantity have in common.
+// Statistics of the samples of one quantity.
 #pragma once
 
 #include <vector>
@@ -10,9 +10,9 @@ struct Spread {
     double high = 0;
 };
 
-// The value below which `share` (0 to 1) of `sorted`, which is ascending and not empty, lies;
-// between two samples it is interpolated.
+// Returns the value below which the share `share` (0 to 1) of the samples lies, interpolated
+// between samples. `sorted` is ascending and not empty.
 double percentile(const std::vector<double>& sorted, double share);
 
-// All zero for no samples.
+// Returns zeros if there are no samples.
 Spread spreadOf(std::vector<double> samples);

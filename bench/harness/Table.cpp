@@ -27,7 +27,7 @@ void Table::add(std::vector<std::string> row)
 
 void Table::write(std::ostream& output) const
 {
-    std::vector<std::size_t> widths(fRows.front().size(), 3); // the least that Markdown takes
+    std::vector<std::size_t> widths(fRows.front().size(), 3); // the minimum in Markdown
     for (const Row& row : fRows) {
         for (std::size_t column = 0; column < row.size(); ++column)
             widths[column] = std::max(widths[column], row[column].size());

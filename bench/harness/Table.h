@@ -1,20 +1,21 @@
-// A Markdown table with aligned columns.
+// Tables in Markdown.
 #pragma once
 
 #include <ostream>
 #include <string>
 #include <vector>
 
+// A Markdown table with aligned columns.
 class Table {
 public:
     explicit Table(std::vector<std::string> header);
 
-    // As many cells as the header has.
+    // Adds a row with as many cells as the header.
     void add(std::vector<std::string> row);
 
-    // The first column is set to the left, the others to the right.
+    // Writes the table. The first column is aligned left, the others right.
     void write(std::ostream& output) const;
 
 private:
-    std::vector<std::vector<std::string>> fRows; // the header first
+    std::vector<std::vector<std::string>> fRows; // the header is the first
 };

@@ -1,4 +1,4 @@
-// The part of a case that is measured.
+// Measurement of the timed part of a case.
 #pragma once
 
 #include "harness/InstructionCount.h"
@@ -8,7 +8,8 @@
 
 using Nanoseconds = std::chrono::duration<double, std::nano>;
 
-// The wall time of `operation`. What a case does outside of it is neither timed nor counted.
+// Returns the wall time of `operation`. Work of the case outside of it is neither timed nor
+// counted.
 template <typename Operation>
 Nanoseconds timed(Operation&& operation)
 {
@@ -18,7 +19,7 @@ Nanoseconds timed(Operation&& operation)
     return std::chrono::steady_clock::now() - begin;
 }
 
-// The wall time of `count` calls of `operation`.
+// Returns the wall time of `count` calls of `operation`.
 template <typename Operation>
 Nanoseconds timedLoop(std::size_t count, Operation&& operation)
 {
@@ -28,7 +29,7 @@ Nanoseconds timedLoop(std::size_t count, Operation&& operation)
     });
 }
 
-// Keeps the compiler from leaving out the computation of `value`.
+// Prevents the compiler from removing the computation of `value`.
 template <typename Value>
 void keep(const Value& value)
 {

@@ -1,4 +1,4 @@
-// A second thread that stands by, so that starting it is not measured.
+// Measurements on two threads.
 #pragma once
 
 #include "harness/Timing.h"
@@ -7,6 +7,7 @@
 #include <functional>
 #include <thread>
 
+// Owns a second thread, which waits for work: its start is not measured.
 class TwoThreads {
 public:
     TwoThreads();
@@ -14,8 +15,8 @@ public:
     TwoThreads(const TwoThreads&) = delete;
     TwoThreads& operator=(const TwoThreads&) = delete;
 
-    // Runs `work(0)` on the calling thread and `work(1)` on the other; the time until both are
-    // done.
+    // Runs `work(0)` on the calling thread and `work(1)` on the other. Returns the time until both
+    // have finished.
     Nanoseconds timedTogether(const std::function<void(std::size_t thread)>& work);
 
 private:

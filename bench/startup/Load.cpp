@@ -1,5 +1,5 @@
-// How long libraries take to load: opens the ones it is given, in order, and prints the
-// milliseconds of each. A program of its own, since nothing that it opens may be loaded already.
+// Opens the libraries given as arguments, in order, and prints the milliseconds that each takes to
+// load. A separate program, since none of the libraries may be loaded already.
 #include <chrono>
 #include <cstdio>
 

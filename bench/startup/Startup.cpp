@@ -26,7 +26,7 @@ struct Started {
     Started& operator=(const Started&) = delete;
 };
 
-void askPlatform(cl_platform_id platform)
+void queryPlatform(cl_platform_id platform)
 {
     constexpr cl_platform_info kQueries[] = {CL_PLATFORM_NAME, CL_PLATFORM_VENDOR,
                                              CL_PLATFORM_VERSION, CL_PLATFORM_EXTENSIONS};
@@ -47,7 +47,7 @@ void start(Started& started, void* graphicsContext)
     if (platforms.empty())
         throw std::runtime_error("there is no OpenCL platform");
     for (cl_platform_id platform : platforms)
-        askPlatform(platform);
+        queryPlatform(platform);
 
     const GLDisplayProperty display = glDisplayProperty(nullptr);
     const std::array<cl_context_properties, 7> properties{
@@ -58,11 +58,11 @@ void start(Started& started, void* graphicsContext)
         display.name,
         display.value,
         0};
-    const auto askForDevice = reinterpret_cast<clGetGLContextInfoKHR_fn>(
+    const auto queryDevice = reinterpret_cast<clGetGLContextInfoKHR_fn>(
         clGetExtensionFunctionAddressForPlatform(platforms.front(), "clGetGLContextInfoKHR"));
     cl_device_id device = nullptr;
-    if (!askForDevice || askForDevice(properties.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
-                                      sizeof(cl_device_id), &device, nullptr) != CL_SUCCESS)
+    if (!queryDevice || queryDevice(properties.data(), CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR,
+                                    sizeof(cl_device_id), &device, nullptr) != CL_SUCCESS)
         throw std::runtime_error("no device shares with this OpenGL context");
 
     cl_int status = CL_SUCCESS;
@@ -70,12 +70,12 @@ void start(Started& started, void* graphicsContext)
     for (cl_command_queue& queue : started.queues)
         queue = clCreateCommandQueue(started.context, device, 0, &status);
     if (status != CL_SUCCESS)
-        throw std::runtime_error("no context or queue can be made");
+        throw std::runtime_error("no context or queue can be created");
 }
 
 } // namespace
 
-Nanoseconds startByHand(void* graphicsContext)
+Nanoseconds startDirectly(void* graphicsContext)
 {
     Started started;
     return timed([&] { start(started, graphicsContext); });

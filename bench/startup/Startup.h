@@ -1,9 +1,10 @@
-// What starting the library costs beside the OpenCL calls that start-up must make.
+// The baseline of start-up.
 #pragma once
 
 #include "harness/Timing.h"
 
-// The calls made bare: platform, device, context that shares with the current OpenGL context, two
-// queues, and the queries that start-up decides by. `graphicsContext` is the native handle. All
-// that is made is released outside of the time. Throws std::runtime_error where it cannot be made.
-Nanoseconds startByHand(void* graphicsContext);
+// Makes the OpenCL calls of start-up directly: platform, device, context that shares with the
+// current OpenGL context, two queues, and the queries. Returns their duration, without the release
+// of the objects. `graphicsContext` is the native handle. Throws std::runtime_error if an object
+// cannot be created.
+[[nodiscard]] Nanoseconds startDirectly(void* graphicsContext);

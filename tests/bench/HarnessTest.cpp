@@ -1,5 +1,4 @@
-// What the harness measures, concludes and writes. The bodies of cases tell times of their own, so
-// nothing is timed here.
+// The harness of the benchmarks. The bodies of the cases return made-up times; nothing is timed.
 #include "harness/InstructionCount.h"
 #include "harness/Report.h"
 #include "harness/Table.h"
@@ -18,10 +17,10 @@ using testing::AllOf, testing::HasSubstr, testing::Not;
 
 constexpr Effort kEffort{5, std::chrono::microseconds(10)};
 
-TEST(Comparison, TimesArePerOperationOfFilledSamplesAndRatiosToTheBaseline)
+TEST(Comparison, CompareReturnsTimesPerOperationAndRatiosToBaseline)
 {
     std::size_t longest = 0;
-    // Says that it takes so long per iteration.
+    // Returns this time per iteration.
     const auto pretending = [&longest](double nanoseconds) -> Body {
         return [=, &longest](std::size_t iterations) {
             longest = std::max(longest, iterations);
@@ -29,7 +28,7 @@ TEST(Comparison, TimesArePerOperationOfFilledSamplesAndRatiosToTheBaseline)
         };
     };
     std::mt19937 random;
-    const std::vector<Case> cases{{"bare", pretending(200), {}, 2},
+    const std::vector<Case> cases{{"direct", pretending(200), {}, 2},
                                   {"twice", pretending(800), {}, 4},
                                   {"half", pretending(50), {}, 1, "another"}};
     const GroupResult result = compare({"group", cases}, kEffort, random);
@@ -39,16 +38,16 @@ TEST(Comparison, TimesArePerOperationOfFilledSamplesAndRatiosToTheBaseline)
     EXPECT_DOUBLE_EQ(result.cases[1].measurement.ratio.median, 2);
     EXPECT_DOUBLE_EQ(result.cases[1].measurement.extraNanoseconds.median, 100);
     EXPECT_DOUBLE_EQ(result.cases[2].measurement.ratio.high, 0.5);
-    EXPECT_EQ(result.cases[2].peer, "another");
+    EXPECT_EQ(result.cases[2].thirdParty, "another");
     EXPECT_DOUBLE_EQ(result.control.median, 1);
     EXPECT_GE(longest, 200u) << "10 us of 50 ns each";
     EXPECT_LE(longest, 400u) << "no more than one doubling too far";
 }
 
-TEST(Comparison, EveryCaseRunsOnceARoundAndTheBaselineAgainAsTheControl)
+TEST(Comparison, CompareRunsEachCaseOncePerRoundAndBaselineTwice)
 {
     std::vector<int> order;
-    // Each call takes longer than the one before, so the control is not even.
+    // Each call takes longer than the previous one, so the control is not 1.
     const auto noting = [&order](int number) -> Body {
         return [&order, number](std::size_t iterations) {
             order.push_back(number);
@@ -59,16 +58,17 @@ TEST(Comparison, EveryCaseRunsOnceARoundAndTheBaselineAgainAsTheControl)
     const std::vector<Case> cases{{"0", noting(0)}, {"1", noting(1)}, {"2", noting(2)}};
     const Spread control = compare({"group", cases}, kEffort, random).control;
     EXPECT_NE(control.low, control.high);
-    order.erase(order.begin(), order.begin() + 3); // which filled a sample at once
-    // A round that lost the processor runs a case again, so these are least numbers.
+    order.erase(order.begin(), order.begin() + 3); // the calls that determined the iterations
+    // A preempted sample is repeated, so these are minimum numbers.
     EXPECT_GE(std::count(order.begin(), order.end(), 0), 2 * kEffort.rounds);
     EXPECT_GE(std::count(order.begin(), order.end(), 1), kEffort.rounds);
     EXPECT_GE(std::count(order.begin(), order.end(), 2), kEffort.rounds);
     const auto backwards = [](int one, int next) { return next == one - 1; };
-    EXPECT_NE(std::adjacent_find(order.begin(), order.end(), backwards), order.end()) << "random";
+    EXPECT_NE(std::adjacent_find(order.begin(), order.end(), backwards), order.end())
+        << "the order is random";
 }
 
-TEST(Statistics, PercentilesLieBetweenTheSamplesWhateverTheirOrder)
+TEST(Statistics, PercentileInterpolatesBetweenSamplesInAnyOrder)
 {
     const std::vector<double> sorted{10, 20, 30, 40, 50};
     EXPECT_DOUBLE_EQ(percentile(sorted, 0), 10);
@@ -79,7 +79,7 @@ TEST(Statistics, PercentilesLieBetweenTheSamplesWhateverTheirOrder)
     EXPECT_DOUBLE_EQ(spreadOf({}).median, 0);
 }
 
-TEST(Verdicts, FollowFromGoalAndMeasurement)
+TEST(Verdicts, JudgeDependsOnGoalAndMeasurement)
 {
     const auto times = [](double median, double extra) {
         return Measurement{{median, median, median}, {9, 9, 9}, {extra, extra, extra}, {}, {}};
@@ -115,7 +115,7 @@ std::vector<GroupResult> someResults(double ratio)
 {
     CaseResult ours{"ours", Goal::ratio(1.2), {}};
     ours.measurement.ratio = {ratio, ratio - 0.05, ratio + 0.05};
-    return {{"group", {{"bare", {}, {}}, ours}, {1, 0.98, 1.03}}};
+    return {{"group", {{"direct", {}, {}}, ours}, {1, 0.98, 1.03}}};
 }
 
 std::string tableOf(const std::vector<GroupResult>& results)
@@ -125,23 +125,23 @@ std::string tableOf(const std::vector<GroupResult>& results)
     return output.str();
 }
 
-TEST(Results, AMissedGoalStandsOut)
+TEST(Results, TableMarksMissedGoal)
 {
     EXPECT_THAT(tableOf(someResults(1.3)), HasSubstr("MISSED"));
     EXPECT_THAT(tableOf(someResults(1.1)), AllOf(HasSubstr("met"), Not(HasSubstr("MISS"))));
 }
 
-TEST(Results, OtherLibrariesAreMarkedAndNotJudged)
+TEST(Results, ThirdPartyBaselineIsMarkedAndHasNoVerdict)
 {
     auto results = someResults(1.3);
-    results[0].cases[1].peer = "another";
-    EXPECT_THAT(tableOf(results), AllOf(HasSubstr("peer |"), Not(HasSubstr("MISS"))));
+    results[0].cases[1].thirdParty = "another";
+    EXPECT_THAT(tableOf(results), AllOf(HasSubstr("third party |"), Not(HasSubstr("MISS"))));
     const QJsonValue json = toJson(RunDescription{}, results)["groups"][0]["cases"];
-    EXPECT_EQ(json[1]["peer"].toString(), "another");
-    EXPECT_TRUE(json[0]["peer"].isUndefined());
+    EXPECT_EQ(json[1]["thirdParty"].toString(), "another");
+    EXPECT_TRUE(json[0]["thirdParty"].isUndefined());
 }
 
-TEST(Table, ColumnsAreAligned)
+TEST(Table, WriteAlignsColumns)
 {
     Table table({"name", "n"});
     table.add({"a", "1"});
@@ -154,30 +154,31 @@ TEST(Table, ColumnsAreAligned)
                             "| long name | 12345 |\n");
 }
 
-TEST(ResultFiles, InstructionCountsArePerOperationAndByCase)
+TEST(ResultFiles, ReadInstructionCountsReturnsCountPerOperationByCase)
 {
     const QTemporaryDir folder;
     const std::pair<const char*, const char*> files[] = {
-        {"out.1", "desc: Trigger: Client Request: 64 group: bare\nsummary: 6400\n"},
+        {"out.1", "desc: Trigger: Client Request: 64 group: direct\nsummary: 6400\n"},
         {"out.2", "desc: Trigger: Client Request: 32 group: ours\nsummary: 4800 7\n"},
         {"out.3", "desc: Trigger: Program termination\nsummary: 99\n"},
-        {"notes", "nothing of the kind\n"},
+        {"notes", "not a count\n"},
     };
     for (const auto& [name, text] : files)
         std::ofstream(folder.filePath(name).toStdString()) << text;
     const auto counts = readInstructionCounts(folder.path().toStdString());
-    EXPECT_EQ(counts, (std::map<std::string, double>{{"group: bare", 100}, {"group: ours", 150}}));
+    EXPECT_EQ(counts,
+              (std::map<std::string, double>{{"group: direct", 100}, {"group: ours", 150}}));
 
     auto results = someResults(1.25);
     addInstructionCounts(results, counts);
     EXPECT_THAT(tableOf(results), HasSubstr("1.500")) << "the ratio by count";
 }
 
-TEST(ResultFiles, ARunComparesWithAnEarlierOneAndWithNothingElse)
+TEST(ResultFiles, WriteChangesMarksChangesBeyondNoiseAndReadRejectsOtherFiles)
 {
     const QTemporaryDir folder;
     const std::filesystem::path path = folder.filePath("run.json").toStdString();
-    EXPECT_THROW(readRatios(path), std::runtime_error) << "it does not exist";
+    EXPECT_THROW(readRatios(path), std::runtime_error) << "no such file";
     std::ofstream(path) << "{\"groups\": 3}";
     EXPECT_THROW(readRatios(path), std::runtime_error);
 

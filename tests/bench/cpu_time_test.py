@@ -1,4 +1,4 @@
-"""bench/frames/cpu_time.py on the samples of a run: who counts for which room, and what is left out."""
+"""Tests of bench/frames/cpu_time.py: the module of each sample, and the samples that are excluded."""
 import json
 import pathlib
 import subprocess
@@ -8,7 +8,7 @@ import unittest
 SCRIPT = pathlib.Path(__file__).parents[2] / "bench/frames/cpu_time.py"
 DEFORM = ("SharedBufferPath::deform()", "/b/vyra-opencl-bench-frames")
 SAMPLES = [
-    # thread, frames from the innermost outwards, the room
+    # thread, frames from the innermost outwards, the module or None if excluded
     (1, [("strlen", "/l/libc.so.6"), ("main", "/b/vyra-opencl-bench-frames")], None),  # outside of an evaluation
     (1, [("malloc", "/l/libc.so.6"), ("AutoCLEventList::grow()", "/b/libvyra-opencl.so.1.0.0"), DEFORM], "library"),
     (1, [("entry", "[kernel.kallsyms]"), ("clFlush", "/l/libOpenCL.so.1.0.0"), DEFORM], "runtime"),
@@ -21,8 +21,8 @@ SAMPLES = [
 ]
 
 
-class Rooms(unittest.TestCase):
-    def test_each_sample_is_counted_where_it_belongs(self):
+class CpuTime(unittest.TestCase):
+    def test_sample_counts_for_module_of_innermost_frame(self):
         text = "".join(
             f"vyra-opencl-ben {thread} \n"
             + "".join(f"\t    7f00 {symbol} ({module})\n" for symbol, module in frames)
@@ -30,8 +30,8 @@ class Rooms(unittest.TestCase):
             for thread, frames, _ in SAMPLES
         ) + "Xvfb 9 \n\t    7f00 main (/usr/bin/Xvfb)\n\n"
         output = subprocess.run([sys.executable, SCRIPT], input=text, capture_output=True, text=True, check=True)
-        rooms = [room for _, _, room in SAMPLES]
-        expected = {room: rooms.count(room) for room in ("kernels", "runtime", "library", "evaluator", "host")}
+        modules = [module for _, _, module in SAMPLES]
+        expected = {name: modules.count(name) for name in ("kernels", "runtime", "library", "evaluator", "host")}
         self.assertEqual(json.loads(output.stdout), expected)
 
 
