@@ -32,7 +32,7 @@ if(TARGET vyra-viewer)
     vyra_man_page(Tools vyra-viewer vyra-viewer "shows a character that OpenCL deforms")
 endif()
 if(TARGET vyra-opencl-info)
-    vyra_man_page(Tools vyra-opencl-info vyra-opencl-info "tells whether vyra-opencl's OpenCL is on, and why")
+    vyra_man_page(Tools vyra-opencl-info vyra-opencl-info "reports whether vyra-opencl's OpenCL is on, and why")
 endif()
 
 get_property(pages GLOBAL PROPERTY VYRA_MAN_PAGES)

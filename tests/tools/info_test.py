@@ -213,13 +213,9 @@ class Info(unittest.TestCase):
         self.assertEqual(first, second)
         self.assertTrue(first)
 
-    def test_help_lists_options_and_returns_0(self):
+    def test_help_returns_0_and_wrong_option_prints_error_and_returns_2(self):
         run = run_info({}, ["--help"])
-        self.assertEqual((run.returncode, run.stderr), (0, ""))
-        for option in ("--platform", "--device-vendor", "--json", "--version", "--help"):
-            self.assertIn(option, run.stdout)
-
-    def test_wrong_option_prints_error_and_returns_2(self):
+        self.assertEqual((run.returncode, run.stdout.count("--device-vendor"), run.stderr), (0, 1, ""))
         run = run_info({}, ["--jsn"])
         error = "vyra-opencl-info: there is no option '--jsn'; see vyra-opencl-info --help\n"
         self.assertEqual((run.returncode, run.stdout, run.stderr), (2, "", error))

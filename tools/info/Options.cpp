@@ -66,7 +66,13 @@ std::string problemOf(const QCommandLineParser& parser)
         return "there is no option " + quoted("--" + unknown.first().toStdString());
     if (!parser.positionalArguments().isEmpty())
         return "unexpected argument " + quoted(parser.positionalArguments().first().toStdString());
-    return parser.errorText().toStdString();
+    QString error = parser.errorText(); // a sentence: "Missing value after '--platform'."
+    if (error.isEmpty())
+        return "";
+    error[0] = error[0].toLower();
+    if (error.endsWith(u'.'))
+        error.chop(1);
+    return error.toStdString();
 }
 
 } // namespace
@@ -78,9 +84,10 @@ std::optional<Options> parseOptions(const QStringList& arguments, std::string& p
     addOptions(parser);
     parser.parse(arguments);
     problem = problemOf(parser);
-    Options options{.help = parser.isSet(kHelp),
-                    .version = parser.isSet(kVersion),
-                    .json = parser.isSet(kJson)};
+    Options options;
+    options.help = parser.isSet(kHelp);
+    options.version = parser.isSet(kVersion);
+    options.json = parser.isSet(kJson);
     if (problem.empty() && parser.isSet(kPlatform)) {
         options.platform = parser.value(kPlatform).toStdString();
         if (options.platform->empty())

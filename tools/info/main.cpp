@@ -42,7 +42,11 @@ int main(int argc, char* argv[])
         return 0;
     }
     if (options->help) {
-        const QCoreApplication application(argc, argv);
+        // The text begins with the program's name, here without its directory.
+        char name[] = "vyra-opencl-info";
+        char* names[] = {name, nullptr};
+        int count = 1;
+        const QCoreApplication application(count, names);
         std::fputs(info::helpText().c_str(), stdout);
         return 0;
     }
