@@ -4,6 +4,7 @@
 #include "interop/SharedBufferMgrBlock.h"
 #include "interop/TopenCLSharedBufferMgr.h"
 #include "loader/OpenCLLoader.h"
+#include "runtime/EnvironmentVariables.h"
 #include "runtime/InteropFunctions.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -21,7 +22,7 @@ constinit bool sfConstructedOnce = false;
 TopenCLSharedBufferMgr::TopenCLSharedBufferMgr()
     : fImpl(std::make_unique<TopenCLSharedBufferMgrImpl>())
 {
-    const bool forceThreading = VyraGetEnv("VYRA_OPENCL_FORCE_THREADING") != nullptr;
+    const bool forceThreading = VyraGetEnv(kForceThreadingVariable) != nullptr;
     fBatchingEnabled = !forceThreading;
     if (std::exchange(sfConstructedOnce, true))
         return;

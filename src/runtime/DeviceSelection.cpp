@@ -6,6 +6,7 @@
 #include "host/GLDisplay.h"
 #include "loader/OpenCLLoader.h"
 #include "runtime/DriverVersion.h"
+#include "runtime/EnvironmentVariables.h"
 #include "runtime/InteropFunctions.h"
 #include "runtime/PlatformSelection.h"
 #include "runtime/StartUpStep.h"
@@ -125,7 +126,7 @@ bool chooseDeviceForD3D11(void* d3dDevice, cl_platform_id platform, cl_device_id
 
 std::optional<int> ignoreDriverVersion()
 {
-    const char* value = std::getenv("VYRA_OPENCL_IGNORE_DRIVER_VERSION");
+    const char* value = std::getenv(kIgnoreDriverVersionVariable);
     return value ? std::optional<int>(std::atoi(value)) : std::nullopt;
 }
 
@@ -235,7 +236,7 @@ bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
     }
 
     if (!fPlatformSupportsDoublePrecision &&
-        TenvironmentVariable("VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT").asInt32(0) != 0) {
+        TenvironmentVariable(kOffWithoutDoubleVariable).asInt32(0) != 0) {
         std::fprintf(
             stderr,
             "Vyra OpenCL is not supported on device because double precision is not supported.\n");

@@ -5,6 +5,7 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "loader/OpenCLLoader.h"
 #include "runtime/DeviceSelection.h"
+#include "runtime/EnvironmentVariables.h"
 #include "runtime/PlatformSelection.h"
 #include "runtime/StartUpStep.h"
 #include "runtime/TopenCLInfo.h"
@@ -19,7 +20,7 @@ namespace {
 bool disabledByUser()
 {
     enterStartUpStep(StartUpStep::kSwitch);
-    if (!std::getenv("VYRA_DISABLE_OPENCL"))
+    if (!std::getenv(kDisableOpenCLVariable))
         return false;
     std::fprintf(stderr, "OpenCL initialization has been disabled by user\n");
     return true;

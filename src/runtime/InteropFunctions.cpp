@@ -3,6 +3,7 @@
 
 #include "host/Environment.h"
 #include "host/GLFunctionTable.h"
+#include "runtime/EnvironmentVariables.h"
 #include "runtime/StartUpStep.h"
 #include "runtime/SyncModes.h"
 #include "runtime/TopenCLInfo.h"
@@ -143,6 +144,6 @@ void TopenCLInfo::finalizeExtensionFunctions()
 
 bool TopenCLInfo::supportsThreadedSharing() const
 {
-    static const bool sfForceThreading = VyraGetEnv("VYRA_OPENCL_FORCE_THREADING") != nullptr;
+    static const bool sfForceThreading = VyraGetEnv(kForceThreadingVariable) != nullptr;
     return sfForceThreading || fProvider != kNVIDIAProvider || fUsingDX || fUsingKHRD3D11Sharing;
 }

@@ -3,6 +3,7 @@
 
 #include "diagnostics/CLStatusReport.h"
 #include "loader/OpenCLLoader.h"
+#include "runtime/EnvironmentVariables.h"
 #include "runtime/StartUpStep.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -68,7 +69,7 @@ bool readPlatformNames(cl_platform_id platform, PlatformNames& names)
 
 std::optional<Tstring> chooseVendor(unsigned vendorId)
 {
-    if (const char* forced = std::getenv("VYRA_OPENCL_PLATFORM"))
+    if (const char* forced = std::getenv(kPlatformVariable))
         return Tstring(forced);
     for (const VendorId& vendor : kVendorIds) {
         if (vendor.id == vendorId)

@@ -1,6 +1,7 @@
 #include "runtime/SyncModes.h"
 
 #include "host/Environment.h"
+#include "runtime/EnvironmentVariables.h"
 
 namespace {
 
@@ -19,9 +20,9 @@ constexpr const char* kImplicitOverridden =
 SyncModeVariables readSyncModeVariables()
 {
     SyncModeVariables variables;
-    variables.forceFinish = TenvironmentVariable("VYRA_OPENCL_FORCE_FINISH").asInt32(0);
-    variables.graphicsToCL = TenvironmentVariable("VYRA_GRAPHICSTOOPENCL_SYNC_MODE").asInt32(0);
-    variables.clToGraphics = TenvironmentVariable("VYRA_OPENCLTOGRAPHICS_SYNC_MODE").asInt32(0);
+    variables.forceFinish = TenvironmentVariable(kForceFinishVariable).asInt32(0);
+    variables.graphicsToCL = TenvironmentVariable(kGraphicsToCLSyncVariable).asInt32(0);
+    variables.clToGraphics = TenvironmentVariable(kCLToGraphicsSyncVariable).asInt32(0);
     return variables;
 }
 

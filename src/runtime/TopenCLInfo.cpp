@@ -1,5 +1,7 @@
 #include "runtime/TopenCLInfo.h"
 
+#include "runtime/EnvironmentVariables.h"
+
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -29,7 +31,7 @@ TopenCLInfo& TopenCLInfo::operator=(const TopenCLInfo& other) = default;
 
 int TopenCLInfo::getDefaultMinimumBufferSize() const
 {
-    if (const char* value = std::getenv("VYRA_OPENCL_DEFORMER_MIN_VERTS")) {
+    if (const char* value = std::getenv(kMinimumVerticesVariable)) {
         const int vertices = std::max(std::atoi(value), 0);
         std::fprintf(stderr,
                      "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to %d.\n",

@@ -1,6 +1,7 @@
 #include "standalone/OpenCLPlatforms.h"
 
 #include "loader/OpenCLLibraryName.h"
+#include "runtime/EnvironmentVariables.h"
 
 #include <algorithm>
 
@@ -14,7 +15,6 @@
 
 namespace {
 
-constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
 constexpr char kSharingExtension[] = "cl_khr_gl_sharing";
 
 struct Adapter {
