@@ -82,7 +82,7 @@ private:
     std::unique_ptr<KernelLibrary> fLibrary;
     std::vector<std::unique_ptr<DeformationQueue>> fQueues;
 
-    // The rest poses on the device, by geometry; the weak pointer shows that the geometry is gone.
+    // The rest poses on the device, by geometry; the weak pointer shows that the geometry was destroyed.
     struct SharedRestPose {
         std::weak_ptr<const MeshGeometry> geometry;
         RestPose rest;

@@ -7,4 +7,4 @@ class QOpenGLContext;
 
 // Returns the handle of `context` in GLX, EGL or WGL, as TopenCLInfo::initialize takes it. The
 // context owns it. Null if the context has not been created.
-VYRA_HOST_API void* nativeContext(const QOpenGLContext& context);
+[[nodiscard]] VYRA_HOST_API void* nativeContext(const QOpenGLContext& context);

@@ -19,16 +19,16 @@ struct OpenCLPlatform {
 };
 
 // Returns all platforms in the order of the OpenCL loader. Empty without an OpenCL library.
-VYRA_HOST_API std::vector<OpenCLPlatform> openCLPlatforms();
+[[nodiscard]] VYRA_HOST_API std::vector<OpenCLPlatform> openCLPlatforms();
 
 // Returns the files that the variable OPENCL_LAYERS names and that do not exist. The OpenCL loader
 // ignores them silently.
-VYRA_HOST_API std::vector<std::string> missingOpenCLLayers();
+[[nodiscard]] VYRA_HOST_API std::vector<std::string> missingOpenCLLayers();
 
 // Returns the PCI vendor id of the adapter that has these GL_VENDOR and GL_RENDERER texts. Empty
 // for a software renderer and for a vendor whose OpenCL the library does not choose by id.
-VYRA_HOST_API std::optional<unsigned> adapterVendorId(std::string_view glVendor,
-                                                      std::string_view glRenderer);
+[[nodiscard]] VYRA_HOST_API std::optional<unsigned> adapterVendorId(std::string_view glVendor,
+                                                                    std::string_view glRenderer);
 
 // Returns the vendor id to pass to TopenCLInfo::initialize for the renderer of this context, which
 // is current: the PCI id of its adapter, or 0 for a software renderer and an unknown adapter.

@@ -32,5 +32,6 @@ public:
     // microseconds. An event that has not ended is written as begun. Returns false if the file
     // cannot be written: it is then removed, and `reason`, unless null, receives the system's
     // message.
-    static bool writeChromeTrace(const std::string& path, std::string* reason = nullptr);
+    [[nodiscard]] static bool writeChromeTrace(const std::string& path,
+                                               std::string* reason = nullptr);
 };

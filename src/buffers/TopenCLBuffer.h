@@ -81,11 +81,12 @@ public:
 
 private:
     void allocateOpenCLBuffer(std::size_t size, void* hostPtr, int* error);
-    int createMemory(std::size_t size, void* hostPtr);
+    [[nodiscard]] int createMemory(std::size_t size, void* hostPtr);
     void mapMemory(std::size_t size, int* error);
     void unmapMemory();
-    int enqueueWrite(cl_command_queue queue, cl_uint blocking, std::size_t offset, std::size_t size,
-                     const void* hostPtr, cl_uint numEvents, const cl_event* waitList);
+    [[nodiscard]] int enqueueWrite(cl_command_queue queue, cl_uint blocking, std::size_t offset,
+                                   std::size_t size, const void* hostPtr, cl_uint numEvents,
+                                   const cl_event* waitList);
 
     TopenCLDataBuffer fDataBuffer;
     void* fMappedPointer = nullptr;

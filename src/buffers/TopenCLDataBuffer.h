@@ -34,12 +34,12 @@ public:
     TopenCLDataBuffer& operator=(TopenCLDataBuffer&& other) noexcept;
     ~TopenCLDataBuffer();
 
-    AutoCLObject<cl_mem>& buffer() { return fBuffer; }
-    const AutoCLObject<cl_mem>& buffer() const { return fBuffer; }
-    AutoCLObject<cl_event>& bufferReadyEvent() { return fBufferReadyEvent; }
-    const AutoCLObject<cl_event>& bufferReadyEvent() const { return fBufferReadyEvent; }
-    TopenCLDataBufferDescriptor& descriptor() { return fDescriptor; }
-    const TopenCLDataBufferDescriptor& descriptor() const { return fDescriptor; }
+    AutoCLObject<cl_mem>& buffer() noexcept { return fBuffer; }
+    const AutoCLObject<cl_mem>& buffer() const noexcept { return fBuffer; }
+    AutoCLObject<cl_event>& bufferReadyEvent() noexcept { return fBufferReadyEvent; }
+    const AutoCLObject<cl_event>& bufferReadyEvent() const noexcept { return fBufferReadyEvent; }
+    TopenCLDataBufferDescriptor& descriptor() noexcept { return fDescriptor; }
+    const TopenCLDataBufferDescriptor& descriptor() const noexcept { return fDescriptor; }
 
     // Shares `buffer` and records its size in bytes.
     void setBuffer(const AutoCLObject<cl_mem>& buffer, unsigned int capacityInBytes);

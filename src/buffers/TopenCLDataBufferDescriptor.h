@@ -35,12 +35,12 @@ public:
     // and sets the permissions to kReadOnly or kReadWrite as isReadOnly() reports.
     TopenCLDataBufferDescriptor(const Tplug& plug, const TopenCLDataBufferDescriptor& other);
 
-    const TuniqueString& name() const { return fName; }
-    const Tplug& plug() const { return fPlug; }
-    unsigned int elementSizeInBytes() const { return fElementSizeInBytes; }
-    unsigned int elementCount() const { return fElementCount; }
-    unsigned int capacityInBytes() const { return fCapacityInBytes; }
-    bool isReadOnly() const { return fPermissions == kReadOnly; }
+    const TuniqueString& name() const noexcept { return fName; }
+    const Tplug& plug() const noexcept { return fPlug; }
+    unsigned int elementSizeInBytes() const noexcept { return fElementSizeInBytes; }
+    unsigned int elementCount() const noexcept { return fElementCount; }
+    unsigned int capacityInBytes() const noexcept { return fCapacityInBytes; }
+    bool isReadOnly() const noexcept { return fPermissions == kReadOnly; }
     bool hasEmptyName();
 
     // Each stores its argument unchanged.

@@ -52,7 +52,7 @@ private:
     using FreeBuffers = std::multimap<unsigned int, TopenCLDataBuffer>;
     using Entry = FreeBuffers::node_type;
 
-    Entry takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result);
+    [[nodiscard]] Entry takeBestFit(unsigned int requiredBytes, TopenCLDataBuffer& result);
     static void createMemory(unsigned int requiredBytes, TopenCLDataBuffer& result);
 
     FreeBuffers fFreeBuffers;

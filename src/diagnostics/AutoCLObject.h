@@ -96,7 +96,7 @@ public:
     }
 
     // Returns the handle, or null if the holder is empty. The reference stays the holder's.
-    T get() const { return fHandle; }
+    T get() const noexcept { return fHandle; }
 
 private:
     T fHandle = nullptr;

@@ -81,7 +81,7 @@ private:
     }
 
     // Growth that runs out of memory leaves a vector that cannot grow any more; clear replaces it.
-    bool canGrow() const { return fSlots.size() == fSlotCount; }
+    bool canGrow() const noexcept { return fSlots.size() == fSlotCount; }
 
     // Creates the slot at `index`, and as many again, unless another thread has done so.
     void grow(std::size_t index)

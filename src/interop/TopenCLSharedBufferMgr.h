@@ -56,8 +56,10 @@ public:
     // null on failure; `*errcode` receives the status, and `errcode` must not be null. The buffer
     // is unbatched until the next PreEvaluate. Wraps clCreateFromGLBuffer or its Direct3D 11
     // counterparts.
-    const TopenCLSharedBuffer* CreateSharedCLBuffer(cl_context context, cl_mem_flags flags,
-                                                    void* graphicsBuffer, int* errcode);
+    [[nodiscard]] const TopenCLSharedBuffer* CreateSharedCLBuffer(cl_context context,
+                                                                  cl_mem_flags flags,
+                                                                  void* graphicsBuffer,
+                                                                  int* errcode);
 
     // Destroys the record of a buffer. If the buffer is in the batch:
     // - If the batch is not acquired, waits for its last release and dissolves the batch.
@@ -113,7 +115,7 @@ private:
     void UpdateBufferBatch();
     void ReleaseBufferBatch();
     void AcquireBatch();
-    int DissolveBatch();
+    [[nodiscard]] int DissolveBatch();
     void LeaveBatch(const TopenCLSharedBuffer& record);
     void ReleaseUnbatched(const TopenCLSharedBuffer& record);
 

@@ -39,7 +39,7 @@ public:
     void reserveForKernel() { reserveForOne(fKernels); }
     void add(cl_kernel kernel, ProgramInfo& program);
     // Removes `kernel` and returns its program, or null if the kernel is not in the index.
-    ProgramInfo* take(cl_kernel kernel);
+    [[nodiscard]] ProgramInfo* take(cl_kernel kernel);
 
     // Removes every entry of a program that is about to be destroyed.
     void forget(const ProgramInfo& program);

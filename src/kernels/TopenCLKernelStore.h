@@ -44,13 +44,14 @@ public:
     // `includeDirs` may be null. The caller owns the result's reference and releases the kernel
     // with freeKernel. Wraps clCreateKernel and, for a program that is not cached,
     // clCreateProgramWithSource and clBuildProgram.
-    AutoCLObject<cl_kernel> getKernel(const char* fileName, const char* buildFlags,
-                                      const char* kernelName, const TstringArray* includeDirs);
+    [[nodiscard]] AutoCLObject<cl_kernel> getKernel(const char* fileName, const char* buildFlags,
+                                                    const char* kernelName,
+                                                    const TstringArray* includeDirs);
 
     // As getKernel, for the NUL-terminated program text `source`, cached under `programName`.
-    AutoCLObject<cl_kernel> getKernelFromString(const char* source, const char* programName,
-                                                const char* buildFlags, const char* kernelName,
-                                                const TstringArray* includeDirs);
+    [[nodiscard]] AutoCLObject<cl_kernel>
+    getKernelFromString(const char* source, const char* programName, const char* buildFlags,
+                        const char* kernelName, const TstringArray* includeDirs);
 
     // Removes a kernel from the store, and its program with the program's last kernel. Returns true
     // if the kernel was found, and for an empty holder. The caller's own reference is unchanged.
@@ -70,13 +71,15 @@ private:
         std::size_t operator()(const ProgramKey& key) const;
     };
 
-    ProgramInfo* getProgram(const char* fileName, const char* buildFlags,
-                            const TstringArray* includeDirs);
-    ProgramInfo* getProgramFromString(const char* source, const char* programName,
-                                      const char* buildFlags, const TstringArray* includeDirs);
-    cl_program getProgramFromString(const char* source, const char* options);
-    ProgramInfo* cacheProgram(ProgramKey&& key, const char* source);
-    AutoCLObject<cl_kernel> createKernel(ProgramInfo& program, const char* kernelName);
+    [[nodiscard]] ProgramInfo* getProgram(const char* fileName, const char* buildFlags,
+                                          const TstringArray* includeDirs);
+    [[nodiscard]] ProgramInfo* getProgramFromString(const char* source, const char* programName,
+                                                    const char* buildFlags,
+                                                    const TstringArray* includeDirs);
+    [[nodiscard]] cl_program getProgramFromString(const char* source, const char* options);
+    [[nodiscard]] ProgramInfo* cacheProgram(ProgramKey&& key, const char* source);
+    [[nodiscard]] AutoCLObject<cl_kernel> createKernel(ProgramInfo& program,
+                                                       const char* kernelName);
     void reportBuildLog(cl_program program);
     Tstring expandBuildFlags(const char* flags, const TstringArray* includeDirs);
 

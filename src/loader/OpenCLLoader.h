@@ -97,4 +97,4 @@ enum class OpenCLLoadStatus : int {
 // Opens the system's OpenCL loader library and fills the table; each entry is looked up in the
 // library first, then with clGetExtensionFunctionAddress. Never ends the process. May throw
 // standard exceptions.
-OpenCLLoadStatus loadOpenCL();
+[[nodiscard]] OpenCLLoadStatus loadOpenCL();

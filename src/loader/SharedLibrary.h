@@ -3,5 +3,5 @@
 
 // Both texts are NUL-terminated; null is returned if there is no such library or symbol. An opened
 // library stays open until the process ends, as do the handles that its functions return.
-void* openSharedLibrary(const char* name);
-void* findSymbol(void* library, const char* name);
+[[nodiscard]] void* openSharedLibrary(const char* name);
+[[nodiscard]] void* findSymbol(void* library, const char* name);

@@ -226,7 +226,7 @@ bool TopenCLInfo::decideDoublePrecision(cl_platform_id platform)
         std::strncmp(version.data(), "OpenCL 1.1", kVersionPrefix) == 0) {
         // Before version 1.2 double precision is an extension; a failing query counts as absence.
         std::vector<char> extensions;
-        queryPlatformInfo(platform, CL_PLATFORM_EXTENSIONS, extensions);
+        static_cast<void>(queryPlatformInfo(platform, CL_PLATFORM_EXTENSIONS, extensions));
         fPlatformSupportsDoublePrecision = platformText(extensions).findMB("cl_khr_fp64") != -1;
     } else {
         cl_device_fp_config config = 0;

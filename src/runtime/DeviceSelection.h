@@ -18,9 +18,9 @@ ContextProperties d3d11ContextProperties(void* d3dDevice, cl_platform_id platfor
 // `properties` if it is a GPU and shares with the context, else the first GPU that shares; none is
 // reported on standard error. With Direct3D 11: the first device that the runtime prefers for the
 // device `graphicsContext`. Returns false if there is none, or if a query fails, which is reported.
-bool chooseDevice(bool usingDX, void* graphicsContext, cl_platform_id platform,
-                  const ContextProperties& properties, cl_device_id& device);
+[[nodiscard]] bool chooseDevice(bool usingDX, void* graphicsContext, cl_platform_id platform,
+                                const ContextProperties& properties, cl_device_id& device);
 
 // Prints name, type and availability of `device` to standard error. Returns false if the device is
 // not available or a query fails; both are reported.
-bool reportDevice(cl_device_id device);
+[[nodiscard]] bool reportDevice(cl_device_id device);

@@ -27,4 +27,5 @@ struct DriverVerdict {
 // Returns the features that work in a driver of this version. `ignoreVersion` is the value of
 // VYRA_OPENCL_IGNORE_DRIVER_VERSION if it is set: with 0 or more every driver is usable, and with
 // more than 0 its implicit synchronisation works.
-DriverVerdict judgeDriver(const DriverVersion& version, std::optional<int> ignoreVersion);
+[[nodiscard]] DriverVerdict judgeDriver(const DriverVersion& version,
+                                        std::optional<int> ignoreVersion);

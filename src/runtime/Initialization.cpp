@@ -82,7 +82,7 @@ TopenCLInfo::TopenCLInfo(void* window, void* graphicsContext, void* /*reserved*/
     cl_platform_id platform = nullptr;
     Tstring extensions;
     // The result is ignored: a search that fails after the match has found the platform.
-    findPlatformByVendor(*vendor, platform, extensions);
+    static_cast<void>(findPlatformByVendor(*vendor, platform, extensions));
     if (!reportPlatform(*vendor, platform))
         return;
     fProvider = providerOfVendor(*vendor);

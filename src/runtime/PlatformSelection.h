@@ -17,14 +17,15 @@ inline constexpr const char* kAppleVendor = "Apple";
 
 // Returns the vendor's name: the value of VYRA_OPENCL_PLATFORM if it is set, else the vendor with
 // the PCI id `vendorId`. Empty for an unknown id, which is reported on standard error.
-std::optional<Tstring> chooseVendor(unsigned vendorId);
+[[nodiscard]] std::optional<Tstring> chooseVendor(unsigned vendorId);
 
 // Returns the provider with exactly this vendor name, or kUnknownProvider.
 OpenCLProvider providerOfVendor(const Tstring& vendor);
 
 // Reads a text of a platform with its terminating NUL. Returns the status of the first call that
 // fails, without reporting it.
-cl_int queryPlatformInfo(cl_platform_id platform, cl_platform_info name, std::vector<char>& value);
+[[nodiscard]] cl_int queryPlatformInfo(cl_platform_id platform, cl_platform_info name,
+                                       std::vector<char>& value);
 
 // Returns the text in `value` up to its first NUL; the empty string if `value` is empty.
 Tstring platformText(const std::vector<char>& value);

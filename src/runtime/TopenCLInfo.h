@@ -45,7 +45,7 @@ public:
     // Returns the object. Requires initialize.
     static TopenCLInfo& theOne();
     // Returns whether there is an object with a context and a primary queue.
-    static bool isValid();
+    [[nodiscard]] static bool isValid();
 
     // Wait for (finish) or submit (flush) all commands of both queues. Do nothing if not valid.
     // Wrap clFinish and clFlush.
@@ -53,40 +53,46 @@ public:
     static void flush();
     // Returns whether the command of `event` is complete. True for null and for an event whose
     // query fails; false for a command that ended with an error. Wraps clGetEventInfo.
-    static bool IsEventComplete(cl_event event);
+    [[nodiscard]] static bool IsEventComplete(cl_event event);
 
     // Copy the members: handles and kernel store are shared, nothing is retained.
     TopenCLInfo(const TopenCLInfo& other);
     TopenCLInfo& operator=(const TopenCLInfo& other);
 
     // The object owns the handles; callers borrow them.
-    cl_context openCLContext() const { return fContext; }
-    cl_command_queue openCLCommandQueue() const { return fCommandQueue; }
-    cl_command_queue secondaryOpenCLCommandQueue() const { return fSecondaryCommandQueue; }
-    cl_device_id openCLDevice() const { return fDevice; }
-    OpenCLProvider openCLProvider() const { return fProvider; }
-    unsigned computeUnitCount() const { return fComputeUnitCount; }
+    cl_context openCLContext() const noexcept { return fContext; }
+    cl_command_queue openCLCommandQueue() const noexcept { return fCommandQueue; }
+    cl_command_queue secondaryOpenCLCommandQueue() const noexcept { return fSecondaryCommandQueue; }
+    cl_device_id openCLDevice() const noexcept { return fDevice; }
+    OpenCLProvider openCLProvider() const noexcept { return fProvider; }
+    unsigned computeUnitCount() const noexcept { return fComputeUnitCount; }
     // Requires that start-up has reached the creation of the queues.
-    TopenCLKernelStore& kernelStore() const { return *fKernelStore; }
-    TopenCLSharedBufferMgr& sharedBufferMgr() { return fSharedBufferMgr; }
-    const TopenCLSharedBufferMgr& sharedBufferMgr() const { return fSharedBufferMgr; }
+    TopenCLKernelStore& kernelStore() const noexcept { return *fKernelStore; }
+    TopenCLSharedBufferMgr& sharedBufferMgr() noexcept { return fSharedBufferMgr; }
+    const TopenCLSharedBufferMgr& sharedBufferMgr() const noexcept { return fSharedBufferMgr; }
 
-    GraphicsToCLSyncMode graphicsToCLSyncMode() const { return fGraphicsToCLSyncMode; }
-    CLToGraphicsSyncMode clToGraphicsSyncMode() const { return fCLToGraphicsSyncMode; }
+    GraphicsToCLSyncMode graphicsToCLSyncMode() const noexcept { return fGraphicsToCLSyncMode; }
+    CLToGraphicsSyncMode clToGraphicsSyncMode() const noexcept { return fCLToGraphicsSyncMode; }
     // Return whether the host calls glFinish before an evaluation, and clFinish before drawing.
-    bool useGLFinish() const { return fGraphicsToCLSyncMode == kGraphicsToCLFinish && !fUsingDX; }
-    bool useCLFinish() const { return fCLToGraphicsSyncMode == kCLToGraphicsFinish; }
+    bool useGLFinish() const noexcept
+    {
+        return fGraphicsToCLSyncMode == kGraphicsToCLFinish && !fUsingDX;
+    }
+    bool useCLFinish() const noexcept { return fCLToGraphicsSyncMode == kCLToGraphicsFinish; }
     // Returns whether several threads may share buffers at the same time.
     bool supportsThreadedSharing() const;
 
-    bool usingGPU() const { return fUsingGPU; }
-    bool usingDX() const { return fUsingDX; }
-    bool usingGLCoreProfile() const { return fUsingGLCoreProfile; }
-    bool usingOutOfOrderExecution() const { return fUsingOutOfOrderExecution; }
-    bool supportsAsyncReadback() const { return fSupportsAsyncReadback; }
+    bool usingGPU() const noexcept { return fUsingGPU; }
+    bool usingDX() const noexcept { return fUsingDX; }
+    bool usingGLCoreProfile() const noexcept { return fUsingGLCoreProfile; }
+    bool usingOutOfOrderExecution() const noexcept { return fUsingOutOfOrderExecution; }
+    bool supportsAsyncReadback() const noexcept { return fSupportsAsyncReadback; }
 
-    bool platformSupportsDoublePrecision() const { return fPlatformSupportsDoublePrecision; }
-    bool allowDoublePrecisionSupport() const { return fAllowDoublePrecisionSupport; }
+    bool platformSupportsDoublePrecision() const noexcept
+    {
+        return fPlatformSupportsDoublePrecision;
+    }
+    bool allowDoublePrecisionSupport() const noexcept { return fAllowDoublePrecisionSupport; }
     bool supportsDoublePrecision() const
     {
         return fPlatformSupportsDoublePrecision && fAllowDoublePrecisionSupport;
@@ -95,8 +101,11 @@ public:
     bool setAllowDoublePrecisionSupport(bool allow);
 
     // Returns the least number of vertices for which the host deforms with OpenCL.
-    int minimumBufferSize() const { return fUseMinimumBufferSize ? fMinimumBufferSize : 0; }
-    bool useMinimumBufferSize() const { return fUseMinimumBufferSize; }
+    int minimumBufferSize() const noexcept
+    {
+        return fUseMinimumBufferSize ? fMinimumBufferSize : 0;
+    }
+    bool useMinimumBufferSize() const noexcept { return fUseMinimumBufferSize; }
     // Returns, in vertices, VYRA_OPENCL_DEFORMER_MIN_VERTS if it is set, which is read and printed
     // to standard error on every call; else 2000 on NVIDIA and 500 elsewhere.
     int getDefaultMinimumBufferSize() const;
@@ -107,7 +116,7 @@ public:
     // Returns a new in-order queue, whose reference the caller owns. Null without a context or a
     // device, or if a call fails, which is reported. The out-parameter may be null and receives
     // false. Wraps clCreateCommandQueue.
-    cl_command_queue createOpenCLCommandQueue(bool* usingOutOfOrderExecution);
+    [[nodiscard]] cl_command_queue createOpenCLCommandQueue(bool* usingOutOfOrderExecution);
     // Computes the sizes of a one-dimensional launch of `workItemCount` work-items: the kernel's
     // work-group size on the device, and the count rounded up to a multiple of it. Kernels must
     // skip the work-items past the count. Returns an OpenCL status; on failure the outputs are not
@@ -121,7 +130,8 @@ public:
     // Reads a kernel source file into `source`, unchanged, after `preamble`. Returns false if it
     // cannot be read, is empty, or has 2 GiB or more; `source` is then unspecified. Safe from any
     // thread.
-    static bool oclLoadProgSource(Tstring& source, const char* fileName, const char* preamble);
+    [[nodiscard]] static bool oclLoadProgSource(Tstring& source, const char* fileName,
+                                                const char* preamble);
 
 private:
     TopenCLInfo(void* window, void* graphicsContext, void* reserved, bool usingDX,
@@ -130,17 +140,17 @@ private:
     void cleanUpOpenCL();
 
     // The steps of start-up. A step that returns false stops it.
-    static bool findPlatformByVendor(const Tstring& vendor, cl_platform_id& platform,
-                                     Tstring& extensions);
-    bool setupDirectXExtensionFunctions(Tstring* extensions);
-    bool decideAsyncReadback();
-    bool judgeNVIDIADriver();
-    bool createContext(const cl_context_properties* properties);
-    bool setupExtensionFunctions(Tstring* extensions);
+    [[nodiscard]] static bool findPlatformByVendor(const Tstring& vendor, cl_platform_id& platform,
+                                                   Tstring& extensions);
+    [[nodiscard]] bool setupDirectXExtensionFunctions(Tstring* extensions);
+    [[nodiscard]] bool decideAsyncReadback();
+    [[nodiscard]] bool judgeNVIDIADriver();
+    [[nodiscard]] bool createContext(const cl_context_properties* properties);
+    [[nodiscard]] bool setupExtensionFunctions(Tstring* extensions);
     static void finalizeExtensionFunctions();
-    bool decideDoublePrecision(cl_platform_id platform);
+    [[nodiscard]] bool decideDoublePrecision(cl_platform_id platform);
     void createQueuesAndKernelStore();
-    bool readComputeUnitCount();
+    [[nodiscard]] bool readComputeUnitCount();
 
     static TopenCLInfo* sfTheOne;
     static bool sfListPlatforms; // true until all platforms have been listed once

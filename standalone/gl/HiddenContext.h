@@ -27,7 +27,7 @@ public:
     HiddenContext& operator=(const HiddenContext&) = delete;
 
     // Returns whether the context was created and is current on its thread.
-    bool valid() const { return fValid; }
+    bool valid() const noexcept { return fValid; }
 
     // Runs `function` with the context current, and returns after it has ended. Calls are run one
     // at a time. Safe from any thread. Requires valid().

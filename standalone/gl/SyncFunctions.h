@@ -20,19 +20,20 @@ public:
     explicit SyncFunctions(QOpenGLContext& context);
 
     // Whether the functions below may be called.
-    bool usable() const { return fUsable; }
+    bool usable() const noexcept { return fUsable; }
 
-    GLsync fence(unsigned int condition, unsigned int flags);
+    [[nodiscard]] GLsync fence(unsigned int condition, unsigned int flags);
     void remove(GLsync sync);
-    unsigned int clientWait(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
+    [[nodiscard]] unsigned int clientWait(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
     void serverWait(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
     // Returns null for an invalid event or flags other than 0.
-    GLsync fromCLEvent(cl_context context, cl_event event, unsigned int flags);
+    [[nodiscard]] GLsync fromCLEvent(cl_context context, cl_event event, unsigned int flags);
 
 private:
     bool callerHasContext() const;
-    GLsync fenceAndFlush(unsigned int condition, unsigned int flags) const;
-    unsigned int waitInTurns(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
+    [[nodiscard]] GLsync fenceAndFlush(unsigned int condition, unsigned int flags) const;
+    [[nodiscard]] unsigned int waitInTurns(GLsync sync, unsigned int flags,
+                                           std::uint64_t timeoutNs);
 
     GLFunctionTable fDriver;
     void (*fFlush)() = nullptr;

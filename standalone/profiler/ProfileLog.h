@@ -44,14 +44,14 @@ public:
     static ProfileLog& ofThisThread();
 
     // Returns copies of all logs, in the order of their creation.
-    static std::vector<ThreadProfile> copyAll();
+    [[nodiscard]] static std::vector<ThreadProfile> copyAll();
     // Empties all logs. The ends of events that are open are ignored.
     static void clearAll();
 
     void setThreadName(std::string name);
 
     // Appends an event and returns the identifier with which to end it; never 0.
-    profiler::EventId append(ProfileEvent event);
+    [[nodiscard]] profiler::EventId append(ProfileEvent event);
     // Ends an event of any thread. Ignores unknown identifiers and those from before clearAll.
     static void end(profiler::EventId id, std::int64_t endNs);
 

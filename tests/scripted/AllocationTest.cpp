@@ -204,7 +204,8 @@ TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
     bench.makeStore();
     const Lines before = runtime().balance();
     const auto build = [&] {
-        bench.store->getKernelFromString("#error", "program", "", "skin", nullptr);
+        const auto kernel =
+            bench.store->getKernelFromString("#error", "program", "", "skin", nullptr);
     };
     EXPECT_GT(untilMemorySuffices(build, [&] { EXPECT_EQ(runtime().balance(), before); }), 1U);
     EXPECT_GT(std::ranges::count(warnings(), ""), 0);

@@ -107,7 +107,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
                 {"b/the-same-ending.cl", kLong, {}, 1}};
     for (const auto& [name, flags, list, expected] : rows) {
         const TstringArray directories = arrayOf(list);
-        fStore->getKernelFromString(kSource, name, flags, "skin", &directories);
+        const auto kernel = fStore->getKernelFromString(kSource, name, flags, "skin", &directories);
         EXPECT_EQ(builds(), expected) << name << flags;
     }
     // Where the name has a program already, no file is looked for.
@@ -274,7 +274,8 @@ TEST_F(KernelStoreTest, TheVendorsOwnFlagIsNoPartOfTheKey)
     const TstringArray folders = arrayOf({"a"});
     fromText("skin", " -I a");
     fStore->initialize(info.openCLContext(), info.openCLDevice(), kNVIDIAProvider);
-    fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // in other words
+    const auto kernel =
+        fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // in other words
     EXPECT_EQ(builds(), 1U);
 }
 
@@ -336,7 +337,8 @@ TEST_F(KernelStoreTest, BuildOptionsReachTheCompilerToTheCharacter)
             TopenCLInfo::theOne().setAllowDoublePrecisionSupport(doublePrecision);
             makeStore(provider);
             const TstringArray directories = arrayOf(list);
-            fStore->getKernelFromString(kSource, "name", flags, "skin", &directories);
+            const auto kernel =
+                fStore->getKernelFromString(kSource, "name", flags, "skin", &directories);
             EXPECT_THAT(
                 callsOf("clBuildProgram"),
                 ::testing::ElementsAre(::testing::EndsWith(

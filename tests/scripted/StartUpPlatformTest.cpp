@@ -178,7 +178,8 @@ TEST_F(StartUpOnce, CleanUpDeletesTheKernelStoreAndReleasesNothingElse)
 {
     ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
-    info.kernelStore().getKernelFromString("skin", "program", "", "skin", nullptr);
+    const auto kernel =
+        info.kernelStore().getKernelFromString("skin", "program", "", "skin", nullptr);
     calls();
     (info.*memberOf(CleanUp()))();
     (info.*memberOf(CleanUp()))();
