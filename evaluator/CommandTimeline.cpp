@@ -16,8 +16,8 @@ CommandTimeline::CommandTimeline(const OpenCLFunctions& cl, cl_command_queue que
                                  std::string track, const EvaluatorSettings& settings)
     : fCL(cl), fTrack(std::move(track)), fSettings(settings)
 {
-    // The device notes when a marker is queued, which is between two readings of the host's clock.
-    // The closest pair of readings counts.
+    // The device records when a marker is queued, between two readings of the host's clock. The
+    // closest pair of readings is used.
     std::int64_t closest = std::numeric_limits<std::int64_t>::max();
     for (int comparison = 0; comparison < kClockComparisons; ++comparison) {
         AutoCLObject<cl_event> marker;
@@ -39,7 +39,7 @@ void CommandTimeline::add(const char* name, const AutoCLObject<cl_event>& event)
     try {
         fCommands.push_back({name, event});
     } catch (const std::bad_alloc&) {
-        // The trace lacks a command; the evaluation goes on.
+        // The trace lacks a command; the evaluation continues.
     }
 }
 

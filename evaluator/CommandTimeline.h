@@ -1,4 +1,4 @@
-// When the device ran the commands of a queue. Internal.
+// The times at which the device ran the commands of a queue. Internal.
 #pragma once
 
 #include "evaluator/Evaluator.h"
@@ -14,17 +14,17 @@
 
 namespace vyra {
 
-// Passes the times of one queue's commands to EvaluatorSettings::traceCommand. The queue was
-// created with CL_QUEUE_PROFILING_ENABLE and is in order. One thread at a time uses an object.
+// A record of one queue's commands, whose times it passes to EvaluatorSettings::traceCommand. The
+// queue is in order and has CL_QUEUE_PROFILING_ENABLE. One object is used by one thread at a time.
 class CommandTimeline {
 public:
-    // Borrows the queue and the settings, which have both functions.
+    // Borrows the queue and the settings, both of whose trace functions are set.
     CommandTimeline(const OpenCLFunctions& cl, cl_command_queue queue, std::string track,
                     const EvaluatorSettings& settings);
 
-    // Adds a command, unless there is no memory for it. `name` is borrowed until record().
+    // Adds a command; out of memory, the command is left out. `name` is borrowed until record().
     void add(const char* name, const AutoCLObject<cl_event>& event);
-    // Waits for the commands that were added, and passes on their times.
+    // Waits for the commands that were added, and passes their times to the settings' function.
     void record();
 
 private:

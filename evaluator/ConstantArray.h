@@ -1,4 +1,4 @@
-// Numbers that kernels read and that do not change from evaluation to evaluation.
+// Constant data of kernels.
 #pragma once
 
 #include "evaluator/EvaluatorExport.h"
@@ -13,14 +13,14 @@ namespace vyra {
 
 class ConstantStorage; // host bytes and device memory, internal
 
-// An immutable array on the host, and, from its first use in an evaluation on, on the device.
+// An immutable array on the host and, after its first use in an evaluation, on the device.
 //
 // Copies share host and device memory, so deformers of many meshes can read one array. To change
-// the numbers, assign a new array: it is uploaded in the next evaluation. Safe to copy from any
+// the values, assign a new array: it is uploaded in the next evaluation. Safe to copy from any
 // thread; one object is assigned by one thread at a time.
 class VYRA_EVALUATOR_API ConstantArray {
 public:
-    // An empty array.
+    // Constructs an empty array.
     ConstantArray() = default;
 
     template <typename T>
@@ -32,7 +32,7 @@ public:
 
     std::size_t sizeInBytes() const;
 
-    // The elements. `T` is the type that the array was built from.
+    // Returns the elements. `T` is the element type of the vector passed to the constructor.
     template <typename T>
     std::span<const T> values() const
     {
@@ -40,7 +40,7 @@ public:
     }
 
     // Internal: the storage that copies share; null for an empty array.
-    const std::shared_ptr<ConstantStorage>& storage() const { return fStorage; }
+    const std::shared_ptr<ConstantStorage>& storage() const noexcept { return fStorage; }
 
 private:
     ConstantArray(const void* bytes, std::size_t sizeInBytes);

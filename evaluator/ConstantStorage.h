@@ -17,10 +17,10 @@ class ConstantStorage {
 public:
     ConstantStorage(const void* bytes, std::size_t sizeInBytes);
 
-    const std::vector<std::byte>& bytes() const { return fBytes; }
+    const std::vector<std::byte>& bytes() const noexcept { return fBytes; }
 
-    // The device memory, which the first successful call creates with the bytes in it. Null on
-    // failure, with the status in `status`. Safe from any thread.
+    // Returns the device memory; the first successful call creates it with the bytes as contents.
+    // On failure returns null. `status` receives the status. Safe from any thread.
     cl_mem memory(cl_int& status);
 
 private:

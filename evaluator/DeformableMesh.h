@@ -15,8 +15,8 @@ namespace vyra {
 
 struct MeshState; // device data and shared buffers, internal
 
-// A mesh in its rest pose, the deformers that it goes through in order, and the vertex buffers that
-// receive the result. Made by Evaluator::createMesh and owned by the evaluator.
+// A mesh in its rest pose, its chain of deformers, and the vertex buffers that receive the result.
+// Created by Evaluator::createMesh and owned by the evaluator.
 //
 // Used on the renderer's thread between evaluations.
 class VYRA_EVALUATOR_API DeformableMesh {
@@ -25,7 +25,7 @@ public:
     DeformableMesh(const DeformableMesh&) = delete;
     DeformableMesh& operator=(const DeformableMesh&) = delete;
 
-    // Appends a deformer to the chain, made from `arguments`. The mesh owns it.
+    // Appends a deformer to the chain, constructed from `arguments`. The mesh owns it.
     template <typename T, typename... Arguments>
     T& add(Arguments&&... arguments)
     {
@@ -36,21 +36,21 @@ public:
     }
     void add(std::unique_ptr<Deformer> deformer);
 
-    const std::vector<std::unique_ptr<Deformer>>& deformers() const { return fDeformers; }
-    const MeshGeometry& geometry() const { return *fGeometry; }
+    const std::vector<std::unique_ptr<Deformer>>& deformers() const noexcept { return fDeformers; }
+    const MeshGeometry& geometry() const noexcept { return *fGeometry; }
 
-    // Whether kernels deform the mesh. False if it has fewer vertices than
+    // Returns whether kernels deform the mesh: false if it has fewer vertices than
     // TopenCLInfo::minimumBufferSize, and without OpenCL.
     bool usesOpenCL() const;
-    // The result of the last evaluation of this mesh, or of Evaluator::prepare. A mesh that failed
-    // keeps its last good shape.
+    // Returns the status of the last evaluation of this mesh, or of Evaluator::prepare. A mesh that
+    // failed keeps its last good shape.
     const Status& status() const;
 
-    // The rest pose after all enabled deformers, computed on the CPU.
+    // Returns the rest pose after all enabled deformers, computed on the CPU.
     Surface deformOnCpu() const;
 
     // Internal.
-    MeshState& state() const { return *fState; }
+    MeshState& state() const noexcept { return *fState; }
 
 private:
     friend class Evaluator;

@@ -49,7 +49,7 @@ DeformationQueue::~DeformationQueue()
 {
     if (!fQueue)
         return;
-    // The memory of the pool is released with this object, so nothing may use it any more.
+    // The destructor releases the memory of the pool, so no command may still use it.
     finish();
     fCL.clReleaseCommandQueue(fQueue);
 }
@@ -67,7 +67,7 @@ void DeformationQueue::recordTrace()
 
 void DeformationQueue::addMesh(DeformableMesh& mesh)
 {
-    fAcquiredAlone.reserve(2 * (fMeshes.size() + 1)); // recording an acquire must not fail
+    fAcquiredUnbatched.reserve(2 * (fMeshes.size() + 1)); // recording an acquire must not fail
     fMeshes.push_back(&mesh);
     mesh.state().queue = this;
 }
@@ -85,18 +85,18 @@ std::size_t DeformationQueue::vertexCount() const
     return count;
 }
 
-void DeformationQueue::begin(cl_event releasedAlone)
+void DeformationQueue::begin(cl_event unbatchedReleased)
 {
     if (fLast.get())
         fFormerLast = std::move(fLast);
     fLast.reset();
     if (!fRetired.empty() && TopenCLInfo::IsEventComplete(fFormerLast.get()))
         fRetired.clear();
-    fAcquiredAlone.clear();
-    fReleasedAlone = releasedAlone;
+    fAcquiredUnbatched.clear();
+    fUnbatchedReleased = unbatchedReleased;
 }
 
-// Collects passes, arguments and numbers of all meshes, and uploads the numbers.
+// Collects passes, arguments and frame data of all meshes, and uploads the frame data.
 void DeformationQueue::collect(KernelLibrary& library, unsigned leastPasses)
 {
     fFrame.begin();
@@ -115,7 +115,7 @@ void DeformationQueue::deform(KernelLibrary& library)
         // The next mesh may reuse the memory, since its commands run later.
         fPool.releaseBuffers();
     }
-    // Others wait for the last event; without a flush they could wait forever.
+    // Other queues and the host wait for the last event; without a flush they might wait forever.
     if (fLast.get())
         fCL.clFlush(fQueue);
 }
@@ -136,8 +136,8 @@ Status DeformationQueue::collectMesh(DeformableMesh& mesh, KernelLibrary& librar
     return {};
 }
 
-// Creates the kernels of at least `leastPasses` passes of a deformer, also of one whose present
-// settings need none.
+// Creates the kernels of at least `leastPasses` passes of a deformer, even if its present settings
+// need none.
 Status DeformationQueue::collectPasses(DeformableMesh& mesh, std::size_t index,
                                        KernelLibrary& library, unsigned leastPasses)
 {
@@ -172,8 +172,8 @@ Status DeformationQueue::enqueueMesh(DeformableMesh& mesh)
     return status;
 }
 
-// Only the last pass waits for the acquired vertex buffers: those before may run while the renderer
-// still draws.
+// Only the last pass waits for the acquired vertex buffers: earlier passes may run while the
+// renderer still draws.
 Status DeformationQueue::enqueuePasses(DeformableMesh& mesh)
 {
     VertexMemory input = mesh.state().restMemory;
@@ -196,7 +196,7 @@ Status DeformationQueue::enqueuePass(DeformableMesh& mesh, std::size_t index, Ve
     const std::size_t vertexCount = mesh.geometry().rest.vertexCount();
     const bool inputIsScratch = index > 0;
     if (pass->usesFrame() && fUpload != CL_SUCCESS)
-        return failureOf(fUpload, "uploading the numbers of the evaluation");
+        return failureOf(fUpload, "uploading the frame data");
     VertexMemory output;
     Status status;
     if (index + 1 == state.active.size()) {
@@ -251,7 +251,7 @@ Status DeformationQueue::acquireTarget(const DeformableMesh& mesh)
     if (status.ok())
         status = acquire(*mesh.state().normals, fAcquiredNormals);
     fWaits.add(fAcquiredPositions);
-    if (fAcquiredNormals.get() != fAcquiredPositions.get()) // those of the batch have one event
+    if (fAcquiredNormals.get() != fAcquiredPositions.get()) // buffers of the batch share one event
         fWaits.add(fAcquiredNormals);
     return status;
 }
@@ -266,26 +266,27 @@ Status DeformationQueue::acquire(const TopenCLSharedBuffer& buffer,
         // The acquire of the batch failed when the evaluation was opened.
         status = acquired.get() ? CL_SUCCESS : CL_INVALID_EVENT;
     } else {
-        status = acquireAlone(buffer, acquired);
+        status = acquireUnbatched(buffer, acquired);
     }
     return failureOf(status, "acquiring a vertex buffer");
 }
 
 // The last release was enqueued on another queue, and the manager makes no acquire wait for it.
-cl_int DeformationQueue::acquireAlone(const TopenCLSharedBuffer& buffer,
-                                      AutoCLObject<cl_event>& acquired)
+cl_int DeformationQueue::acquireUnbatched(const TopenCLSharedBuffer& buffer,
+                                          AutoCLObject<cl_event>& acquired)
 {
-    if (fReleasedAlone) {
-        const cl_int status = fCL.clEnqueueMarkerWithWaitList(fQueue, 1, &fReleasedAlone, nullptr);
+    if (fUnbatchedReleased) {
+        const cl_int status =
+            fCL.clEnqueueMarkerWithWaitList(fQueue, 1, &fUnbatchedReleased, nullptr);
         if (status != CL_SUCCESS)
             return status;
-        fReleasedAlone = nullptr;
+        fUnbatchedReleased = nullptr;
     }
     const cl_int status = TopenCLInfo::theOne().sharedBufferMgr().EnqueueAcquireSharedCLBuffer(
         fQueue, &buffer, acquired.receive());
     if (status != CL_SUCCESS)
         return status;
-    fAcquiredAlone.push_back(buffer.fMem.get()); // has capacity
+    fAcquiredUnbatched.push_back(buffer.fMem.get()); // has capacity
     AutoCLObject<cl_event> enqueued = acquired;
     noteCommand("Acquire", enqueued);
     return CL_SUCCESS;
@@ -310,7 +311,7 @@ cl_mem DeformationQueue::createScratchArray(std::size_t vertexCount)
     return memory;
 }
 
-// The last command that was enqueued covers all before it.
+// The event of the last command covers all commands before it.
 void DeformationQueue::noteCommand(const char* name, AutoCLObject<cl_event>& enqueued)
 {
     if (!enqueued.get())

@@ -25,17 +25,18 @@ struct TopenCLSharedBuffer;
 
 namespace vyra {
 
-// An in-order queue of its own, with a pool for what passes between deformers.
+// An in-order command queue, and a pool of memory for the results between two deformers.
 //
-// A mesh stays on its queue. Commands of one queue run in the order of enqueuing, so memory of the
-// pool and the numbers of an evaluation may be overwritten by later commands without waiting, and
-// the event of the last command covers all before it. One thread at a time uses an object.
+// A mesh stays on its queue. Commands of one queue run in the order of enqueuing, so later
+// commands may overwrite memory of the pool and the frame data without waiting, and the event of
+// the last command covers all commands before it. One object is used by one thread at a time.
 class DeformationQueue {
 public:
-    // Null if the queue cannot be created, with the reason in `status`. Borrows the settings.
-    static std::unique_ptr<DeformationQueue> create(const OpenCLFunctions& cl, std::size_t number,
-                                                    const EvaluatorSettings& settings,
-                                                    Status& status);
+    // Creates a queue. Returns null on failure, with the reason in `status`. Borrows the settings.
+    [[nodiscard]] static std::unique_ptr<DeformationQueue> create(const OpenCLFunctions& cl,
+                                                                  std::size_t number,
+                                                                  const EvaluatorSettings& settings,
+                                                                  Status& status);
     // Waits for all commands.
     ~DeformationQueue();
     DeformationQueue(const DeformationQueue&) = delete;
@@ -44,30 +45,30 @@ public:
     void addMesh(DeformableMesh& mesh);
     void removeMesh(DeformableMesh& mesh);
     bool hasMeshes() const { return !fMeshes.empty(); }
-    // Of all meshes.
+    // Returns the number of vertices of all meshes.
     std::size_t vertexCount() const;
 
-    // Starts an evaluation. `releasedAlone` is the event of the last release of buffers outside the
-    // batch, or null; it is borrowed until deform() returns.
-    void begin(cl_event releasedAlone);
-    // Creates the kernels of the enabled deformers that are missing or were replaced, also those
-    // that the present settings do not need, sets the arguments that changed and uploads the
-    // numbers of all meshes. Failures are in the statuses of the meshes. Never throws.
+    // Starts an evaluation. `unbatchedReleased` is the event of the last release of buffers outside
+    // the batch, or null; it is borrowed until deform() returns.
+    void begin(cl_event unbatchedReleased);
+    // Creates the kernels of the enabled deformers that are missing or were replaced (also those
+    // that the present settings do not need), sets the arguments that changed and uploads the frame
+    // data of all meshes. Failures are in the statuses of the meshes. Never throws.
     void prepare(KernelLibrary& library) { collect(library, 1); }
-    // The same for the kernels that are needed, which it enqueues and submits. Once after begin();
-    // never throws.
+    // Does the same for the kernels that are needed, then enqueues and submits them. Called once
+    // after begin(). Never throws.
     void deform(KernelLibrary& library);
-    // The event of the last command since begin(); empty if there was none.
-    const AutoCLObject<cl_event>& lastEvent() const { return fLast; }
-    // Memory that deform() acquired outside the batch, and that is to be released after
+    // Returns the event of the last command since begin(); empty if there was none.
+    const AutoCLObject<cl_event>& lastEvent() const noexcept { return fLast; }
+    // Returns the memory that deform() acquired outside the batch. The caller releases it after
     // lastEvent().
-    const std::vector<cl_mem>& acquiredAlone() const { return fAcquiredAlone; }
+    const std::vector<cl_mem>& acquiredUnbatched() const noexcept { return fAcquiredUnbatched; }
     // Waits for all commands.
     void finish();
     void recordTrace();
 
-    std::size_t buffersCreated() const { return fSeen.size(); }
-    std::size_t buffersReused() const { return fReused; }
+    std::size_t buffersCreated() const noexcept { return fSeen.size(); }
+    std::size_t buffersReused() const noexcept { return fReused; }
 
 private:
     explicit DeformationQueue(const OpenCLFunctions& cl) : fCL(cl) {}
@@ -83,7 +84,7 @@ private:
     Status enqueueRestPose(DeformableMesh& mesh);
     Status acquireTarget(const DeformableMesh& mesh);
     Status acquire(const TopenCLSharedBuffer& buffer, AutoCLObject<cl_event>& acquired);
-    cl_int acquireAlone(const TopenCLSharedBuffer& buffer, AutoCLObject<cl_event>& acquired);
+    cl_int acquireUnbatched(const TopenCLSharedBuffer& buffer, AutoCLObject<cl_event>& acquired);
     Status createScratch(std::size_t vertexCount, VertexMemory& scratch);
     cl_mem createScratchArray(std::size_t vertexCount);
     void noteCommand(const char* name, AutoCLObject<cl_event>& enqueued);
@@ -92,14 +93,14 @@ private:
     cl_command_queue fQueue = nullptr; // owned
     TopenCLDataBufferPool fPool;
     FrameBlock fFrame;
-    cl_int fUpload = CL_SUCCESS;                // of the numbers of this evaluation
+    cl_int fUpload = CL_SUCCESS;                // status of the upload of the frame data
     std::unique_ptr<CommandTimeline> fTimeline; // null: nothing is traced
     std::vector<DeformableMesh*> fMeshes;
     AutoCLObject<cl_event> fLast;
-    AutoCLObject<cl_event> fFormerLast; // of the last evaluation before that enqueued anything
+    AutoCLObject<cl_event> fFormerLast; // of the last earlier evaluation that enqueued a command
     RetiredMemory fRetired;             // released after fFormerLast
-    std::vector<cl_mem> fAcquiredAlone;
-    cl_event fReleasedAlone = nullptr; // an acquire outside the batch comes after it
+    std::vector<cl_mem> fAcquiredUnbatched;
+    cl_event fUnbatchedReleased = nullptr; // an acquire outside the batch comes after it
     // Of the mesh whose target was acquired last.
     AutoCLObject<cl_event> fAcquiredPositions;
     AutoCLObject<cl_event> fAcquiredNormals;

@@ -67,18 +67,19 @@ public:
     // The evaluator skips a deformer that is not enabled.
     bool enabled = true;
 
-    // The name in messages, traces and option texts, such as "wave".
+    // Returns the name in messages, traces and option texts, such as "wave".
     virtual const char* name() const = 0;
 
-    // Why the settings do not fit the mesh, such as a bone index out of range. Called before each
-    // evaluation, so it only compares sizes; checks of whole arrays belong in constructors.
-    virtual std::string mismatch(const MeshGeometry& geometry) const;
+    // Returns why the settings do not fit the mesh, such as a bone index out of range. Called
+    // before each evaluation, so it only compares sizes; checks of whole arrays belong in
+    // constructors.
+    [[nodiscard]] virtual std::string mismatch(const MeshGeometry& geometry) const;
 
-    // The number of kernels that run one after another; 0 if the present settings leave the
-    // mesh as it is.
+    // Returns the number of kernels that run one after another; 0 if the present settings do not
+    // change the mesh.
     virtual unsigned passCount() const;
     virtual KernelSource kernel(unsigned pass) const = 0;
-    // Whether a pass reads other vertices than its own. It then never runs in place.
+    // Returns whether a pass reads other vertices than its own. It then never runs in place.
     virtual bool readsNeighbours() const;
     // Adds the arguments of a pass. Called in each evaluation.
     virtual void setArguments(unsigned pass, KernelArguments& arguments) = 0;
@@ -87,13 +88,13 @@ public:
     // meshes and machines without OpenCL. All passes; computes in double precision.
     virtual void deform(const MeshGeometry& geometry, Surface& surface) const = 0;
 
-    // The settings that can be listed and set by name. The pointers stay valid as long as the
-    // deformer.
+    // Returns the settings that can be listed and set by name. The pointers are valid as long as
+    // the deformer.
     virtual std::vector<DeformerParameter> parameters();
 };
 
-// Sets one parameter from text. Returns an empty text, or a sentence that says what is wrong and
-// which names or values there are.
+// Sets one parameter from text. Returns an empty text, or a sentence that describes the error and
+// lists the names or values that are accepted.
 VYRA_EVALUATOR_API std::string setParameter(Deformer& deformer, std::string_view name,
                                             std::string_view value);
 

@@ -19,8 +19,8 @@ namespace vyra {
 
 class EvaluatorImplementation; // internal
 
-// What the evaluator asks of its host. The functions are called on the thread that evaluates, with
-// the renderer's context current.
+// The functions and directories that the host supplies. The functions are called on the thread that
+// evaluates, with the renderer's context current.
 struct EvaluatorSettings {
     // Waits until the renderer's commands are complete: glFinish. Needed with OpenGL.
     std::function<void()> finishRenderer;
@@ -34,14 +34,14 @@ struct EvaluatorSettings {
     std::vector<std::string> kernelDirectories;
 
     // Receives when the device ran each command, in nanoseconds of `traceClock`; both optional.
-    // The queues record times only if the host's profiler samples when the evaluator is built.
+    // The queues record times only if the host's profiler samples when the evaluator is created.
     std::function<void(const std::string& track, const char* name, std::int64_t begin,
                        std::int64_t end)>
         traceCommand;
     std::function<std::int64_t()> traceClock;
 };
 
-// Since the evaluator was built.
+// Counts since the evaluator was constructed.
 struct EvaluatorCounts {
     std::size_t evaluations = 0;
     std::size_t acquires = 0; // commands
@@ -57,9 +57,9 @@ struct EvaluatorCounts {
 //     evaluate(id), waitUntilDrawable(), ... draw ..., renderingComplete()
 //
 // A failing mesh does not stop the others: it keeps its last good shape, and its status names the
-// reason. Whatever was acquired is released, and nothing throws for an OpenCL failure.
+// reason. Every acquired buffer is released, and nothing throws for an OpenCL failure.
 //
-// Built after TopenCLInfo::initialize; without OpenCL every mesh is deformed on the CPU. All
+// Constructed after TopenCLInfo::initialize; without OpenCL every mesh is deformed on the CPU. All
 // functions are called on the renderer's thread with its context current; kernels are enqueued by
 // worker threads. The destructor waits for OpenCL and destroys all meshes, so it runs before the
 // renderer deletes its vertex buffers.
@@ -71,12 +71,12 @@ public:
     Evaluator(const Evaluator&) = delete;
     Evaluator& operator=(const Evaluator&) = delete;
 
-    // Adds a mesh. The buffers hold the rest pose, or whatever is to be drawn until the first
-    // evaluation. The mesh is the evaluator's; its status tells whether it can be deformed.
+    // Adds a mesh. The buffers hold the vertices to draw until the first evaluation, usually the
+    // rest pose. The evaluator owns the mesh, whose status reports whether it can be deformed.
     DeformableMesh& createMesh(std::shared_ptr<const MeshGeometry> geometry,
                                const VertexBuffers& buffers);
-    // Removes a mesh after its commands are complete. Between deform() and PostEvaluate, too.
-    // During an evaluation (in a function of the settings) it is removed when the evaluation ends.
+    // Removes a mesh after its commands are complete; allowed between deform() and PostEvaluate.
+    // During an evaluation (in a function of the settings), the mesh is removed when it ends.
     void destroyMesh(DeformableMesh& mesh);
 
     // Builds the kernels and uploads the constant data of meshes that are new or were changed;
@@ -94,28 +94,28 @@ public:
     // released. Returns status().
     const Status& deform();
 
-    // Returns when the renderer may draw what was evaluated: waits in the modes that leave this to
-    // the host.
+    // Waits until the renderer may draw the evaluated buffers, in the synchronisation modes that
+    // leave this wait to the host.
     void waitUntilDrawable();
-    // To be called after drawing.
+    // Reports that the renderer's drawing commands are issued. Called after drawing.
     void renderingComplete();
     // Waits until no enqueued command uses a vertex buffer.
     void finish();
 
-    // The first failure of the last evaluation.
+    // Returns the first failure of the last evaluation.
     const Status& status() const;
-    // False without OpenCL.
+    // Returns false if every mesh is deformed on the CPU, for lack of OpenCL.
     bool usesOpenCL() const;
 
-    // Uses `source` in the place of the kernel file `file` from the next evaluation on. If the
+    // Replaces the kernel file `file` by the text `source` from the next evaluation on. If the
     // text does not compile, or a kernel is missing or has other arguments, returns the reason with
     // the build log, and the former kernel stays in use. A file that no deformer uses is ignored.
     Status replaceKernelFile(const std::string& file, const std::string& source);
-    // The library's own kernel directory.
+    // Returns the directory of the library's own kernels.
     static std::string kernelDirectory();
 
     EvaluatorCounts counts() const;
-    // Vertex buffers that are acquired and released together.
+    // Returns the number of vertex buffers that are acquired and released together.
     std::size_t batchSize() const;
 
 private:

@@ -1,4 +1,4 @@
-// The parts behind the Evaluator. Internal.
+// The implementation of Evaluator. Internal.
 #pragma once
 
 #include "evaluator/DeformationQueue.h"
@@ -20,7 +20,7 @@
 
 namespace vyra {
 
-// The operations have the contracts of the Evaluator's.
+// The operations have the contracts of the operations of Evaluator.
 class EvaluatorImplementation {
 public:
     explicit EvaluatorImplementation(EvaluatorSettings settings);
@@ -34,13 +34,14 @@ public:
     void waitUntilDrawable();
     void renderingComplete();
     void finish();
-    const Status& status() const { return fStatus; }
+    const Status& status() const noexcept { return fStatus; }
     bool usesOpenCL() const { return !fQueues.empty(); }
     Status replaceKernelFile(const std::string& file, const std::string& source);
     EvaluatorCounts counts() const;
     std::size_t batchSize() const;
 
 private:
+    static TopenCLSharedBufferMgr& manager();
     void startOpenCL();
     Status share(DeformableMesh& mesh, const VertexBuffers& buffers);
     Status shareBuffer(std::uint32_t name, void* d3d11Buffer, std::size_t bytes, const char* what,
@@ -50,10 +51,10 @@ private:
     void dropUnusedRestPoses();
     void destroy(DeformableMesh& mesh);
 
-    bool mayDeform();
+    [[nodiscard]] bool mayDeform();
     void refuse(const char* reason, cl_int status = CL_SUCCESS);
     void evaluateWithOpenCL(const em::Id& id);
-    const TopenCLSharedBuffer* findWitness() const;
+    const TopenCLSharedBuffer* findProbe() const;
     void deformMeshes();
     void resetStatuses();
     void deformAll();
@@ -62,9 +63,9 @@ private:
     static Status deformOnCpu(const DeformableMesh& mesh, const Deformer& deformer,
                               Surface& surface);
     void reportLastEvents();
-    void releaseAlone();
+    void releaseUnbatched();
     void releaseLeftOver();
-    void enqueueReleaseAlone();
+    void enqueueUnbatchedRelease();
     void writeCpuSurfaces();
     void collectStatus();
     void destroyRemovedMeshes();
@@ -77,7 +78,7 @@ private:
     const OpenCLFunctions* fCL = nullptr; // null without OpenCL
     Status fStatus;
     Status fFailure;     // of the evaluation that runs
-    Status fStartStatus; // why there is no OpenCL although the library runs
+    Status fStartStatus; // why OpenCL is off although the library runs
     tbb::task_arena fArena;
     std::unique_ptr<KernelLibrary> fLibrary;
     std::vector<std::unique_ptr<DeformationQueue>> fQueues;
@@ -89,19 +90,19 @@ private:
     };
     std::unordered_map<const MeshGeometry*, SharedRestPose> fRestPoses;
     std::vector<std::unique_ptr<DeformableMesh>> fMeshes;
-    // What one thread does in an evaluation: all meshes of a queue, or one mesh on the CPU.
+    // One task of an evaluation: all meshes of a queue, or one mesh on the CPU.
     struct Work {
         DeformationQueue* queue = nullptr;
         DeformableMesh* mesh = nullptr;
     };
     std::vector<Work> fWork; // of this evaluation
 
-    const cl_event* fBatchReleased = nullptr; // where the manager stores its last release event
-    AutoCLObject<cl_event> fReleasedAlone;    // of the last release outside the batch
-    std::vector<cl_mem> fAlone;               // acquired outside the batch, to be released
-    AutoCLEventList fAloneWaits;              // of that release
-    bool fBusy = false;                       // an evaluation runs
-    bool fUnordered = false;                  // the last release failed, or gave no event
+    const cl_event* fBatchReleased = nullptr;  // where the manager stores its last release event
+    AutoCLObject<cl_event> fUnbatchedReleased; // of the last release outside the batch
+    std::vector<cl_mem> fUnbatched;            // acquired outside the batch, to be released
+    AutoCLEventList fUnbatchedWaits;           // of that release
+    bool fBusy = false;                        // an evaluation runs
+    bool fUnordered = false;                   // the last release failed, or gave no event
     EvaluatorCounts fCounts;
 };
 

@@ -12,14 +12,14 @@ namespace vyra {
 class DeformableMesh;
 class Deformer;
 
-// Success, or a status that names the operation and the OpenCL status.
+// Returns success, or a status that names the operation and the OpenCL status.
 Status failureOf(cl_int status, const char* operation);
 
-// The status of the exception that is being handled; never throws.
+// Returns a status for the exception that is being handled.
 Status currentException() noexcept;
 
-// Runs steps that return a status, and turns what they throw into a status. Deformers of the host
-// may throw anything.
+// Runs steps that return a status, and turns an exception into a status. Deformers of the host may
+// throw objects of any type.
 template <typename Steps>
 Status guarded(const Steps& steps) noexcept
 {
@@ -30,7 +30,8 @@ Status guarded(const Steps& steps) noexcept
     }
 }
 
-// Adds who failed, before the message of a failure. Without memory for it the message stays.
+// Prefixes the message of a failure with the name of the mesh or deformer. Out of memory, the
+// message stays as it is.
 Status ofMesh(const DeformableMesh& mesh, Status status) noexcept;
 Status ofDeformer(const Deformer& deformer, Status status) noexcept;
 

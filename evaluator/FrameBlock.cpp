@@ -74,7 +74,7 @@ cl_int FrameBlock::upload(cl_command_queue queue, AutoCLObject<cl_event>& event)
         fDevice.uploadDataToGPU(queue, CL_FALSE, fChangedBegin, fChangedEnd - fChangedBegin,
                                 fHost.data() + fChangedBegin, 0, nullptr);
     if (status != CL_SUCCESS) {
-        // The device does not hold what the host does: the next evaluation uploads everything.
+        // Host and device contents differ: the next evaluation uploads all bytes.
         fHost.clear();
         return status;
     }

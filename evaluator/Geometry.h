@@ -1,4 +1,4 @@
-// Vertices, matrices and meshes as the evaluator takes them.
+// The evaluator's types of vertices, matrices and meshes.
 #pragma once
 
 #include <array>

@@ -12,11 +12,11 @@
 
 namespace vyra {
 
-// Takes the arguments of one pass of a deformer, in the order in which the kernel declares them
-// after the common ones. A failure is kept by the evaluator, which then skips the mesh.
+// A receiver of the arguments of one pass of a deformer, in the order in which the kernel declares
+// them after the common ones. If setting one fails, the evaluator skips the mesh and reports it.
 class VYRA_EVALUATOR_API KernelArguments {
 public:
-    // A scalar, a vector such as cl_float4, or a struct of plain numbers.
+    // Passes a scalar, a vector such as cl_float4, or a struct of plain numbers.
     template <typename T>
     void value(const T& value)
     {
@@ -24,12 +24,12 @@ public:
         setValue(&value, sizeof(T));
     }
 
-    // A pointer to constant memory: `global const T*`. An empty array passes a null pointer.
+    // Passes a pointer to constant data: `global const T*`. An empty array passes a null pointer.
     virtual void constant(const ConstantArray& array) = 0;
 
-    // Numbers of this evaluation. The kernel declares two arguments: `global const float4*` and
-    // `uint`, the index of the first float4 of the numbers. The bytes are copied, and they are
-    // uploaded only if they changed since the last evaluation.
+    // Passes frame data, the values of this evaluation. The kernel declares two arguments:
+    // `global const float4*` and `uint`, the index of the first float4 of the data. The bytes are
+    // copied, and they are uploaded only if they changed since the last evaluation.
     template <typename T>
     void frame(std::span<const T> values)
     {

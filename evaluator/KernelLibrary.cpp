@@ -23,7 +23,7 @@ std::string buildOptions(const std::string& added)
     return added.empty() ? std::string(kKernelBuildOptions) : kKernelBuildOptions + (" " + added);
 }
 
-// Why the file cannot be a kernel file; empty if it has contents that can be read.
+// Returns why the file cannot be used as a kernel file; empty if it can be read and is not empty.
 std::string unreadable(const std::string& path)
 {
     errno = 0;
@@ -61,7 +61,8 @@ LibraryKernel KernelLibrary::create(const KernelSource& source)
     return kernel;
 }
 
-// The text that stands for the source's file, or null. The caller holds the lock.
+// Returns the text used for the source's file, or null if the file is read. The caller holds the
+// lock.
 const KernelLibrary::ProgramText* KernelLibrary::textOf(const KernelSource& source)
 {
     const std::string file(source.file);
@@ -71,7 +72,8 @@ const KernelLibrary::ProgramText* KernelLibrary::textOf(const KernelSource& sour
     return text == fTexts.end() ? nullptr : &text->second;
 }
 
-// Whether a kernel of the same file and options keeps the program. The caller holds the lock.
+// Returns whether a kernel of the same file and options keeps the program. The caller holds the
+// lock.
 bool KernelLibrary::isProgramKept(const Key& key) const
 {
     return std::any_of(fEntries.begin(), fEntries.end(), [&key](const auto& other) {

@@ -21,7 +21,7 @@
 
 namespace vyra {
 
-// A kernel for one user, with what is known about it.
+// A kernel object of one deformer pass, and its properties.
 struct LibraryKernel {
     StoreKernel kernel; // empty on failure
     cl_uint argumentCount = 0;
@@ -30,28 +30,31 @@ struct LibraryKernel {
     Status status;
 };
 
-// Finds kernel files, and creates kernels with the kernel store. Each program stays built until the
-// library is destroyed. A file that was replaced stands for its new text. Safe from any thread.
+// A source of kernels: finds kernel files, and creates kernels with the kernel store. Each program
+// stays built until the library is destroyed. A replaced file reads as its new text. Safe from any
+// thread.
 class KernelLibrary {
 public:
-    // Searches `directories` in their order. Needs the runtime object to be valid.
+    // Searches `directories` in their order. Requires TopenCLInfo::isValid.
     KernelLibrary(const OpenCLFunctions& cl, const std::vector<std::string>& directories);
     KernelLibrary(const KernelLibrary&) = delete;
     KernelLibrary& operator=(const KernelLibrary&) = delete;
 
-    // A new kernel object. A failure names the file, and carries the build log if there is one.
-    LibraryKernel create(const KernelSource& source);
-    // Reports how many arguments a deformer passes to the kernel, which a text that replaces the
-    // file is measured by.
+    // Creates a kernel object. The status of a failure names the file and has the build log, if
+    // any.
+    [[nodiscard]] LibraryKernel create(const KernelSource& source);
+    // Records the number of arguments that a deformer passes to the kernel. A text that replaces
+    // the file must have kernels with as many.
     void noteArguments(const KernelSource& source, cl_uint count);
 
     // Uses this text for `file` from now on, for kernels created afterwards. Fails, and changes
     // nothing, unless every kernel that was created from the file can be created from the text with
-    // the arguments that its deformer passes. Ignores a file that nobody asked for.
+    // the arguments that its deformer passes. Ignores a file from which no kernel was requested.
     Status replaceFile(const std::string& file, const std::string& text);
 
-    // Changes whenever a file is replaced: kernels of an older generation are to be created again.
-    unsigned generation() const { return fGeneration; }
+    // Returns a number that changes whenever a file is replaced: kernels of an older generation are
+    // out of date.
+    unsigned generation() const noexcept { return fGeneration; }
 
     std::size_t programsBuilt() const;
     std::size_t kernelsCreated() const;
@@ -68,11 +71,11 @@ private:
         std::string text;
     };
 
-    LibraryKernel build(const Key& key, const ProgramText* program);
+    [[nodiscard]] LibraryKernel build(const Key& key, const ProgramText* program);
     const ProgramText* textOf(const KernelSource& source);
     bool isProgramKept(const Key& key) const;
     Status examine(const Key& key, LibraryKernel& created) const;
-    std::optional<std::string> findFile(const std::string& file) const;
+    [[nodiscard]] std::optional<std::string> findFile(const std::string& file) const;
     std::string describeMissingFile(const std::string& file) const;
     Status failure(const Key& key, const std::string& path, const std::string& warnings) const;
 
@@ -81,8 +84,7 @@ private:
     TstringArray fIncludeDirectories;
     mutable std::mutex fMutex; // guards all that follows; the generation is read without it
     std::map<Key, Entry> fEntries;
-    std::map<std::string, ProgramText>
-        fTexts; // by file: those that replaced one, or are in no file
+    std::map<std::string, ProgramText> fTexts; // by file: texts that replaced a file or have none
     std::atomic<unsigned> fGeneration = 0;
     unsigned fReplacementCount = 0;
     std::size_t fProgramsBuilt = 0;

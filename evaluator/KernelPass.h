@@ -30,21 +30,21 @@ struct VertexMemory {
 // Memory objects that kernels no longer name, but that commands may still use.
 using RetiredMemory = std::vector<AutoCLObject<cl_mem>>;
 
-// Owns a kernel object, so that arguments that did not change are set once. One thread at a time
-// uses an object.
+// The owner of a pass's kernel object; arguments that did not change are not set again. One object
+// is used by one thread at a time.
 class KernelPass final : private KernelArguments {
 public:
-    // Borrows everything. `retired` receives the memory of arguments that were replaced.
+    // Borrows all arguments. `retired` receives the memory of arguments that were replaced.
     KernelPass(const OpenCLFunctions& cl, Deformer& deformer, unsigned pass,
                RetiredMemory& retired);
 
-    // Creates the kernel if there is none yet, if the deformer asks for another one, or if its file
-    // was replaced. A failure leaves everything as it is.
+    // Creates the kernel if there is none yet, if the deformer returns another source, or if its
+    // file was replaced. A failure changes nothing.
     Status prepare(KernelLibrary& library);
 
-    // Sets the deformer's arguments and copies its numbers of this evaluation to `frame`.
+    // Sets the deformer's arguments and copies its frame data to `frame`.
     Status setArguments(FrameBlock& frame, KernelLibrary& library);
-    // Whether the last arguments had such numbers.
+    // Returns whether the last arguments included frame data.
     bool usesFrame() const { return !fFrameArguments.empty(); }
 
     // Enqueues one work-item per vertex after `waits`. Returns an OpenCL status; `event` receives
@@ -65,7 +65,7 @@ private:
     void setValue(const void* value, std::size_t sizeInBytes) override;
     void setFrame(const void* bytes, std::size_t sizeInBytes) override;
     void constant(const ConstantArray& array) override;
-    bool set(cl_uint index, const void* value, std::size_t sizeInBytes);
+    [[nodiscard]] bool set(cl_uint index, const void* value, std::size_t sizeInBytes);
     void setMemory(cl_uint index, cl_mem memory);
     bool isCurrent(const KernelSource& source, const KernelLibrary& library) const;
 
@@ -80,7 +80,7 @@ private:
     unsigned fGeneration = 0;
     std::size_t fWorkGroupSize = 0;
     std::vector<Argument> fArguments;
-    cl_uint fNotedCount = 0; // of arguments, as the library knows it
+    cl_uint fNotedCount = 0; // the argument count last reported to the library
 
     // While the deformer's arguments are set.
     FrameBlock* fFrame = nullptr;

@@ -12,7 +12,7 @@ bool isFinite(const Vector3& v)
     return std::isfinite(v.x) && std::isfinite(v.y) && std::isfinite(v.z);
 }
 
-// "position 17 is not a finite number", or nothing.
+// Returns a text such as "position 17 is not a finite number", or an empty text.
 std::string findNonFinite(const std::vector<Vector3>& values, const char* what)
 {
     const auto found = std::find_if_not(values.begin(), values.end(), isFinite);

@@ -1,4 +1,4 @@
-// What the evaluator keeps about one mesh. Internal.
+// The evaluator's internal data of one mesh. Internal.
 #pragma once
 
 #include "evaluator/ConstantArray.h"
@@ -27,7 +27,7 @@ struct MeshState {
     Status status;        // of the last evaluation
     bool removed = false; // to be destroyed when the evaluation ends
 
-    // With OpenCL.
+    // Used with OpenCL only.
     RestPose rest;
     VertexMemory restMemory;                        // of `rest`
     const TopenCLSharedBuffer* positions = nullptr; // records of the manager
@@ -42,11 +42,11 @@ struct MeshState {
     std::vector<ActivePass> active; // in the order of this evaluation
     bool showsRestPose = false;     // the vertex buffers hold it: nothing to do without deformers
 
-    // Without OpenCL.
+    // Used without OpenCL only.
     Surface surface; // the result of the last evaluation
 };
 
-// Why a mesh of this geometry cannot be deformed; empty if it can. Looks at every vertex.
+// Returns why a mesh of this geometry cannot be deformed; empty if it can. Examines every vertex.
 std::string findProblem(const MeshGeometry& geometry);
 
 } // namespace vyra

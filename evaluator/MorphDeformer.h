@@ -27,12 +27,12 @@ public:
     MorphTargets() = default;
     explicit MorphTargets(const std::vector<MorphTarget>& targets);
 
-    std::size_t targetCount() const { return fDeltas.size(); }
-    std::size_t vertexCount() const { return fVertexCount; }
+    std::size_t targetCount() const noexcept { return fDeltas.size(); }
+    std::size_t vertexCount() const noexcept { return fVertexCount; }
     // Whether any target changes normals.
-    bool hasNormals() const { return fHasNormals; }
-    // What is wrong with the targets; empty if they can be used.
-    const std::string& problem() const { return fProblem; }
+    bool hasNormals() const noexcept { return fHasNormals; }
+    // Returns the error in the targets; empty if they can be used.
+    const std::string& problem() const noexcept { return fProblem; }
 
     // The deltas of a target, one component after the other: x of all vertices, then y, then z,
     // and, with hasNormals(), the same of the normals.
@@ -58,10 +58,10 @@ public:
     // Multiplies all weights.
     float strength = 1;
 
-    const MorphTargets& targets() const { return fTargets; }
+    const MorphTargets& targets() const noexcept { return fTargets; }
 
     const char* name() const override { return "morph"; }
-    std::string mismatch(const MeshGeometry& geometry) const override;
+    [[nodiscard]] std::string mismatch(const MeshGeometry& geometry) const override;
     unsigned passCount() const override;
     KernelSource kernel(unsigned pass) const override;
     void setArguments(unsigned pass, KernelArguments& arguments) override;

@@ -25,6 +25,6 @@ struct OpenCLFunctions {
 
 // The functions of the OpenCL library, which is opened by the first call and stays open. Null if
 // it cannot be opened or lacks one of them. Safe from any thread.
-const OpenCLFunctions* openCLFunctions();
+[[nodiscard]] const OpenCLFunctions* openCLFunctions();
 
 } // namespace vyra

@@ -16,7 +16,7 @@ TopenCLSharedBufferMgr& manager()
     return TopenCLInfo::theOne().sharedBufferMgr();
 }
 
-// With a reference of its own.
+// Returns the event with a reference of its own; empty outside the batch.
 AutoCLObject<cl_event> acquireEventOf(const TopenCLSharedBuffer& buffer)
 {
     AutoCLObject<cl_event> event;
@@ -27,12 +27,12 @@ AutoCLObject<cl_event> acquireEventOf(const TopenCLSharedBuffer& buffer)
 
 } // namespace
 
-OpenEvaluation::OpenEvaluation(const em::Id& id, const TopenCLSharedBuffer* witness) : fId(id)
+OpenEvaluation::OpenEvaluation(const em::Id& id, const TopenCLSharedBuffer* probe) : fId(id)
 {
-    if (!witness)
+    if (!probe)
         return;
     try {
-        open(*witness);
+        open(*probe);
     } catch (const std::bad_alloc&) {
         // PreEvaluate needs memory only if the evaluation is not open.
         fIsOpen = false;
@@ -40,23 +40,23 @@ OpenEvaluation::OpenEvaluation(const em::Id& id, const TopenCLSharedBuffer* witn
     }
 }
 
-// The manager does not report whether an evaluation is open, and opening one once more changes
-// nothing. That it was opened here shows in one of four things:
-//  - there is a release event, which stands from PostEvaluate to the next PreEvaluate;
-//  - a buffer joins the batch;
+// The manager does not report whether an evaluation is open, and opening an open one changes
+// nothing. It was opened here if one of these holds:
+//  - there was a release event, which exists from PostEvaluate to the next PreEvaluate;
+//  - a buffer has joined the batch;
 //  - the batch has another acquire event;
-//  - the acquire failed, and was reported.
-void OpenEvaluation::open(const TopenCLSharedBuffer& witness)
+//  - the acquire failed, and a warning was issued.
+void OpenEvaluation::open(const TopenCLSharedBuffer& probe)
 {
     const bool wasClosed = *manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr) != nullptr;
-    const bool wasInBatch = witness.fInBatch;
-    const AutoCLObject<cl_event> before = acquireEventOf(witness);
+    const bool wasInBatch = probe.fInBatch;
+    const AutoCLObject<cl_event> before = acquireEventOf(probe);
     std::optional<WarningCapture> warnings;
     if (!wasClosed && wasInBatch && !before.get())
         warnings.emplace();
     manager().PreEvaluate(fId);
-    fAcquired = acquireEventOf(witness);
-    fIsOwn = wasClosed || witness.fInBatch != wasInBatch || fAcquired.get() != before.get() ||
+    fAcquired = acquireEventOf(probe);
+    fIsOwn = wasClosed || probe.fInBatch != wasInBatch || fAcquired.get() != before.get() ||
              (warnings && !warnings->text().empty());
 }
 

@@ -1,4 +1,4 @@
-// An evaluation of the shared-buffer manager, open for a scope. Internal.
+// A scope in which an evaluation of the shared-buffer manager is open. Internal.
 #pragma once
 
 #include "diagnostics/AutoCLObject.h"
@@ -9,28 +9,28 @@
 
 namespace vyra {
 
-// Opens an evaluation and closes it again. An evaluation that the host opened with the same id
-// stays open. On the thread that evaluates.
+// An evaluation that is opened by the constructor and closed by the destructor. An evaluation that
+// the host opened with the same id stays open. Used on the thread that evaluates.
 class OpenEvaluation {
 public:
-    // `witness` is a buffer of the evaluator, preferably one outside the batch; null if there is
-    // none, and then nothing is opened. Borrows both.
-    OpenEvaluation(const em::Id& id, const TopenCLSharedBuffer* witness);
+    // `probe` is a buffer of the evaluator, preferably one outside the batch; if it is
+    // null, nothing is opened. Borrows both.
+    OpenEvaluation(const em::Id& id, const TopenCLSharedBuffer* probe);
     ~OpenEvaluation();
     OpenEvaluation(const OpenEvaluation&) = delete;
     OpenEvaluation& operator=(const OpenEvaluation&) = delete;
 
-    // False if there was no memory to open it: nothing may be deformed.
-    bool isOpen() const { return fIsOpen; }
-    // Whether the destructor closes it, and whether opening it acquired the batch.
-    bool isOwn() const { return fIsOwn; }
-    bool acquiredBatch() const { return fIsOwn && fAcquired.get(); }
+    // Returns false if opening ran out of memory: nothing may be deformed.
+    bool isOpen() const noexcept { return fIsOpen; }
+    // Return whether the destructor closes it, and whether opening it acquired the batch.
+    bool isOwn() const noexcept { return fIsOwn; }
+    bool acquiredBatch() const noexcept { return fIsOwn && fAcquired.get(); }
 
 private:
-    void open(const TopenCLSharedBuffer& witness);
+    void open(const TopenCLSharedBuffer& probe);
 
     const em::Id& fId;
-    AutoCLObject<cl_event> fAcquired; // the batch's acquire; empty if the witness is not in it
+    AutoCLObject<cl_event> fAcquired; // the batch's acquire; empty if the probe is not in it
     bool fIsOpen = true;
     bool fIsOwn = false;
 };

@@ -47,14 +47,14 @@ public:
 
     std::size_t vertexCount() const;
     // The highest index of a bone with a weight above 0; 0 without vertices.
-    std::uint32_t highestBone() const { return fHighestBone; }
-    // What is wrong with the weights; empty if they can be used.
-    const std::string& problem() const { return fProblem; }
+    std::uint32_t highestBone() const noexcept { return fHighestBone; }
+    // Returns the error in the weights; empty if they can be used.
+    const std::string& problem() const noexcept { return fProblem; }
 
     // BoneIndices and BoneWeights, one per vertex. Influences of weight 0 refer to a bone that the
     // vertex follows.
-    const ConstantArray& bones() const { return fBones; }
-    const ConstantArray& weights() const { return fWeights; }
+    const ConstantArray& bones() const noexcept { return fBones; }
+    const ConstantArray& weights() const noexcept { return fWeights; }
 
 private:
     void store(std::vector<BoneIndices>&& bones, std::vector<BoneWeights>&& weights);
@@ -79,7 +79,7 @@ private:
 // magnitudes, and t the translation: eight roundings, in any order, fused or not (N. J. Higham,
 // Accuracy and Stability of Numerical Algorithms, 2002, section 3.1). So the error grows with the
 // distance from the origin: 0.5 mm at 1 km if the bones move the mesh there from its own origin.
-// The linear part alone decides on the normals, so their error does not grow: with P the matrix of
+// Normals depend on the linear part only, so their error does not grow: with P the matrix of
 // cofactors in which all terms are positive, it is at most 15 * 2^-24 * |P n| / |cofactors n| +
 // 6 * 2^-24. That holds for matrices that scale by factors from 1e-9 to 1e9.
 class VYRA_EVALUATOR_API SkinDeformer : public Deformer {
@@ -94,10 +94,10 @@ public:
     // A Precision. Double needs a device that supports it.
     unsigned precision = kSingle;
 
-    const SkinWeights& weights() const { return fWeights; }
+    const SkinWeights& weights() const noexcept { return fWeights; }
 
     const char* name() const override { return "skin"; }
-    std::string mismatch(const MeshGeometry& geometry) const override;
+    [[nodiscard]] std::string mismatch(const MeshGeometry& geometry) const override;
     KernelSource kernel(unsigned pass) const override;
     void setArguments(unsigned pass, KernelArguments& arguments) override;
     void deform(const MeshGeometry& geometry, Surface& surface) const override;

@@ -32,7 +32,7 @@ public:
     SmoothTopology() = default;
     explicit SmoothTopology(const MeshGeometry& geometry);
 
-    // Where a vertex's elements begin and end in an array that all vertices share.
+    // The range of a vertex's elements in an array that all vertices share.
     struct Range {
         std::uint32_t begin = 0;
         std::uint32_t end = 0;
@@ -44,17 +44,17 @@ public:
     };
 
     std::size_t vertexCount() const;
-    // What is wrong with the triangles; empty if they can be used.
-    const std::string& problem() const { return fProblem; }
+    // Returns the error in the triangles; empty if they can be used.
+    const std::string& problem() const noexcept { return fProblem; }
 
     // One range per vertex in neighbours(), which holds vertex indices.
-    const ConstantArray& neighbourRanges() const { return fNeighbourRanges; }
-    const ConstantArray& neighbours() const { return fNeighbours; }
+    const ConstantArray& neighbourRanges() const noexcept { return fNeighbourRanges; }
+    const ConstantArray& neighbours() const noexcept { return fNeighbours; }
     // One range per vertex in corners(): the triangles of the vertices that share its position and
     // its rest normal. The first is the one whose plane is nearest to the mean of all; it decides
     // on which side of the triangles a normal lies.
-    const ConstantArray& cornerRanges() const { return fCornerRanges; }
-    const ConstantArray& corners() const { return fCorners; }
+    const ConstantArray& cornerRanges() const noexcept { return fCornerRanges; }
+    const ConstantArray& corners() const noexcept { return fCorners; }
 
 private:
     ConstantArray fNeighbourRanges;
@@ -82,10 +82,10 @@ public:
     float weight = 0.5f;     // from 0 to 1
     unsigned iterations = 1; // up to kMostIterations
 
-    const SmoothTopology& topology() const { return fTopology; }
+    const SmoothTopology& topology() const noexcept { return fTopology; }
 
     const char* name() const override { return "smooth"; }
-    std::string mismatch(const MeshGeometry& geometry) const override;
+    [[nodiscard]] std::string mismatch(const MeshGeometry& geometry) const override;
     // One per iteration, and one for the normals.
     unsigned passCount() const override;
     KernelSource kernel(unsigned pass) const override;

@@ -12,7 +12,7 @@ namespace vyra {
 // build log if a kernel does not compile. A plain value.
 struct [[nodiscard]] Status {
     std::string message;        // empty on success
-    cl_int openCL = CL_SUCCESS; // the OpenCL status behind the failure, if there is one
+    cl_int openCL = CL_SUCCESS; // the OpenCL status that caused the failure, if any
 
     Status() = default;
     explicit Status(std::string text, cl_int status = CL_SUCCESS)

@@ -11,8 +11,8 @@
 
 namespace vyra {
 
-// Gives the kernel back to the store of the runtime object when it goes. One thread at a time uses
-// an object.
+// An owner that returns its kernel to the store of the runtime object on destruction. One object is
+// used by one thread at a time.
 class StoreKernel {
 public:
     StoreKernel() = default;
@@ -25,11 +25,11 @@ public:
     StoreKernel(StoreKernel&& other) noexcept = default;
     StoreKernel& operator=(StoreKernel&& other) noexcept
     {
-        std::swap(fKernel, other.fKernel); // the former kernel goes with `other`
+        std::swap(fKernel, other.fKernel); // `other` destroys the former kernel
         return *this;
     }
 
-    cl_kernel get() const { return fKernel.get(); }
+    cl_kernel get() const noexcept { return fKernel.get(); }
 
 private:
     AutoCLObject<cl_kernel> fKernel;

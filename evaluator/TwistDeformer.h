@@ -19,7 +19,7 @@ public:
     MatrixRows space = kIdentityRows;
 
     const char* name() const override { return "twist"; }
-    std::string mismatch(const MeshGeometry& geometry) const override;
+    [[nodiscard]] std::string mismatch(const MeshGeometry& geometry) const override;
     unsigned passCount() const override { return angle == 0 ? 0 : 1; }
     KernelSource kernel(unsigned pass) const override;
     void setArguments(unsigned pass, KernelArguments& arguments) override;

@@ -53,7 +53,7 @@ inline double length(const Vector& v)
     return std::sqrt(dot(v, v));
 }
 
-// The vector with length 1, or `v` itself if its length is 0.
+// Returns the vector with length 1, or `v` itself if its length is 0.
 inline Vector normalised(const Vector& v)
 {
     const double size = length(v);
@@ -97,7 +97,7 @@ inline Vector transformTransposed(const Affine& m, const Vector& v)
     return v.x * m.rows[0] + v.y * m.rows[1] + v.z * m.rows[2];
 }
 
-// The cofactors of the linear part, by rows: the transposed inverse times the determinant.
+// Returns the cofactors of the linear part, by rows: the transposed inverse times the determinant.
 inline std::array<Vector, 3> cofactors(const Affine& m)
 {
     return {cross(m.rows[1], m.rows[2]), cross(m.rows[2], m.rows[0]), cross(m.rows[0], m.rows[1])};
@@ -108,7 +108,7 @@ inline double determinant(const Affine& m)
     return dot(m.rows[0], cross(m.rows[1], m.rows[2]));
 }
 
-// The inverse. The determinant is not 0.
+// Returns the inverse. The determinant must not be 0.
 inline Affine inverse(const Affine& m)
 {
     const std::array<Vector, 3> c = cofactors(m);
@@ -120,7 +120,7 @@ inline Affine inverse(const Affine& m)
     return result;
 }
 
-// Whether the transform has an inverse. False if a number is not finite.
+// Returns whether the transform has an inverse: false if a number is not finite.
 inline bool isInvertible(const Affine& m)
 {
     const double factor = 1 / determinant(m);

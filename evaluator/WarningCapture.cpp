@@ -9,11 +9,11 @@ namespace {
 
 thread_local std::string* capturedText = nullptr;
 
-std::mutex installation; // guards the two below, and who exchanges the library's sink
+std::mutex installation; // guards the two below and the library's sink
 int captures = 0;        // on all threads
 CLWarningSink hostSink = nullptr;
 
-// Waits while the sink is exchanged on another thread, so that the host's is known.
+// Returns the host's sink; waits while another thread exchanges it.
 CLWarningSink currentHostSink()
 {
     const std::scoped_lock lock(installation);
@@ -54,7 +54,7 @@ WarningCapture::~WarningCapture()
     const std::scoped_lock lock(installation);
     if (--captures > 0)
         return;
-    // A sink that the host installed meanwhile stays.
+    // A sink that the host has installed since then stays.
     const CLWarningSink installed = setCLWarningSink(hostSink);
     if (installed != forward)
         setCLWarningSink(installed);

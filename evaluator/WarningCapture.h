@@ -5,8 +5,8 @@
 
 namespace vyra {
 
-// While an object lives, warnings that are issued on its thread are collected. Every warning still
-// reaches the sink that the host installed. At most one object per thread.
+// A collection of the warnings that are issued on one thread while the object exists. The host's
+// sink still receives every warning. At most one object per thread.
 class WarningCapture {
 public:
     WarningCapture();
@@ -14,8 +14,8 @@ public:
     WarningCapture(const WarningCapture&) = delete;
     WarningCapture& operator=(const WarningCapture&) = delete;
 
-    // The warnings so far, one per line.
-    const std::string& text() const { return fText; }
+    // Returns the warnings so far, one per line.
+    const std::string& text() const noexcept { return fText; }
 
 private:
     std::string fText;

@@ -11,8 +11,8 @@ namespace vyra {
 //     p + amplitude * sin(2 pi / wavelength * p[direction] - phase) * unit vector of displacement
 //
 // which is the plane harmonic wave of textbooks; a growing phase makes it travel in the direction.
-// Displacement along the direction itself gives a wave of compression. Other directions than the
-// axes come from the space.
+// Displacement along the direction itself gives a compression wave. For directions other than the
+// axes, rotate the space.
 class VYRA_EVALUATOR_API WaveDeformer : public Deformer {
 public:
     enum Axis : unsigned { kX, kY, kZ };
@@ -26,7 +26,7 @@ public:
     MatrixRows space = kIdentityRows;
 
     const char* name() const override { return "wave"; }
-    std::string mismatch(const MeshGeometry& geometry) const override;
+    [[nodiscard]] std::string mismatch(const MeshGeometry& geometry) const override;
     unsigned passCount() const override { return amplitude == 0 ? 0 : 1; }
     KernelSource kernel(unsigned pass) const override;
     void setArguments(unsigned pass, KernelArguments& arguments) override;
