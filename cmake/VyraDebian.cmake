@@ -1,7 +1,6 @@
-# Debian packages, made by CPack: one for each component. scripts/package builds them.
+# Debian packages, created by CPack: one for each component. scripts/package builds them.
 #
-# They belong below /usr; a build that is configured for another prefix has its libraries where the
-# system does not look for them.
+# They install below /usr; the system does not find the libraries of a build with another prefix.
 set(VYRA_DEBIAN_DIR ${CMAKE_CURRENT_LIST_DIR}/debian)
 set(VYRA_DEBIAN_REVISION 1)
 set(VYRA_DEBIAN_VERSION ${PROJECT_VERSION}-${VYRA_DEBIAN_REVISION})
@@ -12,7 +11,7 @@ set(CPACK_GENERATOR DEB)
 set(CPACK_VERBATIM_VARIABLES ON)
 set(CPACK_STRIP_FILES ON)
 set(CPACK_PACKAGE_CONTACT ${VYRA_PACKAGE_MAINTAINER})
-# Each package's description brings its own first line.
+# Each package's description has its own first line.
 set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "")
 set(CPACK_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS ${CMAKE_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS})
 set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
@@ -25,7 +24,7 @@ set(CPACK_DEBIAN_COMPRESSION_TYPE xz)
 set(CPACK_DEBIAN_PACKAGE_SOURCE vyra-opencl)
 set(CPACK_DEBIAN_PACKAGE_RELEASE ${VYRA_DEBIAN_REVISION})
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
-# What a package links is looked up; our own libraries are found where they were built.
+# Dependencies come from the linked libraries; the project's own are found in the build directory.
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${CMAKE_LIBRARY_OUTPUT_DIRECTORY})
 set(CPACK_DEBIAN_PACKAGE_GENERATE_SHLIBS ON)
@@ -43,7 +42,7 @@ function(vyra_debian_package component name description)
     endif()
 endfunction()
 
-# Debian wants changelogs compressed, and the same bytes from the same text.
+# Debian requires compressed changelogs, and the same bytes from the same text.
 file(STRINGS ${VYRA_DEBIAN_DIR}/changelog newest_entry LIMIT_COUNT 1)
 if(NOT newest_entry MATCHES "\\(${VYRA_DEBIAN_VERSION}\\)")
     message(SEND_ERROR "cmake/debian/changelog has no entry for ${VYRA_DEBIAN_VERSION}")
@@ -70,7 +69,7 @@ shared buffers through one acquire and one release around each evaluation.
 This package holds the library, and a host for applications that have none of
 their own.")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_SECTION libs)
-# Opened at run time: without them the library says that OpenCL is off.
+# Opened at run time: without them the library reports that OpenCL is off.
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_RECOMMENDS "ocl-icd-libopencl1 | libopencl1")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_SUGGESTS "opencl-icd, glshare, vyra-opencl-tools")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_CONTROL_EXTRA ${VYRA_DEBIAN_DIR}/triggers)
@@ -107,9 +106,9 @@ set(CPACK_DEBIAN_GLSHARE_PACKAGE_RECOMMENDS "pocl-opencl-icd | opencl-icd, libgl
 
 vyra_debian_package(Tools vyra-opencl-tools
 "mesh deformers on the GPU through OpenCL - tools
-\"vyra-opencl-info\" tells whether vyra-opencl can use OpenCL on this machine,
-what it decided at its start and why. \"vyra-viewer\" is a host application in
-small: it deforms an animated character through the library and draws it.")
+\"vyra-opencl-info\" reports whether vyra-opencl can use OpenCL on this machine,
+what start-up decided and why. \"vyra-viewer\" is a small host application: it
+deforms an animated character through the library and draws it.")
 set(CPACK_COMPONENT_TOOLS_DEPENDS Library Evaluator)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_SECTION graphics)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_RECOMMENDS "ocl-icd-libopencl1 | libopencl1, opencl-icd")

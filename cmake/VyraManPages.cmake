@@ -1,5 +1,5 @@
-# Manual pages, from what the programs say with --help. The target `man-pages` makes them, and an
-# installation has them when it was built; help2man is needed only then.
+# Manual pages, from the programs' --help texts. The target `man-pages` builds them with help2man;
+# they are installed if that target was built.
 find_program(VYRA_HELP2MAN help2man)
 if(NOT VYRA_HELP2MAN OR NOT VYRA_GZIP)
     return()

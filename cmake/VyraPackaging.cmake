@@ -1,5 +1,5 @@
-# What lets other projects find the installed library: a CMake package, pkg-config files, and the
-# examples. Included after the rooms.
+# The CMake package and the pkg-config files, with which other projects find the installed library,
+# and the examples. Included after the project's folders.
 include(CMakePackageConfigHelpers)
 
 set(VYRA_CMAKE_PACKAGE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/VyraOpenCL)
@@ -20,7 +20,7 @@ install(FILES
     DESTINATION ${VYRA_CMAKE_PACKAGE_DIR}
     COMPONENT Development)
 
-# The files name the prefix as seen from their own folder, so that an installation can be moved.
+# The files name the prefix relative to their own folder, so that an installation can be moved.
 set(VYRA_PKG_CONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
 file(RELATIVE_PATH VYRA_PREFIX_FROM_PKG_CONFIG
     ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
@@ -48,7 +48,7 @@ install(DIRECTORY
     DESTINATION ${VYRA_EXAMPLES_DIR}
     COMPONENT Development)
 
-# The guides, without what only the source has. They need Python when they are written.
+# The guides, without the parts for readers of the source. Writing them needs Python.
 find_package(Python3 COMPONENTS Interpreter)
 if(Python3_FOUND)
     set(VYRA_GUIDES ${PROJECT_BINARY_DIR}/packaging/guides)

@@ -11,19 +11,19 @@ target_compile_options(vyra_options INTERFACE
     $<$<BOOL:${VYRA_WARNINGS_AS_ERRORS}>:-Werror>)
 # Qt's `emit` and `slots` macros break oneTBB's headers.
 target_compile_definitions(vyra_options INTERFACE QT_NO_KEYWORDS)
-# Version 1.2 of the OpenCL interface is the one the library is written against.
+# The library is written for version 1.2 of OpenCL.
 target_compile_definitions(vyra_options INTERFACE
     CL_TARGET_OPENCL_VERSION=120 CL_USE_DEPRECATED_OPENCL_1_1_APIS)
 
 set(VYRA_NO_UNDEFINED LINKER:--no-undefined)
 if(VYRA_SANITIZE)
-    # clang++ links the runtime libraries of sanitizers into programs alone.
+    # clang++ links the runtime libraries of sanitizers into programs only.
     set(VYRA_NO_UNDEFINED)
     add_compile_options(-fsanitize=${VYRA_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
     add_link_options(-fsanitize=${VYRA_SANITIZE})
 endif()
 if(VYRA_COVERAGE)
-    # Several threads count at once.
+    # Several threads update the counters at once.
     add_compile_options(--coverage -fprofile-update=atomic)
     add_link_options(--coverage)
 endif()

@@ -1,9 +1,9 @@
-"""Writes the guides as an installation has them.
+"""Writes the guides for an installation.
 
     installed_guides.py SOURCE_DIRECTORY OUTPUT_DIRECTORY
 
-Links to files that the packages install lead there; the text of other links stays, marked as "in the
-source". Lines between <!-- source only --> and <!-- end --> are left out.
+Links to installed files are adjusted; of other links only the text stays, marked "(in the source)". Lines
+between <!-- source only --> and <!-- end --> are left out.
 """
 import os
 import pathlib
@@ -56,14 +56,14 @@ def installed_path(target, source, headers):
 
 def installed(text, source, headers):
     def replaced(match):
-        image, words, target = match.groups()
+        image, label, target = match.groups()
         if re.match(r"[a-z]+:|#", target):
             return match.group()
         path, _, anchor = target.partition("#")
         place = installed_path((source / "docs" / path).resolve(), source, headers)
         if place is None:
-            return f"{words} (in the source)"
-        return f"{image}[{words}]({os.path.relpath(place, GUIDES_FOLDER)}{anchor and '#' + anchor})"
+            return f"{label} (in the source)"
+        return f"{image}[{label}]({os.path.relpath(place, GUIDES_FOLDER)}{anchor and '#' + anchor})"
 
     text = SOURCE_ONLY.sub("", text)
     text = TABLE_ROW.sub(lambda row: row.group() if row.group(1) in GUIDES else "", text)

@@ -20,7 +20,7 @@ private:
     int fEvaluations = 0;
 };
 
-// Another module: it knows the bridge and nothing of the class behind it.
+// Stands for another module, which includes the bridge but not the evaluator's class.
 bool evaluateFrame(std::uint16_t frame)
 {
     IDeformerEvaluatorBridgeAPI* evaluator = IDeformerEvaluatorBridge::getAPI();
@@ -38,7 +38,7 @@ int main()
     IDeformerEvaluatorBridge::setAPI(&evaluator);
     const bool evaluated = evaluateFrame(1) && evaluateFrame(2);
 
-    // Withdrawn before it goes: the bridge only borrows it.
+    // Withdrawn before its destruction: the bridge only borrows it.
     IDeformerEvaluatorBridge::setAPI(nullptr);
     return evaluated && evaluator.evaluations() == 2 && !evaluateFrame(3) ? 0 : 1;
 }

@@ -1,4 +1,4 @@
-// The smallest evaluator: one vertex buffer, one kernel, one evaluation, drawn from by OpenGL.
+// The smallest evaluator: one vertex buffer, one kernel, one evaluation, drawn by OpenGL.
 #include "diagnostics/CLWarningSink.h"
 #include "host/EvaluationId.h"
 #include "kernels/TopenCLKernelStore.h"
@@ -33,7 +33,7 @@ int main(int argc, char** argv)
         if (type == QtFatalMsg)
             std::fputs(kNoOpenGL, stderr), std::_Exit(1);
     });
-    // A renderer: here a hidden one. GLHost hands its OpenGL functions to the library.
+    // The renderer, here a hidden one. GLHost passes its OpenGL functions to the library.
     QGuiApplication application(argc, argv);
     qInstallMessageHandler(nullptr);
     QOffscreenSurface surface;
@@ -50,11 +50,11 @@ int main(int argc, char** argv)
     // renderer the host library chooses the platform that shares with it.
     if (!TopenCLInfo::initialize(nullptr, nativeContext(context), nullptr, false, true,
                                  chooseOpenCLPlatform(context)))
-        return std::fprintf(stderr, "OpenCL is off; the lines above say why.\n"), 1;
+        return std::fprintf(stderr, "OpenCL is off; the lines above name the reason.\n"), 1;
     TopenCLInfo& info = TopenCLInfo::theOne();
     TopenCLSharedBufferMgr& buffers = info.sharedBufferMgr();
 
-    // The renderer's vertex buffer, and the OpenCL memory object made of it.
+    // The renderer's vertex buffer, and the OpenCL memory object that shares its storage.
     std::vector<float> heights(1000, 1.0F);
     const auto bytes = static_cast<GLsizeiptr>(heights.size() * sizeof(float));
     QOpenGLExtraFunctions& gl = *context.extraFunctions();
@@ -68,7 +68,7 @@ int main(int argc, char** argv)
     AutoCLObject<cl_kernel> kernel =
         info.kernelStore().getKernelFromString(kSource, "raise.cl", nullptr, "raise", nullptr);
     if (!shared || !kernel.get())
-        return std::fprintf(stderr, "The buffer or the kernel could not be made.\n"), 1;
+        return std::fprintf(stderr, "The buffer or the kernel could not be created.\n"), 1;
 
     // One evaluation. All shared buffers are acquired at its start and released at its end.
     if (info.useGLFinish())
@@ -101,14 +101,14 @@ int main(int argc, char** argv)
     TopenCLInfo::finish(); // the simplest way to wait; hosts follow the synchronisation mode
                            // instead
 
-    // The renderer draws from its buffer; here it only looks at what has become of it.
+    // The renderer draws from its buffer; here it only reads the result.
     const void* drawn = gl.glMapBufferRange(GL_ARRAY_BUFFER, 0, bytes, GL_MAP_READ_BIT);
     const float result = drawn ? static_cast<const float*>(drawn)[heights.size() - 1] : 0.0F;
     gl.glUnmapBuffer(GL_ARRAY_BUFFER);
     std::printf("1 raised by 0.5 is %g\n", static_cast<double>(result));
     buffers.RenderingComplete();
 
-    // Shared buffers go before the OpenGL context.
+    // Shared buffers are destroyed before the OpenGL context.
     info.kernelStore().freeKernel(kernel);
     buffers.DestroySharedCLBuffer(shared);
     return result == 1.5F ? 0 : 1;

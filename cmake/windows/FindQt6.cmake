@@ -1,5 +1,5 @@
-# Stands in for Qt where there is no Qt for Windows: the headers of this machine's Qt, which the library
-# compiles against, and a Qt6OpenGL.dll with the one function that it calls.
+# A replacement for Qt if there is no Qt for Windows: the headers of this machine's Qt, which the library
+# compiles against, and a Qt6OpenGL.dll with the one function that the library calls.
 if(TARGET Qt6::OpenGL)
     set(Qt6_FOUND TRUE)
     return()
@@ -21,7 +21,7 @@ find_package_handle_standard_args(Qt6
 add_library(vyra-qt-headers INTERFACE)
 target_include_directories(vyra-qt-headers SYSTEM INTERFACE
     ${VYRA_QT_HEADERS} ${VYRA_QT_HEADERS}/QtCore ${VYRA_QT_HEADERS}/QtGui ${VYRA_QT_HEADERS}/QtOpenGL)
-# Else each object asks for a symbol of QtCore's.
+# Without this, each object refers to a symbol of QtCore.
 target_compile_definitions(vyra-qt-headers INTERFACE QT_NO_VERSION_TAGGING)
 
 add_library(vyra-qt-opengl SHARED ${CMAKE_CURRENT_LIST_DIR}/Qt6OpenGL.cpp)

@@ -1,7 +1,7 @@
-// Preloaded into Wine: the first handler of SIGQUIT stays.
+// Preloaded into Wine: keeps the first handler of SIGQUIT.
 //
-// Wine ends the threads of an exiting program by that signal. LLVM, inside PoCL, puts a handler of its own
-// in the place of Wine's, and the program then dies by the signal instead of exiting.
+// Wine ends the threads of an exiting program with that signal. LLVM, inside PoCL, replaces Wine's handler
+// by its own, and the signal then kills the program instead of letting it exit.
 #define _GNU_SOURCE
 #include <dlfcn.h>
 #include <signal.h>

@@ -1,4 +1,4 @@
-# Toolchain: as mingw.cmake, with clang in the place of g++.
+# Toolchain: as mingw.cmake, with clang instead of g++.
 set(CMAKE_SYSTEM_NAME Windows)
 set(CMAKE_SYSTEM_PROCESSOR x86_64)
 
@@ -15,7 +15,7 @@ set(CMAKE_CXX_FLAGS_INIT "-isystem ${VYRA_GCC_FOLDER}/include/c++ \
 -isystem ${VYRA_GCC_FOLDER}/include/c++/backward")
 include(${CMAKE_CURRENT_LIST_DIR}/windows.cmake)
 
-# The linker that belongs to it; g++'s own takes clang's tables of types for conflicting ones.
+# clang's linker; g++'s linker rejects clang's type information as conflicting.
 foreach(kind EXE SHARED)
     string(APPEND CMAKE_${kind}_LINKER_FLAGS_INIT " -fuse-ld=lld -L${VYRA_GCC_FOLDER} -lwinpthread")
 endforeach()

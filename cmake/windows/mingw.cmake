@@ -1,5 +1,5 @@
-# Toolchain: Windows programs from Debian, built with g++ and run under Wine. scripts/test-windows puts
-# what Debian has no Windows build of into VYRA_WINDOWS_LIBRARIES.
+# Toolchain: Windows programs from Debian, built with g++ and run under Wine. scripts/test-windows
+# builds the libraries of which Debian has no Windows build into VYRA_WINDOWS_LIBRARIES.
 set(CMAKE_SYSTEM_NAME Windows)
 set(CMAKE_SYSTEM_PROCESSOR x86_64)
 

@@ -1,2 +1,2 @@
-# DLLs are named as their programs look for them: without "lib".
+# Programs look for DLLs without the prefix "lib".
 set(CMAKE_SHARED_LIBRARY_PREFIX "")

@@ -1,22 +1,22 @@
-# What the Windows toolchains have in common.
+# The common part of the Windows toolchains.
 set(VYRA_WINDOWS_LIBRARIES ${CMAKE_CURRENT_LIST_DIR}/../../build/windows-libraries CACHE PATH
     "Where scripts/test-windows has put headers and libraries")
-# Compiler checks are projects of their own, and need it too.
+# Compiler checks are separate projects, and need it too.
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES VYRA_WINDOWS_LIBRARIES)
 cmake_path(NORMAL_PATH VYRA_WINDOWS_LIBRARIES)
 
 set(CMAKE_RC_COMPILER x86_64-w64-mingw32-windres)
-# No library of the compiler's beside the programs.
+# Programs need no DLLs of the compiler.
 set(CMAKE_EXE_LINKER_FLAGS_INIT -static)
 set(CMAKE_SHARED_LINKER_FLAGS_INIT -static)
 
-# Never the headers and libraries of the machine that builds.
+# Never use headers and libraries of the build machine.
 set(CMAKE_FIND_ROOT_PATH ${VYRA_WINDOWS_LIBRARIES} /usr/x86_64-w64-mingw32)
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
-# Qt, of which Debian has no Windows build: one from elsewhere, or what stands in for it.
+# Debian has no Windows build of Qt: use one from elsewhere, or FindQt6.cmake's replacement.
 set(VYRA_WINDOWS_QT "" CACHE PATH "Where a Qt for Windows is, and what else the viewer needs")
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES VYRA_WINDOWS_QT)
 if(VYRA_WINDOWS_QT)

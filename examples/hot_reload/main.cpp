@@ -1,5 +1,5 @@
-// Runs a kernel that may be edited meanwhile: prints the height that it computes whenever the file
-// changes, and goes on with the last good kernel if the new text does not compile.
+// Runs a kernel that may be edited while it runs: prints the height that it computes whenever the
+// file changes, and continues with the last good kernel if the new text does not compile.
 //
 //   hot-reload DIRECTORY SECONDS     DIRECTORY holds ripple.cl
 #include "evaluator/Evaluator.h"
@@ -34,7 +34,7 @@ public:
     {
         arguments.value(time);
     }
-    // The kernel is what is being developed: there is nothing to compare it with.
+    // No CPU version: the kernel is still being developed.
     void deform(const vyra::MeshGeometry& /*geometry*/, vyra::Surface& /*surface*/) const override
     {
     }
@@ -107,7 +107,7 @@ int main(int argc, char** argv)
             const vyra::Status status = evaluator.replaceKernelFile("ripple.cl", text);
             changed = status.ok();
             if (!changed)
-                std::printf("going on with the last good kernel: %s\n", status.message.c_str());
+                std::printf("continuing with the last good kernel: %s\n", status.message.c_str());
         }
         evaluator.evaluate(em::Id(frame));
         evaluator.waitUntilDrawable();
