@@ -32,8 +32,7 @@ public:
 private:
     bool callerHasContext() const;
     [[nodiscard]] GLsync fenceAndFlush(unsigned int condition, unsigned int flags) const;
-    [[nodiscard]] unsigned int waitInTurns(GLsync sync, unsigned int flags,
-                                           std::uint64_t timeoutNs);
+    unsigned int waitInTurns(GLsync sync, unsigned int flags, std::uint64_t timeoutNs);
 
     GLFunctionTable fDriver;
     void (*fFlush)() = nullptr;

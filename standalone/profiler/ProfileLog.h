@@ -51,7 +51,7 @@ public:
     void setThreadName(std::string name);
 
     // Appends an event and returns the identifier with which to end it; never 0.
-    [[nodiscard]] profiler::EventId append(ProfileEvent event);
+    profiler::EventId append(ProfileEvent event);
     // Ends an event of any thread. Ignores unknown identifiers and those from before clearAll.
     static void end(profiler::EventId id, std::int64_t endNs);
 

@@ -32,7 +32,7 @@ std::unique_ptr<SkinDeformer> skin(const MeshGeometry& geometry, float side, uns
     result->bones = {{side * 0.8f, -0.6f, 0, 1, side * 0.6f, 0.8f, 0, 2, 0, 0, 1, 3},
                      {side, 0.5f, 0, 0, 0, 1, 0, -1, 0, 0.2f, 1, 0},
                      {side * 2, 0, 0, 0, 0, 0.7f, -0.7f, 0, 0, 0.7f, 0.7f, 1}};
-    if (side == 0) // all bones take all vertices to one point, where no normal is right
+    if (side == 0) // all bones move all vertices to one point, which has no normal
         result->bones.assign(3, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3});
     result->precision = precision;
     return result;

@@ -11,8 +11,8 @@
 struct DeformerCase {
     const char* name; // letters, for test names
     std::function<std::unique_ptr<vyra::Deformer>(const vyra::MeshGeometry&)> make;
-    // Whether a point moves by its own place alone, and normals are those of the moved surface.
-    // Vertices that belong together are kProbes in a row.
+    // Whether a point's movement depends on its position only, and normals follow the moved
+    // surface. Vertices that belong together are kProbes in a row.
     bool isSmoothMap;
 };
 

@@ -27,7 +27,7 @@ constexpr std::size_t kWorkGroup = 74;
 constexpr double kHalfUnit = 0x1p-24; // of the last place of a float, relative
 const std::string kKernels = VYRA_EVALUATOR_KERNELS;
 
-// Sets the arguments of a kernel, which keeps their memory.
+// Sets the arguments of a kernel and keeps their memory.
 class Arguments final : public KernelArguments {
 public:
     Arguments(const cl::Context& context, cl::Kernel& kernel) : fContext(context), fKernel(kernel)
@@ -56,7 +56,7 @@ private:
     {
         fKernel.setArg(fIndex++, sizeInBytes, value);
     }
-    // After numbers of another deformer.
+    // Placed after frame data of another deformer.
     void setFrame(const void* bytes, std::size_t sizeInBytes) override
     {
         std::string all(3 * sizeof(cl_float4), 0x7f);
@@ -173,7 +173,7 @@ class DeformerKernel : public DeformerKernels, public testing::WithParamInterfac
 INSTANTIATE_TEST_SUITE_P(All, DeformerKernel, testing::ValuesIn(deformerCases()),
                          [](const auto& row) { return std::string(row.param.name); });
 
-TEST_P(DeformerKernel, EqualsItsCpuSide)
+TEST_P(DeformerKernel, KernelMatchesCpu)
 {
     constexpr double kBound = 2e-5;
     const MeshGeometry sheet = makeSheet(31);
@@ -238,7 +238,7 @@ std::pair<Vector, double> skinBounds(const SkinDeformer& skin, std::size_t i, co
             kHalfUnit * (15 * growth + 6)};
 }
 
-TEST_F(DeformerKernels, SkinStaysWithinItsBoundFarFromTheOrigin)
+TEST_F(DeformerKernels, SkinErrorStaysWithinBoundFarFromOrigin)
 {
     const MeshGeometry sheet = makeSheet(101);
     const auto deformer = deformerCases()[0].make(sheet);
@@ -265,14 +265,14 @@ TEST_F(DeformerKernels, SkinStaysWithinItsBoundFarFromTheOrigin)
             }
             EXPECT_LT(largest, 1);
             if (precision == SkinDeformer::kDouble)
-                EXPECT_LT(largest, 0.01); // the results are rounded alike
+                EXPECT_LT(largest, 0.01); // both results have the same rounding
             else
-                EXPECT_GT(largest, 0.05); // the bound is not idle
+                EXPECT_GT(largest, 0.05); // the bound is not too wide
         }
     }
 }
 
-TEST_F(DeformerKernels, SineAndCosineStayWithinTheirBound)
+TEST_F(DeformerKernels, SineAndCosineStayWithinBound)
 {
     constexpr double kBound = 1e-7;
     constexpr std::uint32_t kStride = 997; // in units of the last place
@@ -310,8 +310,8 @@ TEST_F(DeformerKernels, SineAndCosineStayWithinTheirBound)
     }
 }
 
-// Each once, for tools that look at the accesses of kernels.
-TEST_F(DeformerKernels, KernelsOfTestsLeavePaddingUnchanged)
+// Runs each kernel once, for tools that check memory accesses.
+TEST_F(DeformerKernels, TestKernelsLeavePaddingUnchanged)
 {
     constexpr cl_uint kCount = kWorkGroup + 1;
     for (const char* function : {"add", "scale", "sinesAndCosines"}) {

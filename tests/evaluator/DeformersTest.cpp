@@ -1,5 +1,5 @@
 // The CPU sides of skin, morph, twist and wave against closed forms and finite differences, and the
-// settings that deformers refuse.
+// settings that deformers reject.
 #include "DeformerCases.h"
 #include "evaluator/MorphDeformer.h"
 #include "evaluator/SkinDeformer.h"
@@ -70,7 +70,7 @@ std::unique_ptr<MorphDeformer> morph(const std::vector<MorphTarget>& targets,
     return result;
 }
 
-// Checks where the deformer puts the one vertex of a mesh.
+// Checks the position to which the deformer moves the one vertex of a mesh.
 void expectVertex(const char* what, const std::unique_ptr<Deformer>& deformer, const Surface& rest,
                   const Surface& expected)
 {
@@ -84,7 +84,7 @@ void expectVertex(const char* what, const std::unique_ptr<Deformer>& deformer, c
     expectNear(surface.normals[0], expected.normals[0]);
 }
 
-TEST(Deformers, VertexGoesWhereTheFormulaPutsIt)
+TEST(Deformers, DeformMovesVertexAccordingToFormula)
 {
     const Vector3 up{0, 1, 0};
     const Surface rest{{{1, 2, 3}}, {up}};
@@ -164,12 +164,12 @@ TEST(Deformers, NormalsMatchFiniteDifferencesOfTheDeformedSurface)
             near += length(normal - probedNormal(surface, first)) < 0.02 ? 1 : 0;
             EXPECT_NEAR(length(normal), 1, kTolerance);
         }
-        // Next to a fold the probe's points lie on both sides of it.
+        // Near a fold, the probe's points lie on both sides of it.
         EXPECT_GE(near, std::string(row.name) == "waveInsideOut" ? kSamples - 20 : kSamples);
     }
 }
 
-TEST(SkinWeights, HeaviestFourAreKeptAndAddUpToOne)
+TEST(SkinWeights, HeaviestFourAreKeptAndSumToOne)
 {
     const std::tuple<std::vector<SkinWeights::Influence>, SkinWeights::BoneIndices,
                      SkinWeights::BoneWeights>
@@ -200,7 +200,7 @@ TEST(SkinWeights, FourGivenWeightsAreScaledAndUnusedBonesIgnored)
     EXPECT_NEAR(weights.weights().values<float>()[1], 0.5 / 0.995, 1e-7);
 }
 
-TEST(Deformers, SettingsThatDoNotFitAreNamed)
+TEST(Deformers, MismatchNamesInvalidSettings)
 {
     using Lists = std::vector<std::vector<SkinWeights::Influence>>;
     const MatrixRows flat{1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 0, 0};
@@ -245,7 +245,7 @@ TEST(Deformers, SettingsThatDoNotFitAreNamed)
         EXPECT_THAT(deformer->mismatch(mesh), HasSubstr(text));
 }
 
-TEST(Deformers, SettingsThatChangeNothingTakeNoPass)
+TEST(Deformers, NeutralSettingsNeedNoPass)
 {
     const MeshGeometry sheet = makeSheet(3);
     SmoothDeformer smooth{SmoothTopology(sheet)};
@@ -266,7 +266,7 @@ TEST(Deformers, SettingsThatChangeNothingTakeNoPass)
     EXPECT_EQ(targets->passCount(), 0u);
 }
 
-TEST(Deformers, ParametersAreSetByName)
+TEST(Deformers, SetParameterAcceptsValuesAndRejectsOthers)
 {
     const auto turned = twist(0);
     const auto travelling = wave(0);

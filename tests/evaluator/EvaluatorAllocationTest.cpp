@@ -1,5 +1,5 @@
-// An evaluation allocates nothing once everything is built, and wherever memory runs out before,
-// nothing stays acquired, nothing is lost, and the next evaluation works.
+// A steady evaluation allocates nothing. If an earlier allocation fails, nothing stays acquired,
+// nothing leaks, and the next evaluation succeeds.
 #include "FailingAllocations.h"
 #include "ScriptedEvaluator.h"
 
@@ -30,7 +30,8 @@ protected:
             frame();
             EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
             EXPECT_EQ(runtime().acquired(), Lines{});
-            EXPECT_EQ(linesOf(leftOver(), "program"), leftOver()) << "beyond what the store keeps";
+            EXPECT_EQ(linesOf(leftOver(), "program"), leftOver())
+                << "objects other than the store's programs";
             if (HasFailure())
                 return nth;
         }
@@ -64,13 +65,13 @@ TEST_F(EvaluatorAllocationTest, SteadyStateAllocatesNothing)
     }
 }
 
-TEST_F(EvaluatorAllocationTest, FirstEvaluation)
+TEST_F(EvaluatorAllocationTest, FailedAllocationInFirstEvaluationIsReported)
 {
     startIn(1, 1);
     EXPECT_GT(failEach([this] { addTwoChains(); }, [this] { evaluate(); }), 20U);
 }
 
-TEST_F(EvaluatorAllocationTest, LaterEvaluationWithMoreNumbersPassesAndMeshes)
+TEST_F(EvaluatorAllocationTest, FailedAllocationInGrowingEvaluationIsReported)
 {
     startIn(2, 3);
     const auto prepare = [this] {
@@ -84,7 +85,7 @@ TEST_F(EvaluatorAllocationTest, LaterEvaluationWithMoreNumbersPassesAndMeshes)
     EXPECT_GT(failEach(prepare, [this] { evaluate(); }), 20U);
 }
 
-TEST_F(EvaluatorAllocationTest, EvaluationInTheHosts)
+TEST_F(EvaluatorAllocationTest, FailedAllocationInHostsEvaluationIsReported)
 {
     startIn(1, 2);
     const auto run = [this] {
@@ -100,7 +101,7 @@ TEST_F(EvaluatorAllocationTest, EvaluationInTheHosts)
     EXPECT_GT(failEach([this] { addTwoChains(); }, run), 20U);
 }
 
-TEST_F(EvaluatorAllocationTest, MeshThatCannotBeCreatedLeavesNothing)
+TEST_F(EvaluatorAllocationTest, FailedCreateMeshLeavesNothing)
 {
     startIn(1, 1);
     const auto geometry = grid(4, "geometry of a name that is not short");
@@ -116,7 +117,7 @@ TEST_F(EvaluatorAllocationTest, MeshThatCannotBeCreatedLeavesNothing)
     EXPECT_GT(failEach([] {}, create), 5U);
 }
 
-TEST_F(EvaluatorAllocationTest, MeshesOnTheCpuKeepTheirShape)
+TEST_F(EvaluatorAllocationTest, FailedAllocationKeepsShapeOfCpuMeshes)
 {
     std::size_t written = 0;
     settings.writeVertices = [&](vyra::DeformableMesh& mesh, const vyra::Surface& surface) {
@@ -132,7 +133,7 @@ TEST_F(EvaluatorAllocationTest, MeshesOnTheCpuKeepTheirShape)
     EXPECT_GT(written, 0U);
 }
 
-TEST_F(EvaluatorAllocationTest, ReplacedKernelFile)
+TEST_F(EvaluatorAllocationTest, FailedAllocationKeepsFormerKernelFile)
 {
     startIn(1, 1);
     const auto prepare = [this] {
@@ -148,7 +149,7 @@ TEST_F(EvaluatorAllocationTest, ReplacedKernelFile)
         evaluate();
     };
     EXPECT_GT(failEach(prepare, replace), 10U);
-    expectedLeft = leftOver(); // a program whose kernel found no memory stays in the store
+    expectedLeft = leftOver(); // the store keeps a program whose kernel ran out of memory
     EXPECT_LT(expectedLeft.size(), 4U);
 }
 

@@ -10,7 +10,7 @@ using testing::HasSubstr;
 
 namespace {
 
-TEST_F(EvaluatorTest, SteadyStateTakesThreeCommandsPerMeshAndNoCallForWhatIsUnchanged)
+TEST_F(EvaluatorTest, SteadyStateMakesThreeCommandsPerMesh)
 {
     startIn(1, 1);
     const std::size_t queues = runtime().created(Kind::kQueue) - 2;
@@ -43,7 +43,7 @@ TEST_F(EvaluatorTest, SteadyStateTakesThreeCommandsPerMeshAndNoCallForWhatIsUnch
     EXPECT_EQ(evaluator->batchSize(), 2 * meshes.size());
 }
 
-TEST_F(EvaluatorTest, UploadCoversTheNumbersThatChangedAndNoOthers)
+TEST_F(EvaluatorTest, UploadCoversOnlyChangedFrameData)
 {
     startIn(1, 1);
     vyra::DeformableMesh& mesh = addMesh();
@@ -60,17 +60,17 @@ TEST_F(EvaluatorTest, UploadCoversTheNumbersThatChangedAndNoOthers)
     deformer(mesh, 2).numbers[0] = 9;
     expectUpload(", 0, 0, 88");
     deformer(mesh, 1).numbers[4] = 8;
-    deformer(mesh, 0).enabled = false; // the others move to the front
+    deformer(mesh, 0).enabled = false; // the data of the others move to the front
     expectUpload(", 0, 0, 56");
     deformer(mesh, 2).numbers[4] = 7;
     runtime().plan({.function = "clEnqueueWriteBuffer"});
     evaluate();
     EXPECT_FALSE(mesh.status().ok());
-    expectUpload(", 0, 0, 56"); // all that the device may lack
+    expectUpload(", 0, 0, 56"); // all bytes whose upload may have failed
 }
 
-// What the kernels read and write, one pair of letters each: R is the rest pose, V the vertex
-// buffer, A and B are memory of the pool. `first` is 0 for positions and 1 for normals.
+// Returns what the kernels read and write, one pair of letters each: R is the rest pose, V the
+// vertex buffer, A and B are memory of the pool. `first` is 0 for positions and 1 for normals.
 std::string memoryOf(const Lines& kernelLines, std::size_t first)
 {
     std::map<std::string, char> letters;
@@ -90,7 +90,7 @@ std::string memoryOf(const Lines& kernelLines, std::size_t first)
     return text;
 }
 
-TEST_F(EvaluatorTest, DeformersRunInPlaceOnlyIfTheyReadNoNeighbours)
+TEST_F(EvaluatorTest, DeformersRunInPlaceUnlessTheyReadNeighbours)
 {
     startIn(1, 1);
     // i: may run in place, n: reads neighbours, -: not enabled, 2: two passes
@@ -121,7 +121,7 @@ TEST_F(EvaluatorTest, DeformersRunInPlaceOnlyIfTheyReadNoNeighbours)
     }
 }
 
-TEST_F(EvaluatorTest, OnlyTheLastKernelWaitsForTheAcquire)
+TEST_F(EvaluatorTest, OnlyLastKernelWaitsForAcquire)
 {
     startIn(1, 1);
     addChain().add<TestDeformer>("wave");
@@ -134,7 +134,7 @@ TEST_F(EvaluatorTest, OnlyTheLastKernelWaitsForTheAcquire)
                                      HasSubstr(", [" + event + "]) on")));
 }
 
-TEST_F(EvaluatorTest, WithoutEnabledDeformersTheRestPoseIsCopiedOnce)
+TEST_F(EvaluatorTest, WithoutEnabledDeformersRestPoseIsCopiedOnce)
 {
     startIn(1, 1);
     vyra::DeformableMesh& mesh = addMesh();
@@ -160,7 +160,7 @@ TEST_F(EvaluatorTest, WithoutEnabledDeformersTheRestPoseIsCopiedOnce)
     expect(false, 1, 0, 0);
 }
 
-TEST_F(EvaluatorTest, ConstantsAreUploadedOnceForAllMeshesThatShareThem)
+TEST_F(EvaluatorTest, SharedConstantsAreUploadedOnce)
 {
     startIn(1, 1);
     const auto geometry = grid(4, "shared");
@@ -173,7 +173,7 @@ TEST_F(EvaluatorTest, ConstantsAreUploadedOnceForAllMeshesThatShareThem)
     }
     EXPECT_TRUE(evaluator->prepare().ok());
     EXPECT_EQ(linesOf(calls(), "clCreateBuffer").size(), 3 + runtime().created(Kind::kQueue) - 2)
-        << "positions, normals, weights, and the numbers of each queue";
+        << "positions, normals, weights, and the frame data of each queue";
     Lines lines = callsOfEvaluation();
     EXPECT_EQ(countOf(lines, "clCreateBuffer"), 0U);
     deformer(*meshes[0]).weights = vyra::ConstantArray(std::vector<float>{4});
@@ -184,8 +184,8 @@ TEST_F(EvaluatorTest, ConstantsAreUploadedOnceForAllMeshesThatShareThem)
     EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
 }
 
-// Buffers outside the batch: each is acquired on its mesh's queue, all are released at once.
-TEST_F(EvaluatorTest, BuffersOutsideTheBatchAreReleasedTogetherAfterTheRenderersCommands)
+// Each is acquired on its mesh's queue; one command releases all.
+TEST_F(EvaluatorTest, UnbatchedBuffersAreReleasedTogetherAfterRendererCommands)
 {
     setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
     startIn(1, 1);
@@ -227,7 +227,7 @@ protected:
     }
 };
 
-TEST_P(EvaluatorModeTest, LeavesItsWaitsToTheEvaluator)
+TEST_P(EvaluatorModeTest, EvaluatorMakesWaitsOfMode)
 {
     settings.flushRenderer = [] { runtime().log("flushRenderer()"); };
     startIn(GetParam().graphicsToCL, GetParam().clToGraphics);
@@ -256,7 +256,7 @@ INSTANTIATE_TEST_SUITE_P(
         ModeRow{"Finish", 1, 4, "clRetainEvent", {"clFinish", "clFinish"}, {"flushRenderer"}}),
     ::testing::PrintToStringParamName());
 
-TEST_F(EvaluatorTest, QueryModeEndsAtACommandThatFailed)
+TEST_F(EvaluatorTest, QueryModeStopsPollingFailedCommand)
 {
     startIn(1, 2);
     addChain();
@@ -267,7 +267,7 @@ TEST_F(EvaluatorTest, QueryModeEndsAtACommandThatFailed)
 }
 
 // Under ThreadSanitizer a missing lock shows as a race here.
-TEST_F(EvaluatorTest, ManyMeshesOverSeveralQueuesWhileKernelsAreReplaced)
+TEST_F(EvaluatorTest, KernelsAreReplacedWhileQueuesDeform)
 {
     constexpr std::size_t kMeshes = 24;
     startIn(1, 1);
@@ -292,7 +292,7 @@ TEST_F(EvaluatorTest, ManyMeshesOverSeveralQueuesWhileKernelsAreReplaced)
     }
 }
 
-TEST_F(EvaluatorTest, TraceReceivesEachCommandOnceInTheHostsTime)
+TEST_F(EvaluatorTest, TraceReceivesEachCommandOnceInHostTime)
 {
     host().sampling = true;
     std::int64_t now = 0;

@@ -1,6 +1,6 @@
-// Every OpenCL and OpenGL call of an evaluation fails in turn, once and from there on: the meshes
-// that it concerns report it and all others are deformed, everything that was enqueued is reported
-// to the release, nothing stays acquired, and later evaluations work.
+// Makes each OpenCL and OpenGL call of an evaluation fail, once and permanently: affected meshes
+// report it and all others are deformed, every enqueued command is reported to the release, nothing
+// stays acquired, and later evaluations succeed.
 #include "ScriptedEvaluator.h"
 
 #include <algorithm>
@@ -20,8 +20,8 @@ constexpr std::size_t kMeshes = 3;
 
 enum class Start {
     kFirst,    // kernels are built and constants uploaded in the evaluation that fails
-    kSteady,   // evaluations went before
-    kRestPose, // the same, and no deformer is enabled any more
+    kSteady,   // after two evaluations
+    kRestPose, // the same, with all deformers disabled
     kInHosts   // the meshes are created, and deformed, in an evaluation that the host opened
 };
 
@@ -67,7 +67,7 @@ protected:
     tbb::global_control fOneThread{tbb::global_control::max_allowed_parallelism, 1};
 };
 
-// A new evaluator and its meshes, ready for the evaluation that will fail.
+// Creates an evaluator and its meshes, ready for the evaluation that will fail.
 void EvaluatorFaultTest::prepareSubject()
 {
     makeEvaluator();
@@ -110,7 +110,7 @@ std::size_t EvaluatorFaultTest::deformedMeshes(const Lines& lines) const
            2;
 }
 
-// How many meshes a call of a function concerns, if it alone fails.
+// Returns the number of meshes that fail if one call of the function fails.
 std::size_t failingMeshes(const std::string& function, bool batching)
 {
     constexpr std::string_view kOne =
@@ -138,7 +138,7 @@ void EvaluatorFaultTest::checkFailure(const Fault& fault, const Lines& functions
     if (fault.onwards)
         return;
     const std::string& function = functions[fault.nth - 1];
-    // Memory may be that of one mesh or of a queue, and an upload is that of a queue.
+    // Memory belongs to one mesh or to one queue, an upload to one queue.
     if (function == "clEnqueueWriteBuffer" || function == "clCreateBuffer")
         EXPECT_THAT(failed, testing::AllOf(testing::Ge(1U), testing::Lt(kMeshes)));
     else if (function == "clEnqueueMarkerWithWaitList") // of a queue, or after the release
@@ -152,8 +152,8 @@ void EvaluatorFaultTest::checkFailure(const Fault& fault, const Lines& functions
         checkReported(lines);
 }
 
-// The release waits for the last command of each queue that acquired something, and that of the
-// batch for the last of each queue.
+// Requires that the release waits for the last command of each queue that acquired buffers, and
+// that the batch's release waits for the last command of each queue.
 void EvaluatorFaultTest::checkReported(const Lines& lines)
 {
     std::map<std::string, std::string> lastEvents; // by queue
@@ -179,8 +179,8 @@ void EvaluatorFaultTest::checkReported(const Lines& lines)
     }
 }
 
-// The next evaluation works. After a failed release it is the next but one, since the runtime
-// refuses what is still acquired.
+// Requires that the next evaluation succeeds; after a failed release the second one, because the
+// runtime rejects buffers that are still acquired.
 void EvaluatorFaultTest::recover(bool releaseFailed)
 {
     for (int i = 0; i < (releaseFailed ? 2 : 1); ++i) {
@@ -190,12 +190,12 @@ void EvaluatorFaultTest::recover(bool releaseFailed)
         run();
     }
     EXPECT_EQ(runtime().acquired(), Lines{});
-    // A mesh whose creation failed stays so.
+    // A mesh whose creation failed keeps its status.
     std::size_t created = 0;
     for (const vyra::DeformableMesh* mesh : fMeshes) {
         created += mesh->status().ok() ? 1 : 0;
         EXPECT_THAT(mesh->status().message,
-                    testing::AnyOf("", HasSubstr("buffer of"), HasSubstr("rest pose has")));
+                    testing::AnyOf("", HasSubstr("buffer of"), HasSubstr("rest pose")));
     }
     if (!in(Start::kRestPose)) {
         EXPECT_EQ(deformedMeshes(calls()), created);
@@ -220,17 +220,17 @@ void EvaluatorFaultTest::runWith(const Fault& fault, const Lines& functions)
     checkFailure(fault, functions, lines);
     recover(releaseFailed);
     EXPECT_EQ(leftOver(), Lines{});
-    // The rules have a batch released though its acquire failed, and acquired again though its
-    // release did.
+    // The rules require the release of a batch whose acquire failed, and the acquire of one whose
+    // release failed.
     for (const std::string& note : runtime().takeMisuse())
         EXPECT_THAT(note, testing::AnyOf("clEnqueueReleaseGLObjects: not acquired",
                                          "clEnqueueAcquireGLObjects: already acquired"));
     warnings();
 }
 
-TEST_P(EvaluatorFaultTest, EveryCallFailsInTurn)
+TEST_P(EvaluatorFaultTest, EachFailingCallIsReportedAndRetrySucceeds)
 {
-    // The second run is like all that follow: the renderer's fence is pending.
+    // The second run equals all later ones: the renderer's fence is pending.
     Lines functions;
     for (int i = 0; i < 2; ++i) {
         prepareSubject();
@@ -248,7 +248,7 @@ TEST_P(EvaluatorFaultTest, EveryCallFailsInTurn)
         for (const bool onwards : {false, true})
             runWith({.function = "*", .nth = nth, .onwards = onwards}, functions);
         if (HasFailure())
-            break; // the others would say the same
+            break; // later faults would report the same
     }
 }
 

@@ -1,5 +1,5 @@
-// Bad input: each mesh that cannot be deformed has a status that names it and the reason, and all
-// others go on.
+// Invalid input: the status of each mesh that cannot be deformed names it and the reason; all other
+// meshes are deformed.
 #include "ScriptedEvaluator.h"
 
 #include <cmath>
@@ -12,7 +12,8 @@ using testing::StartsWith;
 
 namespace {
 
-// The bad mesh fails with the message, in prepare and in each evaluation; the good one is drawn.
+// Requires that the invalid mesh fails with the message, in prepare and in each evaluation, and
+// that the valid one is deformed.
 class EvaluatorInputTest : public EvaluatorTest {
 protected:
     void expectFailure(vyra::DeformableMesh& bad, const std::string& message)
@@ -28,7 +29,7 @@ protected:
     }
 };
 
-TEST_F(EvaluatorInputTest, MeshesThatCannotBeDeformed)
+TEST_F(EvaluatorInputTest, InvalidMeshesAreRejectedWithReason)
 {
     using Spoil = void (*)(vyra::MeshGeometry&);
     startIn(1, 1);
@@ -55,13 +56,13 @@ TEST_F(EvaluatorInputTest, MeshesThatCannotBeDeformed)
     expectFailure(none, "mesh '': it has no geometry");
 }
 
-TEST_F(EvaluatorInputTest, VertexBuffersThatCannotBeShared)
+TEST_F(EvaluatorInputTest, InvalidVertexBuffersAreRejectedWithReason)
 {
     world.sharedBytes[2] = 47;
     startIn(1, 1);
     expectFailure(addMesh(grid(4, "small")), "mesh 'small': its buffer of normals has 47 bytes, "
                                              "and the vertices need 48");
-    EXPECT_EQ(evaluator->batchSize(), 2U) << "those of the other mesh";
+    EXPECT_EQ(evaluator->batchSize(), 2U) << "the buffers of the other mesh";
     makeEvaluator();
     runtime().plan({.function = "clCreateFromGLBuffer", .status = CL_INVALID_GL_OBJECT, .nth = 2});
     expectFailure(addMesh(grid(4, "gone")),
@@ -75,7 +76,7 @@ TEST_F(EvaluatorInputTest, VertexBuffersThatCannotBeShared)
                   "(CL_OUT_OF_RESOURCES); check the OpenCL driver");
 }
 
-TEST_F(EvaluatorInputTest, DeformersThatDoNotFitOrThrow)
+TEST_F(EvaluatorInputTest, InvalidOrThrowingDeformersAreReported)
 {
     using Spoil = void (*)(TestDeformer&);
     startIn(1, 1);
@@ -96,7 +97,7 @@ TEST_F(EvaluatorInputTest, DeformersThatDoNotFitOrThrow)
     }
 }
 
-// Of the meshes that the CPU deforms.
+// Records the meshes that the CPU deforms.
 class EvaluatorOnCpuTest : public EvaluatorTest {
 protected:
     void SetUp() override
@@ -112,7 +113,7 @@ protected:
     std::function<void()> onWrite;
 };
 
-TEST_F(EvaluatorOnCpuTest, WithoutOpenCLEveryMeshIsDeformedAndFailuresAreReported)
+TEST_F(EvaluatorOnCpuTest, WithoutOpenCLMeshesAreDeformedAndFailuresReported)
 {
     world.platforms.clear();
     EXPECT_FALSE(start());
@@ -149,7 +150,7 @@ TEST_F(EvaluatorOnCpuTest, WithoutOpenCLEveryMeshIsDeformedAndFailuresAreReporte
     EXPECT_EQ(calls(), Lines{});
 }
 
-TEST_F(EvaluatorOnCpuTest, SmallMeshesAreWrittenWhileOthersUseOpenCL)
+TEST_F(EvaluatorOnCpuTest, SmallMeshesAreDeformedOnCpu)
 {
     startIn(1, 1);
     vyra::DeformableMesh& small = addMesh(kSmallest - 1);
@@ -160,8 +161,8 @@ TEST_F(EvaluatorOnCpuTest, SmallMeshesAreWrittenWhileOthersUseOpenCL)
     EXPECT_FALSE(small.usesOpenCL());
 }
 
-// In functions of the settings, which run while an evaluation is open.
-TEST_F(EvaluatorOnCpuTest, MeshesComeAndGoAndNothingIsEvaluatedInsideAnEvaluation)
+// Calls the evaluator from functions of the settings, which run during an evaluation.
+TEST_F(EvaluatorOnCpuTest, MeshesChangeAndNestedEvaluationsAreRejectedDuringEvaluation)
 {
     std::vector<vyra::DeformableMesh*> gone;
     onWrite = [&] {
@@ -197,7 +198,7 @@ TEST_F(EvaluatorOnCpuTest, MeshesComeAndGoAndNothingIsEvaluatedInsideAnEvaluatio
     EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U);
 }
 
-TEST_F(EvaluatorTest, WhatCannotBeEvaluatedIsRefusedWithoutACall)
+TEST_F(EvaluatorTest, InvalidEvaluationsAreRejectedWithoutCalls)
 {
     startIn(1, 1);
     addChain();

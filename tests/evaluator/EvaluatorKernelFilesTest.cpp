@@ -1,5 +1,5 @@
-// Kernel files: what is wrong with them is in the status of the mesh, a text that replaces one is
-// used only if it fits, and the host's warning sink receives everything all the while.
+// Kernel files: the status of the mesh reports their errors, a replacement is used only if it
+// builds with the same arguments, and the host's warning sink receives every warning.
 #include "ScriptedEvaluator.h"
 
 #include "diagnostics/CLInternalWarning.h"
@@ -27,7 +27,7 @@ protected:
         fOther = &addMesh();
         fOther->add<TestDeformer>();
     }
-    // Evaluates; the other mesh is deformed.
+    // Evaluates, and requires that the other mesh is deformed.
     std::string messageOfMesh()
     {
         evaluate();
@@ -40,7 +40,7 @@ protected:
     vyra::DeformableMesh* fOther = nullptr;
 };
 
-TEST_F(EvaluatorKernelFileTest, MissingFileIsFoundOnceItIsThere)
+TEST_F(EvaluatorKernelFileTest, MissingFileIsFoundAfterItIsCreated)
 {
     settings.kernelDirectories.insert(settings.kernelDirectories.begin(), "/nowhere");
     startWithMesh("late.cl");
@@ -57,7 +57,7 @@ TEST_F(EvaluatorKernelFileTest, MissingFileIsFoundOnceItIsThere)
     EXPECT_EQ(messageOfMesh(), "");
 }
 
-TEST_F(EvaluatorKernelFileTest, FileThatDoesNotBuildReportsItsLogAndTheFormerKernelIsNotLost)
+TEST_F(EvaluatorKernelFileTest, FailedBuildReportsLogAndKeepsFormerKernel)
 {
     startWithMesh("own.cl");
     writeKernels("own.cl", "#error");
@@ -81,7 +81,7 @@ TEST_F(EvaluatorKernelFileTest, FileThatDoesNotBuildReportsItsLogAndTheFormerKer
     warnings();
 }
 
-TEST_F(EvaluatorKernelFileTest, MissingFunctionAndOtherArgumentsAreNamed)
+TEST_F(EvaluatorKernelFileTest, StatusNamesMissingFunctionAndWrongArguments)
 {
     writeKernels("own.cl", "kernel void plain(uint count, float* p) {}");
     startWithMesh("own.cl");
@@ -92,13 +92,13 @@ TEST_F(EvaluatorKernelFileTest, MissingFunctionAndOtherArgumentsAreNamed)
     EXPECT_EQ(messageOfMesh(), "mesh 'a': deformer 'skin': the kernel file own.cl has no kernel "
                                "'full'; check the names");
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL_NAME"});
-    // The text of a watcher that saw the file change.
+    // As a file watcher does.
     EXPECT_TRUE(evaluator->replaceKernelFile("own.cl", kKernelText).ok());
     EXPECT_EQ(messageOfMesh(), "");
 }
 
-// Of a file, and of a deformer that brings its text.
-TEST_F(EvaluatorKernelFileTest, FunctionThatATextLackedIsFoundInItsReplacement)
+// For a file, and for a deformer with a source text.
+TEST_F(EvaluatorKernelFileTest, MissingFunctionIsFoundInReplacement)
 {
     writeKernels("own.cl", "nothing");
     startWithMesh("own.cl");
@@ -113,11 +113,11 @@ TEST_F(EvaluatorKernelFileTest, FunctionThatATextLackedIsFoundInItsReplacement)
     EXPECT_TRUE(evaluator->replaceKernelFile("memory.cl", kKernelText).ok());
     EXPECT_EQ(messageOfMesh(), "");
     warnings();
-    expectedLeft = leftOver(); // the store keeps what lacks the kernel
+    expectedLeft = leftOver(); // the store keeps the program that lacks the kernel
     EXPECT_THAT(expectedLeft, testing::ElementsAre(StartsWith("program#")));
 }
 
-TEST_F(EvaluatorKernelFileTest, ReplacementThatDoesNotFitChangesNothing)
+TEST_F(EvaluatorKernelFileTest, InvalidReplacementChangesNothing)
 {
     startWithMesh();
     evaluate();
@@ -142,13 +142,13 @@ TEST_F(EvaluatorKernelFileTest, ReplacementThatDoesNotFitChangesNothing)
     const Lines lines = callsOfEvaluation();
     EXPECT_EQ(countOf(lines, "clCreateKernel"), 2U);
     EXPECT_EQ(countOf(lines, "clBuildProgram"), 0U);
-    EXPECT_EQ(countOf(lines, "clSetKernelArg"), 10U) << "all of the new kernel objects";
+    EXPECT_EQ(countOf(lines, "clSetKernelArg"), 10U) << "all arguments of the new kernel objects";
     EXPECT_EQ(evaluator->counts().programsBuilt, 2U);
     EXPECT_EQ(evaluator->counts().kernelsCreated, 4U);
-    expectedLeft = {"program#4 x1"}; // the store keeps what lacks the kernel
+    expectedLeft = {"program#4 x1"}; // the store keeps the program that lacks the kernel
 }
 
-TEST_F(EvaluatorKernelFileTest, OptionsArePrograms)
+TEST_F(EvaluatorKernelFileTest, OptionsSelectSeparatePrograms)
 {
     startWithMesh();
     fDeformer->options = "-D Fast";
@@ -169,7 +169,7 @@ void receive(const char* /*text*/)
     ++received;
 }
 
-TEST_F(EvaluatorKernelFileTest, SinkThatIsReplacedDuringABuildIsNeitherLostNorCalledTwice)
+TEST_F(EvaluatorKernelFileTest, SinkReplacedDuringBuildIsKeptAndCalledOnce)
 {
     const CLWarningSink hosts = setCLWarningSink(nullptr);
     setCLWarningSink(hosts);
@@ -184,7 +184,7 @@ TEST_F(EvaluatorKernelFileTest, SinkThatIsReplacedDuringABuildIsNeitherLostNorCa
     EXPECT_EQ(warnings(), Lines{"first"});
     EXPECT_EQ(received, 1);
     EXPECT_EQ(setCLWarningSink(former), receive) << "the host's new sink stayed installed";
-    CLInternalWarning("third"); // the former sink still leads to the one before
+    CLInternalWarning("third"); // the former sink forwards to the host's
     {
         const vyra::WarningCapture capture;
         CLInternalWarning("fourth");
@@ -194,7 +194,7 @@ TEST_F(EvaluatorKernelFileTest, SinkThatIsReplacedDuringABuildIsNeitherLostNorCa
     EXPECT_EQ(setCLWarningSink(hosts), hosts);
 }
 
-TEST_F(EvaluatorKernelFileTest, CapturesOnSeveralThreadsLoseNoWarningOfTheHosts)
+TEST_F(EvaluatorKernelFileTest, ConcurrentCapturesKeepHostsWarnings)
 {
     constexpr int kThreads = 4;
     constexpr int kRounds = 2000;

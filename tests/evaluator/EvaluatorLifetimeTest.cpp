@@ -1,5 +1,5 @@
-// Who opens and closes evaluations, and what goes when: memory never dies while a command that is
-// not complete uses it, which the runtime notes as wrong use.
+// Evaluations that the host opens, and the order of destruction: the runtime reports as misuse if
+// memory is released while an incomplete command uses it.
 #include "ScriptedEvaluator.h"
 
 #include "bridge/IDeformerEvaluatorBridge.h"
@@ -13,7 +13,7 @@ const em::Id kHosts(7);
 
 class EvaluatorLifetimeTest : public EvaluatorTest {
 protected:
-    // Two meshes that have been drawn; commands stay incomplete from now on.
+    // Starts with two meshes that have been drawn. Later commands stay incomplete.
     void startWithMeshes(int clToGraphics = 1)
     {
         startIn(1, clToGraphics);
@@ -24,7 +24,7 @@ protected:
         runtime().holdCommands(true);
         calls();
     }
-    // Two evaluations within one of the host's.
+    // Evaluates twice within an evaluation of the host.
     void expectHostsStaysOpen(bool inBatch, bool acquireFails)
     {
         if (acquireFails)
@@ -42,7 +42,7 @@ protected:
         EXPECT_EQ(callsOf("clEnqueueReleaseGLObjects(queue#1").size(), inBatch ? 1U : 0U);
         if (acquireFails) {
             EXPECT_FALSE(warnings().empty());
-            runtime().takeMisuse(); // the release of what was not acquired, which the rules ask for
+            runtime().takeMisuse(); // the release after the failed acquire
         }
     }
 
@@ -50,7 +50,7 @@ protected:
     vyra::DeformableMesh* fOther = nullptr;
 };
 
-TEST_F(EvaluatorLifetimeTest, MeshDestroyedAfterAnEvaluationWaitsForItsCommands)
+TEST_F(EvaluatorLifetimeTest, DestroyMeshAfterEvaluationWaitsForCommands)
 {
     startWithMeshes();
     evaluate();
@@ -64,7 +64,7 @@ TEST_F(EvaluatorLifetimeTest, MeshDestroyedAfterAnEvaluationWaitsForItsCommands)
     EXPECT_TRUE(evaluator->status().ok());
 }
 
-TEST_F(EvaluatorLifetimeTest, MeshDestroyedInTheHostsEvaluationIsReleasedFirst)
+TEST_F(EvaluatorLifetimeTest, DestroyMeshInHostsEvaluationReleasesItFirst)
 {
     startWithMeshes();
     manager().PreEvaluate(kHosts);
@@ -76,10 +76,10 @@ TEST_F(EvaluatorLifetimeTest, MeshDestroyedInTheHostsEvaluationIsReleasedFirst)
     evaluate();
 }
 
-TEST_F(EvaluatorLifetimeTest, EvaluatorDestroyedInTheHostsEvaluation)
+TEST_F(EvaluatorLifetimeTest, DestructorInHostsEvaluationLeavesNothingAcquired)
 {
     startWithMeshes(3);
-    // Of another evaluator, so that there is something to release in the end.
+    // A second evaluator, so that the batch has buffers to release in the end.
     vyra::Evaluator second(settings);
     second.createMesh(grid(4, "z"), {.positions = 90, .normals = 91});
     manager().PreEvaluate(kHosts);
@@ -90,7 +90,7 @@ TEST_F(EvaluatorLifetimeTest, EvaluatorDestroyedInTheHostsEvaluation)
     manager().PostEvaluate(kHosts);
 }
 
-TEST_F(EvaluatorLifetimeTest, DeformTwiceInOneEvaluationWhileABufferIsOutsideTheBatch)
+TEST_F(EvaluatorLifetimeTest, DeformTwiceReleasesUnbatchedBufferEachTime)
 {
     startWithMeshes(3);
     manager().PreEvaluate(kHosts);
@@ -101,7 +101,7 @@ TEST_F(EvaluatorLifetimeTest, DeformTwiceInOneEvaluationWhileABufferIsOutsideThe
     evaluator->waitUntilDrawable();
 }
 
-TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveTheirCommands)
+TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveCommands)
 {
     startWithMeshes();
     for (int i = 0; i < 3; ++i) {
@@ -114,12 +114,12 @@ TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveTheirCommands)
     runtime().completeCommands();
     evaluate();
     evaluate();
-    // The rest pose, the weights in use, the numbers and the memory between the two deformers.
+    // The rest pose, the weights in use, the frame data and the memory between the two deformers.
     const std::size_t queues = runtime().created(Kind::kQueue) - 2;
     EXPECT_LE(countOf(runtime().balance(), "mem"), 4U + 4U + 3U + queues + 2 * queues);
 }
 
-TEST_F(EvaluatorLifetimeTest, NumbersThatNeedMoreMemoryWaitForTheKernelsThatReadTheFormer)
+TEST_F(EvaluatorLifetimeTest, GrowingFrameDataWaitsForKernelsThatReadFormerMemory)
 {
     startWithMeshes();
     for (const std::size_t count : {16U, 400U, 4U, 1000U}) {
@@ -129,7 +129,7 @@ TEST_F(EvaluatorLifetimeTest, NumbersThatNeedMoreMemoryWaitForTheKernelsThatRead
     }
 }
 
-TEST_F(EvaluatorLifetimeTest, MemoryOfAGeometryGoesWithItsLastMesh)
+TEST_F(EvaluatorLifetimeTest, GeometryMemoryIsReleasedWithLastMesh)
 {
     startIn(1, 1);
     std::shared_ptr<const vyra::MeshGeometry> geometry = grid(4, "shared");
@@ -142,7 +142,7 @@ TEST_F(EvaluatorLifetimeTest, MemoryOfAGeometryGoesWithItsLastMesh)
     EXPECT_EQ(callsOf("clReleaseMemObject").size(), 4U) << "and the rest pose";
 }
 
-// The evaluation that a host opened with the same id stays open in evaluate, and its own is closed.
+// evaluate() leaves an evaluation that the host opened with the same id open, and closes its own.
 TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpen)
 {
     startIn(1, 1);
@@ -159,7 +159,7 @@ TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpen)
             expectHostsStaysOpen(batched || round > 0, acquireFails);
         const Lines lines = callsOfEvaluation();
         EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
-        EXPECT_EQ(countOf(lines, "clEnqueueReleaseGLObjects(queue#1"), 1U) << "its own";
+        EXPECT_EQ(countOf(lines, "clEnqueueReleaseGLObjects(queue#1"), 1U) << "the evaluator's";
     }
 }
 
@@ -171,7 +171,7 @@ TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpenWithoutBatching)
     evaluator->destroyMesh(*fMesh); // its buffers are acquired after their last release
 }
 
-TEST_F(EvaluatorLifetimeTest, EvaluationWhoseAcquireFailsIsClosed)
+TEST_F(EvaluatorLifetimeTest, EvaluationIsClosedWhenAcquireFails)
 {
     startIn(1, 1);
     addChain();
@@ -190,20 +190,20 @@ TEST_F(EvaluatorLifetimeTest, EvaluationWhoseAcquireFailsIsClosed)
     }
 }
 
-TEST_F(EvaluatorLifetimeTest, BatchedBufferWithoutAnAcquireEventIsNotWritten)
+TEST_F(EvaluatorLifetimeTest, BatchedBufferWithoutAcquireEventIsNotWritten)
 {
     startWithMeshes();
     runtime().plan({.function = "clEnqueueAcquireGLObjects", .status = CL_SUCCESS});
     const Lines lines = callsOfEvaluation();
     runtime().clearFaults();
-    EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U) << "the first deformers alone";
+    EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U) << "only the first deformers";
     EXPECT_EQ(fMesh->status().openCL, CL_INVALID_EVENT);
     EXPECT_EQ(runtime().acquired(), Lines{});
     evaluate();
     EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
 }
 
-TEST_F(EvaluatorLifetimeTest, DeformIsRefusedUnlessAnEvaluationIsOpen)
+TEST_F(EvaluatorLifetimeTest, DeformWithoutOpenEvaluationIsRejected)
 {
     startWithMeshes();
     EXPECT_THAT(evaluator->deform().message, HasSubstr("no evaluation is open"));
@@ -212,7 +212,7 @@ TEST_F(EvaluatorLifetimeTest, DeformIsRefusedUnlessAnEvaluationIsOpen)
     EXPECT_TRUE(evaluator->status().ok());
 }
 
-TEST_F(EvaluatorLifetimeTest, EvaluatorWithdrawsFromTheBridgeOnlyItself)
+TEST_F(EvaluatorLifetimeTest, DestructorWithdrawsOnlyItselfFromBridge)
 {
     startIn(1, 1);
     IDeformerEvaluatorBridge::setAPI(evaluator.get());
@@ -241,7 +241,7 @@ TEST_F(EvaluatorLifetimeTest, TwoEvaluatorsShareTheBatch)
     EXPECT_TRUE(second.status().ok()) << second.status().message;
 }
 
-TEST_F(EvaluatorTest, EvaluatorWithoutAQueueDeformsOnTheCpuAndSaysWhy)
+TEST_F(EvaluatorTest, WithoutQueueMeshesAreDeformedOnCpuAndStatusNamesReason)
 {
     startIn(1, 1);
     runtime().plan({.function = "clCreateCommandQueue", .onwards = true});

@@ -1,5 +1,5 @@
-// The fixture of tests of the evaluator on the scripted runtime, and a deformer whose behaviour a
-// test sets.
+// The fixture of the evaluator's tests on the scripted runtime, and a deformer with settable
+// behaviour.
 #pragma once
 
 #include "ScriptedTest.h"
@@ -56,28 +56,28 @@ protected:
     ~EvaluatorTest() override;
     void TearDown() override;
 
-    // Starts OpenCL in these modes and builds the evaluator.
+    // Starts OpenCL in these modes and creates the evaluator.
     void startIn(int graphicsToCL, int clToGraphics);
     void makeEvaluator();
-    // A grid of two rows, named a, b, c, ..., with vertex buffers of its own.
+    // Adds a grid of two rows, named a, b, c, ..., with vertex buffers of its own.
     vyra::DeformableMesh& addMesh(unsigned vertices = kSmallest);
     vyra::DeformableMesh& addMesh(std::shared_ptr<const vyra::MeshGeometry> geometry);
-    // A chain like skin and twist: one upload of numbers, two kernels.
+    // Adds a mesh with a chain like skin and twist: one upload, two kernels.
     vyra::DeformableMesh& addChain();
     static std::shared_ptr<vyra::MeshGeometry> grid(unsigned vertices, std::string name);
 
     void evaluate() { evaluator->evaluate(em::Id(++fEvaluations)); }
-    // One drawn frame.
+    // Evaluates and draws one frame.
     void frame();
-    // The calls of one evaluation.
+    // Returns the calls of one evaluation.
     Lines callsOfEvaluation();
     static TestDeformer& deformer(const vyra::DeformableMesh& mesh, std::size_t index = 0)
     {
         return static_cast<TestDeformer&>(*mesh.deformers()[index]);
     }
 
-    // Objects beyond those of start-up, once the evaluator is gone, without what the library keeps:
-    // the event of the last batch acquire, and the renderer's fence.
+    // Destroys the evaluator and returns the objects created since start-up, except those that the
+    // library keeps: the event of the last batch acquire, and the renderer's fence.
     Lines leftOver();
     void writeKernels(const std::string& file, const std::string& text) const;
     static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
@@ -102,9 +102,9 @@ inline constexpr const char* kKernelText =
     "global const float4* numbers, const uint first, const float amount) {}\n";
 
 std::size_t countOf(const Lines& lines, const std::string& prefix);
-// The lines that begin with the prefix.
+// Returns the lines that begin with the prefix.
 Lines linesOf(Lines lines, const std::string& prefix);
-// The names in a list of a line, the last one if there are several: "[event#1, event#2]".
+// Returns the names in the last list of a line: "[event#1, event#2]".
 Lines lastListOf(const std::string& line);
 
 } // namespace scripted

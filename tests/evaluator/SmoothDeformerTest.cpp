@@ -62,7 +62,7 @@ MeshGeometry octahedron()
     return mesh;
 }
 
-// The mesh with a vertex of its own for each corner of a triangle.
+// Returns the mesh with a separate vertex for each corner of a triangle.
 MeshGeometry split(const MeshGeometry& whole)
 {
     MeshGeometry mesh;
@@ -75,7 +75,7 @@ MeshGeometry split(const MeshGeometry& whole)
 }
 
 // The four neighbours of a corner have the mean 0, so each iteration scales by 1 - weight.
-TEST(SmoothDeformer, SolidShrinksAndKeepsItsNormalsSmoothOrHard)
+TEST(SmoothDeformer, ClosedMeshShrinksAndKeepsSmoothAndHardNormals)
 {
     MeshGeometry hard = split(octahedron());
     for (std::size_t i = 0; i < hard.rest.vertexCount(); ++i) {
@@ -91,7 +91,7 @@ TEST(SmoothDeformer, SolidShrinksAndKeepsItsNormalsSmoothOrHard)
     }
 }
 
-TEST(SmoothDeformer, SpikeSinksAndBorderFollowsItself)
+TEST(SmoothDeformer, SpikeSinksAndBorderUsesBorderNeighbours)
 {
     const MeshGeometry mesh = hexagon(8);
     const Surface surface = smoothed(mesh, mesh.rest, 3);
@@ -105,7 +105,7 @@ TEST(SmoothDeformer, SpikeSinksAndBorderFollowsItself)
 }
 
 // The hexagon cut open: its centre is six vertices, each ring vertex two, all with one normal.
-TEST(SmoothDeformer, SeamDoesNotShow)
+TEST(SmoothDeformer, SeamVerticesMoveTogether)
 {
     const MeshGeometry whole = hexagon(1);
     MeshGeometry cut = split(whole);
@@ -118,10 +118,10 @@ TEST(SmoothDeformer, SeamDoesNotShow)
     }
 }
 
-TEST(SmoothDeformer, NormalsLieOnTheSideOnWhichTheyCameIn)
+TEST(SmoothDeformer, NormalsKeepTheirSide)
 {
     const MeshGeometry mesh = hexagon(2);
-    // Its first triangle looks the other way.
+    // Its first triangle faces the other way.
     MeshGeometry folded = mesh;
     folded.triangles.insert(folded.triangles.begin(), {0, 2, 1});
     for (MeshGeometry given : {mesh, folded}) {
@@ -139,7 +139,7 @@ TEST(SmoothDeformer, NormalsLieOnTheSideOnWhichTheyCameIn)
     }
 }
 
-TEST(SmoothDeformer, FaultsOfAMeshHaveADefinedResult)
+TEST(SmoothDeformer, InvalidMeshesHaveDefinedResults)
 {
     const Vector3 a{0, 0, 0};
     const Vector3 b{2, 0, 0};

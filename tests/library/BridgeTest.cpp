@@ -6,7 +6,7 @@
 
 #include <gtest/gtest.h>
 
-// Neither has data of its own.
+// Neither has data members.
 static_assert(sizeof(IDeformerEvaluatorBridgeAPI) == sizeof(void*));
 static_assert(std::is_empty_v<IDeformerEvaluatorBridge>);
 
@@ -36,7 +36,8 @@ TEST(Bridge, PublishesOneBorrowedEvaluator)
     IDeformerEvaluatorBridge::getAPI()->evaluate(em::Id(7));
     EXPECT_EQ(evaluator.lastEvaluation, 7);
 
-    // Modules of the host call by slot: those of the destructor (two in this ABI), then evaluate.
+    // Modules of the host call through the virtual table: the destructor has two slots, then
+    // evaluate.
     using Evaluate = void(IDeformerEvaluatorBridgeAPI*, const em::Id&);
     Evaluate** slots = *reinterpret_cast<Evaluate***>(IDeformerEvaluatorBridge::getAPI());
     slots[2](owned.get(), em::Id(8));

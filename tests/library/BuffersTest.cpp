@@ -12,7 +12,7 @@
 
 using Buffers = LibraryTest;
 
-TEST_F(Buffers, HoldUploadsIntoThemAndPastTheirEnd)
+TEST_F(Buffers, UploadsFitOrGrowBuffer)
 {
     const cl_command_queue queue = TopenCLInfo::theOne().openCLCommandQueue();
     TopenCLBuffer buffer(TopenCLInfo::theOne().openCLContext(), CL_MEM_READ_WRITE);

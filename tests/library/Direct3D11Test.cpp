@@ -95,7 +95,7 @@ protected:
 
 } // namespace
 
-TEST_P(Direct3D11, NumbersArriveInTheBuffers)
+TEST_P(Direct3D11, KernelResultsReachBuffers)
 {
     std::vector<Pointer<ID3D11Buffer>> buffers;
     std::vector<const TopenCLSharedBuffer*> shared;
@@ -125,7 +125,7 @@ TEST_P(Direct3D11, NumbersArriveInTheBuffers)
         EXPECT_EQ(manager().DestroySharedCLBuffer(record), CL_SUCCESS);
 }
 
-TEST_P(Direct3D11, WhatIsOnTheOtherSideOrOfAnotherDeviceIsRefused)
+TEST_P(Direct3D11, BuffersOfOtherApiOrDeviceAreRejected)
 {
     const auto function = [](const std::string& name) {
         const std::string suffix = std::string(GetParam()) == "nv" ? "NV" : "KHR";

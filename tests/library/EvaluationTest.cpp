@@ -1,5 +1,5 @@
-// Whole evaluations: the renderer writes, OpenCL deforms, the renderer reads, and the numbers are
-// right in every pair of synchronisation modes.
+// Whole evaluations: the renderer writes, OpenCL deforms, the renderer reads the expected values,
+// in every pair of synchronisation modes.
 #include "LibraryTest.h"
 
 #include "host/EvaluationId.h"
@@ -31,18 +31,18 @@ void PrintTo(const Modes& modes, std::ostream* stream)
 struct Mesh {
     unsigned glBuffer = 0;
     const TopenCLSharedBuffer* shared = nullptr;
-    bool alone = false; // outside the batch in this evaluation
+    bool unbatched = false; // outside the batch in this evaluation
     AutoCLObject<cl_kernel> add;
     AutoCLObject<cl_kernel> scale;
     std::shared_ptr<_cl_command_queue> queue;
-    AutoCLObject<cl_event> released; // of a release on its own
+    AutoCLObject<cl_event> released; // of an unbatched release
 };
 
 class Evaluation : public LibraryTest, public testing::WithParamInterface<Modes> {
 protected:
     void SetUp() override
     {
-        // Where a mode is explicit, the sharing layer must not order things by itself.
+        // If both modes are explicit, the sharing layer must not order commands itself.
         const bool implicit =
             GetParam().graphicsToCL[0] == '1' || GetParam().clToGraphics[0] == '1';
         start({{"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", GetParam().graphicsToCL},
@@ -65,7 +65,7 @@ protected:
         mesh.queue = {TopenCLInfo::theOne().createOpenCLCommandQueue(nullptr),
                       clReleaseCommandQueue};
         share(mesh);
-        mesh.alone = GetParam().forceThreading != nullptr;
+        mesh.unbatched = GetParam().forceThreading != nullptr;
     }
 
     static void share(Mesh& mesh)
@@ -76,7 +76,7 @@ protected:
         ASSERT_NE(mesh.shared, nullptr) << error;
     }
 
-    // A deformer: x -> 2 (x + 1), with its input acquired and its last event handed over.
+    // A deformer: x -> 2 (x + 1), with its input acquired and its last event reported.
     static void deform(Mesh& mesh)
     {
         AutoCLObject<cl_event> acquired;
@@ -90,7 +90,7 @@ protected:
         const auto scaled = enqueueDeform(mesh.queue.get(), mesh.scale.get(), memory, 2.0F,
                                           kElements, {added.get()});
         const cl_event last = scaled.get();
-        if (!mesh.alone) {
+        if (!mesh.unbatched) {
             manager().EnqueueReleaseBatchedSharedCLBuffer(1, &last);
         } else {
             ASSERT_EQ(manager().EnqueueReleaseSharedCLBuffer(mesh.queue.get(), 1, &memory, 1, &last,
@@ -100,8 +100,8 @@ protected:
         clFlush(mesh.queue.get());
     }
 
-    // What the modes leave to the host before it draws.
-    void waitAsTheHostDoes()
+    // Makes the waits that the modes leave to the host before it draws.
+    void waitUntilDrawable()
     {
         TopenCLInfo::flush();
         const cl_event batchReleased = *manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr);
@@ -111,7 +111,7 @@ protected:
         }
         if (TopenCLInfo::theOne().useCLFinish())
             TopenCLInfo::finish();
-        // Releases of single buffers came from threads without an OpenGL context.
+        // Unbatched releases were enqueued on threads without an OpenGL context.
         for (Mesh& mesh : fMeshes) {
             if (const cl_event event = mesh.released.get()) {
                 EXPECT_EQ(clWaitForEvents(1, &event), CL_SUCCESS);
@@ -120,8 +120,8 @@ protected:
         }
     }
 
-    // One evaluation, after the renderer has drawn; `atItsBeginning` is what else happens in it.
-    void evaluate(int frame, const std::function<void()>& atItsBeginning = nullptr)
+    // Evaluates after the renderer has drawn; calls `duringIt` once the evaluation is open.
+    void evaluate(int frame, const std::function<void()>& duringIt = nullptr)
     {
         manager().RenderingComplete();
         renderer().flush();
@@ -129,14 +129,14 @@ protected:
             renderer().finish();
         const em::Id id(static_cast<std::uint16_t>(frame));
         manager().PreEvaluate(id);
-        if (atItsBeginning)
-            atItsBeginning();
+        if (duringIt)
+            duringIt();
         std::vector<std::jthread> deformers;
         for (Mesh& mesh : fMeshes)
             deformers.emplace_back([&mesh] { deform(mesh); });
         deformers.clear();
         manager().PostEvaluate(id);
-        waitAsTheHostDoes();
+        waitUntilDrawable();
     }
 
     std::vector<Mesh> fMeshes;
@@ -144,12 +144,12 @@ protected:
 
 } // namespace
 
-TEST_P(Evaluation, NumbersArriveInGLMemory)
+TEST_P(Evaluation, KernelResultsReachGLBuffers)
 {
     for (int frame = 0; frame < kFrames; ++frame) {
         SCOPED_TRACE(frame);
         while (fMeshes.size() < (frame < kFrames / 3 ? 3U : 4U))
-            addMesh(); // the last one is on its own until it joins the batch
+            addMesh(); // the last one is unbatched until it joins the batch
         const auto first = static_cast<float>(frame * 10);
         for (float input = first; const Mesh& mesh : fMeshes)
             renderer().writeBuffer(mesh.glBuffer, everywhere(input++));
@@ -163,7 +163,7 @@ TEST_P(Evaluation, NumbersArriveInGLMemory)
         manager().DestroySharedCLBuffer(mesh.shared);
 }
 
-TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
+TEST_P(Evaluation, BuffersAreCreatedAndDestroyedDuringEvaluation)
 {
     while (fMeshes.size() < 3)
         addMesh();
@@ -173,16 +173,16 @@ TEST_P(Evaluation, BuffersComeAndGoWithinAnEvaluation)
         for (const Mesh& mesh : fMeshes)
             renderer().writeBuffer(mesh.glBuffer, everywhere(5.0F));
         evaluate(frame, [&] {
-            // The mesh changes its level of detail: its buffer goes and another comes.
+            // As for a change of the level of detail: another buffer replaces the mesh's.
             EXPECT_EQ(manager().DestroyBatchedSharedCLBuffer(changing.shared), CL_SUCCESS);
             renderer().deleteBuffer(changing.glBuffer);
             changing.glBuffer = renderer().makeBuffer(everywhere(5.0F));
             renderer().finish();
             share(changing);
             EXPECT_FALSE(changing.shared->fInBatch);
-            changing.alone = true;
+            changing.unbatched = true;
         });
-        changing.alone = GetParam().forceThreading != nullptr; // it has joined the batch
+        changing.unbatched = GetParam().forceThreading != nullptr; // it has joined the batch
         for (const Mesh& mesh : fMeshes)
             EXPECT_EQ(renderer().readBuffer(mesh.glBuffer, kElements), everywhere(12.0F));
     }

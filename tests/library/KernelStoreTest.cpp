@@ -14,12 +14,12 @@ namespace {
 
 using KernelStore = LibraryTest;
 
-// A sink is a plain function, so its texts are the process's.
+// Global, because a sink is a plain function.
 std::vector<std::string> warnings;
 
 } // namespace
 
-TEST_F(KernelStore, FailedRequestsReachTheSinkWithTheCompilersLog)
+TEST_F(KernelStore, FailedBuildReachesSinkWithLog)
 {
     const CLWarningSink before =
         setCLWarningSink([](const char* text) { warnings.emplace_back(text); });
@@ -38,7 +38,7 @@ TEST_F(KernelStore, FailedRequestsReachTheSinkWithTheCompilersLog)
     EXPECT_NE(deformKernel("add").get(), nullptr);
 }
 
-TEST_F(KernelStore, FlagsIncludeDirectoriesAndPrecisionReachTheCompiler)
+TEST_F(KernelStore, FlagsAndIncludeDirectoriesReachCompiler)
 {
     constexpr const char* kSource = "#include \"deform.cl\"\n"
                                     "#ifdef SupportsDoublePrecision\n"
@@ -59,6 +59,6 @@ TEST_F(KernelStore, FlagsIncludeDirectoriesAndPrecisionReachTheCompiler)
     }
     EXPECT_NE(request("inDouble").get(), nullptr);
     ASSERT_TRUE(TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false));
-    EXPECT_NE(request("inSingle").get(), nullptr) << "other options are another program";
+    EXPECT_NE(request("inSingle").get(), nullptr) << "other options select another program";
     EXPECT_EQ(request("inDouble").get(), nullptr);
 }

@@ -15,8 +15,9 @@ void LibraryTest::chooseFirstPlatform()
     cl_platform_id platform = nullptr;
     std::array<char, 256> vendor{};
     ASSERT_EQ(clGetPlatformIDs(1, &platform, nullptr), CL_SUCCESS);
-    ASSERT_EQ(clGetPlatformInfo(platform, CL_PLATFORM_VENDOR, vendor.size(), vendor.data(), nullptr),
-              CL_SUCCESS);
+    ASSERT_EQ(
+        clGetPlatformInfo(platform, CL_PLATFORM_VENDOR, vendor.size(), vendor.data(), nullptr),
+        CL_SUCCESS);
     setEnvironment("VYRA_OPENCL_PLATFORM", vendor.data());
 }
 
@@ -31,7 +32,7 @@ void LibraryTest::start(std::initializer_list<Variable> environment)
     }
     fRenderer = Renderer::make();
     if (!fRenderer)
-        GTEST_SKIP() << "no OpenGL context can be made on this display";
+        GTEST_SKIP() << "this display has no OpenGL";
     ASSERT_TRUE(TopenCLInfo::initialize(fRenderer->window(), fRenderer->context(), nullptr, false,
                                         false, 0));
 }

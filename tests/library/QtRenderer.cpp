@@ -32,7 +32,7 @@ private:
         return reinterpret_cast<void*>(fContext.getProcAddress(name));
     }
 
-    // The first members go last: the application outlives everything of Qt's.
+    // Destroyed in reverse order: the application outlives all other Qt objects.
     int fArgumentCount = 1;
     char fProgramName[18] = "vyra-opencl-tests";
     char* fArguments[2] = {fProgramName, nullptr};

@@ -8,15 +8,15 @@
 
 class Renderer {
 public:
-    // Null when the machine has no OpenGL.
+    // Creates a renderer; null if the machine has no OpenGL.
     static std::unique_ptr<Renderer> make();
     virtual ~Renderer() = default;
 
-    // What TopenCLInfo::initialize takes.
+    // The arguments of TopenCLInfo::initialize.
     virtual void* window() const = 0;
     virtual void* context() const = 0;
 
-    // A buffer that holds `values`; what one is given, and what it holds.
+    // Creates a buffer with these values; writes and reads its contents.
     unsigned makeBuffer(const std::vector<float>& values);
     void writeBuffer(unsigned name, const std::vector<float>& values);
     std::vector<float> readBuffer(unsigned name, std::size_t count);
@@ -26,6 +26,6 @@ public:
     void flush();
 
 protected:
-    // A function of OpenGL's.
+    // Returns the address of an OpenGL function.
     virtual void* function(const char* name) const = 0;
 };

@@ -41,7 +41,7 @@ struct Window {
     Window& operator=(const Window&) = delete;
 };
 
-// Threads without a context of their own call the sync functions in a second one, in turn.
+// Threads without a context call the sync functions in a second context, one at a time.
 class HiddenContext {
 public:
     void create(HGLRC shared)
@@ -93,7 +93,7 @@ GLFunctionTable makeTable()
     table.glWaitSync = [](GLsync sync, unsigned flags, std::uint64_t timeout) {
         hidden->call([=] { return waitSync(sync, flags, timeout), true; });
     };
-    // No driver under test makes one of an event.
+    // No driver under test creates a sync object from an event.
     table.glCreateSyncFromCLeventARB = [](cl_context, cl_event event, unsigned flags) {
         clWaitForEvents(1, &event);
         return hidden->call([=] { return fenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, flags); });

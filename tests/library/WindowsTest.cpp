@@ -1,4 +1,4 @@
-// What only Windows has: which libraries a process gets.
+// Windows only: the libraries that a process loads.
 #include "LibraryTest.h"
 
 #include "runtime/TopenCLInfo.h"
@@ -24,7 +24,7 @@ using Windows = LibraryTest;
 
 } // namespace
 
-TEST_F(Windows, OpenCLIsTheOneBesideTheProgram)
+TEST_F(Windows, OpenCLIsLoadedFromProgramFolder)
 {
     EXPECT_EQ(fileOf("OpenCL.dll"), fileOf(nullptr).parent_path() / "OpenCL.dll");
     EXPECT_EQ(fileOf("vyra-opencl.dll").filename(), "vyra-opencl.dll");

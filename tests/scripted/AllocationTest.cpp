@@ -1,7 +1,6 @@
-// Running out of memory: what is promised to stay unchanged does, and nothing leaks or stays
-// locked.
+// Failing allocations: documented state stays unchanged, and nothing leaks or stays locked.
 //
-// A test counts the allocations of an operation and makes each of them fail in turn.
+// A test makes each allocation of an operation fail in turn.
 #include "FailingAllocations.h"
 #include "FaultBench.h"
 #include "ManagerTest.h"
@@ -25,7 +24,7 @@ struct Row : Named {
 
 class OutOfMemory : public ScriptedTest, public ::testing::WithParamInterface<Row> {};
 
-// A program that was built stays cached though its kernel could not be listed.
+// A built program stays cached even if its kernel could not be listed.
 Lines withoutPrograms()
 {
     Lines lines = runtime().balance();
@@ -33,7 +32,7 @@ Lines withoutPrograms()
     return lines;
 }
 
-TEST_P(OutOfMemory, LosesNothingAndWorksWhenTriedAgain)
+TEST_P(OutOfMemory, FailedAllocationChangesNothingAndRetrySucceeds)
 {
     ASSERT_TRUE(start());
     const Lines before = runtime().balance();
@@ -50,10 +49,10 @@ TEST_P(OutOfMemory, LosesNothingAndWorksWhenTriedAgain)
                 failed = false;
                 EXPECT_GT(nth, 1U);
             } catch (const std::bad_alloc&) {
-                EXPECT_EQ(withoutPrograms(), prepared) << "something was taken or lost";
+                EXPECT_EQ(withoutPrograms(), prepared) << "objects were leaked or released";
             }
             allocationsLeft = 0;
-            EXPECT_EQ(GetParam().run(bench), 1) << "tried again";
+            EXPECT_EQ(GetParam().run(bench), 1) << "retry";
         }
         EXPECT_EQ(runtime().balance(), before);
     }
@@ -78,7 +77,7 @@ unsigned untilMemorySuffices(const Operation& operation, const Check& check)
         try {
             operation();
         } catch (const std::bad_alloc&) {
-            // As may be: what counts is what is left.
+            // Allowed; `check` examines the state.
         }
         allocationsLeft = 0;
         if (failures == 0)
@@ -87,7 +86,7 @@ unsigned untilMemorySuffices(const Operation& operation, const Check& check)
     }
 }
 
-// While it lives, every allocation fails.
+// Makes every allocation fail while it exists.
 struct NoMemory {
     NoMemory()
     {
@@ -101,11 +100,12 @@ struct NoMemory {
     }
 };
 
-#ifndef _WIN32 // where TBB's allocations cannot fail
-// The argument: waits fail, too, which is reported and changes nothing.
+#ifndef _WIN32 // TBB's allocations cannot fail there
+// Parameter: whether waits fail, too, which is reported and changes nothing else.
 class FullLists : public ManagerTest, public ::testing::WithParamInterface<bool> {
 protected:
-    // Without memory the operation waits for these events itself, and throws nothing.
+    // Requires that the operation, without memory, waits for these events itself and throws
+    // nothing.
     template <typename Operation>
     void expectWaits(const Lines& events, const Operation& operation)
     {
@@ -129,9 +129,9 @@ protected:
     Lines fCalls; // of the last operation
 };
 
-TEST_P(FullLists, LetOperationsWaitForTheEventsInstead)
+TEST_P(FullLists, FullListsMakeOperationsWaitForEvents)
 {
-    constexpr std::size_t kReserved = 100; // what a list has room for from the start
+    constexpr std::size_t kReserved = 100; // the initial capacity of a list
     const auto* leaving = startWithBuffer(1, 3);
     create();
     evaluate(); // event#1, event#2
@@ -146,15 +146,15 @@ TEST_P(FullLists, LetOperationsWaitForTheEventsInstead)
     EXPECT_THROW(const NoMemory none; report(), std::bad_alloc);
     EXPECT_EQ(runtime().references(Kind::kEvent, reported), 1 + kReserved);
 
-    const TopenCLSharedBuffer* alone[] = {create(), create()};
+    const TopenCLSharedBuffer* unbatched[] = {create(), create()};
     std::array<AutoCLObject<cl_event>, kReserved + 1> released;
     for (AutoCLObject<cl_event>& event : released) {
-        acquire(alone[0]);
-        const auto releaseAlone = [&] { release(alone[0], event.receive()); };
+        acquire(unbatched[0]);
+        const auto releaseOne = [&] { release(unbatched[0], event.receive()); };
         if (&event != &released.back())
-            releaseAlone();
+            releaseOne();
         else
-            expectWaits({"event#105"}, releaseAlone);
+            expectWaits({"event#105"}, releaseOne);
     }
     Lines waits(kReserved, "event#3");
     waits.emplace_back("event#106"); // of the buffer's own release
@@ -166,14 +166,14 @@ TEST_P(FullLists, LetOperationsWaitForTheEventsInstead)
     EXPECT_EQ(std::ranges::count(fCalls, "clReleaseEvent(event#3)"), std::ptrdiff_t{kReserved});
     const auto isWait = [](const std::string& line) { return line.starts_with("glWaitSync"); };
     EXPECT_EQ(std::ranges::count_if(fCalls, isWait), std::ptrdiff_t{kReserved} + 1);
-    EXPECT_FALSE(alone[0]->fInBatch) << "there was no memory for the batch";
+    EXPECT_FALSE(unbatched[0]->fInBatch) << "there was no memory for the batch";
     evaluate();
-    EXPECT_TRUE(alone[0]->fInBatch && alone[1]->fInBatch);
+    EXPECT_TRUE(unbatched[0]->fInBatch && unbatched[1]->fInBatch);
 }
 INSTANTIATE_TEST_SUITE_P(Allocation, FullLists, ::testing::Bool());
 #endif
 
-TEST_F(ScriptedTest, AnEventListThatCannotGrowIsUnchanged)
+TEST_F(ScriptedTest, FailedGrowthLeavesEventListUnchanged)
 {
     ASSERT_TRUE(start());
     Bench bench;
@@ -197,7 +197,7 @@ TEST_F(ScriptedTest, AnEventListThatCannotGrowIsUnchanged)
     EXPECT_EQ(untilMemorySuffices(assign, [&] { EXPECT_EQ(target.size(), 1U); }), 2U);
 }
 
-TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
+TEST_F(ScriptedTest, FailedBuildIsReleasedWhenMemoryRunsOut)
 {
     ASSERT_TRUE(start());
     Bench bench;
@@ -211,8 +211,8 @@ TEST_F(ScriptedTest, AFailedBuildGoesWhereverMemoryRunsOut)
     EXPECT_GT(std::ranges::count(warnings(), ""), 0);
 }
 
-// A list that only grows needs more memory now and then.
-TEST_F(ScriptedTest, AFailedRequestLeavesNothingInTheStore)
+// A list that kept entries of failed requests would allocate from time to time.
+TEST_F(ScriptedTest, FailedRequestStoresNothing)
 {
     ASSERT_TRUE(start());
     Bench bench;
@@ -229,7 +229,7 @@ TEST_F(ScriptedTest, AFailedRequestLeavesNothingInTheStore)
 }
 
 #ifndef _WIN32
-TEST(Allocation, AMapKeepsItsEntriesWhereAnInsertionFailsAndNoneWhereACopyDoes)
+TEST(Allocation, FailedInsertionKeepsMapAndFailedCopyEmptiesIt)
 {
     TopenCLData source;
     for (std::uint64_t node = 1; node <= 5; ++node)
@@ -243,7 +243,7 @@ TEST(Allocation, AMapKeepsItsEntriesWhereAnInsertionFailsAndNoneWhereACopyDoes)
     EXPECT_GT(untilMemorySuffices(assign, [&] { EXPECT_TRUE(map.empty()); }), 5U);
 }
 
-TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
+TEST(Allocation, FailedAppendIsNotListed)
 {
     ConcurrentEventList list;
     std::vector<cl_event> events;
@@ -257,23 +257,23 @@ TEST(Allocation, AReportThatFindsNoMemoryIsNotListed)
     list.copyTo(events);
     const std::size_t listed = events.size();
     EXPECT_GE(listed, 100U);
-    EXPECT_THROW(list.append(nullptr), std::bad_alloc) << "a list that could not grow stays so";
+    EXPECT_THROW(list.append(nullptr), std::bad_alloc) << "growth is not retried before clear()";
     list.clear();
     for (std::size_t index = 0; index < 3 * listed; ++index)
         list.append(nullptr);
     list.copyTo(events);
-    EXPECT_EQ(events.size(), 3 * listed) << "cleared, it grows again";
+    EXPECT_EQ(events.size(), 3 * listed) << "it grows after clear()";
 }
 #endif
 
-TEST_F(ScriptedTest, AWarningWithoutMemoryIsEmpty)
+TEST_F(ScriptedTest, WarningWithoutMemoryIsEmpty)
 {
     allocationsLeft = 1;
     CLInternalWarning("%s", "lost");
     EXPECT_EQ(warnings(), Lines{""});
 }
 
-TEST_F(ScriptedTest, ABatchThatCannotBeRebuiltStaysAsItWas)
+TEST_F(ScriptedTest, FailedRebuildKeepsBatch)
 {
     ASSERT_TRUE(start());
     Bench bench;
@@ -286,11 +286,11 @@ TEST_F(ScriptedTest, ABatchThatCannotBeRebuiltStaysAsItWas)
     EXPECT_THROW(bench.open(), std::bad_alloc);
     allocationsLeft = 0;
     EXPECT_THAT(calls(), ::testing::ElementsAre(::testing::StartsWith("eventBegin"), "eventEnd(5)"))
-        << "the profiler's scope is closed, and nothing else was done";
+        << "only the profiler's scope was opened and closed";
     EXPECT_EQ(bench.leaveBatch(), CL_SUCCESS);
     EXPECT_EQ(callsOf("clReleaseMemObject").size(), 2U) << "the batch's and the record's";
     bench.open();
-    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "tried again";
+    EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "retry";
 }
 
 } // namespace

@@ -29,7 +29,7 @@ protected:
         EXPECT_EQ(deviceMemory(), 0U);
     }
     static cl_context context() { return TopenCLInfo::theOne().openCLContext(); }
-    // Not the queue that the library uses by itself.
+    // Differs from the queue that the library uses for its own commands.
     static cl_command_queue queue() { return TopenCLInfo::theOne().secondaryOpenCLCommandQueue(); }
     int upload(TopenCLBuffer& buffer, std::size_t offset, std::size_t size, cl_uint waitCount = 0,
                const cl_event* waitList = nullptr)
@@ -37,7 +37,7 @@ protected:
         return buffer.uploadDataToGPU(queue(), CL_FALSE, offset, size, fBytes.data(), waitCount,
                                       waitList);
     }
-    // Makes memory with a pending write, whose event is event#1.
+    // Creates memory with a pending write, whose event is event#1.
     void fill(TopenCLBuffer& buffer)
     {
         buffer.ensureBufferCapacity(kSize);
@@ -48,7 +48,7 @@ protected:
     std::array<char, 256> fBytes{};
 };
 
-TEST_F(BufferTest, EachOperationMakesItsCalls)
+TEST_F(BufferTest, OperationsMakeExactCalls)
 {
     TopenCLBuffer buffer(context(), CL_MEM_ALLOC_HOST_PTR); // flags 16
     const auto expect = [&](int status, std::size_t capacity, bool mapped, const Lines& expected) {
@@ -92,7 +92,7 @@ TEST_F(BufferTest, EachOperationMakesItsCalls)
             "clReleaseMemObject(mem#4)", "clReleaseEvent(event#7)"});
 }
 
-TEST_F(BufferTest, MemoryIsMappedAsItsFlagsAskFor)
+TEST_F(BufferTest, MemoryIsMappedAccordingToFlags)
 {
     const std::pair<cl_mem_flags, std::string> rows[] = {
         {CL_MEM_HOST_WRITE_ONLY | CL_MEM_HOST_READ_ONLY, "2"}, // writing takes precedence
@@ -109,11 +109,11 @@ TEST_F(BufferTest, MemoryIsMappedAsItsFlagsAskFor)
     }
 }
 
-TEST_F(BufferTest, ImpossibleSizesAndReadOnlyBuffersAreRefusedBeforeAnyCall)
+TEST_F(BufferTest, InvalidSizesAndReadOnlyBuffersAreRejectedWithoutCalls)
 {
     TopenCLBuffer buffer;
     fill(buffer);
-    const cl_event null = nullptr; // would be noted as misuse
+    const cl_event null = nullptr; // the runtime would note it as misuse
     EXPECT_EQ(buffer.ensureBufferCapacity(kLimit), CL_INVALID_BUFFER_SIZE);
     EXPECT_EQ(upload(buffer, 0, kLimit, 1, &null), CL_INVALID_BUFFER_SIZE);
     EXPECT_EQ(upload(buffer, kLimit - 16, 16, 1, &null), CL_INVALID_BUFFER_SIZE);
@@ -128,11 +128,11 @@ TEST_F(BufferTest, ImpossibleSizesAndReadOnlyBuffersAreRefusedBeforeAnyCall)
     EXPECT_EQ(buffer.capacityInBytes(), kLimit - 1);
 }
 
-TEST_F(BufferTest, CopiesAndWrappersShareMemoryAndEventAndNeitherMappingNorCount)
+TEST_F(BufferTest, CopiesAndWrappersShareMemoryAndEventOnly)
 {
     TopenCLBuffer buffer(context(), CL_MEM_ALLOC_HOST_PTR);
     fill(buffer);
-    // Element count times element size decides, not the capacity that is recorded.
+    // The capacity is element count times element size, not the recorded one.
     TopenCLDataBuffer data = buffer.openCLDataBuffer();
     data.descriptor().setElementCount(16);
     data.descriptor().setElementSizeInBytes(4);
@@ -159,7 +159,7 @@ TEST_F(BufferTest, CopiesAndWrappersShareMemoryAndEventAndNeitherMappingNorCount
     EXPECT_EQ(deviceMemory(), kSize);
 }
 
-TEST_F(BufferTest, WaitListsPassUnchangedOnWritesAndOnlyWithACountOnReads)
+TEST_F(BufferTest, WritesPassWaitListAlwaysAndReadsOnlyWithCount)
 {
     TopenCLBuffer buffer;
     fill(buffer);
@@ -176,12 +176,12 @@ TEST_F(BufferTest, WaitListsPassUnchangedOnWritesAndOnlyWithACountOnReads)
             "clEnqueueReadBuffer(queue#2, mem#1, 1, 4, 4, host+2, [event#1, event#1]) = event#3",
             "clEnqueueReadBuffer(queue#2, mem#1, 0, 4, 4, host+3, []) = event#4"}));
 
-    // A null list with a count, and a list without, are the caller's affair.
+    // The library passes an inconsistent wait list on; the runtime rejects it.
     upload(buffer, 0, 4, 0, list);
     expectMisuse("clEnqueueWriteBuffer: count and pointer of the wait list disagree");
 }
 
-TEST_F(BufferTest, AGrowingUploadWaitsForTheWaitListFirst)
+TEST_F(BufferTest, UploadThatGrowsWaitsForWaitListFirst)
 {
     TopenCLBuffer buffer;
     fill(buffer);
@@ -197,12 +197,12 @@ TEST_F(BufferTest, AGrowingUploadWaitsForTheWaitListFirst)
     EXPECT_THAT(elsewhere.back(), ::testing::HasSubstr("mem#3, 0, 65, 4, host+0, [event#1])"));
 }
 
-TEST_F(BufferTest, AReadBackChecksNeitherPermissionsNorCapacity)
+TEST_F(BufferTest, ReadBackChecksNeitherPermissionsNorCapacity)
 {
     TopenCLBuffer buffer;
     buffer.ensureBufferCapacity(8);
     buffer.openCLDataBuffer().descriptor().setPermissions(Descriptor::kReadOnly);
-    // The checks of the runtime decide.
+    // Only the runtime checks the range.
     for (const std::size_t size : {std::size_t{8}, std::size_t{0}})
         EXPECT_EQ(buffer.readBackDataFromGPU(queue(), CL_TRUE, 0, size, fBytes.data(), 0, nullptr),
                   0);
@@ -213,7 +213,7 @@ TEST_F(BufferTest, AReadBackChecksNeitherPermissionsNorCapacity)
     EXPECT_EQ(callsOf("clEnqueueRead").size(), 4U);
 }
 
-TEST_F(BufferTest, TheEventGoesThoughItsWaitFailsOrItsBufferIsEmpty)
+TEST_F(BufferTest, EnsureCapacityReleasesEventAfterFailedWaitAndOfEmptyBuffer)
 {
     TopenCLBuffer buffer;
     fill(buffer);
@@ -227,7 +227,7 @@ TEST_F(BufferTest, TheEventGoesThoughItsWaitFailsOrItsBufferIsEmpty)
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
 }
 
-TEST_F(BufferTest, AWrappedBufferKeepsItsDescription)
+TEST_F(BufferTest, WrappedBufferKeepsDescriptor)
 {
     const TopenCLDataBuffer data(Tplug(1, 2), TuniqueString("positions"), Descriptor::kReadOnly, 12,
                                  10, 7);
@@ -239,7 +239,7 @@ TEST_F(BufferTest, AWrappedBufferKeepsItsDescription)
     EXPECT_EQ(TopenCLBuffer(nullptr, 0, large).capacityInBytes(), 65536U) << "a 32-bit product";
 }
 
-TEST_F(BufferTest, AFailedMappingKeepsTheCountedMemoryAndNoAddress)
+TEST_F(BufferTest, FailedMappingKeepsCountedMemoryWithoutAddress)
 {
     TopenCLBuffer buffer(context(), CL_MEM_ALLOC_HOST_PTR);
     runtime().plan({.function = "clEnqueueMapBuffer", .withHandle = true});
@@ -249,7 +249,7 @@ TEST_F(BufferTest, AFailedMappingKeepsTheCountedMemoryAndNoAddress)
     EXPECT_EQ(deviceMemory(), kSize);
 }
 
-TEST_F(BufferTest, ConstructorsAndCopiesCreateMemoryAsAskedFor)
+TEST_F(BufferTest, ConstructorsCreateMemoryAndCopiesShareIt)
 {
     int error = 1;
     const TopenCLBuffer filled(context(), CL_MEM_READ_WRITE, 8, fBytes.data(), &error);
@@ -281,12 +281,12 @@ TEST_F(BufferTest, ConstructorsReportFailures)
     };
     runtime().plan({.function = "clCreateBuffer", .status = -6});
     EXPECT_EQ(errorOf(7), -6);
-    // Neither a handle nor a reason is a failure all the same.
+    // Neither a handle nor an error status: still a failure.
     runtime().plan({.function = "clCreateBuffer", .status = CL_SUCCESS});
     EXPECT_EQ(errorOf(7), CL_MEM_OBJECT_ALLOCATION_FAILURE);
     EXPECT_EQ(errorOf(kLimit), CL_INVALID_BUFFER_SIZE);
     EXPECT_EQ(errorOf(0), CL_INVALID_BUFFER_SIZE);
-    expectMisuse("clCreateBuffer: of no bytes"); // the check of the runtime
+    expectMisuse("clCreateBuffer: of no bytes"); // noted by the runtime
 }
 
 } // namespace

@@ -42,7 +42,7 @@ protected:
     }
 };
 
-TEST_F(DataTest, EqualityIsNameAndPlug)
+TEST_F(DataTest, DescriptorsAreEqualIfNameAndPlugAre)
 {
     const TopenCLDataBuffer data(describe(4));
     const TopenCLDataBuffer same = makeData({kPlug, kName, Descriptor::kReadOnly, 12, 10, 99});
@@ -53,7 +53,7 @@ TEST_F(DataTest, EqualityIsNameAndPlug)
         EXPECT_TRUE(data != other && !(data == other));
 }
 
-TEST_F(DataTest, TheNullBufferIsEmptyAndWritable)
+TEST_F(DataTest, NullBufferIsEmptyAndWritable)
 {
     TopenCLDataBuffer null = TopenCLDataBuffer::fsNULL;
     EXPECT_EQ(null.buffer().get(), nullptr);
@@ -78,9 +78,9 @@ TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
     }
 }
 
-// What a move leaves behind is what these tests look at.
+// These tests examine moved-from objects.
 // NOLINTBEGIN(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
-TEST_F(DataTest, EventAndDescriptorGoWithTheMemory)
+TEST_F(DataTest, SetBufferKeepsEventAndDescriptorWithMemory)
 {
     AutoCLObject<cl_mem> mem;
     AutoCLObject<cl_event> event; // event#1
@@ -116,7 +116,7 @@ TEST_F(DataTest, EventAndDescriptorGoWithTheMemory)
     target = std::move(moved);
     expectSource(target);
     EXPECT_EQ(moved.bufferReadyEvent().get(), other.get());
-    EXPECT_EQ(calls(), Lines{}) << "moves take or exchange handles";
+    EXPECT_EQ(calls(), Lines{}) << "moves transfer or exchange handles";
 
     TopenCLData data;
     data.setData(kName, kPlug, TopenCLDataBuffer(describe(4), {}, other));
@@ -125,7 +125,7 @@ TEST_F(DataTest, EventAndDescriptorGoWithTheMemory)
 }
 // NOLINTEND(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 
-TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
+TEST_F(DataTest, DataMapKeepsOneBufferPerKey)
 {
     TopenCLData data;
     EXPECT_TRUE(data.empty());
@@ -142,13 +142,13 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     TopenCLData copy(data);
     EXPECT_EQ(std::distance(copy.begin(), copy.end()), 2);
     EXPECT_EQ(runtime().references(Kind::kMem, copy.getData(kName, kPlug).buffer().get()), 2U);
-    for (std::uint64_t node = 10; node < 20; ++node) { // anywhere in the order of the map
+    for (std::uint64_t node = 10; node < 20; ++node) { // at any position of the map
         TopenCLData severalPlugs(copy);
         severalPlugs.setData(kName, Tplug(node, 0), {});
         EXPECT_TRUE(severalPlugs.getSinglePlug() == Tplug::fsNULL);
     }
     data.setData(kName, kOtherPlug, makeData());
-    EXPECT_TRUE(copy.getSinglePlug() == kPlug) << "a copy is a map of its own";
+    EXPECT_TRUE(copy.getSinglePlug() == kPlug) << "a copy is independent";
     TopenCLData& itself = data;
     data = itself;
     EXPECT_EQ(std::distance(data.cbegin(), data.cend()), 3);
@@ -156,8 +156,8 @@ TEST_F(DataTest, TheMapKeepsOneBufferForEachKey)
     EXPECT_EQ(&data.getData(kName, kOtherPlug), &TopenCLDataBuffer::fsNULL);
 }
 
-// The hash, written out apart from the library's own.
-TEST_F(DataTest, TheKeyHashFollowsItsFormula)
+// An independent implementation of the hash.
+TEST_F(DataTest, KeyHashFollowsFormula)
 {
     for (const char* text : {"", "positions", "normalIdxToPositionIdx"}) {
         const TuniqueString name(text);
@@ -178,9 +178,9 @@ struct PoolEntry {
     cl_mem mem;
 };
 
-TEST_F(DataTest, ThePoolHandsOutTheBestFitAndOfEqualsTheFirst)
+TEST_F(DataTest, PoolReturnsBestFitAndFirstOfEquals)
 {
-    std::mt19937 random(20); // any number: the sequences only have to vary
+    std::mt19937 random(20); // an arbitrary seed
     for (int sequence = 0; sequence < 200; ++sequence) {
         std::vector<PoolEntry> free;
         std::vector<PoolEntry> used;
@@ -195,7 +195,7 @@ TEST_F(DataTest, ThePoolHandsOutTheBestFitAndOfEqualsTheFirst)
             // few sizes, so that many fit exactly
             const auto bytes = static_cast<unsigned>(random() % 9) * 50;
             const auto excess = [bytes](const PoolEntry& entry) {
-                return entry.capacity - bytes; // huge for what is too small
+                return entry.capacity - bytes; // wraps to a large number if the entry is too small
             };
             const auto best = std::ranges::min_element(free, {}, excess);
             const bool reused = best != free.end() && best->capacity >= bytes;
@@ -216,7 +216,7 @@ TEST_F(DataTest, ThePoolHandsOutTheBestFitAndOfEqualsTheFirst)
     }
 }
 
-TEST_F(DataTest, APoolBufferIsDescribedAsItIsAskedForWhereverItsMemoryIsFrom)
+TEST_F(DataTest, PoolBufferHasRequestedDescriptor)
 {
     TopenCLDataBufferPool pool;
     const Descriptor wanted[] = {
@@ -230,14 +230,15 @@ TEST_F(DataTest, APoolBufferIsDescribedAsItIsAskedForWhereverItsMemoryIsFrom)
         EXPECT_EQ(made.descriptor().isReadOnly(), descriptor.isReadOnly());
         EXPECT_EQ(made.descriptor().elementSizeInBytes(), descriptor.elementSizeInBytes());
         EXPECT_EQ(made.descriptor().elementCount(), descriptor.elementCount());
-        EXPECT_EQ(runtime().references(Kind::kMem, made.buffer().get()), 2U) << "and the pool's";
+        EXPECT_EQ(runtime().references(Kind::kMem, made.buffer().get()), 2U)
+            << "the result's and the pool's";
         pool.releaseBuffers();
     }
     EXPECT_EQ(callsOf("clCreate"), (Lines{"clCreateBuffer(context#1, 1, 120, null) = mem#1",
                                           "clCreateBuffer(context#1, 1, 65536, null) = mem#2"}));
 }
 
-TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
+TEST_F(DataTest, OutputReusesWritableInputElsePoolMemory)
 {
     TopenCLDataBufferPool pool;
     TopenCLDataBuffer input = makeData({kPlug, kName, Descriptor::kReadWrite, 12, 10, 130});
@@ -253,14 +254,15 @@ TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
         pool.collectDataForPlug(kOtherPlug, data);
         return data.getData(kName, kOtherPlug).buffer().get();
     };
-    EXPECT_EQ(collected(), nullptr) << "in-place outputs are not the pool's";
+    EXPECT_EQ(collected(), nullptr) << "in-place outputs are not in the pool";
 
     input.descriptor().setPermissions(Descriptor::kReadOnly);
     const TopenCLDataBuffer pooled = pool.createOutputBuffer(input, kOtherPlug);
     EXPECT_NE(pooled.buffer().get(), input.buffer().get());
     EXPECT_FALSE(pooled.descriptor().isReadOnly());
     EXPECT_EQ(collected(), pooled.buffer().get());
-    const TopenCLDataBuffer later = pool.createBuffer(pooled); // same name and plug: it wins
+    const TopenCLDataBuffer later =
+        pool.createBuffer(pooled); // same name and plug: the later one is collected
     EXPECT_EQ(collected(), later.buffer().get());
     pool.createBuffer(describe(4)); // of another plug
     EXPECT_EQ(collected(), later.buffer().get());
@@ -268,7 +270,7 @@ TEST_F(DataTest, OutputsTakeWritableInputsAndElsePoolMemory)
     EXPECT_EQ(collected(), nullptr);
 }
 
-TEST_F(DataTest, MemoryThatCannotBeMadeStaysOutOfThePool)
+TEST_F(DataTest, BufferWithoutMemoryStaysOutOfPool)
 {
     TopenCLDataBufferPool pool;
     runtime().plan({.function = "clCreateBuffer"});

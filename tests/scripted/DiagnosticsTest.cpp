@@ -21,7 +21,7 @@ struct NamedStatus {
     const char* name;
 };
 
-// The codes are the OpenCL headers'.
+// The codes are those of the OpenCL headers.
 #define STATUS(name)                                                                               \
     {                                                                                              \
         name, #name                                                                                \
@@ -49,7 +49,7 @@ const NamedStatus kStatuses[] = {
     STATUS(CL_INVALID_OPERATION), STATUS(CL_INVALID_GL_OBJECT), STATUS(CL_INVALID_BUFFER_SIZE),
     STATUS(CL_INVALID_MIP_LEVEL), STATUS(CL_INVALID_GLOBAL_WORK_SIZE),
     STATUS(CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR),
-    // The header is Windows' own, and its names end in _KHR.
+    // Their header needs Windows, and its names end in _KHR.
     {-1006, "CL_INVALID_D3D11_DEVICE"},
     {-1007, "CL_INVALID_D3D11_RESOURCE"},
     {-1008, "CL_D3D11_RESOURCE_ALREADY_ACQUIRED"},
@@ -58,7 +58,7 @@ const NamedStatus kStatuses[] = {
 // clang-format on
 #undef STATUS
 
-TEST(ErrorNames, AreThoseOfTheHeadersAndElseTheNumber)
+TEST(ErrorNames, MatchHeadersElseNumber)
 {
     std::map<int, std::string> expected{{INT_MIN, "-2147483648"}, {INT_MAX, "2147483647"}};
     for (int code = -1200; code <= 100; ++code)
@@ -76,7 +76,7 @@ TEST(ErrorNames, AreThoseOfTheHeadersAndElseTheNumber)
 
 using WarningTest = ScriptedTest;
 
-TEST_F(WarningTest, AMessageIsWholeOrEmptyIfItCannotBeFormatted)
+TEST_F(WarningTest, WarningIsWholeOrEmptyWhenFormattingFails)
 {
     testing::internal::CaptureStderr();
     testing::internal::CaptureStdout();
@@ -99,7 +99,7 @@ void keepText(const char* text)
 void dropText(const char*) {}
 
 // Without the fixture, which replaces the built-in sink.
-TEST(WarningSink, TheBuiltInOneWritesNothingAndIsRestoredByNull)
+TEST(WarningSink, BuiltInSinkWritesNothingAndNullRestoresIt)
 {
     testing::internal::CaptureStderr();
     testing::internal::CaptureStdout();
@@ -116,7 +116,7 @@ TEST(WarningSink, TheBuiltInOneWritesNothingAndIsRestoredByNull)
     EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
 }
 
-// A sink that two replacements both return, or neither, is one that its owner cannot restore.
+// If two replacements returned the same sink, or none did, its owner could not restore it.
 TEST(WarningSink, ConcurrentReplacementsReturnEachSinkOnce)
 {
     constexpr int kReplacements = 2'000'000; // of each thread
@@ -126,7 +126,7 @@ TEST(WarningSink, ConcurrentReplacementsReturnEachSinkOnce)
         for (int i = 0; i < kReplacements; ++i) {
             const auto before = std::ranges::find(sinks, setCLWarningSink(sinks[thread]));
             ++returned[thread][static_cast<std::size_t>(before - sinks.begin())];
-            if (i % 1000 == 0) // rare, since they keep the threads apart
+            if (i % 1000 == 0) // rare, because warnings slow the replacements down
                 CLInternalWarning("warning");
         }
     };

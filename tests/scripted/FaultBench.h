@@ -1,5 +1,5 @@
-// What an operation is tried on: subjects that a test makes anew for every fault, and operations
-// whose result is a number. Everything goes with the bench.
+// Subjects that a test creates again for every fault, and operations on them whose result is a
+// number. The bench owns all of them.
 #pragma once
 
 #include "Objects.h"
@@ -30,7 +30,7 @@ public:
             clReleaseCommandQueue(queue);
     }
 
-    // A buffer with a mapping, and with a pending write where asked.
+    // Creates a buffer with a mapping, and with a pending write if `pending`.
     void makeBuffer(std::size_t bytes, bool pending = false)
     {
         buffer.reset();
@@ -52,7 +52,7 @@ public:
         buffer->reset();
         return static_cast<int>(buffer->capacityInBytes());
     }
-    int wrap() // a buffer around the buffer's data, and copies of it
+    int wrap() // a buffer that wraps the buffer's data, and copies of it
     {
         TopenCLBuffer wrapped(info().openCLContext(), 1, buffer->openCLDataBuffer());
         TopenCLBuffer copy(wrapped);
@@ -64,7 +64,7 @@ public:
         return int{TopenCLInfo::IsEventComplete(buffer->bufferReadyEvent().get())};
     }
 
-    // A pool with one free buffer; none where `bytes` is 0.
+    // Creates a pool with one free buffer; with none if `bytes` is 0.
     void makePool(unsigned bytes)
     {
         data = {};
@@ -117,7 +117,7 @@ public:
         return int{made != nullptr};
     }
 
-    // A manager with as many buffers.
+    // Creates a manager with this number of buffers.
     void makeManager(int buffers)
     {
         dropManager();
@@ -158,7 +158,7 @@ public:
         return manager->EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr,
                                                      fEvents.emplace_back().receive());
     }
-    int handOver()
+    int reportEvent()
     {
         const cl_event event = fEvents.back().get();
         return int{*manager->EnqueueReleaseBatchedSharedCLBuffer(1, &event) != nullptr};
@@ -193,7 +193,7 @@ private:
         shared.erase(shared.begin());
         return record;
     }
-    // An evaluation that is open is closed, and the fence waited for: both outlive the manager.
+    // Closes an open evaluation and waits for the fence: both outlive the manager.
     void dropManager()
     {
         if (!manager)

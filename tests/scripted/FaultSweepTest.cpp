@@ -1,6 +1,5 @@
-// Every public operation with every one of its OpenCL and OpenGL calls failing in turn, once and
-// from there on: the stated result, the stated reports, nothing lost, and it works when tried
-// again.
+// Makes each OpenCL and OpenGL call of every public operation fail, once and permanently: the
+// result and the reports are as documented, nothing leaks, and a retry succeeds.
 #include "FaultBench.h"
 
 #include <functional>
@@ -15,13 +14,13 @@ constexpr int kTheStatus = 1000; // stands for the status of the failing call
 struct Row : Named {
     std::function<void(Bench&)> prepare;
     std::function<int(Bench&)> run; // the operation's result as a number
-    // Results other than that of a run without faults, by the function that fails.
+    // Results that differ from a run without faults, by failing function.
     std::map<std::string, int> results{};
-    // Numbers of warnings other than one for a function of OpenCL and none for OpenGL's.
+    // Numbers of warnings, if not one for an OpenCL function and none for an OpenGL function.
     std::map<std::string, std::size_t> reports{};
-    // Wrong use that the rules prescribe after a failure.
+    // Misuse that the rules require after a failure.
     std::set<std::string> prescribed{};
-    // The first attempt used its subject up: prepare it once more before trying again.
+    // The first attempt consumed its subject: prepare it again before the retry.
     bool fresh = false;
 };
 
@@ -45,7 +44,7 @@ class FaultSweep : public ScriptedTest, public ::testing::WithParamInterface<Row
 protected:
     void SetUp() override { startInModes(2, 3); }
 
-    // The functions that a run without faults calls, and its result.
+    // Returns the functions that a run without faults calls, and stores its result.
     Lines runWithout()
     {
         Bench bench;
@@ -57,7 +56,7 @@ protected:
     void runWith(const Fault& fault, const Lines& functions);
     void checkReports(const Fault& fault, const Lines& functions);
 
-    // What the result has to be: the last function that fails decides.
+    // Returns the expected result: that of the last function that fails.
     int resultWith(const Fault& fault, const Lines& functions) const
     {
         int result = fResult;
@@ -104,7 +103,7 @@ void FaultSweep::runWith(const Fault& fault, const Lines& functions)
 
         if (row.fresh)
             row.prepare(bench);
-        EXPECT_EQ(row.run(bench), fResult) << "tried again";
+        EXPECT_EQ(row.run(bench), fResult) << "retry";
     }
     EXPECT_EQ(runtime().balance(), before);
     EXPECT_EQ(deviceMemory(), 0U);
@@ -113,7 +112,7 @@ void FaultSweep::runWith(const Fault& fault, const Lines& functions)
     warnings();
 }
 
-TEST_P(FaultSweep, EveryCallFailsInTurn)
+TEST_P(FaultSweep, EachFailingCallIsReportedAndRetrySucceeds)
 {
     const Lines functions = runWithout();
     ASSERT_FALSE(functions.empty());
@@ -146,7 +145,7 @@ const std::set<std::string> kNotReleased = {kAcquire + ": already acquired",
                                             kRelease + ": not acquired"};
 using B = Bench;
 
-// A row is a sentence, not a column.
+// Rows are kept on one line.
 // clang-format off
 const Row kBufferRows[] = {
     {"EnsureEmpty", [](B& b) { b.makeBuffer(0); }, [](B& b) { return b.buffer->ensureBufferCapacity(64); },
@@ -170,9 +169,9 @@ const Row kBufferRows[] = {
 const Row kRuntimeRows[] = {
     {"KernelBuilt", [](B& b) { b.makeStore(); }, [](B& b) { return b.getKernel(); },
      {{kProgram, 0}, {kBuild, 0}, {kBuilt, 0}, {kKernel, 0}}, {{kBuild, 2}, {kBuilt, 2}}},
-    {"KernelFromTheCache", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return b.getKernel(); }, {{kKernel, 0}}},
-    {"KernelGivenBack", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return int{b.store->freeKernel(b.kernel)}; }, {}, {}, {}, true},
-    {"StoreGoes", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { b.store.reset(); return 0; }, {}, {}, {}, true},
+    {"KernelCached", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return b.getKernel(); }, {{kKernel, 0}}},
+    {"KernelFreed", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return int{b.store->freeKernel(b.kernel)}; }, {}, {}, {}, true},
+    {"StoreDestroyed", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { b.store.reset(); return 0; }, {}, {}, {}, true},
     {"WorkGroupSizes", [](B& b) { b.makeStore(); b.getKernel(); }, [](B& b) { return b.workGroupSizes(); }, {{kGroups, kTheStatus}}},
     {"EventQuery", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.eventComplete(); }},
     {"FinishAndFlush", [](B&) {}, [](B&) { TopenCLInfo::finish(); TopenCLInfo::flush(); return 0; }, {}, {{"clFinish", 0}, {"clFlush", 0}}},
@@ -180,19 +179,19 @@ const Row kRuntimeRows[] = {
 };
 const Row kSharedRows[] = {
     {"Create", [](B& b) { b.makeManager(0); }, [](B& b) { return b.createShared(); }, {{kFromGL, 0}}, {{kFromGL, 0}}},
-    {"DestroyAlone", [](B& b) { b.makeManager(2); }, [](B& b) { return b.destroy(); }, {}, {}, {}, true},
+    {"DestroyUnbatched", [](B& b) { b.makeManager(2); }, [](B& b) { return b.destroy(); }, {}, {}, {}, true},
     {"DestroyBatched", [](B& b) { b.makeManager(2); b.evaluate(); }, [](B& b) { return b.destroy(); }, {{kWait, kTheStatus}}, {}, {}, true},
     {"DestroyAcquired", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.destroy(); }, {}, {}, {}, true},
-    {"LeaveTheBatch", [](B& b) { b.makeManager(2); b.evaluate(); }, [](B& b) { return b.leaveBatch(); }, {}, {}, {}, true},
-    {"LeaveTheAcquiredBatch", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.leaveBatch(); }, {}, {}, kNotReleased, true},
+    {"LeaveBatch", [](B& b) { b.makeManager(2); b.evaluate(); }, [](B& b) { return b.leaveBatch(); }, {}, {}, {}, true},
+    {"LeaveAcquiredBatch", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.leaveBatch(); }, {}, {}, kNotReleased, true},
     {"PreEvaluate", [](B& b) { b.makeManager(2); b.manager->RenderingComplete(); }, [](B& b) { return b.open(); },
      {}, {{kRetainEvent, 0}}, kNotAcquired, true},
     {"AcquireBatched", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.acquire(); }, {}, {{kRetainEvent, 0}}},
-    {"AcquireAlone", [](B& b) { b.makeManager(1); b.manager->RenderingComplete(); }, [](B& b) { return b.acquire(); },
+    {"AcquireUnbatched", [](B& b) { b.makeManager(1); b.manager->RenderingComplete(); }, [](B& b) { return b.acquire(); },
      {{kAcquire, kTheStatus}}, {{kAcquire, 0}}, {}, true},
-    {"ReleaseAlone", [](B& b) { b.makeManager(1); b.acquire(); }, [](B& b) { return b.release(); },
+    {"ReleaseUnbatched", [](B& b) { b.makeManager(1); b.acquire(); }, [](B& b) { return b.release(); },
      {{kRelease, kTheStatus}}, {{kRelease, 0}}, {}, true},
-    {"HandOver", [](B& b) { b.makeManager(2); b.open(); b.acquire(); }, [](B& b) { return b.handOver(); }},
+    {"ReportEvent", [](B& b) { b.makeManager(2); b.open(); b.acquire(); }, [](B& b) { return b.reportEvent(); }},
     {"PostEvaluate", [](B& b) { b.makeManager(2); b.open(); b.createShared(); }, [](B& b) { return b.close(); }, {}, {}, kNotReleased, true},
     {"RenderingComplete", [](B& b) { b.makeManager(1); b.manager->RenderingComplete(); }, [](B& b) { b.manager->RenderingComplete(); return 0; }},
     {"Copy", [](B& b) { b.makeManager(2); b.open(); }, [](B& b) { return b.copyManager(); }},

@@ -1,4 +1,4 @@
-// The kernel store: what is built, what is cached, what is handed out and given back.
+// The kernel store: which programs are built and cached, which kernels are created and freed.
 #include "ScriptedTest.h"
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
@@ -50,7 +50,7 @@ protected:
     {
         return fStore->getKernelFromString(kSource, name, flags, kernel, nullptr);
     }
-    // A source file of that content. It is the test's own and goes with it.
+    // Writes a source file with this content, which the test removes at its end. Returns its path.
     const char* file(const std::string& content)
     {
         fFile = testing::TempDir() + "vyra-" +
@@ -64,8 +64,8 @@ protected:
     std::string fFile;
 };
 
-// A runtime's fault, within one program or across two.
-TEST_F(KernelStoreTest, AHandleReturnedTwiceIsGivenBackTwice)
+// A faulty runtime returns one handle twice, within one program or across two.
+TEST_F(KernelStoreTest, KernelReturnedTwiceIsFreedTwice)
 {
     for (const char* secondProgram : {"text", "other"}) {
         SCOPED_TRACE(secondProgram);
@@ -79,12 +79,12 @@ TEST_F(KernelStoreTest, AHandleReturnedTwiceIsGivenBackTwice)
         EXPECT_TRUE(fStore->freeKernel(second));
         EXPECT_FALSE(fStore->freeKernel(second));
         const Kernel third = fromText();
-        EXPECT_EQ(builds(), 1U) << "the program went with its last kernel";
+        EXPECT_EQ(builds(), 1U) << "the program was released with its last kernel";
         EXPECT_TRUE(fStore->freeKernel(third));
     }
 }
 
-TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
+TEST_F(KernelStoreTest, CacheKeyIsNameAndOptionsNotText)
 {
     constexpr const char* kLong = "-DA -D THE_SAME_ENDING";
     const struct {
@@ -99,7 +99,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
                 {"name", "-DA", {"a", "b"}, 1},
                 {"name", "-DA", {"b", "a"}, 1},
                 {"name", "-DA", {"a", "c"}, 1},
-                {"name", "-DA -I a", {}, 0}, // in other words
+                {"name", "-DA -I a", {}, 0}, // the same options
                 {"name", "", {}, 1},
                 {"name", nullptr, {}, 1},
                 {"a/the-same-ending.cl", kLong, {}, 1},
@@ -110,7 +110,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
         const auto kernel = fStore->getKernelFromString(kSource, name, flags, "skin", &directories);
         EXPECT_EQ(builds(), expected) << name << flags;
     }
-    // Where the name has a program already, no file is looked for.
+    // A name that is cached is not looked up as a file.
     for (const auto& [name, flags, list, expected] : rows) {
         const TstringArray directories = arrayOf(list);
         EXPECT_NE(fStore->getKernel(name, flags, "wave", &directories).get(), nullptr) << name;
@@ -123,7 +123,7 @@ TEST_F(KernelStoreTest, NameAndOptionsAreTheKeyAndTheTextIsNot)
     EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#13, [device#1], \"-DA\")"});
 }
 
-TEST_F(KernelStoreTest, AHitCreatesAKernelAndTheLastKernelGivenBackDropsTheProgram)
+TEST_F(KernelStoreTest, CacheHitCreatesKernelAndFreeingLastKernelDropsProgram)
 {
     const TstringArray folders = arrayOf({"a"});
     const auto inOtherWords = [&](const char* kernel) {
@@ -145,7 +145,7 @@ TEST_F(KernelStoreTest, AHitCreatesAKernelAndTheLastKernelGivenBackDropsTheProgr
     EXPECT_TRUE(fStore->freeKernel(second));
     EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#1)", "clReleaseKernel(kernel#2)",
                               "clReleaseProgram(program#1)"}));
-    // The program is forgotten in all words, whichever it is asked for in next.
+    // The program is dropped for every spelling of its options.
     for (const bool other : {true, false, true}) {
         const Kernel kernel = other ? inOtherWords("skin") : fromText("skin", " -I a");
         EXPECT_EQ(builds(), 1U);
@@ -154,10 +154,10 @@ TEST_F(KernelStoreTest, AHitCreatesAKernelAndTheLastKernelGivenBackDropsTheProgr
     }
 }
 
-TEST_F(KernelStoreTest, KernelsComeBackInAnyOrder)
+TEST_F(KernelStoreTest, KernelsAreFreedInAnyOrder)
 {
     const Lines before = runtime().balance();
-    std::mt19937 random(4); // any number: the orders only have to vary
+    std::mt19937 random(4); // an arbitrary seed
     for (int round = 0; round < 30; ++round) {
         std::vector<Kernel> kernels(9);
         for (std::size_t i = 0; i < kernels.size(); ++i)
@@ -170,7 +170,7 @@ TEST_F(KernelStoreTest, KernelsComeBackInAnyOrder)
     }
 }
 
-TEST_F(KernelStoreTest, AStoreThatGoesReleasesItsProgramLast)
+TEST_F(KernelStoreTest, DestructorReleasesProgramsLast)
 {
     const Kernel kernel = fromText();
     calls();
@@ -179,11 +179,11 @@ TEST_F(KernelStoreTest, AStoreThatGoesReleasesItsProgramLast)
     EXPECT_EQ(runtime().references(Kind::kKernel, kernel.get()), 1U);
 }
 
-TEST_F(KernelStoreTest, AWrongKernelNameKeepsTheBuild)
+TEST_F(KernelStoreTest, WrongKernelNameKeepsProgram)
 {
     EXPECT_EQ(fromText("missing").get(), nullptr);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL_NAME"});
-    EXPECT_TRUE(fStore->freeKernel(fromText("skin", "", "other"))); // takes its own program alone
+    EXPECT_TRUE(fStore->freeKernel(fromText("skin", "", "other"))); // releases its own program only
     const Kernel kernel = fromText("skin");
     EXPECT_NE(kernel.get(), nullptr);
     EXPECT_EQ(builds(), 2U) << "this and the other";
@@ -192,7 +192,7 @@ TEST_F(KernelStoreTest, AWrongKernelNameKeepsTheBuild)
         << "the wrong name left no kernel in the list";
 }
 
-TEST_F(KernelStoreTest, AHandleCountsWhateverTheStatus)
+TEST_F(KernelStoreTest, HandleIsUsedWhateverTheStatus)
 {
     for (const char* function : {"clCreateProgramWithSource", "clCreateKernel"}) {
         SCOPED_TRACE(function);
@@ -221,9 +221,9 @@ protected:
     }
 };
 
-TEST_P(FailedBuild, IsReportedWithItsLogAndForgotten)
+TEST_P(FailedBuild, BuildIsReportedWithLogAndNotCached)
 {
-    runtime().plan({.function = "clReleaseProgram"}); // of which nobody hears
+    runtime().plan({.function = "clReleaseProgram"}); // not reported
     for (const unsigned fails : {GetParam().fails, 0U}) {
         runtime().plan({.function = "clGetProgramBuildInfo", .nth = fails});
         EXPECT_EQ(fStore->getKernelFromString("#error", "bad", "", "skin", nullptr).get(), nullptr);
@@ -243,18 +243,18 @@ INSTANTIATE_TEST_SUITE_P(KernelStore, FailedBuild,
                                            LogRow{"EmptyLog", ""}, LogRow{"NoLog", "", true}),
                          ::testing::PrintToStringParamName());
 
-TEST_F(KernelStoreTest, ABuildThatOnlyReportsFailureCounts)
+TEST_F(KernelStoreTest, BuildWithFailedStatusIsFailure)
 {
     runtime().plan({.function = "clGetProgramBuildInfo", .status = CL_INVALID_DEVICE});
     EXPECT_EQ(fromText().get(), nullptr);
     EXPECT_EQ(warnings().front(), "OpenCL error: CL_INVALID_DEVICE");
-    // The build says no, the status says yes: the status decides.
+    // If clBuildProgram fails and the build status is success, the build status decides.
     runtime().plan({.function = "clBuildProgram", .withHandle = true});
     EXPECT_NE(fromText().get(), nullptr);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
 }
 
-TEST_F(KernelStoreTest, InitializingWithoutAContextChangesNothing)
+TEST_F(KernelStoreTest, InitializeWithoutContextChangesNothing)
 {
     const cl_device_id device = TopenCLInfo::theOne().openCLDevice();
     fStore->initialize(nullptr, nullptr, kNVIDIAProvider);
@@ -268,32 +268,32 @@ TEST_F(KernelStoreTest, InitializingWithoutAContextChangesNothing)
     expectMisuse("clCreateProgramWithSource: null");
 }
 
-TEST_F(KernelStoreTest, TheVendorsOwnFlagIsNoPartOfTheKey)
+TEST_F(KernelStoreTest, CacheKeyOmitsVendorFlag)
 {
     const TopenCLInfo& info = TopenCLInfo::theOne();
     const TstringArray folders = arrayOf({"a"});
     fromText("skin", " -I a");
     fStore->initialize(info.openCLContext(), info.openCLDevice(), kNVIDIAProvider);
     const auto kernel =
-        fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // in other words
+        fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // the same options
     EXPECT_EQ(builds(), 1U);
 }
 
-TEST_F(KernelStoreTest, UnreadableFilesGiveNoKernelAndNoWord)
+TEST_F(KernelStoreTest, UnreadableSourceReturnsEmptyKernelSilently)
 {
     const std::string directory = testing::TempDir();
     const std::string empty = file("");
-    const char* withoutEnd = "/dev/ptmx"; // where there is one, it opens but tells no size
+    const char* withoutEnd = "/dev/ptmx"; // if it exists, it opens but has no size
     for (const char* path : {"no/such/file.cl", empty.c_str(), directory.c_str(), withoutEnd})
         EXPECT_EQ(fStore->getKernel(path, "", "skin", nullptr).get(), nullptr) << path;
     EXPECT_EQ(calls(), Lines{});
-    file("skin"); // it is there now, and read again
+    file("skin"); // now it is readable
     EXPECT_NE(fStore->getKernel(empty.c_str(), "", "skin", nullptr).get(), nullptr);
     EXPECT_EQ(callsOf("clCreateProgram"),
               Lines{"clCreateProgramWithSource(context#1, 1, \"skin\", null) = program#1"});
 }
 
-TEST_F(KernelStoreTest, SourcesAreReadUnchangedAfterThePreamble)
+TEST_F(KernelStoreTest, SourceIsReadUnchangedAfterPreamble)
 {
     Tstring source("before");
     ASSERT_TRUE(TopenCLInfo::oclLoadProgSource(source, file("a\r\nb\n\x1A"), "#"));
@@ -307,7 +307,7 @@ TEST_F(KernelStoreTest, SourcesAreReadUnchangedAfterThePreamble)
     }
 }
 
-TEST_F(KernelStoreTest, TheResourceDirectoryIsAskedForOnce)
+TEST_F(KernelStoreTest, ResourceDirectoryIsQueriedOnce)
 {
     TopenCLInfo& info = TopenCLInfo::theOne();
     EXPECT_STREQ(info.getAbsolutePathToResources().asChar(), "scripted/resources");
@@ -315,7 +315,7 @@ TEST_F(KernelStoreTest, TheResourceDirectoryIsAskedForOnce)
     EXPECT_EQ(calls(), Lines{"getResourcesLocation()"});
 }
 
-TEST_F(KernelStoreTest, BuildOptionsReachTheCompilerToTheCharacter)
+TEST_F(KernelStoreTest, BuildOptionsArePassedExactly)
 {
     const std::string standard = "-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror";
     const struct {

@@ -1,4 +1,5 @@
-// The library itself, loaded and unloaded: in which order its static objects come and go.
+// The shared library, loaded and unloaded: the order in which its static objects are constructed
+// and destroyed.
 #include "Platform.h"
 #include "buffers/TopenCLDataBuffer.h"
 #include "fake/FakeRuntime.h"
@@ -15,7 +16,7 @@ T* find(void* library, const char* mangledName)
 
 } // namespace
 
-TEST(Load, BuildsTheStaticObjectsInOrderAndUnloadingDestroysThemInReverse)
+TEST(Load, LoadingConstructsStaticObjectsAndUnloadingDestroysInReverse)
 {
     using Initialize = bool(void*, void*, void*, bool, bool, unsigned);
     using Lines = std::vector<std::string>;
@@ -32,7 +33,7 @@ TEST(Load, BuildsTheStaticObjectsInOrderAndUnloadingDestroysThemInReverse)
                "event type GPUOverrideAcquireQuorSharedBufferBatch",
                "event type GPUOverrideReleaseQuorSharedBufferBatch"}));
 
-    // The null buffer goes without a trace, unless it has something to release.
+    // Destroying the null buffer makes no call.
     auto* initialize = find<Initialize>(library, "_ZN11TopenCLInfo10initializeEPvS0_S0_bbj");
     auto* null = find<TopenCLDataBuffer>(library, "_ZN17TopenCLDataBuffer6fsNULLE");
     ASSERT_TRUE(initialize && null);
@@ -42,5 +43,5 @@ TEST(Load, BuildsTheStaticObjectsInOrderAndUnloadingDestroysThemInReverse)
     *reinterpret_cast<cl_mem*>(null) = clCreateBuffer(context, 0, 64, nullptr, nullptr);
     runtime.takeCalls();
     unloadLibrary(library);
-    EXPECT_EQ(runtime.takeCalls(), (Lines{"trace gone: clKernel", "clReleaseMemObject(mem#1)"}));
+    EXPECT_EQ(runtime.takeCalls(), (Lines{"trace destroyed: clKernel", "clReleaseMemObject(mem#1)"}));
 }

@@ -11,10 +11,11 @@ namespace scripted {
 
 inline const em::Id kId(1); // of an evaluation
 
-// A manager of the test's own: when it goes, nothing of its making may be left alive.
+// A manager that the test owns; TearDown destroys it, and none of its objects may remain.
 class ManagerTest : public ScriptedTest {
 protected:
-    // Starts in these modes, and makes the manager; with a buffer, which is returned.
+    // Starts in these modes and creates the manager; startWithBuffer also creates and returns a
+    // buffer.
     void startIn(int graphicsToCL, int clToGraphics)
     {
         startInModes(graphicsToCL, clToGraphics);

@@ -1,4 +1,4 @@
-// Objects that a test makes itself, outside the library, and owns.
+// Objects that a test creates without the library, and owns.
 #pragma once
 
 #include "interop/TopenCLSharedBufferMgr.h"
@@ -33,7 +33,7 @@ inline cl_program makeProgram()
     return program;
 }
 
-// A buffer around the renderer's buffer 7.
+// Creates a shared buffer of the renderer's buffer 7.
 inline const TopenCLSharedBuffer* makeShared(TopenCLSharedBufferMgr& manager, int* status)
 {
     unsigned glBuffer = 7;

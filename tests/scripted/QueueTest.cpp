@@ -26,9 +26,9 @@ private:
     AutoCLObject<cl_program> fProgram;
 };
 
-TEST_F(QueueTest, BothQueuesAreFinishedAndFlushedInTurn)
+TEST_F(QueueTest, FinishAndFlushCallBothQueuesInOrder)
 {
-    TopenCLInfo::finish(); // there is no runtime yet: nothing
+    TopenCLInfo::finish(); // makes no call before start-up
     ASSERT_TRUE(start());
     TopenCLInfo::finish();
     TopenCLInfo::flush();
@@ -36,7 +36,7 @@ TEST_F(QueueTest, BothQueuesAreFinishedAndFlushedInTurn)
                               "clFlush(queue#2)"}));
 }
 
-TEST_F(QueueTest, ANullSecondaryQueueIsHarmless)
+TEST_F(QueueTest, FinishAndFlushSkipNullSecondaryQueue)
 {
     faults = {{.function = "clCreateCommandQueue", .nth = 2}};
     ASSERT_TRUE(start());
@@ -50,7 +50,7 @@ TEST_F(QueueTest, ANullSecondaryQueueIsHarmless)
     expectMisuse("clFlush: null");
 }
 
-TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
+TEST_F(QueueTest, CreateOpenCLCommandQueueIsInOrder)
 {
     ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
@@ -60,7 +60,7 @@ TEST_F(QueueTest, AQueueOfTheHostsIsInOrder)
     const cl_command_queue first = info.createOpenCLCommandQueue(&outOfOrder);
     EXPECT_NE(first, info.createOpenCLCommandQueue(nullptr));
     EXPECT_FALSE(outOfOrder);
-    EXPECT_EQ(info.createOpenCLCommandQueue(nullptr), nullptr) << "a queue with a failure";
+    EXPECT_EQ(info.createOpenCLCommandQueue(nullptr), nullptr) << "a handle with an error status";
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES\n"});
     EXPECT_EQ(callsOf("clCreate"),
               (Lines{"clCreateCommandQueue(context#1, device#1, 0) ! -30",
@@ -82,7 +82,7 @@ const char* const kAMD = "Advanced Micro Devices, Inc.";
 const char* const kNVIDIA = "NVIDIA Corporation";
 class EventQuery : public ScriptedTest, public ::testing::WithParamInterface<EventRow> {};
 
-TEST_P(EventQuery, AnswersAfterAsManyLooksAsNeeded)
+TEST_P(EventQuery, IsEventCompleteMakesExpectedQueries)
 {
     const EventRow& row = GetParam();
     world.platforms[0].vendor = row.vendor;
@@ -126,7 +126,7 @@ struct GroupRow : Named {
 };
 class WorkGroupSize : public QueueTest, public ::testing::WithParamInterface<GroupRow> {};
 
-TEST_P(WorkGroupSize, OfTheKernelOr256AndItsSmallestMultiple)
+TEST_P(WorkGroupSize, IsKernelsOr256AndGlobalIsSmallestMultiple)
 {
     if (GetParam().unanswered)
         world.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
@@ -155,7 +155,7 @@ INSTANTIATE_TEST_SUITE_P(Queue, WorkGroupSize,
                                            GroupRow{"Unanswered", 64, true, 256}),
                          ::testing::PrintToStringParamName());
 
-TEST_F(QueueTest, FailingWorkGroupQueriesWriteNothing)
+TEST_F(QueueTest, FailedWorkGroupQueryWritesNothing)
 {
     ASSERT_TRUE(start());
     std::size_t global = 3;
@@ -170,8 +170,8 @@ TEST_F(QueueTest, FailingWorkGroupQueriesWriteNothing)
     EXPECT_EQ(local, 4U);
 }
 
-// The destructor is the library's own, so the copy stays, in memory that stays too.
-TEST_F(QueueTest, ACopyOfTheRuntimeObjectBorrowsTheSameHandles)
+// The destructor is private to the library, so the copy stays, in static memory.
+TEST_F(QueueTest, CopyOfRuntimeObjectBorrowsSameHandles)
 {
     ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();

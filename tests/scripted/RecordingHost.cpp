@@ -1,5 +1,5 @@
-// The part of the host that the library's static objects call, writing down who calls: the order in
-// which they are built and destroyed. In the place of the stand-in's own.
+// The host functions that the library's static objects call. They record the order in which these
+// objects are constructed and destroyed, and replace the stand-in host's definitions.
 #include "fake/FakeRuntime.h"
 #include "host/Profiler.h"
 #include "host/Trace.h"
@@ -41,7 +41,7 @@ TdbTrace::TdbTrace(int level, const char* name, std::ostream& output, const char
 
 TdbTrace::~TdbTrace()
 {
-    scripted::runtime().log(std::string("trace gone: ") + fName);
+    scripted::runtime().log(std::string("trace destroyed: ") + fName);
 }
 
 std::ostream& TdebugOutput::sCerr()

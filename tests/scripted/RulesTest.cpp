@@ -11,7 +11,7 @@
 namespace {
 
 struct DriverRow {
-    std::optional<int> ignore; // VYRA_OPENCL_IGNORE_DRIVER_VERSION, where it is set
+    std::optional<int> ignore; // VYRA_OPENCL_IGNORE_DRIVER_VERSION, if it is set
     bool usable;
     bool implicitSync;
     bool asyncReadback;
@@ -19,7 +19,7 @@ struct DriverRow {
 };
 
 const DriverRow kDriverRows[] = {
-    // Only the first three characters and the two behind the fourth count.
+    // Only the first three characters and the two after the fourth are read.
     {{}, true, false, false, {"359.90", " 99.99"}},
     {{}, true, false, true, {"359.91", "360.00", "361.91", "361.910"}},
     {{}, false, false, true, {"361.92", "362.00", "365910", "368.85"}},
@@ -33,7 +33,7 @@ const DriverRow kDriverRows[] = {
     {2, true, true, false, {"300.00"}},
 };
 
-TEST(DriverVersionRule, EachRow)
+TEST(DriverVersionRule, MatchesTable)
 {
     for (const DriverRow& row : kDriverRows) {
         for (const char* version : row.versions) {
@@ -46,7 +46,7 @@ TEST(DriverVersionRule, EachRow)
     }
 }
 
-TEST(DriverVersionRule, UnreadableVersionsRaise)
+TEST(DriverVersionRule, ParseThrowsForMalformedVersion)
 {
     for (const char* text :
          {"", "385", "38", "abc.31", "385.", "385.xy", "   .31", "385.  ", "3610.92"}) {
@@ -55,7 +55,7 @@ TEST(DriverVersionRule, UnreadableVersionsRaise)
     }
 }
 
-// The numbers are the host's, too.
+// The host uses the same numbers.
 static_assert(kNVIDIAProvider == 0 && kAMDProvider == 1 && kIntelProvider == 2);
 static_assert(kAppleProvider == 3 && kUnknownProvider == 4);
 
@@ -121,7 +121,7 @@ void expectModes(const Choose& choose, const SyncRow& row)
     EXPECT_STREQ(choice.message ? choice.message : "", kMessages[row.message]);
 }
 
-TEST(SyncModeRule, EachRow)
+TEST(SyncModeRule, MatchesTable)
 {
     for (const SyncRow& row : kGraphicsToCLRows)
         expectModes(chooseGraphicsToCLSyncMode, row);

@@ -1,6 +1,5 @@
-// The shared-buffer manager: the exact calls of an evaluation, then unusual circumstances: odd
-// results of creations, failures, the host's window, timeouts, profiling, missing abilities,
-// copies.
+// The shared-buffer manager: the exact calls of an evaluation, failures, the host's window,
+// time-outs, profiling, missing functions, copies.
 #include "ManagerTest.h"
 #include "host/GLFunctionTable.h"
 #include "interop/ProfilerScope.h"
@@ -17,7 +16,7 @@ static_assert(offsetof(TopenCLSharedBuffer, fMem) == 0);
 
 using SharedBufferTest = ManagerTest;
 
-TEST_F(SharedBufferTest, AnEvaluationIsOneAcquireAndOneReleaseAfterAllReportedEvents)
+TEST_F(SharedBufferTest, EvaluationAcquiresOnceAndReleasesOnceAfterReportedEvents)
 {
     const auto* buffer = startWithBuffer(2, 3);
     const TopenCLSharedBuffer* buffers[] = {buffer, create(), create()};
@@ -58,7 +57,7 @@ TEST_F(SharedBufferTest, AnEvaluationIsOneAcquireAndOneReleaseAfterAllReportedEv
     EXPECT_EQ(runtime().name(*slot), "event#3");
 }
 
-TEST_F(SharedBufferTest, TheRendererWaitsForTheBatchAndThenForSingleReleasesInTheirOrder)
+TEST_F(SharedBufferTest, GraphicsWaitsForBatchThenForUnbatchedReleasesInOrder)
 {
     startWithBuffer(1, 3);
     manager().PreEvaluate(kId);
@@ -76,14 +75,14 @@ TEST_F(SharedBufferTest, TheRendererWaitsForTheBatchAndThenForSingleReleasesInTh
                      "glCreateSyncFromCLeventARB(context#1, event#3, 0) = sync#3"}));
 }
 
-TEST_F(SharedBufferTest, AFenceReplacesThePendingOneButNotOneThatIsWaitedFor)
+TEST_F(SharedBufferTest, RenderingCompleteReplacesPendingFenceUnlessItIsAwaited)
 {
     const auto* buffer = startWithBuffer(2, 1);
     std::future<void> set;
     host().duringFenceWait = [&] {
         set = std::async(std::launch::async, [&] { manager().RenderingComplete(); });
         EXPECT_EQ(set.wait_for(std::chrono::seconds(10)), std::future_status::ready)
-            << "setting a fence waited for a lock";
+            << "RenderingComplete waited for a lock";
     };
     manager().RenderingComplete();
     manager().RenderingComplete();
@@ -97,7 +96,7 @@ TEST_F(SharedBufferTest, AFenceReplacesThePendingOneButNotOneThatIsWaitedFor)
                      "glClientWaitSync(sync#3, 1, 1000000000)", "glDeleteSync(sync#3)"}));
 }
 
-TEST_F(SharedBufferTest, DestructionReleasesEventsBeforeMemory)
+TEST_F(SharedBufferTest, DestructorReleasesEventsBeforeMemory)
 {
     startWithBuffer(1, 1);
     evaluate();
@@ -107,7 +106,7 @@ TEST_F(SharedBufferTest, DestructionReleasesEventsBeforeMemory)
                               "clReleaseMemObject(mem#1)", "clReleaseMemObject(mem#1)"}));
 }
 
-TEST_F(SharedBufferTest, CreationPassesItsArgumentsOnAndFailsWithoutARecord)
+TEST_F(SharedBufferTest, FailedCreateReturnsNullAndKeepsBatch)
 {
     startWithBuffer(1, 1);
     evaluate();
@@ -133,7 +132,7 @@ TEST_F(SharedBufferTest, CreationPassesItsArgumentsOnAndFailsWithoutARecord)
     manager().PostEvaluate(kId);
 }
 
-TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
+TEST_F(SharedBufferTest, CreateWithSameHandleKeepsOneRecord)
 {
     const auto* first = startWithBuffer(1, 1);
     evaluate();
@@ -147,10 +146,10 @@ TEST_F(SharedBufferTest, TheSameHandleAgainKeepsOneRecordAndOneReference)
     manager().PostEvaluate(kId);
 }
 
-// The first manager of the process alone says that nothing is batched.
+// Parameter: whether the first manager of the process reports that batching is off.
 class FirstManagerTest : public SharedBufferTest, public ::testing::WithParamInterface<bool> {};
 
-TEST_P(FirstManagerTest, IsTheOnlyOneThatSaysSo)
+TEST_P(FirstManagerTest, OnlyFirstManagerReportsForcedThreading)
 {
     if (GetParam())
         setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
@@ -162,7 +161,7 @@ TEST_P(FirstManagerTest, IsTheOnlyOneThatSaysSo)
 }
 INSTANTIATE_TEST_SUITE_P(SharedBuffers, FirstManagerTest, ::testing::Bool());
 
-TEST_F(SharedBufferTest, AFailedWaitDissolvesTheBatchAllTheSame)
+TEST_F(SharedBufferTest, DestroyDissolvesBatchWhenWaitFails)
 {
     const auto* first = startWithBuffer(1, 1);
     const auto* second = create();
@@ -172,10 +171,10 @@ TEST_F(SharedBufferTest, AFailedWaitDissolvesTheBatchAllTheSame)
     EXPECT_EQ(manager().DestroySharedCLBuffer(first), CL_OUT_OF_RESOURCES);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
     EXPECT_FALSE(second->fInBatch);
-    EXPECT_EQ(callsOf("clReleaseMemObject").size(), 3U) << "the batch's two and the record's";
+    EXPECT_EQ(callsOf("clReleaseMemObject").size(), 3U) << "two of the batch and one of the record";
 }
 
-TEST_F(SharedBufferTest, ABufferWhoseOwnReleaseFailsLeavesTheBatchAllTheSame)
+TEST_F(SharedBufferTest, DestroyBatchedLeavesBatchWhenReleaseFails)
 {
     const auto* first = startWithBuffer(1, 1);
     create();
@@ -189,15 +188,15 @@ TEST_F(SharedBufferTest, ABufferWhoseOwnReleaseFailsLeavesTheBatchAllTheSame)
               Lines{"clEnqueueReleaseGLObjects(queue#1, [mem#2], [event#1]) = event#2"});
 }
 
-TEST_F(SharedBufferTest, ABatchWhoseAcquireFailedIsReleasedAllTheSame)
+TEST_F(SharedBufferTest, BatchIsReleasedWhenAcquireFailed)
 {
     const auto* buffer = startWithBuffer(1, 1);
     const auto* other = create();
-    evaluate(); // makes the wait list's storage, which stays: an empty list is null all the same
+    evaluate(); // allocates the wait list's storage; an empty list is passed as null all the same
     runtime().plan({.function = "clEnqueueAcquireGLObjects"});
     manager().PreEvaluate(kId);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
-    auto event = reinterpret_cast<cl_event>(&manager()); // anything
+    auto event = reinterpret_cast<cl_event>(&manager()); // not null
     calls();
     EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, &event), CL_SUCCESS);
     EXPECT_EQ(event, nullptr);
@@ -210,33 +209,33 @@ TEST_F(SharedBufferTest, ABatchWhoseAcquireFailedIsReleasedAllTheSame)
     EXPECT_EQ(warnings(), (Lines(2, "OpenCL error: CL_INVALID_GL_OBJECT")));
 }
 
-TEST_F(SharedBufferTest, AnEvaluationWhoseReleaseFailedIsClosedAllTheSame)
+TEST_F(SharedBufferTest, PostEvaluateClosesWhenReleaseFails)
 {
     startWithBuffer(1, 3);
     manager().PreEvaluate(kId);
-    const auto* alone = create();
+    const auto* unbatched = create();
     AutoCLObject<cl_event> released;
-    acquire(alone);
-    release(alone, released.receive());
+    acquire(unbatched);
+    release(unbatched, released.receive());
     runtime().plan({.function = "clEnqueueReleaseGLObjects"});
     calls();
     manager().PostEvaluate(kId);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES"});
-    EXPECT_EQ(callsOf("glWaitSync").size(), 1U) << "for the single release";
-    EXPECT_TRUE(alone->fInBatch);
+    EXPECT_EQ(callsOf("glWaitSync").size(), 1U) << "for the unbatched release";
+    EXPECT_TRUE(unbatched->fInBatch);
     EXPECT_EQ(*manager().EnqueueReleaseBatchedSharedCLBuffer(0, nullptr), nullptr);
     manager().PostEvaluate(kId);
-    EXPECT_EQ(calls(), Lines{}) << "released but once";
+    EXPECT_EQ(calls(), Lines{}) << "released once";
 }
 
-TEST_F(SharedBufferTest, EveryOtherIdOpensAnEvaluation)
+TEST_F(SharedBufferTest, PreEvaluateOpensForEveryOtherId)
 {
     startWithBuffer(1, 1);
     for (const unsigned value : {0U, 0xFFFDU, 0xFFFEU, 0xFFFFU}) {
         const em::Id id(static_cast<std::uint16_t>(value));
         calls();
         manager().PreEvaluate(id);
-        if (value != 0xFFFE) // stands for none
+        if (value != 0xFFFE) // means no evaluation
             manager().PreEvaluate(id);
         EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << value;
         manager().PostEvaluate(id);
@@ -249,7 +248,7 @@ TEST_F(SharedBufferTest, EveryOtherIdOpensAnEvaluation)
     manager().PostEvaluate(kId);
 }
 
-TEST_F(SharedBufferTest, SingleCommandsPassWholeListsOnAndRefuseBuffersWithoutMemory)
+TEST_F(SharedBufferTest, UnbatchedCommandsPassWholeListsAndRejectEmptyBuffers)
 {
     startIn(1, 1);
     const TopenCLSharedBuffer empty;
@@ -270,7 +269,7 @@ TEST_F(SharedBufferTest, SingleCommandsPassWholeListsOnAndRefuseBuffersWithoutMe
                      "clEnqueueReleaseGLObjects(queue#2, [mem#1, mem#2], [event#1, event#2])"}));
 }
 
-TEST_F(SharedBufferTest, AReleaseThatFailsOrGivesNoEventIsNotWaitedFor)
+TEST_F(SharedBufferTest, GraphicsDoesNotWaitForReleaseWithoutEvent)
 {
     const auto* buffer = startWithBuffer(1, 3);
     AutoCLObject<cl_event> acquired;
@@ -284,11 +283,11 @@ TEST_F(SharedBufferTest, AReleaseThatFailsOrGivesNoEventIsNotWaitedFor)
     EXPECT_EQ(callsOf("gl"), Lines{});
 }
 
-TEST_F(SharedBufferTest, TheProfilersScopesEncloseTheCommandsEvenIfThereAreNone)
+TEST_F(SharedBufferTest, ProfilerScopesEncloseCommandsEvenIfEmpty)
 {
     startWithBuffer(1, 1);
     host().sampling = true;
-    // The number of lines in a scope of this type.
+    // Returns the number of lines in a scope of this type.
     const auto scopeOf = [&](const std::string& type) {
         const Lines lines = calls();
         EXPECT_EQ(lines.front(), "eventBegin(main, 14, " + type + ", \"\", null, 0)");
@@ -308,7 +307,7 @@ TEST_F(SharedBufferTest, TheProfilersScopesEncloseTheCommandsEvenIfThereAreNone)
                  "Releasing the quorview shared buffer from the OpenCl buffer manager");
 }
 
-TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
+TEST_F(SharedBufferTest, ReportedNullEventIsPassedToRelease)
 {
     startWithBuffer(1, 1);
     manager().PreEvaluate(kId);
@@ -322,7 +321,7 @@ TEST_F(SharedBufferTest, ANullEventIsHandedOverLikeAnyOther)
     EXPECT_EQ(runtime().takeMisuse().size(), 3U) << "retain, wait list, release";
 }
 
-TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesInTheHostsContext)
+TEST_F(SharedBufferTest, FenceWaitRepeatsOneSecondInHostContext)
 {
     const auto* buffer = startWithBuffer(2, 1);
     const ResourceWindow window;
@@ -339,7 +338,7 @@ TEST_F(SharedBufferTest, AFenceIsWaitedForInSlicesInTheHostsContext)
     }
 }
 
-TEST_F(SharedBufferTest, PreEvaluateThatThrowsInTheFenceWaitOpensNothing)
+TEST_F(SharedBufferTest, PreEvaluateOpensNothingWhenFenceWaitThrows)
 {
     startWithBuffer(2, 1);
     const ResourceWindow window;
@@ -352,12 +351,12 @@ TEST_F(SharedBufferTest, PreEvaluateThatThrowsInTheFenceWaitOpensNothing)
             manager().PostEvaluate(kId);
         EXPECT_EQ(callsOf("clEnqueue"), Lines{});
         manager().PreEvaluate(kId);
-        EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "tried again";
+        EXPECT_EQ(callsOf("clEnqueueAcquire").size(), 1U) << "retry";
         manager().PostEvaluate(kId);
     }
 }
 
-TEST_F(SharedBufferTest, AFenceOutlastsATimeInWhichSyncObjectsCannotBeUsed)
+TEST_F(SharedBufferTest, PendingFenceSurvivesUnusableSyncObjects)
 {
     const auto* buffer = startWithBuffer(2, 1);
     manager().RenderingComplete();
@@ -372,9 +371,9 @@ TEST_F(SharedBufferTest, AFenceOutlastsATimeInWhichSyncObjectsCannotBeUsed)
     }
 }
 
-TEST_F(SharedBufferTest, OnlyUsableFunctionsAreCalled)
+TEST_F(SharedBufferTest, UnusableGLFunctionsAreNotCalled)
 {
-    startWithBuffer(2, 3); // chosen while everything was usable
+    startWithBuffer(2, 3); // chosen while all functions were usable
     const auto expectUse = [this](std::size_t fences, std::size_t graphicsWaits) {
         manager().RenderingComplete();
         EXPECT_EQ(callsOf("glFenceSync").size(), fences);
@@ -391,7 +390,7 @@ TEST_F(SharedBufferTest, OnlyUsableFunctionsAreCalled)
     expectUse(1, 1);
 }
 
-// How a copy is made.
+// Parameter: copy construction or copy assignment.
 class CopyTest : public SharedBufferTest, public ::testing::WithParamInterface<bool> {
 protected:
     std::unique_ptr<TopenCLSharedBufferMgr> copied()
@@ -405,7 +404,7 @@ protected:
     }
 };
 
-TEST_P(CopyTest, GoesOnWhereTheOriginalStandsWithReferencesOfItsOwn)
+TEST_P(CopyTest, CopyContinuesOriginalsStateWithOwnReferences)
 {
     const auto* buffer = startWithBuffer(1, 1);
     evaluate();
@@ -420,8 +419,8 @@ TEST_P(CopyTest, GoesOnWhereTheOriginalStandsWithReferencesOfItsOwn)
     dropManager();
     calls();
     copy->PreEvaluate(kId);
-    EXPECT_EQ(calls(), Lines{}) << "its evaluation is open";
-    TopenCLSharedBuffer batched; // as the original's, which is gone
+    EXPECT_EQ(calls(), Lines{}) << "its evaluation is open already";
+    TopenCLSharedBuffer batched; // as in the destroyed original
     batched.fInBatch = true;
     *batched.fMem.receive() = makeMem();
     AutoCLObject<cl_event> acquired;
@@ -430,14 +429,14 @@ TEST_P(CopyTest, GoesOnWhereTheOriginalStandsWithReferencesOfItsOwn)
     copy->PostEvaluate(kId);
     EXPECT_EQ(callsOf("clEnqueue"),
               Lines{"clEnqueueReleaseGLObjects(queue#1, [mem#1], []) = event#4"})
-        << "the reported events stay the original's";
+        << "the reported events stay in the original";
     copy->PreEvaluate(kId);
     EXPECT_THAT(callsOf("clEnqueue"), ::testing::ElementsAre(::testing::HasSubstr("mem#2, mem#1")));
     copy->PostEvaluate(kId);
     ocl.clReleaseEvent(acquired.get()); // the reference in the list of the original
 }
 
-TEST_P(CopyTest, WithoutBatchingNeitherOriginalNorCopyDoesOrProfilesAnything)
+TEST_P(CopyTest, WithoutBatchingOriginalAndCopyMakeNoCalls)
 {
     setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
     startWithBuffer(2, 3);
@@ -455,7 +454,7 @@ TEST_P(CopyTest, WithoutBatchingNeitherOriginalNorCopyDoesOrProfilesAnything)
 INSTANTIATE_TEST_SUITE_P(SharedBuffers, CopyTest, ::testing::Bool(),
                          [](const auto& row) { return row.param ? "Constructed" : "Assigned"; });
 
-TEST_F(SharedBufferTest, AssignmentReleasesTheEventsThatTheTargetLists)
+TEST_F(SharedBufferTest, AssignmentReleasesTargetsEvents)
 {
     startIn(1, 1);
     AutoCLObject<cl_event> event;

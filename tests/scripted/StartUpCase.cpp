@@ -46,7 +46,7 @@ void StartUp::onDirect3D(const char* extensions)
     table = "devices create pending final";
 }
 
-// The last platform of the row is the one that is asked for, the first of its vendor the one taken.
+// The row's last platform is the requested one; the first platform of its vendor is chosen.
 std::string StartUp::platformText() const
 {
     std::size_t taken = 0;
@@ -107,7 +107,7 @@ void StartUp::fails(const std::string& function, unsigned nth)
 
 namespace {
 
-// The entries that are set of the interop function table; those of a pair are set together.
+// Returns the entries of the interop function table that are set; those of a pair are set together.
 std::string interopTable()
 {
     std::string names;
@@ -124,7 +124,7 @@ std::string interopTable()
 
 } // namespace
 
-TEST_P(StartUpRows, PrintsAnswersAndLeaves)
+TEST_P(StartUpRows, InitializePrintsReturnsAndSetsExpectedState)
 {
     StartUp expected;
     GetParam().set(expected);

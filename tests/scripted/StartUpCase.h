@@ -1,4 +1,4 @@
-// One start-up of the library: what it meets, and what it prints, answers and leaves.
+// One start-up of the library: the machine, and the expected output, results and remaining objects.
 #pragma once
 
 #include "ScriptedTest.h"
@@ -20,7 +20,7 @@ struct StartUp {
     std::vector<Fault> faults;
     std::function<void()> prepareHost; // may be empty
 
-    std::optional<std::string> error; // on standard error; else that of a start-up without incident
+    std::optional<std::string> error; // on standard error; unset: that of a successful start-up
     std::string output;               // on standard output
     Lines warnings;
     bool valid = true;
@@ -34,19 +34,19 @@ struct StartUp {
     Lines lookUps{kForceThreading, "asInt32(VYRA_OPENCL_FORCE_FINISH, 0)",
                   "asInt32(VYRA_GRAPHICSTOOPENCL_SYNC_MODE, 0)",
                   "asInt32(VYRA_OPENCLTOGRAPHICS_SYNC_MODE, 0)"}; // of variables, by the host
-    unsigned computeUnits = 8;                 // 0: start-up stopped before the host's last step
+    unsigned computeUnits = 8; // 0: start-up stopped before its last call of the host
     std::string table{"create pending final"}; // the filled entries of the interop function table
     Lines left{"context#1 x1", "queue#1 x1", "queue#2 x1"};
 
     PlatformScript& platform() { return world.platforms[0]; }
     DeviceScript& firstDevice() { return world.platforms[0].devices[0]; }
-    // The platform is another vendor's.
+    // The platform has another vendor.
     void onVendor(const char* vendor, OpenCLProvider expectedProvider, unsigned id);
     void onNVIDIA(const char* driver);
     // The renderer is Direct3D 11; the platform has these extensions.
     void onDirect3D(const char* extensions);
 
-    // What is printed as far as the platform, and all of it.
+    // The text printed up to the choice of the platform, and the whole text.
     std::string platformText() const;
     std::string wholeText() const;
 
@@ -55,9 +55,9 @@ struct StartUp {
     void stopsBeforePlatform(const std::string& text);
     void stopsBeforeDevice(const std::string& text);
     void stopsWithContext(const std::string& text);
-    // There is no double precision: the host is asked whether that matters.
+    // The device has no double precision: start-up reads the variable that requires it.
     void withoutDoublePrecision();
-    // The n-th call of `function` fails with CL_OUT_OF_RESOURCES, which is reported.
+    // Makes the n-th call of `function` fail with CL_OUT_OF_RESOURCES, which is reported.
     void fails(const std::string& function, unsigned nth = 1);
 };
 
@@ -68,10 +68,10 @@ struct StartUpRow : Named {
 // A table of start-ups.
 class StartUpRows : public ScriptedTest, public ::testing::WithParamInterface<StartUpRow> {};
 
-// The listing of all platforms, with the line of the one that is taken.
+// Returns the listing of all platforms, with the line of the chosen one.
 std::string listing(const World& world, std::size_t taken);
 
-inline constexpr std::size_t kNoPlatform = 64; // more than any world has
+inline constexpr std::size_t kNoPlatform = 64; // more than any test has
 inline const std::string kAttempt = "OpenCL evaluator is attempting to initialize OpenCL.\n";
 inline const std::string kIntel = "Intel(R) Corporation";
 inline const std::string kNamed = "Choosing OpenCL Device Scripted GPU.  ";

@@ -15,7 +15,7 @@ const std::string kNoGPU =
     "OpenCL evaluator is unable to find a GPU device that can share VBOs with OpenGL.\n";
 const std::string kNoGL = "Error: found cl_khr_gl_sharing but failed to get function pointers";
 
-// Three devices that share with OpenGL, driven by one of them or by none (-1); the device expected.
+// Three devices that share with OpenGL, the current one (-1: none), and the expected device.
 void threeDevices(StartUp& c, const cl_device_type (&types)[3], int current, const char* device)
 {
     c.platform().devices = {{.type = types[0]}, {.type = types[1]}, {.type = types[2]}};
@@ -26,7 +26,7 @@ void threeDevices(StartUp& c, const cl_device_type (&types)[3], int current, con
     c.device = device;
 }
 
-// The primary queue cannot be made; the attempts fail with this status.
+// Makes the creation of the primary queue fail with this status.
 void primaryQueueFails(StartUp& c, cl_int status, unsigned attempts, const std::string& name)
 {
     for (unsigned nth = 1; nth <= attempts; ++nth)
@@ -66,7 +66,7 @@ void unreadableDriver(StartUp& c)
     c.modes = {1, 2};
 }
 
-// A row is a sentence, not a column.
+// Rows are kept on one line.
 // clang-format off
 const StartUpRow kDeviceRows[] = {
     {"CurrentDeviceOfTheList", [](StartUp& c) { threeDevices(c, {4, 4, 4}, 1, "device#2"); }},
@@ -134,16 +134,16 @@ const StartUpRow kDeviceRows[] = {
          c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"DriverVersionFails", [](StartUp& c) { c.onNVIDIA("400.00"); c.fails("clGetDeviceInfo", 2); c.stopsBeforeDevice(""); c.device = "device#1"; }},
     {"OldDriverReadsBackSynchronously", [](StartUp& c) { c.onNVIDIA("359.90"); c.asyncReadback = false; c.modes = {1, 2}; }},
-    {"IgnoredByAWord", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "yes"}}; c.modes = {1, 2}; }},
+    {"IgnoreVariableIsNoNumber", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "yes"}}; c.modes = {1, 2}; }},
     {"IgnoredOlderDriverIsImplicit", [](StartUp& c) { c.onNVIDIA("365.10"); c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", "1"}}; }},
     {"ModesFromTheEnvironment", [](StartUp& c) { demandModes(c, "2", "3"); c.modes = {2, 3}; }},
-    {"FinishGoesBeforeTheModes", [](StartUp& c) {
+    {"ForceFinishTakesPrecedence", [](StartUp& c) {
          withoutEvents(c, {3, 4});
          demandModes(c, "1", "1");
          c.environment.emplace_back("VYRA_OPENCL_FORCE_FINISH", "-2"); }},
     {"ModesWithoutEvents", [](StartUp& c) { withoutEvents(c, {2, 2}); }},
     {"ExtensionsAreFoundAnywhereInTheText", [](StartUp& c) { c.platform().extensions = "xcl_khr_gl_eventx"; }},
-    {"ImpossibleDemandsAreTold", [](StartUp& c) {
+    {"UnsupportedModesAreReported", [](StartUp& c) {
          withoutEvents(c, {1, 2});
          demandModes(c, "1", "1");
          c.error = c.platformText() + chooseGraphicsToCLSyncMode(1, {}).message +
@@ -169,7 +169,7 @@ INSTANTIATE_TEST_SUITE_P(Device, StartUpRows, ::testing::ValuesIn(kDeviceRows), 
 
 using DeviceStartUpOnce = ScriptedTest;
 
-TEST_F(DeviceStartUpOnce, WithoutAQueueTheRestIsDoneAllTheSame)
+TEST_F(DeviceStartUpOnce, StartUpWithoutQueueContinues)
 {
     setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
     world.platforms[0].vendor = "NVIDIA Corporation";
@@ -185,7 +185,7 @@ TEST_F(DeviceStartUpOnce, WithoutAQueueTheRestIsDoneAllTheSame)
     expectLeft({"program#1 x1", "kernel#1 x1"});
 }
 
-TEST_F(DeviceStartUpOnce, WithoutAContextThereIsNoQueue)
+TEST_F(DeviceStartUpOnce, StartUpWithoutContextCreatesNoQueue)
 {
     faults = {{.function = "clCreateContext"}};
     EXPECT_FALSE(start());
@@ -198,7 +198,7 @@ TEST_F(DeviceStartUpOnce, WithoutAContextThereIsNoQueue)
 
 class DeviceName : public ScriptedTest, public ::testing::WithParamInterface<std::size_t> {};
 
-TEST_P(DeviceName, HasRoomFor127Characters)
+TEST_P(DeviceName, NameIsCutAfter127Characters)
 {
     const bool fits = GetParam() == 127;
     world.platforms[0].devices[0].name = std::string(GetParam(), 'n');
@@ -207,11 +207,11 @@ TEST_P(DeviceName, HasRoomFor127Characters)
     EXPECT_EQ(printedError.find("Device " + std::string(127, 'n') + ".  ") != std::string::npos,
               fits);
     if (!fits)
-        expectMisuse("clGetDeviceInfo: no room for the answer");
+        expectMisuse("clGetDeviceInfo: the value is too small");
 }
 INSTANTIATE_TEST_SUITE_P(Device, DeviceName, ::testing::Values(127, 128));
 
-TEST_F(DeviceStartUpOnce, ForcedThreadingIsAskedForOnce)
+TEST_F(DeviceStartUpOnce, SupportsThreadedSharingReadsVariableOnce)
 {
     setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
     world.platforms[0].vendor = "NVIDIA Corporation";
@@ -226,7 +226,7 @@ TEST_F(DeviceStartUpOnce, ForcedThreadingIsAskedForOnce)
 class DisplayStartUp : public ScriptedTest,
                        public ::testing::WithParamInterface<GLDisplayProperty> {};
 
-TEST_P(DisplayStartUp, DeviceQueryAndContextGetTheSamePropertyList)
+TEST_P(DisplayStartUp, DeviceQueryAndContextReceiveSamePropertyList)
 {
     host().display = GetParam();
     ASSERT_TRUE(startWatched());

@@ -14,7 +14,7 @@ const char* const kNVIncomplete =
 const char* const kKHRIncomplete =
     "Error: found cl_khr_d3d11_sharing extension but failed to get function pointers.";
 
-// The first of the devices is taken, whatever its type; no variable changes the modes.
+// The first device is chosen, whatever its type; no variable changes the modes.
 StartUp onDirect3D(const char* extensions, const char* missing)
 {
     StartUp c;
@@ -28,7 +28,7 @@ StartUp onDirect3D(const char* extensions, const char* missing)
     return c;
 }
 
-// An entry point is missing: so says standard output.
+// A missing entry point is reported on standard output.
 void incomplete(StartUp& c, const char* extensions, const char* missing, const char* output)
 {
     c = onDirect3D(extensions, missing);
@@ -37,12 +37,12 @@ void incomplete(StartUp& c, const char* extensions, const char* missing, const c
     c.output = output;
 }
 
-// A row is a sentence, not a column.
+// Rows are kept on one line.
 // clang-format off
 const StartUpRow kDirect3DRows[] = {
     {"NV", [](StartUp& c) { c = onDirect3D(kNV, ""); }},
     {"KHR", [](StartUp& c) { c = onDirect3D(kKHR, ""); }},
-    {"WithoutOpenGL", [](StartUp& c) { c = onDirect3D(kNV, "clGetGLContextInfoKHR"); }}, // which only OpenGL needs
+    {"WithoutOpenGL", [](StartUp& c) { c = onDirect3D(kNV, "clGetGLContextInfoKHR"); }}, // only OpenGL needs it
     {"OnNVIDIA", [](StartUp& c) { c.onNVIDIA("400.00"); c.onDirect3D(kNV); }},
     {"Neither", [](StartUp& c) {
          c = onDirect3D("cl_khr_gl_sharing", "");
@@ -70,8 +70,8 @@ INSTANTIATE_TEST_SUITE_P(Direct3D, StartUpRows, ::testing::ValuesIn(kDirect3DRow
 using Extensions = std::pair<const char*, const char*>; // of the platform, and the suffix in use
 class Direct3DFunctions : public ManagerTest, public ::testing::WithParamInterface<Extensions> {};
 
-// The device query, the property list and the functions behind a shared buffer's life.
-TEST_P(Direct3DFunctions, AreThoseOfTheExtension)
+// The device query, the property list and the functions that create and transfer a shared buffer.
+TEST_P(Direct3DFunctions, AreTakenFromSupportedExtension)
 {
     world.platforms[0].extensions = GetParam().first;
     const std::string suffix = GetParam().second;
@@ -89,7 +89,7 @@ TEST_P(Direct3DFunctions, AreThoseOfTheExtension)
 
     makeManager();
     int status = 1;
-    // NOLINTNEXTLINE(performance-no-int-to-ptr): an ID3D11Buffer, which nobody looks behind.
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): an ID3D11Buffer, never dereferenced.
     const auto* buffer = manager().CreateSharedCLBuffer(context(), CL_MEM_READ_WRITE,
                                                         reinterpret_cast<void*>(9), &status);
     ASSERT_TRUE(buffer);

@@ -22,7 +22,7 @@ const std::string kIntelLine =
     " 0: Intel(R) Corporation. Scripted platform. OpenCL 1.2 scripted.\n";
 const PlatformScript kSomebody{.vendor = "Somebody", .devices = {}};
 
-// A row is a sentence, not a column.
+// Rows are kept on one line.
 // clang-format off
 const StartUpRow kPlatformRows[] = {
     {"ByTheBook", [](StartUp& c) {
@@ -36,7 +36,7 @@ const StartUpRow kPlatformRows[] = {
     {"DisabledByTheUser", [](StartUp& c) {
          c.environment = {{"VYRA_DISABLE_OPENCL", "0"}};
          c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
-#if !defined(_WIN32) // where a variable cannot be empty
+#if !defined(_WIN32) // a variable cannot be empty there
     {"DisabledByAnEmptyVariable", [](StartUp& c) {
          c.environment = {{"VYRA_DISABLE_OPENCL", ""}};
          c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
@@ -61,7 +61,7 @@ const StartUpRow kPlatformRows[] = {
          c.stopsBeforePlatform("CLEW failed to initialize: scripted look-up  Vyra running without OpenCL support.\n"); }},
     {"LoadingThrowsSomethingElse", [](StartUp& c) {
          c.world.lookUp = LookUp::kThrowsNumber;
-         c.arguments.vendorId = 1; // looked at only later
+         c.arguments.vendorId = 1; // read only later
          c.stopsBeforePlatform("CLEW failed to initialize.  Vyra running without OpenCL support.\n"); }},
     {"UnknownVendorId", [](StartUp& c) {
          c.arguments.vendorId = 0x1AB8;
@@ -119,7 +119,7 @@ using StartUpOnce = ScriptedTest;
 
 class StartUpAgain : public ScriptedTest, public ::testing::WithParamInterface<bool> {};
 
-TEST_P(StartUpAgain, ChangesAndPrintsNothing)
+TEST_P(StartUpAgain, InitializeAgainChangesAndPrintsNothing)
 {
     const bool disabled = GetParam();
     if (disabled)
@@ -134,7 +134,7 @@ TEST_P(StartUpAgain, ChangesAndPrintsNothing)
 }
 INSTANTIATE_TEST_SUITE_P(StartUp, StartUpAgain, ::testing::Bool());
 
-TEST_F(StartUpOnce, OnlyExtensionsAreLookedUpThroughTheRuntime)
+TEST_F(StartUpOnce, OnlyExtensionFunctionsAreLookedUpThroughRuntime)
 {
     ASSERT_TRUE(startWatched());
     const Lines lookUps = callsOf("clGetExtensionFunctionAddress");
@@ -143,7 +143,7 @@ TEST_F(StartUpOnce, OnlyExtensionsAreLookedUpThroughTheRuntime)
                                                           ::testing::HasSubstr("D3D11"))));
 }
 
-TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
+TEST_F(StartUpOnce, OptionSettersReturnWhetherValueChanged)
 {
     world.platforms[0].devices[0].doublePrecision = 0;
     ASSERT_TRUE(start());
@@ -162,7 +162,7 @@ TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
     testing::internal::CaptureStderr();
     EXPECT_TRUE(info.setMinimumBufferSize(-1));
     EXPECT_FALSE(info.setMinimumBufferSize(-1));
-    EXPECT_FALSE(info.setMinimumBufferSize(0)) << "0 is no request for the default";
+    EXPECT_FALSE(info.setMinimumBufferSize(0)) << "0 does not select the default";
     const std::string line =
         "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 0.\n";
     EXPECT_EQ(testing::internal::GetCapturedStderr(), line + line);
@@ -174,7 +174,7 @@ TEST_F(StartUpOnce, OptionsReportWhetherTheyChanged)
     EXPECT_FALSE(info.setAllowDoublePrecisionSupport(true));
 }
 
-TEST_F(StartUpOnce, CleanUpDeletesTheKernelStoreAndReleasesNothingElse)
+TEST_F(StartUpOnce, CleanUpReleasesKernelStoreOnly)
 {
     ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
@@ -190,7 +190,7 @@ TEST_F(StartUpOnce, CleanUpDeletesTheKernelStoreAndReleasesNothingElse)
     EXPECT_EQ(runtime().name(info.openCLDevice()), "device#1");
 }
 
-TEST_F(StartUpOnce, PlatformsAreListedUntilOnePassIsComplete)
+TEST_F(StartUpOnce, PlatformsAreListedUntilOneListIsComplete)
 {
     faults = {{.function = "clGetPlatformInfo"}};
     EXPECT_FALSE(start());
@@ -204,7 +204,7 @@ TEST_F(StartUpOnce, PlatformsAreListedUntilOnePassIsComplete)
     }
 }
 
-TEST_F(StartUpOnce, ErrorsOfTheContextGoToStandardError)
+TEST_F(StartUpOnce, ContextErrorsAreWrittenToStandardError)
 {
     ASSERT_TRUE(start());
     testing::internal::CaptureStderr();

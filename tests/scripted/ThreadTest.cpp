@@ -1,5 +1,6 @@
-// What several threads may do at once. ThreadSanitizer sees the library, not the runtime below it
-// (see QuietLock), so a lock that is missing shows as a race here; the counts show it elsewhere.
+// Operations on several threads at once. ThreadSanitizer reports a missing lock of the library as a
+// race, because the runtime's own lock is hidden from it (see QuietLock); elsewhere the counts
+// differ.
 #include "ManagerTest.h"
 #include "PrivateMember.h"
 #include "buffers/TopenCLData.h"
@@ -29,7 +30,7 @@ namespace {
 constexpr int kThreads = 4;
 constexpr int kRounds = 200;
 
-// Runs `body` on all threads, which begin together; the argument is the thread's number.
+// Runs `body` on all threads, which start together; the argument is the thread's number.
 void onThreads(const std::function<void(int)>& body)
 {
     std::atomic<int> arrived = 0;
@@ -47,7 +48,7 @@ void onThreads(const std::function<void(int)>& body)
 
 using ThreadTest = ManagerTest;
 
-TEST_F(ThreadTest, KernelRequestsTakeTurns)
+TEST_F(ThreadTest, ConcurrentKernelRequestsAreSerialised)
 {
     startInModes(1, 1);
     TopenCLKernelStore& store = TopenCLInfo::theOne().kernelStore();
@@ -67,7 +68,7 @@ TEST_F(ThreadTest, KernelRequestsTakeTurns)
     std::filesystem::remove(file);
 }
 
-TEST_F(ThreadTest, PoolBuffersAreHandedOutOnceAndTakenBackByAnyone)
+TEST_F(ThreadTest, ConcurrentPoolRequestsNeverShareBuffer)
 {
     startInModes(1, 1);
     TopenCLDataBufferPool pool;
@@ -86,7 +87,7 @@ TEST_F(ThreadTest, PoolBuffersAreHandedOutOnceAndTakenBackByAnyone)
     }
 }
 
-TEST_F(ThreadTest, TheDataMapIsFilledAndReadAtOnce)
+TEST_F(ThreadTest, ConcurrentDataMapUseKeepsAllEntries)
 {
     startInModes(1, 1);
     TopenCLData data;
@@ -103,12 +104,12 @@ TEST_F(ThreadTest, TheDataMapIsFilledAndReadAtOnce)
     EXPECT_EQ(std::distance(data.begin(), data.end()), kThreads * kRounds);
 }
 
-TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
+TEST_F(ThreadTest, ConcurrentlyReportedEventsAreAwaitedOnce)
 {
     const auto* batched = startWithBuffer(1, 3);
     manager().PreEvaluate(kId);
-    const TopenCLSharedBuffer* alone[kThreads];
-    for (auto& buffer : alone)
+    const TopenCLSharedBuffer* unbatched[kThreads];
+    for (auto& buffer : unbatched)
         buffer = create();
     AutoCLObject<cl_event> released[kThreads][kRounds];
     onThreads([&](int thread) {
@@ -117,20 +118,20 @@ TEST_F(ThreadTest, EveryReportedEventIsWaitedForOnce)
             acquire(batched, acquired.receive());
             const cl_event reported = acquired.get();
             manager().EnqueueReleaseBatchedSharedCLBuffer(1, &reported);
-            acquire(alone[thread]);
-            release(alone[thread], event.receive());
+            acquire(unbatched[thread]);
+            release(unbatched[thread], event.receive());
         }
     });
     calls();
     manager().PostEvaluate(kId);
     const Lines lines = calls();
-    // The batch's own acquire is waited for, too, and the renderer waits for the batch's release.
+    // Plus one: the batch's own acquire, and the batch's release.
     EXPECT_EQ(std::ranges::count(lines, "clReleaseEvent(event#1)"), kThreads * kRounds + 1);
     const auto isWait = [](const std::string& line) { return line.starts_with("glWaitSync"); };
     EXPECT_EQ(std::ranges::count_if(lines, isWait), kThreads * kRounds + 1);
 }
 
-TEST_F(ThreadTest, SharedBuffersComeAndGoAtOnce)
+TEST_F(ThreadTest, ConcurrentCreateAndDestroyKeepBatchConsistent)
 {
     startIn(1, 1);
     onThreads([this](int thread) {
@@ -145,7 +146,7 @@ TEST_F(ThreadTest, SharedBuffersComeAndGoAtOnce)
     });
 }
 
-TEST_F(ThreadTest, OneThreadWaitsForTheFenceAndNobodyOvertakesIt)
+TEST_F(ThreadTest, OneThreadWaitsForFenceAndOthersFollow)
 {
     startIn(2, 1);
     const TopenCLSharedBuffer* buffers[kThreads];
@@ -168,7 +169,7 @@ TEST_F(ThreadTest, OneThreadWaitsForTheFenceAndNobodyOvertakesIt)
 }
 
 // The list to which several threads report events while another one reads it.
-constexpr std::uintptr_t kEventsEach = 300; // beyond what is reserved
+constexpr std::uintptr_t kEventsEach = 300; // more than the initial capacity
 
 // Never dereferenced.
 cl_event fakeEvent(std::uintptr_t thread, std::uintptr_t number)
@@ -195,7 +196,7 @@ bool beginsWith(const std::vector<cl_event>& whole, const std::vector<cl_event>&
            std::equal(beginning.begin(), beginning.end(), whole.begin());
 }
 
-TEST(ConcurrentEventList, CopiesDuringAppendsGrowToWhatAllThreadsAppended)
+TEST(ConcurrentEventList, CopiesDuringAppendsGrowToAllEvents)
 {
     for (int evaluation = 0; evaluation < 100; ++evaluation) {
         ConcurrentEventList list;
@@ -218,7 +219,7 @@ TEST(ConcurrentEventList, CopiesDuringAppendsGrowToWhatAllThreadsAppended)
             std::vector<cl_event> events = contentsOf(list);
             ASSERT_TRUE(grows && beginsWith(events, copy));
             ASSERT_EQ(events.size(), kThreads * kEventsEach);
-            // Each thread's events are all there, in the order in which it appended them.
+            // All events of each thread are present, in the order in which it appended them.
             std::ranges::stable_sort(events, {}, threadOf);
             for (std::uintptr_t i = 0; i < events.size(); ++i)
                 ASSERT_EQ(events[i], fakeEvent(i / kEventsEach, i % kEventsEach));
@@ -228,7 +229,7 @@ TEST(ConcurrentEventList, CopiesDuringAppendsGrowToWhatAllThreadsAppended)
     }
 }
 
-TEST(ConcurrentEventList, AReaderWaitsForATakenSlotThatWasWrittenBeforeClear)
+TEST(ConcurrentEventList, CopyWaitsForTakenSlotWrittenBeforeClear)
 {
     ConcurrentEventList list;
     list.append(fakeEvent(0, 0));
@@ -236,7 +237,7 @@ TEST(ConcurrentEventList, AReaderWaitsForATakenSlotThatWasWrittenBeforeClear)
     list.clear();
     list.append(fakeEvent(1, 0));
     std::atomic<std::size_t>& size = list.*memberOf(Size());
-    size = 2; // another append has taken a slot and not written it yet
+    size = 2; // another append has taken a slot but not written it
     std::vector<cl_event> seen;
     std::atomic<bool> reading = false;
     std::thread reader([&] {
@@ -247,7 +248,8 @@ TEST(ConcurrentEventList, AReaderWaitsForATakenSlotThatWasWrittenBeforeClear)
     });
     while (!reading)
         std::this_thread::yield();
-    std::this_thread::sleep_for(std::chrono::milliseconds(50)); // to meet the slot unwritten
+    std::this_thread::sleep_for(
+        std::chrono::milliseconds(50)); // so that it reads the unwritten slot
     size = 1;
     list.append(fakeEvent(1, 1));
     reader.join();

@@ -1,4 +1,4 @@
-// Start-up where the OpenCL library cannot be used.
+// Start-up if the OpenCL library is missing or incomplete.
 #include "Platform.h"
 #include "runtime/TopenCLInfo.h"
 
@@ -45,8 +45,8 @@ void expectNothingLoaded()
                                   "OpenCL evaluator failed to initialize clew.\n");
 }
 
-// Loads a copy of the scripted runtime in which no symbol has this name. It is what the library
-// gets when it opens OpenCL by name, since it is in the process already.
+// Loads a copy of the scripted runtime without this symbol. The library then gets this copy when it
+// opens OpenCL by name, because it is loaded already.
 void loadRuntimeWithout(const std::string& function)
 {
     const std::filesystem::path original = VYRA_FAKE_OPENCL;
@@ -54,19 +54,19 @@ void loadRuntimeWithout(const std::string& function)
     std::filesystem::create_directories(folder);
     std::ifstream input(original, std::ios::binary);
     std::string bytes{std::istreambuf_iterator<char>(input), {}};
-    // The last letter: a table of names stays sorted.
+    // Changes the last letter: the table of names stays sorted.
     const std::string name = '\0' + function + '\0';
     for (std::size_t at = bytes.find(name); at != std::string::npos; at = bytes.find(name, at + 1))
         bytes[at + function.size()] = '_';
     const std::filesystem::path copy = folder / original.filename();
     std::ofstream(copy, std::ios::binary) << bytes;
     EXPECT_NE(loadLibrary(copy.string().c_str()), nullptr);
-    std::error_code inUse; // Windows removes no library that is loaded
+    std::error_code inUse; // Windows cannot remove a loaded library
     std::filesystem::remove_all(folder, inUse);
 }
 
-// CTest puts a file on the search path that is no library.
-TEST(WithoutOpenCL, StartUpStopsAndCallsOfTheHostDoNothing)
+// CTest puts a file that is not a library on the search path.
+TEST(WithoutOpenCL, StartUpStopsAndHostCallsDoNothing)
 {
     expectNothingLoaded();
     TopenCLInfo::finish();
@@ -78,7 +78,7 @@ TEST(WithoutOpenCL, StartUpStopsAndCallsOfTheHostDoNothing)
     std::size_t local = 4;
     EXPECT_EQ(TopenCLInfo::theOne().getWorkGroupSizes(nullptr, 1, global, local),
               CL_DEVICE_NOT_FOUND);
-    EXPECT_EQ(global + local, 7U) << "written in spite of the failure";
+    EXPECT_EQ(global + local, 7U) << "written despite the failure";
 }
 
 class WithoutOneFunction : public ::testing::TestWithParam<std::string> {};
@@ -91,7 +91,7 @@ TEST_P(WithoutOneFunction, StartUpStops)
 INSTANTIATE_TEST_SUITE_P(OpenCL, WithoutOneFunction, ::testing::ValuesIn(requiredFunctions()),
                          [](const auto& row) { return row.param; });
 
-TEST(WithoutOpenCL, AFunctionThatTheLibraryDoesNotCallMayBeMissing)
+TEST(WithoutOpenCL, MissingUncalledFunctionIsAccepted)
 {
     loadRuntimeWithout("clReleaseContext");
     EXPECT_NE(printedByStartUp().find("failed to find OpenCL device"), std::string::npos);

@@ -16,7 +16,7 @@ Zyl::Objects::AMemoryMonitor& monitor()
     return Zyl::Objects::ObjModel::MemoryMonitor(0);
 }
 
-TEST(DeviceMemory, KeepsThePeakWhenMemoryIsGivenBack)
+TEST(DeviceMemory, ReducingKeepsPeak)
 {
     monitor().AddToDeviceMemory(100);
     TresourceGuard::initializeOffset();
@@ -29,15 +29,15 @@ TEST(DeviceMemory, KeepsThePeakWhenMemoryIsGivenBack)
     EXPECT_EQ(deviceMemoryUse().offsetBytes, 100u);
 }
 
-TEST(DeviceMemory, LosesNoByteAndNoPeakBetweenThreads)
+TEST(DeviceMemory, ConcurrentUseLosesNeitherBytesNorPeak)
 {
     using Clock = std::chrono::steady_clock;
     const auto latest = Clock::now() + std::chrono::seconds(2); // for a busy machine
     const std::size_t peakBefore = deviceMemoryUse().peakBytes;
     monitor().AddToDeviceMemory(peakBefore - deviceMemoryUse().currentBytes);
 
-    // The threads meet again and again. They spin, since a lost peak takes both within nanoseconds,
-    // and a thread that slept comes late.
+    // The threads meet repeatedly. They spin, because a peak is lost only if both add within
+    // nanoseconds.
     std::atomic<unsigned int> arrived = 0;
     const auto meet = [&] {
         const unsigned int everybody = (arrived.fetch_add(1) / 2 + 1) * 2;

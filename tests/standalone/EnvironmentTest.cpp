@@ -11,14 +11,14 @@ namespace {
 constexpr const char* variable = "VYRA_HOST_TEST_VARIABLE";
 constexpr std::int32_t defaultValue = -77;
 
-// What the variable reads as when it has that text.
+// Returns the value of the variable with this text.
 std::int32_t read(const char* text)
 {
     setEnvironment(variable, text);
     return TenvironmentVariable(variable).asInt32(defaultValue);
 }
 
-TEST(Environment, ReadsWholeIntegersAndNothingElse)
+TEST(Environment, AsInt32ReadsWholeIntegersOnly)
 {
     EXPECT_EQ(read("-42"), -42);
     EXPECT_EQ(read("2147483647"), INT32_MAX);
@@ -31,12 +31,12 @@ TEST(Environment, ReadsWholeIntegersAndNothingElse)
         EXPECT_EQ(read(text), defaultValue) << text;
 }
 
-TEST(Environment, AnswersTheDefaultForAMissingVariable)
+TEST(Environment, AsInt32ReturnsDefaultForMissingVariable)
 {
     removeEnvironment(variable);
     EXPECT_EQ(VyraGetEnv(variable), nullptr);
     EXPECT_EQ(TenvironmentVariable(variable).asInt32(defaultValue), defaultValue);
-#ifndef _WIN32 // where a variable that is set to the empty text is removed
+#ifndef _WIN32 // setting the empty text removes a variable there
     setEnvironment(variable, "");
     EXPECT_STREQ(VyraGetEnv(variable), "");
 #endif

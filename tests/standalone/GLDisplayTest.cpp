@@ -10,13 +10,13 @@ namespace {
 
 using GLDisplayTest = GLTest;
 
-TEST_P(GLDisplayTest, IsThatOfTheCallersContext)
+TEST_P(GLDisplayTest, DisplayIsThatOfCurrentContext)
 {
     using namespace QNativeInterface;
     const bool isEGL = std::get<std::string>(GetParam()) == "xcb_egl";
     const auto* const egl = context().nativeInterface<QEGLContext>();
     if (isEGL && !egl)
-        GTEST_SKIP() << "this Qt makes no EGL contexts on X";
+        GTEST_SKIP() << "this Qt creates no EGL contexts on X";
     const void* display =
         egl ? egl->display() : qGuiApp->nativeInterface<QX11Application>()->display();
     const GLDisplayProperty property = glDisplayProperty(nullptr);

@@ -6,7 +6,7 @@
 
 namespace {
 
-// QGuiApplication keeps references to both for as long as it lives.
+// QGuiApplication keeps references to both.
 int argumentCount = 1;
 char programName[] = "vyra-host-gl-tests";
 char* arguments[] = {programName, nullptr};

@@ -12,10 +12,11 @@
 #include <string>
 #include <tuple>
 
-// QT_XCB_GL_INTEGRATION, which says what interface Qt uses on X, and whether there is a window.
+// The value of QT_XCB_GL_INTEGRATION, which selects Qt's interface on X, and whether there is a
+// window.
 using GLKind = std::tuple<std::string, bool>;
 
-// Every kind, to instantiate a test with, and what it is called.
+// All kinds, to instantiate a test with, and their names.
 inline const auto allGLKinds = testing::Combine(
     testing::Values(std::string("xcb_glx"), std::string("xcb_egl")), testing::Bool());
 std::string nameOf(const testing::TestParamInfo<GLKind>& info);
@@ -34,7 +35,7 @@ protected:
     void makeCurrent() const;
 
 private:
-    // A context goes before the surface that it is current on, the application last.
+    // Destroyed in reverse order: the context before its surface, the application last.
     std::unique_ptr<QGuiApplication> fApplication;
     std::unique_ptr<QOpenGLWindow> fWindow;
     std::unique_ptr<QOffscreenSurface> fSurface;

@@ -23,7 +23,7 @@ using Clock = std::chrono::steady_clock;
 
 constexpr std::uint64_t aSecondNs = 1'000'000'000;
 
-// The result of `function`, run on a thread that has no OpenGL context.
+// Returns the result of `function`, run on a thread that has no OpenGL context.
 template <class Function>
 auto onForeignThread(Function function)
 {
@@ -61,7 +61,7 @@ protected:
 using GLHostAnyContext = GLHostTest;
 INSTANTIATE_TEST_SUITE_P(Contexts, GLHostAnyContext, allGLKinds, nameOf);
 
-TEST_P(GLHostAnyContext, RegistersWhileItLivesAndOnItsThreadOnly)
+TEST_P(GLHostAnyContext, ConstructorRegistersOnItsThreadUntilDestruction)
 {
     ASSERT_NE(GLFunctionTable::fpGlobalFunctionTable, nullptr);
     EXPECT_TRUE(table().syncObjectsUsable());
@@ -76,7 +76,7 @@ TEST_P(GLHostAnyContext, RegistersWhileItLivesAndOnItsThreadOnly)
     EXPECT_EQ(Q3dPort::resourceWindow(), nullptr);
 }
 
-TEST_P(GLHostAnyContext, FencesPassBetweenTheRendererAndForeignThreads)
+TEST_P(GLHostAnyContext, FencesWorkAcrossThreads)
 {
     const GLsync ours = makeFence();
     ASSERT_TRUE(isSync(ours));
@@ -89,7 +89,7 @@ TEST_P(GLHostAnyContext, FencesPassBetweenTheRendererAndForeignThreads)
     onForeignThread([ours] { table().glDeleteSync(ours); });
     EXPECT_FALSE(isSync(ours)) << "not deleted";
 
-    // The other way round, without a flush: a foreign thread has no context to flush.
+    // In the other direction, without a flush: a foreign thread has no context to flush.
     const GLsync theirs = onForeignThread(makeFence);
     ASSERT_TRUE(isSync(theirs));
     table().glWaitSync(theirs, 0, GL_TIMEOUT_IGNORED);
@@ -99,11 +99,11 @@ TEST_P(GLHostAnyContext, FencesPassBetweenTheRendererAndForeignThreads)
     EXPECT_EQ(gl().glGetError(), static_cast<GLenum>(GL_NO_ERROR));
 }
 
-// A machine's window system has no say in what follows.
+// The following tests do not depend on the window system.
 using GLHostOnce = GLHostTest;
 INSTANTIATE_TEST_SUITE_P(Contexts, GLHostOnce, testing::Values(GLKind("xcb_glx", true)), nameOf);
 
-// Draws for at least `duration`, as far as the GPU is concerned, behind all earlier commands.
+// Enqueues drawing that takes the GPU at least `duration`, after all earlier commands.
 void drawFor(QOpenGLExtraFunctions& gl, std::chrono::milliseconds duration)
 {
     QOpenGLShaderProgram program;
@@ -127,7 +127,7 @@ void drawFor(QOpenGLExtraFunctions& gl, std::chrono::milliseconds duration)
         program.setUniformValue("rounds", rounds);
         gl.glDrawArrays(GL_TRIANGLES, 0, 3);
     };
-    // How long a round takes depends on the machine: double until it is long enough.
+    // The time of a round depends on the machine: double the work until it suffices.
     for (auto taken = Clock::duration::zero(); taken < duration; rounds *= 2) {
         const auto start = Clock::now();
         draw();
@@ -137,7 +137,7 @@ void drawFor(QOpenGLExtraFunctions& gl, std::chrono::milliseconds duration)
     draw();
 }
 
-TEST_P(GLHostOnce, ForeignWaitsTimeOutAndShareTheHiddenContext)
+TEST_P(GLHostOnce, ForeignWaitsTimeOutAndShareHiddenContext)
 {
     ASSERT_NO_FATAL_FAILURE(drawFor(gl(), 500ms));
     const GLsync fence = makeFence();
@@ -157,14 +157,14 @@ TEST_P(GLHostOnce, ForeignWaitsTimeOutAndShareTheHiddenContext)
         waiting = false;
     });
     const GLsync other = onForeignThread(makeFence);
-    EXPECT_TRUE(waiting.load()) << "the fence came too late";
+    EXPECT_TRUE(waiting.load()) << "the fence was created too late";
     waiter.join();
     EXPECT_FALSE(onForeignThread([&] { return timedOut(0); })) << "the wait ended too early";
     table().glDeleteSync(other);
     table().glDeleteSync(fence);
 }
 
-TEST_P(GLHostOnce, ContextsOfOtherShareGroupsGoThroughTheHiddenOne)
+TEST_P(GLHostOnce, ContextsOfOtherShareGroupsUseHiddenContext)
 {
     QOffscreenSurface surface;
     surface.create();
@@ -173,11 +173,11 @@ TEST_P(GLHostOnce, ContextsOfOtherShareGroupsGoThroughTheHiddenOne)
     const GLsync fence = makeFence();
     EXPECT_EQ(QOpenGLContext::currentContext(), &stranger);
     makeCurrent();
-    EXPECT_TRUE(isSync(fence)) << "made in a context that the renderer cannot see";
+    EXPECT_TRUE(isSync(fence)) << "created in a context that does not share with the renderer";
     table().glDeleteSync(fence);
 }
 
-TEST_P(GLHostOnce, SyncsFromCLEventsFollowTheEvent)
+TEST_P(GLHostOnce, SyncFromCLEventFollowsEvent)
 {
     cl_platform_id platform = nullptr;
     cl_device_id device = nullptr;
@@ -196,7 +196,7 @@ TEST_P(GLHostOnce, SyncsFromCLEventsFollowTheEvent)
         return isSignalledNow;
     };
 
-    // Either the sync comes late, as the host's own does, or it comes early and unsignalled.
+    // The sync object is returned after the event (as the host's own), or earlier and unsignalled.
     auto early = std::async(std::launch::async, [&] { return signals(createSync(event)); });
     EXPECT_EQ(early.wait_for(300ms), std::future_status::timeout) << "signalled before the event";
     clSetUserEventStatus(event, CL_COMPLETE);
@@ -205,7 +205,7 @@ TEST_P(GLHostOnce, SyncsFromCLEventsFollowTheEvent)
     EXPECT_TRUE(isSync(here));
     EXPECT_TRUE(signals(here));
 
-    // A command that failed has ended too.
+    // A failed command has ended, too.
     const cl_event failed = clCreateUserEvent(openCL, nullptr);
     clSetUserEventStatus(failed, CL_OUT_OF_RESOURCES);
     const GLsync ofFailed = onForeignThread([&] { return createSync(failed); });

@@ -1,4 +1,4 @@
-// Prints the resource directory that the library beside this program finds.
+// Prints the resource directory that the library next to this program finds.
 #include "host/Application.h"
 
 #include <cstdio>

@@ -64,12 +64,12 @@ TEST(Profiler, RecordsNothingWhileNotSampling)
     EXPECT_TRUE(readTrace().empty());
 }
 
-TEST(Profiler, WritesEventsAsTheyWere)
+TEST(Profiler, TraceContainsRecordedEvents)
 {
     const std::string name = "\"quoted\" \\ back\nslash \x01 \xc3\xa9";
     ProfileRecorder::start();
     const std::int64_t beforeNs = ProfileRecorder::nowNs();
-    // The texts may go before the trace is written.
+    // The texts may be destroyed before the trace is written.
     const profiler::EventId id =
         profiler::eventBegin(7, 3, std::string(name).c_str(), "why\t\"so\"", nullptr, 0);
     std::this_thread::sleep_for(std::chrono::milliseconds(2));
@@ -90,7 +90,7 @@ TEST(Profiler, WritesEventsAsTheyWere)
     EXPECT_LE(start + duration, static_cast<double>(afterNs) / 1000.0 + 0.001);
 }
 
-TEST(Profiler, KeepsEveryEventOfEveryThreadInARowOfItsOwn)
+TEST(Profiler, EachThreadHasItsOwnTrack)
 {
     constexpr int threadCount = 8;
     constexpr std::size_t eventsPerThread = 2'000;
@@ -118,7 +118,7 @@ TEST(Profiler, KeepsEveryEventOfEveryThreadInARowOfItsOwn)
     }
 }
 
-TEST(Profiler, KeepsTracksApartAndTheirTimesExact)
+TEST(Profiler, RecordedTracksAreSeparateWithExactTimes)
 {
     ProfileRecorder::start();
     ProfileRecorder::record("queue 1", "copy", 1'000'000'000'001'500, 1'000'000'000'002'750);
@@ -138,7 +138,7 @@ TEST(Profiler, KeepsTracksApartAndTheirTimesExact)
     EXPECT_NE(kernel["tid"], copy["tid"]);
 }
 
-TEST(Profiler, EndsTheRightEventOrNone)
+TEST(Profiler, EventEndEndsMatchingEventOrNone)
 {
     ProfileRecorder::start();
     const profiler::EventId stale = begin("stale");
@@ -158,7 +158,7 @@ TEST(Profiler, EndsTheRightEventOrNone)
     EXPECT_EQ(readTrace().at("open").front()["ph"], "X");
 }
 
-TEST(Profiler, SaysWhenTheFileCannotBeWritten)
+TEST(Profiler, WriteChromeTraceReportsUnwritableFile)
 {
     EXPECT_FALSE(ProfileRecorder::writeChromeTrace("/nonexistent-directory/trace.json"));
     ProfileRecorder::start();

@@ -10,8 +10,8 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// An installation of the library and of a program that prints what it answers.
-TEST(ResourceLocation, IsInTheInstallationOrElseInTheSourceTree)
+// An installation of the library and of a program that prints its resource directory.
+TEST(ResourceLocation, IsInInstallationElseInSourceTree)
 {
     const fs::path prefix = fs::canonical(fs::temp_directory_path()) /
                             ("vyra-resources-" + std::to_string(std::random_device()()));

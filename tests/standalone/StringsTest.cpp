@@ -14,7 +14,7 @@
 
 namespace {
 
-// Published values of FNV-1a; the sign of char must not leak into them.
+// Published values of FNV-1a; they do not depend on the sign of char.
 TEST(Hashes, EqualFnv1a)
 {
     EXPECT_EQ(Tstring("").hash(), 0x811c9dc5u);
@@ -24,7 +24,7 @@ TEST(Hashes, EqualFnv1a)
     EXPECT_EQ(Tstring("\xff").hash(), (0x811c9dc5u ^ 0xffu) * 0x01000193u);
 }
 
-TEST(Hashes, OfPlugsTakeBothHalves)
+TEST(Hashes, PlugHashDependsOnBothHalves)
 {
     constexpr std::uint64_t side = 100;
     std::set<std::uint64_t> hashes;
@@ -36,13 +36,13 @@ TEST(Hashes, OfPlugsTakeBothHalves)
     EXPECT_FALSE(Tplug(0, 1) == Tplug::fsNULL);
 }
 
-TEST(String, CutsExtendsWithNulBytesAndAppends)
+TEST(String, ResizeCutsOrExtendsWithNulBytesAndAppendAppends)
 {
     Tstring text("abc");
     text.setLength(5);
     ASSERT_EQ(text.length(), 5u);
     EXPECT_EQ(std::string_view(text.asChar(), 6), std::string_view("abc\0\0\0", 6));
-    // A byte string: what stands behind a NUL counts.
+    // A byte string: bytes after a NUL are part of it.
     EXPECT_FALSE(text == Tstring("abc"));
     EXPECT_NE(text.hash(), Tstring("abc").hash());
     text.setLength(1);
@@ -85,10 +85,10 @@ TEST(String, TrimsSpacesOnlyAndOnlyOutside)
     }
 }
 
-TEST(UniqueString, GivesAllThreadsOneHandleForOneText)
+TEST(UniqueString, EqualTextsHaveOneHandleOnAllThreads)
 {
     constexpr std::size_t threadCount = 8;
-    // More than the table has buckets, so that some texts meet in one.
+    // More than the table has buckets, so that some texts share one.
     std::vector<std::string> texts(40'000);
     for (std::size_t i = 0; i < texts.size(); ++i)
         texts[i] = "node" + std::to_string(i) + ".attribute";
@@ -98,7 +98,7 @@ TEST(UniqueString, GivesAllThreadsOneHandleForOneText)
     for (std::size_t thread = 0; thread < threadCount; ++thread)
         threads.emplace_back([&, thread] {
             for (std::size_t i = 0; i < texts.size(); ++i) {
-                // Pairs of threads walk the same way and meet at each text.
+                // Pairs of threads use the same order, so that both intern each text at once.
                 const std::size_t at = (thread / 2 * 100 + i) % texts.size();
                 handles[thread][at] = TuniqueString(texts[at].c_str());
             }
@@ -109,7 +109,7 @@ TEST(UniqueString, GivesAllThreadsOneHandleForOneText)
     EXPECT_EQ(handles, std::vector(threadCount, handles[0]));
 }
 
-TEST(UniqueString, KeepsTextsApartAlsoThoseOfEqualHash)
+TEST(UniqueString, DifferentTextsDifferEvenWithEqualHash)
 {
     const TuniqueString one("8yn0iYCKYHlIj4-BwPqk");
     const TuniqueString other("GReLUrM4wMqfg9yzV3KQ");

@@ -13,7 +13,7 @@ using testing::ElementsAre;
 using testing::FieldsAre;
 using testing::StrEq;
 
-TEST(TraceChannels, ListsTheChannelsThatExist)
+TEST(TraceChannels, TraceChannelsListsExistingChannels)
 {
     std::ostringstream output;
     auto first = std::make_unique<TdbTrace>(1, "first", output, "of two");

@@ -1,4 +1,4 @@
-// Decides which allocations fail, and replaces what oneTBB's containers call.
+// Selects the allocations that fail, and replaces the functions that oneTBB's containers call.
 #include "FailingAllocations.h"
 
 #include "ReplacedOperators.h"

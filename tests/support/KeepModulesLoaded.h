@@ -6,8 +6,8 @@
 #include <dlfcn.h>
 #include <link.h>
 
-// Keeps what is loaded now until the process ends: what the static objects of a driver hold reads
-// as leaked once the driver is unloaded.
+// Keeps all loaded modules until the process ends: memory that static objects of a driver own is
+// reported as leaked after the driver is unloaded.
 inline void keepModulesLoaded()
 {
     dl_iterate_phdr(

@@ -1,4 +1,4 @@
-// What tests ask of the operating system.
+// Operating-system functions for tests.
 #pragma once
 
 #include <string>
@@ -7,10 +7,10 @@
 void setEnvironment(const char* name, const char* value);
 void removeEnvironment(const char* name);
 
-// A shared library of that path, or null; the address of its symbol. Unloading ends with the last.
+// Loads a shared library, null on failure; returns the address of a symbol; unloads the library.
 void* loadLibrary(const char* path);
 void* symbolOf(void* library, const char* name);
 void unloadLibrary(void* library);
 
-// What `program`, run without arguments, writes to standard output, without the end of the line.
+// Runs `program` without arguments. Returns its standard output without the final line break.
 std::string outputOf(const std::string& program);

@@ -1,4 +1,4 @@
-// Access to a private member, where a rule shows nowhere else. In the global namespace:
+// Access to a private member, for rules without another observable effect. In the global namespace:
 //
 //     struct Size : PrivateMember<std::size_t List::*> {
 //         friend Type memberOf(Size);

@@ -9,7 +9,7 @@
 
 namespace {
 
-// Windows has no aligned memory that free() takes.
+// On Windows, free() does not accept aligned memory.
 #ifdef _WIN32
 void* allocateAligned(std::size_t size, std::size_t alignment)
 {
@@ -52,7 +52,7 @@ void* operator new(std::size_t size, std::align_val_t alignment)
         throw std::bad_alloc();
     return memory;
 }
-// A sanitizer's own would not come by.
+// A sanitizer's own operators would bypass these.
 void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
 {
     return operator new(size, std::nothrow);
@@ -61,7 +61,7 @@ void* operator new[](std::size_t size)
 {
     return operator new(size);
 }
-// Not inlined, or a compiler sees free where it expects the counterpart of new.
+// Not inlined: otherwise compilers warn that free does not match new.
 [[gnu::noinline]] void operator delete(void* memory) noexcept
 {
     std::free(memory);

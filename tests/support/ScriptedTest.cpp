@@ -21,7 +21,7 @@ void keepWarning(const char* text)
 
 void* opaque(std::uintptr_t number)
 {
-    // NOLINTNEXTLINE(performance-no-int-to-ptr): nobody looks behind the host's handles.
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): the host's handles are never dereferenced.
     return reinterpret_cast<void*>(number);
 }
 
@@ -47,7 +47,7 @@ void ScriptedTest::TearDown()
     Lines expected = leftByStart;
     expected.insert(expected.end(), fExpectedLeft.begin(), fExpectedLeft.end());
     EXPECT_EQ(livingObjects(), expected) << "objects left alive";
-    EXPECT_EQ(runtime().takeMisuse(), fExpectedMisuse) << "wrong use of the runtime";
+    EXPECT_EQ(runtime().takeMisuse(), fExpectedMisuse) << "misuse of the runtime";
     EXPECT_EQ(warnings(), Lines{}) << "warnings that the test did not read";
 }
 

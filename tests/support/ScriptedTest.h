@@ -1,7 +1,7 @@
 // The fixture of all tests on the scripted runtime.
 //
 // Start-up happens once per process, so each test is a process of its own: run them through CTest.
-// A test ends with every object accounted for, every wrong use declared and every warning read.
+// When a test ends, every object must be released, every misuse declared and every warning read.
 #pragma once
 
 #include "Platform.h"
@@ -19,7 +19,7 @@ namespace scripted {
 
 using Lines = std::vector<std::string>;
 
-// What the host passes to start-up.
+// The arguments of TopenCLInfo::initialize.
 struct StartArguments {
     std::uintptr_t window = 3;
     std::uintptr_t graphicsContext = 5;
@@ -30,7 +30,7 @@ struct StartArguments {
 
 // A row of a table of tests is derived from its name, which is its first initialiser.
 struct Named {
-    // Implicit: a row begins with the bare text.
+    // Implicit, so that a row begins with the text.
     Named(const char* text) : name(text) {}
 
     const char* name;
@@ -42,13 +42,13 @@ protected:
     ScriptedTest();
     void TearDown() override;
 
-    // Describes `world` to the runtime and starts the library; returns whether it is valid. What
-    // start-up prints, logs and leaves alive is taken as given from here on.
+    // Describes `world` to the runtime and starts the library; returns whether it is valid. The
+    // output, calls and objects of start-up are dropped.
     bool start();
-    // The same, keeping what start-up prints and logs for the test to read.
+    // The same, but keeps the output and calls of start-up for the test.
     bool startWatched();
 
-    // Starts in these synchronisation modes, which the environment demands.
+    // Starts in these synchronisation modes, set by environment variables.
     void startInModes(int graphicsToCL, int clToGraphics);
 
     // Since the last reading: all calls, those whose text begins with `prefix`, and the warnings.
@@ -56,9 +56,9 @@ protected:
     Lines callsOf(const std::string& prefix);
     static Lines warnings();
 
-    // The test leaves wrong use, which some rules prescribe after a failure; in order.
+    // Declares misuse, which some rules require after a failure; in order.
     void expectMisuse(const std::string& note) { fExpectedMisuse.push_back(note); }
-    // Objects that stay alive beyond those of start-up.
+    // Declares objects that remain at the end, besides those of start-up.
     void expectLeft(const Lines& objects) { fExpectedLeft = objects; }
 
     World world;
@@ -66,7 +66,7 @@ protected:
     std::vector<Fault> faults; // of start-up
     std::string printedError;  // what start-up wrote to standard error
     std::string printedOutput; // and to standard output
-    Lines leftByStart;         // what start-up left alive, besides platforms and devices
+    Lines leftByStart;         // objects that start-up left, except platforms and devices
 
 private:
     Lines fExpectedMisuse;

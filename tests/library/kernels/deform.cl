@@ -1,4 +1,4 @@
-// Two deformers whose results tell in which order they ran. Work-items beyond `count` are padding.
+// Two deformers whose results depend on the order in which they ran. Work-items from `count` on are padding.
 
 __kernel void add(__global float* data, float amount, uint count)
 {

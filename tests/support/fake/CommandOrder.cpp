@@ -5,7 +5,7 @@
 
 namespace scripted {
 
-// Adds a command, and what comes before it, to those that come before another one.
+// Adds a command, and all commands before it, to the commands before another one.
 void CommandOrder::merge(std::map<const void*, unsigned>& after, unsigned number) const
 {
     if (number == 0)

@@ -1,4 +1,4 @@
-// The commands that were enqueued: which of them come before which, and which are not complete.
+// The order of enqueued commands, and which of them are not complete.
 #pragma once
 
 #include <map>
@@ -8,7 +8,7 @@
 namespace scripted {
 
 // Queues are in order. A command comes after another one if it is later on the same queue, if its
-// wait list says so, directly or through other commands, or if the host had seen the other one
+// wait list contains it, directly or through other commands, or if the host had seen the other one
 // complete when it was enqueued.
 class CommandOrder {
 public:
@@ -18,25 +18,25 @@ public:
         std::vector<const void*> mems;         // memory objects that it uses
     };
 
-    // Commands that are added while `hold` is true complete when somebody waits for them, or with
+    // Commands that are added while `hold` is true complete when the host waits for them, or with
     // completeAll. Others are complete at once, though the host has not seen it.
     void hold(bool hold) { fHold = hold; }
 
-    // A command that would be enqueued on `queue` after these commands.
+    // Returns a command on `queue` after these commands.
     Command next(const void* queue, const std::vector<unsigned>& waits) const;
     // Adds it, and returns its number, counted from 1.
     unsigned add(Command command);
     bool precedes(unsigned first, const Command& second) const;
 
-    // The host sees a command complete, and so all that come before it; 0 is none.
+    // Records that the host has seen a command, and all before it, complete; 0 is none.
     void observe(unsigned number);
     void observeQueue(const void* queue);
     void completeAll() { fPending.clear(); }
-    // The queue is gone; its commands count as complete.
+    // Removes a queue; its commands count as complete.
     void forget(const void* queue);
 
     bool isPending(unsigned number) const { return fPending.contains(number); }
-    // Whether a command that is not complete uses a memory object.
+    // Returns whether an incomplete command uses a memory object.
     bool isInUse(const void* mem) const;
 
 private:

@@ -7,7 +7,7 @@
 namespace scripted {
 namespace {
 
-// What a runtime answers to a handle of the kind that is not alive, in the order of Kind.
+// The status for a handle of the kind that does not exist, in the order of Kind.
 constexpr std::array<cl_int, kKindCount> kInvalid = {
     CL_INVALID_PLATFORM,      CL_INVALID_DEVICE,     CL_INVALID_CONTEXT,
     CL_INVALID_COMMAND_QUEUE, CL_INVALID_MEM_OBJECT, CL_INVALID_EVENT,
@@ -133,7 +133,7 @@ cl_int Entry::command(cl_command_queue queue, const WaitList& list, cl_event* ev
                       const Mems& mems, bool blocking)
 {
     CommandOrder::Command next = nextCommand(queue, list);
-    const bool isOrdered = ok(); // otherwise it is not known what it waits for
+    const bool isOrdered = ok(); // otherwise its wait list is unknown
     std::vector<Object*> shared;
     for (cl_mem mem : mems) {
         Object* used = usableMem(mem);
@@ -205,7 +205,7 @@ unsigned Entry::nextClientWait()
     return result;
 }
 
-cl_int Entry::answer(cl_uint query, const void* data, std::size_t size, std::size_t room,
+cl_int Entry::answer(cl_uint query, const void* data, std::size_t size, std::size_t capacity,
                      void* value, std::size_t* sizeReturned)
 {
     if (ok() && world().emptyAnswers.contains(query)) {
@@ -213,7 +213,7 @@ cl_int Entry::answer(cl_uint query, const void* data, std::size_t size, std::siz
             *sizeReturned = 0;
         return fStatus;
     }
-    if (!ok() || !require(!value || room >= size, CL_INVALID_VALUE, "no room for the answer"))
+    if (!ok() || !require(!value || capacity >= size, CL_INVALID_VALUE, "the value is too small"))
         return fStatus;
     if (value && size > 0)
         std::memcpy(value, data, size);

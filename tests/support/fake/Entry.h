@@ -25,8 +25,8 @@ struct PropertyList {
     const cl_context_properties* items;
 };
 
-// Two things set the status of a call: a planned fault, and wrong use, which is noted as well.
-// A call that has a status does nothing, save for retains and releases.
+// The status of a call is set by a planned fault or by misuse, which is also noted. A call that has
+// a status does nothing, except retains and releases.
 class Entry {
 public:
     template <typename... Arguments>
@@ -48,31 +48,31 @@ public:
     }
     bool ok() const { return fStatus == CL_SUCCESS; }
     cl_int status() const { return fStatus; }
-    bool withHandle() const { return fWithHandle; } // does its work although it fails
+    bool withHandle() const { return fWithHandle; } // has its effect although it fails
 
-    // Sets the status that a runtime gives to right use, such as a program that does not build.
+    // Sets an error status that is not caused by misuse, such as a program that does not build.
     cl_int answerWith(cl_int status) { return fStatus = status; }
-    // Notes wrong use unless `holds`, and returns it.
+    // Notes misuse unless `holds`. Returns `holds`.
     bool require(bool holds, cl_int status, const std::string& note);
-    // The living object, or null after noting wrong use.
+    // Returns the existing object, or null after noting misuse.
     Object* object(Kind kind, const void* handle);
     void requireWaitList(const WaitList& list);
 
     cl_int retain(Kind kind, const void* handle);
     cl_int release(Kind kind, const void* handle);
-    // Adds what the arguments do not show to the call's line.
+    // Appends text to the call's line in the log.
     template <typename T>
     void describe(const char* what, const List<T>& list)
     {
         fLine += what + text(list);
     }
-    // Makes the call's result, unless the call has a status.
+    // Creates the call's result, unless the call has a status.
     template <typename T>
     T create(Kind kind)
     {
         return static_cast<T>(createHandle(kind));
     }
-    // Hands out what the call made, with its status.
+    // Returns the result of the call, with its status.
     template <typename T>
     T result(T handle, cl_int* error)
     {
@@ -80,35 +80,35 @@ public:
             *error = fStatus;
         return handle;
     }
-    // The living memory object that a command may use, or null: a renderer's only if acquired.
+    // Returns the existing memory object that a command may use, or null; a shared one only if
+    // acquired.
     Object* usableMem(cl_mem mem);
     // Ends an enqueued command: checks its queue, its wait list and the memory that it uses, and
-    // makes its event if `event` is not null.
+    // creates its event if `event` is not null.
     cl_int command(cl_command_queue queue, const WaitList& list, cl_event* event,
                    const Mems& mems = {}, bool blocking = false);
     // Ends an enqueued acquire or release of these objects.
     cl_int changeSide(cl_command_queue queue, const WaitList& list, cl_event* event,
                       const std::vector<Object*>& objects, bool acquire);
-    // The host waits for an event, or for all commands of a queue.
+    // Completes the commands before an event, or all commands of a queue.
     void waitFor(const Object& event) { fRuntime.fCommands.observe(event.command); }
     void waitForQueue(cl_command_queue queue) { fRuntime.fCommands.observeQueue(queue); }
     bool isPending(const Object& event) const
     {
         return fRuntime.fCommands.isPending(event.command);
     }
-    // The result that a test has scripted for the next creation from a renderer's buffer, of a
-    // kernel, or for the next wait of an OpenGL client.
+    // Returns the scripted result of the next shared buffer, kernel, or OpenGL client wait.
     std::optional<cl_mem> nextSharedMem() { return std::exchange(fRuntime.fNextSharedMem, {}); }
     cl_kernel nextKernel() { return std::exchange(fRuntime.fNextKernel, nullptr); }
     unsigned nextClientWait();
     void rememberNotify(ContextNotify notify) { fRuntime.fNotify = notify; }
     // Ends a query.
-    cl_int answer(cl_uint query, const void* data, std::size_t size, std::size_t room, void* value,
-                  std::size_t* sizeReturned);
-    cl_int answer(cl_uint query, const std::string& data, std::size_t room, void* value,
+    cl_int answer(cl_uint query, const void* data, std::size_t size, std::size_t capacity,
+                  void* value, std::size_t* sizeReturned);
+    cl_int answer(cl_uint query, const std::string& data, std::size_t capacity, void* value,
                   std::size_t* sizeReturned)
     {
-        return answer(query, data.c_str(), data.size() + 1, room, value, sizeReturned);
+        return answer(query, data.c_str(), data.size() + 1, capacity, value, sizeReturned);
     }
 
 private:

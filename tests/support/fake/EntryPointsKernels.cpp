@@ -24,14 +24,14 @@ Mems memoryOf(Entry& call, const Object& kernel)
 
 extern "C" {
 
-cl_int clGetKernelInfo(cl_kernel kernel, cl_kernel_info query, std::size_t room, void* value,
+cl_int clGetKernelInfo(cl_kernel kernel, cl_kernel_info query, std::size_t capacity, void* value,
                        std::size_t* size)
 {
     Entry call("clGetKernelInfo", kernel, query);
     const Object* object = call.object(Kind::kKernel, kernel);
     call.require(query == CL_KERNEL_NUM_ARGS, CL_INVALID_VALUE, "unknown query");
     const auto count = static_cast<cl_uint>(object ? object->arguments.size() : 0);
-    return call.answer(query, &count, sizeof count, room, value, size);
+    return call.answer(query, &count, sizeof count, capacity, value, size);
 }
 
 cl_int clSetKernelArg(cl_kernel kernel, cl_uint index, std::size_t size, const void* value)

@@ -26,7 +26,7 @@ void complete(Entry& call, Object& event)
     call.waitFor(event);
 }
 
-// A mapping's address: a number of its own that nobody looks behind.
+// The address of a mapping: a unique number that is never dereferenced.
 void* mappedAddress(cl_mem mem)
 {
     return reinterpret_cast<char*>(mem) + 8;
@@ -113,14 +113,14 @@ cl_int clEnqueueMarkerWithWaitList(cl_command_queue queue, cl_uint waitCount,
     return Entry("clEnqueueMarkerWithWaitList", queue, list).command(queue, list, event);
 }
 
-cl_int clGetMemObjectInfo(cl_mem mem, cl_mem_info query, std::size_t room, void* value,
+cl_int clGetMemObjectInfo(cl_mem mem, cl_mem_info query, std::size_t capacity, void* value,
                           std::size_t* size)
 {
     Entry call("clGetMemObjectInfo", mem, query);
     const Object* object = call.object(Kind::kMem, mem);
     call.require(query == CL_MEM_SIZE, CL_INVALID_VALUE, "unknown query");
     const std::size_t bytes = object ? object->size : 0;
-    return call.answer(query, &bytes, sizeof bytes, room, value, size);
+    return call.answer(query, &bytes, sizeof bytes, capacity, value, size);
 }
 
 cl_int clWaitForEvents(cl_uint count, const cl_event* events)
@@ -134,7 +134,7 @@ cl_int clWaitForEvents(cl_uint count, const cl_event* events)
     return call.status();
 }
 
-cl_int clGetEventInfo(cl_event event, cl_event_info query, std::size_t room, void* value,
+cl_int clGetEventInfo(cl_event event, cl_event_info query, std::size_t capacity, void* value,
                       std::size_t* size)
 {
     Entry call("clGetEventInfo", event, query);
@@ -148,10 +148,10 @@ cl_int clGetEventInfo(cl_event event, cl_event_info query, std::size_t room, voi
         object->statuses.pop_front();
     if (status == CL_COMPLETE)
         call.waitFor(*object);
-    return call.answer(query, &status, sizeof status, room, value, size);
+    return call.answer(query, &status, sizeof status, capacity, value, size);
 }
 
-cl_int clGetEventProfilingInfo(cl_event event, cl_profiling_info query, std::size_t room,
+cl_int clGetEventProfilingInfo(cl_event event, cl_profiling_info query, std::size_t capacity,
                                void* value, std::size_t* size)
 {
     Entry call("clGetEventProfilingInfo", event, query);
@@ -162,7 +162,7 @@ cl_int clGetEventProfilingInfo(cl_event event, cl_profiling_info query, std::siz
     // A microsecond a command, which runs from its start to its end.
     const cl_ulong nanoseconds =
         object ? 1000 * cl_ulong{object->command} + (query - CL_PROFILING_COMMAND_QUEUED) : 0;
-    return call.answer(query, &nanoseconds, sizeof nanoseconds, room, value, size);
+    return call.answer(query, &nanoseconds, sizeof nanoseconds, capacity, value, size);
 }
 
 } // extern "C"

@@ -53,7 +53,7 @@ cl_int clBuildProgram(cl_program program, cl_uint deviceCount, const cl_device_i
 }
 
 cl_int clGetProgramBuildInfo(cl_program program, cl_device_id device, cl_program_build_info query,
-                             std::size_t room, void* value, std::size_t* size)
+                             std::size_t capacity, void* value, std::size_t* size)
 {
     Entry call("clGetProgramBuildInfo", program, device, query);
     const Object* object = call.object(Kind::kProgram, program);
@@ -61,10 +61,10 @@ cl_int clGetProgramBuildInfo(cl_program program, cl_device_id device, cl_program
     if (!call.ok())
         return call.status();
     if (query == CL_PROGRAM_BUILD_LOG)
-        return call.answer(query, call.world().buildLog, room, value, size);
+        return call.answer(query, call.world().buildLog, capacity, value, size);
     call.require(query == CL_PROGRAM_BUILD_STATUS, CL_INVALID_VALUE, "unknown query");
     const cl_build_status status = object->built ? CL_BUILD_SUCCESS : CL_BUILD_ERROR;
-    return call.answer(query, &status, sizeof status, room, value, size);
+    return call.answer(query, &status, sizeof status, capacity, value, size);
 }
 
 cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
@@ -85,7 +85,7 @@ cl_kernel clCreateKernel(cl_program program, const char* name, cl_int* error)
 }
 
 cl_int clGetKernelWorkGroupInfo(cl_kernel kernel, cl_device_id device,
-                                cl_kernel_work_group_info query, std::size_t room, void* value,
+                                cl_kernel_work_group_info query, std::size_t capacity, void* value,
                                 std::size_t* size)
 {
     Entry call("clGetKernelWorkGroupInfo", kernel, device, query);
@@ -95,7 +95,7 @@ cl_int clGetKernelWorkGroupInfo(cl_kernel kernel, cl_device_id device,
     if (!call.ok())
         return call.status();
     const std::size_t groupSize = call.script(*object).workGroupSize;
-    return call.answer(query, &groupSize, sizeof groupSize, room, value, size);
+    return call.answer(query, &groupSize, sizeof groupSize, capacity, value, size);
 }
 
 } // extern "C"

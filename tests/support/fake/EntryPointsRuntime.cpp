@@ -18,20 +18,20 @@ const std::map<cl_platform_info, std::string PlatformScript::*> kPlatformTexts =
 
 extern "C" {
 
-cl_int clGetPlatformIDs(cl_uint room, cl_platform_id* platforms, cl_uint* count)
+cl_int clGetPlatformIDs(cl_uint capacity, cl_platform_id* platforms, cl_uint* count)
 {
-    Entry call("clGetPlatformIDs", room, platforms);
+    Entry call("clGetPlatformIDs", capacity, platforms);
     if (!call.ok())
         return call.status();
     const auto& all = call.platforms();
     if (platforms)
-        std::copy_n(all.begin(), std::min<std::size_t>(room, all.size()), platforms);
+        std::copy_n(all.begin(), std::min<std::size_t>(capacity, all.size()), platforms);
     if (count)
         *count = static_cast<cl_uint>(all.size());
     return CL_SUCCESS;
 }
 
-cl_int clGetPlatformInfo(cl_platform_id platform, cl_platform_info query, std::size_t room,
+cl_int clGetPlatformInfo(cl_platform_id platform, cl_platform_info query, std::size_t capacity,
                          void* value, std::size_t* size)
 {
     Entry call("clGetPlatformInfo", platform, query);
@@ -42,10 +42,10 @@ cl_int clGetPlatformInfo(cl_platform_id platform, cl_platform_info query, std::s
     if (!call.require(text != kPlatformTexts.end(), CL_INVALID_VALUE, "unknown query"))
         return call.status();
     const PlatformScript& script = call.world().platforms[object->index];
-    return call.answer(query, script.*text->second, room, value, size);
+    return call.answer(query, script.*text->second, capacity, value, size);
 }
 
-cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t room, void* value,
+cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t capacity, void* value,
                        std::size_t* size)
 {
     Entry call("clGetDeviceInfo", device, query);
@@ -54,15 +54,15 @@ cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t ro
         return call.status();
     const DeviceScript& script = call.script(*object);
     const auto number = [&](const auto& field) {
-        return call.answer(query, &field, sizeof field, room, value, size);
+        return call.answer(query, &field, sizeof field, capacity, value, size);
     };
     switch (query) {
     case CL_DEVICE_TYPE:
         return number(script.type);
     case CL_DEVICE_NAME:
-        return call.answer(query, script.name, room, value, size);
+        return call.answer(query, script.name, capacity, value, size);
     case CL_DRIVER_VERSION:
-        return call.answer(query, script.driverVersion, room, value, size);
+        return call.answer(query, script.driverVersion, capacity, value, size);
     case CL_DEVICE_AVAILABLE:
         return number(static_cast<cl_bool>(script.available));
     case CL_DEVICE_DOUBLE_FP_CONFIG:

@@ -1,4 +1,4 @@
-// Entry points of the sharing extensions, and the look-up through which alone they are found.
+// Entry points of the sharing extensions, and the look-up through which they are found.
 #include "fake/Entry.h"
 
 #include <algorithm>
@@ -52,7 +52,7 @@ cl_mem createShared(const SharingNames& names, cl_context context, cl_mem_flags 
     return call.result(mem, error);
 }
 
-// Acquire and release: every object has to be shared and on the other side.
+// Acquire and release: every object must be shared, and not acquired or acquired, respectively.
 template <const SharingNames& kNames, bool kAcquire>
 cl_int changeSide(cl_command_queue queue, cl_uint count, const cl_mem* mems, cl_uint waitCount,
                   const cl_event* waitList, cl_event* event)
@@ -81,14 +81,14 @@ cl_mem createFromGLBuffer(cl_context context, cl_mem_flags flags, cl_GLuint buff
 template <const SharingNames& kNames>
 cl_mem createFromD3DBuffer(cl_context context, cl_mem_flags flags, void* buffer, cl_int* error)
 {
-    // A Direct3D 11 buffer is a number in the log: its address, which tests choose.
+    // The log shows a Direct3D 11 buffer as a number: its address, which tests choose.
     return createShared(kNames, context, flags, reinterpret_cast<std::uintptr_t>(buffer), error);
 }
 
 cl_int getGLContextInfo(const cl_context_properties* properties, cl_gl_context_info query,
-                        std::size_t room, void* value, std::size_t* size)
+                        std::size_t capacity, void* value, std::size_t* size)
 {
-    Entry call("clGetGLContextInfoKHR", PropertyList{properties}, query, room);
+    Entry call("clGetGLContextInfoKHR", PropertyList{properties}, query, capacity);
     const auto& all = call.devices();
     std::vector<cl_device_id> answer;
     if (query == CL_DEVICES_FOR_GL_CONTEXT_KHR) {
@@ -100,21 +100,21 @@ cl_int getGLContextInfo(const cl_context_properties* properties, cl_gl_context_i
     } else {
         call.require(false, CL_INVALID_VALUE, "unknown query");
     }
-    return call.answer(query, answer.data(), answer.size() * sizeof(cl_device_id), room, value,
+    return call.answer(query, answer.data(), answer.size() * sizeof(cl_device_id), capacity, value,
                        size);
 }
 
 template <const SharingNames& kNames>
 cl_int getDeviceIDsFromD3D11(cl_platform_id platform, cl_uint source, void* object, cl_uint set,
-                             cl_uint room, cl_device_id* devices, cl_uint* count)
+                             cl_uint capacity, cl_device_id* devices, cl_uint* count)
 {
     Entry call(kNames.devices, platform, source, reinterpret_cast<std::uintptr_t>(object), set,
-               room);
+               capacity);
     call.object(Kind::kPlatform, platform);
     if (!call.ok())
         return call.status();
     const auto& indices = call.world().d3dDevices;
-    for (std::size_t i = 0; devices && i < std::min<std::size_t>(room, indices.size()); ++i)
+    for (std::size_t i = 0; devices && i < std::min<std::size_t>(capacity, indices.size()); ++i)
         devices[i] = call.devices()[indices[i]];
     if (count)
         *count = static_cast<cl_uint>(indices.size());

@@ -1,5 +1,5 @@
-// The renderer's OpenGL sync objects: in the runtime's log, ledger and plan of faults, like
-// OpenCL's own objects. A sync object that fails to be made is null; a failing wait returns
+// The renderer's OpenGL sync objects, which use the runtime's log, ledger and planned faults as
+// OpenCL's objects do. A sync object that cannot be created is null; a failing wait returns
 // GL_WAIT_FAILED.
 #include "fake/Entry.h"
 #include "fake/FakeHost.h"

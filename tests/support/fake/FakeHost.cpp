@@ -78,7 +78,7 @@ Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int
     return scripted::monitor();
 }
 
-// The log tells a look-up through the host from a plain getenv.
+// The log distinguishes a look-up through the host from getenv.
 const char* VyraGetEnv(const char* name)
 {
     log("VyraGetEnv(", name, ")");
@@ -136,7 +136,7 @@ profiler::EventId profiler::eventBegin(std::uint32_t categoryId, Color color, co
     const bool isMain = categoryId == categories().main().id();
     log("eventBegin(", isMain ? "main" : "another category", ", ", color, ", ", name, ", \"",
         description, "\", ", data ? "data" : "null", ", ", dataSize, ")");
-    constexpr EventId kEvent = 5; // only its way to eventEnd matters
+    constexpr EventId kEvent = 5; // checked in eventEnd
     return kEvent;
 }
 

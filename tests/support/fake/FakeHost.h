@@ -1,8 +1,8 @@
-// The host that a scripted test describes, in place of the parts of the stand-in host that would
-// need a window, a GPU or a clock.
+// A scripted host, which replaces the parts of the stand-in host that need a window, a GPU or a
+// clock.
 //
-// What is defined here takes the place of the stand-in's own definition, since the tests'
-// executables contain the library's objects and so bind to the executable's symbols first. Strings,
+// These definitions take precedence over those of the stand-in host, because the tests' executables
+// contain the library's objects, which bind to the executable's symbols first. Strings,
 // plugs and the trace channel remain the stand-in's. Every call of the library is a line in the
 // runtime's log.
 #pragma once
@@ -26,7 +26,7 @@ struct HostScript {
 };
 HostScript& host();
 
-// While it lives, there is a resource window.
+// Provides a resource window while it exists.
 class ResourceWindow {
 public:
     ResourceWindow();
@@ -37,10 +37,10 @@ private:
     std::unique_ptr<Window> fWindow;
 };
 
-// What the memory monitor counts at present, in bytes.
+// Returns the bytes that the memory monitor counts.
 std::size_t deviceMemory();
 
-// The renderer's OpenGL function table.
+// Installs or removes the renderer's OpenGL function table.
 void installFunctionTable(bool syncObjects, bool syncFromCLEvent);
 void removeFunctionTable();
 

@@ -1,12 +1,12 @@
-// The scripted OpenCL runtime behind the entry points: what a test sets, and what it reads.
+// The scripted OpenCL runtime that implements the entry points, for a test to set and to read.
 //
 // The entry points live in a shared library that has the name of the OpenCL library. The tests'
 // executables are linked to it, so it is in the process already when the code under test opens
-// OpenCL by name, and the loader hands it out. Extension entry points are not exported: they are
-// found through clGetExtensionFunctionAddress alone, unless the world leaves them out.
+// OpenCL by name, and the loader returns it. Extension entry points are not exported: they are
+// found only through clGetExtensionFunctionAddress, unless the world leaves them out.
 //
-// Any thread may call an entry point. What is declared here is for the test's own thread, while
-// nobody else calls.
+// Any thread may call an entry point. The functions declared here are for the test's own thread,
+// while no other thread makes calls.
 #pragma once
 
 #include "World.h"
@@ -21,8 +21,8 @@
 
 namespace scripted {
 
-// A spin lock without a trace in ThreadSanitizer's eyes: the runtime's library is built without it.
-// A mutex here would order the threads of the code under test and so hide their races.
+// A spin lock that ThreadSanitizer does not see: the runtime's library is built without it. A mutex
+// would order the threads of the code under test and hide their races.
 class QuietLock {
 public:
     void lock()
@@ -40,55 +40,57 @@ using ContextNotify = void(CL_CALLBACK*)(const char*, const void*, std::size_t, 
 
 class FakeRuntime {
 public:
-    // Forgets everything and makes the platforms and devices of `world`.
+    // Removes all objects and creates the platforms and devices of `world`.
     void describe(const World& world);
 
     // The calls since the last take, OpenCL's, OpenGL's and the host's in one order, each as text:
     //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, host+16, [event#1]) = event#3
     //     clCreateBuffer(context#1, 4, 64, null) ! -4
     //     clEnqueueNDRangeKernel(queue#1, kernel#1, 64, 64, []) on [mem#1, mem#2] = event#4
-    // Lists are in brackets; the first form names what the call made, the second its status, the
+    // Lists are in brackets; the first form names the created object, the second the status, the
     // third the memory objects in the kernel's arguments.
     std::vector<std::string> takeCalls() { return std::exchange(fCalls, {}); }
-    // A line of the host's in the same log.
+    // Adds a line of the host to the same log.
     void log(std::string line);
 
     void plan(const Fault& fault) { fPlans.push_back({fault}); }
     void clearFaults() { fPlans.clear(); }
 
-    // Wrong use that a validating runtime would refuse: "clReleaseEvent: event#1 is dead".
+    // Misuse that a validating runtime would reject: "clReleaseEvent: event#1 is dead".
     std::vector<std::string> takeMisuse() { return std::exchange(fMisuse, {}); }
 
     std::vector<std::string> balance() const { return fLedger.balance(); }
-    // The name of an object, "host+OFFSET" for an address in the host memory, else "null" or "ptr".
+    // Returns the name of an object, "host+OFFSET" for an address in the host memory, else "null"
+    // or "ptr".
     std::string name(const void* handle) const;
-    // The test's memory that transfers read and write, which the log then names.
+    // Sets the test's memory that transfers read and write, which the log then names.
     void setHostMemory(const void* begin, std::size_t bytes) { fHostMemory = {begin, bytes}; }
     void forgetDead() { fLedger.forgetDead(); }
     unsigned created(Kind kind) const { return fLedger.created(kind); }
-    // References of a living object, else 0.
+    // Returns the references of an existing object, else 0.
     unsigned references(Kind kind, const void* handle);
-    // Bytes of a living memory object.
+    // Returns the bytes of an existing memory object.
     std::size_t memSize(cl_mem mem);
 
-    // The renderer's buffers that are acquired, by name.
+    // Returns the names of the acquired shared buffers.
     std::vector<std::string> acquired() const;
-    // Whether commands stay incomplete until somebody waits for them, or until completeCommands.
+    // Sets whether commands stay incomplete until the host waits for them, or until
+    // completeCommands.
     void holdCommands(bool hold) { fCommands.hold(hold); }
     void completeCommands() { fCommands.completeAll(); }
 
-    // What the queries of every event made from now on answer, in turn; the last one stays. The
-    // default is one CL_COMPLETE. Waiting for an event completes it.
+    // Sets the statuses that queries of every later event return, in order; the last one repeats.
+    // The default is one CL_COMPLETE. Waiting for an event completes it.
     void scriptEventStatuses(std::deque<cl_int> statuses) { fEventStatuses = std::move(statuses); }
-    // What the next glClientWaitSync calls return; without any, that the fence was signalled.
+    // Sets the results of the next glClientWaitSync calls; without any, the fence is signalled.
     void scriptClientWaits(std::deque<unsigned> results) { fClientWaits = std::move(results); }
-    // The next creation from a renderer's buffer returns this memory object, with one more
-    // reference; null: it returns null, with success.
+    // Makes the next creation of a shared buffer return this memory object, with one more
+    // reference; if null, it returns null with success.
     void scriptNextSharedMem(cl_mem mem) { fNextSharedMem = mem; }
-    // The next clCreateKernel returns this living kernel, with one more reference.
+    // Makes the next clCreateKernel return this existing kernel, with one more reference.
     void scriptNextKernel(cl_kernel kernel) { fNextKernel = kernel; }
 
-    // Calls what was given to clCreateContext for errors.
+    // Calls the error callback that was passed to clCreateContext.
     void raiseContextError(const char* text) { fNotify(text, nullptr, 0, nullptr); }
 
 private:
@@ -102,7 +104,7 @@ private:
     // Adds a platform or a device to its list.
     template <typename T>
     void add(Kind kind, std::vector<T>& list);
-    // Counts a call of `function`; the fault that it meets, or null.
+    // Counts a call of `function`. Returns the fault for it, or null.
     const Fault* meetFault(const std::string& function);
 
     QuietLock fLock;
@@ -123,11 +125,11 @@ private:
     cl_kernel fNextKernel = nullptr;
 };
 
-// The process's one.
+// Returns the runtime of the process.
 FakeRuntime& runtime();
 
-// While it lives, the calling thread is inside the scripted runtime or host: its allocations are
-// not the library's.
+// Marks the calling thread as inside the scripted runtime or host: its allocations are not counted
+// as the library's.
 class InsideRuntime {
 public:
     InsideRuntime() { ++depth(); }

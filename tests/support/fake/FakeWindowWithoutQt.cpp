@@ -1,5 +1,5 @@
-// The resource window where there is no Qt: an address behind which nobody looks, since the one
-// operation that the library calls is ours.
+// The resource window without Qt: an address that is never dereferenced, because the one function
+// that the library calls on it is defined here.
 #include "fake/FakeHost.h"
 
 namespace scripted {

@@ -1,4 +1,4 @@
-// Every object that the scripted runtime has handed out, with its explicit references.
+// A ledger of all objects that the scripted runtime has returned, with their references.
 #pragma once
 
 #include <array>
@@ -43,21 +43,21 @@ struct Object {
     std::vector<KernelArgument> arguments{}; // kernels
     bool profiled = false;                   // queues, and the events of their commands
     unsigned command = 0;                    // events: its number
-    std::deque<cl_int> statuses{}; // events: what the next queries answer; the last one stays
+    std::deque<cl_int> statuses{}; // events: statuses of the next queries; the last one repeats
 };
 
-// Handles are numbers, not addresses: a dead one is recognised without touching it. Their order is
-// scattered, so that nothing is in order of creation by accident.
+// Handles are numbers, not addresses: a released one is recognised without accessing it. Their
+// order is scattered, so that nothing is in order of creation by accident.
 class Ledger {
 public:
-    // A new object with one reference.
+    // Creates an object with one reference.
     void* create(Kind kind);
-    // The living object of that kind, or null. Valid until it dies.
+    // Returns the existing object of that kind, or null. Valid until its last release.
     Object* alive(Kind kind, const void* handle);
-    // Takes one reference; the object dies with the last one.
+    // Removes one reference, and the object with the last one.
     void release(const void* handle);
 
-    // Calls `use` with every living object.
+    // Calls `use` with every existing object.
     template <typename Use>
     void forEach(const Use& use) const
     {
@@ -65,13 +65,13 @@ public:
             use(object);
     }
 
-    // "mem#2" for anything that was ever handed out (dead or alive), "null", or "ptr".
+    // Returns "mem#2" for any object that ever existed, "null", or "ptr".
     std::string name(const void* handle) const;
-    // Frees what is kept of dead objects, whose handles have no name from now on.
+    // Removes the records of released objects; their handles then have no name.
     void forgetDead() { fDead.clear(); }
-    // How many of that kind there ever were.
+    // Returns the number of objects of that kind created so far.
     unsigned created(Kind kind) const { return fCreated[static_cast<std::size_t>(kind)]; }
-    // One line per living object, in order of kind and creation: "mem#2 x1".
+    // Returns one line per existing object, in order of kind and creation: "mem#2 x1".
     std::vector<std::string> balance() const;
 
 private:

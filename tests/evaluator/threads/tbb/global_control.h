@@ -1,4 +1,4 @@
-// Stands in for oneTBB, which is not built for ThreadSanitizer: what it orders would look like
+// Replaces oneTBB, which is not built for ThreadSanitizer: its synchronisation would be reported as
 // races.
 #pragma once
 

@@ -1,4 +1,4 @@
-// Stands in for oneTBB: see global_control.h.
+// Replaces oneTBB: see global_control.h.
 #pragma once
 
 #include "global_control.h"
