@@ -29,7 +29,7 @@ std::string list(const Names& names, const NameOf& nameOf)
     return text.empty() ? "none" : text;
 }
 
-// The whole text as a finite number.
+// Returns the whole text as a finite number, or nothing.
 std::optional<float> parseNumber(std::string_view text)
 {
     float number = 0;

@@ -89,7 +89,7 @@ void KernelLibrary::noteArguments(const KernelSource& source, cl_uint count)
     fEntries[key].passedCount = count;
 }
 
-// One kernel of a program text, or of the file if it is null. The caller holds the lock.
+// Creates a kernel of a program text, or of the file if it is null. The caller holds the lock.
 LibraryKernel KernelLibrary::build(const Key& key, const ProgramText* program)
 {
     const auto& [file, function, options] = key;

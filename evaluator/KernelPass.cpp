@@ -37,7 +37,7 @@ Status KernelPass::prepare(KernelLibrary& library)
     LibraryKernel created = library.create(source);
     if (!created.status.ok())
         return created.status;
-    // All that needs memory, so that nothing fails half-way.
+    // Allocates first, so that no later step fails.
     std::vector<Argument> arguments(created.argumentCount);
     std::string file(source.file);
     std::string function(source.function);
@@ -135,7 +135,7 @@ void KernelPass::setMemory(cl_uint index, cl_mem memory)
         return;
     AutoCLObject<cl_mem> kept;
     if (memory) {
-        retainCLObject(memory); // paid back by `kept`
+        retainCLObject(memory); // released by `kept`
         kept.adopt(memory);
     }
     std::swap(fArguments[index].memory, kept);

@@ -11,7 +11,7 @@
 namespace vyra {
 namespace {
 
-// Targets that one pass adds; the kernel has as many arguments.
+// The number of targets that one pass adds, each a kernel argument.
 constexpr unsigned kTargetsPerPass = 8;
 constexpr float kLargestStrength = 10;
 
@@ -110,7 +110,7 @@ void MorphDeformer::setArguments(unsigned pass, KernelArguments& arguments)
         }
         ++active;
     }
-    // Places that are left over add the first target with the weight 0.
+    // Unused arguments add the first target with the weight 0.
     for (const ConstantArray* array : deltas)
         arguments.constant(array ? *array : *deltas[0]);
     arguments.value(passWeights);

@@ -16,7 +16,7 @@ using Influence = SkinWeights::Influence;
 using BoneIndices = SkinWeights::BoneIndices;
 using BoneWeights = SkinWeights::BoneWeights;
 
-// The columns of a 3x4 matrix, four floats each; a kernel reads two columns with one load.
+// Returns the columns of a 3x4 matrix, four floats each; a kernel reads two columns with one load.
 constexpr std::size_t kFloatsPerBone = 16;
 
 bool isWeight(float weight)
@@ -34,7 +34,7 @@ std::string atVertex(std::size_t vertex)
     return " of vertex " + std::to_string(vertex);
 }
 
-// The heaviest influences first, of equal ones in their order.
+// Sorts the influences by descending weight; equal ones keep their order.
 std::vector<Influence> heaviest(std::vector<Influence> influences)
 {
     std::stable_sort(influences.begin(), influences.end(),
@@ -109,7 +109,7 @@ SkinWeights::SkinWeights(const std::vector<BoneIndices>& bones,
     store(std::vector(bones), std::vector(weights));
 }
 
-// Keeps nothing of bad weights.
+// Stores no arrays if the weights are invalid.
 void SkinWeights::store(std::vector<BoneIndices>&& bones, std::vector<BoneWeights>&& weights)
 {
     if (!fProblem.empty())

@@ -18,17 +18,17 @@ using Index = std::uint32_t;
 using Range = SmoothTopology::Range;
 using Corner = SmoothTopology::Corner;
 
-// The areas of a vertex's triangles cancel if their sum is smaller than this part of their sizes.
+// The areas of a vertex's triangles cancel if their sum is below this fraction of their sizes.
 constexpr double kCancelled = 1e-4;
 
-// Equal exactly if the vectors are; 0 and -0 are.
+// Returns keys that are equal if and only if the vectors are; 0 equals -0.
 std::array<Index, 3> keyOf(const Vector3& v)
 {
     return {std::bit_cast<Index>(v.x + 0.0f), std::bit_cast<Index>(v.y + 0.0f),
             std::bit_cast<Index>(v.z + 0.0f)};
 }
 
-// For each index below `count` the lowest one that has an equal key.
+// Returns for each index below `count` the lowest index with an equal key.
 template <typename KeyOf>
 std::vector<Index> firstWithSameKey(std::size_t count, const KeyOf& key)
 {
@@ -68,7 +68,7 @@ Lists<Item> listsByOwner(std::size_t owners, const std::vector<std::pair<Index, 
     return lists;
 }
 
-// All vertices of a group have the range of its first vertex.
+// Gives all vertices of a group the range of its first vertex.
 void shareRanges(const std::vector<Index>& first, std::vector<Range>& ranges)
 {
     for (std::size_t i = 0; i < ranges.size(); ++i)
@@ -92,7 +92,7 @@ void forEachTriangle(const std::vector<Index>& triangles, const std::vector<Inde
 
 using Edge = std::pair<Index, Index>; // two points, the lower first
 
-// The edges of all triangles, in order; each as often as triangles have it.
+// Returns the sorted edges of all triangles; an edge occurs once per triangle.
 std::vector<Edge> triangleEdges(const std::vector<Index>& triangles,
                                 const std::vector<Index>& pointOf)
 {
@@ -130,13 +130,13 @@ Lists<Index> neighbourLists(const std::vector<Index>& triangles, const std::vect
     return listsByOwner(pointOf.size(), neighbours);
 }
 
-// Twice the area of a triangle, as a vector that is perpendicular to it.
+// Returns twice the area of a triangle, as a vector that is perpendicular to it.
 Vector areaVector(const Vector& p, const Vector& next, const Vector& last)
 {
     return cross(next - p, last - p);
 }
 
-// Puts the corner first that SmoothTopology::corners() has first.
+// Moves the first corner according to SmoothTopology::corners() to the front.
 void arrange(std::span<Corner> corners, const Surface& rest, Index vertex)
 {
     const auto area = [&](const Corner& corner) {
@@ -191,7 +191,7 @@ std::string problemOf(const MeshGeometry& geometry)
     return {};
 }
 
-// The items of one vertex.
+// Returns the items of one vertex.
 template <typename Item>
 std::span<const Item> itemsOf(const ConstantArray& ranges, const ConstantArray& items,
                               std::size_t vertex)
@@ -216,7 +216,7 @@ std::vector<Vector> smoothed(const std::vector<Vector>& positions, const SmoothT
     return result;
 }
 
-// The normal from the triangles of a vertex, or a vector of length 0.
+// Returns the normal from the triangles of a vertex, or a vector of length 0.
 Vector normalOf(const std::vector<Vector>& positions, std::span<const Corner> corners,
                 std::size_t vertex)
 {

@@ -71,8 +71,8 @@ void WaveDeformer::setArguments(unsigned /*pass*/, KernelArguments& arguments)
 
 // With g the gradient, u the displacement and c = cos(g . p + start), the Jacobian is
 // I + c u g^T. Its transposed inverse times its determinant 1 + c (g . u) turns a normal n into
-// (1 + c (g . u)) n - c (u . n) g. The sign of the determinant keeps the normal on its side of the
-// surface where compression turns the mesh inside out.
+// (1 + c (g . u)) n - c (u . n) g. The sign of the determinant keeps the normal on its side of
+// the surface if compression turns the mesh inside out.
 void WaveDeformer::deform(const MeshGeometry& /*geometry*/, Surface& surface) const
 {
     const MeshWave wave = meshWave(*this);

@@ -1,4 +1,4 @@
-// The OpenCL platforms of this machine, and which of them goes with a renderer: for applications
+// The OpenCL platforms of this machine, and the choice of one for a renderer: for applications
 // that run on any machine, also without a GPU.
 #pragma once
 

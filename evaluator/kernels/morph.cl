@@ -12,7 +12,7 @@
 #define TARGET_NAMES                                                                               \
     deltas0, deltas1, deltas2, deltas3, deltas4, deltas5, deltas6, deltas7, weights
 
-// The sum of one component of all targets; `at` is its place in the deltas.
+// Returns the sum of one component of all targets; `at` is its index in the deltas.
 INLINE float weightedSum(const size_t at, TARGETS)
 {
     return weights.s0 * deltas0[at] + weights.s1 * deltas1[at] + weights.s2 * deltas2[at] +
@@ -56,7 +56,7 @@ INLINE void copyNormal(const size_t vertex, global const float* normals,
     deformedNormals[at + 2] = normals[at + 2];
 }
 
-// `isLastPass` is 1 in the pass that gives the normals the length 1.
+// `isLastPass` is 1 in the pass that normalises the normals.
 kernel void morph(const uint vertexCount, global const float* positions,
                   global const float* normals, global float* deformedPositions,
                   global float* deformedNormals, TARGETS, const uint isLastPass)

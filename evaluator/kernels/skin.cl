@@ -1,7 +1,7 @@
 // Linear-blend skinning: each vertex follows four bones.
 //
-// `bones` holds the columns of a 3x4 matrix for each bone, four floats each, from the float4 with
-// the index `firstBone` on. Blending by columns takes no sums across a vector, and two columns take
+// `bones` holds the columns of a 3x4 matrix for each bone, four floats each, from the float4
+// with the index `firstBone` on. Blending by columns takes no sums across a vector, and two columns take
 // one load.
 #include "deformers.clh"
 
@@ -20,7 +20,7 @@ typedef float8 real8;
 #define TO_REAL8
 #endif
 
-// Two columns of the blended matrix: those of the pair with the index `pair`.
+// Returns two columns of the blended matrix: those of the pair with the index `pair`.
 INLINE real8 blendedColumns(global const float* bones, const uint4 index, const real4 weight,
                             const uint pair)
 {
@@ -57,8 +57,8 @@ kernel void skin(const uint vertexCount, global const float* positions,
     const size_t at = 3 * vertex;
     const real4 point =
         x * positions[at] + y * positions[at + 1] + z * positions[at + 2] + zw.hi;
-    // The columns of the cofactors carry normals through any blend, also a sheared one; the sign of
-    // the determinant keeps them outside of a mirrored mesh.
+    // The cofactors transform normals correctly for any blend, also with shear; the sign of the
+    // determinant keeps them on the outside of a mirrored mesh.
     const real4 yz = crossProduct(y, z);
     const real4 turned = yz * normals[at] + crossProduct(z, x) * normals[at + 1] +
                          crossProduct(x, y) * normals[at + 2];

@@ -3,14 +3,14 @@
 // Ranges are indices of the first element of a vertex and of the one past its last. A corner holds
 // the two other vertices of a triangle.
 //
-// The first pass compares each normal with a triangle. It gives a normal on the other side of the
-// surface the length 2, which later passes copy and the last one reads.
+// The first pass compares each normal with a triangle, and marks a normal on the other side of the
+// surface by the length 2. Later passes copy the mark, and the last one reads it.
 #include "deformers.clh"
 
-// The areas of a vertex's triangles cancel if their sum is smaller than this part of their sizes.
+// The areas of a vertex's triangles cancel if their sum is below this fraction of their sizes.
 #define CANCELLED 1e-4f
 
-// Twice the area of a triangle, as a vector that is perpendicular to it.
+// Returns twice the area of a triangle, as a vector that is perpendicular to it.
 INLINE float3 areaVector(const float3 position, const uint2 corner, global const float* positions)
 {
     const float3 next = vload3(corner.x, positions) - position;

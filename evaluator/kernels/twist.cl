@@ -1,6 +1,6 @@
-// A twist around the y axis of a space: the higher a vertex, the further round.
+// A twist around the y axis of a space: the angle grows with the height of a vertex.
 //
-// Three rows each lead from the mesh's space to that of the twist and back.
+// Three rows each transform from the mesh's space to that of the twist and back.
 #include "deformers.clh"
 
 // With R the rotation by the angle twist * y, a point p becomes R p. Its Jacobian is

@@ -2,8 +2,8 @@
 //
 // (gX, gY, gZ) is the gradient of the wave's angle in the mesh's space, `start` the angle at the
 // origin, (uX, uY, uZ) the displacement at the crest, and `stretch` the dot product of the two
-// vectors. They are single numbers because PoCL's compiler takes the elements of a vector for a
-// reason to combine components, and then leaves the work-items one by one.
+// vectors. They are scalars because, with vectors, PoCL's compiler combines components and then does
+// not vectorise over work-items.
 #include "deformers.clh"
 
 #define WAVE                                                                                       \

@@ -206,6 +206,12 @@ TEST_F(EvaluatorTest, InvalidEvaluationsAreRejectedWithoutCalls)
     evaluator->evaluate(em::Id(0xFFFE));
     EXPECT_THAT(evaluator->status().message, HasSubstr("65534 never names an evaluation"));
     EXPECT_EQ(calls(), Lines{});
+    evaluate();
+    calls();
+    EXPECT_THAT(evaluator->deform().message, HasSubstr("no evaluation is open"));
+    EXPECT_EQ(callsOf("clEnqueue"), Lines{});
+    evaluate();
+    EXPECT_TRUE(evaluator->status().ok());
 
     settings.finishRenderer = nullptr;
     makeEvaluator();

@@ -203,15 +203,6 @@ TEST_F(EvaluatorLifetimeTest, BatchedBufferWithoutAcquireEventIsNotWritten)
     EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
 }
 
-TEST_F(EvaluatorLifetimeTest, DeformWithoutOpenEvaluationIsRejected)
-{
-    startWithMeshes();
-    EXPECT_THAT(evaluator->deform().message, HasSubstr("no evaluation is open"));
-    EXPECT_EQ(callsOf("clEnqueue"), Lines{});
-    evaluate();
-    EXPECT_TRUE(evaluator->status().ok());
-}
-
 TEST_F(EvaluatorLifetimeTest, DestructorWithdrawsOnlyItselfFromBridge)
 {
     startIn(1, 1);

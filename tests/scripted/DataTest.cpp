@@ -80,7 +80,7 @@ TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
 
 // These tests examine moved-from objects.
 // NOLINTBEGIN(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
-TEST_F(DataTest, SetBufferKeepsEventAndDescriptorWithMemory)
+TEST_F(DataTest, CopiesAndMovesKeepEventAndDescriptor)
 {
     AutoCLObject<cl_mem> mem;
     AutoCLObject<cl_event> event; // event#1

@@ -126,11 +126,11 @@ TEST_F(KernelStoreTest, CacheKeyIsNameAndOptionsNotText)
 TEST_F(KernelStoreTest, CacheHitCreatesKernelAndFreeingLastKernelDropsProgram)
 {
     const TstringArray folders = arrayOf({"a"});
-    const auto inOtherWords = [&](const char* kernel) {
+    const auto withFolder = [&](const char* kernel) {
         return fStore->getKernelFromString(kSource, "text", "", kernel, &folders);
     };
     const Kernel first = fromText("skin", " -I a");
-    const Kernel second = inOtherWords("wave");
+    const Kernel second = withFolder("wave");
     EXPECT_EQ(
         calls(),
         (Lines{std::string("clCreateProgramWithSource(context#1, 1, \"") + kSource +
@@ -147,9 +147,9 @@ TEST_F(KernelStoreTest, CacheHitCreatesKernelAndFreeingLastKernelDropsProgram)
                               "clReleaseProgram(program#1)"}));
     // The program is dropped for every spelling of its options.
     for (const bool other : {true, false, true}) {
-        const Kernel kernel = other ? inOtherWords("skin") : fromText("skin", " -I a");
+        const Kernel kernel = other ? withFolder("skin") : fromText("skin", " -I a");
         EXPECT_EQ(builds(), 1U);
-        for (const Kernel& more : {inOtherWords("wave"), fromText("wave", " -I a"), kernel})
+        for (const Kernel& more : {withFolder("wave"), fromText("wave", " -I a"), kernel})
             EXPECT_TRUE(fStore->freeKernel(more));
     }
 }
@@ -221,7 +221,7 @@ protected:
     }
 };
 
-TEST_P(FailedBuild, BuildIsReportedWithLogAndNotCached)
+TEST_P(FailedBuild, IsReportedWithLogAndNotCached)
 {
     runtime().plan({.function = "clReleaseProgram"}); // not reported
     for (const unsigned fails : {GetParam().fails, 0U}) {

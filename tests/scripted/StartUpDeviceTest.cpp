@@ -198,7 +198,7 @@ TEST_F(DeviceStartUpOnce, StartUpWithoutContextCreatesNoQueue)
 
 class DeviceName : public ScriptedTest, public ::testing::WithParamInterface<std::size_t> {};
 
-TEST_P(DeviceName, NameIsCutAfter127Characters)
+TEST_P(DeviceName, AcceptsUpTo127Characters)
 {
     const bool fits = GetParam() == 127;
     world.platforms[0].devices[0].name = std::string(GetParam(), 'n');
