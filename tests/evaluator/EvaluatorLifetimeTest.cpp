@@ -171,25 +171,6 @@ TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpenWithoutBatching)
     evaluator->destroyMesh(*fMesh); // its buffers are acquired after their last release
 }
 
-TEST_F(EvaluatorLifetimeTest, EvaluationIsClosedWhenAcquireFails)
-{
-    startIn(1, 1);
-    addChain();
-    for (const char* when : {"first", "later"}) {
-        runtime().plan({.function = "clEnqueueAcquireGLObjects"});
-        evaluate();
-        runtime().clearFaults();
-        EXPECT_THAT(evaluator->status().message,
-                    HasSubstr("mesh 'a': deformer 'twist': acquiring a vertex buffer failed"))
-            << when;
-        evaluate();
-        EXPECT_TRUE(evaluator->status().ok()) << when << evaluator->status().message;
-        EXPECT_EQ(runtime().acquired(), Lines{});
-        runtime().takeMisuse();
-        warnings();
-    }
-}
-
 TEST_F(EvaluatorLifetimeTest, BatchedBufferWithoutAcquireEventIsNotWritten)
 {
     startWithMeshes();
