@@ -65,7 +65,7 @@ private:
     void setValue(const void* value, std::size_t sizeInBytes) override;
     void setFrame(const void* bytes, std::size_t sizeInBytes) override;
     void constant(const ConstantArray& array) override;
-    [[nodiscard]] bool set(cl_uint index, const void* value, std::size_t sizeInBytes);
+    bool set(cl_uint index, const void* value, std::size_t sizeInBytes);
     void setMemory(cl_uint index, cl_mem memory);
     bool isCurrent(const KernelSource& source, const KernelLibrary& library) const;
 
