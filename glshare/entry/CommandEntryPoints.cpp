@@ -1,11 +1,11 @@
 // Implements the commands and events of EntryPoints.h.
-#include "core/Answer.h"
-#include "core/Devices.h"
-#include "core/EventTypes.h"
-#include "core/GlSyncEvents.h"
-#include "core/Registry.h"
-#include "core/SharingCommands.h"
-#include "core/Switches.h"
+#include "core/api/Answer.h"
+#include "core/api/Devices.h"
+#include "core/api/Switches.h"
+#include "core/sharing/EventTypes.h"
+#include "core/sharing/GlSyncEvents.h"
+#include "core/sharing/Registry.h"
+#include "core/sharing/SharingCommands.h"
 #include "entry/EntryPoints.h"
 
 #include <algorithm>

@@ -1,7 +1,7 @@
 // Implements the context functions of EntryPoints.h.
-#include "core/Answer.h"
-#include "core/Devices.h"
-#include "core/Registry.h"
+#include "core/api/Answer.h"
+#include "core/api/Devices.h"
+#include "core/sharing/Registry.h"
 #include "entry/EntryPoints.h"
 
 #include <algorithm>

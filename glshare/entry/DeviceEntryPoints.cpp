@@ -1,6 +1,6 @@
 // Implements the platform and device queries of EntryPoints.h.
-#include "core/Answer.h"
-#include "core/Devices.h"
+#include "core/api/Answer.h"
+#include "core/api/Devices.h"
 #include "entry/EntryPoints.h"
 
 #include <algorithm>

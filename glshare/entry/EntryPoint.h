@@ -2,9 +2,9 @@
 // they fail.
 #pragma once
 
-#include "core/Answer.h"
-#include "core/Fork.h"
-#include "core/OpenCl.h"
+#include "core/api/Answer.h"
+#include "core/api/OpenCl.h"
+#include "core/worker/Fork.h"
 
 #include <exception>
 #include <tuple>

@@ -1,7 +1,7 @@
 #include "entry/EntryPoints.h"
 
-#include "core/Counters.h"
-#include "core/Switches.h"
+#include "core/api/Switches.h"
+#include "core/sharing/Counters.h"
 #include "entry/EntryPoint.h"
 #include "glshare.h"
 

@@ -2,7 +2,7 @@
 // headers. Any shell can put them in front of a runtime.
 #pragma once
 
-#include "core/OpenCl.h"
+#include "core/api/OpenCl.h"
 
 namespace glshare {
 

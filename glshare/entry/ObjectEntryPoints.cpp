@@ -1,8 +1,8 @@
 // Implements the functions of EntryPoints.h that make and describe memory objects.
-#include "core/Answer.h"
-#include "core/BufferCreation.h"
-#include "core/Devices.h"
-#include "core/Registry.h"
+#include "core/api/Answer.h"
+#include "core/api/Devices.h"
+#include "core/sharing/BufferCreation.h"
+#include "core/sharing/Registry.h"
 #include "entry/EntryPoints.h"
 
 #include <GL/gl.h>

@@ -1,9 +1,9 @@
 // The shell for OpenCL loaders that know layers: hands the loader a table of functions in which
 // ours stand in front of those below.
-#include "core/OpenCl.h"
+#include "core/api/OpenCl.h"
 #include "entry/EntryPoints.h"
 
-#include "core/Answer.h"
+#include "core/api/Answer.h"
 
 #include <CL/cl_layer.h>
 

@@ -1,7 +1,7 @@
 #include "windows/Direct3D11.h"
 
-#include "core/Answer.h"
-#include "core/Devices.h"
+#include "core/api/Answer.h"
+#include "core/api/Devices.h"
 #include "entry/EntryPoint.h"
 #include "entry/EntryPoints.h"
 #include "windows/Direct3D11Buffer.h"

@@ -6,7 +6,7 @@
 // commands of the two sides are in order then. Textures are not offered.
 #pragma once
 
-#include "core/OpenCl.h"
+#include "core/api/OpenCl.h"
 
 #include <string_view>
 

@@ -1,5 +1,5 @@
 // Implements LibraryFunctions.h for Windows.
-#include "core/LibraryFunctions.h"
+#include "core/gl/LibraryFunctions.h"
 
 #include <windows.h>
 

@@ -1,7 +1,7 @@
 // The shell for Windows, where OpenCL's loader knows no layers that reach OpenGL sharing: an
 // OpenCL.dll that a program finds beside itself. It passes everything on to the system's, with our
 // functions in front.
-#include "core/Switches.h"
+#include "core/api/Switches.h"
 #include "entry/EntryPoint.h"
 #include "entry/EntryPoints.h"
 #include "windows/Direct3D11.h"

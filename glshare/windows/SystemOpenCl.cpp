@@ -1,6 +1,6 @@
 #include "windows/SystemOpenCl.h"
 
-#include "core/LibraryFunctions.h"
+#include "core/gl/LibraryFunctions.h"
 #include "entry/EntryPoint.h"
 #include "windows/Functions.h"
 

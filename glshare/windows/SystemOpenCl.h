@@ -1,7 +1,7 @@
 // The OpenCL.dll of the system, which ours stands in front of.
 #pragma once
 
-#include "core/OpenCl.h"
+#include "core/api/OpenCl.h"
 
 namespace glshare {
 

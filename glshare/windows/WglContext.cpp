@@ -2,8 +2,8 @@
 //
 // The context is made on the application's device context, and used on a window of our own of the
 // same pixel format, which belongs to the worker's thread.
-#include "core/GlContext.h"
-#include "core/LibraryFunctions.h"
+#include "core/gl/GlContext.h"
+#include "core/gl/LibraryFunctions.h"
 
 #include <array>
 

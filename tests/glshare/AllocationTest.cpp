@@ -3,7 +3,7 @@
 // The program's operator new is replaced, which the layer's allocations resolve to as well. Those
 // of OpenCL and OpenGL themselves are left alone. Before the headers of the tests, as it includes
 // those of the newest OpenCL.
-#include "core/OpenCl.h"
+#include "core/api/OpenCl.h"
 
 #include "ReplacedOperators.h"
 #include "SharingTest.h"

@@ -1,6 +1,6 @@
 // GlDevice on a scripted OpenGL that executes commands only in glFinish, as a GPU's driver may.
 // Mesa's software renderers execute at once, so that they do not show a missing glFinish.
-#include "core/GlDevice.h"
+#include "core/gl/GlDevice.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 // What is kept, and for how long, when things go in any order.
 // Before the headers of the tests, as it includes those of the newest OpenCL.
-#include "core/OpenCl.h"
+#include "core/api/OpenCl.h"
 
 #include "SharingTest.h"
 #include "StressRounds.h"
