@@ -1,7 +1,7 @@
-/* What glshare offers beyond the two extensions: counters that show what sharing costs.
+/* The counters of glshare, which show whether acquires and releases copy.
  *
- * The function is found by its name through clGetExtensionFunctionAddressForPlatform (or the older
- * clGetExtensionFunctionAddress). A null answer means that glshare is not active. */
+ * Look the function up by name with clGetExtensionFunctionAddressForPlatform (or the older
+ * clGetExtensionFunctionAddress). Null means that glshare is not active. */
 #ifndef GLSHARE_H
 #define GLSHARE_H
 
@@ -14,14 +14,14 @@ extern "C" {
 /* Totals since the process started, over all contexts. */
 /* NOLINTNEXTLINE(modernize-use-using): C programs include this */
 typedef struct glshare_counters {
-    uint64_t acquired_in_place; /* acquires of a buffer whose GL storage OpenCL uses directly */
-    uint64_t acquired_by_copy;  /* acquires that copied from the GL buffer */
-    uint64_t released_by_copy;  /* releases that copied to the GL buffer */
+    uint64_t acquired_in_place; /* acquires of buffers whose storage OpenCL uses in place */
+    uint64_t acquired_by_copy;  /* acquires that copied from the OpenGL buffer */
+    uint64_t released_by_copy;  /* releases that copied to the OpenGL buffer */
     uint64_t bytes_copied;      /* in either direction */
-    uint64_t failed_copies;     /* copies that found the GL buffer gone or too small */
+    uint64_t failed_copies;     /* copies that failed: the buffer was deleted, mapped or too small */
 } glshare_counters;
 
-/* Fills `counters`. Safe from any thread. */
+/* Writes the totals to `counters`. Any thread. */
 /* NOLINTNEXTLINE(modernize-use-using): C programs include this */
 typedef void (*glshare_get_counters_fn)(glshare_counters* counters);
 #define GLSHARE_GET_COUNTERS_NAME "glshareGetCounters"

@@ -1,7 +1,7 @@
 // Implements the context functions of EntryPoints.h.
-#include "core/api/Answer.h"
+#include "core/api/Arguments.h"
 #include "core/api/Devices.h"
-#include "core/sharing/Registry.h"
+#include "core/sharing/ObjectRegistry.h"
 #include "entry/EntryPoints.h"
 
 #include <algorithm>
@@ -14,23 +14,24 @@ namespace glshare::entry {
 
 namespace {
 
-bool shareByThemselves(std::span<const cl_device_id> devices)
+bool shareNatively(std::span<const cl_device_id> devices)
 {
-    return !devices.empty() && std::ranges::all_of(devices, sharesByItself);
+    return !devices.empty() && std::ranges::all_of(devices, sharesNatively);
 }
 
-bool workInHostMemory(std::span<const cl_device_id> devices)
+bool areCpuDevices(std::span<const cl_device_id> devices)
 {
-    return std::ranges::all_of(
-        devices, [](cl_device_id device) { return (ownType(device) & CL_DEVICE_TYPE_CPU) != 0; });
+    return std::ranges::all_of(devices, [](cl_device_id device) {
+        return (runtimeType(device) & CL_DEVICE_TYPE_CPU) != 0;
+    });
 }
 
-// Starts sharing with the context of OpenGL that `properties` name. Null, and the reason in
-// `error`, if it cannot be shared with.
-std::shared_ptr<SharingContext> makeSharing(ContextProperties properties, bool canUseHostMemory,
-                                            cl_int* error)
+// Starts to share with the OpenGL context of `properties`. Returns null, and sets `error`, if that
+// context cannot be shared with.
+[[nodiscard]] std::shared_ptr<SharingContext> startSharing(ContextProperties properties,
+                                                           bool canUseHostMemory, cl_int* error)
 {
-    std::unique_ptr<GlContext> gl = createSharingContext(*properties.binding);
+    std::unique_ptr<GlContext> gl = createSharedGlContext(*properties.glContext);
     std::unique_ptr<GlWorker> worker = gl == nullptr ? nullptr : GlWorker::start(std::move(gl));
     if (worker == nullptr) {
         setError(error, CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR);
@@ -40,33 +41,34 @@ std::shared_ptr<SharingContext> makeSharing(ContextProperties properties, bool c
                                             canUseHostMemory);
 }
 
-// Makes a context on `devices`. `create` asks the runtime for it, with the properties it gets.
+// Creates a context on `devices`. `create` calls the runtime with the properties that it is passed.
 template <typename Create>
-cl_context createSharing(const cl_context_properties* properties,
-                         std::span<const cl_device_id> devices, cl_int* error, Create create)
+[[nodiscard]] cl_context createSharingContext(const cl_context_properties* properties,
+                                              std::span<const cl_device_id> devices, cl_int* error,
+                                              Create create)
 {
     ContextProperties parsed = parseProperties(properties);
-    if (parsed.original == parsed.forRuntime || shareByThemselves(devices))
+    if (parsed.original == parsed.forRuntime || shareNatively(devices))
         return create(properties, error);
     if (parsed.error != CL_SUCCESS) {
         setError(error, parsed.error);
         return nullptr;
     }
     const std::vector<cl_context_properties> forRuntime = parsed.forRuntime;
-    if (!parsed.binding)
+    if (!parsed.glContext)
         return create(forRuntime.data(), error);
 
     std::shared_ptr<SharingContext> sharing =
-        makeSharing(std::move(parsed), workInHostMemory(devices), error);
+        startSharing(std::move(parsed), areCpuDevices(devices), error);
     if (sharing == nullptr)
         return nullptr;
     cl_context context = create(forRuntime.data(), error);
     if (context == nullptr)
         return nullptr;
     try {
-        Registry::get().add(context, std::move(sharing));
+        ObjectRegistry::get().add(context, std::move(sharing));
     } catch (...) {
-        runtime().clReleaseContext(context); // the one reference, which nobody has seen
+        runtime().clReleaseContext(context); // the only reference
         throw;
     }
     return context;
@@ -78,30 +80,31 @@ cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl
                                      const cl_device_id* devices, ContextNotify notify, void* user,
                                      cl_int* error)
 {
-    if (!isList(count, devices)) {
+    if (!isValidList(count, devices)) {
         setError(error, CL_INVALID_VALUE);
         return nullptr;
     }
-    return createSharing(properties, {devices, count}, error,
-                         [&](const cl_context_properties* forRuntime, cl_int* result) {
-                             return runtime().clCreateContext(forRuntime, count, devices, notify,
-                                                              user, result);
-                         });
+    return createSharingContext(properties, {devices, count}, error,
+                                [&](const cl_context_properties* forRuntime, cl_int* result) {
+                                    return runtime().clCreateContext(forRuntime, count, devices,
+                                                                     notify, user, result);
+                                });
 }
 
 cl_context CL_API_CALL createContextFromType(const cl_context_properties* properties,
                                              cl_device_type type, ContextNotify notify, void* user,
                                              cl_int* error)
 {
-    const auto asked = typeToAskFor(type);
+    const auto typeForRuntime = runtimeTypeFor(type);
     const cl_platform_id platform = platformOrFirst(parseProperties(properties).platform);
-    return createSharing(
+    return createSharingContext(
         properties, devicesOf(platform, type), error,
         [&](const cl_context_properties* forRuntime, cl_int* result) -> cl_context {
-            if (asked)
-                return runtime().clCreateContextFromType(forRuntime, *asked, notify, user, result);
-            const bool isUserLost = notify == nullptr && user != nullptr;
-            setError(result, isUserLost ? CL_INVALID_VALUE : CL_DEVICE_NOT_FOUND);
+            if (typeForRuntime)
+                return runtime().clCreateContextFromType(forRuntime, *typeForRuntime, notify, user,
+                                                         result);
+            const bool isUserUnused = notify == nullptr && user != nullptr;
+            setError(result, isUserUnused ? CL_INVALID_VALUE : CL_DEVICE_NOT_FOUND);
             return nullptr;
         });
 }
@@ -110,14 +113,14 @@ cl_int CL_API_CALL retainContext(cl_context context)
 {
     const cl_int error = runtime().clRetainContext(context);
     if (error == CL_SUCCESS)
-        Registry::get().retain(context);
+        ObjectRegistry::get().retain(context);
     return error;
 }
 
-// Our own record goes first: afterwards the handle may be another context's.
+// Counts first: after the release the handle may be reused for another context.
 cl_int CL_API_CALL releaseContext(cl_context context)
 {
-    Registry::get().release(context);
+    ObjectRegistry::get().release(context);
     return runtime().clReleaseContext(context);
 }
 
@@ -125,19 +128,19 @@ cl_int CL_API_CALL getContextInfo(cl_context context, cl_context_info name, std:
                                   void* value, std::size_t* sizeNeeded)
 {
     if (name == CL_CONTEXT_PROPERTIES) {
-        if (const auto sharing = Registry::get().find(context))
-            return answer(std::as_bytes(std::span(sharing->properties().original)),
-                          {size, value, sizeNeeded});
+        if (const auto sharing = ObjectRegistry::get().find(context))
+            return writeInfo(std::as_bytes(std::span(sharing->properties().original)),
+                             {size, value, sizeNeeded});
     }
     return runtime().clGetContextInfo(context, name, size, value, sizeNeeded);
 }
 
 namespace {
 
-// Returns the error of a context with these properties, by creating and releasing one. An attribute
-// that the runtime does not have is CL_INVALID_VALUE in this query.
-cl_int tryContext(const cl_context_properties* properties, const ContextProperties& parsed,
-                  cl_device_id device)
+// Creates a context with these properties, releases it, and returns the error. For a property that
+// the runtime does not have, this query requires CL_INVALID_VALUE.
+[[nodiscard]] cl_int testContextCreation(const cl_context_properties* properties,
+                                         const ContextProperties& parsed, cl_device_id device)
 {
     cl_int error = CL_SUCCESS;
     cl_context context = createContext(properties, 1, &device, nullptr, nullptr, &error);
@@ -157,17 +160,18 @@ cl_int CL_API_CALL getGlContextInfo(const cl_context_properties* properties,
     const std::vector<cl_device_id> devices = devicesOf(platform, CL_DEVICE_TYPE_ALL);
     if (devices.empty())
         return CL_INVALID_PLATFORM;
-    if (shareByThemselves(devices))
+    if (shareNatively(devices))
         return runtime().clGetGLContextInfoKHR(properties, name, size, value, sizeNeeded);
-    if (parsed.error == CL_SUCCESS && !parsed.binding)
+    if (parsed.error == CL_SUCCESS && !parsed.glContext)
         return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    if (const cl_int error = tryContext(properties, parsed, devices.front()); error != CL_SUCCESS)
+    if (const cl_int error = testContextCreation(properties, parsed, devices.front());
+        error != CL_SUCCESS)
         return error;
     switch (name) {
     case CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR:
-        return answerWith(devices.front(), {size, value, sizeNeeded});
+        return writeInfoValue(devices.front(), {size, value, sizeNeeded});
     case CL_DEVICES_FOR_GL_CONTEXT_KHR:
-        return answer(std::as_bytes(std::span(devices)), {size, value, sizeNeeded});
+        return writeInfo(std::as_bytes(std::span(devices)), {size, value, sizeNeeded});
     default:
         return CL_INVALID_VALUE;
     }

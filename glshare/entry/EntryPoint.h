@@ -1,10 +1,10 @@
-// The C functions around those of EntryPoints.h: no exception leaves them, and in a forked child
-// they fail.
+// Wraps the functions of EntryPoints.h for C: exceptions become error codes, and calls in a forked
+// child fail.
 #pragma once
 
-#include "core/api/Answer.h"
+#include "core/api/Arguments.h"
 #include "core/api/OpenCl.h"
-#include "core/worker/Fork.h"
+#include "core/worker/ProcessHooks.h"
 
 #include <exception>
 #include <tuple>
@@ -12,10 +12,10 @@
 
 namespace glshare {
 
-// Returns what an OpenCL function with these arguments returns when it fails with `error`: the
-// error itself, or null and the error through errcode_ret, which is always the last argument.
+// Returns the result of an OpenCL function that fails with `error`: the error itself, or null after
+// setting errcode_ret, which is always the last argument.
 template <typename Result, typename... Arguments>
-Result failWith(cl_int error, Arguments... arguments)
+[[nodiscard]] Result failWith(cl_int error, Arguments... arguments) noexcept
 {
     if constexpr (std::is_same_v<Result, cl_int>) {
         return error;
@@ -27,7 +27,7 @@ Result failWith(cl_int error, Arguments... arguments)
     }
 }
 
-// Whether a function works in a forked child: true of those that only query platforms and devices.
+// Whether a function works in a forked child. Only queries of platforms and devices do.
 enum class InForkedChild { kFails, kWorks };
 
 template <auto function, InForkedChild inForkedChild = InForkedChild::kFails>
@@ -36,8 +36,8 @@ struct EntryPoint;
 template <typename Result, typename... Arguments, Result(CL_API_CALL* function)(Arguments...),
           InForkedChild inForkedChild>
 struct EntryPoint<function, inForkedChild> {
-    // Catches standard exceptions only: a cancelled thread unwinds by another, which must pass.
-    // Each means that the host has no memory or no thread to give.
+    // Catches standard exceptions only: the exception that unwinds a cancelled thread must pass.
+    // Each standard exception means that memory or threads have run out.
     static Result CL_API_CALL call(Arguments... arguments)
     {
         if (inForkedChild == InForkedChild::kFails && isForkedChild())
@@ -54,6 +54,6 @@ template <auto function>
 inline constexpr auto entryPoint = &EntryPoint<function>::call;
 
 template <auto function>
-inline constexpr auto entryPointOfDescription = &EntryPoint<function, InForkedChild::kWorks>::call;
+inline constexpr auto queryEntryPoint = &EntryPoint<function, InForkedChild::kWorks>::call;
 
 } // namespace glshare

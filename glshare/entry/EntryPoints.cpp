@@ -1,6 +1,6 @@
 #include "entry/EntryPoints.h"
 
-#include "core/api/Switches.h"
+#include "core/api/Settings.h"
 #include "core/sharing/Counters.h"
 #include "entry/EntryPoint.h"
 #include "glshare.h"
@@ -12,9 +12,9 @@ namespace glshare {
 
 void installEntryPoints(cl_icd_dispatch& table)
 {
-    table.clGetPlatformInfo = entryPointOfDescription<entry::getPlatformInfo>;
-    table.clGetDeviceIDs = entryPointOfDescription<entry::getDeviceIds>;
-    table.clGetDeviceInfo = entryPointOfDescription<entry::getDeviceInfo>;
+    table.clGetPlatformInfo = queryEntryPoint<entry::getPlatformInfo>;
+    table.clGetDeviceIDs = queryEntryPoint<entry::getDeviceIds>;
+    table.clGetDeviceInfo = queryEntryPoint<entry::getDeviceInfo>;
     table.clCreateContext = entryPoint<entry::createContext>;
     table.clCreateContextFromType = entryPoint<entry::createContextFromType>;
     table.clRetainContext = entryPoint<entry::retainContext>;
@@ -36,10 +36,9 @@ void installEntryPoints(cl_icd_dispatch& table)
     table.clRetainEvent = entryPoint<entry::retainEvent>;
     table.clReleaseEvent = entryPoint<entry::releaseEvent>;
     table.clSetUserEventStatus = entryPoint<entry::setUserEventStatus>;
-    table.clGetExtensionFunctionAddress =
-        entryPointOfDescription<entry::getExtensionFunctionAddress>;
+    table.clGetExtensionFunctionAddress = queryEntryPoint<entry::getExtensionFunctionAddress>;
     table.clGetExtensionFunctionAddressForPlatform =
-        entryPointOfDescription<entry::getExtensionFunctionAddressForPlatform>;
+        queryEntryPoint<entry::getExtensionFunctionAddressForPlatform>;
 }
 
 namespace {
@@ -80,16 +79,16 @@ void* findFunction(std::string_view name)
     return nullptr;
 }
 
-// The loader has an entry point of its own for every name it knows, so that a function which is not
-// offered must be hidden from it.
-template <typename AskBelow>
-void* lookUp(const char* name, AskBelow askBelow)
+// Returns a function of glshare, or else what the runtime returns. The loader has an entry point
+// for every name of an extension, so the name of a disabled function must not reach it.
+template <typename CallRuntime>
+void* lookUp(const char* name, CallRuntime callRuntime)
 {
-    const std::string_view wanted = name == nullptr ? std::string_view() : name;
-    if (wanted == kCreateEventFromGlSync && !switches().glEvent)
+    const std::string_view requested = name == nullptr ? std::string_view() : name;
+    if (requested == kCreateEventFromGlSync && !settings().glEvent)
         return nullptr;
-    void* own = findFunction(wanted);
-    return own != nullptr ? own : askBelow();
+    void* own = findFunction(requested);
+    return own != nullptr ? own : callRuntime();
 }
 
 } // namespace

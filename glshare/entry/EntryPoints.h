@@ -1,12 +1,12 @@
-// The OpenCL functions that this program answers itself, under the signatures of the OpenCL
-// headers. Any shell can put them in front of a runtime.
+// The OpenCL functions that glshare implements, under the signatures of the OpenCL headers. They
+// return the errors of the OpenCL functions of the same names. Any thread.
 #pragma once
 
 #include "core/api/OpenCl.h"
 
 namespace glshare {
 
-// Replaces the functions below in `table`, which otherwise stays as it is.
+// Replaces the functions below in `table`; the others stay.
 void installEntryPoints(cl_icd_dispatch& table);
 
 namespace entry {

@@ -1,8 +1,8 @@
-// Implements the functions of EntryPoints.h that make and describe memory objects.
-#include "core/api/Answer.h"
+// Implements the functions of EntryPoints.h that create and query memory objects.
+#include "core/api/Arguments.h"
 #include "core/api/Devices.h"
 #include "core/sharing/BufferCreation.h"
-#include "core/sharing/Registry.h"
+#include "core/sharing/ObjectRegistry.h"
 #include "entry/EntryPoints.h"
 
 #include <GL/gl.h>
@@ -36,45 +36,47 @@ constexpr bool isAnyDimension(cl_GLenum target)
            is3D(target);
 }
 
-// The arguments of the functions that make images.
+// The arguments of the functions that create images.
 struct ImageRequest {
     cl_context context;
     cl_mem_flags flags;
-    bool isTarget = true;
+    bool isValidTarget = true;
     cl_GLint level = 0;
 };
 
-// Textures and renderbuffers are not offered: no name is that of an object to share. The other
-// arguments are checked first.
-cl_int errorOf(const ImageRequest& request)
+// Returns the error for an image. Textures and renderbuffers are not supported, so every name is
+// invalid; the other arguments are checked first.
+[[nodiscard]] cl_int imageError(const ImageRequest& request)
 {
-    if (Registry::get().find(request.context) == nullptr)
+    if (ObjectRegistry::get().find(request.context) == nullptr)
         return CL_INVALID_CONTEXT;
-    if (!areSharingFlags(request.flags) || !request.isTarget)
+    if (!areValidSharingFlags(request.flags) || !request.isValidTarget)
         return CL_INVALID_VALUE;
     return request.level < 0 ? CL_INVALID_MIP_LEVEL : CL_INVALID_GL_OBJECT;
 }
 
-template <typename PassDown>
-cl_mem refuse(const ImageRequest& request, cl_int* error, PassDown passDown)
+template <typename CallRuntime>
+[[nodiscard]] cl_mem rejectImage(const ImageRequest& request, cl_int* error,
+                                 CallRuntime callRuntime)
 {
-    const cl_int reason = errorOf(request);
-    if (reason == CL_INVALID_CONTEXT && runtimeShares(request.context))
-        return passDown();
+    const cl_int reason = imageError(request);
+    if (reason == CL_INVALID_CONTEXT && runtimeSharesNatively(request.context))
+        return callRuntime();
     setError(error, reason);
     return nullptr;
 }
 
-// Of an object that is not ours: what the runtime says, if it knows OpenGL objects at all.
-template <typename PassDown>
-cl_int askRuntime(cl_mem memory, PassDown passDown)
+// Calls the runtime for a memory object without a record, if the runtime shares natively; otherwise
+// returns an error.
+template <typename CallRuntime>
+[[nodiscard]] cl_int callNativeRuntime(cl_mem memory, CallRuntime callRuntime)
 {
     cl_context context = nullptr;
     if (memory == nullptr ||
         runtime().clGetMemObjectInfo(memory, CL_MEM_CONTEXT, sizeof(cl_context), &context,
                                      nullptr) != CL_SUCCESS)
         return CL_INVALID_MEM_OBJECT;
-    return runtimeShares(context) ? passDown() : CL_INVALID_GL_OBJECT;
+    return runtimeSharesNatively(context) ? callRuntime() : CL_INVALID_GL_OBJECT;
 }
 
 } // namespace
@@ -82,9 +84,9 @@ cl_int askRuntime(cl_mem memory, PassDown passDown)
 cl_mem CL_API_CALL createFromGlBuffer(cl_context context, cl_mem_flags flags, cl_GLuint name,
                                       cl_int* error)
 {
-    const auto sharing = Registry::get().find(context);
+    const auto sharing = ObjectRegistry::get().find(context);
     if (sharing == nullptr) {
-        if (runtimeShares(context))
+        if (runtimeSharesNatively(context))
             return runtime().clCreateFromGLBuffer(context, flags, name, error);
         setError(error, CL_INVALID_CONTEXT);
         return nullptr;
@@ -98,7 +100,7 @@ cl_mem CL_API_CALL createFromGlBuffer(cl_context context, cl_mem_flags flags, cl
 cl_mem CL_API_CALL createFromGlTexture(cl_context context, cl_mem_flags flags, cl_GLenum target,
                                        cl_GLint level, cl_GLuint texture, cl_int* error)
 {
-    return refuse({context, flags, isAnyDimension(target), level}, error, [&] {
+    return rejectImage({context, flags, isAnyDimension(target), level}, error, [&] {
         return runtime().clCreateFromGLTexture(context, flags, target, level, texture, error);
     });
 }
@@ -106,7 +108,7 @@ cl_mem CL_API_CALL createFromGlTexture(cl_context context, cl_mem_flags flags, c
 cl_mem CL_API_CALL createFromGlTexture2D(cl_context context, cl_mem_flags flags, cl_GLenum target,
                                          cl_GLint level, cl_GLuint texture, cl_int* error)
 {
-    return refuse({context, flags, is2D(target), level}, error, [&] {
+    return rejectImage({context, flags, is2D(target), level}, error, [&] {
         return runtime().clCreateFromGLTexture2D(context, flags, target, level, texture, error);
     });
 }
@@ -114,7 +116,7 @@ cl_mem CL_API_CALL createFromGlTexture2D(cl_context context, cl_mem_flags flags,
 cl_mem CL_API_CALL createFromGlTexture3D(cl_context context, cl_mem_flags flags, cl_GLenum target,
                                          cl_GLint level, cl_GLuint texture, cl_int* error)
 {
-    return refuse({context, flags, is3D(target), level}, error, [&] {
+    return rejectImage({context, flags, is3D(target), level}, error, [&] {
         return runtime().clCreateFromGLTexture3D(context, flags, target, level, texture, error);
     });
 }
@@ -122,16 +124,17 @@ cl_mem CL_API_CALL createFromGlTexture3D(cl_context context, cl_mem_flags flags,
 cl_mem CL_API_CALL createFromGlRenderbuffer(cl_context context, cl_mem_flags flags,
                                             cl_GLuint renderbuffer, cl_int* error)
 {
-    return refuse({context, flags}, error, [&] {
+    return rejectImage({context, flags}, error, [&] {
         return runtime().clCreateFromGLRenderbuffer(context, flags, renderbuffer, error);
     });
 }
 
 cl_int CL_API_CALL getGlObjectInfo(cl_mem memory, cl_gl_object_type* type, cl_GLuint* name)
 {
-    const auto buffer = Registry::get().find(memory);
+    const auto buffer = ObjectRegistry::get().find(memory);
     if (buffer == nullptr)
-        return askRuntime(memory, [&] { return runtime().clGetGLObjectInfo(memory, type, name); });
+        return callNativeRuntime(memory,
+                                 [&] { return runtime().clGetGLObjectInfo(memory, type, name); });
     if (type != nullptr)
         *type = CL_GL_OBJECT_BUFFER;
     if (name != nullptr)
@@ -142,34 +145,34 @@ cl_int CL_API_CALL getGlObjectInfo(cl_mem memory, cl_gl_object_type* type, cl_GL
 cl_int CL_API_CALL getGlTextureInfo(cl_mem memory, cl_gl_texture_info name, std::size_t size,
                                     void* value, std::size_t* sizeNeeded)
 {
-    if (Registry::get().find(memory) != nullptr)
+    if (ObjectRegistry::get().find(memory) != nullptr)
         return CL_INVALID_GL_OBJECT;
-    return askRuntime(memory, [&] {
+    return callNativeRuntime(memory, [&] {
         return runtime().clGetGLTextureInfo(memory, name, size, value, sizeNeeded);
     });
 }
 
 namespace {
 
-// Returns the shared buffer that a memory object is, or is a part or an image of; null if there is
-// none.
-std::shared_ptr<SharedBuffer> findWhole(cl_mem memory)
+// Returns the shared buffer that a memory object is, or was created from as a sub-buffer or image;
+// null if there is none.
+[[nodiscard]] std::shared_ptr<SharedBuffer> findParentBuffer(cl_mem memory)
 {
     std::shared_ptr<SharedBuffer> buffer;
-    while (memory != nullptr && (buffer = Registry::get().find(memory)) == nullptr) {
-        cl_mem whole = nullptr;
+    while (memory != nullptr && (buffer = ObjectRegistry::get().find(memory)) == nullptr) {
+        cl_mem parent = nullptr;
         runtime().clGetMemObjectInfo(memory, CL_MEM_ASSOCIATED_MEMOBJECT, sizeof(cl_mem),
-                                     static_cast<void*>(&whole), nullptr);
-        memory = whole;
+                                     static_cast<void*>(&parent), nullptr);
+        memory = parent;
     }
     return buffer;
 }
 
-// Returns the flags that the application has given, without those for the memory of `whole`.
-cl_mem_flags shownFlags(cl_mem memory, const SharedBuffer& whole)
+// Returns the flags that the application has passed, without those that glshare adds.
+cl_mem_flags reportedFlags(cl_mem memory, const SharedBuffer& buffer)
 {
-    if (memory == whole.memory)
-        return whole.flags;
+    if (memory == buffer.memory)
+        return buffer.flags;
     cl_mem_flags flags = 0;
     runtime().clGetMemObjectInfo(memory, CL_MEM_FLAGS, sizeof flags, &flags, nullptr);
     return flags & ~cl_mem_flags{CL_MEM_USE_HOST_PTR | CL_MEM_ALLOC_HOST_PTR};
@@ -181,10 +184,10 @@ cl_int CL_API_CALL getMemObjectInfo(cl_mem memory, cl_mem_info name, std::size_t
                                     std::size_t* sizeNeeded)
 {
     if (name == CL_MEM_FLAGS || name == CL_MEM_HOST_PTR) {
-        if (const auto whole = findWhole(memory)) {
-            const Query query{size, value, sizeNeeded};
-            return name == CL_MEM_FLAGS ? answerWith(shownFlags(memory, *whole), query)
-                                        : answerWith<void*>(nullptr, query);
+        if (const auto buffer = findParentBuffer(memory)) {
+            const InfoOutput output{size, value, sizeNeeded};
+            return name == CL_MEM_FLAGS ? writeInfoValue(reportedFlags(memory, *buffer), output)
+                                        : writeInfoValue<void*>(nullptr, output);
         }
     }
     return runtime().clGetMemObjectInfo(memory, name, size, value, sizeNeeded);

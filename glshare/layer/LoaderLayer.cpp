@@ -1,9 +1,8 @@
-// The shell for OpenCL loaders that know layers: hands the loader a table of functions in which
-// ours stand in front of those below.
+// The layer for the OpenCL loader. It returns a table in which the functions of EntryPoints.h
+// replace those of the layer below.
+#include "core/api/Arguments.h"
 #include "core/api/OpenCl.h"
 #include "entry/EntryPoints.h"
-
-#include "core/api/Answer.h"
 
 #include <CL/cl_layer.h>
 
@@ -17,7 +16,7 @@
 
 namespace {
 
-// The number of functions in a table, which is how loaders and layers of different age agree.
+// The number of functions in a table, by which loaders and layers compare their versions.
 constexpr cl_uint kFunctions = sizeof(cl_icd_dispatch) / sizeof(void*);
 
 constexpr std::string_view kName = "OpenGL buffer sharing in software (glshare)";
@@ -29,8 +28,8 @@ std::array<void*, kFunctions> functionsOf(const cl_icd_dispatch& table)
     return functions;
 }
 
-// Whether calls to `below` come back to this layer.
-bool liesOverItself(const cl_icd_dispatch& below)
+// Returns whether a function of `below` is this layer's.
+bool isStackedOnItself(const cl_icd_dispatch& below)
 {
     cl_icd_dispatch entryPoints{};
     glshare::installEntryPoints(entryPoints);
@@ -43,14 +42,14 @@ bool liesOverItself(const cl_icd_dispatch& below)
     return false;
 }
 
-// How many libraries the process has unloaded so far.
+// Returns the number of libraries that the process has unloaded so far.
 unsigned long long unloadedLibraries()
 {
     unsigned long long count = 0;
     dl_iterate_phdr(
         [](dl_phdr_info* info, std::size_t, void* result) {
             *static_cast<unsigned long long*>(result) = info->dlpi_subs;
-            return 1; // the number is the same for all
+            return 1; // every library reports the same number
         },
         &count);
     return count;
@@ -64,38 +63,38 @@ extern "C" {
                                                                  std::size_t size, void* value,
                                                                  std::size_t* sizeNeeded)
 {
-    const glshare::Query query{size, value, sizeNeeded};
+    const glshare::InfoOutput output{size, value, sizeNeeded};
     switch (name) {
     case CL_LAYER_API_VERSION:
-        return glshare::answerWith(cl_layer_api_version{CL_LAYER_API_VERSION_100}, query);
+        return glshare::writeInfoValue(cl_layer_api_version{CL_LAYER_API_VERSION_100}, output);
     case CL_LAYER_NAME:
-        return glshare::answer(std::as_bytes(std::span(kName.data(), kName.size() + 1)), query);
+        return glshare::writeInfo(std::as_bytes(std::span(kName.data(), kName.size() + 1)), output);
     default:
         return CL_INVALID_VALUE;
     }
 }
 
-// The loader keeps the table until it is unloaded. This layer stays then, and starts again when the
-// process loads the loader again. A second start under the same loader, which has unloaded nothing,
-// would put the layer on top of itself: such calls never return.
+// The loader uses the table until it is unloaded. The layer itself stays loaded, and is initialised
+// again if the process reloads the loader. A second initialisation without an unloaded library is
+// by the same loader: it would stack the layer on itself, and each call would recurse without end.
 [[gnu::visibility("default")]] cl_int CL_API_CALL clInitLayer(cl_uint count,
                                                               const cl_icd_dispatch* below,
                                                               cl_uint* countNeeded,
                                                               const cl_icd_dispatch** table)
 {
     static cl_icd_dispatch theTable;
-    static bool isStarted = false;
-    static unsigned long long unloadedAtStart = 0;
+    static bool isInitialized = false;
+    static unsigned long long unloadedBefore = 0;
     if (below == nullptr || countNeeded == nullptr || table == nullptr || count < kFunctions)
         return CL_INVALID_VALUE;
     const unsigned long long unloaded = unloadedLibraries();
-    if (liesOverItself(*below) || (isStarted && unloaded == unloadedAtStart))
+    if (isStackedOnItself(*below) || (isInitialized && unloaded == unloadedBefore))
         return CL_INVALID_VALUE;
     theTable = *below;
     glshare::setRuntime(*below);
     glshare::installEntryPoints(theTable);
-    isStarted = true;
-    unloadedAtStart = unloaded;
+    isInitialized = true;
+    unloadedBefore = unloaded;
     *countNeeded = kFunctions;
     *table = &theTable;
     return CL_SUCCESS;

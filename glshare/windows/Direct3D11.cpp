@@ -1,7 +1,8 @@
 #include "windows/Direct3D11.h"
 
-#include "core/api/Answer.h"
+#include "core/api/Arguments.h"
 #include "core/api/Devices.h"
+#include "core/api/VariableNames.h"
 #include "entry/EntryPoint.h"
 #include "entry/EntryPoints.h"
 #include "windows/Direct3D11Buffer.h"
@@ -28,7 +29,7 @@ struct SharedRecord {
     bool isAcquired = false;
 };
 
-// Which handles mean something here. Never destroyed, as objects may be released at exit.
+// The contexts and memory objects that share. Never destroyed: objects may be released at exit.
 struct Records {
     std::mutex mutex;                            // guards the rest
     std::map<cl_context, ID3D11Device*> devices; // the application's, which outlive their contexts
@@ -41,8 +42,8 @@ struct Records {
     }
 };
 
-// The functions that were in front before.
-cl_icd_dispatch inFront{};
+// The functions that installDirect3D11 has replaced.
+cl_icd_dispatch previousTable{};
 
 cl_int CL_API_CALL getDeviceIds(cl_platform_id platform, cl_d3d11_device_source_khr source,
                                 void* object, cl_d3d11_device_set_khr set, cl_uint capacity,
@@ -69,7 +70,7 @@ void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
     records.buffers.erase(memory);
 }
 
-// Of a new object, which goes if there is no memory for its record.
+// Adds the record of a new memory object; releases the object if that throws.
 void addRecord(cl_mem memory, Direct3D11Buffer buffer)
 {
     try {
@@ -77,7 +78,7 @@ void addRecord(cl_mem memory, Direct3D11Buffer buffer)
         const std::scoped_lock lock(Records::get().mutex);
         Records::get().buffers[memory] = std::move(record);
     } catch (...) {
-        runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
+        runtime().clReleaseMemObject(memory); // the only reference
         throw;
     }
     runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
@@ -105,9 +106,10 @@ cl_mem CL_API_CALL createFromBuffer(cl_context context, cl_mem_flags flags, ID3D
     return memory;
 }
 
-// The records of all objects, marked as `acquired`; or why that cannot be, and nothing changed.
-cl_int mark(std::span<const cl_mem> memory, bool acquired,
-            std::vector<std::shared_ptr<SharedRecord>>& found)
+// Finds the records of all objects and marks them as acquired, or as released. On an error nothing
+// is marked.
+cl_int setAcquired(std::span<const cl_mem> memory, bool acquired,
+                   std::vector<std::shared_ptr<SharedRecord>>& found)
 {
     Records& records = Records::get();
     const std::scoped_lock lock(records.mutex);
@@ -126,7 +128,8 @@ cl_int mark(std::span<const cl_mem> memory, bool acquired,
     return CL_SUCCESS;
 }
 
-cl_int copy(cl_command_queue queue, cl_mem memory, Direct3D11Buffer& buffer, bool toOpenCl)
+[[nodiscard]] cl_int copy(cl_command_queue queue, cl_mem memory, Direct3D11Buffer& buffer,
+                          bool toOpenCl)
 {
     std::vector<std::byte> bytes(buffer.size());
     if (toOpenCl) {
@@ -142,7 +145,7 @@ cl_int copy(cl_command_queue queue, cl_mem memory, Direct3D11Buffer& buffer, boo
     return buffer.write(bytes) ? CL_SUCCESS : CL_OUT_OF_RESOURCES;
 }
 
-// Waits and copies; a failure leaves the rest undone.
+// Waits for the wait list and copies; stops at the first failure.
 cl_int copyAll(cl_command_queue queue, std::span<const cl_mem> memory,
                std::span<const std::shared_ptr<SharedRecord>> records,
                std::span<const cl_event> waitList, bool toOpenCl)
@@ -159,13 +162,13 @@ template <bool acquired>
 cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* memory,
                            cl_uint waitCount, const cl_event* waitList, cl_event* event)
 {
-    if (!isList(count, memory))
+    if (!isValidList(count, memory))
         return CL_INVALID_VALUE;
-    if (!isList(waitCount, waitList))
+    if (!isValidList(waitCount, waitList))
         return CL_INVALID_EVENT_WAIT_LIST;
     const std::span objects(memory, count);
     std::vector<std::shared_ptr<SharedRecord>> records;
-    if (const cl_int error = mark(objects, acquired, records); error != CL_SUCCESS)
+    if (const cl_int error = setAcquired(objects, acquired, records); error != CL_SUCCESS)
         return error;
     cl_int error = CL_OUT_OF_HOST_MEMORY;
     try {
@@ -173,7 +176,7 @@ cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* 
         if (error == CL_SUCCESS)
             error = runtime().clEnqueueMarkerWithWaitList(queue, 0, nullptr, event);
     } catch (const std::exception&) {
-        // As any other failure of the command.
+        // `error` is CL_OUT_OF_HOST_MEMORY.
     }
     if (error != CL_SUCCESS) {
         const std::scoped_lock lock(Records::get().mutex);
@@ -183,7 +186,7 @@ cl_int CL_API_CALL enqueue(cl_command_queue queue, cl_uint count, const cl_mem* 
     return error;
 }
 
-// The list without its Direct3D device, which goes to `device`.
+// Returns the list without its Direct3D device, and sets `device` if it has one.
 std::vector<cl_context_properties> withoutDevice(const cl_context_properties* list,
                                                  ID3D11Device*& device)
 {
@@ -204,9 +207,9 @@ cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl
 {
     ID3D11Device* device = nullptr;
     const std::vector<cl_context_properties> others = withoutDevice(properties, device);
-    cl_context context = inFront.clCreateContext(device == nullptr ? properties : others.data(),
-                                                 count, devices, notify, user, error);
-    // The handle may have been another context's before.
+    cl_context context = previousTable.clCreateContext(
+        device == nullptr ? properties : others.data(), count, devices, notify, user, error);
+    // The handle may have an entry from an earlier context.
     Records& records = Records::get();
     const std::scoped_lock lock(records.mutex);
     records.devices.erase(context);
@@ -214,42 +217,43 @@ cl_context CL_API_CALL createContext(const cl_context_properties* properties, cl
         if (context != nullptr && device != nullptr)
             records.devices[context] = device;
     } catch (...) {
-        inFront.clReleaseContext(context); // the one reference, which nobody has seen
+        previousTable.clReleaseContext(context); // the only reference
         throw;
     }
     return context;
 }
 
-// What GLSHARE_D3D11 says, in the way in which the extension ends its functions' names.
-std::string suffix()
+// Returns the suffix of the extension's function names that GLSHARE_D3D11 selects; empty for none.
+std::string functionSuffix()
 {
-    const char* value = std::getenv("GLSHARE_D3D11");
-    const std::string_view wanted = value == nullptr ? "khr" : value;
-    if (wanted == "0")
+    const char* value = std::getenv(kDirect3D11Variable);
+    const std::string_view setting = value == nullptr ? "khr" : value;
+    if (setting == "0")
         return "";
-    return wanted == "nv" ? "NV" : "KHR";
+    return setting == "nv" ? "NV" : "KHR";
 }
 
 void* CL_API_CALL findFunction(const char* name)
 {
     void* own = name == nullptr ? nullptr : findDirect3D11Function(name);
-    return own != nullptr ? own : inFront.clGetExtensionFunctionAddress(name);
+    return own != nullptr ? own : previousTable.clGetExtensionFunctionAddress(name);
 }
 
 void* CL_API_CALL findFunctionForPlatform(cl_platform_id platform, const char* name)
 {
     void* own = name == nullptr ? nullptr : findDirect3D11Function(name);
-    return own != nullptr ? own : inFront.clGetExtensionFunctionAddressForPlatform(platform, name);
+    return own != nullptr ? own
+                          : previousTable.clGetExtensionFunctionAddressForPlatform(platform, name);
 }
 
 } // namespace
 
 void installDirect3D11(cl_icd_dispatch& table)
 {
-    if (suffix().empty())
+    if (functionSuffix().empty())
         return;
-    addExtension(suffix() == "NV" ? "cl_nv_d3d11_sharing" : "cl_khr_d3d11_sharing");
-    inFront = table;
+    addExtension(functionSuffix() == "NV" ? "cl_nv_d3d11_sharing" : "cl_khr_d3d11_sharing");
+    previousTable = table;
     table.clCreateContext = entryPoint<createContext>;
     table.clGetExtensionFunctionAddress = entryPoint<findFunction>;
     table.clGetExtensionFunctionAddressForPlatform = entryPoint<findFunctionForPlatform>;
@@ -258,12 +262,13 @@ void installDirect3D11(cl_icd_dispatch& table)
 void* findDirect3D11Function(std::string_view name)
 {
     const std::array<std::pair<std::string, void*>, 4> functions{{
-        {"clGetDeviceIDsFromD3D11" + suffix(), reinterpret_cast<void*>(entryPoint<getDeviceIds>)},
-        {"clCreateFromD3D11Buffer" + suffix(),
+        {"clGetDeviceIDsFromD3D11" + functionSuffix(),
+         reinterpret_cast<void*>(entryPoint<getDeviceIds>)},
+        {"clCreateFromD3D11Buffer" + functionSuffix(),
          reinterpret_cast<void*>(entryPoint<createFromBuffer>)},
-        {"clEnqueueAcquireD3D11Objects" + suffix(),
+        {"clEnqueueAcquireD3D11Objects" + functionSuffix(),
          reinterpret_cast<void*>(entryPoint<enqueue<true>>)},
-        {"clEnqueueReleaseD3D11Objects" + suffix(),
+        {"clEnqueueReleaseD3D11Objects" + functionSuffix(),
          reinterpret_cast<void*>(entryPoint<enqueue<false>>)},
     }};
     for (const auto& [ownName, address] : functions) {

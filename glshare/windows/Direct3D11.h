@@ -1,9 +1,8 @@
-// Direct3D 11 buffer sharing by copying: cl_khr_d3d11_sharing, or with GLSHARE_D3D11=nv its older
-// relative cl_nv_d3d11_sharing, whose functions have the same signatures. GLSHARE_D3D11=0 offers
-// neither.
+// Direct3D 11 buffer sharing by copies: cl_khr_d3d11_sharing, or with GLSHARE_D3D11=nv the older
+// cl_nv_d3d11_sharing, whose functions have the same signatures. GLSHARE_D3D11=0 disables both.
 //
-// An acquire waits for its wait list and copies on the calling thread, and so does a release: the
-// commands of the two sides are in order then. Textures are not offered.
+// Acquire and release wait for their wait list and copy on the calling thread, so that OpenCL and
+// Direct3D commands are in order. Textures are not supported.
 #pragma once
 
 #include "core/api/OpenCl.h"
@@ -12,11 +11,11 @@
 
 namespace glshare {
 
-// Puts the context functions that know Direct3D devices in front of those in `table`, and adds the
-// extension. Once, by the shell, after installEntryPoints.
+// Replaces the functions in `table` that create contexts and look up extension functions, and adds
+// the extension. Called once, after installEntryPoints.
 void installDirect3D11(cl_icd_dispatch& table);
 
-// The extension's function of that name, or null.
+// Returns the extension's function of that name; null if there is none.
 [[nodiscard]] void* findDirect3D11Function(std::string_view name);
 
 } // namespace glshare

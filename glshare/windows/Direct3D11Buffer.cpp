@@ -9,7 +9,7 @@ namespace glshare {
 
 namespace {
 
-void protect(ID3D11DeviceContext* commands)
+void enableMultithreadProtection(ID3D11DeviceContext* commands)
 {
     ID3D11Multithread* threads = nullptr;
     if (SUCCEEDED(commands->QueryInterface(__uuidof(ID3D11Multithread),
@@ -28,7 +28,7 @@ std::optional<Direct3D11Buffer> Direct3D11Buffer::create(ID3D11Device* device,
         return std::nullopt;
     ID3D11Device* owner = nullptr;
     resource->GetDevice(&owner);
-    const ComPointer<ID3D11Device> ownerHold(owner);
+    const ComPointer<ID3D11Device> ownerReference(owner);
     D3D11_BUFFER_DESC description{};
     resource->GetDesc(&description);
     if (owner != device || description.Usage == D3D11_USAGE_IMMUTABLE)
@@ -47,13 +47,13 @@ std::optional<Direct3D11Buffer> Direct3D11Buffer::create(ID3D11Device* device,
     ID3D11DeviceContext* commands = nullptr;
     device->GetImmediateContext(&commands);
     buffer.fCommands.reset(commands);
-    protect(commands);
+    enableMultithreadProtection(commands);
     resource->AddRef();
     buffer.fResource.reset(resource);
     return buffer;
 }
 
-// The mapping waits for the copy.
+// Map waits for the copy.
 bool Direct3D11Buffer::read(std::span<std::byte> to)
 {
     fCommands->CopyResource(fStaging.get(), fResource.get());

@@ -1,5 +1,4 @@
-// What is done on the Direct3D 11 side: reading and writing a buffer through one of our own that
-// the processor can map.
+// Reads and writes a Direct3D 11 buffer through a staging buffer that the CPU can map.
 #pragma once
 
 #include <cstddef>
@@ -12,21 +11,22 @@
 namespace glshare {
 
 struct ComRelease {
-    void operator()(IUnknown* object) const { object->Release(); }
+    void operator()(IUnknown* object) const noexcept { object->Release(); }
 };
 template <typename T>
 using ComPointer = std::unique_ptr<T, ComRelease>;
 
-// Uses the device's immediate context, which is made safe for several threads.
+// Uses the device's immediate context, for which it enables multithread protection. One thread at a
+// time.
 class Direct3D11Buffer {
 public:
-    // Holds a reference to `resource`. Empty if that is null, of another device, or of a kind that
-    // cannot be copied to.
-    static std::optional<Direct3D11Buffer> create(ID3D11Device* device, ID3D11Buffer* resource);
+    // Holds a reference to `resource`. Empty if that is null, immutable or of another device.
+    [[nodiscard]] static std::optional<Direct3D11Buffer> create(ID3D11Device* device,
+                                                                ID3D11Buffer* resource);
 
-    [[nodiscard]] std::size_t size() const { return fSize; }
+    [[nodiscard]] std::size_t size() const noexcept { return fSize; }
 
-    // All bytes of the buffer; false if Direct3D fails.
+    // Copy all bytes of the buffer; return false if Direct3D fails. The span has size() bytes.
     [[nodiscard]] bool read(std::span<std::byte> to);
     [[nodiscard]] bool write(std::span<const std::byte> from);
 

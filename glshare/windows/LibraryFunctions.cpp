@@ -5,20 +5,15 @@
 
 namespace glshare {
 
-LibraryFunctions::LibraryFunctions(const char* fileName) : fLibrary(LoadLibraryA(fileName)) {}
+LibraryFunctions::LibraryFunctions(const char* fileName) noexcept : fLibrary(LoadLibraryA(fileName))
+{
+}
 
-void* LibraryFunctions::address(const char* name) const
+void* LibraryFunctions::address(const char* name) const noexcept
 {
     if (fLibrary == nullptr)
         return nullptr;
     return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(fLibrary), name));
-}
-
-void callAtExit(void (* /*call*/)()) {}
-
-bool callInForkedChild(void (* /*call*/)())
-{
-    return true;
 }
 
 } // namespace glshare

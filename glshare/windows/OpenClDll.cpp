@@ -1,11 +1,11 @@
-// The shell for Windows, where OpenCL's loader knows no layers that reach OpenGL sharing: an
-// OpenCL.dll that a program finds beside itself. It passes everything on to the system's, with our
-// functions in front.
-#include "core/api/Switches.h"
+// An OpenCL.dll that a program loads from its own directory, since layers of the Windows loader
+// cannot replace the OpenGL sharing functions. It calls the system's OpenCL.dll, except for the
+// functions of EntryPoints.h.
+#include "core/api/Settings.h"
 #include "entry/EntryPoint.h"
 #include "entry/EntryPoints.h"
 #include "windows/Direct3D11.h"
-#include "windows/Functions.h"
+#include "windows/OpenClFunctions.h"
 #include "windows/SystemOpenCl.h"
 
 #include <exception>
@@ -24,14 +24,14 @@ cl_icd_dispatch makeTable()
     return table;
 }
 
-// Made with the first call, not when this library is loaded: one may load no other then.
+// Created with the first call: a DLL must not load another one while it is loaded.
 const cl_icd_dispatch& table()
 {
     static const cl_icd_dispatch theTable = makeTable();
     return theTable;
 }
 
-// The function that stands for `member` of the table, under the same signature.
+// A function that calls `member` of the table, under the same signature.
 template <auto member>
 struct Forward;
 
@@ -52,8 +52,8 @@ struct Forward<member> {
 
 } // namespace glshare
 
-// Exported under the function's own name, which the headers have declared already; so the function
-// has another name here, and jumps to the one above with its arguments untouched.
+// Exports a function under its OpenCL name. The headers have declared that name, so the function
+// has another one here, and jumps to Forward::call with its arguments unchanged.
 #define GLSHARE_EXPORT(function)                                                                   \
     [[gnu::used]] auto* const glshareTarget_##function =                                           \
         &glshare::Forward<&cl_icd_dispatch::function>::call;                                       \

@@ -2,7 +2,7 @@
 
 #include "core/gl/LibraryFunctions.h"
 #include "entry/EntryPoint.h"
-#include "windows/Functions.h"
+#include "windows/OpenClFunctions.h"
 
 #include <map>
 #include <memory>
@@ -17,7 +17,7 @@ namespace glshare {
 
 namespace {
 
-// By its full path: the bare name would be this library again.
+// Returns the full path: the file name alone would find this library.
 std::string systemLibrary()
 {
     std::string folder(MAX_PATH, '\0');
@@ -31,13 +31,13 @@ using EventNotify = void(CL_CALLBACK*)(cl_event, cl_int, void*);
 using MemoryNotify = void(CL_CALLBACK*)(cl_mem, void*);
 
 struct EventCallback {
-    cl_event event; // a reference of its own
+    cl_event event; // owned
     EventNotify notify;
     void* user;
 };
 
-// On a thread of the system's pool.
-void CALLBACK waitAndTell(PTP_CALLBACK_INSTANCE /*instance*/, void* argument)
+// Runs on a thread of the system's pool.
+void CALLBACK waitAndNotify(PTP_CALLBACK_INSTANCE /*instance*/, void* argument)
 {
     const std::unique_ptr<EventCallback> callback(static_cast<EventCallback*>(argument));
     cl_int status = CL_COMPLETE;
@@ -54,15 +54,15 @@ cl_int CL_API_CALL setEventCallback(cl_event event, cl_int /*status*/, EventNoti
     auto callback = std::make_unique<EventCallback>(EventCallback{event, notify, user});
     if (const cl_int error = theSystem.clRetainEvent(event); error != CL_SUCCESS)
         return error;
-    if (!TrySubmitThreadpoolCallback(waitAndTell, callback.get(), nullptr)) {
+    if (!TrySubmitThreadpoolCallback(waitAndNotify, callback.get(), nullptr)) {
         theSystem.clReleaseEvent(event);
         return CL_OUT_OF_RESOURCES;
     }
-    static_cast<void>(callback.release()); // waitAndTell's
+    static_cast<void>(callback.release()); // owned by waitAndNotify
     return CL_SUCCESS;
 }
 
-// Who is told when a memory object goes. Never destroyed, as objects may be released at exit.
+// The destructor callbacks of memory objects. Never destroyed: objects may be released at exit.
 struct Destructors {
     std::mutex mutex; // guards the rest, and each last release
     std::map<cl_mem, std::vector<std::pair<MemoryNotify, void*>>> callbacks;
@@ -111,11 +111,11 @@ cl_icd_dispatch loadSystemOpenCl()
 #define GLSHARE_FIND(function) static_cast<void>(library.find(theSystem.function, #function));
     GLSHARE_FUNCTIONS(GLSHARE_FIND)
 #undef GLSHARE_FIND
-    cl_icd_dispatch repaired = theSystem;
-    repaired.clSetEventCallback = entryPoint<setEventCallback>;
-    repaired.clSetMemObjectDestructorCallback = entryPoint<setDestructorCallback>;
-    repaired.clReleaseMemObject = releaseMemory;
-    return repaired;
+    cl_icd_dispatch table = theSystem;
+    table.clSetEventCallback = entryPoint<setEventCallback>;
+    table.clSetMemObjectDestructorCallback = entryPoint<setDestructorCallback>;
+    table.clReleaseMemObject = releaseMemory;
+    return table;
 }
 
 } // namespace glshare

@@ -1,15 +1,16 @@
-// The OpenCL.dll of the system, which ours stands in front of.
+// The OpenCL.dll of the system.
 #pragma once
 
 #include "core/api/OpenCl.h"
 
 namespace glshare {
 
-// Its functions; those that it lacks are null. Null, all of them, where there is none. Loads it.
+// Loads the library and returns its functions. Missing functions are null, and so are all if there
+// is no such library.
 //
-// Some systems' OpenCL.dll refuses to call back. Then the callbacks for events and for memory
-// objects that are destroyed are given here: the first on a thread that waits for the event, the
-// second when the application lets its last reference go.
+// Some systems' OpenCL.dll rejects callbacks, so they are implemented here. Event callbacks run on
+// a thread that waits for the event. Destructor callbacks of a memory object run when the
+// application releases its last reference.
 [[nodiscard]] cl_icd_dispatch loadSystemOpenCl();
 
 } // namespace glshare

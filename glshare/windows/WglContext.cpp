@@ -1,7 +1,7 @@
 // Implements GlContext for WGL.
 //
-// The context is made on the application's device context, and used on a window of our own of the
-// same pixel format, which belongs to the worker's thread.
+// The context is created for the application's device context. It is made current with a hidden
+// window of the same pixel format, which belongs to the worker's thread.
 #include "core/gl/GlContext.h"
 #include "core/gl/LibraryFunctions.h"
 
@@ -25,7 +25,7 @@ struct WglFunctions {
     decltype(&::DescribePixelFormat) describePixelFormat = nullptr;
     decltype(&::GetPixelFormat) getPixelFormat = nullptr;
     decltype(&::SetPixelFormat) setPixelFormat = nullptr;
-    // Whether all of the above were found. Nothing may be called otherwise.
+    // Whether all of the above were found. If not, none may be called.
     bool complete = false;
 };
 
@@ -51,7 +51,8 @@ const WglFunctions& wgl()
     return theFunctions;
 }
 
-// wglGetProcAddress knows extensions and what came after OpenGL 1.1; the library itself the rest.
+// wglGetProcAddress finds extensions and functions newer than OpenGL 1.1; the library exports the
+// others.
 void* resolveGl(const char* name)
 {
     if (const PROC extension = wgl().getProcAddress(name))
@@ -78,7 +79,7 @@ public:
                wgl().makeCurrent(fDevice, fContext);
     }
 
-    // On the thread that has made the context current, whose the window is.
+    // On the thread that called makeCurrent, which owns the window.
     void releaseCurrent() override
     {
         wgl().makeCurrent(nullptr, nullptr);
@@ -90,7 +91,7 @@ public:
 
     bool callerHasContext() const override { return wgl().getCurrentContext() != nullptr; }
 
-    GlFunctions::Resolver resolver() const override { return resolveGl; }
+    GlFunctions::Resolver resolver() const noexcept override { return resolveGl; }
 
     void onDisplayClosing(std::function<void()>) override {}
 
@@ -103,26 +104,26 @@ private:
 
 } // namespace
 
-bool isSupported(WindowSystem windowSystem)
+bool isSupported(WindowSystem windowSystem) noexcept
 {
     return windowSystem == WindowSystem::kWgl;
 }
 
-bool isShareable(const GlBinding& binding)
+bool isShareable(const GlContextHandle& handle)
 {
-    return binding.context != nullptr && wgl().complete &&
-           wgl().getPixelFormat(static_cast<HDC>(binding.display)) != 0;
+    return handle.context != nullptr && wgl().complete &&
+           wgl().getPixelFormat(static_cast<HDC>(handle.display)) != 0;
 }
 
-// A context of the application's must be current: only then does WGL tell of its extensions.
-std::unique_ptr<GlContext> createSharingContext(const GlBinding& binding)
+// A context must be current on the calling thread: WGL finds its extension functions only then.
+std::unique_ptr<GlContext> createSharedGlContext(const GlContextHandle& handle)
 {
-    const auto device = static_cast<HDC>(binding.display);
+    const auto device = static_cast<HDC>(handle.display);
     const auto create = reinterpret_cast<PFNWGLCREATECONTEXTATTRIBSARBPROC>(
         resolveGl("wglCreateContextAttribsARB"));
     if (create == nullptr)
         return nullptr;
-    // 3.3 is the oldest version that has all we call.
+    // 3.3 is the oldest version with all the functions that GlFunctions needs.
     const std::array<int, 7> attributes{WGL_CONTEXT_MAJOR_VERSION_ARB,
                                         3,
                                         WGL_CONTEXT_MINOR_VERSION_ARB,
@@ -130,7 +131,7 @@ std::unique_ptr<GlContext> createSharingContext(const GlBinding& binding)
                                         WGL_CONTEXT_PROFILE_MASK_ARB,
                                         WGL_CONTEXT_CORE_PROFILE_BIT_ARB,
                                         0};
-    const HGLRC context = create(device, static_cast<HGLRC>(binding.context), attributes.data());
+    const HGLRC context = create(device, static_cast<HGLRC>(handle.context), attributes.data());
     if (context == nullptr)
         return nullptr;
     return std::make_unique<WglContext>(context, wgl().getPixelFormat(device));

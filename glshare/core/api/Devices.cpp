@@ -1,15 +1,15 @@
 #include "core/api/Devices.h"
 
-#include "core/api/Switches.h"
+#include "core/api/Settings.h"
 
 namespace glshare {
 
 namespace {
 
-constexpr std::string_view kSharing = "cl_khr_gl_sharing";
-constexpr std::string_view kEvent = "cl_khr_gl_event";
+constexpr std::string_view kGlSharing = "cl_khr_gl_sharing";
+constexpr std::string_view kGlEvent = "cl_khr_gl_event";
 
-// Empty if `context` is not a context.
+// Returns the devices of a context; empty if it is not a valid context.
 std::vector<cl_device_id> devicesOf(cl_context context)
 {
     std::size_t size = 0;
@@ -23,27 +23,27 @@ std::vector<cl_device_id> devicesOf(cl_context context)
 
 } // namespace
 
-bool sharesByItself(cl_device_id device)
+bool sharesNatively(cl_device_id device)
 {
     std::size_t size = 0;
     if (runtime().clGetDeviceInfo(device, CL_DEVICE_EXTENSIONS, 0, nullptr, &size) != CL_SUCCESS)
         return false;
     std::string extensions(size, '\0');
     runtime().clGetDeviceInfo(device, CL_DEVICE_EXTENSIONS, size, extensions.data(), nullptr);
-    return containsExtension(extensions.c_str(), kSharing);
+    return containsExtension(extensions.c_str(), kGlSharing);
 }
 
-bool runtimeShares(cl_context context)
+bool runtimeSharesNatively(cl_context context)
 {
     const std::vector<cl_device_id> devices = devicesOf(context);
-    return !devices.empty() && sharesByItself(devices.front());
+    return !devices.empty() && sharesNatively(devices.front());
 }
 
-bool offersVersion3(cl_context context)
+bool supportsOpenCl3(cl_context context)
 {
     const std::vector<cl_device_id> devices = devicesOf(context);
     cl_platform_id platform = nullptr;
-    cl_version version = 0; // a query that OpenCL 3.0 has introduced
+    cl_version version = 0; // a query of OpenCL 3.0
     return !devices.empty() &&
            runtime().clGetDeviceInfo(devices.front(), CL_DEVICE_PLATFORM, sizeof platform,
                                      static_cast<void*>(&platform), nullptr) == CL_SUCCESS &&
@@ -52,34 +52,34 @@ bool offersVersion3(cl_context context)
            CL_VERSION_MAJOR(version) >= 3;
 }
 
-cl_device_type ownType(cl_device_id device)
+cl_device_type runtimeType(cl_device_id device)
 {
     cl_device_type type = 0;
     runtime().clGetDeviceInfo(device, CL_DEVICE_TYPE, sizeof type, &type, nullptr);
     return type;
 }
 
-cl_device_type shownType(cl_device_type own)
+cl_device_type reportedType(cl_device_type type)
 {
-    const bool isDisguised = switches().cpuAsGpu && (own & CL_DEVICE_TYPE_CPU) != 0;
-    return isDisguised ? cl_device_type{CL_DEVICE_TYPE_GPU} : own;
+    const bool isReportedAsGpu = settings().cpuAsGpu && (type & CL_DEVICE_TYPE_CPU) != 0;
+    return isReportedAsGpu ? cl_device_type{CL_DEVICE_TYPE_GPU} : type;
 }
 
-std::optional<cl_device_type> typeToAskFor(cl_device_type wanted)
+std::optional<cl_device_type> runtimeTypeFor(cl_device_type requested)
 {
-    if (!switches().cpuAsGpu || wanted == CL_DEVICE_TYPE_ALL)
-        return wanted;
-    const bool wantsGpu = (wanted & CL_DEVICE_TYPE_GPU) != 0;
-    const cl_device_type others = wanted & ~cl_device_type{CL_DEVICE_TYPE_CPU};
-    const cl_device_type asked = wantsGpu ? others | CL_DEVICE_TYPE_CPU : others;
-    if (asked == 0 && wanted != 0)
+    if (!settings().cpuAsGpu || requested == CL_DEVICE_TYPE_ALL)
+        return requested;
+    const bool includesGpu = (requested & CL_DEVICE_TYPE_GPU) != 0;
+    const cl_device_type others = requested & ~cl_device_type{CL_DEVICE_TYPE_CPU};
+    const cl_device_type type = includesGpu ? others | CL_DEVICE_TYPE_CPU : others;
+    if (type == 0 && requested != 0)
         return std::nullopt;
-    return asked;
+    return type;
 }
 
-std::vector<cl_device_id> devicesOf(cl_platform_id platform, cl_device_type wanted)
+std::vector<cl_device_id> devicesOf(cl_platform_id platform, cl_device_type requested)
 {
-    const std::optional<cl_device_type> type = typeToAskFor(wanted);
+    const std::optional<cl_device_type> type = runtimeTypeFor(requested);
     cl_uint count = 0;
     if (!type || runtime().clGetDeviceIDs(platform, *type, 0, nullptr, &count) != CL_SUCCESS)
         return {};
@@ -100,8 +100,9 @@ namespace {
 
 std::vector<std::string_view>& extensionsToAdd()
 {
-    static auto theExtensions = switches().glEvent ? std::vector<std::string_view>{kSharing, kEvent}
-                                                   : std::vector<std::string_view>{kSharing};
+    static auto theExtensions = settings().glEvent
+                                    ? std::vector<std::string_view>{kGlSharing, kGlEvent}
+                                    : std::vector<std::string_view>{kGlSharing};
     return theExtensions;
 }
 
@@ -117,7 +118,7 @@ void addExtension(std::string_view name)
     extensionsToAdd().push_back(name);
 }
 
-bool containsExtension(std::string_view extensions, std::string_view name)
+bool containsExtension(std::string_view extensions, std::string_view name) noexcept
 {
     while (!extensions.empty()) {
         const std::size_t end = extensions.find(' ');
@@ -130,16 +131,16 @@ bool containsExtension(std::string_view extensions, std::string_view name)
     return false;
 }
 
-std::string shownExtensions(std::string own)
+std::string reportedExtensions(std::string extensions)
 {
-    if (containsExtension(own, kSharing))
-        return own;
-    for (const std::string_view extension : addedExtensions()) {
-        if (!own.empty() && own.back() != ' ')
-            own += ' ';
-        own += extension;
+    if (containsExtension(extensions, kGlSharing))
+        return extensions;
+    for (const std::string_view added : addedExtensions()) {
+        if (!extensions.empty() && extensions.back() != ' ')
+            extensions += ' ';
+        extensions += added;
     }
-    return own;
+    return extensions;
 }
 
 } // namespace glshare

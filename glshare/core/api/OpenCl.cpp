@@ -6,12 +6,12 @@ namespace {
 cl_icd_dispatch theRuntime{};
 }
 
-const cl_icd_dispatch& runtime()
+const cl_icd_dispatch& runtime() noexcept
 {
     return theRuntime;
 }
 
-void setRuntime(const cl_icd_dispatch& table)
+void setRuntime(const cl_icd_dispatch& table) noexcept
 {
     theRuntime = table;
 }

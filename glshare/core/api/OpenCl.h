@@ -1,5 +1,5 @@
-// The OpenCL interface as this program sees it: the newest headers, whatever version the rest of
-// the build targets, and the table of functions that calls are passed down to.
+// The newest OpenCL headers, whatever version the rest of the build targets, and the table of the
+// underlying OpenCL functions.
 #pragma once
 
 #undef CL_TARGET_OPENCL_VERSION
@@ -10,13 +10,13 @@
 
 namespace glshare {
 
-// The functions of whatever lies below: another layer, or the runtime itself. Valid from the moment
-// the shell has called setRuntime, which is before the application's first OpenCL call returns.
-// Nothing here calls the OpenCL library's exported functions: those would come back to this
-// program.
-const cl_icd_dispatch& runtime();
+// Returns the functions of the layer below, which is another layer or the OpenCL runtime. Valid
+// once setRuntime has been called. glshare calls these only: the OpenCL library's exported
+// functions would call glshare again. Any thread.
+[[nodiscard]] const cl_icd_dispatch& runtime() noexcept;
 
-// Called once by the shell. The table is copied.
-void setRuntime(const cl_icd_dispatch& table);
+// Copies `table`. Called by layer/ or windows/, before the first OpenCL call of the application
+// returns.
+void setRuntime(const cl_icd_dispatch& table) noexcept;
 
 } // namespace glshare

@@ -1,7 +1,8 @@
-// Implements GlContext for EGL.
-#include "core/gl/EglFunctions.h"
+// Implements GlContext for EGL. EGL is loaded at run time: nothing links it.
 #include "core/gl/GlContext.h"
+#include "core/gl/LibraryFunctions.h"
 
+#include <EGL/egl.h>
 #include <EGL/eglext.h>
 
 #include <array>
@@ -10,6 +11,47 @@ namespace glshare {
 
 namespace {
 
+struct EglFunctions {
+    decltype(&::eglGetProcAddress) getProcAddress = nullptr;
+    decltype(&::eglBindAPI) bindApi = nullptr;
+    decltype(&::eglQueryAPI) queryApi = nullptr;
+    decltype(&::eglChooseConfig) chooseConfig = nullptr;
+    decltype(&::eglCreateContext) createContext = nullptr;
+    decltype(&::eglDestroyContext) destroyContext = nullptr;
+    decltype(&::eglGetCurrentContext) getCurrentContext = nullptr;
+    decltype(&::eglMakeCurrent) makeCurrent = nullptr;
+    decltype(&::eglQueryContext) queryContext = nullptr;
+    decltype(&::eglReleaseThread) releaseThread = nullptr;
+
+    // Whether all of the above were found. If not, none may be called.
+    bool complete = false;
+};
+
+EglFunctions loadEgl()
+{
+    EglFunctions egl;
+    const LibraryFunctions library("libEGL.so.1");
+    egl.complete = library.find(egl.getProcAddress, "eglGetProcAddress") &&
+                   library.find(egl.bindApi, "eglBindAPI") &&
+                   library.find(egl.queryApi, "eglQueryAPI") &&
+                   library.find(egl.chooseConfig, "eglChooseConfig") &&
+                   library.find(egl.createContext, "eglCreateContext") &&
+                   library.find(egl.destroyContext, "eglDestroyContext") &&
+                   library.find(egl.getCurrentContext, "eglGetCurrentContext") &&
+                   library.find(egl.makeCurrent, "eglMakeCurrent") &&
+                   library.find(egl.queryContext, "eglQueryContext") &&
+                   library.find(egl.releaseThread, "eglReleaseThread");
+    return egl;
+}
+
+// Loads EGL with the first call. It stays loaded, since its threads and exit handlers may outlive
+// every context.
+const EglFunctions& egl()
+{
+    static const EglFunctions theFunctions = loadEgl();
+    return theFunctions;
+}
+
 void* resolveGl(const char* name)
 {
     return reinterpret_cast<void*>(egl().getProcAddress(name));
@@ -17,10 +59,10 @@ void* resolveGl(const char* name)
 
 class EglContext final : public GlContext {
 public:
-    // Owns no context yet.
+    // Owns no context until own() is called.
     EglContext(EGLDisplay display, EGLenum api) : fDisplay(display), fApi(api) {}
 
-    // After the application's eglTerminate this is refused with an error, which is fine.
+    // eglDestroyContext fails after the application's eglTerminate, which has no effect here.
     ~EglContext() override
     {
         if (fContext != EGL_NO_CONTEXT)
@@ -35,15 +77,15 @@ public:
                egl().makeCurrent(fDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, fContext) == EGL_TRUE;
     }
 
-    // eglMakeCurrent would refuse to unbind on a terminated display; this never does.
+    // eglMakeCurrent fails to unbind on a terminated display; eglReleaseThread does not.
     void releaseCurrent() override { egl().releaseThread(); }
 
-    // EGL keeps what is current alive beyond its display.
+    // EGL keeps a current context alive after its display is terminated.
     void abandon() override {}
 
     bool callerHasContext() const override { return egl().getCurrentContext() != EGL_NO_CONTEXT; }
 
-    GlFunctions::Resolver resolver() const override { return resolveGl; }
+    GlFunctions::Resolver resolver() const noexcept override { return resolveGl; }
 
     void onDisplayClosing(std::function<void()>) override {}
 
@@ -53,7 +95,7 @@ private:
     EGLenum fApi;
 };
 
-// The configuration of the application's context, or none at all where it was made without one.
+// Returns the configuration of a context; EGL_NO_CONFIG_KHR if it was created without one.
 EGLConfig configOf(EGLDisplay display, EGLContext context)
 {
     EGLint id = 0;
@@ -85,16 +127,16 @@ std::unique_ptr<GlContext> createEglContext(void* display, void* shareContext)
     const auto api = static_cast<EGLenum>(type);
     auto result = std::make_unique<EglContext>(display, api);
 
-    // Only contexts of one client interface share. 3.3 and ES 3.0 are the oldest that have all we
-    // call.
+    // Contexts share only within one client API. 3.3 and ES 3.0 are the oldest versions with all
+    // the functions that GlFunctions needs.
     const std::array<EGLint, 5> attributes{EGL_CONTEXT_MAJOR_VERSION, 3, EGL_CONTEXT_MINOR_VERSION,
                                            api == EGL_OPENGL_API ? 3 : 0, EGL_NONE};
-    // The bound interface belongs to the thread, so it is put back for the application.
-    const EGLenum before = egl().queryApi();
+    // The bound API is state of the calling thread, and is restored.
+    const EGLenum previousApi = egl().queryApi();
     egl().bindApi(api);
     EGLContext context = egl().createContext(display, configOf(display, shareContext), shareContext,
                                              attributes.data());
-    egl().bindApi(before);
+    egl().bindApi(previousApi);
     if (context == EGL_NO_CONTEXT)
         return nullptr;
     result->own(context);

@@ -1,5 +1,5 @@
-// An OpenGL context of our own in the share group of one of the application's, behind an interface
-// that hides the window system. One source file per window system implements it.
+// An OpenGL context of glshare's own, which shares objects with a context of the application.
+// GlxContext.cpp, EglContext.cpp and windows/WglContext.cpp implement it, one per window system.
 #pragma once
 
 #include "core/gl/GlFunctions.h"
@@ -11,13 +11,14 @@ namespace glshare {
 
 enum class WindowSystem { kGlx, kEgl, kWgl };
 
-// The application's context, as it came in the properties of an OpenCL context.
-struct GlBinding {
+// A context of the application, as named by the properties of an OpenCL context.
+struct GlContextHandle {
     WindowSystem windowSystem;
-    void* display; // with WGL, the device context of a window
+    void* display; // for WGL, the device context of a window
     void* context;
 };
 
+// One thread at a time; GlWorker uses it on its own thread.
 class GlContext {
 public:
     GlContext() = default;
@@ -27,39 +28,42 @@ public:
     // Destroys the context, unless it was abandoned. It must not be current on any thread.
     virtual ~GlContext() = default;
 
-    // Makes the context current on the calling thread, without a drawable; false on failure.
+    // Makes the context current on the calling thread, without a drawable; returns false on
+    // failure.
     [[nodiscard]] virtual bool makeCurrent() = 0;
 
-    // Leaves the calling thread without a current context.
+    // Leaves the calling thread, on which the context is current, without a current context.
     virtual void releaseCurrent() = 0;
 
-    // The display is about to go. What the context holds is left behind on purpose, since OpenCL
-    // commands may still be using the storage of its buffers.
+    // Called before the display closes. Leaks the context and its objects, since OpenCL commands
+    // may still use the storage of its buffers.
     virtual void abandon() = 0;
 
-    // Whether any context of this window system is current on the calling thread.
+    // Returns whether any context of this window system is current on the calling thread. Any
+    // thread.
     [[nodiscard]] virtual bool callerHasContext() const = 0;
 
-    [[nodiscard]] virtual GlFunctions::Resolver resolver() const = 0;
+    [[nodiscard]] virtual GlFunctions::Resolver resolver() const noexcept = 0;
 
-    // `closing` is called, on the thread that closes the display, before the display goes. Never
-    // called where the window system gives no such notice.
+    // Registers a callback that runs before the display closes, on the thread that closes it. Does
+    // nothing for EGL and WGL, which do not report that.
     virtual void onDisplayClosing(std::function<void()> closing) = 0;
 };
 
-// Whether contexts of this window system are known on the system that this is built for. What
-// follows is for bindings of those.
-[[nodiscard]] bool isSupported(WindowSystem windowSystem);
+// Returns whether the system that glshare is built for has this window system. The functions below
+// require it.
+[[nodiscard]] bool isSupported(WindowSystem windowSystem) noexcept;
 
-// Whether `binding` names a context that can be shared with, as far as the window system can tell
-// without a risk.
-[[nodiscard]] bool isShareable(const GlBinding& binding);
+// Returns whether a context can be shared with, as far as that can be queried safely: GLX may end
+// the process if it is passed an invalid handle.
+[[nodiscard]] bool isShareable(const GlContextHandle& handle);
 
-// Creates a context that shares with `binding`; null if the window system refuses. Any thread, also
-// while the application's context is current on another.
-[[nodiscard]] std::unique_ptr<GlContext> createSharingContext(const GlBinding& binding);
+// Creates a context that shares objects with `handle`; null if the window system refuses. Any
+// thread, also while the application's context is current on another one; for WGL, a thread with a
+// current context.
+[[nodiscard]] std::unique_ptr<GlContext> createSharedGlContext(const GlContextHandle& handle);
 
-// The parts of the two functions above for each window system of Linux.
+// Implement the two functions above on Linux.
 [[nodiscard]] bool isShareableGlx(void* display, void* context);
 [[nodiscard]] bool isShareableEgl(void* display, void* context);
 [[nodiscard]] std::unique_ptr<GlContext> createGlxContext(void* display, void* shareContext);

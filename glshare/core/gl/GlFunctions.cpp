@@ -18,7 +18,7 @@ bool GlFunctions::load(Resolver resolve)
     const auto found = [resolve](auto& function, const char* name) {
         return resolveInto(function, resolve, name);
     };
-    static_cast<void>(found(getBufferSubData, "glGetBufferSubData")); // OpenGL ES has none
+    static_cast<void>(found(getBufferSubData, "glGetBufferSubData")); // missing in OpenGL ES
     return found(getString, "glGetString") && found(finish, "glFinish") &&
            found(getError, "glGetError") && found(getIntegerv, "glGetIntegerv") &&
            found(isBuffer, "glIsBuffer") && found(genBuffers, "glGenBuffers") &&

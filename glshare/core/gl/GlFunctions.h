@@ -1,5 +1,5 @@
-// The OpenGL functions this program calls, resolved at run time: nothing links an OpenGL library,
-// so a process that shares through EGL never loads GLX, and the other way round.
+// The OpenGL functions that glshare calls, resolved at run time: nothing links an OpenGL library.
+// A process that shares through EGL never loads GLX, and vice versa.
 #pragma once
 
 #include <GL/gl.h>
@@ -10,8 +10,8 @@ namespace glshare {
 struct GlFunctions {
     using Resolver = void* (*)(const char* name);
 
-    // Fills the table; false if a function is missing that OpenGL 3.3 and OpenGL ES 3.0 have. The
-    // functions act on the context that is current on the calling thread.
+    // Fills the table; returns false if a function of OpenGL 3.3 and OpenGL ES 3.0 is missing. The
+    // functions act on the calling thread's current context.
     [[nodiscard]] bool load(Resolver resolve);
 
     const GLubyte*(APIENTRYP getString)(GLenum) = nullptr;
@@ -26,7 +26,7 @@ struct GlFunctions {
     PFNGLBINDBUFFERBASEPROC bindBufferBase = nullptr;
     PFNGLBUFFERDATAPROC bufferData = nullptr;
     PFNGLBUFFERSUBDATAPROC bufferSubData = nullptr;
-    PFNGLGETBUFFERSUBDATAPROC getBufferSubData = nullptr; // null where there is none
+    PFNGLGETBUFFERSUBDATAPROC getBufferSubData = nullptr; // null in OpenGL ES
     PFNGLCOPYBUFFERSUBDATAPROC copyBufferSubData = nullptr;
     PFNGLGETBUFFERPARAMETERI64VPROC getBufferParameteri64v = nullptr;
     PFNGLMAPBUFFERRANGEPROC mapBufferRange = nullptr;

@@ -1,10 +1,9 @@
 // Implements GlContext for GLX.
 //
-// The context lives on the application's own display connection: the drivers share objects between
-// contexts of one connection, and each connection has a screen object of its own that must outlive
-// the storage. Xlib locks a connection by itself since 1.8; applications on older ones that use
-// several threads call XInitThreads anyway. When the application closes the connection, Xlib tells
-// us first.
+// The context uses the application's display connection, since drivers share objects only between
+// contexts of one connection. The connection's screen object must outlive the storage of buffers.
+// Xlib is thread-safe by default since 1.8; before, multi-threaded applications call XInitThreads.
+// Xlib calls an extension's hook when the application closes the connection.
 #include "core/gl/GlContext.h"
 #include "core/gl/GlxFunctions.h"
 
@@ -26,24 +25,26 @@ void* resolveGl(const char* name)
     return reinterpret_cast<void*>(glx().getProcAddress(reinterpret_cast<const GLubyte*>(name)));
 }
 
-// Who must be told when a display connection closes, and with that which connections have our hook.
+// The open display connections that contexts use, and the listeners to call when one closes. Any
+// thread.
 class OpenDisplays {
 public:
     using Listener = std::function<void()>;
 
-    // Sets the hook where there is none yet.
+    // Installs the hook that runs when the display closes, once per display.
     void open(Display* display);
 
+    // Calls `listener` before the display closes, until the context is destroyed.
     void listen(Display* display, GLXContext context, Listener listener);
 
-    // Destroys a context, unless its display is closed or is closing.
+    // Destroys a context, unless its display is closed or closing.
     void destroy(Display* display, GLXContext context);
 
-    // For a context that is left behind: remembers it, so that it does not look lost.
+    // Keeps a reference to an abandoned context, so that leak checkers find it.
     void keep(GLXContext context) noexcept;
 
 private:
-    // Xlib's hook: runs in XCloseDisplay, before GLX's own, since the newest extension comes first.
+    // Runs in XCloseDisplay before GLX's hook, since Xlib calls the newest extension first.
     static int closing(Display* display, XExtCodes* codes);
 
     std::mutex fMutex; // guards the rest
@@ -53,7 +54,7 @@ private:
 
 OpenDisplays& openDisplays()
 {
-    // Never destroyed, so that a display closed at exit still finds it.
+    // Never destroyed: displays may be closed in exit handlers.
     static auto* const theDisplays = new OpenDisplays;
     return *theDisplays;
 }
@@ -73,8 +74,8 @@ void OpenDisplays::listen(Display* display, GLXContext context, Listener listene
     fListeners[display].insert_or_assign(context, std::move(listener));
 }
 
-// The lock is held throughout, so that the display cannot go in the meantime. An entry without
-// listeners stays as long as its display: it says that the hook is set.
+// The lock is held throughout, so that the display cannot close in the meantime. An entry without
+// listeners stays until its display closes, as a mark that the hook is installed.
 void OpenDisplays::destroy(Display* display, GLXContext context)
 {
     const std::scoped_lock lock(fMutex);
@@ -91,7 +92,7 @@ void OpenDisplays::keep(GLXContext context) noexcept
     try {
         fKept.push_back(context);
     } catch (const std::bad_alloc&) {
-        // It looks lost, and nothing else follows from that.
+        // A leak checker reports the context; there is no other effect.
     }
 }
 
@@ -111,7 +112,7 @@ int OpenDisplays::closing(Display* display, XExtCodes* /*codes*/)
 
 class GlxContext final : public GlContext {
 public:
-    // Owns no context yet.
+    // Owns no context until own() is called.
     explicit GlxContext(Display* display) : fDisplay(display) { openDisplays().open(display); }
 
     ~GlxContext() override
@@ -133,7 +134,7 @@ public:
 
     bool callerHasContext() const override { return glx().getCurrentContext() != nullptr; }
 
-    GlFunctions::Resolver resolver() const override { return resolveGl; }
+    GlFunctions::Resolver resolver() const noexcept override { return resolveGl; }
 
     void onDisplayClosing(std::function<void()> closing) override
     {
@@ -145,8 +146,8 @@ private:
     GLXContext fContext = nullptr;
 };
 
-// Xlib ends the process on an error that nobody handles, and has one handler for all threads. This
-// one takes its place while a context is created, which is the only request that can be refused.
+// Ignores X errors while a context is created, the only request here that the server can refuse.
+// Xlib ends the process on an unhandled error, and has one handler for all threads.
 class ErrorTrap {
 public:
     explicit ErrorTrap(Display* display) : fDisplay(display)
@@ -167,13 +168,13 @@ private:
     XErrorHandler fPrevious = nullptr;
 };
 
-// The configuration of the application's context. It is searched for by hand, since
-// glXChooseFBConfig does not return every configuration by its number.
+// Returns the framebuffer configuration of a context; null if there is none. Compares ids itself,
+// since glXChooseFBConfig does not find every configuration by id.
 GLXFBConfig configOf(Display* display, GLXContext context)
 {
-    int wanted = 0;
+    int contextId = 0;
     int screen = 0;
-    glx().queryContext(display, context, GLX_FBCONFIG_ID, &wanted);
+    glx().queryContext(display, context, GLX_FBCONFIG_ID, &contextId);
     glx().queryContext(display, context, GLX_SCREEN, &screen);
     int count = 0;
     GLXFBConfig* all = glx().getFBConfigs(display, screen, &count);
@@ -183,7 +184,7 @@ GLXFBConfig configOf(Display* display, GLXContext context)
     for (GLXFBConfig config : std::span(all, static_cast<std::size_t>(count))) {
         int id = 0;
         glx().getFBConfigAttrib(display, config, GLX_FBCONFIG_ID, &id);
-        if (id == wanted)
+        if (id == contextId)
             found = config;
     }
     glx().free(all);
@@ -192,7 +193,7 @@ GLXFBConfig configOf(Display* display, GLXContext context)
 
 } // namespace
 
-// GLX offers no question that is safe to ask about a handle that may be bad.
+// GLX has no query that is safe for an invalid handle.
 bool isShareableGlx(void* display, void* context)
 {
     return display != nullptr && context != nullptr && glx().complete;
@@ -202,10 +203,10 @@ std::unique_ptr<GlContext> createGlxContext(void* display, void* shareContext)
 {
     if (!isShareableGlx(display, shareContext))
         return nullptr;
-    auto* const x = static_cast<Display*>(display);
-    auto* const share = static_cast<GLXContext>(shareContext);
+    auto* x = static_cast<Display*>(display);
+    auto* share = static_cast<GLXContext>(shareContext);
 
-    // 3.3 is the oldest version that has all we call, and works without a drawable.
+    // 3.3 is the oldest version with all the functions that GlFunctions needs.
     const std::array<int, 7> attributes{GLX_CONTEXT_MAJOR_VERSION_ARB,
                                         3,
                                         GLX_CONTEXT_MINOR_VERSION_ARB,

@@ -1,4 +1,4 @@
-// The GLX and Xlib functions this program calls.
+// The GLX and Xlib functions that glshare calls, resolved at run time: nothing links them.
 #pragma once
 
 #include <GL/glx.h>
@@ -6,8 +6,7 @@
 
 namespace glshare {
 
-// Of XESetCloseDisplay, which only Xlib's internal header declares. That header suits no C++
-// program.
+// The type of XESetCloseDisplay. Only Xlib's internal header declares it, which C++ cannot include.
 using CloseDisplayHook = int (*)(Display*, XExtCodes*);
 using SetCloseDisplay = CloseDisplayHook (*)(Display*, int extension, CloseDisplayHook);
 
@@ -26,12 +25,12 @@ struct GlxFunctions {
     decltype(&::XSync) sync = nullptr;
     decltype(&::XFree) free = nullptr;
 
-    // Whether all of the above were found. Nothing may be called otherwise.
+    // Whether all of the above were found. If not, none may be called.
     bool complete = false;
 };
 
-// Loads the libraries with the first call, and keeps them: their hooks and exit handlers may
-// outlive every context.
-const GlxFunctions& glx();
+// Loads the libraries with the first call. They stay loaded, since their hooks and exit handlers
+// may outlive every context. Any thread.
+[[nodiscard]] const GlxFunctions& glx();
 
 } // namespace glshare

@@ -5,29 +5,21 @@ namespace glshare {
 
 class LibraryFunctions {
 public:
-    // Opens the library, and never closes it. If there is none of that name, nothing is found.
-    explicit LibraryFunctions(const char* fileName);
+    // Opens the library, and never closes it. If it cannot be opened, find() returns false.
+    explicit LibraryFunctions(const char* fileName) noexcept;
 
-    // Fills in a function pointer; false if the library has no such function.
+    // Stores the address of a function, null if the library lacks it. Returns whether it was found.
     template <typename Function>
-    [[nodiscard]] bool find(Function& function, const char* name) const
+    [[nodiscard]] bool find(Function& function, const char* name) const noexcept
     {
         function = reinterpret_cast<Function>(address(name));
         return function != nullptr;
     }
 
 private:
-    [[nodiscard]] void* address(const char* name) const;
+    [[nodiscard]] void* address(const char* name) const noexcept;
 
     void* fLibrary;
 };
-
-// Has `call` called when the process exits, while threads that use the libraries still run; never
-// where the system ends all threads first.
-void callAtExit(void (*call)());
-
-// Has `call` called in each child that this process forks, before anything else runs there; never
-// where processes are not forked. False if the system has no memory for it.
-[[nodiscard]] bool callInForkedChild(void (*call)());
 
 } // namespace glshare

@@ -1,35 +1,44 @@
 #include "core/sharing/BufferCreation.h"
 
-#include "core/api/Switches.h"
-#include "core/sharing/Registry.h"
-#include "core/worker/Fork.h"
+#include "core/api/Settings.h"
+#include "core/sharing/ObjectRegistry.h"
+#include "core/worker/ProcessHooks.h"
 
 namespace glshare {
 
 namespace {
 
-// Fills in the size and, if it is to be used in place and can be, the storage. False if there is no
-// such buffer, or one without storage.
-bool describe(SharedBuffer& buffer, GlDevice& device, bool inPlace)
+// Allocates at least `size` bytes, not initialised. Throws std::bad_alloc.
+[[nodiscard]] HostMemory allocateHostMemory(std::size_t size)
 {
-    buffer.size = device.bufferSize(buffer.name).value_or(0);
+    constexpr std::size_t kCacheLine = 64; // devices may access whole lines
+    const std::size_t padded = (size + kCacheLine - 1) / kCacheLine * kCacheLine;
+    return HostMemory(::operator new(padded, kHostMemoryAlignment));
+}
+
+// Sets the size and, if requested and possible, pins the storage. Returns false if there is no such
+// buffer or it has no storage.
+bool initializeFromGl(SharedBuffer& buffer, GlBufferAccess& gl, bool inPlace)
+{
+    buffer.size = gl.bufferSize(buffer.name).value_or(0);
     if (buffer.size == 0)
         return false;
     if (inPlace)
-        buffer.storage = PinnedStorage(buffer.context, device, buffer.name, buffer.size);
+        buffer.storage = PinnedStorage(buffer.context, gl, buffer.name, buffer.size);
     return true;
 }
 
-// The runtime calls this when nothing uses the memory object any more, on any thread.
+// The runtime calls this on any thread, when it destroys the memory object.
 void CL_CALLBACK onDestroyed(cl_mem memory, void* /*user*/)
 {
     if (!isForkedChild())
-        Registry::get().remove(memory);
+        ObjectRegistry::get().remove(memory);
 }
 
-// Over the OpenGL storage, over memory of our own where the devices work in it, or else wherever
-// the runtime puts it.
-cl_mem createMemory(cl_context handle, SharedBuffer& buffer, bool inHostMemory, cl_int& error)
+// Creates the memory object on the pinned storage, on own host memory if the devices use that in
+// place, or on memory that the runtime allocates.
+[[nodiscard]] cl_mem createMemory(cl_context handle, SharedBuffer& buffer, bool inHostMemory,
+                                  cl_int& error)
 {
     void* address = buffer.storage.address();
     if (address == nullptr && inHostMemory) {
@@ -42,7 +51,7 @@ cl_mem createMemory(cl_context handle, SharedBuffer& buffer, bool inHostMemory, 
 
 } // namespace
 
-bool areSharingFlags(cl_mem_flags flags)
+bool areValidSharingFlags(cl_mem_flags flags) noexcept
 {
     return flags == 0 || flags == CL_MEM_READ_WRITE || flags == CL_MEM_READ_ONLY ||
            flags == CL_MEM_WRITE_ONLY;
@@ -51,7 +60,7 @@ bool areSharingFlags(cl_mem_flags flags)
 cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContext>& context,
                           cl_mem_flags flags, cl_GLuint name, cl_int& error)
 {
-    if (!areSharingFlags(flags)) {
+    if (!areValidSharingFlags(flags)) {
         error = CL_INVALID_VALUE;
         return nullptr;
     }
@@ -61,10 +70,10 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
     buffer->flags = flags == 0 ? cl_mem_flags{CL_MEM_READ_WRITE} : flags;
 
     const bool inHostMemory = context->canUseHostMemory() && isHostMemoryAllowed();
-    const bool inPlace = inHostMemory && switches().zeroCopy;
+    const bool inPlace = inHostMemory && settings().zeroCopy;
     bool isBuffer = false;
-    context->worker().call([&](GlDevice* device) {
-        isBuffer = device != nullptr && describe(*buffer, *device, inPlace);
+    context->worker().call([&](GlBufferAccess* gl) {
+        isBuffer = gl != nullptr && initializeFromGl(*buffer, *gl, inPlace);
     });
     if (!isBuffer) {
         error = CL_INVALID_GL_OBJECT;
@@ -76,16 +85,16 @@ cl_mem createSharedBuffer(cl_context handle, const std::shared_ptr<SharingContex
         return nullptr;
     cl_mem memory = buffer->memory;
     try {
-        Registry::get().add(handle, buffer);
+        ObjectRegistry::get().add(handle, buffer);
     } catch (...) {
-        runtime().clReleaseMemObject(memory); // the one reference, which nobody has seen
+        runtime().clReleaseMemObject(memory); // the only reference
         throw;
     }
     error = runtime().clSetMemObjectDestructorCallback(memory, onDestroyed, nullptr);
     if (error == CL_SUCCESS)
         return memory;
     onDestroyed(memory, nullptr);
-    runtime().clReleaseMemObject(memory); // likewise
+    runtime().clReleaseMemObject(memory); // the only reference
     return nullptr;
 }
 

@@ -1,4 +1,4 @@
-// Makes OpenCL memory objects from OpenGL buffers.
+// Creates OpenCL memory objects from OpenGL buffers.
 #pragma once
 
 #include "core/sharing/SharingContext.h"
@@ -7,13 +7,13 @@
 
 namespace glshare {
 
-// Whether `flags` are valid for an object that is made from one of OpenGL's. 0 is, and means
-// CL_MEM_READ_WRITE.
-[[nodiscard]] bool areSharingFlags(cl_mem_flags flags);
+// Returns whether `flags` are valid for a memory object that is created from an OpenGL object. 0 is
+// valid and means CL_MEM_READ_WRITE.
+[[nodiscard]] bool areValidSharingFlags(cl_mem_flags flags) noexcept;
 
-// clCreateFromGLBuffer, for a context that shares. The memory object lies over the buffer's own
-// storage where devices and renderer allow it, and has storage of its own elsewhere. The caller
-// owns the one reference; null, and the reason in `error`, on failure.
+// Implements clCreateFromGLBuffer for a context that shares. The memory object uses the buffer's
+// storage in place if devices and renderer allow it, else memory of its own. The caller owns the
+// returned reference. Returns null, and sets `error`, on failure.
 [[nodiscard]] cl_mem createSharedBuffer(cl_context handle,
                                         const std::shared_ptr<SharingContext>& context,
                                         cl_mem_flags flags, cl_GLuint name, cl_int& error);

@@ -8,15 +8,16 @@ namespace glshare {
 
 namespace {
 
-// The values of the OpenGL entries; zero where the list has none, which is the default of each.
-struct GlEntries {
+// The values of the OpenGL properties; 0, the default of each, if the list has none.
+struct GlProperties {
     cl_context_properties context = 0;
     cl_context_properties egl = 0;
     cl_context_properties glx = 0;
     cl_context_properties wgl = 0;
     cl_context_properties cgl = 0;
 
-    cl_context_properties* find(cl_context_properties name)
+    // Returns null if `name` is not an OpenGL property.
+    [[nodiscard]] cl_context_properties* find(cl_context_properties name) noexcept
     {
         switch (name) {
         case CL_GL_CONTEXT_KHR:
@@ -37,12 +38,12 @@ struct GlEntries {
 
 void* pointerOf(cl_context_properties value)
 {
-    return reinterpret_cast<void*>(value); // NOLINT(performance-no-int-to-ptr): the API's own form
+    return reinterpret_cast<void*>(value); // NOLINT(performance-no-int-to-ptr)
 }
 
-cl_int findBinding(const GlEntries& gl, std::optional<GlBinding>& binding)
+[[nodiscard]] cl_int findGlContext(const GlProperties& gl, std::optional<GlContextHandle>& result)
 {
-    std::vector<GlBinding> given;
+    std::vector<GlContextHandle> given;
     for (const auto& [windowSystem, display] : {std::pair(WindowSystem::kGlx, gl.glx),
                                                 {WindowSystem::kEgl, gl.egl},
                                                 {WindowSystem::kWgl, gl.wgl}}) {
@@ -55,7 +56,7 @@ cl_int findBinding(const GlEntries& gl, std::optional<GlBinding>& binding)
         return CL_SUCCESS;
     if (given.empty() || !isShareable(given[0]))
         return CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
-    binding = given[0];
+    result = given[0];
     return CL_SUCCESS;
 }
 
@@ -64,7 +65,7 @@ cl_int findBinding(const GlEntries& gl, std::optional<GlBinding>& binding)
 ContextProperties parseProperties(const cl_context_properties* list)
 {
     ContextProperties result;
-    GlEntries gl;
+    GlProperties gl;
     std::vector<cl_context_properties> names;
     for (; list != nullptr && *list != 0; list += 2) {
         const cl_context_properties name = list[0];
@@ -73,14 +74,14 @@ ContextProperties parseProperties(const cl_context_properties* list)
         if (std::ranges::find(names, name) != names.end())
             result.error = CL_INVALID_PROPERTY;
         names.push_back(name);
-        if (cl_context_properties* entry = gl.find(name)) {
-            *entry = value;
+        if (cl_context_properties* glProperty = gl.find(name)) {
+            *glProperty = value;
             continue;
         }
         if (name == CL_CONTEXT_PLATFORM)
             result.platform = static_cast<cl_platform_id>(pointerOf(value));
         if (name == CL_CONTEXT_INTEROP_USER_SYNC) {
-            result.userSynchronises = value == CL_TRUE;
+            result.hasUserSync = value == CL_TRUE;
             if (value != CL_TRUE && value != CL_FALSE)
                 result.error = CL_INVALID_PROPERTY;
         }
@@ -89,7 +90,7 @@ ContextProperties parseProperties(const cl_context_properties* list)
     result.original.push_back(0);
     result.forRuntime.push_back(0);
     if (result.error == CL_SUCCESS)
-        result.error = findBinding(gl, result.binding);
+        result.error = findGlContext(gl, result.glContext);
     return result;
 }
 

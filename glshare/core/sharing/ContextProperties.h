@@ -1,4 +1,4 @@
-// The property list of an OpenCL context, taken apart.
+// The parsed property list of an OpenCL context.
 #pragma once
 
 #include "core/api/OpenCl.h"
@@ -10,14 +10,14 @@
 namespace glshare {
 
 struct ContextProperties {
-    // CL_SUCCESS, or why the list cannot be used; then the rest is incomplete.
+    // CL_SUCCESS, or the error of the list; the other fields are then incomplete.
     cl_int error = CL_SUCCESS;
-    std::vector<cl_context_properties> original;   // as given, ending in 0
-    std::vector<cl_context_properties> forRuntime; // without the OpenGL entries, ending in 0
-    cl_platform_id platform = nullptr;             // as given, may be null
-    bool userSynchronises = false;                 // CL_CONTEXT_INTEROP_USER_SYNC
-    // The OpenGL context to share with; empty if the list names none.
-    std::optional<GlBinding> binding;
+    std::vector<cl_context_properties> original;   // as passed, ending in 0
+    std::vector<cl_context_properties> forRuntime; // without the OpenGL properties, ending in 0
+    cl_platform_id platform = nullptr;             // as passed, may be null
+    bool hasUserSync = false;                      // CL_CONTEXT_INTEROP_USER_SYNC
+    // The OpenGL context to share with; empty if the list has none.
+    std::optional<GlContextHandle> glContext;
 };
 
 // `list` may be null.

@@ -1,7 +1,7 @@
 #include "core/sharing/CopyBatch.h"
 
 #include "core/sharing/Counters.h"
-#include "core/sharing/EventTypes.h"
+#include "core/sharing/EventRegistry.h"
 
 #include <algorithm>
 #include <utility>
@@ -10,22 +10,23 @@ namespace glshare {
 
 namespace {
 
-// Runtimes use the events of commands that fail for a while after they have shown it. Far longer
-// than that, as threads may be interrupted.
-constexpr std::chrono::milliseconds kUseAfterFailure{100};
+// How long the events of a failed command are kept: runtimes use them for a moment after they have
+// reported the failure. Much longer than that moment, since threads may be preempted.
+constexpr std::chrono::milliseconds kEventUseAfterFailure{100};
 
 bool hasEnded(cl_event event)
 {
-    cl_int status = CL_COMPLETE; // of an event that cannot be asked
+    cl_int status = CL_COMPLETE; // if the query fails
     runtime().clGetEventInfo(event, CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status, &status,
                              nullptr);
     return status <= CL_COMPLETE;
 }
 
-// Comes on a thread of the runtime's, possibly late, or not at all when a command fails.
+// Called on a thread of the runtime, possibly late, or never if the command fails: the worker
+// polls, too.
 void CL_CALLBACK onReady(cl_event /*event*/, cl_int /*status*/, void* /*user*/)
 {
-    GlWorker::lookNow();
+    GlWorker::pollNow();
 }
 
 } // namespace
@@ -43,45 +44,45 @@ CopyBatch::Ptr CopyBatch::take(std::shared_ptr<SharingContext> context)
     return batch;
 }
 
-cl_int CopyBatch::copyWhenReady(Ptr& batch)
+cl_int CopyBatch::submit(Ptr& batch)
 {
     const cl_int error =
-        runtime().clSetEventCallback(batch->ready(), CL_COMPLETE, onReady, nullptr);
+        runtime().clSetEventCallback(batch->readyEvent(), CL_COMPLETE, onReady, nullptr);
     if (error != CL_SUCCESS)
         return error;
     GlWorker& worker = batch->fContext->worker();
-    worker.watch(std::move(batch));
+    worker.poll(std::move(batch));
     return CL_SUCCESS;
 }
 
-bool CopyBatch::run(GlDevice* device) noexcept
+bool CopyBatch::run(GlBufferAccess* gl) noexcept
 {
-    if (!fIsSettled) {
+    if (!fIsExecuted) {
         cl_int status = CL_QUEUED;
-        runtime().clGetEventInfo(ready(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status, &status,
-                                 nullptr);
+        runtime().clGetEventInfo(readyEvent(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof status,
+                                 &status, nullptr);
         if (status > CL_COMPLETE)
             return false;
-        settle(status, device);
+        execute(status, gl);
     }
-    return hasEnded(events.done.back()) && (!fHasFailed || mayBeReleased());
+    return hasEnded(events.done.back()) && (!fHasFailed || canBeReleased());
 }
 
-void CopyBatch::settle(cl_int status, GlDevice* device) noexcept
+void CopyBatch::execute(cl_int status, GlBufferAccess* gl) noexcept
 {
-    fIsSettled = true;
+    fIsExecuted = true;
     fHasFailed = status != CL_COMPLETE;
-    if (!fHasFailed && device != nullptr)
-        copyAll(*device);
+    if (!fHasFailed && gl != nullptr)
+        copyAll(*gl);
     else if (!fHasFailed)
         counters().failedCopies += items.size();
-    fEndOfUse = std::chrono::steady_clock::time_point::max();
+    fReleaseTime = std::chrono::steady_clock::time_point::max();
     runtime().clSetUserEventStatus(events.copied.back(), CL_COMPLETE);
 }
 
-// A buffer that is gone by now keeps what it holds: the application broke the rules after the
-// command was given, and all that is left is to end well.
-void CopyBatch::copyAll(GlDevice& device) noexcept
+// A copy fails if the application has deleted or mapped the buffer since it enqueued the command.
+// That violates the extension, and only the counters report it.
+void CopyBatch::copyAll(GlBufferAccess& gl) noexcept
 {
     const auto copyEach = [this](auto copy) {
         for (const CopyItem& item : items) {
@@ -92,40 +93,40 @@ void CopyBatch::copyAll(GlDevice& device) noexcept
         }
     };
     if (direction == CopyDirection::kFromGl) {
-        copyEach([&](auto... copy) { return device.read(copy...); });
+        copyEach([&](auto... copy) { return gl.read(copy...); });
     } else {
-        GlDevice::Writing writing(device);
-        copyEach([&](auto... copy) { return writing.write(copy...); });
+        GlBufferAccess::WriteScope scope(gl);
+        copyEach([&](auto... copy) { return scope.write(copy...); });
     }
 }
 
-// Of a batch that has failed, once each of its commands has ended and is out of use.
-bool CopyBatch::mayBeReleased() noexcept
+// Returns whether each command of a failed batch has ended, and its events are no longer used.
+bool CopyBatch::canBeReleased() noexcept
 {
     using Clock = std::chrono::steady_clock;
     if (!std::ranges::all_of(events.unmaps, hasEnded))
         return false;
-    fEndOfUse = std::min(fEndOfUse, Clock::now() + kUseAfterFailure);
-    return Clock::now() >= fEndOfUse;
+    fReleaseTime = std::min(fReleaseTime, Clock::now() + kEventUseAfterFailure);
+    return Clock::now() >= fReleaseTime;
 }
 
-// Some runtimes use the event of a command that has failed whenever something else ends that the
-// command was to wait for. A program that lives with that keeps its event until then; so the other
-// events of the batch stay as long as the application's.
-void CopyBatch::drop() noexcept
+// Some runtimes use the event of a failed command once more when the other events of its wait list
+// complete. An application that is safe on them keeps its event until then. The batch is attached
+// to that event, so that the batch's other events live as long.
+void CopyBatch::dispose() noexcept
 {
     if (std::exchange(fHasFailed, false)) {
         GlTaskPtr self(this);
-        if (EventTypes::get().keep(events.done.back(), self))
+        if (EventRegistry::get().attach(events.done.back(), self))
             return;
         static_cast<void>(self.release());
     }
     events.clear();
     items.clear();
     buffers.clear();
-    fIsSettled = false;
+    fIsExecuted = false;
     const std::shared_ptr<SharingContext> context = std::move(fContext);
-    context->keepBatch(std::unique_ptr<CopyBatch>(this));
+    context->returnBatch(std::unique_ptr<CopyBatch>(this));
 }
 
 } // namespace glshare

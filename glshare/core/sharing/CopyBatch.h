@@ -1,5 +1,5 @@
-// One acquire or release that has to copy: its buffers, its events, and the part of it that is not
-// in the queue, which is the worker's copying.
+// An acquire or release that copies: its buffers, its events, and the task that makes the copies on
+// the worker's thread.
 #pragma once
 
 #include "core/sharing/EventList.h"
@@ -29,48 +29,48 @@ struct CopyEvents {
 // One buffer to copy.
 struct CopyItem {
     const SharedBuffer* buffer;
-    // Where the memory object lies in the host's memory; null until it is mapped, if it has to be.
-    void* pointer;
+    void* pointer; // the memory object's host address; null until it is mapped
     bool isMapped = false;
 };
 
-// Owned by the thread that gives the command, then by the worker. Batches are used again, so that a
-// command allocates nothing once there have been some.
+// Owned by the thread that enqueues the command, then by the worker. Batches are reused, so that
+// later commands allocate nothing.
 class CopyBatch final : public GlTask {
 public:
-    using Ptr = std::unique_ptr<CopyBatch, Drop>;
+    using Ptr = std::unique_ptr<CopyBatch, Deleter>;
 
-    // An empty batch for a command in `context`.
+    // Returns an empty batch for a command in `context`.
     [[nodiscard]] static Ptr take(std::shared_ptr<SharingContext> context);
 
-    // The event after which each item has its pointer.
-    [[nodiscard]] cl_event ready() const
+    // Returns the event after which each item has its pointer.
+    [[nodiscard]] cl_event readyEvent() const noexcept
     {
         return events.mapped.empty() ? events.started.back() : events.mapped.back();
     }
 
-    // Has the worker copy when the batch is ready, and complete `copied` then. If `ready` fails,
-    // `copied` completes without copies. On failure the batch stays with the caller.
-    [[nodiscard]] static cl_int copyWhenReady(Ptr& batch);
+    // Passes the batch to the worker, which copies when readyEvent() completes and then completes
+    // `copied`. If readyEvent() fails, `copied` completes without copies. If submit fails, the
+    // batch stays the caller's.
+    [[nodiscard]] static cl_int submit(Ptr& batch);
 
-    bool run(GlDevice* device) noexcept override;
-    void drop() noexcept override;
+    bool run(GlBufferAccess* gl) noexcept override;
+    void dispose() noexcept override;
 
     SharedBuffers buffers;       // all of the command's
-    std::vector<CopyItem> items; // those of them that are copied
+    std::vector<CopyItem> items; // the buffers to copy
     CopyDirection direction = CopyDirection::kFromGl;
     CopyEvents events;
     std::vector<cl_event> waitList; // of `done`, while it is enqueued
 
 private:
-    void settle(cl_int status, GlDevice* device) noexcept;
-    void copyAll(GlDevice& device) noexcept;
-    [[nodiscard]] bool mayBeReleased() noexcept;
+    void execute(cl_int status, GlBufferAccess* gl) noexcept;
+    void copyAll(GlBufferAccess& gl) noexcept;
+    [[nodiscard]] bool canBeReleased() noexcept;
 
     std::shared_ptr<SharingContext> fContext;
-    bool fIsSettled = false; // `copied` has its status
+    bool fIsExecuted = false; // `copied` has its status
     bool fHasFailed = false;
-    std::chrono::steady_clock::time_point fEndOfUse; // of the events of a batch that has failed
+    std::chrono::steady_clock::time_point fReleaseTime; // the earliest, of a batch that has failed
 };
 
 } // namespace glshare

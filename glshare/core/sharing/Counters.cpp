@@ -2,13 +2,13 @@
 
 namespace glshare {
 
-Counters& counters()
+Counters& counters() noexcept
 {
     static Counters theCounters;
     return theCounters;
 }
 
-void getCounters(glshare_counters* result)
+void getCounters(glshare_counters* result) noexcept
 {
     const Counters& from = counters();
     result->acquired_in_place = from.acquiredInPlace;

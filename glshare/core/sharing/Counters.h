@@ -1,4 +1,4 @@
-// The totals behind glshareGetCounters.
+// The totals that glshareGetCounters returns.
 #pragma once
 
 #include "glshare.h"
@@ -8,7 +8,7 @@
 
 namespace glshare {
 
-// Safe from any thread; the fields are independent of each other.
+// Any thread. The fields are not synchronised with each other.
 struct Counters {
     std::atomic<std::uint64_t> acquiredInPlace{0};
     std::atomic<std::uint64_t> acquiredByCopy{0};
@@ -17,8 +17,9 @@ struct Counters {
     std::atomic<std::uint64_t> failedCopies{0};
 };
 
-Counters& counters();
+[[nodiscard]] Counters& counters() noexcept;
 
-void getCounters(glshare_counters* result);
+// Implements glshareGetCounters.
+void getCounters(glshare_counters* result) noexcept;
 
 } // namespace glshare

@@ -1,4 +1,4 @@
-// A list of events that owns a reference to each.
+// A list of events that owns a reference to each. Not synchronised.
 #pragma once
 
 #include "core/api/OpenCl.h"
@@ -17,6 +17,7 @@ public:
     EventList(const EventList&) = delete;
     EventList& operator=(const EventList&) = delete;
 
+    // Releases the events.
     void clear() noexcept
     {
         for (cl_event event : fEvents)
@@ -24,13 +25,13 @@ public:
         fEvents.clear();
     }
 
-    // Makes space for `count` events: adding them allocates nothing.
+    // Allocates capacity for `count` events.
     void reserve(std::size_t count) { fEvents.reserve(count); }
 
-    // Makes a call that returns an event: `call` gets where to store it, and answers its status.
-    // The event becomes the last of the list if the call succeeds. Throws before the call only.
+    // Calls `call` with the place for a new event and returns its status. On success the event is
+    // appended. Throws std::bad_alloc, before the call only.
     template <typename Call>
-    cl_int add(Call call)
+    [[nodiscard]] cl_int add(Call call)
     {
         fEvents.push_back(nullptr);
         const cl_int error = call(&fEvents.back());
@@ -39,12 +40,12 @@ public:
         return error;
     }
 
-    [[nodiscard]] bool empty() const { return fEvents.empty(); }
-    [[nodiscard]] cl_uint size() const { return static_cast<cl_uint>(fEvents.size()); }
-    [[nodiscard]] const cl_event* data() const { return fEvents.data(); }
-    [[nodiscard]] auto begin() const { return fEvents.begin(); }
-    [[nodiscard]] auto end() const { return fEvents.end(); }
-    [[nodiscard]] cl_event back() const { return fEvents.back(); }
+    [[nodiscard]] bool empty() const noexcept { return fEvents.empty(); }
+    [[nodiscard]] cl_uint size() const noexcept { return static_cast<cl_uint>(fEvents.size()); }
+    [[nodiscard]] const cl_event* data() const noexcept { return fEvents.data(); }
+    [[nodiscard]] auto begin() const noexcept { return fEvents.begin(); }
+    [[nodiscard]] auto end() const noexcept { return fEvents.end(); }
+    [[nodiscard]] cl_event back() const noexcept { return fEvents.back(); }
 
 private:
     std::vector<cl_event> fEvents;

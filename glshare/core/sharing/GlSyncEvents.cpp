@@ -1,8 +1,8 @@
 #include "core/sharing/GlSyncEvents.h"
 
-#include "core/api/Answer.h"
+#include "core/api/Arguments.h"
 #include "core/sharing/EventList.h"
-#include "core/sharing/EventTypes.h"
+#include "core/sharing/EventRegistry.h"
 
 #include <utility>
 
@@ -10,24 +10,25 @@ namespace glshare {
 
 namespace {
 
-// Completes an event when a sync object is signalled. Keeps the context, whose worker runs it.
-class SyncWatch final : public GlTask {
+// Completes an event when a sync object is signalled. Keeps the context alive, whose worker polls
+// it.
+class SyncTask final : public GlTask {
 public:
-    SyncWatch(std::shared_ptr<SharingContext> context, GLsync sync)
+    SyncTask(std::shared_ptr<SharingContext> context, GLsync sync) noexcept
         : fContext(std::move(context)), fSync(sync)
     {
     }
 
-    bool run(GlDevice* device) noexcept override
+    bool run(GlBufferAccess* gl) noexcept override
     {
-        const bool exists = device != nullptr && device->isSync(fSync);
-        if (exists && !device->isSignalled(fSync))
+        const bool exists = gl != nullptr && gl->isSync(fSync);
+        if (exists && !gl->isSignalled(fSync))
             return false;
         runtime().clSetUserEventStatus(events.back(), exists ? CL_COMPLETE : CL_INVALID_GL_OBJECT);
         return true;
     }
 
-    EventList events; // the one event
+    EventList events; // one event
 
 private:
     std::shared_ptr<SharingContext> fContext;
@@ -40,16 +41,17 @@ cl_event createSyncEvent(cl_context handle, const std::shared_ptr<SharingContext
                          GLsync sync, cl_int* error)
 {
     bool isSync = false;
-    context->worker().call([&](const GlDevice* device) {
-        isSync = device != nullptr && sync != nullptr && device->isSync(sync);
+    context->worker().call([&](const GlBufferAccess* gl) {
+        isSync = gl != nullptr && sync != nullptr && gl->isSync(sync);
     });
     if (!isSync) {
         setError(error, CL_INVALID_GL_OBJECT);
         return nullptr;
     }
-    EventTypes::Prepared type = EventTypes::get().prepare(CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR);
-    auto watch = std::make_unique<SyncWatch>(context, sync);
-    const cl_int result = watch->events.add([&](cl_event* event) {
+    EventRegistry::PreparedEntry type =
+        EventRegistry::get().prepareEntry(CL_COMMAND_GL_FENCE_SYNC_OBJECT_KHR);
+    auto task = std::make_unique<SyncTask>(context, sync);
+    const cl_int result = task->events.add([&](cl_event* event) {
         cl_int status = CL_SUCCESS;
         *event = runtime().clCreateUserEvent(handle, &status);
         return status;
@@ -57,10 +59,10 @@ cl_event createSyncEvent(cl_context handle, const std::shared_ptr<SharingContext
     setError(error, result);
     if (result != CL_SUCCESS)
         return nullptr;
-    cl_event event = watch->events.back();
+    cl_event event = task->events.back();
     runtime().clRetainEvent(event); // the application's reference
-    EventTypes::get().add(event, std::move(type));
-    context->worker().watch(GlTaskPtr(watch.release()));
+    EventRegistry::get().add(event, std::move(type));
+    context->worker().poll(GlTaskPtr(task.release()));
     return event;
 }
 

@@ -8,12 +8,12 @@ namespace glshare {
 
 namespace {
 
-class Unpin final : public GlTask {
+class UnpinTask final : public GlTask {
 public:
-    bool run(GlDevice* device) noexcept override
+    bool run(GlBufferAccess* gl) noexcept override
     {
-        if (device != nullptr)
-            device->unpin(pin); // 0 is ignored
+        if (gl != nullptr)
+            gl->unpin(pin);
         return true;
     }
 
@@ -22,30 +22,30 @@ public:
 
 } // namespace
 
-// The address is taken after pinning: only then is it known to stay.
-PinnedStorage::PinnedStorage(std::shared_ptr<SharingContext> context, GlDevice& device, GLuint name,
-                             std::size_t size)
+// Reads the address after pinning, since it may change before.
+PinnedStorage::PinnedStorage(std::shared_ptr<SharingContext> context, GlBufferAccess& gl,
+                             GLuint name, std::size_t size)
 {
-    auto unpin = std::make_unique<Unpin>();
-    unpin->pin = device.pin(name);
-    fAddress = unpin->pin == 0 ? nullptr : device.address(name, size);
+    auto unpin = std::make_unique<UnpinTask>();
+    unpin->pin = gl.pin(name);
+    fAddress = unpin->pin == 0 ? nullptr : gl.hostAddress(name, size);
     if (fAddress == nullptr) {
-        unpin->run(&device);
+        gl.unpin(unpin->pin); // 0 is ignored
         return;
     }
-    fRelease.reset(unpin.release());
+    fUnpinTask.reset(unpin.release());
     fContext = std::move(context);
 }
 
 PinnedStorage::~PinnedStorage()
 {
-    if (fRelease != nullptr)
-        fContext->worker().post(std::move(fRelease));
+    if (fUnpinTask != nullptr)
+        fContext->worker().post(std::move(fUnpinTask));
 }
 
 PinnedStorage::PinnedStorage(PinnedStorage&& other) noexcept
     : fContext(std::move(other.fContext)), fAddress(std::exchange(other.fAddress, nullptr)),
-      fRelease(std::move(other.fRelease))
+      fUnpinTask(std::move(other.fUnpinTask))
 {
 }
 
@@ -54,7 +54,7 @@ PinnedStorage& PinnedStorage::operator=(PinnedStorage&& other) noexcept
     PinnedStorage taken(std::move(other));
     std::swap(fContext, taken.fContext);
     std::swap(fAddress, taken.fAddress);
-    std::swap(fRelease, taken.fRelease);
+    std::swap(fUnpinTask, taken.fUnpinTask);
     return *this;
 }
 

@@ -1,8 +1,8 @@
-// The host memory that a GL buffer had as its storage at one moment, kept alive whatever happens to
-// the buffer. Only renderers that keep buffers in host memory have such storage.
+// The storage of an OpenGL buffer, kept alive even if the buffer is deleted or reallocated. Only
+// renderers that keep buffers in host memory have it.
 #pragma once
 
-#include "core/gl/GlDevice.h"
+#include "core/gl/GlBufferAccess.h"
 #include "core/worker/GlTask.h"
 
 #include <cstddef>
@@ -12,16 +12,16 @@ namespace glshare {
 
 class SharingContext;
 
-// Owned by one thread at a time; may be let go on any.
+// Movable. Destroyed on any thread: the worker unpins the storage.
 class PinnedStorage {
 public:
     // Holds nothing.
     PinnedStorage() = default;
 
-    // On the worker of `context`, whose device it is. Holds nothing if the buffer is gone, smaller
-    // than `size` bytes, or without host memory to look at. No other thread may use the buffer in
-    // OpenGL at that time.
-    PinnedStorage(std::shared_ptr<SharingContext> context, GlDevice& device, GLuint name,
+    // Called on the worker's thread of `context`, with its `gl`. Pins the current storage of buffer
+    // `name`. Holds nothing if the buffer was deleted, is smaller than `size` bytes, or has no host
+    // address. No other thread may use the buffer in OpenGL during the call.
+    PinnedStorage(std::shared_ptr<SharingContext> context, GlBufferAccess& gl, GLuint name,
                   std::size_t size);
 
     ~PinnedStorage();
@@ -31,15 +31,15 @@ public:
     PinnedStorage(const PinnedStorage&) = delete;
     PinnedStorage& operator=(const PinnedStorage&) = delete;
 
-    // Null if nothing is held.
-    [[nodiscard]] void* address() const { return fAddress; }
+    // Returns null if nothing is held.
+    [[nodiscard]] void* address() const noexcept { return fAddress; }
 
 private:
     std::shared_ptr<SharingContext> fContext;
     void* fAddress = nullptr;
-    // Unpins the storage; null if nothing is held. Made in advance, since a destructor that found
-    // no memory could not report it.
-    GlTaskPtr fRelease;
+    // Null if nothing is held. Allocated in advance, since the destructor could not report a
+    // failure.
+    GlTaskPtr fUnpinTask;
 };
 
 } // namespace glshare

@@ -1,38 +1,51 @@
-// An OpenCL memory object made from an OpenGL buffer.
+// An OpenCL memory object that was created from an OpenGL buffer.
 #pragma once
 
 #include "core/api/OpenCl.h"
-#include "core/sharing/HostMemory.h"
 #include "core/sharing/PinnedStorage.h"
 
 #include <cstddef>
 #include <memory>
+#include <new>
 
 namespace glshare {
 
 class SharingContext;
 
-// Everything but the last two fields is fixed once the object exists; those are guarded by the
-// sharing context.
+// A page: no runtime requires a larger alignment for memory that it uses in place.
+constexpr std::align_val_t kHostMemoryAlignment{4096};
+
+struct HostMemoryDeleter {
+    void operator()(void* memory) const noexcept
+    {
+        ::operator delete(memory, kHostMemoryAlignment);
+    }
+};
+
+// Host memory for a memory object, on devices that use it in place.
+using HostMemory = std::unique_ptr<void, HostMemoryDeleter>;
+
+// The record of a memory object. The last two fields are guarded by the sharing context; the others
+// do not change after creation.
 struct SharedBuffer {
-    cl_mem memory = nullptr; // the runtime's own object, borrowed: this record ends with it
+    cl_mem memory = nullptr; // borrowed: the record is removed when the runtime destroys it
     std::shared_ptr<SharingContext> context;
     cl_GLuint name = 0;
     std::size_t size = 0; // bytes
     cl_mem_flags flags = 0;
-    // What `memory` lies over: the GL storage, memory of our own, or, with neither, memory of the
-    // runtime's.
+    // The memory that `memory` uses: the OpenGL storage, own host memory, or neither if the runtime
+    // has allocated it.
     PinnedStorage storage;
     HostMemory ownMemory;
 
-    // Where `memory` lies in the host's memory; null if it is the runtime's.
-    [[nodiscard]] void* hostAddress() const
+    // Returns the host address of `memory`; null if the runtime has allocated it.
+    [[nodiscard]] void* hostAddress() const noexcept
     {
         return storage.address() != nullptr ? storage.address() : ownMemory.get();
     }
 
     bool isAcquired = false;
-    bool isCopied = false; // how it was acquired; the release goes the same way
+    bool isCopied = false; // by the last acquire; the release then copies, too
 };
 
 } // namespace glshare

@@ -1,9 +1,9 @@
 #include "core/sharing/SharingCommands.h"
 
-#include "core/sharing/Copies.h"
+#include "core/sharing/CopyCommands.h"
 #include "core/sharing/Counters.h"
-#include "core/sharing/EventTypes.h"
-#include "core/sharing/Registry.h"
+#include "core/sharing/EventRegistry.h"
+#include "core/sharing/ObjectRegistry.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -16,8 +16,8 @@ namespace glshare {
 
 namespace {
 
-// A handle that is not ours is either bad or an object that has nothing to do with OpenGL.
-cl_int errorOfUnknown(cl_mem memory)
+// Returns the error for a handle without a record: it is invalid, or not created from OpenGL.
+[[nodiscard]] cl_int errorForUnsharedObject(cl_mem memory)
 {
     cl_mem_object_type type = 0;
     if (memory == nullptr || runtime().clGetMemObjectInfo(memory, CL_MEM_TYPE, sizeof type, &type,
@@ -26,46 +26,48 @@ cl_int errorOfUnknown(cl_mem memory)
     return CL_INVALID_GL_OBJECT;
 }
 
-cl_int findAll(const SharingRequest& request, const std::shared_ptr<SharingContext>& context,
-               SharedBuffers& buffers)
+// Appends the records of the request's memory objects, which must belong to `context`.
+[[nodiscard]] cl_int findBuffers(const SharingRequest& request,
+                                 const std::shared_ptr<SharingContext>& context,
+                                 SharedBuffers& buffers)
 {
-    Registry::get().find(request.memory.data(), request.memory.size(), buffers);
+    ObjectRegistry::get().find(request.memory.data(), request.memory.size(), buffers);
     if (buffers.size() < request.memory.size())
-        return errorOfUnknown(request.memory[buffers.size()]);
-    const bool areAllHere = std::ranges::all_of(
+        return errorForUnsharedObject(request.memory[buffers.size()]);
+    const bool areInContext = std::ranges::all_of(
         buffers, [&](const auto& buffer) { return buffer->context == context; });
-    return areAllHere ? CL_SUCCESS : CL_INVALID_CONTEXT;
+    return areInContext ? CL_SUCCESS : CL_INVALID_CONTEXT;
 }
 
-// Decides for each buffer whether it must be copied, and lists those. CL_INVALID_GL_OBJECT if a
-// buffer is gone or has become too small now, when the command is given.
-cl_int inspect(CopyBatch& batch, const GlDevice& device)
+// Adds the buffers that must be copied to the batch's items. Returns CL_INVALID_GL_OBJECT if a
+// buffer was deleted, or is smaller than its memory object.
+[[nodiscard]] cl_int selectCopies(CopyBatch& batch, const GlBufferAccess& gl)
 {
     for (const auto& buffer : batch.buffers) {
-        void* const storage = buffer->storage.address();
+        const void* storage = buffer->storage.address();
         buffer->isCopied =
-            storage == nullptr || device.address(buffer->name, buffer->size) != storage;
+            storage == nullptr || gl.hostAddress(buffer->name, buffer->size) != storage;
         if (!buffer->isCopied)
             continue;
-        if (device.bufferSize(buffer->name).value_or(0) < buffer->size)
+        if (gl.bufferSize(buffer->name).value_or(0) < buffer->size)
             return CL_INVALID_GL_OBJECT;
         batch.items.push_back({buffer.get(), buffer->hostAddress()});
     }
     return CL_SUCCESS;
 }
 
-// Whether no buffer must be copied, by a look from the calling thread, which saves two switches to
-// the worker's. A false result decides nothing.
+// Returns true if no buffer must be copied, as far as the calling thread's context shows. That
+// saves two thread switches. If false, the worker's context has to decide.
 bool areAllInPlace(const SharingContext& context, const CopyBatch& batch)
 {
-    const GlDevice::CallerLook look = context.worker().lookFromCaller();
-    return std::ranges::all_of(batch.buffers, [&look](const auto& buffer) {
-        void* const storage = buffer->storage.address();
-        return storage != nullptr && look.address(buffer->name, buffer->size) == storage;
+    const GlBufferAccess::CallerAccess gl = context.worker().callerAccess();
+    return std::ranges::all_of(batch.buffers, [&gl](const auto& buffer) {
+        const void* storage = buffer->storage.address();
+        return storage != nullptr && gl.hostAddress(buffer->name, buffer->size) == storage;
     });
 }
 
-cl_int prepareAcquire(const SharingContext& context, bool isOrdered, CopyBatch& batch)
+[[nodiscard]] cl_int prepareAcquire(const SharingContext& context, bool isOrdered, CopyBatch& batch)
 {
     batch.direction = CopyDirection::kFromGl;
     if (isOrdered && areAllInPlace(context, batch)) {
@@ -74,14 +76,14 @@ cl_int prepareAcquire(const SharingContext& context, bool isOrdered, CopyBatch& 
         return CL_SUCCESS;
     }
     cl_int result = CL_INVALID_GL_OBJECT;
-    context.worker().call([&](GlDevice* device) {
-        if (device != nullptr)
-            result = inspect(batch, *device);
+    context.worker().call([&](GlBufferAccess* gl) {
+        if (gl != nullptr)
+            result = selectCopies(batch, *gl);
     });
     return result;
 }
 
-// What was copied on the way in is copied on the way out.
+// Copies the buffers that the acquire has copied.
 void prepareRelease(CopyBatch& batch)
 {
     batch.direction = CopyDirection::kToGl;
@@ -91,7 +93,7 @@ void prepareRelease(CopyBatch& batch)
     }
 }
 
-void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
+void updateCounters(SharingCommand command, std::size_t copied, std::size_t inPlace)
 {
     if (command == SharingCommand::kAcquire) {
         counters().acquiredByCopy += copied;
@@ -101,8 +103,9 @@ void count(SharingCommand command, std::size_t copied, std::size_t inPlace)
     }
 }
 
-// The commands in the queue. In place nothing has to be done, and the command is a marker.
-cl_int enqueue(const SharingRequest& request, CopyBatch::Ptr& batch, cl_event* done)
+// Enqueues the copies, or a marker if every buffer is used in place.
+[[nodiscard]] cl_int enqueueCommands(const SharingRequest& request, CopyBatch::Ptr& batch,
+                                     cl_event* done)
 {
     if (!batch->items.empty())
         return enqueueCopies(request.queue, batch, request.waitList, done);
@@ -111,31 +114,31 @@ cl_int enqueue(const SharingRequest& request, CopyBatch::Ptr& batch, cl_event* d
                                                  request.waitList.data(), done);
 }
 
-cl_command_type typeOf(SharingCommand command)
+cl_command_type commandTypeOf(SharingCommand command)
 {
     return command == SharingCommand::kAcquire ? CL_COMMAND_ACQUIRE_GL_OBJECTS
                                                : CL_COMMAND_RELEASE_GL_OBJECTS;
 }
 
-// Hands the event to the application, or gives it back if it is not wanted.
-void handOver(cl_event done, EventTypes::Prepared type, cl_event* wanted)
+// Passes ownership of `done` to the application, or releases it if `event` is null.
+void returnEvent(cl_event done, EventRegistry::PreparedEntry type, cl_event* event)
 {
-    if (wanted == nullptr) {
+    if (event == nullptr) {
         runtime().clReleaseEvent(done);
         return;
     }
-    EventTypes::get().add(done, std::move(type));
-    *wanted = done;
+    EventRegistry::get().add(done, std::move(type));
+    *event = done;
 }
 
-cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
-                        const SharingContext& context, CopyBatch::Ptr& batch)
+[[nodiscard]] cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
+                                      const SharingContext& context, CopyBatch::Ptr& batch)
 {
     const bool isOrdered = context.isOrderedWithCaller();
-    // Allocated before the command is in the queue, which nothing takes back.
-    EventTypes::Prepared type;
+    // Allocated first, since an enqueued command cannot be taken back.
+    EventRegistry::PreparedEntry type;
     if (request.event != nullptr)
-        type = EventTypes::get().prepare(typeOf(command));
+        type = EventRegistry::get().prepareEntry(commandTypeOf(command));
     if (command == SharingCommand::kAcquire) {
         if (isOrdered)
             context.worker().finishCaller();
@@ -147,13 +150,13 @@ cl_int acquireOrRelease(SharingCommand command, const SharingRequest& request,
     const std::size_t copied = batch->items.size();
     const std::size_t inPlace = batch->buffers.size() - copied;
     cl_event done = nullptr;
-    if (const cl_int error = enqueue(request, batch, &done); error != CL_SUCCESS)
+    if (const cl_int error = enqueueCommands(request, batch, &done); error != CL_SUCCESS)
         return error;
-    count(command, copied, inPlace);
-    // A wait that fails tells of a command before this one, and so will the event.
+    updateCounters(command, copied, inPlace);
+    // The wait fails if an earlier command has failed. The event reports that, too.
     if (command == SharingCommand::kRelease && isOrdered)
         static_cast<void>(runtime().clWaitForEvents(1, &done));
-    handOver(done, std::move(type), request.event);
+    returnEvent(done, std::move(type), request.event);
     return CL_SUCCESS;
 }
 
@@ -163,7 +166,7 @@ cl_int enqueueSharing(SharingCommand command, const std::shared_ptr<SharingConte
                       const SharingRequest& request)
 {
     CopyBatch::Ptr batch = CopyBatch::take(context);
-    if (const cl_int error = findAll(request, context, batch->buffers); error != CL_SUCCESS)
+    if (const cl_int error = findBuffers(request, context, batch->buffers); error != CL_SUCCESS)
         return error;
 
     const bool acquired = command == SharingCommand::kAcquire;
@@ -173,7 +176,7 @@ cl_int enqueueSharing(SharingCommand command, const std::shared_ptr<SharingConte
     try {
         error = acquireOrRelease(command, request, *context, batch);
     } catch (const std::exception&) {
-        // As any other failure of the command.
+        // `error` is CL_OUT_OF_HOST_MEMORY.
     }
     if (error != CL_SUCCESS)
         static_cast<void>(context->setAcquired(batch->buffers, !acquired));

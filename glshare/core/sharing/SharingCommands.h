@@ -1,4 +1,4 @@
-// clEnqueueAcquireGLObjects and clEnqueueReleaseGLObjects.
+// Implements clEnqueueAcquireGLObjects and clEnqueueReleaseGLObjects.
 #pragma once
 
 #include "core/sharing/SharingContext.h"
@@ -10,17 +10,16 @@ namespace glshare {
 
 enum class SharingCommand { kAcquire, kRelease };
 
-// The arguments of both.
+// The arguments of both functions.
 struct SharingRequest {
     cl_command_queue queue;
     std::span<const cl_mem> memory; // not empty
     std::span<const cl_event> waitList;
-    cl_event* event; // may be null; the application owns what it gets
+    cl_event* event; // may be null; the application owns the returned event
 };
 
-// Enqueues the command; `context` is the queue's. It never waits for the queue, except where
-// cl_khr_gl_event has it ordered against the OpenGL context of the calling thread: then a release
-// returns when it is done.
+// Enqueues the command; `context` is that of the queue. Does not wait for the queue, with one
+// exception: if SharingContext::isOrderedWithCaller, a release returns when it is complete.
 [[nodiscard]] cl_int enqueueSharing(SharingCommand command,
                                     const std::shared_ptr<SharingContext>& context,
                                     const SharingRequest& request);

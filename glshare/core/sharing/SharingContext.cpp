@@ -1,6 +1,6 @@
 #include "core/sharing/SharingContext.h"
 
-#include "core/api/Switches.h"
+#include "core/api/Settings.h"
 #include "core/sharing/CopyBatch.h"
 
 #include <utility>
@@ -9,8 +9,8 @@ namespace glshare {
 
 namespace {
 
-// More than a program has commands under way that copy.
-constexpr std::size_t kKeptBatches = 16;
+// More than the copying commands that an application has pending at a time.
+constexpr std::size_t kMaxFreeBatches = 16;
 
 } // namespace
 
@@ -25,7 +25,7 @@ SharingContext::~SharingContext() = default;
 
 bool SharingContext::isOrderedWithCaller() const
 {
-    return switches().glEvent && !fProperties.userSynchronises && fWorker->callerSharesObjects();
+    return settings().glEvent && !fProperties.hasUserSync && fWorker->isCallerInShareGroup();
 }
 
 bool SharingContext::setAcquired(const SharedBuffers& buffers, bool acquired)
@@ -46,21 +46,21 @@ std::unique_ptr<CopyBatch> SharingContext::takeBatch()
 {
     {
         const std::scoped_lock lock(fMutex);
-        fBatches.reserve(kKeptBatches); // so that keepBatch allocates nothing
-        if (!fBatches.empty()) {
-            std::unique_ptr<CopyBatch> batch = std::move(fBatches.back());
-            fBatches.pop_back();
+        fFreeBatches.reserve(kMaxFreeBatches); // so that returnBatch allocates nothing
+        if (!fFreeBatches.empty()) {
+            std::unique_ptr<CopyBatch> batch = std::move(fFreeBatches.back());
+            fFreeBatches.pop_back();
             return batch;
         }
     }
     return std::make_unique<CopyBatch>();
 }
 
-void SharingContext::keepBatch(std::unique_ptr<CopyBatch> batch) noexcept
+void SharingContext::returnBatch(std::unique_ptr<CopyBatch> batch) noexcept
 {
     const std::scoped_lock lock(fMutex);
-    if (fBatches.size() < fBatches.capacity())
-        fBatches.push_back(std::move(batch));
+    if (fFreeBatches.size() < fFreeBatches.capacity())
+        fFreeBatches.push_back(std::move(batch));
 }
 
 } // namespace glshare

@@ -1,5 +1,4 @@
-// What this program keeps for an OpenCL context that was made with an OpenGL context in its
-// properties.
+// The state of an OpenCL context that shares with an OpenGL context.
 #pragma once
 
 #include "core/sharing/ContextProperties.h"
@@ -16,9 +15,10 @@ namespace glshare {
 using SharedBuffers = std::vector<std::shared_ptr<SharedBuffer>>;
 class CopyBatch;
 
+// Owned by the object registry, its buffers and its pending tasks. Any thread.
 class SharingContext {
 public:
-    // `canUseHostMemory` says that every device of the context works in the host's own memory.
+    // `canUseHostMemory`: every device of the context uses host memory in place.
     SharingContext(std::unique_ptr<GlWorker> worker, ContextProperties properties,
                    bool canUseHostMemory);
 
@@ -27,28 +27,28 @@ public:
     SharingContext(const SharingContext&) = delete;
     SharingContext& operator=(const SharingContext&) = delete;
 
-    [[nodiscard]] const ContextProperties& properties() const { return fProperties; }
-    [[nodiscard]] bool canUseHostMemory() const { return fCanUseHostMemory; }
-    [[nodiscard]] GlWorker& worker() const { return *fWorker; }
+    [[nodiscard]] const ContextProperties& properties() const noexcept { return fProperties; }
+    [[nodiscard]] bool canUseHostMemory() const noexcept { return fCanUseHostMemory; }
+    [[nodiscard]] GlWorker& worker() const noexcept { return *fWorker; }
 
-    // Whether a command given on the calling thread must be ordered against the OpenGL context that
-    // is current there.
+    // Returns whether cl_khr_gl_event orders a command of the calling thread with the OpenGL
+    // commands of its current context.
     [[nodiscard]] bool isOrderedWithCaller() const;
 
-    // Marks all as acquired, or as released, in one step; false, and nothing changed, if one of
-    // them is so already, or stands in the list twice.
+    // Marks all buffers as acquired, or as released, in one step. Returns false, and changes
+    // nothing, if one of them already is or is listed twice.
     [[nodiscard]] bool setAcquired(const SharedBuffers& buffers, bool acquired);
 
-    // Takes a batch that a command has used before, or makes one; and takes it back, empty.
+    // Returns an unused batch, or a new one. returnBatch accepts an empty batch for reuse.
     [[nodiscard]] std::unique_ptr<CopyBatch> takeBatch();
-    void keepBatch(std::unique_ptr<CopyBatch> batch) noexcept;
+    void returnBatch(std::unique_ptr<CopyBatch> batch) noexcept;
 
 private:
     std::unique_ptr<GlWorker> fWorker;
     ContextProperties fProperties;
     bool fCanUseHostMemory;
     std::mutex fMutex; // guards SharedBuffer::isAcquired and the following
-    std::vector<std::unique_ptr<CopyBatch>> fBatches; // not in use
+    std::vector<std::unique_ptr<CopyBatch>> fFreeBatches;
 };
 
 } // namespace glshare

@@ -1,5 +1,4 @@
-// A piece of work for a worker's thread, and the queue that holds such work. Passing a task on
-// allocates nothing.
+// Tasks for a GlWorker's thread, and the queue that holds them. Queueing a task allocates nothing.
 #pragma once
 
 #include <memory>
@@ -7,7 +6,7 @@
 
 namespace glshare {
 
-class GlDevice;
+class GlBufferAccess;
 
 class GlTask {
 public:
@@ -17,26 +16,27 @@ public:
     GlTask(const GlTask&) = delete;
     GlTask& operator=(const GlTask&) = delete;
 
-    // Works on the worker's thread. `device` is null once the GL side is gone: then all that is
-    // left to do is to complete what others wait for. Returns whether the work has ended; a task
-    // that is watched runs again at short intervals until it has.
-    virtual bool run(GlDevice* device) noexcept = 0;
+    // Runs on the worker's thread. `gl` is null once the worker has lost its OpenGL context; the
+    // task then only completes what others wait for. Returns whether the task has finished; a
+    // polled task that has not runs again.
+    virtual bool run(GlBufferAccess* gl) noexcept = 0;
 
-    // What a GlTaskPtr does at its end. Nothing may be done with the task afterwards.
-    virtual void drop() noexcept { delete this; }
+    // Called instead of a delete expression when a GlTaskPtr ends. The caller may not use the task
+    // afterwards.
+    virtual void dispose() noexcept { delete this; }
 
-    struct Drop {
-        void operator()(GlTask* task) const noexcept { task->drop(); }
+    struct Deleter {
+        void operator()(GlTask* task) const noexcept { task->dispose(); }
     };
 
 private:
     friend class GlTaskQueue;
-    std::unique_ptr<GlTask, Drop> fNext; // in the queue that owns the task
+    std::unique_ptr<GlTask, Deleter> fNext; // in the queue that owns the task
 };
 
-using GlTaskPtr = std::unique_ptr<GlTask, GlTask::Drop>;
+using GlTaskPtr = std::unique_ptr<GlTask, GlTask::Deleter>;
 
-// First in, first out. Not synchronised.
+// A first-in, first-out queue that owns its tasks. Not synchronised.
 class GlTaskQueue {
 public:
     GlTaskQueue() = default;
@@ -55,16 +55,16 @@ public:
         std::swap(fLast, other.fLast);
     }
 
-    [[nodiscard]] bool empty() const { return fFirst == nullptr; }
+    [[nodiscard]] bool empty() const noexcept { return fFirst == nullptr; }
 
     void push(GlTaskPtr task) noexcept
     {
-        GlTask* const added = task.get();
+        GlTask* added = task.get();
         (empty() ? fFirst : fLast->fNext) = std::move(task);
         fLast = added;
     }
 
-    // Takes the first; the queue must not be empty.
+    // Removes the first task; the queue must not be empty.
     GlTaskPtr pop() noexcept
     {
         GlTaskPtr task = std::move(fFirst);
@@ -74,7 +74,7 @@ public:
 
 private:
     GlTaskPtr fFirst;
-    GlTask* fLast = nullptr; // valid unless the queue is empty
+    GlTask* fLast = nullptr; // unspecified if the queue is empty
 };
 
 } // namespace glshare

@@ -1,7 +1,7 @@
 #include "core/worker/GlWorker.h"
 
-#include "core/worker/Fork.h"
 #include "core/worker/GlWorkerLoop.h"
+#include "core/worker/ProcessHooks.h"
 
 #include <exception>
 #include <future>
@@ -19,7 +19,7 @@ std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
     worker->fThread = std::thread([loop = std::move(loop), promise = std::move(started)]() mutable {
         bool isUsable = false;
         try {
-            isUsable = loop->begin();
+            isUsable = loop->makeCurrent();
             promise.set_value(isUsable);
         } catch (...) {
             promise.set_exception(std::current_exception());
@@ -29,12 +29,12 @@ std::unique_ptr<GlWorker> GlWorker::start(std::unique_ptr<GlContext> context)
     });
     if (!isRunning.get())
         return nullptr;
-    Loop::listenForDisplay(worker->fLoop);
-    Loop::listenForExit(worker->fLoop);
+    Loop::handleDisplayClosing(worker->fLoop);
+    Loop::registerForExit(worker->fLoop);
     return worker;
 }
 
-GlWorker::GlWorker(std::shared_ptr<Loop> loop) : fLoop(std::move(loop)) {}
+GlWorker::GlWorker(std::shared_ptr<Loop> loop) noexcept : fLoop(std::move(loop)) {}
 
 GlWorker::~GlWorker()
 {
@@ -48,10 +48,10 @@ void GlWorker::stop()
     if (!fLoop->requestStop()) {
         fThread.detach();
     } else if (fThread.get_id() == std::this_thread::get_id()) {
-        Loop::adopt(fLoop, std::move(fThread));
+        Loop::joinLater(fLoop, std::move(fThread));
     } else {
         fThread.join();
-        fLoop->markGone();
+        fLoop->markJoined();
     }
 }
 
@@ -60,27 +60,27 @@ void GlWorker::post(GlTaskPtr task) noexcept
     fLoop->post(std::move(task));
 }
 
-void GlWorker::watch(GlTaskPtr task) noexcept
+void GlWorker::poll(GlTaskPtr task) noexcept
 {
-    fLoop->watch(std::move(task));
+    fLoop->poll(std::move(task));
 }
 
-void GlWorker::lookNow() noexcept
+void GlWorker::pollNow() noexcept
 {
-    Loop::lookNow();
+    Loop::pollNow();
 }
 
-bool GlWorker::Call::run(GlDevice* device) noexcept
+bool GlWorker::Call::run(GlBufferAccess* gl) noexcept
 {
     try {
-        work(device);
+        work(gl);
     } catch (...) {
         thrown = std::current_exception();
     }
     return true;
 }
 
-void GlWorker::Call::drop() noexcept
+void GlWorker::Call::dispose() noexcept
 {
     loop->endCall(hasRun);
 }
@@ -94,9 +94,9 @@ void GlWorker::run(Call& call)
         std::rethrow_exception(call.thrown);
 }
 
-bool GlWorker::callerSharesObjects() const
+bool GlWorker::isCallerInShareGroup() const
 {
-    return fLoop->callerSharesObjects();
+    return fLoop->isCallerInShareGroup();
 }
 
 void GlWorker::finishCaller() const
@@ -104,9 +104,9 @@ void GlWorker::finishCaller() const
     fLoop->finishCaller();
 }
 
-GlDevice::CallerLook GlWorker::lookFromCaller() const
+GlBufferAccess::CallerAccess GlWorker::callerAccess() const
 {
-    return fLoop->lookFromCaller();
+    return fLoop->callerAccess();
 }
 
 } // namespace glshare

@@ -1,9 +1,9 @@
-// A thread with an OpenGL context of its own, which does the GL side's share of the work. It never
-// waits for OpenCL, so that anybody may wait for it.
+// A thread with a current OpenGL context, on which glshare makes its OpenGL calls. One per OpenCL
+// context that shares. No other thread ever makes a context of glshare's current.
 #pragma once
 
+#include "core/gl/GlBufferAccess.h"
 #include "core/gl/GlContext.h"
-#include "core/gl/GlDevice.h"
 #include "core/worker/GlTask.h"
 
 #include <exception>
@@ -12,72 +12,78 @@
 
 namespace glshare {
 
+// Owns the thread, and through it the context. The thread never waits for OpenCL, so that any
+// thread may wait for it.
 class GlWorker {
 public:
-    // Starts the thread on `context`; null if the context cannot be used. Throws std::system_error
-    // if the system creates no thread.
+    // Starts the thread, which makes `context` current. Returns null if that fails or if its OpenGL
+    // version is too old. Throws std::system_error if the system creates no thread.
     [[nodiscard]] static std::unique_ptr<GlWorker> start(std::unique_ptr<GlContext> context);
 
-    // Stops. Any thread, the worker's own included, where the last owner may be a task.
+    // Finishes the posted tasks, then ends the thread. Any thread, also the worker's own if the
+    // last owner is a task.
     ~GlWorker();
 
     GlWorker(const GlWorker&) = delete;
     GlWorker& operator=(const GlWorker&) = delete;
 
-    // Runs the task once. Tasks run in the order given. Any thread.
+    // Runs a task once. Posted tasks run in order. Any thread.
     void post(GlTaskPtr task) noexcept;
 
-    // Runs the task at short intervals until it has ended. Any thread.
-    void watch(GlTaskPtr task) noexcept;
+    // Runs a task at short intervals until it has finished. The task must keep the worker alive
+    // until then. Any thread.
+    void poll(GlTaskPtr task) noexcept;
 
-    // Has every worker of the process look at once at what it watches. Any thread.
-    static void lookNow() noexcept;
+    // Makes all workers of the process run their polled tasks without waiting for the interval. Any
+    // thread.
+    static void pollNow() noexcept;
 
-    // Calls job(device) on the worker's thread, as a task would be run; returns when it has
-    // returned, and throws what it throws. Not on the worker's thread.
+    // Calls job(gl) on the worker's thread, as GlTask::run is called, and waits for it. Throws what
+    // the job throws. Any thread but the worker's.
     template <typename Job>
     void call(Job&& job)
     {
         struct JobCall final : Call {
             explicit JobCall(Job& work) : job(work) {}
-            void work(GlDevice* device) override { job(device); }
+            void work(GlBufferAccess* gl) override { job(gl); }
             Job& job;
         } call(job);
         run(call);
     }
 
-    // Whether the calling thread has a current context of this share group. Any thread.
-    [[nodiscard]] bool callerSharesObjects() const;
+    // Returns whether the calling thread's current context belongs to the worker's share group;
+    // false if it has none. Any thread.
+    [[nodiscard]] bool isCallerInShareGroup() const;
 
-    // Waits for what was drawn on the context that is current on the calling thread.
+    // Waits for the OpenGL commands of the calling thread. Requires isCallerInShareGroup().
     void finishCaller() const;
 
-    // Looks at buffers with the context that is current on the calling thread.
-    [[nodiscard]] GlDevice::CallerLook lookFromCaller() const;
+    // Returns access through the calling thread's context. Requires isCallerInShareGroup().
+    [[nodiscard]] GlBufferAccess::CallerAccess callerAccess() const;
 
 private:
     class Loop;
 
-    // A job with somebody who waits for it, and owns it.
+    // A task that a thread waits for and owns.
     class Call : public GlTask {
     public:
-        virtual void work(GlDevice* device) = 0;
-        bool run(GlDevice* device) noexcept final;
-        void drop() noexcept final; // lets the caller go on
+        virtual void work(GlBufferAccess* gl) = 0;
+        bool run(GlBufferAccess* gl) noexcept final;
+        void dispose() noexcept final; // wakes the waiting thread
 
         Loop* loop = nullptr;
         std::exception_ptr thrown;
         bool hasRun = false; // guarded by the loop
     };
 
-    explicit GlWorker(std::shared_ptr<Loop> loop);
+    explicit GlWorker(std::shared_ptr<Loop> loop) noexcept;
 
     void run(Call& call);
 
-    // Ends the loop; returns when the thread uses the context no more.
+    // Returns when the thread no longer uses the context.
     void stop();
 
-    std::shared_ptr<Loop> fLoop; // the thread's own; it holds a reference too
+    std::shared_ptr<Loop> fLoop; // shared with the thread
     std::thread fThread;
 };
 

@@ -1,7 +1,6 @@
 #include "core/worker/GlWorkerLoop.h"
 
-#include "core/gl/LibraryFunctions.h"
-#include "core/worker/Fork.h"
+#include "core/worker/ProcessHooks.h"
 
 #include <chrono>
 #include <utility>
@@ -10,59 +9,59 @@ namespace glshare {
 
 namespace {
 
-// Between two looks at what is watched: short beside a frame, long beside a look.
-constexpr std::chrono::microseconds kWatchInterval{250};
+// Between two passes over the polled tasks: short compared with a frame, long compared with a pass.
+constexpr std::chrono::microseconds kPollInterval{250};
 
-// An exiting process waits this long for a job that is running, which is a copy at most.
-constexpr std::chrono::seconds kExitPatience{1};
+// How long an exiting process waits for the current task, which is a copy at most.
+constexpr std::chrono::seconds kExitTimeout{1};
 
 } // namespace
 
-// The loops that were started and may still run.
-struct GlWorker::Loop::Running {
+// The loops of the process that may still run.
+struct GlWorker::Loop::RunningLoops {
     struct Entry {
         std::weak_ptr<Loop> loop;
-        // Of a loop that stopped itself: nobody has joined the thread.
+        // Set for a loop that was stopped on its own thread, which has to be joined here.
         std::shared_ptr<Loop> orphan;
         std::thread thread;
     };
 
-    // Joins the threads that have ended, and drops entries without a loop. With `mutex` held.
-    void tidy();
+    // Joins orphans that have ended, and removes entries without a loop. Called with `mutex` held.
+    void removeEnded();
 
     std::mutex mutex; // guards the rest
     std::list<Entry> entries;
     bool isRegistered = false;
 
-    // Never destroyed, as an exit handler uses it.
-    static Running& get()
+    // Never destroyed: an exit handler uses it.
+    static RunningLoops& get()
     {
-        static auto* const theLoops = new Running;
+        static auto* const theLoops = new RunningLoops;
         return *theLoops;
     }
 };
 
-GlWorker::Loop::Loop(std::unique_ptr<GlContext> context) : fContext(std::move(context)) {}
+GlWorker::Loop::Loop(std::unique_ptr<GlContext> context) noexcept : fContext(std::move(context)) {}
 
-bool GlWorker::Loop::begin()
+bool GlWorker::Loop::makeCurrent()
 {
     if (!fContext->makeCurrent())
         return false;
     try {
-        fDevice = GlDevice::create(fContext->resolver());
+        fGl = GlBufferAccess::create(fContext->resolver());
     } catch (...) {
         fContext->releaseCurrent();
         throw;
     }
-    fHasGl = fDevice.has_value();
+    fHasGl = fGl.has_value();
     if (!fHasGl)
         fContext->releaseCurrent();
     return fHasGl;
 }
 
-GlDevice* GlWorker::Loop::device()
+GlBufferAccess* GlWorker::Loop::gl() noexcept
 {
-    return fHasGl ? &*fDevice : nullptr;
+    return fHasGl ? &*fGl : nullptr;
 }
 
 void GlWorker::Loop::run()
@@ -72,13 +71,13 @@ void GlWorker::Loop::run()
         if (fIsExiting)
             fChanged.wait(lock, [] { return false; });
         if (fIsDisplayClosing && fHasGl)
-            letGoOfDisplay(lock);
+            abandonContext(lock);
         if (!fTasks.empty()) {
             runTask(lock);
         } else if (fIsStopping && !fIsExiting) {
             break;
-        } else if (!fWatched.empty()) {
-            lookAtWatched(lock);
+        } else if (!fPolled.empty()) {
+            pollTasks(lock);
         } else {
             fChanged.wait(lock);
         }
@@ -87,60 +86,60 @@ void GlWorker::Loop::run()
     fIsBusy = true;
     lock.unlock();
     if (fHasGl.exchange(false)) {
-        fDevice->destroy();
+        fGl->destroy();
         fContext->releaseCurrent();
     }
-    while (!fWatched.empty())
-        fWatched.pop()->run(nullptr);
+    while (!fPolled.empty())
+        fPolled.pop()->run(nullptr);
     fContext.reset();
     lock.lock();
     fIsBusy = false;
     fChanged.notify_all();
 }
 
-// The task is dropped before the lock is taken again: it may be the last owner of its worker.
+// Disposes of the task before it locks again, since the task may be the last owner of the worker.
 void GlWorker::Loop::runTask(Lock& lock)
 {
     fCurrent = fTasks.pop();
     fIsBusy = true;
     lock.unlock();
-    fCurrent->run(device());
+    fCurrent->run(gl());
     fCurrent = nullptr;
     lock.lock();
     fIsBusy = false;
     fChanged.notify_all();
 }
 
-void GlWorker::Loop::lookAtWatched(Lock& lock)
+void GlWorker::Loop::pollTasks(Lock& lock)
 {
-    fWatched.swap(fUnseen);
-    fMustLookNow = false;
+    fPolled.swap(fToPoll);
+    fMustPollNow = false;
     fIsBusy = true;
     lock.unlock();
-    while (!fUnseen.empty()) {
-        fCurrent = fUnseen.pop();
-        if (fCurrent->run(device()))
+    while (!fToPoll.empty()) {
+        fCurrent = fToPoll.pop();
+        if (fCurrent->run(gl()))
             fCurrent = nullptr;
         else
-            fSeen.push(std::move(fCurrent));
+            fToPollAgain.push(std::move(fCurrent));
     }
     lock.lock();
     fIsBusy = false;
     fChanged.notify_all();
-    // Tasks that were added during the look follow after the earlier ones.
-    fWatched.swap(fSeen);
-    while (!fSeen.empty())
-        fWatched.push(fSeen.pop());
-    fChanged.wait_for(lock, kWatchInterval, [this] {
-        return fWatched.empty() || fMustLookNow || !fTasks.empty() || fIsStopping || fIsExiting ||
+    // Keeps the order: tasks added during the pass come last.
+    fPolled.swap(fToPollAgain);
+    while (!fToPollAgain.empty())
+        fPolled.push(fToPollAgain.pop());
+    fChanged.wait_for(lock, kPollInterval, [this] {
+        return fPolled.empty() || fMustPollNow || !fTasks.empty() || fIsStopping || fIsExiting ||
                (fIsDisplayClosing && fHasGl);
     });
 }
 
-void GlWorker::Loop::letGoOfDisplay(Lock& lock)
+void GlWorker::Loop::abandonContext(Lock& lock)
 {
     lock.unlock();
-    fDevice->destroy();
+    fGl->destroy();
     fContext->releaseCurrent();
     fContext->abandon();
     lock.lock();
@@ -161,28 +160,28 @@ void GlWorker::Loop::post(GlTaskPtr task) noexcept
     task->run(nullptr);
 }
 
-void GlWorker::Loop::watch(GlTaskPtr task) noexcept
+void GlWorker::Loop::poll(GlTaskPtr task) noexcept
 {
     const std::scoped_lock lock(fMutex);
-    fWatched.push(std::move(task));
-    fMustLookNow = true;
+    fPolled.push(std::move(task));
+    fMustPollNow = true;
     fChanged.notify_all();
 }
 
-// Nobody waits for the list of loops here, which may be held by a thread that waits for this one;
-// the loops look at short intervals anyway.
-void GlWorker::Loop::lookNow() noexcept
+// Returns if the list is locked, possibly by a thread that waits for this one: the loops poll again
+// after the interval.
+void GlWorker::Loop::pollNow() noexcept
 {
-    Running& running = Running::get();
+    RunningLoops& running = RunningLoops::get();
     const std::unique_lock lock(running.mutex, std::try_to_lock);
     if (!lock)
         return;
-    for (const Running::Entry& entry : running.entries) {
+    for (const RunningLoops::Entry& entry : running.entries) {
         const std::shared_ptr<Loop> loop = entry.loop.lock();
         if (loop == nullptr)
             continue;
         const std::scoped_lock loopLock(loop->fMutex);
-        loop->fMustLookNow = true;
+        loop->fMustPollNow = true;
         loop->fChanged.notify_all();
     }
 }
@@ -208,14 +207,14 @@ bool GlWorker::Loop::requestStop()
     return !fIsExiting;
 }
 
-void GlWorker::Loop::markGone()
+void GlWorker::Loop::markJoined()
 {
     const std::scoped_lock lock(fMutex);
-    fIsGone = true;
+    fIsJoined = true;
     fChanged.notify_all();
 }
 
-void GlWorker::Loop::Running::tidy()
+void GlWorker::Loop::RunningLoops::removeEnded()
 {
     std::erase_if(entries, [](Entry& entry) {
         if (entry.orphan == nullptr)
@@ -228,12 +227,12 @@ void GlWorker::Loop::Running::tidy()
     });
 }
 
-void GlWorker::Loop::adopt(std::shared_ptr<Loop> loop, std::thread thread) noexcept
+void GlWorker::Loop::joinLater(std::shared_ptr<Loop> loop, std::thread thread) noexcept
 {
-    Running& running = Running::get();
+    RunningLoops& running = RunningLoops::get();
     const std::scoped_lock lock(running.mutex);
-    running.tidy();
-    for (Running::Entry& entry : running.entries) {
+    running.removeEnded();
+    for (RunningLoops::Entry& entry : running.entries) {
         if (entry.loop.lock() != loop)
             continue;
         entry.orphan = std::move(loop);
@@ -242,22 +241,22 @@ void GlWorker::Loop::adopt(std::shared_ptr<Loop> loop, std::thread thread) noexc
     }
 }
 
-bool GlWorker::Loop::callerSharesObjects() const
+bool GlWorker::Loop::isCallerInShareGroup() const
 {
-    return fHasGl && fContext->callerHasContext() && fDevice->callerSharesObjects();
+    return fHasGl && fContext->callerHasContext() && fGl->isCallerInShareGroup();
 }
 
 void GlWorker::Loop::finishCaller() const
 {
-    fDevice->finishCaller();
+    fGl->finishCaller();
 }
 
-GlDevice::CallerLook GlWorker::Loop::lookFromCaller() const
+GlBufferAccess::CallerAccess GlWorker::Loop::callerAccess() const
 {
-    return GlDevice::CallerLook(*fDevice);
+    return GlBufferAccess::CallerAccess(*fGl);
 }
 
-void GlWorker::Loop::leaveDisplay()
+void GlWorker::Loop::closeDisplay()
 {
     Lock lock(fMutex);
     fIsDisplayClosing = true;
@@ -265,7 +264,7 @@ void GlWorker::Loop::leaveDisplay()
     fChanged.wait(lock, [this] { return (!fHasGl && !fIsBusy) || fIsExiting; });
 }
 
-// A thread that is ending is waited for until it is gone; any other stays where it is.
+// Waits for the end of a thread that is ending already; any other thread stays parked in run().
 void GlWorker::Loop::park(std::thread* orphan)
 {
     Lock lock(fMutex);
@@ -276,35 +275,35 @@ void GlWorker::Loop::park(std::thread* orphan)
         orphan->join();
         return;
     }
-    fChanged.wait_for(lock, kExitPatience, [this] { return !fIsBusy && (!fIsEnding || fIsGone); });
+    fChanged.wait_for(lock, kExitTimeout, [this] { return !fIsBusy && (!fIsEnding || fIsJoined); });
 }
 
-void GlWorker::Loop::listenForDisplay(const std::shared_ptr<Loop>& loop)
+void GlWorker::Loop::handleDisplayClosing(const std::shared_ptr<Loop>& loop)
 {
     loop->fContext->onDisplayClosing([weak = std::weak_ptr<Loop>(loop)] {
         if (const std::shared_ptr<Loop> open = weak.lock())
-            open->leaveDisplay();
+            open->closeDisplay();
     });
 }
 
-void GlWorker::Loop::listenForExit(const std::shared_ptr<Loop>& loop)
+void GlWorker::Loop::registerForExit(const std::shared_ptr<Loop>& loop)
 {
-    Running& running = Running::get();
+    RunningLoops& running = RunningLoops::get();
     const std::scoped_lock lock(running.mutex);
-    running.tidy();
+    running.removeEnded();
     running.entries.push_back({loop, nullptr, {}});
     if (!std::exchange(running.isRegistered, true))
         callAtExit(parkAll);
 }
 
-// In a forked child there are no threads to park.
+// A forked child has no threads to park.
 void GlWorker::Loop::parkAll()
 {
     if (isForkedChild())
         return;
-    Running& running = Running::get();
+    RunningLoops& running = RunningLoops::get();
     const std::scoped_lock lock(running.mutex);
-    for (Running::Entry& entry : running.entries) {
+    for (RunningLoops::Entry& entry : running.entries) {
         if (entry.orphan != nullptr)
             entry.orphan->park(&entry.thread);
         else if (const std::shared_ptr<Loop> loop = entry.loop.lock())

@@ -1,5 +1,4 @@
-// What runs on a worker's thread; part of GlWorker. It outlives the GlWorker where that ends on its
-// own thread or in a process that is exiting.
+// The part of GlWorker that runs on its thread.
 #pragma once
 
 #include "core/worker/GlWorker.h"
@@ -13,77 +12,81 @@
 
 namespace glshare {
 
+// Shared by the GlWorker and its thread. It outlives the GlWorker if that is destroyed on its own
+// thread or in a process that is exiting.
 class GlWorker::Loop {
 public:
-    explicit Loop(std::unique_ptr<GlContext> context);
+    explicit Loop(std::unique_ptr<GlContext> context) noexcept;
 
-    // On the worker's thread: takes the context; false if it cannot be used.
-    [[nodiscard]] bool begin();
+    // The worker's thread: makes the context current; returns false if it cannot be used.
+    [[nodiscard]] bool makeCurrent();
 
-    // On the worker's thread: works until requestStop, and then until nothing is left to do.
+    // The worker's thread: runs tasks until requestStop, then the posted tasks that are left, and
+    // releases the context.
     void run();
 
-    // The following on any thread.
+    // The following: any thread.
 
     void post(GlTaskPtr task) noexcept;
-    void watch(GlTaskPtr task) noexcept;
-    static void lookNow() noexcept;
+    void poll(GlTaskPtr task) noexcept;
+    static void pollNow() noexcept;
 
-    // Sets `hasRun`, which belongs to a call that may be gone on return; waits until it is set.
+    // Sets `hasRun`, after which the waiting thread may destroy its call; and waits for it.
     void endCall(bool& hasRun) noexcept;
     void waitForCall(const bool& hasRun);
 
-    // False if the thread will not end any more, since the process is exiting.
+    // Returns false if the thread will not end, since the process is exiting.
     [[nodiscard]] bool requestStop();
-    // Says that the thread, asked to stop, has been joined.
-    void markGone();
-    // Takes over the thread of a loop that was asked to stop by itself: somebody has to join it.
-    // listenForExit has been called for the loop.
-    static void adopt(std::shared_ptr<Loop> loop, std::thread thread) noexcept;
+    // Called after the thread was joined.
+    void markJoined();
+    // Takes ownership of a thread that has called requestStop for its own loop; another thread
+    // joins it. The loop must be registered for exit.
+    static void joinLater(std::shared_ptr<Loop> loop, std::thread thread) noexcept;
 
-    [[nodiscard]] bool callerSharesObjects() const;
+    [[nodiscard]] bool isCallerInShareGroup() const;
     void finishCaller() const;
-    [[nodiscard]] GlDevice::CallerLook lookFromCaller() const;
+    [[nodiscard]] GlBufferAccess::CallerAccess callerAccess() const;
 
-    // Lets go of the GL side when its display closes, and parks the thread when the process exits:
-    // the exit handlers of the drivers must not run beside a thread that uses them, nor beside one
-    // that ends, which gives back what the drivers keep for it.
-    static void listenForDisplay(const std::shared_ptr<Loop>& loop);
-    static void listenForExit(const std::shared_ptr<Loop>& loop);
+    // Abandons the context when its display closes.
+    static void handleDisplayClosing(const std::shared_ptr<Loop>& loop);
+    // Parks the thread when the process exits. The drivers' exit handlers must not run while it
+    // uses them, nor while it ends, which frees the drivers' thread-local data.
+    static void registerForExit(const std::shared_ptr<Loop>& loop);
 
 private:
-    struct Running;
+    struct RunningLoops;
     using Lock = std::unique_lock<std::mutex>;
 
-    void leaveDisplay();
+    void closeDisplay();
     void park(std::thread* orphan);
     static void parkAll();
 
-    // With the lock held; the lock is given up while foreign code runs.
+    // Called with the lock held; unlock while tasks and drivers run.
     void runTask(Lock& lock);
-    void lookAtWatched(Lock& lock);
-    void letGoOfDisplay(Lock& lock);
-    [[nodiscard]] GlDevice* device();
+    void pollTasks(Lock& lock);
+    void abandonContext(Lock& lock);
+    // Returns null once the context is lost.
+    [[nodiscard]] GlBufferAccess* gl() noexcept;
 
     std::unique_ptr<GlContext> fContext;
-    std::optional<GlDevice> fDevice; // unchanged once begin has returned
+    std::optional<GlBufferAccess> fGl; // not changed after makeCurrent
     std::atomic<bool> fHasGl{false};
 
-    // The worker's thread alone: what it has taken from `fWatched`, and the task that runs. No task
-    // is on the thread's stack, which a forked child does not have.
-    GlTaskQueue fUnseen;
-    GlTaskQueue fSeen;
+    // The worker's thread only: the polled tasks during a pass, and the current task. No task is on
+    // the thread's stack, which a forked child lacks.
+    GlTaskQueue fToPoll;
+    GlTaskQueue fToPollAgain;
     GlTaskPtr fCurrent;
 
     std::mutex fMutex; // guards everything below
     std::condition_variable fChanged;
     GlTaskQueue fTasks;
-    GlTaskQueue fWatched;
-    bool fMustLookNow = false;
+    GlTaskQueue fPolled;
+    bool fMustPollNow = false;
     bool fIsBusy = false;
     bool fIsStopping = false;
-    bool fIsEnding = false; // run is over, or nearly
-    bool fIsGone = false;   // and the thread with it
+    bool fIsEnding = false; // run() is returning or has returned
+    bool fIsJoined = false;
     bool fIsDisplayClosing = false;
     bool fIsExiting = false;
 };

@@ -1,4 +1,4 @@
-#include "core/gl/GlDevice.h"
+#include "core/gl/GlBufferAccess.h"
 
 #include <array>
 #include <cstring>
@@ -9,19 +9,19 @@ namespace glshare {
 
 namespace {
 
-// The renderers that keep a buffer in ordinary memory, so that every mapping of it is its storage
-// itself. Elsewhere a mapping may be a temporary copy that happens to lie where the last one did.
+// The renderers that keep buffers in host memory, so that each mapping returns the storage itself.
+// With other renderers a mapping may be a temporary copy, even one with the same address as before.
 constexpr std::array<std::string_view, 2> kRenderersInMemory{"llvmpipe", "softpipe"};
 
-std::string_view textOf(const GLubyte* string)
+std::string_view toStringView(const GLubyte* string)
 {
     return string == nullptr ? std::string_view() : reinterpret_cast<const char*>(string);
 }
 
 bool keepsBuffersInMemory(std::string_view renderer)
 {
-    for (const std::string_view known : kRenderersInMemory) {
-        if (renderer.find(known) != std::string_view::npos)
+    for (const std::string_view name : kRenderersInMemory) {
+        if (renderer.find(name) != std::string_view::npos)
             return true;
     }
     return false;
@@ -29,65 +29,65 @@ bool keepsBuffersInMemory(std::string_view renderer)
 
 } // namespace
 
-std::optional<GlDevice> GlDevice::create(GlFunctions::Resolver resolve)
+std::optional<GlBufferAccess> GlBufferAccess::create(GlFunctions::Resolver resolve)
 {
-    GlDevice device;
-    if (!device.fGl.load(resolve))
+    GlBufferAccess access;
+    if (!access.fGl.load(resolve))
         return std::nullopt;
-    device.fIsEs = textOf(device.fGl.getString(GL_VERSION)).starts_with("OpenGL ES");
-    if (device.fIsEs)
-        device.fGl.getBufferSubData = nullptr; // whatever stands under that name
-    device.fKeepsBuffersInMemory = keepsBuffersInMemory(textOf(device.fGl.getString(GL_RENDERER)));
-    device.fMark = device.fGl.fenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
-    if (device.fMark == nullptr)
+    access.fIsEs = toStringView(access.fGl.getString(GL_VERSION)).starts_with("OpenGL ES");
+    if (access.fIsEs)
+        access.fGl.getBufferSubData = nullptr; // not a function of OpenGL ES, even if it is found
+    access.fKeepsBuffersInMemory =
+        keepsBuffersInMemory(toStringView(access.fGl.getString(GL_RENDERER)));
+    access.fShareGroupSync = access.fGl.fenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
+    if (access.fShareGroupSync == nullptr)
         return std::nullopt;
-    device.fGl.genBuffers(1, &device.fStaging);
-    device.fReportsImmutable = device.findsImmutableStorage();
-    return device;
+    access.fGl.genBuffers(1, &access.fStaging);
+    access.fHasImmutableStorage = access.detectImmutableStorage();
+    return access;
 }
 
-// OpenGL 4.4 and the extension GL_ARB_buffer_storage have it.
-bool GlDevice::findsImmutableStorage() const
+// OpenGL 4.4 and GL_ARB_buffer_storage have immutable storage; elsewhere the query is an error.
+bool GlBufferAccess::detectImmutableStorage() const
 {
     while (fGl.getError() != GL_NO_ERROR) {
     }
     GLuint buffer = 0;
     fGl.genBuffers(1, &buffer);
     fGl.bindBuffer(GL_COPY_READ_BUFFER, buffer);
-    static_cast<void>(parameter(GL_BUFFER_IMMUTABLE_STORAGE));
+    static_cast<void>(boundBufferParameter(GL_BUFFER_IMMUTABLE_STORAGE));
     fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
     fGl.deleteBuffers(1, &buffer);
-    return succeeded();
+    return hasNoError();
 }
 
-void GlDevice::destroy()
+void GlBufferAccess::destroy()
 {
     fGl.useProgram(0);
     fGl.deleteProgram(fPinProgram); // 0 is ignored
     fGl.deleteBuffers(1, &fStaging);
-    fGl.deleteSync(fMark);
+    fGl.deleteSync(fShareGroupSync);
 }
 
-// glIsBuffer comes first everywhere: binding a name that is no buffer would create one in some
-// profiles.
-std::optional<std::size_t> GlDevice::bufferSize(GLuint name) const
+// Every function calls glIsBuffer first: in some profiles, binding an unused name creates a buffer.
+std::optional<std::size_t> GlBufferAccess::bufferSize(GLuint name) const
 {
     if (fGl.isBuffer(name) != GL_TRUE)
         return std::nullopt;
     fGl.bindBuffer(GL_COPY_READ_BUFFER, name);
-    const GLint64 size = parameter(GL_BUFFER_SIZE);
+    const GLint64 size = boundBufferParameter(GL_BUFFER_SIZE);
     fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
     return static_cast<std::size_t>(size);
 }
 
-GLint64 GlDevice::parameter(GLenum name) const
+GLint64 GlBufferAccess::boundBufferParameter(GLenum name) const
 {
     GLint64 value = 0;
     fGl.getBufferParameteri64v(GL_COPY_READ_BUFFER, name, &value);
     return value;
 }
 
-bool GlDevice::prepareCopy(GLuint name, std::size_t size) const
+bool GlBufferAccess::prepareCopy(GLuint name, std::size_t size) const
 {
     if (bufferSize(name).value_or(0) < size)
         return false;
@@ -96,7 +96,7 @@ bool GlDevice::prepareCopy(GLuint name, std::size_t size) const
     return true;
 }
 
-void GlDevice::bindStaging(GLenum target, std::size_t size)
+void GlBufferAccess::bindStaging(GLenum target, std::size_t size)
 {
     fGl.bindBuffer(target, fStaging);
     if (fStagingSize < size) {
@@ -105,8 +105,9 @@ void GlDevice::bindStaging(GLenum target, std::size_t size)
     }
 }
 
-// OpenGL ES reads buffers only through a mapping, which has to be of a buffer of our own.
-bool GlDevice::read(GLuint name, void* to, std::size_t size)
+// OpenGL ES reads buffers only through a mapping. That must not be of the application's buffer, so
+// the staging buffer is mapped.
+bool GlBufferAccess::read(GLuint name, void* to, std::size_t size)
 {
     if (!prepareCopy(name, size))
         return false;
@@ -115,12 +116,12 @@ bool GlDevice::read(GLuint name, void* to, std::size_t size)
     if (fGl.getBufferSubData != nullptr) {
         fGl.getBufferSubData(GL_COPY_READ_BUFFER, 0, bytes, to);
         fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
-        return succeeded();
+        return hasNoError();
     }
     bindStaging(GL_COPY_WRITE_BUFFER, size);
     fGl.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
     fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
-    if (!succeeded())
+    if (!hasNoError())
         return false;
     const void* mapped = fGl.mapBufferRange(GL_COPY_WRITE_BUFFER, 0, bytes, GL_MAP_READ_BIT);
     if (mapped == nullptr)
@@ -130,46 +131,46 @@ bool GlDevice::read(GLuint name, void* to, std::size_t size)
     return true;
 }
 
-bool GlDevice::Writing::write(GLuint name, const void* from, std::size_t size)
+bool GlBufferAccess::WriteScope::write(GLuint name, const void* from, std::size_t size)
 {
-    return fDevice.write(name, from, size);
+    return fAccess.write(name, from, size);
 }
 
-// Storage that the application has made immutable may refuse to be written from the host; OpenGL's
-// own copies it takes.
-bool GlDevice::write(GLuint name, const void* from, std::size_t size)
+// glBufferSubData fails for immutable storage without GL_DYNAMIC_STORAGE_BIT; a copy from the
+// staging buffer does not.
+bool GlBufferAccess::write(GLuint name, const void* from, std::size_t size)
 {
     if (!prepareCopy(name, size))
         return false;
     const auto bytes = static_cast<GLsizeiptr>(size);
     fGl.bindBuffer(GL_COPY_WRITE_BUFFER, name);
     fGl.bufferSubData(GL_COPY_WRITE_BUFFER, 0, bytes, from);
-    bool isWritten = succeeded();
+    bool isWritten = hasNoError();
     if (!isWritten) {
         bindStaging(GL_COPY_READ_BUFFER, size);
         fGl.bufferSubData(GL_COPY_READ_BUFFER, 0, bytes, from);
         fGl.copyBufferSubData(GL_COPY_READ_BUFFER, GL_COPY_WRITE_BUFFER, 0, 0, bytes);
-        isWritten = succeeded();
+        isWritten = hasNoError();
     }
     fGl.bindBuffer(GL_COPY_WRITE_BUFFER, 0);
     return isWritten;
 }
 
-// The mapping is not waited for: it is only looked at. Asking for writing has a use of its own, as
-// the driver then forgets what it has cached of the contents.
-void* GlDevice::address(GLuint name, std::size_t size) const
+void* GlBufferAccess::hostAddress(GLuint name, std::size_t size) const
 {
     if (!fKeepsBuffersInMemory || fGl.isBuffer(name) != GL_TRUE)
         return nullptr;
     fGl.bindBuffer(GL_COPY_READ_BUFFER, name);
-    void* const mapped = addressOfBound(size);
+    void* address = boundBufferAddress(size);
     fGl.bindBuffer(GL_COPY_READ_BUFFER, 0);
-    return mapped;
+    return address;
 }
 
-void* GlDevice::addressOfBound(std::size_t size) const
+// Only the address is used, so that the mapping need not wait. Write access makes the driver
+// discard its cached copies of the contents.
+void* GlBufferAccess::boundBufferAddress(std::size_t size) const
 {
-    // Contexts that share one buffer look at it in turn.
+    // Serialises the contexts that share one buffer.
     static std::mutex theMutex;
     const std::scoped_lock lock(theMutex);
     void* mapped = fGl.mapBufferRange(GL_COPY_READ_BUFFER, 0, static_cast<GLsizeiptr>(size),
@@ -179,32 +180,35 @@ void* GlDevice::addressOfBound(std::size_t size) const
     return mapped;
 }
 
-GlDevice::CallerLook::CallerLook(const GlDevice& device) : fDevice(device)
+GlBufferAccess::CallerAccess::CallerAccess(const GlBufferAccess& access) : fAccess(access)
 {
-    fDevice.fGl.getIntegerv(GL_COPY_READ_BUFFER_BINDING, &fBound);
+    fAccess.fGl.getIntegerv(GL_COPY_READ_BUFFER_BINDING, &fBound);
 }
 
-GlDevice::CallerLook::~CallerLook()
+GlBufferAccess::CallerAccess::~CallerAccess()
 {
-    fDevice.fGl.bindBuffer(GL_COPY_READ_BUFFER, static_cast<GLuint>(fBound));
+    fAccess.fGl.bindBuffer(GL_COPY_READ_BUFFER, static_cast<GLuint>(fBound));
 }
 
-// Whatever could make the mapping fail is looked at before, as errors are the application's.
-// Immutable storage may not be mappable; such a buffer is new, and its storage another one.
-void* GlDevice::CallerLook::address(GLuint name, std::size_t size) const
+// A failed mapping would change the application's error state, so its conditions are checked first.
+// Immutable storage may not be mappable, which no query reports; the worker's context then tries
+// it.
+void* GlBufferAccess::CallerAccess::hostAddress(GLuint name, std::size_t size) const
 {
-    const GlFunctions& gl = fDevice.fGl;
-    if (!fDevice.fReportsImmutable || gl.isBuffer(name) != GL_TRUE)
+    const GlFunctions& gl = fAccess.fGl;
+    if (!fAccess.fHasImmutableStorage || gl.isBuffer(name) != GL_TRUE)
         return nullptr;
     gl.bindBuffer(GL_COPY_READ_BUFFER, name);
-    const bool canBeMapped = fDevice.parameter(GL_BUFFER_SIZE) >= static_cast<GLint64>(size) &&
-                             fDevice.parameter(GL_BUFFER_MAPPED) == GL_FALSE &&
-                             fDevice.parameter(GL_BUFFER_IMMUTABLE_STORAGE) == GL_FALSE;
-    return canBeMapped ? fDevice.addressOfBound(size) : nullptr;
+    const bool canBeMapped =
+        fAccess.boundBufferParameter(GL_BUFFER_SIZE) >= static_cast<GLint64>(size) &&
+        fAccess.boundBufferParameter(GL_BUFFER_MAPPED) == GL_FALSE &&
+        fAccess.boundBufferParameter(GL_BUFFER_IMMUTABLE_STORAGE) == GL_FALSE;
+    return canBeMapped ? fAccess.boundBufferAddress(size) : nullptr;
 }
 
-// Pinning needs a program in use that could be captured from; nothing is ever drawn with it.
-bool GlDevice::buildPinProgram()
+// Transform feedback can begin only while a program with captured varyings is in use. Nothing is
+// drawn with it.
+bool GlBufferAccess::buildPinProgram()
 {
     const std::array<const char*, 2> source{
         fIsEs ? "#version 300 es\n" : "#version 150\n",
@@ -216,10 +220,10 @@ bool GlDevice::buildPinProgram()
         fGl.shaderSource(shader, static_cast<GLsizei>(text.size()), text.data(), nullptr);
         fGl.compileShader(shader);
         fGl.attachShader(fPinProgram, shader);
-        fGl.deleteShader(shader); // goes with the program
+        fGl.deleteShader(shader); // deleted with the program
     };
     attach(GL_VERTEX_SHADER, source);
-    attach(GL_FRAGMENT_SHADER, fragment); // OpenGL ES links no program without one
+    attach(GL_FRAGMENT_SHADER, fragment); // required by OpenGL ES
     const char* captured = "captured";
     fGl.transformFeedbackVaryings(fPinProgram, 1, &captured, GL_INTERLEAVED_ATTRIBS);
     fGl.linkProgram(fPinProgram);
@@ -229,10 +233,10 @@ bool GlDevice::buildPinProgram()
     return linked == GL_TRUE;
 }
 
-// A capture that was begun makes its transform-feedback object hold the storage, not the buffer; so
-// glDeleteBuffers and glBufferData leave it alone. The object stays out of sight of every other
-// context.
-GLuint GlDevice::pin(GLuint name)
+// After a capture has begun, the transform feedback object refers to the storage itself, so that
+// glDeleteBuffers and glBufferData do not free it. Transform feedback objects are not shared, so
+// the application cannot see it.
+GLuint GlBufferAccess::pin(GLuint name)
 {
     if (fKeepsBuffersInMemory && fPinProgram == 0)
         fKeepsBuffersInMemory = buildPinProgram();
@@ -248,25 +252,25 @@ GLuint GlDevice::pin(GLuint name)
     return feedback;
 }
 
-void GlDevice::unpin(GLuint pinned) const
+void GlBufferAccess::unpin(GLuint pinned) const
 {
     fGl.deleteTransformFeedbacks(1, &pinned);
 }
 
-bool GlDevice::isSync(GLsync sync) const
+bool GlBufferAccess::isSync(GLsync sync) const
 {
     return fGl.isSync(sync) == GL_TRUE;
 }
 
-bool GlDevice::isSignalled(GLsync sync) const
+bool GlBufferAccess::isSignalled(GLsync sync) const
 {
     const GLenum status = fGl.clientWaitSync(sync, 0, 0);
     return status == GL_ALREADY_SIGNALED || status == GL_CONDITION_SATISFIED;
 }
 
-bool GlDevice::callerSharesObjects() const
+bool GlBufferAccess::isCallerInShareGroup() const
 {
-    return fGl.isSync(fMark) == GL_TRUE;
+    return fGl.isSync(fShareGroupSync) == GL_TRUE;
 }
 
 } // namespace glshare

@@ -1,4 +1,4 @@
-// The functions of OpenCL 1.2 that an OpenCL.dll exports.
+// The list of the functions of OpenCL 1.2, which an OpenCL.dll exports.
 #pragma once
 
 // clang-format off

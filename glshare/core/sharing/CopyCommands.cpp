@@ -1,4 +1,4 @@
-#include "core/sharing/Copies.h"
+#include "core/sharing/CopyCommands.h"
 
 #include <exception>
 #include <utility>
@@ -8,7 +8,7 @@ namespace glshare {
 
 namespace {
 
-cl_int createUserEvent(cl_command_queue queue, EventList& events)
+[[nodiscard]] cl_int createUserEvent(cl_command_queue queue, EventList& events)
 {
     cl_context context = nullptr;
     const cl_int error = runtime().clGetCommandQueueInfo(
@@ -22,7 +22,8 @@ cl_int createUserEvent(cl_command_queue queue, EventList& events)
     });
 }
 
-cl_int enqueueMarker(cl_command_queue queue, std::span<const cl_event> waitList, EventList& events)
+[[nodiscard]] cl_int enqueueMarker(cl_command_queue queue, std::span<const cl_event> waitList,
+                                   EventList& events)
 {
     return events.add([&](cl_event* event) {
         return runtime().clEnqueueMarkerWithWaitList(queue, static_cast<cl_uint>(waitList.size()),
@@ -30,9 +31,9 @@ cl_int enqueueMarker(cl_command_queue queue, std::span<const cl_event> waitList,
     });
 }
 
-// Maps the memory objects that lie in memory of the runtime's. They wait for the one marker, since
-// some runtimes need time for each pair of a command and an event that it waits for.
-cl_int mapAll(cl_command_queue queue, CopyBatch& batch)
+// Maps the memory objects without a host address. They all wait for one marker, since some runtimes
+// take time for each pair of a command and an event of its wait list.
+[[nodiscard]] cl_int mapAll(cl_command_queue queue, CopyBatch& batch)
 {
     CopyEvents& events = batch.events;
     const cl_map_flags access =
@@ -54,8 +55,8 @@ cl_int mapAll(cl_command_queue queue, CopyBatch& batch)
     return events.maps.empty() ? CL_SUCCESS : enqueueMarker(queue, events.maps, events.mapped);
 }
 
-// Unmaps what was mapped, all of it even if one cannot be.
-cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
+// Unmaps every mapped memory object, also after a failure.
+[[nodiscard]] cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
 {
     cl_int result = CL_SUCCESS;
     for (const CopyItem& item : batch.items) {
@@ -71,17 +72,18 @@ cl_int unmapAll(cl_command_queue queue, CopyBatch& batch)
     return result;
 }
 
-// The last marker waits for what comes before the copies too, so that it fails if that does.
-cl_int enqueueDone(cl_command_queue queue, CopyBatch& batch)
+// The marker waits for the ready event, too, so that it fails if a command before the copies fails.
+[[nodiscard]] cl_int enqueueDone(cl_command_queue queue, CopyBatch& batch)
 {
     CopyEvents& events = batch.events;
     batch.waitList.assign(events.unmaps.begin(), events.unmaps.end());
     batch.waitList.push_back(events.copied.back());
-    batch.waitList.push_back(batch.ready());
+    batch.waitList.push_back(batch.readyEvent());
     return enqueueMarker(queue, batch.waitList, events.done);
 }
 
-cl_int enqueueAll(cl_command_queue queue, CopyBatch& batch, std::span<const cl_event> waitList)
+[[nodiscard]] cl_int enqueueAll(cl_command_queue queue, CopyBatch& batch,
+                                std::span<const cl_event> waitList)
 {
     cl_int error = enqueueMarker(queue, waitList, batch.events.started);
     if (error == CL_SUCCESS)
@@ -98,7 +100,7 @@ cl_int enqueueAll(cl_command_queue queue, CopyBatch& batch, std::span<const cl_e
 cl_int enqueueCopies(cl_command_queue queue, CopyBatch::Ptr& batch,
                      std::span<const cl_event> waitList, cl_event* done)
 {
-    batch->events.unmaps.reserve(batch->items.size()); // so that what is mapped can be unmapped
+    batch->events.unmaps.reserve(batch->items.size()); // so that unmapAll does not throw
     cl_int error = createUserEvent(queue, batch->events.copied);
     if (error != CL_SUCCESS)
         return error;
@@ -111,14 +113,14 @@ cl_int enqueueCopies(cl_command_queue queue, CopyBatch::Ptr& batch,
         *done = batch->events.done.back();
         error = runtime().clRetainEvent(*done); // the caller's reference
     }
-    // Requested at the end: until then the caller alone decides about the user event.
+    // Last, since the worker may complete the user event from then on.
     if (error == CL_SUCCESS) {
-        error = CopyBatch::copyWhenReady(batch);
+        error = CopyBatch::submit(batch);
         if (error == CL_SUCCESS)
             return CL_SUCCESS;
         runtime().clReleaseEvent(*done);
     }
-    // What was mapped is unmapped again, if that is not in the queue already.
+    // Unmaps, unless the unmap commands are enqueued already.
     if (batch->events.unmaps.empty())
         static_cast<void>(unmapAll(queue, *batch));
     runtime().clSetUserEventStatus(batch->events.copied.back(), CL_COMPLETE);

@@ -1,24 +1,24 @@
-#include "core/sharing/Registry.h"
+#include "core/sharing/ObjectRegistry.h"
 
 #include "core/api/Devices.h"
-#include "core/worker/Fork.h"
+#include "core/worker/ProcessHooks.h"
 
 #include <algorithm>
 #include <utility>
 
 namespace glshare {
 
-Registry& Registry::get()
+ObjectRegistry& ObjectRegistry::get()
 {
-    static auto* const theRegistry = new Registry;
+    static auto* const theRegistry = new ObjectRegistry;
     return *theRegistry;
 }
 
-// The version is checked since the table of an older runtime ends before this function.
-void Registry::add(cl_context handle, std::shared_ptr<SharingContext> context)
+// Checks the version first: the table of an older runtime ends before the function that is called.
+void ObjectRegistry::add(cl_context handle, std::shared_ptr<SharingContext> context)
 {
     const bool canReportEnd =
-        runtime().clSetContextDestructorCallback != nullptr && offersVersion3(handle);
+        runtime().clSetContextDestructorCallback != nullptr && supportsOpenCl3(handle);
     {
         const std::scoped_lock lock(fMutex);
         fContexts.insert_or_assign(handle, ContextEntry{std::move(context)});
@@ -34,7 +34,7 @@ void Registry::add(cl_context handle, std::shared_ptr<SharingContext> context)
     fContexts.at(handle).isEndReported = true;
 }
 
-void Registry::remove(cl_context handle)
+void ObjectRegistry::remove(cl_context handle)
 {
     std::shared_ptr<SharingContext> unused;
     const std::scoped_lock lock(fMutex);
@@ -42,14 +42,14 @@ void Registry::remove(cl_context handle)
         unused = std::move(entry.mapped().context);
 }
 
-void Registry::retain(cl_context handle)
+void ObjectRegistry::retain(cl_context handle)
 {
     const std::scoped_lock lock(fMutex);
     if (const auto found = fContexts.find(handle); found != fContexts.end())
         ++found->second.references;
 }
 
-void Registry::release(cl_context handle)
+void ObjectRegistry::release(cl_context handle)
 {
     std::shared_ptr<SharingContext> unused;
     const std::scoped_lock lock(fMutex);
@@ -61,14 +61,14 @@ void Registry::release(cl_context handle)
     unused = takeUnused(handle);
 }
 
-std::shared_ptr<SharingContext> Registry::find(cl_context handle)
+std::shared_ptr<SharingContext> ObjectRegistry::find(cl_context handle)
 {
     const std::scoped_lock lock(fMutex);
     const auto found = fContexts.find(handle);
     return found == fContexts.end() ? nullptr : found->second.context;
 }
 
-void Registry::add(cl_context handle, std::shared_ptr<SharedBuffer> buffer)
+void ObjectRegistry::add(cl_context handle, std::shared_ptr<SharedBuffer> buffer)
 {
     const std::scoped_lock lock(fMutex);
     if (const auto found = fContexts.find(handle); found != fContexts.end())
@@ -77,14 +77,14 @@ void Registry::add(cl_context handle, std::shared_ptr<SharedBuffer> buffer)
     fBuffers.insert_or_assign(memory, BufferEntry{handle, std::move(buffer)});
 }
 
-std::shared_ptr<SharedBuffer> Registry::find(cl_mem handle)
+std::shared_ptr<SharedBuffer> ObjectRegistry::find(cl_mem handle)
 {
     const std::scoped_lock lock(fMutex);
     const auto found = fBuffers.find(handle);
     return found == fBuffers.end() ? nullptr : found->second.buffer;
 }
 
-void Registry::find(const cl_mem* handles, std::size_t count, SharedBuffers& result)
+void ObjectRegistry::find(const cl_mem* handles, std::size_t count, SharedBuffers& result)
 {
     const std::scoped_lock lock(fMutex);
     result.reserve(std::min(count, fBuffers.size()));
@@ -96,9 +96,9 @@ void Registry::find(const cl_mem* handles, std::size_t count, SharedBuffers& res
     }
 }
 
-// What is dropped is dropped without the lock: the record may be the last owner of its context, and
+// The locals are destroyed after the lock: the record may be the last owner of its context, and
 // that ends a thread.
-void Registry::remove(cl_mem handle)
+void ObjectRegistry::remove(cl_mem handle)
 {
     std::shared_ptr<SharedBuffer> buffer;
     std::shared_ptr<SharingContext> unused;
@@ -114,7 +114,7 @@ void Registry::remove(cl_mem handle)
     unused = takeUnused(owner);
 }
 
-std::shared_ptr<SharingContext> Registry::takeUnused(cl_context handle)
+std::shared_ptr<SharingContext> ObjectRegistry::takeUnused(cl_context handle)
 {
     const auto found = fContexts.find(handle);
     if (found == fContexts.end() || found->second.isEndReported || found->second.references > 0 ||

@@ -1,5 +1,5 @@
-// Which of the application's handles mean something here. Handles that are not found belong to the
-// runtime alone.
+// The OpenCL contexts and memory objects that glshare shares. Handles that are not found belong to
+// the runtime alone.
 #pragma once
 
 #include "core/sharing/SharingContext.h"
@@ -11,36 +11,38 @@
 
 namespace glshare {
 
-// Safe from any thread.
-class Registry {
+// Owns a record per context and memory object. Any thread.
+class ObjectRegistry {
 public:
     // Never destroyed: objects may be released in exit handlers.
-    static Registry& get();
+    [[nodiscard]] static ObjectRegistry& get();
 
-    // A context lives here until the runtime destroys it, which is after every object in it. A
-    // runtime before OpenCL 3.0 does not report that: then the context lives as long as the
-    // application holds references to it or to shared buffers in it. Those references are counted
-    // here, as the runtime's own count has other owners too.
+    // A context is registered until the runtime destroys it, which is after every object in it. A
+    // runtime before OpenCL 3.0 does not report that. The context is then registered as long as the
+    // application holds references to it or to shared buffers in it. These are counted here, since
+    // the runtime's count includes references of others.
     void add(cl_context handle, std::shared_ptr<SharingContext> context);
     void remove(cl_context handle);
     void retain(cl_context handle);
     void release(cl_context handle);
+    // Returns null if the context is not registered.
     [[nodiscard]] std::shared_ptr<SharingContext> find(cl_context handle);
 
     void add(cl_context handle, std::shared_ptr<SharedBuffer> buffer);
+    // Returns null if the memory object is not registered.
     [[nodiscard]] std::shared_ptr<SharedBuffer> find(cl_mem handle);
 
-    // Appends the records of `count` handles to `result` in their order, up to the first that is
-    // unknown.
+    // Appends the records of `count` handles to `result`, in order, and stops at the first handle
+    // that is not registered.
     void find(const cl_mem* handles, std::size_t count, SharedBuffers& result);
 
-    // When the runtime destroys the memory object. Does nothing if it is unknown.
+    // Called when the runtime destroys the memory object. Ignores one that is not registered.
     void remove(cl_mem handle);
 
 private:
     struct ContextEntry {
         std::shared_ptr<SharingContext> context;
-        bool isEndReported = false; // if so, nothing is counted
+        bool isEndReported = false; // by the runtime; the counts are then not used
         std::size_t references = 1; // the application's
         std::size_t buffers = 0;
     };
@@ -49,8 +51,9 @@ private:
         std::shared_ptr<SharedBuffer> buffer;
     };
 
-    // Under the lock: the context if nobody needs its entry any more. The caller drops it without
-    // the lock, as that ends a thread.
+    // Called with the lock held. Removes the context's entry if its counts are 0, and returns its
+    // context; null otherwise. The caller releases the result after it has unlocked, since that may
+    // end a thread.
     [[nodiscard]] std::shared_ptr<SharingContext> takeUnused(cl_context handle);
 
     std::mutex fMutex; // guards both maps

@@ -1,4 +1,4 @@
-#include "core/sharing/EventTypes.h"
+#include "core/sharing/EventRegistry.h"
 
 #include <utility>
 
@@ -6,24 +6,24 @@ namespace glshare {
 
 namespace {
 
-// More than a program holds events of sharing commands.
-constexpr std::size_t kSpares = 64;
+// More than the events of sharing commands that an application holds at a time.
+constexpr std::size_t kMaxFreeEntries = 64;
 
 } // namespace
 
-EventTypes& EventTypes::get()
+EventRegistry& EventRegistry::get()
 {
-    static auto* const theTypes = new EventTypes;
-    return *theTypes;
+    static auto* const theEvents = new EventRegistry;
+    return *theEvents;
 }
 
-EventTypes::Prepared EventTypes::prepare(cl_command_type type)
+EventRegistry::PreparedEntry EventRegistry::prepareEntry(cl_command_type type)
 {
-    Prepared prepared;
+    PreparedEntry prepared;
     {
         const std::scoped_lock lock(fMutex);
-        if (!fSpares.empty())
-            prepared = fSpares.extract(fSpares.begin());
+        if (!fFreeEntries.empty())
+            prepared = fFreeEntries.extract(fFreeEntries.begin());
     }
     if (prepared.empty()) {
         Entries entries;
@@ -35,43 +35,43 @@ EventTypes::Prepared EventTypes::prepare(cl_command_type type)
     return prepared;
 }
 
-// The handle may have been another event's, whose end was not seen here.
-void EventTypes::add(cl_event event, Prepared prepared) noexcept
+// The handle may have an entry from an earlier event, whose last release was not counted here.
+void EventRegistry::add(cl_event event, PreparedEntry prepared) noexcept
 {
     prepared.key() = event;
-    GlTaskPtr kept; // dropped without the lock
+    GlTaskPtr attached; // disposed of without the lock
     const std::scoped_lock lock(fMutex);
     if (const auto found = fEntries.find(event); found != fEntries.end())
-        kept = retire(found);
+        attached = removeEntry(found);
     fEntries.insert(std::move(prepared));
     fCount = fEntries.size();
 }
 
-bool EventTypes::keep(cl_event event, GlTaskPtr& task) noexcept
+bool EventRegistry::attach(cl_event event, GlTaskPtr& task) noexcept
 {
     const std::scoped_lock lock(fMutex);
     const auto found = fEntries.find(event);
     if (found == fEntries.end())
         return false;
-    found->second.kept = std::move(task);
+    found->second.attached = std::move(task);
     return true;
 }
 
-GlTaskPtr EventTypes::retire(Entries::iterator entry) noexcept
+GlTaskPtr EventRegistry::removeEntry(Entries::iterator entry) noexcept
 {
-    GlTaskPtr kept = std::move(entry->second.kept);
-    if (fSpares.size() < kSpares) {
-        Prepared node = fEntries.extract(entry);
+    GlTaskPtr attached = std::move(entry->second.attached);
+    if (fFreeEntries.size() < kMaxFreeEntries) {
+        PreparedEntry node = fEntries.extract(entry);
         node.key() = nullptr;
-        fSpares.insert(std::move(node));
+        fFreeEntries.insert(std::move(node));
     } else {
         fEntries.erase(entry);
     }
     fCount = fEntries.size();
-    return kept;
+    return attached;
 }
 
-void EventTypes::retain(cl_event event)
+void EventRegistry::retain(cl_event event)
 {
     if (fCount == 0)
         return;
@@ -80,18 +80,18 @@ void EventTypes::retain(cl_event event)
         ++found->second.references;
 }
 
-void EventTypes::release(cl_event event)
+void EventRegistry::release(cl_event event)
 {
     if (fCount == 0)
         return;
-    GlTaskPtr kept; // dropped without the lock
+    GlTaskPtr attached; // disposed of without the lock
     const std::scoped_lock lock(fMutex);
     const auto found = fEntries.find(event);
     if (found != fEntries.end() && --found->second.references == 0)
-        kept = retire(found);
+        attached = removeEntry(found);
 }
 
-std::optional<cl_command_type> EventTypes::find(cl_event event)
+std::optional<cl_command_type> EventRegistry::findCommandType(cl_event event)
 {
     if (fCount == 0)
         return std::nullopt;

@@ -1,6 +1,6 @@
-// GlDevice on a scripted OpenGL that executes commands only in glFinish, as a GPU's driver may.
-// Mesa's software renderers execute at once, so that they do not show a missing glFinish.
-#include "core/gl/GlDevice.h"
+// GlBufferAccess on a scripted OpenGL that executes commands only in glFinish, as a GPU driver may.
+// Mesa's software renderers execute at once, which hides a missing glFinish.
+#include "core/gl/GlBufferAccess.h"
 
 #include <gtest/gtest.h>
 
@@ -13,14 +13,14 @@
 
 namespace {
 
-using glshare::GlDevice;
+using glshare::GlBufferAccess;
 
 constexpr GLuint kBuffer = 7;
 
 std::array<int, 4> theStorage;
 std::vector<std::function<void()>> thePending;
 
-// Stands for every function that a test does not look at.
+// Replaces the functions that the test does not use.
 std::intptr_t APIENTRY doNothing()
 {
     return 0;
@@ -61,16 +61,16 @@ void* resolve(const char* name)
     return found == theFunctions.end() ? reinterpret_cast<void*>(doNothing) : found->second;
 }
 
-TEST(GlDeviceTest, WritesAreExecutedWhenWritingEnds)
+TEST(GlBufferAccessTest, EndOfWriteScopeWaitsForItsWrites)
 {
-    auto device = GlDevice::create(resolve);
-    ASSERT_TRUE(device);
+    auto access = GlBufferAccess::create(resolve);
+    ASSERT_TRUE(access);
     const std::array<int, 4> numbers{1, 2, 3, 4};
     {
-        GlDevice::Writing writing(*device);
-        EXPECT_TRUE(writing.write(kBuffer, numbers.data(), sizeof numbers));
-        EXPECT_FALSE(writing.write(kBuffer, numbers.data(), sizeof numbers + 1)) << "too small";
-        EXPECT_FALSE(writing.write(kBuffer + 1, numbers.data(), sizeof numbers)) << "no buffer";
+        GlBufferAccess::WriteScope scope(*access);
+        EXPECT_TRUE(scope.write(kBuffer, numbers.data(), sizeof numbers));
+        EXPECT_FALSE(scope.write(kBuffer, numbers.data(), sizeof numbers + 1)) << "too small";
+        EXPECT_FALSE(scope.write(kBuffer + 1, numbers.data(), sizeof numbers)) << "not a buffer";
     }
     EXPECT_EQ(theStorage, numbers);
 }
