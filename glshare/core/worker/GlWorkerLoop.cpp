@@ -89,8 +89,6 @@ void GlWorker::Loop::run()
         fGl->destroy();
         fContext->releaseCurrent();
     }
-    while (!fPolled.empty())
-        fPolled.pop()->run(nullptr);
     fContext.reset();
     lock.lock();
     fIsBusy = false;
