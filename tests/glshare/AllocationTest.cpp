@@ -1,8 +1,8 @@
-// The layer without memory or threads: each call reports it, changes nothing and works afterwards.
+// The layer without memory or threads: each call returns an error, changes nothing, and succeeds
+// when repeated. The layer's allocations call this program's operator new. Only they fail, not
+// those of OpenCL and OpenGL.
 //
-// The program's operator new is replaced, which the layer's allocations resolve to as well. Those
-// of OpenCL and OpenGL themselves are left alone. Before the headers of the tests, as it includes
-// those of the newest OpenCL.
+// First, since it includes the newest OpenCL headers.
 #include "core/api/OpenCl.h"
 
 #include "ReplacedOperators.h"
@@ -26,11 +26,12 @@
 
 namespace {
 
-// Allocations of the layer until one fails, on any thread; 0 or less: none fails.
+// The number of the layer's allocation that fails, counted down on all threads; none if not
+// positive.
 std::atomic<int> allocationsLeft{0};
 
-// Whether the innermost caller outside of this program, of the standard library and of a sanitizer
-// is the layer.
+// Returns whether the layer is the innermost caller that is not this program, the standard library
+// or a sanitizer.
 bool isCalledByLayer()
 {
     std::array<void*, 24> frames{};
@@ -58,23 +59,23 @@ bool nextAllocationFails()
 
 namespace {
 
-// Far longer than other threads take to give back what a call has used.
+// Much longer than other threads take to release the objects of a call.
 constexpr std::chrono::milliseconds kSettled{20};
 
-// References to a context, a queue and a memory object, and the threads of the process.
+// The reference counts of a context, a queue and a memory object, and the number of threads.
 using InUse = std::array<std::ptrdiff_t, 4>;
 
 class AllocationTest : public SharingTest {
 protected:
-    // Makes one call while memory is short, waits for what it has started, checks and undoes it.
-    // Returns its status.
+    // Makes one call with a failing allocation, waits for its commands, checks and releases its
+    // results, and returns its status.
     using Call = std::function<cl_int()>;
 
-    void TearDown() override { endShortage(); }
+    void TearDown() override { endFailing(); }
 
-    // Around the call itself.
-    void beginShortage() const { allocationsLeft = fFailing; }
-    cl_int endShortage(cl_int status = CL_SUCCESS)
+    // Enclose the call itself.
+    void beginFailing() const { allocationsLeft = fFailing; }
+    cl_int endFailing(cl_int status = CL_SUCCESS)
     {
         fHasFailed = fFailing > 0 && allocationsLeft <= 0;
         allocationsLeft = 0;
@@ -86,20 +87,20 @@ protected:
         return {infoOf<cl_uint>(clGetContextInfo, fContext, CL_CONTEXT_REFERENCE_COUNT),
                 infoOf<cl_uint>(clGetCommandQueueInfo, fQueue, CL_QUEUE_REFERENCE_COUNT),
                 infoOf<cl_uint>(clGetMemObjectInfo, fMemory, CL_MEM_REFERENCE_COUNT),
-                threadsOfProcess()};
+                threadCount()};
     }
 
-    // Other threads may still have to give back what they use.
-    void expectNothingLost(const InUse& before) const
+    // Other threads may still hold references.
+    void expectNoLeaks(const InUse& before) const
     {
-        const auto isNoMore = [&] {
+        const auto isAtMostBefore = [&] {
             return std::ranges::equal(inUse(), before, std::less_equal());
         };
-        EXPECT_TRUE(isSoon(isNoMore)) << testing::PrintToString(inUse());
+        EXPECT_TRUE(becomesTrue(isAtMostBefore)) << testing::PrintToString(inUse());
     }
 
-    // Fails each allocation of a call in turn. The last time none fails, and the call works.
-    // A call that `maySucceed` has callbacks, whose failures it does not see.
+    // Repeats a call, and fails its first allocation, its second, and so on until none fails. If
+    // `maySucceed`, allocations of callbacks may fail, which the call does not report.
     void failEachAllocation(const char* name, const Call& call, cl_int expected = CL_SUCCESS,
                             bool maySucceed = false)
     {
@@ -112,44 +113,43 @@ protected:
             if (!maySucceed || status != expected) {
                 EXPECT_EQ(status, fHasFailed ? CL_OUT_OF_HOST_MEMORY : expected) << fFailing;
             }
-            expectNothingLost(before);
+            expectNoLeaks(before);
             if (!fHasFailed)
                 break;
         }
         EXPECT_GT(std::exchange(fFailing, 0), 1) << "nothing was allocated";
     }
 
-    // A query whose answer is a Value at most.
+    // An information query that returns at most a Value.
     template <typename Value, typename Get, typename Handle>
     Call query(Get get, Handle handle, cl_uint name)
     {
         return [=, this] {
             Value value{};
-            beginShortage();
-            return endShortage(
-                get(handle, name, sizeof value, static_cast<void*>(&value), nullptr));
+            beginFailing();
+            return endFailing(get(handle, name, sizeof value, static_cast<void*>(&value), nullptr));
         };
     }
 
-    // A call that makes an object and fills in an error.
+    // A call that creates an object and sets an error.
     template <typename Object, typename Make>
     Call creation(Make make)
     {
         return [=, this] {
             cl_int error = CL_INVALID_VALUE;
-            beginShortage();
+            beginFailing();
             const Object object = make(&error);
-            endShortage();
+            endFailing();
             EXPECT_EQ(object != nullptr, error == CL_SUCCESS);
             return error;
         };
     }
 
-    int fFailing = 0; // the allocation that fails, from 1 on; 0: none
+    int fFailing = 0; // the number of the allocation that fails, from 1; 0: none
     bool fHasFailed = false;
 };
 
-TEST_F(AllocationTest, QueriesReportThatMemoryIsShort)
+TEST_F(AllocationTest, QueriesWithoutMemoryReturnOutOfHostMemory)
 {
     using Text = std::array<char, 16384>;
     const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
@@ -167,7 +167,7 @@ TEST_F(AllocationTest, QueriesReportThatMemoryIsShort)
                        CL_INVALID_GL_OBJECT);
 }
 
-TEST_F(AllocationTest, CreationsReportThatMemoryIsShort)
+TEST_F(AllocationTest, CreationsWithoutMemoryReturnOutOfHostMemory)
 {
     const Context plain = makeContext({0});
     const Properties list = properties();
@@ -188,7 +188,7 @@ TEST_F(AllocationTest, CreationsReportThatMemoryIsShort)
                        CL_INVALID_CONTEXT);
 }
 
-// A context with two buffers, and commands for both.
+// A context with two buffers, and commands on both.
 struct Pair {
     Context context;
     Queue queue;
@@ -203,8 +203,8 @@ struct Pair {
     }
 };
 
-// The first acquire or release in a context. One that has failed can be repeated.
-TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
+// The first acquire or release of a context, which allocates. A failed one can be repeated.
+TEST_F(AllocationTest, CommandsWithoutMemoryReturnOutOfHostMemory)
 {
     const GLuint other = makeGlBuffer(from(1));
     cl_int value = 1;
@@ -219,11 +219,10 @@ TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
                 EXPECT_EQ(pair.enqueue(false), CL_SUCCESS);
             }
             Event event;
-            beginShortage();
-            const cl_int error = endShortage(pair.enqueue(isRelease, event.place()));
+            beginFailing();
+            const cl_int error = endFailing(pair.enqueue(isRelease, event.address()));
             EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
-            if (isRelease != (error == CL_SUCCESS)) // acquired
-            {
+            if (isRelease != (error == CL_SUCCESS)) { // acquired
                 EXPECT_EQ(pair.queue.read(pair.owners[0], fCount), from(value));
                 pair.queue.write(pair.owners[0], from(++value));
                 EXPECT_EQ(pair.enqueue(true), CL_SUCCESS);
@@ -236,13 +235,13 @@ TEST_F(AllocationTest, CommandsReportThatMemoryIsShort)
     }
 }
 
-// The layer keeps the memory of commands for later ones. The first ones are in progress at the same
-// time here, since the layer's thread may release that memory long after a command has ended.
+// The layer reuses the memory of earlier commands. The first commands are pending at the same time,
+// since the layer's thread may return their memory long after a command has ended.
 TEST_F(AllocationTest, CommandsAllocateNothingAfterTheFirst)
 {
     constexpr int kMany = 1000000;
     const Memory second = share(makeGlBuffer(from(1)));
-    EglTestContext::releaseCurrent(); // or each release waits for its end
+    EglTestContext::releaseCurrent(); // else each release would wait
     const Event gate = makeUserEvent();
     const auto runFrame = [&] {
         for (cl_mem memory : {cl_mem(fMemory), cl_mem(second)}) {
@@ -266,38 +265,38 @@ TEST_F(AllocationTest, CommandsAllocateNothingAfterTheFirst)
     EXPECT_EQ(allocationsLeft, kMany);
 }
 
-TEST_F(AllocationTest, EventsOfSyncObjectsReportThatMemoryIsShort)
+TEST_F(AllocationTest, SyncEventsWithoutMemoryReturnOutOfHostMemory)
 {
     const auto create = reinterpret_cast<decltype(&clCreateEventFromGLsyncKHR)>(
         clGetExtensionFunctionAddressForPlatform(fPlatform, "clCreateEventFromGLsyncKHR"));
     if (create == nullptr)
-        GTEST_SKIP() << "switched off";
+        GTEST_SKIP() << "disabled by GLSHARE_GL_EVENT";
     failEachAllocation("event", [&] {
         GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
         cl_int error = CL_INVALID_VALUE;
-        beginShortage();
+        beginFailing();
         Event event = create(fContext, reinterpret_cast<cl_GLsync>(sync), &error);
-        endShortage(error == CL_SUCCESS ? clWaitForEvents(1, event.place()) : error);
+        endFailing(error == CL_SUCCESS ? clWaitForEvents(1, event.address()) : error);
         glDeleteSync(sync);
         EXPECT_EQ(event != nullptr, error == CL_SUCCESS);
         return error;
     });
 }
 
-// No stack of that size fits into the address space.
-TEST_F(AllocationTest, ThreadsThatCannotBeCreatedAreReported)
+// No stack of 2^48 bytes fits into the address space.
+TEST_F(AllocationTest, CreateContextWithoutThreadReturnsOutOfHostMemory)
 {
     const Properties list = properties();
-    pthread_attr_t usual;
+    pthread_attr_t normal;
     pthread_attr_t impossible;
-    ASSERT_EQ(pthread_getattr_default_np(&usual), 0);
+    ASSERT_EQ(pthread_getattr_default_np(&normal), 0);
     ASSERT_EQ(pthread_getattr_default_np(&impossible), 0);
     ASSERT_EQ(pthread_attr_setstacksize(&impossible, std::size_t{1} << 48), 0);
     ASSERT_EQ(pthread_setattr_default_np(&impossible), 0);
     cl_int error = CL_SUCCESS;
     EXPECT_EQ(clCreateContext(list.data(), 1, &fDevice, nullptr, nullptr, &error), nullptr);
     EXPECT_EQ(error, CL_OUT_OF_HOST_MEMORY);
-    pthread_setattr_default_np(&usual);
+    pthread_setattr_default_np(&normal);
     share(makeContext(), fBuffer);
 }
 

@@ -1,4 +1,4 @@
-// What OpenCL and OpenGL see of each other's writes.
+// The contents that OpenCL and OpenGL read after each other's writes.
 #include "SharingTest.h"
 
 #include "glshare.h"
@@ -11,7 +11,7 @@ namespace {
 
 class BufferContentsTest : public SharingTest {
 protected:
-    // Rewrites through OpenCL and checks what OpenGL sees.
+    // Writes with OpenCL and expects OpenGL to read the result.
     void roundTrip(GLuint buffer, cl_mem memory, const Numbers& before, const Numbers& after)
     {
         ASSERT_NO_FATAL_FAILURE(fQueue.rewrite(memory, before, after));
@@ -19,15 +19,7 @@ protected:
     }
 };
 
-TEST_F(BufferContentsTest, WritesCrossInBothDirections)
-{
-    roundTrip(fBuffer, fMemory, from(1), from(100));
-    redraw(fBuffer, from(-7));
-    glFinish();
-    roundTrip(fBuffer, fMemory, from(-7), from(3));
-}
-
-TEST_F(BufferContentsTest, BytesAreCopiedOnlyWithoutZeroCopy)
+TEST_F(BufferContentsTest, RoundTripCopiesBytesOnlyWithoutZeroCopy)
 {
     const auto getCounters = reinterpret_cast<glshare_get_counters_fn>(
         clGetExtensionFunctionAddressForPlatform(fPlatform, GLSHARE_GET_COUNTERS_NAME));
@@ -45,40 +37,40 @@ TEST_F(BufferContentsTest, BytesAreCopiedOnlyWithoutZeroCopy)
     EXPECT_EQ(after.failed_copies, before.failed_copies);
 }
 
-// The storage moves away from under the memory object, which stays the same.
-TEST_F(BufferContentsTest, ReallocatedBuffersKeepSharing)
+TEST_F(BufferContentsTest, AcquireAfterOverwriteOrReallocationReadsTheNewContents)
 {
-    roundTrip(fBuffer, fMemory, from(1), from(2));
+    overwrite(fBuffer, from(-7));
+    glFinish();
+    roundTrip(fBuffer, fMemory, from(-7), from(2));
     for (const cl_int factor : {3, 200, 1}) {
         SCOPED_TRACE(factor);
-        refill(fBuffer, numbersFrom(factor, fCount * static_cast<std::size_t>(factor)));
+        reallocate(fBuffer, numbersFrom(factor, fCount * static_cast<std::size_t>(factor)));
         glFinish();
         roundTrip(fBuffer, fMemory, from(factor), from(77));
     }
 }
 
-// OpenCL still uses the old storage when OpenGL replaces it.
-TEST_F(BufferContentsTest, ReallocationWhileAcquiredIsHarmless)
+TEST_F(BufferContentsTest, ReallocationWhileAcquiredKeepsTheContentsOfOpenCl)
 {
     ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
-    refill(fBuffer, numbersFrom(9, fCount * 50));
+    reallocate(fBuffer, numbersFrom(9, fCount * 50));
     fQueue.write(fMemory, from(5));
     EXPECT_EQ(fQueue.read(fMemory, fCount), from(5));
     EXPECT_EQ(fQueue.release(fMemory), CL_SUCCESS);
     clFinish(fQueue);
 
-    redraw(fBuffer, from(21));
+    overwrite(fBuffer, from(21));
     glFinish();
     roundTrip(fBuffer, fMemory, from(21), from(31));
 }
 
-// Acquires look at buffers with the context that is current on the calling thread.
-TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndTheErrorsOfTheCaller)
+// An acquire may use the context that is current on the calling thread.
+TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndErrorStateOfTheCaller)
 {
     const GLuint bound = makeGlBuffer(from(4));
     const auto bytes = static_cast<GLsizeiptr>(fCount * sizeof(cl_int));
     const std::function<void()> changes[] = {
-        [] {}, [this] { refill(fBuffer, numbersFrom(2, 2 * fCount)); },
+        [] {}, [this] { reallocate(fBuffer, numbersFrom(2, 2 * fCount)); },
         [] { glMapBuffer(GL_ARRAY_BUFFER, GL_READ_ONLY); },
         [bytes] {
             glUnmapBuffer(GL_ARRAY_BUFFER);
@@ -99,8 +91,8 @@ TEST_F(BufferContentsTest, AcquireKeepsTheBindingAndTheErrorsOfTheCaller)
     }
 }
 
-// Storage that the application keeps mapped, and storage that nobody may map.
-TEST_F(BufferContentsTest, ImmutableBuffersAreShared)
+// Immutable storage that the application keeps mapped, and storage that cannot be mapped.
+TEST_F(BufferContentsTest, RoundTripOfImmutableBufferTransfersContents)
 {
     constexpr GLbitfield kMapped = GL_MAP_WRITE_BIT | GL_MAP_PERSISTENT_BIT | GL_MAP_COHERENT_BIT;
     for (const GLbitfield access : {kMapped, GLbitfield{0}}) {
@@ -116,8 +108,8 @@ TEST_F(BufferContentsTest, ImmutableBuffersAreShared)
     }
 }
 
-// OpenGL ES reads no buffer back but by a mapping.
-TEST_F(BufferContentsTest, BuffersOfOpenGlEsAreShared)
+// OpenGL ES reads buffers only through a mapping.
+TEST_F(BufferContentsTest, RoundTripOfOpenGlEsBufferTransfersContents)
 {
     const EglTestContext es(nullptr, EGL_OPENGL_ES_API);
     ASSERT_TRUE(es.valid());
@@ -134,8 +126,8 @@ TEST_F(BufferContentsTest, BuffersOfOpenGlEsAreShared)
     EglTestContext::releaseCurrent();
 }
 
-// One list with buffers of every kind: in place, moved, and never in place.
-TEST_F(BufferContentsTest, OneCommandCarriesManyBuffers)
+// With zero copy, one list has buffers used in place and copied ones.
+TEST_F(BufferContentsTest, AcquireOfManyBuffersTransfersEach)
 {
     constexpr cl_int kBuffers = 64;
     std::vector<GLuint> buffers;
@@ -144,7 +136,7 @@ TEST_F(BufferContentsTest, OneCommandCarriesManyBuffers)
         buffers.push_back(makeGlBuffer(from(i)));
         owners.push_back(share(buffers.back()));
         if (i % 3 == 0)
-            refill(buffers.back(), numbersFrom(i, fCount * 2));
+            reallocate(buffers.back(), numbersFrom(i, fCount * 2));
     }
     glFinish();
     const std::vector<cl_mem> memory(owners.begin(), owners.end());
@@ -161,8 +153,8 @@ TEST_F(BufferContentsTest, OneCommandCarriesManyBuffers)
         EXPECT_EQ(readGl(buffer, fCount), from(i++));
 }
 
-// Threads without an OpenGL context, each with a queue and a buffer of its own.
-TEST_F(BufferContentsTest, ThreadsShareAtTheSameTime)
+// Threads without an OpenGL context, each with its own queue and buffer.
+TEST_F(BufferContentsTest, ConcurrentQueuesTransferTheirOwnBuffers)
 {
     constexpr std::size_t kThreads = 4;
     constexpr cl_int kRounds = 50;

@@ -1,4 +1,4 @@
-// When acquires, releases and the events around them happen.
+// The order of acquires, releases and the commands and events around them.
 #include "SharingTest.h"
 
 #include <array>
@@ -8,7 +8,7 @@
 
 namespace {
 
-// Far longer than any of the commands takes: a command that has not completed by then is waiting.
+// Much longer than any command takes: a command that is not complete by then is waiting.
 constexpr std::chrono::milliseconds kSettled{100};
 
 constexpr std::array<cl_command_queue_properties, 2> kQueueKinds{
@@ -16,13 +16,12 @@ constexpr std::array<cl_command_queue_properties, 2> kQueueKinds{
 
 using CommandOrderTest = SharingTest;
 
-// What cl_khr_gl_event alone promises; runs only where it is switched on.
+// Tests of cl_khr_gl_event, which run only where it is enabled.
 using GlEventTest = SharingTest;
 
-// Without an OpenGL context on the calling thread nothing waits: neither the caller, nor the
-// command for less than its wait list, nor what follows it for less than the command. In a queue
-// without order that is what follows it by events.
-TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackWhatFollows)
+// On a thread without an OpenGL context, the calls do not wait. In an out-of-order queue, later
+// commands wait by events.
+TEST_F(CommandOrderTest, CommandsWaitForTheirListAndDelayLaterCommands)
 {
     for (cl_int value = 5; const cl_command_queue_properties kind : kQueueKinds) {
         SCOPED_TRACE(kind);
@@ -45,16 +44,15 @@ TEST_F(CommandOrderTest, CommandsWaitForTheirListAndHoldBackWhatFollows)
         EXPECT_EQ(readGl(fBuffer, fCount), before);
 
         clSetUserEventStatus(gate, CL_COMPLETE);
-        EXPECT_EQ(clWaitForEvents(1, events[2].place()), CL_SUCCESS);
+        EXPECT_EQ(clWaitForEvents(1, events[2].address()), CL_SUCCESS);
         for (const Event& event : events)
             EXPECT_EQ(statusOf(event), CL_COMPLETE);
         EXPECT_EQ(readGl(fBuffer, fCount), Numbers(fCount, value));
     }
 }
 
-// cl_khr_gl_event: drawing after a release sees its result, which needs no OpenCL wait. Without the
-// extension the call returns at once.
-TEST_F(CommandOrderTest, ReleaseReturnsWhenDoneOnlyWithGlContextAndGlEvent)
+// With cl_khr_gl_event, OpenGL commands after a release read its result without an OpenCL wait.
+TEST_F(CommandOrderTest, ReleaseWithCurrentContextReturnsWhenCompleteOnlyWithGlEvent)
 {
     const Event gate = makeUserEvent();
     ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
@@ -72,88 +70,66 @@ TEST_F(CommandOrderTest, ReleaseReturnsWhenDoneOnlyWithGlContextAndGlEvent)
     } else {
         EXPECT_GT(statusOf(event), CL_COMPLETE);
         clSetUserEventStatus(gate, CL_COMPLETE);
-        clWaitForEvents(1, event.place());
+        clWaitForEvents(1, event.address());
     }
     EXPECT_EQ(readGl(fBuffer, fCount), Numbers(fCount, 6));
 }
 
-// The other OpenGL contexts of the process are none of the layer's business.
-TEST_F(CommandOrderTest, ContextsOfOtherShareGroupsAreNotWaitedFor)
+// Either the OpenCL context has CL_CONTEXT_INTEROP_USER_SYNC, or the current OpenGL context belongs
+// to another share group.
+TEST_F(CommandOrderTest, ReleaseWithUserSyncOrAnotherShareGroupReturnsAtOnce)
 {
-    const Event gate = makeUserEvent();
-    ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
     const EglTestContext stranger;
     ASSERT_TRUE(stranger.valid());
-    onOtherThread([&] {
-        stranger.makeCurrent();
-        fQueue.fill(fMemory, 6, {gate});
+    for (const bool hasUserSync : {false, true}) {
+        SCOPED_TRACE(hasUserSync);
+        Properties entries = fGlEntries;
+        if (hasUserSync)
+            entries.insert(entries.end(), {CL_CONTEXT_INTEROP_USER_SYNC, CL_TRUE});
+        const Context context = makeContext(properties(entries));
+        const Queue queue(context, fDevice);
+        const Memory memory = share(context, fBuffer);
+        const Event gate = clCreateUserEvent(context, nullptr);
         Event event;
-        EXPECT_EQ(fQueue.release(fMemory, {}, &event), CL_SUCCESS);
+        (hasUserSync ? *fGl : stranger).makeCurrent();
+        EXPECT_EQ(queue.acquire(memory, {gate}), CL_SUCCESS);
+        EXPECT_EQ(queue.release(memory, {}, &event), CL_SUCCESS);
         EXPECT_GT(statusOf(event), CL_COMPLETE);
-        EglTestContext::releaseCurrent();
-    });
-    clSetUserEventStatus(gate, CL_COMPLETE);
-    clFinish(fQueue);
+        clSetUserEventStatus(gate, CL_COMPLETE);
+        EXPECT_EQ(clWaitForEvents(1, event.address()), CL_SUCCESS);
+        fGl->makeCurrent();
+    }
 }
 
-TEST_F(CommandOrderTest, UserSynchronisationSwitchesTheImpliedOrderOff)
-{
-    fGlEntries.insert(fGlEntries.end(), {CL_CONTEXT_INTEROP_USER_SYNC, CL_TRUE});
-    const Context context = makeContext();
-    const Queue queue(context, fDevice);
-    const Memory memory = share(context, fBuffer);
-    const Event gate = clCreateUserEvent(context, nullptr);
-    Event event;
-    EXPECT_EQ(queue.acquire(memory, {gate}), CL_SUCCESS);
-    EXPECT_EQ(queue.release(memory, {}, &event), CL_SUCCESS);
-    EXPECT_GT(statusOf(event), CL_COMPLETE);
-    clSetUserEventStatus(gate, CL_COMPLETE);
-    EXPECT_EQ(clWaitForEvents(1, event.place()), CL_SUCCESS);
-}
-
-// A target of kSide times kSide pixels.
-constexpr GLsizei kSide = 1024;
+constexpr GLsizei kSide = 1024; // pixels of the render target's width and height
 constexpr std::size_t kPixels = std::size_t{kSide} * kSide;
 
-// Draws so many times over the target. Each pixel's fragment writes -1 to its own place in the
-// buffer. Nothing waits for it, nor flushes.
+// Draws the whole target `times` times. Each fragment writes -1 to the number of its pixel. Neither
+// waits nor flushes.
 void drawIntoBuffer(GLuint pixels, int times)
 {
-    GLuint frame = 0;
-    GLuint vertices = 0;
-    glGenFramebuffers(1, &frame);
-    glBindFramebuffer(GL_FRAMEBUFFER, frame);
-    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, kSide);
-    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, kSide);
-    glGenVertexArrays(1, &vertices);
-    glBindVertexArray(vertices);
+    bindEmptyFramebuffer(kSide);
     glBindBufferBase(GL_SHADER_STORAGE_BUFFER, 0, pixels);
     glFinish();
     const char* vertex =
-        "#version 450\nvoid main() { gl_Position = vec4(gl_VertexID == 1 ? 3 : -1, "
-        "gl_VertexID == 2 ? 3 : -1, 0, 1); }";
+        "#version 450\nout gl_PerVertex { vec4 gl_Position; }; void main() { gl_Position = "
+        "vec4(gl_VertexID == 1 ? 3 : -1, gl_VertexID == 2 ? 3 : -1, 0, 1); }";
     const char* fragment =
-        "#version 450\nlayout(location = 0) uniform int side; layout(std430, binding = 0) buffer "
-        "Numbers { int numbers[]; }; void main() { "
-        "numbers[int(gl_FragCoord.y) * side + int(gl_FragCoord.x)] = -1; }";
-    const GLuint program = glCreateProgram();
-    for (const auto& [stage, text] :
-         {std::pair(GL_VERTEX_SHADER, vertex), std::pair(GL_FRAGMENT_SHADER, fragment)}) {
-        const GLuint shader = glCreateShader(static_cast<GLenum>(stage));
-        glShaderSource(shader, 1, &text, nullptr);
-        glCompileShader(shader);
-        glAttachShader(program, shader);
-    }
-    glLinkProgram(program);
-    glUseProgram(program);
-    glUniform1i(0, kSide);
+        "#version 450\nlayout(std430, binding = 0) buffer Numbers { int numbers[]; }; void main() "
+        "{ numbers[int(gl_FragCoord.y) * 1024 + int(gl_FragCoord.x)] = -1; }";
+    GLuint pipeline = 0;
+    glGenProgramPipelines(1, &pipeline);
+    glUseProgramStages(pipeline, GL_VERTEX_SHADER_BIT,
+                       glCreateShaderProgramv(GL_VERTEX_SHADER, 1, &vertex));
+    glUseProgramStages(pipeline, GL_FRAGMENT_SHADER_BIT,
+                       glCreateShaderProgramv(GL_FRAGMENT_SHADER, 1, &fragment));
+    glBindProgramPipeline(pipeline);
     glViewport(0, 0, kSide, kSide);
     for (int i = 0; i < times; ++i)
         glDrawArrays(GL_TRIANGLES, 0, 3);
 }
 
-// Results of drawing that nobody has waited for, but the implied order.
-TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
+TEST_F(GlEventTest, AcquireAfterPendingDrawingReadsItsResult)
 {
     const GLuint pixels = makeGlBuffer(Numbers(kPixels, 0));
     const Memory memory = share(pixels);
@@ -164,8 +140,7 @@ TEST_F(GlEventTest, AcquireComesAfterPendingDrawing)
     EXPECT_EQ(fQueue.release(memory), CL_SUCCESS);
 }
 
-// The failure of what it waits for is the command's own, in a queue of either kind.
-TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
+TEST_F(CommandOrderTest, FailedWaitListFailsTheCommand)
 {
     for (const cl_command_queue_properties kind : kQueueKinds) {
         SCOPED_TRACE(kind);
@@ -179,10 +154,10 @@ TEST_F(CommandOrderTest, FailedWaitListsFailTheCommand)
             clFlush(queue);
         });
         clSetUserEventStatus(gate, -5);
-        // Some runtimes fail the command now, and use what waited for the other event again later.
+        // Some runtimes fail the command now, and use its event again when `other` completes.
         std::this_thread::sleep_for(2 * kSettled);
         clSetUserEventStatus(other, CL_COMPLETE);
-        clWaitForEvents(1, event.place());
+        clWaitForEvents(1, event.address());
         EXPECT_LT(statusOf(event), CL_COMPLETE);
     }
 }
@@ -193,8 +168,8 @@ decltype(&clCreateEventFromGLsyncKHR) findCreateEvent(cl_platform_id platform)
         clGetExtensionFunctionAddressForPlatform(platform, "clCreateEventFromGLsyncKHR"));
 }
 
-// The event is all that is left of its context when the drawing ends.
-TEST_F(GlEventTest, EventsOfGlSyncObjectsKeepTheirContext)
+// The event is the last object of its context.
+TEST_F(GlEventTest, SyncEventCompletesAfterItsContextIsReleased)
 {
     Context context = makeContext();
     drawIntoBuffer(makeGlBuffer(Numbers(kPixels, 0)), 20);
@@ -202,16 +177,16 @@ TEST_F(GlEventTest, EventsOfGlSyncObjectsKeepTheirContext)
     glFlush();
     Event event = findCreateEvent(fPlatform)(context, reinterpret_cast<cl_GLsync>(sync), nullptr);
     context = nullptr;
-    EXPECT_EQ(clWaitForEvents(1, event.place()), CL_SUCCESS);
+    EXPECT_EQ(clWaitForEvents(1, event.address()), CL_SUCCESS);
     EXPECT_EQ(statusOf(event), CL_COMPLETE);
     glDeleteSync(sync);
 }
 
-TEST_F(GlEventTest, EventsFollowGlSyncObjects)
+TEST_F(GlEventTest, SyncEventCompletesWithItsSyncObject)
 {
     const auto createEvent = findCreateEvent(fPlatform);
     ASSERT_NE(createEvent, nullptr);
-    redraw(fBuffer, from(40));
+    overwrite(fBuffer, from(40));
     GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
     glFlush();
     cl_int error = CL_INVALID_VALUE;

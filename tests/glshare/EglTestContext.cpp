@@ -22,7 +22,7 @@ EglTestContext::EglTestContext(const EglTestContext* share, EGLenum api) : fApi(
 {
     eglBindAPI(api);
     const bool isEs = api == EGL_OPENGL_ES_API;
-    // Contexts of no surface: some platforms have no configuration for pixel buffers.
+    // No surface type: some platforms have no configuration for pixel buffers.
     const std::array<EGLint, 5> wanted{EGL_SURFACE_TYPE, 0, EGL_RENDERABLE_TYPE,
                                        isEs ? EGL_OPENGL_ES3_BIT : EGL_OPENGL_BIT, EGL_NONE};
     EGLConfig config = nullptr;

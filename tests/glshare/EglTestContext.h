@@ -1,4 +1,4 @@
-// An OpenGL context for tests, which needs no display.
+// An OpenGL context for tests that needs no display server.
 #pragma once
 
 #include <CL/cl.h>
@@ -8,11 +8,11 @@
 
 class EglTestContext {
 public:
-    // The process's one display without a window system, initialised; EGL_NO_DISPLAY if there is
-    // none.
+    // Returns the process's display, initialised; EGL_NO_DISPLAY if there is none.
     static EGLDisplay display();
 
-    // Shares its objects with `share`, which may be null. Not current on any thread; valid() tells.
+    // Shares its objects with `share`, which may be null. Not current on any thread. valid()
+    // returns false on failure.
     explicit EglTestContext(const EglTestContext* share = nullptr, EGLenum api = EGL_OPENGL_API);
     ~EglTestContext();
 
@@ -21,14 +21,14 @@ public:
 
     [[nodiscard]] bool valid() const { return fContext != EGL_NO_CONTEXT; }
 
-    // What the properties of an OpenCL context say of it.
+    // Returns the entries for the property list of an OpenCL context.
     [[nodiscard]] std::vector<cl_context_properties> entries() const;
 
     // On the calling thread.
     void makeCurrent() const;
     static void releaseCurrent();
 
-    // Destroys the context early.
+    // Destroys the context before the destructor does.
     void destroy();
 
 private:

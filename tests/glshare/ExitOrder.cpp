@@ -1,5 +1,5 @@
-// How a process may end. A crash or a hang on the way out is what these tests look for, so that
-// each of them belongs in a process of its own.
+// The end of the process, which must neither crash nor hang. Each test runs in a process of its
+// own.
 #include "SharingTest.h"
 
 #include <array>
@@ -14,8 +14,8 @@
 
 namespace {
 
-// One of everything, in the order in which it is made.
-struct Everything {
+// The objects of a test, in order of their creation.
+struct TestObjects {
     std::unique_ptr<EglTestContext> gl;
     Context context;
     Queue queue;
@@ -35,16 +35,16 @@ struct Everything {
     }
 };
 
-// What the test has made and left. Never destroyed by itself.
-Everything& theRest()
+// The objects that the test has left. Never destroyed by the program.
+TestObjects& theObjects()
 {
-    static auto* const theOne = new Everything;
+    static auto* const theOne = new TestObjects;
     return *theOne;
 }
 
-// Releases at exit, after the exit handlers that came later than it.
-std::unique_ptr<Everything, void (*)(Everything*)> theOwner(nullptr, [](Everything* everything) {
-    everything->closeCl();
+// Releases at exit, after the exit handlers that were registered later.
+std::unique_ptr<TestObjects, void (*)(TestObjects*)> theOwner(nullptr, [](TestObjects* objects) {
+    objects->closeCl();
 });
 
 class ExitOrder : public SharingTest {
@@ -58,77 +58,71 @@ protected:
         if (IsSkipped())
             return;
         ASSERT_NO_FATAL_FAILURE(fQueue.rewrite(fMemory, from(1), from(2)));
-        theRest() = {std::move(fGl), std::move(fContext), std::move(fQueue), std::move(fMemory)};
+        theObjects() = {std::move(fGl), std::move(fContext), std::move(fQueue), std::move(fMemory)};
     }
 };
 
-TEST_F(ExitOrder, NothingReleased) {}
+TEST_F(ExitOrder, ExitWithNothingReleasedSucceeds) {}
 
-TEST_F(ExitOrder, EverythingReleased)
+TEST_F(ExitOrder, ExitWithAllReleasedSucceeds)
 {
-    theRest().closeCl();
-    theRest().closeGl();
+    theObjects().closeCl();
+    theObjects().closeGl();
 }
 
-TEST_F(ExitOrder, GlFirst)
+TEST_F(ExitOrder, ReleaseAfterGlIsClosedSucceeds)
 {
-    theRest().closeGl();
-    // May succeed or fail, as the driver keeps its objects or not.
-    theRest().queue.acquire(theRest().memory);
-    theRest().queue.release(theRest().memory);
-    theRest().closeCl();
+    theObjects().closeGl();
+    // May succeed or fail, depending on whether the driver keeps its objects.
+    theObjects().queue.acquire(theObjects().memory);
+    theObjects().queue.release(theObjects().memory);
+    theObjects().closeCl();
 }
 
-TEST_F(ExitOrder, GlOnly)
+TEST_F(ExitOrder, ReleaseByStaticDestructorSucceeds)
 {
-    theRest().closeGl();
+    theOwner.reset(&theObjects());
 }
 
-TEST_F(ExitOrder, StaticOwner)
+// The layer's exit handler runs between the two.
+TEST_F(ExitOrder, GlClosedInExitHandlerSucceeds)
 {
-    theOwner.reset(&theRest());
+    std::atexit([] { theObjects().closeGl(); });
+    theOwner.reset(&theObjects());
 }
 
-// What the layer has registered itself runs between the two.
-TEST_F(ExitOrder, GlInAHandlerAndStaticOwner)
-{
-    std::atexit([] { theRest().closeGl(); });
-    theOwner.reset(&theRest());
-}
-
-TEST_F(ExitOrder, PendingCommands)
+TEST_F(ExitOrder, ExitWithPendingCommandsSucceeds)
 {
     EglTestContext::releaseCurrent();
-    cl_event gate = clCreateUserEvent(theRest().context, nullptr);
-    EXPECT_EQ(theRest().queue.acquire(theRest().memory, {gate}), CL_SUCCESS);
-    EXPECT_EQ(theRest().queue.release(theRest().memory), CL_SUCCESS);
-    clFlush(theRest().queue);
+    cl_event gate = clCreateUserEvent(theObjects().context, nullptr);
+    EXPECT_EQ(theObjects().queue.acquire(theObjects().memory, {gate}), CL_SUCCESS);
+    EXPECT_EQ(theObjects().queue.release(theObjects().memory), CL_SUCCESS);
+    clFlush(theObjects().queue);
 }
 
-// Acquires and releases without end, on a thread without an OpenGL context.
-void keepBusy()
+// Acquires and releases until the process ends, on a thread without an OpenGL context.
+void startBusyThread()
 {
     std::thread([] {
         for (;;) {
-            theRest().queue.acquire(theRest().memory);
-            theRest().queue.release(theRest().memory);
-            clFinish(theRest().queue);
+            theObjects().queue.acquire(theObjects().memory);
+            theObjects().queue.release(theObjects().memory);
+            clFinish(theObjects().queue);
         }
     }).detach();
 }
 
-// The process ends while another thread is in the middle of its work.
-TEST_F(ExitOrder, BusyThread)
+TEST_F(ExitOrder, ExitDuringCommandsOfAnotherThreadSucceeds)
 {
     EglTestContext::releaseCurrent();
-    keepBusy();
+    startBusyThread();
     std::this_thread::sleep_for(std::chrono::milliseconds(50));
 }
 
-// Each function that needs what a forked child lacks reports that, and does not wait for it.
+// Expects the functions that need threads to fail in a forked child, and not to wait.
 void useInChild(cl_device_id device, const Properties& list)
 {
-    const Everything& parent = theRest();
+    const TestObjects& parent = theObjects();
     cl_mem memory = parent.memory;
     cl_event event = nullptr;
     cl_mem_flags flags = 0;
@@ -147,24 +141,24 @@ void useInChild(cl_device_id device, const Properties& list)
     EXPECT_EQ(clGetDeviceInfo(device, CL_DEVICE_TYPE, sizeof flags, &flags, nullptr), CL_SUCCESS);
 }
 
-// Children that are forked in the middle of other threads' work.
-TEST_F(ExitOrder, ForkedChildrenFailToShareAndCanExit)
+// The children are forked during commands of another thread.
+TEST_F(ExitOrder, ForkedChildReturnsOutOfResourcesAndExits)
 {
 #ifdef GLSHARE_TEST_SANITIZED
-    GTEST_SKIP() << "the allocators of the sanitizers can stay locked in a child";
+    GTEST_SKIP() << "the sanitizers' allocators may stay locked in a child";
 #endif
     std::array<char, 64> vendor{};
     clGetPlatformInfo(fPlatform, CL_PLATFORM_VENDOR, vendor.size(), vendor.data(), nullptr);
     if (std::string_view(vendor.data()) == "Mesa/X.org")
         GTEST_SKIP() << "an exit handler of Mesa's runtime crashes in a forked child";
     constexpr int kChildren = 20;
-    constexpr unsigned kPatience = 30; // seconds, after which the system ends a child
+    constexpr unsigned kTimeout = 30; // seconds, after which the system ends a child
     EglTestContext::releaseCurrent();
-    keepBusy();
+    startBusyThread();
     for (int i = 0; i < kChildren; ++i) {
         const pid_t child = fork();
         if (child == 0) {
-            alarm(kPatience);
+            alarm(kTimeout);
             if (i % 2 != 0)
                 useInChild(fDevice, properties());
             std::exit(HasFailure() ? 1 : 0);
@@ -175,7 +169,7 @@ TEST_F(ExitOrder, ForkedChildrenFailToShareAndCanExit)
     }
 }
 
-TEST_F(ExitOrder, ExitOnOtherThread)
+TEST_F(ExitOrder, ExitOnAnotherThreadSucceeds)
 {
     onOtherThread([] { std::exit(HasFailure() ? 1 : 0); });
 }

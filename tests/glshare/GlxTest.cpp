@@ -14,7 +14,7 @@ protected:
     // Large enough to be unmapped when it is freed.
     GlxTest() : SharingTest(300000) {}
 
-    // The plain way into GLX, which gives a context with the compatibility profile.
+    // glXCreateNewContext creates a context with the compatibility profile.
     void openGl() override
     {
         fDisplay = XOpenDisplay(nullptr);
@@ -25,7 +25,7 @@ protected:
         int count = 0;
         GLXFBConfig* configs = glXChooseFBConfig(fDisplay, 0, wanted.data(), &count);
         ASSERT_GT(count, 0);
-        const int noAttributes = None; // some drivers want a list
+        const int noAttributes = None; // some drivers require a list
         fSurface = glXCreatePbuffer(fDisplay, *configs, &noAttributes);
         fGlx = glXCreateNewContext(fDisplay, *configs, GLX_RGBA_TYPE, nullptr, True);
         XFree(configs);
@@ -60,7 +60,7 @@ protected:
     GLXContext fGlx = nullptr;
 };
 
-TEST_F(GlxTest, WritesCrossAlsoFromAThreadWithoutContextWhileTheContextIsInUse)
+TEST_F(GlxTest, RewriteWhileAnotherThreadDrawsReachesOpenGl)
 {
     fQueue.rewrite(fMemory, from(1), from(0));
     EXPECT_EQ(readGl(fBuffer, fCount), from(0));
@@ -76,8 +76,8 @@ TEST_F(GlxTest, WritesCrossAlsoFromAThreadWithoutContextWhileTheContextIsInUse)
     EXPECT_EQ(readGl(fBuffer, fCount), from(50));
 }
 
-// Xlib reports the errors of earlier requests at any time, and the layer catches those of its own.
-TEST_F(GlxTest, EarlierErrorsReachTheApplication)
+// The layer ignores X errors of its own requests only.
+TEST_F(GlxTest, CreateContextPassesEarlierXErrorsToTheApplication)
 {
     static int errors = 0;
     const XErrorHandler before = XSetErrorHandler([](Display*, XErrorEvent*) { return ++errors; });
@@ -88,10 +88,10 @@ TEST_F(GlxTest, EarlierErrorsReachTheApplication)
     EXPECT_EQ(errors, 1);
 }
 
-// The order no application should choose: OpenCL is still at work when the display goes. What it
-// works on is left behind on purpose, so that this test runs without a search for leaks.
+// OpenCL still uses the buffer when the display closes. The layer then leaks the buffer's storage
+// on purpose, so this test runs without leak detection.
 using GlxDisplayTest = GlxTest;
-TEST_F(GlxDisplayTest, ClosingTheDisplayFirstIsRefusedAfterwardsAndHarmless)
+TEST_F(GlxDisplayTest, AcquireAfterDisplayClosedReturnsInvalidGlObject)
 {
     ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
     closeGl();

@@ -1,19 +1,19 @@
-// The entry of the test programs: puts the layer that was built in front of the runtime, and sets
-// the environment variables given as arguments of the form NAME=VALUE. The OpenCL loader and the
-// layer look at the environment when the first OpenCL function is called.
+// The main function of the test programs. It sets OPENCL_LAYERS to the built layer, and the
+// variables that are passed as arguments of the form NAME=VALUE. The OpenCL loader and the layer
+// read the environment with the first OpenCL call.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
 
-// AddressSanitizer asks this in builds that have it. Freed memory that it keeps back in large
-// amounts would look like a leak to the test that watches the size of the process.
+// Called by AddressSanitizer. A large quarantine of freed memory would look like a leak to the test
+// that measures the size of the process.
 extern "C" [[gnu::visibility("default")]] const char* __asan_default_options()
 {
     return "quarantine_size_mb=16";
 }
 
-// ThreadSanitizer asks this. The runtime and the OpenGL driver are not built for it, so that it
-// cannot see how they synchronise.
+// Called by ThreadSanitizer. It cannot see how the runtime and the OpenGL driver synchronise, since
+// they are not built for it.
 extern "C" [[gnu::visibility("default")]] const char* __tsan_default_suppressions()
 {
     return "deadlock:libpocl\nrace:swrast_dri\n";

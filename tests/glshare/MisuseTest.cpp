@@ -1,4 +1,4 @@
-// The error codes of calls that break the rules, and that nothing happens besides.
+// The error codes of invalid calls, which must have no other effect.
 #include "SharingTest.h"
 
 #include <array>
@@ -9,7 +9,7 @@ namespace {
 
 using MisuseTest = SharingTest;
 
-TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
+TEST_F(MisuseTest, AcquireAndReleaseWithInvalidArgumentsReturnTheirError)
 {
     const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
     const Queue unshared(makeContext({0}), fDevice);
@@ -36,30 +36,32 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
         cl_int error;
     };
     const Row rows[] = {
-        {"nothing at all", fQueue, 0, nullptr, 0, nullptr, CL_SUCCESS},
+        {"no objects", fQueue, 0, nullptr, 0, nullptr, CL_SUCCESS},
         {"no queue", nullptr, 1, good, 0, nullptr, CL_INVALID_COMMAND_QUEUE},
-        {"a queue that does not share", unshared, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
-        {"a queue that shares elsewhere", elsewhere, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
+        {"a queue of a context without sharing", unshared, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
+        {"a queue of another context", elsewhere, 1, good, 0, nullptr, CL_INVALID_CONTEXT},
         {"a count without a list", fQueue, 1, nullptr, 0, nullptr, CL_INVALID_VALUE},
         {"a list without a count", fQueue, 0, good, 0, nullptr, CL_INVALID_VALUE},
         {"a null object", fQueue, 2, withNull.data(), 0, nullptr, CL_INVALID_MEM_OBJECT},
-        {"one not from OpenGL", fQueue, 2, withPlain.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
-        {"a part of one", fQueue, 1, part.place(), 0, nullptr, CL_INVALID_GL_OBJECT},
-        {"a count that no list has", fQueue, ~0U, good, 0, nullptr, CL_INVALID_VALUE},
+        {"an object not from OpenGL", fQueue, 2, withPlain.data(), 0, nullptr,
+         CL_INVALID_GL_OBJECT},
+        {"a sub-buffer", fQueue, 1, part.address(), 0, nullptr, CL_INVALID_GL_OBJECT},
+        {"a count above the maximum", fQueue, ~0U, good, 0, nullptr, CL_INVALID_VALUE},
         {"an object twice", fQueue, 2, twice.data(), 0, nullptr, CL_INVALID_GL_OBJECT},
         {"a wait count without a list", fQueue, 1, good, 1, nullptr, CL_INVALID_EVENT_WAIT_LIST},
         {"a wait list without a count", fQueue, 1, good, 0, &events[0], CL_INVALID_EVENT_WAIT_LIST},
         {"a null event", fQueue, 1, good, 1, &events[1], CL_INVALID_EVENT_WAIT_LIST},
-        {"a wait count that no list has", fQueue, 1, good, ~0U, &events[0],
+        {"a wait count above the maximum", fQueue, 1, good, ~0U, &events[0],
          CL_INVALID_EVENT_WAIT_LIST},
-        {"an event of elsewhere", fQueue, 1, good, 1, foreign.place(), CL_INVALID_CONTEXT},
+        {"an event of another context", fQueue, 1, good, 1, foreign.address(), CL_INVALID_CONTEXT},
     };
     const auto enqueue = [&](bool isRelease) {
         return isRelease ? fQueue.release(fMemory) : fQueue.acquire(fMemory);
     };
-    // For release the objects are acquired, so that nothing but the fault in the row can count.
+    // The objects are acquired before the rows of release, so that only the row's argument is
+    // invalid.
     for (const bool isRelease : {false, true}) {
-        EXPECT_EQ(enqueue(!isRelease), CL_INVALID_GL_OBJECT) << "it is on that side already";
+        EXPECT_EQ(enqueue(!isRelease), CL_INVALID_GL_OBJECT) << "acquired or released twice";
         const auto call = isRelease ? clEnqueueReleaseGLObjects : clEnqueueAcquireGLObjects;
         for (const Row& row : rows) {
             SCOPED_TRACE(std::string(isRelease ? "release: " : "acquire: ") + row.what);
@@ -68,15 +70,15 @@ TEST_F(MisuseTest, AcquireAndReleaseRefuseBadArgumentsAndAWrongTurn)
                       row.error);
             EXPECT_EQ(event, nullptr);
         }
-        // Still in the state it was in before all those calls.
+        // The state is unchanged.
         EXPECT_EQ(enqueue(isRelease), CL_SUCCESS);
     }
-    EXPECT_EQ(enqueue(true), CL_INVALID_GL_OBJECT) << "it is released";
+    EXPECT_EQ(enqueue(true), CL_INVALID_GL_OBJECT) << "released twice";
     clFinish(fQueue);
 }
 
-// Calls that make an object, each with one fault.
-TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
+// Each row has one invalid argument.
+TEST_F(MisuseTest, CreationWithInvalidArgumentReturnsItsError)
 {
     const Context plain = makeContext({0});
     constexpr GLuint kUnknown = 9999;
@@ -84,7 +86,7 @@ TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
     glGenBuffers(2, names.data());
     const auto [empty, withoutStorage] = names;
     glBindBuffer(GL_ARRAY_BUFFER, withoutStorage);
-    constexpr cl_mem_flags kUse = CL_MEM_READ_WRITE;
+    constexpr cl_mem_flags kAccess = CL_MEM_READ_WRITE;
     const auto buffer = [](cl_context context, cl_mem_flags flags, GLuint name) {
         return [=](cl_int* error) { return clCreateFromGLBuffer(context, flags, name, error); };
     };
@@ -96,33 +98,40 @@ TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
         return [=](cl_int* error) { return create(context, flags, target, level, 1, error); };
     };
     const auto any = clCreateFromGLTexture;
-    const auto flat = clCreateFromGLTexture2D;
-    const auto solid = clCreateFromGLTexture3D;
+    const auto texture2D = clCreateFromGLTexture2D;
+    const auto texture3D = clCreateFromGLTexture3D;
     const std::tuple<const char*, cl_int, std::function<cl_mem(cl_int*)>> rows[] = {
-        {"no context", CL_INVALID_CONTEXT, buffer(nullptr, kUse, fBuffer)},
-        {"a context that does not share", CL_INVALID_CONTEXT, buffer(plain, kUse, fBuffer)},
-        {"flags without use", CL_INVALID_VALUE, buffer(fContext, CL_MEM_ALLOC_HOST_PTR, fBuffer)},
-        {"two uses", CL_INVALID_VALUE,
+        {"no context", CL_INVALID_CONTEXT, buffer(nullptr, kAccess, fBuffer)},
+        {"a context without sharing", CL_INVALID_CONTEXT, buffer(plain, kAccess, fBuffer)},
+        {"flags without access", CL_INVALID_VALUE,
+         buffer(fContext, CL_MEM_ALLOC_HOST_PTR, fBuffer)},
+        {"two kinds of access", CL_INVALID_VALUE,
          buffer(fContext, CL_MEM_READ_ONLY | CL_MEM_WRITE_ONLY, fBuffer)},
-        {"an unknown name", CL_INVALID_GL_OBJECT, buffer(fContext, kUse, kUnknown)},
-        {"a name without a buffer", CL_INVALID_GL_OBJECT, buffer(fContext, kUse, empty)},
-        {"no storage", CL_INVALID_GL_OBJECT, buffer(fContext, kUse, withoutStorage)},
-        {"a renderbuffer", CL_INVALID_GL_OBJECT, renderbuffer(fContext, kUse)},
-        {"its flags", CL_INVALID_VALUE, renderbuffer(fContext, CL_MEM_USE_HOST_PTR)},
-        {"its context", CL_INVALID_CONTEXT, renderbuffer(plain, CL_MEM_USE_HOST_PTR)},
+        {"an unknown name", CL_INVALID_GL_OBJECT, buffer(fContext, kAccess, kUnknown)},
+        {"a name not yet bound", CL_INVALID_GL_OBJECT, buffer(fContext, kAccess, empty)},
+        {"no storage", CL_INVALID_GL_OBJECT, buffer(fContext, kAccess, withoutStorage)},
+        {"a renderbuffer", CL_INVALID_GL_OBJECT, renderbuffer(fContext, kAccess)},
+        {"invalid flags", CL_INVALID_VALUE, renderbuffer(fContext, CL_MEM_USE_HOST_PTR)},
+        {"a context without sharing", CL_INVALID_CONTEXT, renderbuffer(plain, CL_MEM_USE_HOST_PTR)},
         {"a texture", CL_INVALID_GL_OBJECT, texture(any, fContext, 0, GL_TEXTURE_2D_ARRAY, 0)},
-        {"a part of a cube", CL_INVALID_GL_OBJECT,
-         texture(any, fContext, kUse, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z, 0)},
-        {"its context", CL_INVALID_CONTEXT, texture(any, plain, kUse, GL_TEXTURE_CUBE_MAP, -1)},
-        {"its flags", CL_INVALID_VALUE,
+        {"a face of a cube map", CL_INVALID_GL_OBJECT,
+         texture(any, fContext, kAccess, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z, 0)},
+        {"a context without sharing", CL_INVALID_CONTEXT,
+         texture(any, plain, kAccess, GL_TEXTURE_CUBE_MAP, -1)},
+        {"invalid flags", CL_INVALID_VALUE,
          texture(any, fContext, CL_MEM_COPY_HOST_PTR, GL_TEXTURE_2D, 0)},
-        {"a whole cube", CL_INVALID_VALUE, texture(any, fContext, kUse, GL_TEXTURE_CUBE_MAP, 0)},
-        {"no target", CL_INVALID_VALUE, texture(any, fContext, kUse, GL_ARRAY_BUFFER, 0)},
-        {"its level", CL_INVALID_MIP_LEVEL, texture(any, fContext, kUse, GL_TEXTURE_1D, -1)},
-        {"2D", CL_INVALID_GL_OBJECT, texture(flat, fContext, kUse, GL_TEXTURE_RECTANGLE, 0)},
-        {"2D of three", CL_INVALID_VALUE, texture(flat, fContext, kUse, GL_TEXTURE_3D, 0)},
-        {"3D", CL_INVALID_GL_OBJECT, texture(solid, fContext, kUse, GL_TEXTURE_3D, 0)},
-        {"3D of two", CL_INVALID_VALUE, texture(solid, fContext, kUse, GL_TEXTURE_2D, 0)},
+        {"a whole cube map", CL_INVALID_VALUE,
+         texture(any, fContext, kAccess, GL_TEXTURE_CUBE_MAP, 0)},
+        {"not a target", CL_INVALID_VALUE, texture(any, fContext, kAccess, GL_ARRAY_BUFFER, 0)},
+        {"a negative level", CL_INVALID_MIP_LEVEL,
+         texture(any, fContext, kAccess, GL_TEXTURE_1D, -1)},
+        {"2D", CL_INVALID_GL_OBJECT,
+         texture(texture2D, fContext, kAccess, GL_TEXTURE_RECTANGLE, 0)},
+        {"2D of a 3D target", CL_INVALID_VALUE,
+         texture(texture2D, fContext, kAccess, GL_TEXTURE_3D, 0)},
+        {"3D", CL_INVALID_GL_OBJECT, texture(texture3D, fContext, kAccess, GL_TEXTURE_3D, 0)},
+        {"3D of a 2D target", CL_INVALID_VALUE,
+         texture(texture3D, fContext, kAccess, GL_TEXTURE_2D, 0)},
     };
     for (const auto& [what, expected, create] : rows) {
         SCOPED_TRACE(what);
@@ -134,15 +143,15 @@ TEST_F(MisuseTest, CreationReportsTheFaultyArgument)
     EXPECT_EQ(glIsBuffer(kUnknown), GL_FALSE);
 }
 
-TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
+TEST_F(MisuseTest, InvalidContextPropertiesReturnTheirError)
 {
     const cl_context_properties gl = fGlEntries.at(1);
     const cl_context_properties display = fGlEntries.at(3);
     constexpr cl_context_properties kEgl = CL_EGL_DISPLAY_KHR;
-    constexpr cl_context_properties kNonsense = 0x5eed;
+    constexpr cl_context_properties kInvalid = 0x5eed;
     constexpr cl_int kNoShareGroup = CL_INVALID_GL_SHAREGROUP_REFERENCE_KHR;
     const cl_context_properties platform = reinterpret_cast<cl_context_properties>(fPlatform);
-    const std::ptrdiff_t threads = threadsOfProcess();
+    const std::ptrdiff_t threads = threadCount();
     const auto check = [&](const char* what, cl_int expected, Properties others,
                            cl_context_properties context = 0, cl_int ofQuery = CL_SUCCESS) {
         SCOPED_TRACE(what);
@@ -161,22 +170,22 @@ TEST_F(MisuseTest, ContextPropertiesNameWhatIsWrong)
                   ofQuery == CL_SUCCESS ? expected : ofQuery);
     };
     check("no display", kNoShareGroup, {});
-    check("an unknown context", kNoShareGroup, {kEgl, display}, kNonsense);
-    check("an unknown display", kNoShareGroup, {kEgl, kNonsense});
-    check("two systems", CL_INVALID_OPERATION, {kEgl, display, CL_GLX_DISPLAY_KHR, display});
-    check("an absent window system", CL_INVALID_OPERATION, {CL_WGL_HDC_KHR, display});
-    check("an absent kind of share group", CL_INVALID_OPERATION, {CL_CGL_SHAREGROUP_KHR, gl});
+    check("an unknown context", kNoShareGroup, {kEgl, display}, kInvalid);
+    check("an unknown display", kNoShareGroup, {kEgl, kInvalid});
+    check("two displays", CL_INVALID_OPERATION, {kEgl, display, CL_GLX_DISPLAY_KHR, display});
+    check("an unsupported window system", CL_INVALID_OPERATION, {CL_WGL_HDC_KHR, display});
+    check("an unsupported share group", CL_INVALID_OPERATION, {CL_CGL_SHAREGROUP_KHR, gl});
     check("a property twice", CL_INVALID_PROPERTY, {kEgl, display, kEgl, display});
     check("a platform twice", CL_INVALID_PROPERTY, {kEgl, display, CL_CONTEXT_PLATFORM, platform});
     check("neither true nor false", CL_INVALID_PROPERTY,
           {kEgl, display, CL_CONTEXT_INTEROP_USER_SYNC, 2});
-    check("an unknown name", CL_INVALID_PROPERTY, {kEgl, display, kNonsense, 1}, 0,
+    check("an unknown name", CL_INVALID_PROPERTY, {kEgl, display, kInvalid, 1}, 0,
           CL_INVALID_VALUE);
-    // The system lists a thread for a moment after it was joined.
-    EXPECT_TRUE(isSoon([&] { return threadsOfProcess() <= threads; }));
+    // The system may list a thread for a moment after it was joined.
+    EXPECT_TRUE(becomesTrue([&] { return threadCount() <= threads; }));
 }
 
-TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
+TEST_F(MisuseTest, InvalidContextDevicesReturnTheirError)
 {
     const Properties list = properties();
     const std::array<cl_device_id, 2> devices{fDevice, nullptr};
@@ -185,9 +194,9 @@ TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
         {"no devices", 0, nullptr, nullptr, CL_INVALID_VALUE},
         {"a count without a list", 1, nullptr, nullptr, CL_INVALID_VALUE},
         {"a list without a count", 0, devices.data(), nullptr, CL_INVALID_VALUE},
-        {"a count that no list has", ~0U, devices.data(), nullptr, CL_INVALID_VALUE},
+        {"a count above the maximum", ~0U, devices.data(), nullptr, CL_INVALID_VALUE},
         {"a null device", 2, devices.data(), nullptr, CL_INVALID_DEVICE},
-        {"data for no callback", 1, devices.data(), &user, CL_INVALID_VALUE},
+        {"user data without a callback", 1, devices.data(), &user, CL_INVALID_VALUE},
     };
     for (const auto& [what, count, first, data, expected] : rows) {
         SCOPED_TRACE(what);
@@ -197,8 +206,7 @@ TEST_F(MisuseTest, ContextDevicesNameWhatIsWrong)
     }
 }
 
-// The arguments of clGetDeviceIDs count whether or not a device of the type can exist.
-TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
+TEST_F(MisuseTest, DeviceTypeWithoutDevicesStillChecksOtherArguments)
 {
     const Properties list = properties();
     cl_device_id device = nullptr;
@@ -206,18 +214,18 @@ TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
     const cl_int ofNullPlatform = clGetDeviceIDs(nullptr, CL_DEVICE_TYPE_ALL, 1, &device, nullptr);
     const std::tuple<const char*, cl_platform_id, cl_uint, cl_device_id*, cl_uint*, cl_int> rows[] =
         {
-            {"nothing wrong", fPlatform, 1, &device, &count, CL_SUCCESS},
-            {"count alone", fPlatform, 0, nullptr, &count, CL_SUCCESS},
+            {"valid", fPlatform, 1, &device, &count, CL_SUCCESS},
+            {"count only", fPlatform, 0, nullptr, &count, CL_SUCCESS},
             {"null platform", nullptr, 1, &device, nullptr, ofNullPlatform},
             {"no entries", fPlatform, 0, &device, &count, CL_INVALID_VALUE},
-            {"nowhere to answer", fPlatform, 1, nullptr, nullptr, CL_INVALID_VALUE},
+            {"no output", fPlatform, 1, nullptr, nullptr, CL_INVALID_VALUE},
         };
     for (const cl_device_type type :
          {cl_device_type{CL_DEVICE_TYPE_CPU}, cl_device_type{CL_DEVICE_TYPE_GPU}}) {
         const cl_int found = clGetDeviceIDs(fPlatform, type, 1, &device, nullptr);
         cl_int error = CL_SUCCESS;
         EXPECT_EQ(clCreateContextFromType(list.data(), type, nullptr, &count, &error), nullptr);
-        EXPECT_EQ(error, CL_INVALID_VALUE) << "data for no callback";
+        EXPECT_EQ(error, CL_INVALID_VALUE) << "user data without a callback";
         for (const auto& [what, platform, capacity, devices, number, expected] : rows) {
             SCOPED_TRACE(what);
             EXPECT_EQ(clGetDeviceIDs(platform, type, capacity, devices, number),
@@ -227,7 +235,7 @@ TEST_F(MisuseTest, DeviceTypesWithoutDevicesKeepTheOtherErrors)
     EXPECT_LE(count, 1U);
 }
 
-TEST_F(MisuseTest, FunctionsRefuseObjectsThatAreNotTheirs)
+TEST_F(MisuseTest, QueriesOfOtherObjectsReturnTheirError)
 {
     const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE, 64, nullptr, nullptr);
     Event acquired;
@@ -255,21 +263,21 @@ TEST_F(MisuseTest, FunctionsRefuseObjectsThatAreNotTheirs)
         {"event: null", info(clGetEventInfo, cl_event(), CL_EVENT_COMMAND_TYPE), CL_INVALID_EVENT},
         {"event: release", clReleaseEvent(nullptr), CL_INVALID_EVENT},
         {"event: set", clSetUserEventStatus(nullptr, CL_COMPLETE), CL_INVALID_EVENT},
-        {"event: set a command's", clSetUserEventStatus(acquired, CL_COMPLETE), CL_INVALID_EVENT},
+        {"event: set of a command", clSetUserEventStatus(acquired, CL_COMPLETE), CL_INVALID_EVENT},
         {"device: null", info(clGetDeviceInfo, cl_device_id(), CL_DEVICE_TYPE), CL_INVALID_DEVICE},
     };
     for (const auto& [what, error, expected] : rows)
         EXPECT_EQ(error, expected) << what;
 }
 
-// Gone for OpenGL, or too small by now; OpenCL's object is still an object.
-TEST_F(MisuseTest, BuffersThatOpenGlTookAwayAreRefusedAndHarmless)
+// The memory objects stay usable without sharing.
+TEST_F(MisuseTest, AcquireOfDeletedOrShrunkBufferReturnsInvalidGlObject)
 {
     // Large enough to be unmapped when it is freed.
     constexpr std::size_t kLarge = 100000;
     const GLuint shrunk = makeGlBuffer(numbersFrom(1, kLarge));
     const Memory small = share(shrunk);
-    refill(shrunk, numbersFrom(1, 4));
+    reallocate(shrunk, numbersFrom(1, 4));
     EXPECT_EQ(fQueue.acquire(small), CL_INVALID_GL_OBJECT);
     EXPECT_EQ(fQueue.release(small), CL_INVALID_GL_OBJECT);
 

@@ -1,4 +1,4 @@
-// Part of a layer below glshare: a runtime of OpenCL 1.2 that insists on a platform.
+// A test layer below glshare: a runtime of OpenCL 1.2 that rejects a null platform.
 #include "PassThroughLayer.h"
 
 namespace {

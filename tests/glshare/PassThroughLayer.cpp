@@ -1,4 +1,4 @@
-// A layer for tests, which changes nothing by itself.
+// A test layer that passes all calls on; changeTable may change that.
 #include "PassThroughLayer.h"
 
 #include <cstddef>

@@ -1,4 +1,4 @@
-// What the application is told about devices, contexts, objects and commands.
+// Information queries of devices, contexts, memory objects and events.
 #include "SharingTest.h"
 
 #include <array>
@@ -9,12 +9,12 @@ namespace {
 
 using QueriesTest = SharingTest;
 
-bool isWordOf(const std::string& list, const std::string& word)
+bool hasExtension(const std::string& list, const std::string& name)
 {
-    return (" " + list + " ").find(" " + word + " ") != std::string::npos;
+    return (" " + list + " ").find(" " + name + " ") != std::string::npos;
 }
 
-TEST_F(QueriesTest, ExtensionsAreAddedToDeviceAndPlatform)
+TEST_F(QueriesTest, DeviceAndPlatformExtensionsListSharing)
 {
     std::size_t size = 0;
     clGetDeviceInfo(fDevice, CL_DEVICE_EXTENSIONS, 0, nullptr, &size);
@@ -23,13 +23,14 @@ TEST_F(QueriesTest, ExtensionsAreAddedToDeviceAndPlatform)
     EXPECT_EQ(text.find('\0'), size - 1);
     text.pop_back();
     for (const std::string& extensions : {text, extensionsOf(fPlatform)}) {
-        EXPECT_TRUE(isWordOf(extensions, "cl_khr_gl_sharing"));
-        EXPECT_EQ(isWordOf(extensions, "cl_khr_gl_event"), offersGlEvent());
+        EXPECT_TRUE(hasExtension(extensions, "cl_khr_gl_sharing"));
+        EXPECT_EQ(hasExtension(extensions, "cl_khr_gl_event"), offersGlEvent());
     }
-    EXPECT_TRUE(isWordOf(text, "cl_khr_byte_addressable_store")) << "the device's own are lost";
+    EXPECT_TRUE(hasExtension(text, "cl_khr_byte_addressable_store"))
+        << "the device's own extensions are missing";
 }
 
-TEST_F(QueriesTest, EveryFunctionIsFoundByName)
+TEST_F(QueriesTest, ExtensionFunctionsAreFoundByName)
 {
     for (const char* name :
          {"clCreateFromGLBuffer", "clCreateFromGLTexture", "clCreateFromGLTexture2D",
@@ -45,17 +46,17 @@ TEST_F(QueriesTest, EveryFunctionIsFoundByName)
     EXPECT_EQ(clGetExtensionFunctionAddressForPlatform(fPlatform, "clNoSuchFunction"), nullptr);
 }
 
-TEST_F(QueriesTest, CpuDevicesAreGpusUnlessSwitchedOff)
+TEST_F(QueriesTest, CpuDevicesReportGpuTypeUnlessDisabled)
 {
-    const bool isDisguised = isOn("GLSHARE_CPU_AS_GPU");
-    const cl_device_type shown = isDisguised ? CL_DEVICE_TYPE_GPU : CL_DEVICE_TYPE_CPU;
-    const cl_device_type other = isDisguised ? CL_DEVICE_TYPE_CPU : CL_DEVICE_TYPE_GPU;
+    const bool isReportedAsGpu = isOn("GLSHARE_CPU_AS_GPU");
+    const cl_device_type reported = isReportedAsGpu ? CL_DEVICE_TYPE_GPU : CL_DEVICE_TYPE_CPU;
+    const cl_device_type other = isReportedAsGpu ? CL_DEVICE_TYPE_CPU : CL_DEVICE_TYPE_GPU;
     const auto type = infoOf<cl_device_type>(clGetDeviceInfo, fDevice, CL_DEVICE_TYPE);
-    EXPECT_EQ(isDisguised ? type : type & shown, shown);
+    EXPECT_EQ(isReportedAsGpu ? type : type & reported, reported);
 
     cl_uint count = 0;
     cl_device_id found = nullptr;
-    EXPECT_EQ(clGetDeviceIDs(fPlatform, shown, 1, &found, &count), CL_SUCCESS);
+    EXPECT_EQ(clGetDeviceIDs(fPlatform, reported, 1, &found, &count), CL_SUCCESS);
     EXPECT_EQ(found, fDevice);
     EXPECT_EQ(count, 1U);
     EXPECT_EQ(clGetDeviceIDs(fPlatform, other, 1, &found, &count), CL_DEVICE_NOT_FOUND);
@@ -63,30 +64,17 @@ TEST_F(QueriesTest, CpuDevicesAreGpusUnlessSwitchedOff)
 
     cl_int error = CL_INVALID_VALUE;
     const Context context =
-        clCreateContextFromType(properties().data(), shown, nullptr, nullptr, &error);
+        clCreateContextFromType(properties().data(), reported, nullptr, nullptr, &error);
     ASSERT_EQ(error, CL_SUCCESS);
     share(context, fBuffer);
-    if (isDisguised) {
+    if (isReportedAsGpu) {
         EXPECT_EQ(clCreateContextFromType(properties().data(), other, nullptr, nullptr, &error),
                   nullptr);
         EXPECT_EQ(error, CL_DEVICE_NOT_FOUND);
     }
 }
 
-TEST_F(QueriesTest, GlContextInfoNamesTheDevices)
-{
-    const Properties list = properties();
-    cl_device_id device = nullptr;
-    for (const cl_gl_context_info name :
-         {cl_uint{CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR}, cl_uint{CL_DEVICES_FOR_GL_CONTEXT_KHR}}) {
-        EXPECT_EQ(infoOf<cl_device_id>(clGetGLContextInfoKHR, list.data(), name), fDevice);
-    }
-    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, sizeof(cl_device_id), &device,
-                                    nullptr),
-              CL_INVALID_VALUE);
-}
-
-TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
+TEST_F(QueriesTest, ContextAndBufferInfoReturnsTheValuesOfTheApplication)
 {
     const Properties list = properties();
     Properties seen(list.size());
@@ -94,6 +82,12 @@ TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
                                seen.size() * sizeof(cl_context_properties), seen.data(), nullptr),
               CL_SUCCESS);
     EXPECT_EQ(seen, list);
+
+    for (const cl_gl_context_info name :
+         {cl_uint{CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR}, cl_uint{CL_DEVICES_FOR_GL_CONTEXT_KHR}})
+        EXPECT_EQ(infoOf<cl_device_id>(clGetGLContextInfoKHR, list.data(), name), fDevice);
+    EXPECT_EQ(clGetGLContextInfoKHR(list.data(), CL_GL_CONTEXT_KHR, 0, nullptr, nullptr),
+              CL_INVALID_VALUE);
 
     const Memory memory = share(fContext, fBuffer, CL_MEM_READ_ONLY);
     cl_gl_object_type type = 0;
@@ -108,8 +102,8 @@ TEST_F(QueriesTest, ContextsAndObjectsShowWhatTheApplicationGave)
               fCount * sizeof(cl_int));
 }
 
-// A part of a shared buffer hides where the buffer has its memory, a part of another shows it.
-TEST_F(QueriesTest, PartsShowTheHostPointerOfOtherBuffersOnly)
+// The host pointer of a shared buffer is the layer's.
+TEST_F(QueriesTest, SubBufferInfoHidesTheHostPointerOfSharedBuffersOnly)
 {
     alignas(128) std::array<char, 4096> storage{};
     const Memory plain = clCreateBuffer(fContext, CL_MEM_READ_WRITE | CL_MEM_USE_HOST_PTR,
@@ -126,8 +120,8 @@ TEST_F(QueriesTest, PartsShowTheHostPointerOfOtherBuffersOnly)
     }
 }
 
-// Each query that is answered here gives its size, and refuses a place that is smaller.
-TEST_F(QueriesTest, SizesAreAnsweredAndChecked)
+// The queries that the layer implements.
+TEST_F(QueriesTest, InfoQueriesReturnTheirSizeAndRejectLess)
 {
     Event event;
     ASSERT_EQ(fQueue.acquire(fMemory, {}, &event), CL_SUCCESS);
@@ -151,18 +145,18 @@ TEST_F(QueriesTest, SizesAreAnsweredAndChecked)
         {query(clGetMemObjectInfo, cl_mem(fMemory), CL_MEM_HOST_PTR), sizeof(void*)},
         {query(clGetEventInfo, cl_event(event), CL_EVENT_COMMAND_TYPE), sizeof(cl_command_type)},
     };
-    for (const auto& [ask, expected] : rows) {
+    for (const auto& [getInfo, expected] : rows) {
         std::array<char, 16384> value{};
         std::size_t size = 0;
-        EXPECT_EQ(ask(0, nullptr, &size), CL_SUCCESS);
+        EXPECT_EQ(getInfo(0, nullptr, &size), CL_SUCCESS);
         EXPECT_EQ(size, expected);
-        EXPECT_EQ(ask(size - 1, value.data(), nullptr), CL_INVALID_VALUE);
-        EXPECT_EQ(ask(size, value.data(), nullptr), CL_SUCCESS);
+        EXPECT_EQ(getInfo(size - 1, value.data(), nullptr), CL_INVALID_VALUE);
+        EXPECT_EQ(getInfo(size, value.data(), nullptr), CL_SUCCESS);
     }
     EXPECT_EQ(fQueue.release(fMemory), CL_SUCCESS);
 }
 
-TEST_F(QueriesTest, EventsNameTheirCommand)
+TEST_F(QueriesTest, EventInfoReturnsTheSharingCommandType)
 {
     Event acquired;
     Event released;

@@ -22,15 +22,15 @@ cl_int statusOf(const Event& event)
     return infoOf<cl_int>(clGetEventInfo, event, CL_EVENT_COMMAND_EXECUTION_STATUS);
 }
 
-std::ptrdiff_t threadsOfProcess()
+std::ptrdiff_t threadCount()
 {
     return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {});
 }
 
-bool isSoon(const std::function<bool()>& isSo)
+bool becomesTrue(const std::function<bool()>& condition)
 {
     for (int i = 0; i < 10000; ++i) {
-        if (isSo())
+        if (condition())
             return true;
         std::this_thread::sleep_for(std::chrono::microseconds(500));
     }
@@ -42,17 +42,29 @@ void onOtherThread(const std::function<void()>& work)
     std::thread(work).join();
 }
 
+void bindEmptyFramebuffer(GLsizei side)
+{
+    GLuint frame = 0;
+    GLuint vertices = 0;
+    glGenFramebuffers(1, &frame);
+    glBindFramebuffer(GL_FRAMEBUFFER, frame);
+    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, side);
+    glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, side);
+    glGenVertexArrays(1, &vertices);
+    glBindVertexArray(vertices);
+}
+
 namespace {
 
-// OpenCL wants no pointer to what is empty or not wanted.
+// OpenCL requires null pointers for empty lists.
 const cl_event* eventsOf(const WaitList& waitList)
 {
     return waitList.empty() ? nullptr : waitList.data();
 }
 
-cl_event* placeOf(Event* event)
+cl_event* addressOf(Event* event)
 {
-    return event == nullptr ? nullptr : event->place();
+    return event == nullptr ? nullptr : event->address();
 }
 
 } // namespace
@@ -67,7 +79,7 @@ cl_int Queue::share(decltype(&clEnqueueAcquireGLObjects) call, cl_mem memory,
                     const WaitList& waitList, Event* event) const
 {
     return call(fQueue, 1, &memory, static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
-                placeOf(event));
+                addressOf(event));
 }
 
 void Queue::fill(cl_mem memory, cl_int value, const WaitList& waitList, Event* event) const
@@ -75,7 +87,7 @@ void Queue::fill(cl_mem memory, cl_int value, const WaitList& waitList, Event* e
     const auto size = infoOf<std::size_t>(clGetMemObjectInfo, memory, CL_MEM_SIZE);
     EXPECT_EQ(clEnqueueFillBuffer(fQueue, memory, &value, sizeof value, 0, size,
                                   static_cast<cl_uint>(waitList.size()), eventsOf(waitList),
-                                  placeOf(event)),
+                                  addressOf(event)),
               CL_SUCCESS);
 }
 
@@ -175,7 +187,7 @@ GLuint SharingTest::makeGlBuffer(const Numbers& numbers)
 {
     GLuint buffer = 0;
     glGenBuffers(1, &buffer);
-    refill(buffer, numbers);
+    reallocate(buffer, numbers);
     return buffer;
 }
 
@@ -188,14 +200,14 @@ Memory SharingTest::share(cl_context context, GLuint buffer, cl_mem_flags flags)
     return memory;
 }
 
-void SharingTest::refill(GLuint buffer, const Numbers& numbers)
+void SharingTest::reallocate(GLuint buffer, const Numbers& numbers)
 {
     glBindBuffer(GL_ARRAY_BUFFER, buffer);
     glBufferData(GL_ARRAY_BUFFER, static_cast<GLsizeiptr>(numbers.size() * sizeof(cl_int)),
                  numbers.data(), GL_DYNAMIC_DRAW);
 }
 
-void SharingTest::redraw(GLuint buffer, const Numbers& numbers)
+void SharingTest::overwrite(GLuint buffer, const Numbers& numbers)
 {
     glBindBuffer(GL_ARRAY_BUFFER, buffer);
     glBufferSubData(GL_ARRAY_BUFFER, 0, static_cast<GLsizeiptr>(numbers.size() * sizeof(cl_int)),

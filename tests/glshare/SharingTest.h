@@ -1,6 +1,6 @@
-// What the tests of the layer share: an OpenGL context, current on the test's thread, an OpenCL
-// context and an in-order queue that share with it, and a buffer of both. The tests run under each
-// setting of the layer's switches and ask here which one it is.
+// The fixture of the layer's tests: an OpenGL context, current on the test's thread, an OpenCL
+// context and an in-order queue that share with it, and a shared buffer. The tests run with several
+// settings of the layer's environment variables, which the fixture reports.
 #pragma once
 
 #define GL_GLEXT_PROTOTYPES 1
@@ -24,18 +24,18 @@ using Numbers = std::vector<cl_int>;
 using Properties = std::vector<cl_context_properties>;
 using WaitList = std::vector<cl_event>;
 
-// `count` numbers from `first` on.
-Numbers numbersFrom(cl_int first, std::size_t count);
+// Returns `count` consecutive numbers, starting at `first`.
+[[nodiscard]] Numbers numbersFrom(cl_int first, std::size_t count);
 
-// Owns a reference to an OpenCL object, and stands for it in calls.
-template <typename Handle, cl_int (*giveBack)(Handle)>
+// Owns a reference to an OpenCL object, and converts to its handle.
+template <typename Handle, cl_int (*release)(Handle)>
 class Owned {
 public:
     Owned(Handle handle = nullptr) : fHandle(handle) {}
     ~Owned()
     {
         if (fHandle != nullptr)
-            giveBack(fHandle);
+            release(fHandle);
     }
     Owned(Owned&& other) noexcept : fHandle(std::exchange(other.fHandle, nullptr)) {}
     Owned& operator=(Owned other) noexcept
@@ -45,8 +45,8 @@ public:
     }
     operator Handle() const { return fHandle; }
 
-    // Where calls read the handle, or put a new one if there is none yet.
-    Handle* place() { return &fHandle; }
+    // For calls that read a list of one handle, or store a new handle in an empty object.
+    Handle* address() { return &fHandle; }
 
 private:
     Handle fHandle;
@@ -56,7 +56,7 @@ using Context = Owned<cl_context, clReleaseContext>;
 using Event = Owned<cl_event, clReleaseEvent>;
 using Memory = Owned<cl_mem, clReleaseMemObject>;
 
-// An OpenCL queue with the calls that the tests make. `event` gets the command's.
+// An OpenCL queue. `event`, if not null, gets the command's event.
 class Queue {
 public:
     Queue() = default;
@@ -72,15 +72,15 @@ public:
         return share(clEnqueueReleaseGLObjects, memory, waitList, event);
     }
 
-    // Writes `value` everywhere, without waiting.
+    // Fills the whole memory object with `value`, without waiting.
     void fill(cl_mem memory, cl_int value, const WaitList& waitList = {},
               Event* event = nullptr) const;
 
-    // Both wait.
+    // Blocking.
     [[nodiscard]] Numbers read(cl_mem memory, std::size_t count) const;
     void write(cl_mem memory, const Numbers& numbers) const;
 
-    // Acquires, checks what OpenCL sees, writes something else, releases and waits.
+    // Acquires, expects the contents `before`, writes `after`, releases and waits.
     void rewrite(cl_mem memory, const Numbers& before, const Numbers& after) const;
 
 private:
@@ -90,7 +90,7 @@ private:
     Owned<cl_command_queue, clReleaseCommandQueue> fQueue;
 };
 
-// One fact about an OpenCL object, asked with `get`.
+// Returns one value of the information query `get`.
 template <typename Value, typename Get, typename Handle>
 Value infoOf(Get get, const Handle& handle, cl_uint name)
 {
@@ -99,48 +99,52 @@ Value infoOf(Get get, const Handle& handle, cl_uint name)
     return value;
 }
 
-cl_int statusOf(const Event& event);
+[[nodiscard]] cl_int statusOf(const Event& event);
 
-std::ptrdiff_t threadsOfProcess();
+[[nodiscard]] std::ptrdiff_t threadCount();
 
-// Whether `isSo` holds within some seconds, which is the time that other threads may take.
-bool isSoon(const std::function<bool()>& isSo);
+// Waits some seconds for other threads to make `condition` true; returns whether it became true.
+[[nodiscard]] bool becomesTrue(const std::function<bool()>& condition);
 
-// Runs on a thread of its own, which has no OpenGL context, and waits for it.
+// Runs `work` on a new thread, which has no current OpenGL context, and waits for it.
 void onOtherThread(const std::function<void()>& work);
+
+// Binds a new framebuffer of side x side pixels without attachments, and a new vertex array.
+void bindEmptyFramebuffer(GLsizei side);
 
 class SharingTest : public testing::Test {
 protected:
-    // The buffer has `count` numbers from 1 on.
+    // The buffer has the numbers from 1 to `count`.
     explicit SharingTest(std::size_t count = 5000) : fCount(count) {}
 
     void SetUp() override;
 
-    // Makes an OpenGL context current and fills in `fGlEntries`.
+    // Makes an OpenGL context current and sets `fGlEntries`.
     virtual void openGl();
 
-    // Whether a switch of the layer is on, which is so unless it is 0.
+    // Returns whether an environment variable of the layer is not 0.
     static bool isOn(const char* variable);
     static bool offersGlEvent() { return isOn("GLSHARE_GL_EVENT"); }
     static bool isZeroCopy();
 
     static std::string extensionsOf(cl_platform_id platform);
 
-    // Properties of contexts on the platform, which share if nothing else is said.
+    // Return a property list for the platform with `entries`, by default those of the OpenGL
+    // context.
     [[nodiscard]] Properties properties(const Properties& entries) const;
     [[nodiscard]] Properties properties() const { return properties(fGlEntries); }
     [[nodiscard]] Context makeContext(const Properties& list) const;
     [[nodiscard]] Context makeContext() const { return makeContext(properties()); }
     [[nodiscard]] Event makeUserEvent() const { return clCreateUserEvent(fContext, nullptr); }
 
-    // A GL buffer with these numbers, bound, and an OpenCL object over one.
+    // Create a bound OpenGL buffer with these numbers, and a memory object from a buffer.
     static GLuint makeGlBuffer(const Numbers& numbers);
     static Memory share(cl_context context, GLuint buffer, cl_mem_flags flags = CL_MEM_READ_WRITE);
     Memory share(GLuint buffer) const { return share(fContext, buffer); }
 
-    // Binds the buffer and gives it new storage, or new contents.
-    static void refill(GLuint buffer, const Numbers& numbers);
-    static void redraw(GLuint buffer, const Numbers& numbers);
+    // Bind the buffer, and replace its storage or its contents.
+    static void reallocate(GLuint buffer, const Numbers& numbers);
+    static void overwrite(GLuint buffer, const Numbers& numbers);
     static Numbers readGl(GLuint buffer, std::size_t count);
 
     [[nodiscard]] Numbers from(cl_int first) const { return numbersFrom(first, fCount); }

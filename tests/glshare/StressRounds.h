@@ -1,12 +1,13 @@
-// How often the tests that attack the layer repeat what they do.
+// The number of rounds of stress tests.
 #pragma once
 
 #include <algorithm>
 #include <cstdlib>
 
-// The environment variable GLSHARE_STRESS_ROUNDS, at least 1; `usual` if it is not set.
-inline int stressRounds(int usual)
+// Returns the environment variable GLSHARE_STRESS_ROUNDS, at least 1; `defaultRounds` if it is not
+// set.
+inline int stressRounds(int defaultRounds)
 {
     const char* value = std::getenv("GLSHARE_STRESS_ROUNDS");
-    return value == nullptr ? usual : std::max(1, std::atoi(value));
+    return value == nullptr ? defaultRounds : std::max(1, std::atoi(value));
 }

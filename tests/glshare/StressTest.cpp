@@ -1,6 +1,6 @@
-// A buffer that several threads and contexts use at the same time. The faults that these tests find
-// are a crash, a hang, an OpenGL error that the program has not caused, and a wrong number. The
-// environment variable GLSHARE_STRESS_ROUNDS sets how often each test repeats what it does.
+// A buffer that several threads and contexts use at the same time. The test finds crashes, hangs,
+// OpenGL errors that the program has not caused, and wrong contents. The environment variable
+// GLSHARE_STRESS_ROUNDS sets the number of rounds.
 #include "SharingTest.h"
 #include "StressRounds.h"
 
@@ -24,20 +24,13 @@ protected:
             prepareDrawing();
     }
 
-    // Draws the first vertex attribute, which comes from the buffer, without pixels.
+    // Prepares to draw points from the buffer, without rasterisation.
     void prepareDrawing() const
     {
         const char* text = "#version 450\nlayout(location = 0) in int number;"
                            "void main() { gl_Position = vec4(number, 0, 0, 1); }";
         glUseProgram(glCreateShaderProgramv(GL_VERTEX_SHADER, 1, &text));
-        GLuint frame = 0;
-        glGenFramebuffers(1, &frame);
-        glBindFramebuffer(GL_FRAMEBUFFER, frame);
-        glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_WIDTH, 1);
-        glFramebufferParameteri(GL_FRAMEBUFFER, GL_FRAMEBUFFER_DEFAULT_HEIGHT, 1);
-        GLuint vertices = 0;
-        glGenVertexArrays(1, &vertices);
-        glBindVertexArray(vertices);
+        bindEmptyFramebuffer(1);
         glBindBuffer(GL_ARRAY_BUFFER, fBuffer);
         glVertexAttribIPointer(0, 1, GL_INT, 0, nullptr);
         glEnableVertexAttribArray(0);
@@ -45,23 +38,23 @@ protected:
         ASSERT_EQ(glGetError(), GLenum{GL_NO_ERROR});
     }
 
-    // Creates and releases objects of the buffer, and uses every tenth.
+    // Creates and releases memory objects from the buffer, and uses every tenth.
     void createObjects(cl_context context)
     {
         const Queue queue(context, fDevice);
         for (int i = 0; i < 100; ++i) {
-            std::shared_lock promised(fTurn, std::defer_lock);
+            std::shared_lock noGlUse(fTurn, std::defer_lock);
             if (isZeroCopy())
-                promised.lock(); // that OpenGL leaves the buffer alone meanwhile
+                noGlUse.lock(); // required by zero copy: no OpenGL use of the buffer
             const Memory memory = share(context, fBuffer);
-            if (promised)
-                promised.unlock();
+            if (noGlUse)
+                noGlUse.unlock();
             if (i % 10 == 0)
                 useObject(queue, memory);
         }
     }
 
-    // From the acquire to the release nobody else uses the buffer.
+    // No other thread uses the buffer from the acquire to the release.
     void useObject(const Queue& queue, cl_mem memory)
     {
         const std::scoped_lock turn(fTurn);
@@ -72,7 +65,7 @@ protected:
         clFinish(queue);
     }
 
-    // Maps, writes and draws the buffer. Objects may be created from it meanwhile.
+    // Maps, writes and draws the buffer, while other threads may create memory objects from it.
     void useGl()
     {
         const std::scoped_lock turn(fTurn);
@@ -83,13 +76,13 @@ protected:
         std::ranges::copy(from(++fFirst), numbers);
         ASSERT_EQ(glUnmapBuffer(GL_ARRAY_BUFFER), GL_TRUE);
         glDrawArrays(GL_POINTS, 0, static_cast<GLsizei>(fCount));
-        redraw(fBuffer, from(++fFirst));
+        overwrite(fBuffer, from(++fFirst));
         glFinish();
         ASSERT_EQ(glGetError(), GLenum{GL_NO_ERROR});
     }
 
-    // Runs createObjects on as many threads, each with an OpenCL context of its own, while useGl
-    // repeats on this thread. With `haveGl` each thread has a current OpenGL context, too.
+    // Runs createObjects on `threads` threads, each with its own OpenCL context, and useGl on this
+    // one. If `haveGl`, each thread has a current OpenGL context.
     void onThreads(std::size_t threads, bool haveGl)
     {
         std::atomic<std::size_t> running = threads;
@@ -112,7 +105,7 @@ protected:
     cl_int fFirst = 1;       // its first number
 };
 
-TEST_F(StressTest, ContextsCreateObjectsOfABufferThatOpenGlMapsAndDraws)
+TEST_F(StressTest, ObjectsCreatedWhileOpenGlUsesTheBufferStayCorrect)
 {
     for (int round = 0; round < stressRounds(1) && !HasFailure(); ++round) {
         for (const std::size_t threads : {1U, 2U, 4U}) {
