@@ -8,7 +8,7 @@
 #include "viewer/model/CharacterSpace.h"
 #include "viewer/model/DetailLevel.h"
 #include "viewer/model/Pose.h"
-#include "viewer/model/import/ModelImport.h"
+#include "viewer/model/import/SceneConversion.h"
 #include "viewer/model/import/SceneRepair.h"
 
 #include <algorithm>

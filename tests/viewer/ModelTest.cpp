@@ -256,17 +256,6 @@ TEST(ImportProcess, ChildThatFailsGivesOneSentence)
     EXPECT_THAT(model.failure().text, testing::HasSubstr("the process for it does not start"));
 }
 
-TEST(ModelImport, WeightsAreScaledToAddUpToOne)
-{
-    const std::pair<BoneWeights, BoneWeights> rows[] = {
-        {{0.5f, 0.5f, 0, 0}, {0.5f, 0.5f, 0, 0}},
-        {{1, 1, 1, 1}, {0.25f, 0.25f, 0.25f, 0.25f}},
-        {{0.1f, 0, 0, 0}, {1, 0, 0, 0}},
-        {{0, 0, 0, 0}, {0, 0, 0, 0}}};
-    for (const auto& [weights, expected] : rows)
-        EXPECT_EQ(normalised(weights), expected);
-}
-
 // All points are in the picture and centred, and one of its sides is nearly filled.
 void expectFramed(const Camera& camera, const std::vector<QVector3D>& points)
 {

@@ -1,5 +1,5 @@
 // What the conversion of Assimp's scenes makes of numbers that a valid file may hold.
-#include "viewer/model/import/ModelImport.h"
+#include "viewer/model/import/SceneConversion.h"
 
 #include "viewer/model/Pose.h"
 

@@ -10,14 +10,15 @@
 namespace viewer {
 namespace {
 
-// The mean cosine between a normal and the direction from the middle, from which on a mesh counts
-// as inside out. Of a flat mesh it is 0, but for rounding.
-constexpr float kClearlyInside = -0.1f;
+// A mesh is inside out if the mean cosine between a normal and the direction from the centre is
+// below this. In a flat mesh the mean is 0, except for rounding.
+constexpr float kInsideOutCosine = -0.1f;
 
 using Indices = std::vector<std::uint32_t>;
 
-// In double precision, since the squares of small coordinates vanish in single precision.
-QVector3D scaledToOne(const QVector3D& vector)
+// Returns zero if the vector is zero or not finite. Computes in double precision, because squares
+// of small coordinates underflow in single precision.
+QVector3D normalisedOrZero(const QVector3D& vector)
 {
     const double x = vector.x();
     const double y = vector.y();
@@ -31,22 +32,22 @@ QVector3D scaledToOne(const QVector3D& vector)
 
 QVector3D usableNormal(const QVector3D& sum)
 {
-    const QVector3D normal = scaledToOne(sum);
+    const QVector3D normal = normalisedOrZero(sum);
     return normal.isNull() ? QVector3D(0, 1, 0) : normal;
 }
 
-// The angle between two edges, radians. 0 if one of them has no length.
+// Returns the angle between two edges in radians, 0 if one of them has no length.
 float angleBetween(const QVector3D& a, const QVector3D& b)
 {
-    const float cosine = QVector3D::dotProduct(scaledToOne(a), scaledToOne(b));
+    const float cosine = QVector3D::dotProduct(normalisedOrZero(a), normalisedOrZero(b));
     return a.isNull() || b.isNull() ? 0 : std::acos(std::clamp(cosine, -1.0f, 1.0f));
 }
 
-// The corners of triangles around each position. Corner i is that of the vertex triangles[i], in
-// the triangle i / 3.
-class Surroundings {
+// Triangle corners at each position. Corner i belongs to the vertex triangles[i] and to the
+// triangle i / 3.
+class CornerAdjacency {
 public:
-    explicit Surroundings(const Mesh& mesh) : fMesh(mesh)
+    explicit CornerAdjacency(const Mesh& mesh) : fMesh(mesh)
     {
         numberPositions();
         listCorners();
@@ -54,7 +55,7 @@ public:
             const QVector3D& a = mesh.positions[mesh.triangles[i]];
             const QVector3D& b = mesh.positions[mesh.triangles[i + 1]];
             const QVector3D& c = mesh.positions[mesh.triangles[i + 2]];
-            fNormals.push_back(scaledToOne(QVector3D::crossProduct(b - a, c - a)));
+            fNormals.push_back(normalisedOrZero(QVector3D::crossProduct(b - a, c - a)));
             fAngles.push_back(angleBetween(b - a, c - a));
             fAngles.push_back(angleBetween(c - b, a - b));
             fAngles.push_back(angleBetween(a - c, b - c));
@@ -80,7 +81,7 @@ public:
     }
 
 private:
-    // Gives vertices at the same position the same number.
+    // Assigns the same number to vertices at the same position.
     void numberPositions()
     {
         const auto key = [this](std::uint32_t vertex) {
@@ -126,12 +127,12 @@ private:
     }
 
     const Mesh& fMesh;
-    Indices fNumbers; // of the position of each vertex
+    Indices fNumbers; // position number of each vertex
     std::uint32_t fPositionCount = 0;
     Indices fFirst;
     Indices fCorners;
-    std::vector<QVector3D> fNormals; // of each triangle; zero if it has no area
-    std::vector<float> fAngles;      // at each corner, radians
+    std::vector<QVector3D> fNormals; // of each triangle; zero without area
+    std::vector<float> fAngles;      // at each corner, in radians
 };
 
 template <typename T>
@@ -146,11 +147,11 @@ void select(std::vector<T>& values, const Indices& vertices)
     values = std::move(selected);
 }
 
-// One vertex for each vertex and normal that a corner has.
+// Replaces each vertex by one vertex for each different normal of its corners.
 void splitVertices(Mesh& mesh, const std::vector<QVector3D>& cornerNormals)
 {
-    Indices origins;                                 // of the new vertices
-    std::vector<Indices> copies(mesh.vertexCount()); // of each vertex, as new vertices
+    Indices origins;                                 // old index of each new vertex
+    std::vector<Indices> copies(mesh.vertexCount()); // new indices of each old vertex
     mesh.normals.clear();
     for (std::size_t corner = 0; corner < mesh.triangles.size(); ++corner) {
         std::uint32_t& vertex = mesh.triangles[corner];
@@ -172,21 +173,21 @@ void splitVertices(Mesh& mesh, const std::vector<QVector3D>& cornerNormals)
     select(mesh.boneWeights, origins);
     for (MorphTarget& target : mesh.morphTargets) {
         select(target.positionDeltas, origins);
-        target.normalDeltas.clear(); // to normals that were of no use
+        target.normalDeltas.clear(); // relative to the unusable normals
     }
 }
 
 void createNormals(Mesh& mesh, double creaseAngle)
 {
-    // Rounding must not part triangles that meet at the angle itself.
+    // Prevents rounding from separating triangles that meet exactly at the crease angle.
     constexpr double kTolerance = 1e-4;
     const auto leastCosine =
         static_cast<float>(std::cos(qDegreesToRadians(creaseAngle)) - kTolerance);
-    const Surroundings surroundings(mesh);
+    const CornerAdjacency adjacency(mesh);
     std::vector<QVector3D> cornerNormals;
     cornerNormals.reserve(mesh.triangles.size());
     for (std::size_t i = 0; i < mesh.triangles.size(); ++i)
-        cornerNormals.push_back(surroundings.normalOfCorner(i, leastCosine));
+        cornerNormals.push_back(adjacency.normalOfCorner(i, leastCosine));
     splitVertices(mesh, cornerNormals);
 }
 
@@ -196,28 +197,28 @@ void completeNormals(Mesh& mesh, double creaseAngle)
 {
     std::vector<QVector3D>& normals = mesh.normals;
     const auto isNull = [](const QVector3D& normal) { return normal.isNull(); };
-    std::transform(normals.begin(), normals.end(), normals.begin(), scaledToOne);
+    std::transform(normals.begin(), normals.end(), normals.begin(), normalisedOrZero);
     if (std::all_of(normals.begin(), normals.end(), isNull)) {
         createNormals(mesh, creaseAngle);
     } else if (std::any_of(normals.begin(), normals.end(), isNull)) {
-        const Surroundings surroundings(mesh);
+        const CornerAdjacency adjacency(mesh);
         for (std::size_t i = 0; i < mesh.vertexCount(); ++i) {
             if (normals[i].isNull())
-                normals[i] = surroundings.normalOfVertex(i);
+                normals[i] = adjacency.normalOfVertex(i);
         }
     }
 }
 
-void turnNormalsOutside(Mesh& mesh)
+void orientNormalsOutwards(Mesh& mesh)
 {
-    QVector3D middle;
+    QVector3D centre;
     for (const QVector3D& position : mesh.positions)
-        middle += position / static_cast<float>(mesh.vertexCount());
-    float outside = 0;
+        centre += position / static_cast<float>(mesh.vertexCount());
+    float cosines = 0;
     for (std::size_t i = 0; i < mesh.vertexCount(); ++i)
-        outside +=
-            QVector3D::dotProduct(mesh.normals[i], (mesh.positions[i] - middle).normalized());
-    if (outside >= kClearlyInside * static_cast<float>(mesh.vertexCount()))
+        cosines +=
+            QVector3D::dotProduct(mesh.normals[i], (mesh.positions[i] - centre).normalized());
+    if (cosines >= kInsideOutCosine * static_cast<float>(mesh.vertexCount()))
         return;
     for (QVector3D& normal : mesh.normals)
         normal = -normal;
