@@ -1,4 +1,4 @@
-// How a step of the viewer says that it cannot go on.
+// Results of operations of the viewer that can fail.
 #pragma once
 
 #include <optional>
@@ -8,10 +8,10 @@
 
 namespace viewer {
 
-// What the process answers to the shell. Documented in --help.
+// Exit codes of the process, as --help documents them.
 enum class ExitCode {
     kSuccess = 0,
-    kDeviation = 1,   // --verify found a vertex beyond the bound
+    kDeviation = 1,   // --verify found a vertex above the bound
     kUsage = 2,       // wrong options
     kModel = 3,       // the model cannot be used
     kNoGraphics = 4,  // no display, or no OpenGL 3.3
@@ -19,29 +19,31 @@ enum class ExitCode {
     kOutput = 6,      // a picture or the trace cannot be written
     kOpenCLError = 7, // OpenCL failed while the viewer was running
     kOutOfMemory = 8,
-    kInterrupted = 130, // by Ctrl-C, as shells number it
+    kInterrupted = 130, // by Ctrl-C, numbered as shells do
 };
 
-// One sentence for the user that says what to do, and the exit code that goes with it.
+// Error text for the user, with what to do about it, and the exit code.
 struct Failure {
     ExitCode code;
     std::string text;
 };
 
-// Empty when all went well.
+// Empty on success.
 using Status = std::optional<Failure>;
 
-// A value or the reason why there is none.
+// Holds a value, or the failure to produce it.
 template <typename T>
-class Result {
+class [[nodiscard]] Result {
 public:
     Result(T value) : fContent(std::move(value)) {}
     Result(Failure failure) : fContent(std::move(failure)) {}
 
-    explicit operator bool() const { return std::holds_alternative<T>(fContent); }
-    T& value() { return std::get<T>(fContent); }
-    const T& value() const { return std::get<T>(fContent); }
-    const Failure& failure() const { return std::get<Failure>(fContent); }
+    explicit operator bool() const noexcept { return std::holds_alternative<T>(fContent); }
+    // Throws std::bad_variant_access on a failure.
+    [[nodiscard]] T& value() { return std::get<T>(fContent); }
+    [[nodiscard]] const T& value() const { return std::get<T>(fContent); }
+    // Throws std::bad_variant_access on a value.
+    [[nodiscard]] const Failure& failure() const { return std::get<Failure>(fContent); }
 
 private:
     std::variant<T, Failure> fContent;

@@ -1,9 +1,9 @@
-// Fuzzes the viewer's import without Assimp: the repair and the conversion of a scene, and what is
-// computed from the model.
+// Fuzzes the viewer's import without Assimp: repair and conversion of a scene, levels of detail,
+// poses and character space.
 //
-// The input describes a scene within the rules that Assimp's validation enforces: indices in range,
-// a material for each mesh, triangles. Names, numbers, and the order of keys are arbitrary. The
-// numbers are small, and then all results must be finite, or any bit pattern.
+// The input describes a scene that Assimp's validation accepts: indices in range, a material for
+// each mesh, triangles. Names, numbers, and the order of keys are arbitrary. Numbers are either
+// small, and then all results must be finite, or have any bit pattern.
 #include "Require.h"
 #include "viewer/model/CharacterSpace.h"
 #include "viewer/model/DetailLevel.h"
@@ -51,7 +51,7 @@ private:
     template <typename T, typename Make>
     static void makeArray(T*& parts, unsigned number, Make make)
     {
-        if (number > 0) // the parts' owners leave an empty list alone
+        if (number > 0) // the owners do not delete empty lists
             parts = new T[number];
         std::generate_n(parts, number, make);
     }
@@ -62,7 +62,7 @@ private:
         makeArray(parts, number, make);
     }
 
-    // Floats have 32 bits, times 64. `Small` is what other numbers have eighths of.
+    // Returns any bit pattern, or eighths of a `Small`. Floats take 32 bits of the input, times 64.
     template <typename Float, typename Bits, typename Small>
     Float anyOrSmall()
     {
@@ -87,7 +87,7 @@ private:
             makeArray(vectors, number, [this] { return vector(); });
     }
 
-    // Few names, so that bones and channels meet nodes, several of which may have one name.
+    // Few names, so that bones and channels refer to nodes, and several nodes may share a name.
     aiString name() { return aiString(std::string(1, static_cast<char>('a' + count(0, 7)))); }
 
     aiMaterial* material()
@@ -223,7 +223,7 @@ bool isFinite(const std::vector<T>& list)
     return std::ranges::all_of(list, [](const T& each) { return isFinite(each); });
 }
 
-// What Model.h promises of a mesh.
+// Requires the guarantees of Model.h for a mesh.
 void requireSound(const viewer::Mesh& mesh, std::size_t nodes)
 {
     const std::size_t vertices = mesh.vertexCount();
@@ -289,7 +289,7 @@ void requireSound(const viewer::Model& model)
     }
 }
 
-// Poses over a cycle and the space that they take; finite if the scene's numbers are small.
+// Computes poses over a cycle and the character space. They are finite if the numbers are small.
 void usePoses(const viewer::Model& model, const viewer::Animation* animation, bool small)
 {
     for (const double seconds : {-1.0, 0.0, 0.3, 7.0})
@@ -303,7 +303,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 {
     FuzzedDataProvider input(data, size);
     SceneBuilder builder(input);
-    // The viewer refuses such files, and those without meshes.
+    // The viewer rejects such files, and files without meshes.
     if (viewer::findNonFiniteNumber(builder.scene()))
         return 0;
     viewer::rescaleExtremeScene(builder.scene());

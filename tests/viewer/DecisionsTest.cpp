@@ -1,4 +1,4 @@
-// Command line, and small decisions: vendor, platform, figures, texts.
+// Command line, reasons why OpenCL cannot be used, report and overlay.
 #include "viewer/app/Options.h"
 #include "viewer/app/Report.h"
 #include "viewer/opencl/StartFailure.h"
@@ -17,7 +17,7 @@ Result<Options> parse(const QString& line)
     return parseOptions(QStringList{"vyra-viewer"} + line.split(' ', Qt::SkipEmptyParts));
 }
 
-TEST(Options, AreReadAsTheyAreGiven)
+TEST(Options, ParseReturnsEachGivenValue)
 {
     const Result<Options> result = parse(
         "--frames 60 --crowd 64 --size 640x360 --output out --every 5 --verify --trace t.json "
@@ -42,20 +42,18 @@ TEST(Options, AreReadAsTheyAreGiven)
     EXPECT_TRUE(options.verify && options.allowCpu);
 }
 
-TEST(Options, AModelOrHelpAloneIsEnough)
+TEST(Options, ParseAcceptsModelOrHelpOrVersionAlone)
 {
     const Result<Options> result = parse("a.fbx");
     ASSERT_TRUE(result) << result.failure().text;
     EXPECT_FALSE(result.value().frames || result.value().minimumVertices);
     EXPECT_EQ(result.value().crowd, 1);
     EXPECT_FALSE(result.value().verify || result.value().allowCpu || result.value().help);
-    const Result<Options> help = parse("--help");
-    EXPECT_TRUE(help && help.value().help);
-    const Result<Options> version = parse("--version");
-    EXPECT_TRUE(version && version.value().version);
+    EXPECT_TRUE(parse("--help").value().help);
+    EXPECT_TRUE(parse("--version").value().version);
 }
 
-TEST(Options, EachMistakeIsNamed)
+TEST(Options, ParseFailsWithAReasonForEachWrongValue)
 {
     const std::pair<const char*, std::vector<const char*>> rows[] = {
         {"model is missing", {""}},
@@ -77,17 +75,17 @@ TEST(Options, EachMistakeIsNamed)
          {"--animation= a", "--output= --frames 1 a", "--trace= a", "--platform= a"}},
         {"--output needs --frames", {"--output out a"}},
     };
-    for (const auto& [says, lines] : rows) {
+    for (const auto& [reason, lines] : rows) {
         for (const char* line : lines) {
             const Result<Options> result = parse(line);
             ASSERT_FALSE(result) << line;
             EXPECT_EQ(result.failure().code, ExitCode::kUsage) << line;
-            EXPECT_THAT(result.failure().text, AllOf(HasSubstr(says), HasSubstr("--help")));
+            EXPECT_THAT(result.failure().text, AllOf(HasSubstr(reason), HasSubstr("--help")));
         }
     }
 }
 
-TEST(OpenCLPlatforms, AdapterVendorFollowsFromTheDriversTexts)
+TEST(OpenCLPlatforms, AdapterVendorIdReturnsTheVendorOfTheRendererStrings)
 {
     const std::tuple<const char*, const char*, std::optional<unsigned>> rows[] = {
         {"NVIDIA Corporation", "NVIDIA H100/PCIe/SSE2", 0x10DE},
@@ -101,60 +99,62 @@ TEST(OpenCLPlatforms, AdapterVendorFollowsFromTheDriversTexts)
         EXPECT_EQ(adapterVendorId(vendor, renderer), id) << vendor << ' ' << renderer;
 }
 
-TEST(StartFailure, FirstReasonIsNamedWithAdviceThatIsNotTakenYet)
+TEST(StartFailure, ReturnsFirstReasonAndAdviceNotTakenYet)
 {
     const OpenCLPlatform alone{"A", "a", false, 1};
     const OpenCLPlatform sharing{"B", "b", true, 1};
     const OpenCLPlatform empty{"The pocl project", "p", true, 0};
     const auto with = [](auto change) {
-        StartFacts facts;
-        facts.platforms = {{"A", "a", true, 1}, {"B", "b", true, 1}};
-        change(facts);
-        return startFailure(facts).text;
+        StartDiagnostics diagnostics;
+        diagnostics.platforms = {{"A", "a", true, 1}, {"B", "b", true, 1}};
+        change(diagnostics);
+        return startFailure(diagnostics).text;
     };
     const std::pair<std::string, const char*> rows[] = {
-        {with([](StartFacts& f) {
-             f.missingLayers = {"/none.so"};
-             f.disabled = true;
+        {with([](StartDiagnostics& d) {
+             d.missingLayers = {"/none.so"};
+             d.disabled = true;
          }),
          "OPENCL_LAYERS names '/none.so', which is not a file; correct the variable, or use "
          "--allow-cpu"},
-        {with([](StartFacts& f) {
-             f.disabled = true;
-             f.cpuIsAllowed = true;
+        {with([](StartDiagnostics& d) {
+             d.disabled = true;
+             d.cpuIsAllowed = true;
          }),
          "OpenCL is switched off, since VYRA_DISABLE_OPENCL is set; unset the variable"},
-        {with([](StartFacts& f) { f.libraryFound = false; }), "there is no OpenCL on this machine"},
-        {with([](StartFacts& f) { f.platforms = {}; }), "OpenCL has no platform on this machine"},
-        {with([](StartFacts& f) { f.vendor = "a"; }),
+        {with([](StartDiagnostics& d) { d.libraryFound = false; }),
+         "there is no OpenCL on this machine"},
+        {with([](StartDiagnostics& d) { d.platforms = {}; }),
+         "OpenCL has no platform on this machine"},
+        {with([](StartDiagnostics& d) { d.vendor = "a"; }),
          "no OpenCL platform has the vendor 'a'; there is 'A', 'B'"},
-        {with([&](StartFacts& f) {
-             f.vendor = empty.vendor;
-             f.platforms = {alone, empty};
+        {with([&](StartDiagnostics& d) {
+             d.vendor = empty.vendor;
+             d.platforms = {alone, empty};
          }),
          "'The pocl project' has 0 devices; PoCL has none if it cannot write its cache"},
-        {with([&](StartFacts& f) { f.platforms = {empty}; }), "has 0 devices"},
-        {with([&](StartFacts& f) {
-             f.vendor = "A";
-             f.platforms = {alone, sharing};
+        {with([&](StartDiagnostics& d) { d.platforms = {empty}; }), "has 0 devices"},
+        {with([&](StartDiagnostics& d) {
+             d.vendor = "A";
+             d.platforms = {alone, sharing};
          }),
          "the OpenCL platform of 'A' does not offer cl_khr_gl_sharing"},
-        {with([&](StartFacts& f) { f.platforms = {alone}; }), "no OpenCL platform offers"},
-        {with([](StartFacts&) {}), "choose one with --platform: 'A', 'B'"},
-        {with([](StartFacts& f) {
-             f.vendor = "A";
-             f.platformIsGiven = true;
-             f.warnings = {"OpenCL error: CL_OUT_OF_HOST_MEMORY"};
+        {with([&](StartDiagnostics& d) { d.platforms = {alone}; }), "no OpenCL platform offers"},
+        {with([](StartDiagnostics&) {}), "choose one with --platform: 'A', 'B'"},
+        {with([](StartDiagnostics& d) {
+             d.vendor = "A";
+             d.platformIsGiven = true;
+             d.warnings = {"OpenCL error: CL_OUT_OF_HOST_MEMORY"};
          }),
          "with this renderer (OpenCL error: CL_OUT_OF_HOST_MEMORY); use --allow-cpu"},
-        {with([](StartFacts& f) { f.vendorId = 0x10DE; }),
+        {with([](StartDiagnostics& d) { d.vendorId = 0x10DE; }),
          "for the reason above; name another platform with --platform, or use --allow-cpu"},
     };
     for (const auto& [text, expected] : rows)
         EXPECT_THAT(text, HasSubstr(expected));
 }
 
-TEST(Report, PercentilesAreValuesThatWereMeasured)
+TEST(Report, PercentileReturnsTheNearestMeasuredValue)
 {
     const std::tuple<std::vector<double>, double, double> rows[] = {
         {{}, 0.5, 0},
@@ -169,53 +169,53 @@ TEST(Report, PercentilesAreValuesThatWereMeasured)
         EXPECT_EQ(percentile(values, part), expected);
 }
 
-TEST(Report, DeviationLineNamesTheVerdictAndWhatWasCompared)
+TEST(Report, DeviationLineContainsVerdictAndWarnsIfNothingRanOnOpenCL)
 {
     const char* itself = "compared with itself";
-    RunFacts facts;
-    facts.deviation = Deviation{2 * kPositionBound};
-    EXPECT_THAT(reportText(facts), AllOf(HasSubstr("FAILED"), HasSubstr(itself)));
-    facts.deviation = Deviation{kPositionBound, kNormalBound, kNormalBound};
-    facts.share = {true, 3, 2, 500};
-    EXPECT_THAT(reportText(facts), AllOf(HasSubstr("passed"), Not(HasSubstr(itself))));
+    RunStatistics run;
+    run.deviation = Deviation{2 * kPositionBound};
+    EXPECT_THAT(reportText(run), AllOf(HasSubstr("FAILED"), HasSubstr(itself)));
+    run.deviation = Deviation{kPositionBound, kNormalBound, kNormalBound};
+    run.distribution = {true, 3, 2, 500};
+    EXPECT_THAT(reportText(run), AllOf(HasSubstr("passed"), Not(HasSubstr(itself))));
 }
 
-TEST(MeshShare, CpuIsNamedIfNothingRanOnOpenCL)
+TEST(MeshDistribution, DeformedByReturnsWhyTheCpuDeforms)
 {
-    const std::pair<MeshShare, const char*> rows[] = {
+    const std::pair<MeshDistribution, const char*> rows[] = {
         {{false, 3, 3, 0}, "the CPU, since OpenCL is not used"},
         {{true, 3, 3, 500}, "the CPU, since all meshes have fewer than 500 vertices"},
         {{true, 3, 1, 500}, "OpenCL, but 1 meshes by the CPU: they have fewer than 500 vertices"},
         {{true, 3, 0, 500}, "OpenCL, all of them"},
     };
-    for (const auto& [share, text] : rows)
-        EXPECT_EQ(deformedBy(share), text);
+    for (const auto& [distribution, text] : rows)
+        EXPECT_EQ(deformedBy(distribution), text);
 }
 
-TEST(OverlayText, TellsOnlyWhatIsShown)
+TEST(OverlayText, ContainsOnlyLinesWithAValue)
 {
-    OverlayFacts facts{{{"a device", "2, fence", "4, finish", 128}},
-                       {true, 1, 0, 0},
-                       59.9,
-                       1.5,
-                       {},
-                       true,
-                       "skin, wave (off)"};
-    EXPECT_THAT(overlayText(facts),
-                AllOf(HasSubstr("59.90\n"), HasSubstr("1.50 ms"), HasSubstr("OpenCL, all of them"),
-                      HasSubstr("a device\n"), HasSubstr("2, fence\n"), HasSubstr("4, finish\n"),
-                      HasSubstr("128 vertex buffers\n"), HasSubstr("paused\n"),
-                      HasSubstr("skin, wave (off)\n"), Not(HasSubstr("on the right"))));
-    facts = {{}, {}, 0, 1.5, 7.25, false, "skin"};
-    EXPECT_THAT(overlayText(facts),
-                AllOf(HasSubstr("7.25 ms"), HasSubstr("OpenCL is not used"),
-                      Not(HasSubstr("Batch")), Not(HasSubstr("paused")), Not(HasSubstr("second"))));
+    OverlayContent content{{{"a device", "2, fence", "4, finish", 128}},
+                           {true, 1, 0, 0},
+                           59.9,
+                           1.5,
+                           {},
+                           true,
+                           "skin",
+                           "Esc quit"};
+    EXPECT_THAT(overlayText(content),
+                AllOf(HasSubstr("59.90\n"), HasSubstr("1.50 ms"), HasSubstr("a device\n"),
+                      HasSubstr("2, fence\n"), HasSubstr("4, finish\n"), HasSubstr("128 vertex"),
+                      HasSubstr("paused\n"), HasSubstr("skin\n"), HasSubstr("Esc quit\n"),
+                      Not(HasSubstr("on the right"))));
+    content = {{}, {}, 0, 1.5, 7.25, false, "skin", {}};
+    EXPECT_THAT(overlayText(content), AllOf(HasSubstr("7.25 ms"), Not(HasSubstr("Batch")),
+                                            Not(HasSubstr("paused")), Not(HasSubstr("second"))));
 }
 
-TEST(OverlayText, CutsALongBuildLog)
+TEST(OverlayText, FirstLinesTruncatesLongTextAndCountsOmittedLines)
 {
-    EXPECT_EQ(beginningOf("one\ntwo"), "one\ntwo\n");
-    const std::string cut = beginningOf(std::string(1000, 'x') + std::string(99, '\n'));
+    EXPECT_EQ(firstLines("one\ntwo"), "one\ntwo\n");
+    const std::string cut = firstLines(std::string(1000, 'x') + std::string(99, '\n'));
     EXPECT_LT(cut.size(), 200u);
     EXPECT_THAT(cut, HasSubstr("\n... and 83 more lines\n"));
 }

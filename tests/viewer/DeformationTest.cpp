@@ -1,5 +1,4 @@
-// From the keys of an animation to matrices, the chain of deformers, and the comparison with the
-// CPU.
+// Poses, parsing of deformer chains, comparison with the CPU reference.
 #include "viewer/model/DeformerChain.h"
 #include "viewer/model/Pose.h"
 #include "viewer/opencl/Verification.h"
@@ -34,7 +33,7 @@ QQuaternion turned(float degrees, const QVector3D& axis)
     return QQuaternion::fromAxisAndAngle(axis, degrees);
 }
 
-// A shoulder that is moved, with an arm of length 2 on it that turns around z.
+// A translated shoulder, and an arm of length 2 on it that rotates around z.
 Model armModel()
 {
     Model model;
@@ -44,7 +43,7 @@ Model armModel()
     return model;
 }
 
-TEST(Pose, PositionsAreLinearBetweenKeysAndStandStillOutside)
+TEST(Pose, SamplePositionInterpolatesLinearlyAndClampsOutsideTheKeys)
 {
     const std::vector<Key<QVector3D>> keys{{1.0, {0, 0, 0}}, {3.0, {4, 8, 0}}, {4.0, {4, 8, 6}}};
     const std::pair<double, QVector3D> rows[] = {{0.0, {0, 0, 0}}, {1.0, {0, 0, 0}},
@@ -54,15 +53,15 @@ TEST(Pose, PositionsAreLinearBetweenKeysAndStandStillOutside)
         expectNear(sample(keys, seconds), expected);
 }
 
-TEST(Pose, RotationsTakeTheShorterWayAtAnEvenSpeed)
+TEST(Pose, SampleRotationTakesTheShorterArcAtConstantSpeed)
 {
-    // The same rotation with the opposite sign, which a careless mix goes the long way to.
+    // The quaternion has the opposite sign, for which plain interpolation takes the longer arc.
     const std::vector<Key<QQuaternion>> keys{{0.0, {}}, {3.0, -turned(90, {0, 1, 0})}};
     expectNear(sample(keys, 1.0).rotatedVector({1, 0, 0}),
                turned(30, {0, 1, 0}).rotatedVector({1, 0, 0}));
 }
 
-TEST(Pose, ChildrenFollowTheirParentsAndTimeWrapsAround)
+TEST(Pose, PoseAtMovesChildrenWithTheirParentsAndWrapsTime)
 {
     const Model model = armModel();
     const std::pair<double, QVector3D> rows[] = {
@@ -72,32 +71,28 @@ TEST(Pose, ChildrenFollowTheirParentsAndTimeWrapsAround)
     expectNear(poseAt(model, nullptr, 1.0)[2].map(QVector3D()), {2, 0, 0});
 }
 
-TEST(Pose, BoneMatricesLeadFromTheMeshAtRestToTheModel)
+TEST(Pose, BoneMatricesTransformFromMeshAtRestToModelSpace)
 {
     const Model model = armModel();
     Mesh mesh;
     mesh.bones.push_back({2, moved(-2, 0, 0)}); // the arm's origin in the mesh at rest
-    // A quarter turn around the moved shoulder: (3, 0, 0) becomes (0, 1 + 3, 0).
+    // A quarter turn around the translated shoulder: (3, 0, 0) becomes (0, 1 + 3, 0).
     const vyra::MatrixRows expected{0, -1, 0, 0, 1, 0, 0, 1, 0, 0, 1, 0};
     EXPECT_THAT(boneMatrices(mesh, poseAt(model, &model.animations[0], 1.0))[0],
                 testing::Pointwise(testing::FloatNear(kTolerance), expected));
 }
 
-Result<std::vector<DeformerChoice>> parsed(const std::string& text)
+TEST(ParseDeformers, ReturnsDeformersInOrderWithParameters)
 {
-    return parseDeformers(text);
-}
-
-TEST(DeformerChoices, AreReadInOrderWithTheirParameters)
-{
-    const auto choices = parsed("wave:amplitude=0.5,skin:precision=double,smooth:iterations=3");
+    const auto choices =
+        parseDeformers("wave:amplitude=0.5,skin:precision=double,smooth:iterations=3");
     ASSERT_TRUE(choices);
     EXPECT_EQ(chainText(choices.value()),
               "wave:amplitude=0.5, skin:precision=double, smooth:iterations=3");
-    EXPECT_TRUE(parsed(kDefaultDeformers));
+    EXPECT_TRUE(parseDeformers(kDefaultDeformers));
 }
 
-TEST(DeformerChoices, WrongTextsAreRefusedWithWhatThereIs)
+TEST(ParseDeformers, FailsForWrongTextWithTheValidNames)
 {
     const std::pair<const char*, const char*> rows[] = {
         {"skin,bend", "no deformer 'bend'; there are skin, morph, twist, wave, smooth"},
@@ -110,27 +105,27 @@ TEST(DeformerChoices, WrongTextsAreRefusedWithWhatThereIs)
         {"skin:precision=half", "one of single, double, not 'half'"},
     };
     for (const auto& [text, reason] : rows) {
-        const auto choices = parsed(text);
+        const auto choices = parseDeformers(text);
         ASSERT_FALSE(choices) << text;
         EXPECT_THAT(choices.failure().text, testing::HasSubstr(reason));
     }
 }
 
-TEST(Verification, FindsTheWorstVertexAndValuesThatAreNoNumbers)
+TEST(Verification, CompareReturnsTheLargestDeviationAndInfinityForNaN)
 {
     constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
     constexpr double kInfinity = std::numeric_limits<double>::infinity();
     const vyra::Surface expected{{{0, 0, 0}, {1, 0, 0}}, {{0, 1, 0}, {0, 1, 0}}};
-    const vyra::Surface oneOff{{{0, 0, 0}, {1, 0, 0.5f}}, expected.normals};
+    const vyra::Surface moved{{{0, 0, 0}, {1, 0, 0.5f}}, expected.normals};
     const vyra::Surface turnedNormal{expected.positions, {{0, 1, 0}, {1, 0, 0}}};
-    const vyra::Surface noNumber{{{kNan, 0, 0}, {1, 0, 0}},
-                                 expected.normals}; // before a good vertex
+    const vyra::Surface notANumber{{{kNan, 0, 0}, {1, 0, 0}},
+                                   expected.normals}; // before a good vertex
     QMatrix4x4 toCharacter;
     toCharacter.scale(2);
     const std::tuple<vyra::Surface, double, bool> rows[] = {{expected, 0, true},
-                                                            {oneOff, 1, false},
+                                                            {moved, 1, false},
                                                             {turnedNormal, 0, false},
-                                                            {noNumber, kInfinity, false}};
+                                                            {notANumber, kInfinity, false}};
     for (const auto& [actual, position, passes] : rows) {
         const Deviation deviation = compare(actual, expected, toCharacter);
         EXPECT_DOUBLE_EQ(deviation.position, position);
@@ -138,7 +133,7 @@ TEST(Verification, FindsTheWorstVertexAndValuesThatAreNoNumbers)
     }
 }
 
-TEST(Verification, NormalsFromTrianglesMayTurnAsFarAsPositionsAllow)
+TEST(Verification, CompareAllowsNormalsFromTrianglesToRotateWithPositionErrors)
 {
     constexpr float kSize = 1e-3f; // of the triangle
     const vyra::Surface expected{{{0, 0, 0}, {kSize, 0, 0}, {0, kSize, 0}},

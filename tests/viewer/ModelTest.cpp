@@ -1,9 +1,9 @@
-// From files to meshes, what is derived from a mesh, and the camera that frames it.
+// Import of model files, levels of detail, character space, camera.
 #include "viewer/model/CharacterSpace.h"
 #include "viewer/model/DetailLevel.h"
 #include "viewer/model/import/ImportProcess.h"
 #include "viewer/model/import/ModelImport.h"
-#include "viewer/model/import/ModelStream.h"
+#include "viewer/model/import/ModelSerialisation.h"
 #include "viewer/render/Camera.h"
 
 #include <algorithm>
@@ -57,7 +57,18 @@ protected:
     Model fModel;
 };
 
-TEST_P(SampleModel, IsReadWholeWithWeightsThatAddUpToOne)
+void expectConsistent(const Mesh& mesh)
+{
+    EXPECT_EQ(mesh.normals.size(), mesh.vertexCount());
+    EXPECT_THAT(mesh.triangles, Each(Lt(mesh.vertexCount())));
+    EXPECT_EQ(mesh.boneWeights.size(), mesh.hasBones() ? mesh.vertexCount() : 0);
+    for (const BoneWeights& weights : mesh.boneWeights)
+        EXPECT_NEAR(std::accumulate(weights.begin(), weights.end(), 0.0f), 1, 1e-5);
+    EXPECT_EQ(mesh.boneIndices.size(), mesh.boneWeights.size());
+    EXPECT_THAT(mesh.boneIndices, Each(Each(Lt(mesh.bones.size()))));
+}
+
+TEST_P(SampleModel, ImportReturnsAllMeshesBonesAndAnimations)
 {
     const Sample& expected = GetParam();
     ASSERT_EQ(fModel.meshes.size(), expected.meshes);
@@ -66,33 +77,26 @@ TEST_P(SampleModel, IsReadWholeWithWeightsThatAddUpToOne)
     std::size_t vertices = 0;
     for (const Mesh& mesh : fModel.meshes) {
         vertices += mesh.vertexCount();
-        EXPECT_EQ(mesh.normals.size(), mesh.vertexCount());
-        const std::set<std::uint32_t> drawn(mesh.triangles.begin(), mesh.triangles.end());
-        EXPECT_EQ(drawn.size(), mesh.vertexCount());
-        EXPECT_EQ(mesh.boneWeights.size(), mesh.hasBones() ? mesh.vertexCount() : 0);
-        for (const BoneWeights& weights : mesh.boneWeights)
-            EXPECT_NEAR(std::accumulate(weights.begin(), weights.end(), 0.0f), 1, 1e-5);
-        EXPECT_EQ(mesh.boneIndices.size(), mesh.boneWeights.size());
-        EXPECT_THAT(mesh.boneIndices, Each(Each(Lt(mesh.bones.size()))));
+        expectConsistent(mesh);
+        const std::set<std::uint32_t> used(mesh.triangles.begin(), mesh.triangles.end());
+        EXPECT_EQ(used.size(), mesh.vertexCount());
     }
     EXPECT_EQ(vertices, expected.vertices);
 }
 
-TEST_P(SampleModel, ACoarserLevelIsSmallerAndWhole)
+TEST_P(SampleModel, CoarserMeshHasFewerTrianglesAndConsistentData)
 {
     for (const Mesh& mesh : fModel.meshes) {
         const Mesh coarse = coarserMesh(mesh);
         EXPECT_LT(coarse.vertexCount(), mesh.vertexCount());
         EXPECT_LT(coarse.triangles.size(), mesh.triangles.size());
-        EXPECT_GT(coarse.triangles.size(), mesh.triangles.size() / 8); // still a shape
-        EXPECT_EQ(coarse.normals.size(), coarse.vertexCount());
-        EXPECT_EQ(coarse.boneWeights.size(), mesh.hasBones() ? coarse.vertexCount() : 0);
-        EXPECT_EQ(coarse.boneIndices.size(), coarse.boneWeights.size());
-        EXPECT_THAT(coarse.triangles, Each(Lt(coarse.vertexCount())));
+        EXPECT_GT(coarse.triangles.size(), mesh.triangles.size() / 8); // keeps its shape
+        EXPECT_EQ(coarse.hasBones(), mesh.hasBones());
+        expectConsistent(coarse);
     }
 }
 
-TEST_P(SampleModel, StandsOnTheGroundWithItsLargestExtentOne)
+TEST_P(SampleModel, CharacterSpaceHasFeetOnTheGroundAndLargestExtentOne)
 {
     const Animation* animation = fModel.animations.empty() ? nullptr : &fModel.animations[0];
     const auto [lowest, highest] = boundsOf(characterSpace(fModel, animation).outline);
@@ -136,7 +140,7 @@ std::string cube(const char* size)
     return QString::fromStdString(text).replace("S", size).toStdString();
 }
 
-TEST(ModelImport, UselessFileIsRefusedWithItsReason)
+TEST(ModelImport, UnusableFileFailsWithAReason)
 {
     const ModelFolder folder;
     std::filesystem::create_symlink("loop.obj", folder.path("loop.obj"));
@@ -168,7 +172,7 @@ TEST(ModelImport, UselessFileIsRefusedWithItsReason)
 }
 
 // The vertices of a cube: 24 with sharp edges, 8 with smooth ones.
-TEST(ModelImport, MissingNormalsFollowTheTrianglesUpToTheCreaseAngle)
+TEST(ModelImport, MissingNormalsAreSmoothUpToTheCreaseAngle)
 {
     const ModelFolder folder;
     const std::tuple<const char*, double, std::size_t> rows[] = {
@@ -185,7 +189,7 @@ TEST(ModelImport, MissingNormalsFollowTheTrianglesUpToTheCreaseAngle)
     }
 }
 
-TEST(ModelImport, ZeroNormalsAreComputedFromTheTriangles)
+TEST(ModelImport, ZeroNormalsAreComputedFromTriangles)
 {
     const ModelFolder folder;
     const std::string triangle = "v 0 0 0\nv 1 0 0\nv 0 0 -1\nv 0 1 0\nvn 0 0 0\nvn -1 0 0\n";
@@ -196,7 +200,7 @@ TEST(ModelImport, ZeroNormalsAreComputedFromTheTriangles)
     }
 }
 
-TEST(ModelImport, ModelStandsUprightAlongItsUpAxis)
+TEST(ModelImport, UpAxisIsRotatedToY)
 {
     const ModelFolder folder;
     const std::string file =
@@ -214,23 +218,22 @@ TEST(ModelImport, ModelStandsUprightAlongItsUpAxis)
     }
 }
 
-// The bytes of a model tell whether all of it is the same.
-TEST(ImportProcess, ChildDeliversTheSameModel)
+TEST(ImportProcess, ImportInChildReturnsTheSameModelAsImportModel)
 {
     if (!std::filesystem::exists("/usr/share/assimp/models"))
         GTEST_SKIP() << "the sample models (package assimp-testmodels) are not installed";
     const ImportChild child{VIEWER_PROGRAM, 60, [](int) { return true; }};
     const char* name = "X/BCN_Epileptic.X";
-    const QByteArray expected = toBytes(importModel(name));
-    EXPECT_EQ(toBytes(importInChild(child, name, {})), expected);
+    const QByteArray expected = serialiseModel(importModel(name));
+    EXPECT_EQ(serialiseModel(importInChild(child, name, {})), expected);
     ASSERT_GT(expected.size(), 100000);
-    EXPECT_TRUE(fromBytes(expected));
-    EXPECT_FALSE(fromBytes(expected.chopped(1)));
+    EXPECT_TRUE(deserialiseModel(expected));
+    EXPECT_FALSE(deserialiseModel(expected.chopped(1)));
     const auto wrong = importInChild(child, "/dev/null", {});
     EXPECT_THAT(wrong.failure().text, testing::HasSubstr("not a regular file"));
 }
 
-TEST(ImportProcess, ChildThatFailsGivesOneSentence)
+TEST(ImportProcess, FailingChildReturnsOneSentence)
 {
     const ModelFolder folder;
     const std::string file = folder.write("cube.obj", cube("1"));
@@ -239,14 +242,14 @@ TEST(ImportProcess, ChildThatFailsGivesOneSentence)
         {"kill -SEGV $$", 60, true, "makes Assimp crash (signal 11)"},
         {"echo surprise", 60, true, "makes Assimp crash (exit code 0)"},
         {"exit 3", 60, true, "makes Assimp crash (exit code 3)"},
-        {"exec sleep 1000", -5, true, "takes longer than -5 s"}, // with the 5 s to end itself
+        {"exec sleep 1000", -5, true, "takes longer than -5 s"}, // with the grace period of 5 s
         {"exit 124", 60, true, "takes longer than 60 s"},
         {"exec sleep 1000", 60, false, "interrupted"},
     };
-    for (const auto& [command, timeLimit, goesOn, sentence] : rows) {
+    for (const auto& [command, timeLimit, goOn, sentence] : rows) {
         folder.write("program", std::string("#!/bin/sh\n") + command + '\n');
         std::filesystem::permissions(program, std::filesystem::perms::owner_all);
-        const bool answer = goesOn;
+        const bool answer = goOn;
         const auto model =
             importInChild({program, timeLimit, [answer](int) { return answer; }}, file, {});
         ASSERT_FALSE(model) << command;
@@ -256,7 +259,8 @@ TEST(ImportProcess, ChildThatFailsGivesOneSentence)
     EXPECT_THAT(model.failure().text, testing::HasSubstr("the process for it does not start"));
 }
 
-// All points are in the picture and centred, and one of its sides is nearly filled.
+// All points are in the picture and centred and nearly fill one of its dimensions; the camera is
+// above the ground and below the zenith.
 void expectFramed(const Camera& camera, const std::vector<QVector3D>& points)
 {
     std::vector<QVector3D> inClip = points;
@@ -268,9 +272,12 @@ void expectFramed(const Camera& camera, const std::vector<QVector3D>& points)
     EXPECT_NEAR(low.x() + high.x(), 0, 0.05);
     EXPECT_NEAR(low.y() + high.y(), 0, 0.05);
     EXPECT_GT(std::max(high.x() - low.x(), high.y() - low.y()), 1.5);
+    const QVector3D eye = camera.eye();
+    EXPECT_GT(eye.y(), 0);
+    EXPECT_GT(std::hypot(eye.x(), eye.z()), 0.01f);
 }
 
-TEST(Camera, AllPointsStayInThePictureFromAllSidesAndInAllShapes)
+TEST(Camera, OrbitAndSetAspectKeepAllPointsFramed)
 {
     const std::vector<QVector3D> shapes[] = {
         {{-0.3f, 0, -0.2f}, {0.3f, 1, 0.2f}, {0.3f, 0, 0.2f}}, // upright
@@ -296,7 +303,7 @@ TEST(Camera, AllPointsStayInThePictureFromAllSidesAndInAllShapes)
     }
 }
 
-TEST(Camera, PanMovesThePictureByPartsOfItsHeight)
+TEST(Camera, PanMovesThePictureByFractionsOfItsHeight)
 {
     const QVector3D middle(0, 0.5f, 0);
     Camera camera;
@@ -307,16 +314,6 @@ TEST(Camera, PanMovesThePictureByPartsOfItsHeight)
     const QVector3D moved = camera.toClip().map(middle) - before;
     EXPECT_NEAR(moved.x(), 0.25f, 0.02); // half a height is half of a width of 2
     EXPECT_NEAR(moved.y(), 0.2f, 0.02);
-}
-
-TEST(Camera, StaysAboveTheGround)
-{
-    Camera camera;
-    camera.frame({{-1, 0, -1}, {1, 1, 1}}, 1);
-    camera.orbit(0, -500);
-    EXPECT_GT(camera.eye().y(), 0);
-    camera.orbit(0, 500);
-    EXPECT_GT(std::hypot(camera.eye().x(), camera.eye().z()), 0.1f);
 }
 
 } // namespace

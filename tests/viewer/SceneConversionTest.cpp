@@ -1,4 +1,4 @@
-// What the conversion of Assimp's scenes makes of numbers that a valid file may hold.
+// Conversion of Assimp scenes with unusual numbers that a valid file may contain.
 #include "viewer/model/import/SceneConversion.h"
 
 #include "viewer/model/Pose.h"
@@ -43,7 +43,7 @@ std::unique_ptr<aiScene> triangle()
     return scene;
 }
 
-// A node that an animation moves along x: a key for each of `times`, in ticks, at its own time.
+// A node that an animation moves along x. Each of `times`, in ticks, has a key with x = time.
 std::unique_ptr<aiScene> movingNode(const std::vector<double>& times, double ticksPerSecond)
 {
     auto scene = std::make_unique<aiScene>();
@@ -64,7 +64,7 @@ std::unique_ptr<aiScene> movingNode(const std::vector<double>& times, double tic
     return scene;
 }
 
-TEST(SceneConversion, KeysInAnyOrderMoveTheNodeInTheOrderOfTime)
+TEST(SceneConversion, UnsortedKeysAreSortedByTime)
 {
     const Model model = convertScene(*movingNode({4, 3, 1, 1}, 2), {});
     std::vector<float> places;
@@ -73,9 +73,9 @@ TEST(SceneConversion, KeysInAnyOrderMoveTheNodeInTheOrderOfTime)
     EXPECT_THAT(places, ElementsAre(1, 2, 3, 3.5f));
 }
 
-// A negative weight would turn a part of the mesh inside out; the sum of huge ones is infinite in
+// A negative weight would turn a part of the mesh inside out; the sum of huge weights overflows
 // single precision.
-TEST(SceneConversion, WeightsAddUpToOneWhateverTheFileHolds)
+TEST(SceneConversion, NegativeTinyOrHugeWeightsAreNormalisedToASumOfOne)
 {
     const std::tuple<std::array<float, 3>, float> rows[] = {
         {{2, -1, 0}, 1}, {{-1, 0, 0}, 1}, {{3e38f, 3e38f, 0}, 0.5f}, {{1e-45f, 0, 0}, 1}};
@@ -91,7 +91,7 @@ TEST(SceneConversion, WeightsAddUpToOneWhateverTheFileHolds)
     }
 }
 
-TEST(SceneConversion, ColourThatIsNotFiniteBecomesTheDefault)
+TEST(SceneConversion, NonFiniteColourBecomesTheDefault)
 {
     const QVector3D expected = convertScene(*triangle(), {}).meshes.at(0).colour;
     for (const float number : {std::numeric_limits<float>::quiet_NaN(), HUGE_VALF}) {
@@ -102,7 +102,7 @@ TEST(SceneConversion, ColourThatIsNotFiniteBecomesTheDefault)
     }
 }
 
-TEST(SceneConversion, WeightOfAMorphTargetThatNoMeshHasIsLeftOut)
+TEST(SceneConversion, WeightOfMissingMorphTargetIsLeftOut)
 {
     const auto scene = movingNode({}, 1);
     aiAnimation& animation = *scene->mAnimations[0];
@@ -119,7 +119,7 @@ TEST(SceneConversion, WeightOfAMorphTargetThatNoMeshHasIsLeftOut)
     EXPECT_TRUE(model.animations.at(0).morphChannels.at(0).weights.at(0).value.empty());
 }
 
-TEST(SceneConversion, LengthThatOverflowsIsThatOfAStill)
+TEST(SceneConversion, OverflowingDurationBecomesZero)
 {
     EXPECT_EQ(convertScene(*movingNode({}, 1e-320), {}).animations.at(0).seconds, 0);
 }

@@ -1,5 +1,5 @@
-// The playing window, driven by the events that a user causes and by kernels that change on the
-// disk meanwhile: every frame is right, and Escape ends it.
+// The window, driven by user events and by kernels that change on disk: every frame matches the CPU
+// reference, and Escape ends playing.
 #include "tests/support/KeepModulesLoaded.h"
 #include "viewer/app/Player.h"
 
@@ -30,10 +30,10 @@ namespace {
 using namespace viewer;
 using testing::AllOf, testing::HasSubstr, testing::Not;
 
-constexpr int kUnitsPerNotch = 120; // of the wheel
+constexpr int kUnitsPerStep = 120; // of the wheel
 constexpr int kFramesAfterEscape = 60;
 constexpr qint64 kSliceMs = 100;
-constexpr int kLeastFrames = 5; // also if a frame takes that long
+constexpr int kLeastFrames = 5; // even if they take longer
 constexpr qint64 kHangMs = 20000;
 const QSize kSize(160, 120);
 
@@ -79,8 +79,8 @@ protected:
 
     void TearDown() override { keepModulesLoaded(); }
 
-    // Plays until Escape, which comes after `frames` frames, and looks how that went. Calls
-    // `action` after the first.
+    // Plays, calls `action` after the first frame, presses Escape after `frames` frames, and
+    // expects that playing ends and all frames match the CPU reference.
     void playFor(int frames, const std::function<void()>& action)
     {
         int left = frames;
@@ -97,14 +97,14 @@ protected:
         QObject::disconnect(counting);
         fWindow->stop();
         fWindow->makeCurrent();
-        EXPECT_LE(left, 0) << "playing ended before";
-        EXPECT_GT(left, -kFramesAfterEscape) << "Escape did not end it";
+        EXPECT_LE(left, 0) << "playing ended early";
+        EXPECT_GT(left, -kFramesAfterEscape) << "Escape did not end playing";
         EXPECT_FALSE(fWindow->failure());
         EXPECT_TRUE(fSession->verified());
     }
 
-    // Until a frame is not as the CPU would have it, or the time is over.
-    void playWhileRight(Player& player, qint64 milliseconds)
+    // Renders frames until one differs from the CPU reference or the time is over.
+    void playWhileVerified(Player& player, qint64 milliseconds)
     {
         QElapsedTimer timer;
         timer.start();
@@ -123,13 +123,13 @@ protected:
     std::unique_ptr<QGuiApplication> fApplication;
     Options fOptions;
     std::unique_ptr<ViewerWindow> fWindow;
-    std::unique_ptr<Session> fSession; // goes first, while the context is current
+    std::unique_ptr<Session> fSession; // destroyed first, while the context is current
 };
 
-TEST_F(WindowTest, OrbitsZoomsPansResizesAndChangesTheVertexBuffersDetail)
+TEST_F(WindowTest, MouseMovesCameraAndKeyChangesLevelOfDetailWhilePlaying)
 {
     const std::string before = fSession->report();
-    press(*fWindow, Qt::Key_D); // without effect: nothing plays yet
+    press(*fWindow, Qt::Key_D); // no effect: nothing plays yet
     playFor(8, [&] {
         const QVector3D eye = fSession->camera().eye();
         moveMouse(*fWindow, QEvent::MouseButtonPress, {10, 10});
@@ -142,7 +142,7 @@ TEST_F(WindowTest, OrbitsZoomsPansResizesAndChangesTheVertexBuffersDetail)
         const QVector3D raised = fSession->camera().eye();
         EXPECT_GT(raised.y(), turned.y());
 
-        QWheelEvent wheel({}, {}, {}, QPoint(0, 3 * kUnitsPerNotch), Qt::NoButton, Qt::NoModifier,
+        QWheelEvent wheel({}, {}, {}, QPoint(0, 3 * kUnitsPerStep), Qt::NoButton, Qt::NoModifier,
                           Qt::NoScrollPhase, false);
         QCoreApplication::sendEvent(fWindow.get(), &wheel);
         EXPECT_LT(fSession->camera().eye().length(), raised.length());
@@ -151,7 +151,7 @@ TEST_F(WindowTest, OrbitsZoomsPansResizesAndChangesTheVertexBuffersDetail)
         EXPECT_GT((fSession->camera().eye() - near).length(), 0.01f);
         press(*fWindow, Qt::Key_Home);
         EXPECT_LT((fSession->camera().eye() - eye).length(), 1e-4f);
-        fWindow->resize(200, 1); // lower than the window's smallest size
+        fWindow->resize(200, 1); // below the minimum height
         press(*fWindow, Qt::Key_D);
     });
     EXPECT_EQ(fSession->canvas().size(), QSize(200, 90) * fWindow->devicePixelRatio());
@@ -159,7 +159,7 @@ TEST_F(WindowTest, OrbitsZoomsPansResizesAndChangesTheVertexBuffersDetail)
     EXPECT_THAT(fSession->report(), Not(HasSubstr("3205 vertices")));
 }
 
-TEST_F(WindowTest, LoadProgressIsInTheTitleAndNowAndThenOnStandardError)
+TEST_F(WindowTest, LoadProgressUpdatesTitleAndPrintsPeriodically)
 {
     testing::internal::CaptureStderr();
     {
@@ -173,7 +173,7 @@ TEST_F(WindowTest, LoadProgressIsInTheTitleAndNowAndThenOnStandardError)
                                                       "vyra-viewer: loading 'a.fbx', 5 s so far\n");
 }
 
-TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
+TEST_F(WindowTest, ChangedKernelIsReloadedUnlessItDoesNotBuild)
 {
     if (!TopenCLInfo::isValid())
         GTEST_SKIP() << "OpenCL cannot be used here";
@@ -191,31 +191,31 @@ TEST_F(WindowTest, KeepsTheLastGoodKernelAndTakesTheMendedOne)
         file.write(QByteArray(original).replace(from, to));
         file.close();
     };
-    // What is written to standard error until the edited text is refused.
-    const auto playUntilRefused = [&](const char* from, const char* to) {
+    // Plays until the edited text is rejected. Returns what was written to standard error.
+    const auto playUntilRejected = [&](const char* from, const char* to) {
         edit(from, to);
         QElapsedTimer timer;
         timer.start();
         std::string written;
         while (written.empty() && timer.elapsed() < kHangMs) {
             testing::internal::CaptureStderr();
-            playWhileRight(player, kSliceMs);
+            playWhileVerified(player, kSliceMs);
             written = testing::internal::GetCapturedStderr();
         }
         return written;
     };
 
-    EXPECT_THAT(playUntilRefused("unitScale(", "unitScal("),
+    EXPECT_THAT(playUntilRejected("unitScale(", "unitScal("),
                 AllOf(HasSubstr("does not compile"), HasSubstr("'unitScal'")));
-    EXPECT_THAT(playUntilRefused("twistPerHeight)\n{", "twistPerHeight, const int more)\n{"),
+    EXPECT_THAT(playUntilRejected("twistPerHeight)\n{", "twistPerHeight, const int more)\n{"),
                 HasSubstr("takes 13 arguments"));
     EXPECT_TRUE(fSession->verified());
     edit("sineAndCosine(twist", "sineAndCosine(2.0f * twist");
-    playWhileRight(player, kHangMs);
-    EXPECT_FALSE(fSession->verified()) << "the mended kernel was not taken";
+    playWhileVerified(player, kHangMs);
+    EXPECT_FALSE(fSession->verified()) << "the corrected kernel was not loaded";
 }
 
-// A square on the floor: in one plane with the ground that is drawn below it.
+// A square at y = 0, where the ground is drawn.
 class FlatModelTest : public WindowTest {
 protected:
     FlatModelTest()
@@ -230,7 +230,7 @@ private:
     const QTemporaryDir fFolder;
 };
 
-TEST_F(FlatModelTest, GroundHidesNoPartOfIt)
+TEST_F(FlatModelTest, GroundDoesNotHideAModelAtItsHeight)
 {
     Player player(*fSession);
     ASSERT_FALSE(player.renderFrame());
@@ -246,13 +246,13 @@ TEST_F(FlatModelTest, GroundHidesNoPartOfIt)
     }
 }
 
-TEST_F(WindowTest, EveryFrameIsRightInEachStateOfTheKeys)
+TEST_F(WindowTest, FramesMatchTheCpuReferenceAfterEachKey)
 {
     Player player(*fSession);
-    for (const std::size_t number : {1U, 2U, 1U, 9U, 2U}) {
-        player.toggleDeformer(number);
+    for (const std::size_t index : {1U, 2U, 1U, 9U, 2U}) {
+        player.toggleDeformer(index);
         ASSERT_FALSE(player.renderFrame());
-        EXPECT_TRUE(fSession->verified()) << number;
+        EXPECT_TRUE(fSession->verified()) << index;
     }
     for (const Action action : {Action::kPause, Action::kDeformers, Action::kSideBySide,
                                 Action::kDetail, Action::kDeformers, Action::kSideBySide}) {

@@ -1,4 +1,4 @@
-// What the keys of the playing window do.
+// Keys of the window.
 #pragma once
 
 #include <cstddef>
@@ -9,16 +9,16 @@ namespace viewer {
 
 enum class Action { kPause, kDeformers, kSideBySide, kOverlay, kDetail, kResetView, kQuit };
 
-// The place in the chain of the deformer that the key (of Qt::Key) switches: 0 for the key 1.
-// Nothing for other keys.
-std::optional<std::size_t> deformerOf(int key);
+// Returns the index in the chain of the deformer that a key (Qt::Key) toggles: 0 for the key 1.
+// Empty for keys other than 1 to 9.
+[[nodiscard]] std::optional<std::size_t> deformerOfKey(int key) noexcept;
 
-// Nothing when the key (of Qt::Key) does nothing.
-std::optional<Action> actionOf(int key);
+// Returns the action of a key (Qt::Key), empty if it has none.
+[[nodiscard]] std::optional<Action> actionOfKey(int key) noexcept;
 
-// A line for each key.
-std::string keyHelp();
-// The same in one short line.
-std::string keyReminder();
+// Returns help with one line for each key.
+[[nodiscard]] std::string keyHelp();
+// Returns a summary of the keys in one short line.
+[[nodiscard]] std::string keySummary();
 
 } // namespace viewer

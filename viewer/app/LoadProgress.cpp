@@ -12,7 +12,7 @@ namespace viewer {
 namespace {
 
 constexpr char kTitle[] = "vyra-viewer";
-// Seconds between two lines on standard error, after the first.
+// Seconds between lines on standard error, after the first line at one second.
 constexpr int kLinePeriod = 5;
 
 } // namespace

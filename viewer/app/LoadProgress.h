@@ -1,4 +1,4 @@
-// What the user sees while a model is loaded.
+// Shows the progress of loading a model.
 #pragma once
 
 #include <string>
@@ -7,7 +7,7 @@ class QWindow;
 
 namespace viewer {
 
-// Shows the seconds in the window's title and on standard error, from one second on.
+// Shows the elapsed seconds in the window's title and on standard error.
 class LoadProgress {
 public:
     // Borrows the window.
@@ -17,8 +17,9 @@ public:
     LoadProgress(const LoadProgress&) = delete;
     LoadProgress& operator=(const LoadProgress&) = delete;
 
-    // Handles the window's events. Returns false once the user closed the window or pressed Ctrl-C.
-    bool show(int seconds);
+    // Updates the title if `seconds` has increased, and processes the window's events. Returns
+    // false if the user has closed the window or pressed Ctrl-C.
+    [[nodiscard]] bool show(int seconds);
 
 private:
     QWindow& fWindow;

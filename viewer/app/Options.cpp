@@ -10,19 +10,18 @@
 namespace viewer {
 namespace {
 
-// A picture that a graphics card can hold in one piece, and a crowd that fits into memory.
+// Limits of graphics cards and of memory.
 constexpr int kLargestPicture = 8192;
 constexpr int kLargestCrowd = 10000;
 constexpr int kMostFrames = 1000000;
 constexpr int kMostVertices = 1000000000;
-// What a picture needs to show anything.
-constexpr int kSmallestPicture = 16;
-constexpr int kLongestLoad = 86400; // a day
+constexpr int kSmallestPicture = 16; // pixels
+constexpr int kLongestLoad = 86400;  // seconds, a day
 
 constexpr char kExitCodes[] =
     R"(
 Exit codes:
-  0  all is well
+  0  success
   1  --verify found a deviation above the bound
   2  wrong options
   3  the model cannot be used
@@ -37,42 +36,42 @@ Exit codes:
 void describe(QCommandLineParser& parser)
 {
     parser.setApplicationDescription(
-        "Shows an animated character that OpenCL deforms straight into the buffers that OpenGL "
-        "draws from.");
+        "Shows an animated character that OpenCL deforms in the vertex buffers that OpenGL draws "
+        "from.");
     parser.addOptions({
         {{"h", "help"}, "Shows this text."},
         {"version", "Shows the version."},
-        {"frames", "Renders <n> frames and ends; without it a window plays.", "n"},
-        {"crowd", "Shows <n> characters, each with buffers of its own.", "n"},
-        {"size", "Size of the picture in pixels (1280x720).", "WxH"},
+        {"frames", "Renders <n> frames and exits (default: plays in a window).", "n"},
+        {"crowd", "Shows <n> characters, each with its own buffers.", "n"},
+        {"size", "Size of the picture in pixels (default: 1280x720).", "WxH"},
         {"output", "Writes the frames as PNG into <folder>; needs --frames.", "folder"},
         {"every", "Writes only every <k>-th frame.", "k"},
         {"verify", "Compares every frame with a CPU reference."},
         {"trace", "Writes a timeline for Perfetto to <file>.", "file"},
-        {"animation", "Plays the animation called <name>.", "name"},
+        {"animation", "Plays the animation <name> (default: the first).", "name"},
         {"deformers",
-         QString("Deforms with this chain, in this order (%1), such as "
+         QString("Applies these deformers in this order (default: %1), for example "
                  "skin,wave:amplitude=0.1:wavelength=0.5.")
              .arg(kDefaultDeformers),
          "list", kDefaultDeformers},
         {"min-verts", "Deforms meshes with fewer than <n> vertices on the CPU.", "n"},
         {"platform", "Uses the OpenCL platform of this <vendor>.", "vendor"},
-        {"allow-cpu", "Deforms on the CPU where OpenCL cannot be used."},
+        {"allow-cpu", "Deforms on the CPU if OpenCL cannot be used."},
         {"resize-every", "Changes the level of detail every <n> frames.", "n"},
-        {"up", "Axis of the file that points up: x, y or z (as the file says, else y).", "axis"},
-        {"crease", "Edges sharper than <degrees> stay sharp in a model without normals (60).",
+        {"up", "Axis of the file that points up: x, y or z (default: the file's, or y).", "axis"},
+        {"crease", "In a model without normals, keeps edges above this angle sharp (default: 60).",
          "degrees"},
-        {"load-limit", "Gives up a model that takes longer than <s> seconds to load (60).", "s"},
+        {"load-limit", "Cancels the load of a model after <s> seconds (default: 60).", "s"},
     });
     parser.addPositionalArgument("MODEL", "A model file, or a sample such as X/Testwuson.X.");
 }
 
-Failure wrongUse(const QString& text)
+Failure usageError(const QString& text)
 {
     return {ExitCode::kUsage, text.toStdString() + "; see vyra-viewer --help"};
 }
 
-// Reads the options one by one and keeps the first complaint.
+// Reads the values of options and keeps the first error.
 class Reader {
 public:
     explicit Reader(const QCommandLineParser& parser) : fParser(parser) {}
@@ -81,7 +80,7 @@ public:
     {
         const QString value = fParser.value(name);
         if (fParser.isSet(name) && value.isEmpty())
-            complain(QString("--%1 takes a value that is not empty").arg(name));
+            reject(QString("--%1 takes a value that is not empty").arg(name));
         return value.toStdString();
     }
 
@@ -92,7 +91,7 @@ public:
             return std::nullopt;
         const auto index = names.indexOf(fParser.value(name));
         if (index < 0)
-            complain(QString("--%1 takes x, y or z, not '%2'").arg(name, fParser.value(name)));
+            reject(QString("--%1 takes x, y or z, not '%2'").arg(name, fParser.value(name)));
         return static_cast<UpAxis>(index);
     }
 
@@ -104,11 +103,11 @@ public:
         const int value = fParser.value(name).toInt(&isNumber);
         if (isNumber && value >= lowest && value <= highest)
             return value;
-        complain(QString("--%1 takes a whole number from %2 to %3, not '%4'")
-                     .arg(name)
-                     .arg(lowest)
-                     .arg(highest)
-                     .arg(fParser.value(name)));
+        reject(QString("--%1 takes a whole number from %2 to %3, not '%4'")
+                   .arg(name)
+                   .arg(lowest)
+                   .arg(highest)
+                   .arg(fParser.value(name)));
         return std::nullopt;
     }
 
@@ -121,10 +120,10 @@ public:
         const QSize size(match.captured(1).toInt(), match.captured(2).toInt());
         if (std::min(size.width(), size.height()) < kSmallestPicture ||
             std::max(size.width(), size.height()) > kLargestPicture)
-            complain(QString("--size takes WIDTHxHEIGHT, each from %1 to %2, not '%3'")
-                         .arg(kSmallestPicture)
-                         .arg(kLargestPicture)
-                         .arg(fParser.value("size")));
+            reject(QString("--size takes WIDTHxHEIGHT, each from %1 to %2, not '%3'")
+                       .arg(kSmallestPicture)
+                       .arg(kLargestPicture)
+                       .arg(fParser.value("size")));
         return size;
     }
 
@@ -133,14 +132,14 @@ public:
         Result<std::vector<DeformerChoice>> chain = parseDeformers(text("deformers"));
         if (chain)
             return std::move(chain.value());
-        complain(QString::fromStdString(chain.failure().text));
+        reject(QString::fromStdString(chain.failure().text));
         return {};
     }
 
-    void complain(const QString& text)
+    void reject(const QString& text)
     {
         if (!fFailure)
-            fFailure = wrongUse(text);
+            fFailure = usageError(text);
     }
 
     const Status& failure() const { return fFailure; }
@@ -175,10 +174,9 @@ Options read(const QCommandLineParser& parser, Reader& reader)
     if (models.size() == 1 && !models.front().isEmpty())
         options.model = models.front().toStdString();
     else
-        reader.complain(models.size() > 1 ? "more than one model is given"
-                                          : "the model is missing");
+        reader.reject(models.size() > 1 ? "more than one model is given" : "the model is missing");
     if (!options.output.empty() && !parser.isSet("frames"))
-        reader.complain("--output needs --frames, so that it is known how many pictures to write");
+        reader.reject("--output needs --frames, the number of frames to render");
     return options;
 }
 
@@ -189,7 +187,7 @@ Result<Options> parseOptions(const QStringList& arguments)
     QCommandLineParser parser;
     describe(parser);
     if (!parser.parse(arguments))
-        return wrongUse(parser.errorText().remove('.'));
+        return usageError(parser.errorText().remove('.'));
     if (parser.isSet("help") || parser.isSet("version")) {
         Options options;
         options.help = parser.isSet("help");

@@ -1,4 +1,4 @@
-// What the user asked for on the command line.
+// Command-line options.
 #pragma once
 
 #include "viewer/Failure.h"
@@ -17,29 +17,30 @@ namespace viewer {
 struct Options {
     std::string model;
     ImportSettings import;
-    int loadLimit = 60;                    // seconds that a model may take to load
-    std::string importProgram;             // imports models; empty: this process does
+    int loadLimit = 60;                    // seconds for loading a model
+    std::string importProgram;             // for the import process; empty: no child process
     std::vector<DeformerChoice> deformers; // the chain, in order
-    std::string animation;                 // empty: the model's first
-    std::optional<int> frames;             // render so many and end; unset: play in a window
+    std::string animation;                 // empty: the first of the model
+    std::optional<int> frames;             // number to render; unset: play in a window
     int crowd = 1;                         // number of characters
     QSize size{1280, 720};                 // pixels
     std::string output;                    // folder of the pictures; empty: none
-    int every = 1;                         // each so many frames a picture
+    int every = 1;                         // period of the pictures, frames
     bool verify = false;                   // compare with the CPU reference
     std::string trace;                     // file of the trace; empty: none
-    std::optional<int> minimumVertices;    // below it a mesh is deformed on the CPU
+    std::optional<int> minimumVertices;    // the CPU deforms meshes with fewer
     std::string platform;                  // vendor of the OpenCL platform; empty: by the renderer
-    bool allowCpu = false;                 // go on without OpenCL
-    int resizeEvery = 0;                   // each so many frames another level of detail; 0: never
+    bool allowCpu = false;                 // continue without OpenCL
+    int resizeEvery = 0;                   // period of level changes, frames; 0: none
     bool help = false;
     bool version = false;
 };
 
-// `arguments` begins with the program's name. With --help or --version nothing else is checked.
-Result<Options> parseOptions(const QStringList& arguments);
+// Parses the command line. `arguments` begins with the program's name. With --help or --version,
+// values of other options are not checked.
+[[nodiscard]] Result<Options> parseOptions(const QStringList& arguments);
 
-// The text of --help. Needs an application object.
-std::string helpText();
+// Returns the text of --help. Needs a QCoreApplication.
+[[nodiscard]] std::string helpText();
 
 } // namespace viewer

@@ -8,33 +8,58 @@
 namespace viewer {
 namespace {
 
-// Numbers that change faster cannot be read.
+// Period of updates of the overlay. Numbers that change faster are unreadable.
 constexpr qint64 kTextPeriodMs = 250;
+constexpr double kMsPerSecond = 1000.0;
 
 } // namespace
 
+double PlayClock::seconds() const
+{
+    return static_cast<double>(milliseconds()) / kMsPerSecond;
+}
+
+void PlayClock::togglePause()
+{
+    fBeforeMs = milliseconds();
+    if (paused())
+        fSinceResumed.start();
+    else
+        fSinceResumed.invalidate();
+}
+
+void FrameRate::countFrame()
+{
+    constexpr qint64 kPeriodMs = 500; // steady enough to be read
+    fFrames += 1;
+    if (fSincePeriod.elapsed() < kPeriodMs)
+        return;
+    fPerSecond = fFrames * kMsPerSecond / static_cast<double>(fSincePeriod.restart());
+    fFrames = 0;
+}
+
 Player::Player(Session& session)
-    : fSession(session), fKernelWatch(QString::fromStdString(session.kernelFolder()))
+    : fSession(session), fKernelWatcher(QString::fromStdString(session.kernelFolder()))
 {
 }
 
 Status Player::renderFrame()
 {
-    takeChangedKernels();
+    reloadChangedKernels();
     fFrameRate.countFrame();
     return fSession.renderFrame(fClock.seconds());
 }
 
-void Player::takeChangedKernels()
+void Player::reloadChangedKernels()
 {
-    for (const ChangedFile& file : fKernelWatch.changes()) {
-        fComplaints.erase(file.name);
+    for (const ChangedFile& file : fKernelWatcher.changes()) {
+        fBuildErrors.erase(file.name);
         fSinceTexts.invalidate();
         const vyra::Status status = fSession.replaceKernelFile(file.name, file.text);
         if (status.ok())
             continue;
-        fComplaints[file.name] = status.message;
-        std::fprintf(stderr, "vyra-viewer: going on with the last good kernel: %s\n",
+        fBuildErrors[file.name] = status.message;
+        std::fprintf(stderr, "vyra-viewer: keeping the last good kernel: %s\n",
                      status.message.c_str());
     }
 }
@@ -49,29 +74,30 @@ void Player::showIn(unsigned framebuffer, const QSize& framebufferSize, double p
     fOverlay.draw(framebufferSize);
 }
 
-// A kernel that does not build is told also where the rest of the overlay is off.
+// Shows build errors even if the overlay is hidden.
 OverlayTexts Player::texts() const
 {
     OverlayTexts texts;
-    for (const auto& [file, complaint] : fComplaints)
-        texts.problem += beginningOf(complaint);
+    for (const auto& [file, error] : fBuildErrors)
+        texts.error += firstLines(error);
     if (!fShowsOverlay)
         return texts;
-    OverlayFacts facts = fSession.overlayFacts();
-    facts.paused = fClock.paused();
-    facts.framesPerSecond = fFrameRate.perSecond();
-    texts.facts = overlayText(facts);
-    if (facts.cpuTwinMs) {
-        texts.leftHalf = facts.share.allOnCpu() ? "CPU" : "OpenCL";
+    OverlayContent content = fSession.overlayContent();
+    content.paused = fClock.paused();
+    content.keys = keySummary();
+    content.framesPerSecond = fFrameRate.perSecond();
+    texts.statistics = overlayText(content);
+    if (content.cpuSceneMs) {
+        texts.leftHalf = content.distribution.allOnCpu() ? "CPU" : "OpenCL";
         texts.rightHalf = "CPU";
     }
     return texts;
 }
 
-void Player::toggleDeformer(std::size_t number)
+void Player::toggleDeformer(std::size_t index)
 {
     fSinceTexts.invalidate();
-    fSession.toggleDeformer(number);
+    fSession.toggleDeformer(index);
 }
 
 void Player::act(Action action)
@@ -85,7 +111,7 @@ void Player::act(Action action)
         fSession.toggleDeformers();
         break;
     case Action::kSideBySide:
-        fSession.toggleCpuTwin();
+        fSession.toggleCpuScene();
         break;
     case Action::kDetail:
         fSession.changeDetail();

@@ -8,7 +8,7 @@
 namespace viewer {
 namespace {
 
-// Writes lines of a label and what belongs to it.
+// Writes lines of a label and a value.
 class Lines {
 public:
     std::ostream& operator()(const char* label)
@@ -37,7 +37,7 @@ std::string mebibytes(std::size_t bytes)
     return text.str();
 }
 
-void addOpenCL(const OpenCLFacts& cl, Lines& line)
+void addOpenCL(const OpenCLStatistics& cl, Lines& line)
 {
     line("OpenCL device") << cl.device << (cl.doublePrecision ? ", double" : ", single")
                           << " precision";
@@ -45,15 +45,15 @@ void addOpenCL(const OpenCLFacts& cl, Lines& line)
     line("OpenCL to OpenGL") << cl.clToGraphics;
 }
 
-void addMeshes(const RunFacts& facts, Lines& line)
+void addMeshes(const RunStatistics& run, Lines& line)
 {
-    line("Characters") << facts.characters;
-    line("Meshes") << facts.share.meshes << " with " << facts.vertices << " vertices";
-    line("Deformers") << facts.deformers;
-    line("Deformed by") << deformedBy(facts.share);
+    line("Characters") << run.characters;
+    line("Meshes") << run.distribution.meshes << " with " << run.vertices << " vertices";
+    line("Deformers") << run.deformers;
+    line("Deformed by") << deformedBy(run.distribution);
 }
 
-void addCounts(const OpenCLFacts& cl, Lines& line)
+void addCounts(const OpenCLStatistics& cl, Lines& line)
 {
     const vyra::EvaluatorCounts& counts = cl.counts;
     line("Acquires per frame") << std::setprecision(3)
@@ -67,13 +67,13 @@ void addCounts(const OpenCLFacts& cl, Lines& line)
                           << mebibytes(cl.peakDeviceBytes);
 }
 
-void addDeviation(const Deviation& deviation, const MeshShare& share, Lines& line)
+void addDeviation(const Deviation& deviation, const MeshDistribution& distribution, Lines& line)
 {
     line("Largest deviation") << std::scientific << std::setprecision(2) << deviation.position
                               << " of a character's size (bound " << kPositionBound << "), normals "
                               << deviation.normal << " (bound " << deviation.normalBound
                               << "): " << (deviation.withinBound() ? "passed" : "FAILED");
-    if (share.allOnCpu())
+    if (distribution.allOnCpu())
         line("") << "Nothing ran on OpenCL: the CPU was compared with itself.";
 }
 
@@ -89,22 +89,22 @@ double percentile(std::vector<double> values, double part)
     return values[std::min(index, values.size() - 1)];
 }
 
-std::string reportText(const RunFacts& facts)
+std::string reportText(const RunStatistics& run)
 {
     Lines line;
-    if (facts.openCL)
-        addOpenCL(*facts.openCL, line);
-    line("OpenGL renderer") << facts.renderer;
-    addMeshes(facts, line);
-    line("Frames") << facts.evaluationMs.size();
+    if (run.openCL)
+        addOpenCL(*run.openCL, line);
+    line("OpenGL renderer") << run.renderer;
+    addMeshes(run, line);
+    line("Frames") << run.evaluationMs.size();
     line("Evaluation time") << std::fixed << std::setprecision(2)
-                            << percentile(facts.evaluationMs, 0.5) << " ms median, "
-                            << percentile(facts.evaluationMs, 0.95) << " ms 95th percentile"
+                            << percentile(run.evaluationMs, 0.5) << " ms median, "
+                            << percentile(run.evaluationMs, 0.95) << " ms 95th percentile"
                             << std::defaultfloat;
-    if (facts.openCL)
-        addCounts(*facts.openCL, line);
-    if (facts.deviation)
-        addDeviation(*facts.deviation, facts.share, line);
+    if (run.openCL)
+        addCounts(*run.openCL, line);
+    if (run.deviation)
+        addDeviation(*run.deviation, run.distribution, line);
     return line.text();
 }
 

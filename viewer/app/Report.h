@@ -1,8 +1,8 @@
-// What the viewer tells at the end.
+// Report that the viewer prints at the end.
 #pragma once
 
 #include "evaluator/Evaluator.h"
-#include "viewer/opencl/MeshShare.h"
+#include "viewer/opencl/MeshDistribution.h"
 #include "viewer/opencl/Verification.h"
 
 #include <cstddef>
@@ -12,31 +12,33 @@
 
 namespace viewer {
 
-// How OpenCL was used.
-struct OpenCLFacts {
+// Use of OpenCL.
+struct OpenCLStatistics {
     std::string device;
     std::string graphicsToCL; // the two synchronisation modes
     std::string clToGraphics;
     bool doublePrecision = false;
     vyra::EvaluatorCounts counts;
-    std::size_t deviceBytes = 0;
+    std::size_t deviceBytes = 0; // of buffers
     std::size_t peakDeviceBytes = 0;
 };
 
-struct RunFacts {
-    std::optional<OpenCLFacts> openCL; // empty: everything was deformed on the CPU
+// Statistics of one run.
+struct RunStatistics {
+    std::optional<OpenCLStatistics> openCL; // empty if the CPU deformed everything
     std::string renderer;
     std::size_t characters = 0;
-    MeshShare share;                  // of the meshes of all characters
-    std::size_t vertices = 0;         // of all characters
-    std::string deformers;            // the chain
-    std::vector<double> evaluationMs; // of each frame, from its start until it could be drawn
-    std::optional<Deviation> deviation;
+    MeshDistribution distribution;      // of the meshes of all characters
+    std::size_t vertices = 0;           // of all characters
+    std::string deformers;              // the chain
+    std::vector<double> evaluationMs;   // of each frame, from its start until it is ready to draw
+    std::optional<Deviation> deviation; // empty without --verify
 };
 
-std::string reportText(const RunFacts& facts);
+[[nodiscard]] std::string reportText(const RunStatistics& run);
 
-// The smallest of the values that at least this part (0 to 1) of all does not exceed. 0 for none.
-double percentile(std::vector<double> values, double part);
+// Returns the smallest value that is not less than the fraction `part` (0 to 1) of all values
+// (nearest-rank percentile). Returns 0 for no values.
+[[nodiscard]] double percentile(std::vector<double> values, double part);
 
 } // namespace viewer

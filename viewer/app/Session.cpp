@@ -7,9 +7,8 @@
 #include "standalone/ProfileRecorder.h"
 #include "viewer/app/LoadProgress.h"
 #include "viewer/model/import/ImportProcess.h"
-#include "viewer/opencl/DeviceName.h"
+#include "viewer/opencl/OpenCLNames.h"
 #include "viewer/opencl/OpenCLStart.h"
-#include "viewer/opencl/SyncModeNames.h"
 #include "viewer/system/FileOutput.h"
 
 #include <algorithm>
@@ -25,9 +24,9 @@
 namespace viewer {
 namespace {
 
-// Evaluations are numbered in 15 bits, which leaves out the one number that names none.
+// Evaluation ids have 15 bits here, which excludes the invalid id.
 constexpr int kEvaluationNumbers = 0x8000;
-// Frames over which the overlay's time is a median: steady, and still of the present.
+// Frames whose median the overlay shows: enough for a steady value, few enough to follow changes.
 constexpr std::size_t kRecentFrames = 30;
 
 float aspectOf(const QSize& size)
@@ -50,7 +49,7 @@ Result<const Animation*> chooseAnimation(const Model& model, const std::string& 
                        (known.empty() ? "it has none at all" : "it has " + known)};
 }
 
-Status statusOf(const vyra::Status& status)
+[[nodiscard]] Status statusOf(const vyra::Status& status)
 {
     if (status.ok())
         return {};
@@ -67,8 +66,8 @@ Session::Session(const Options& options, QOpenGLWindow& window) : fOptions(optio
 {
 }
 
-// The evaluation first, which waits for OpenCL; then the shared buffers, with the scene; the
-// context goes last, with the window.
+// The order of the members matters: the scene removes its meshes from the evaluator, which outlives
+// it.
 Session::~Session() = default;
 
 Status Session::start(const QSize& pictureSize)
@@ -118,17 +117,17 @@ Result<Model> Session::importChosenModel()
     const ImportChild child{fOptions.importProgram, fOptions.loadLimit,
                             [&progress](int seconds) { return progress.show(seconds); }};
     Result<Model> model = importInChild(child, fOptions.model, fOptions.import);
-    fWindow.makeCurrent(); // events were handled meanwhile
+    fWindow.makeCurrent(); // event handlers may have changed the context
     return model;
 }
 
 Status Session::startOpenCLIfPossible()
 {
-    Status failure = startOpenCL(fWindow, fOptions);
+    Status failure = startOpenCL(fWindow, fOptions.platform, fOptions.allowCpu);
     if (failure && !fOptions.allowCpu)
         return failure;
     if (failure) {
-        std::fprintf(stderr, "vyra-viewer: going on without OpenCL: %s\n", failure->text.c_str());
+        std::fprintf(stderr, "vyra-viewer: continuing without OpenCL: %s\n", failure->text.c_str());
         return {};
     }
     if (fOptions.minimumVertices)
@@ -159,15 +158,15 @@ Status Session::attachEvaluator()
 {
     fEvaluator = std::make_unique<vyra::Evaluator>(evaluatorSettings());
     fScene->attach(*fEvaluator, fOptions.deformers);
-    fScene->pose(0); // the deformers are checked with what they need
+    fScene->pose(0); // prepare() checks the input of the deformers
     return statusOf(fEvaluator->prepare());
 }
 
 Status Session::renderFrame(double seconds)
 {
     fScene->pose(seconds);
-    if (fCpuTwin)
-        fCpuTwin->follow(*fScene);
+    if (fCpuScene)
+        fCpuScene->update(*fScene);
 
     const auto begin = std::chrono::steady_clock::now();
     if (Status failure = evaluate())
@@ -175,7 +174,7 @@ Status Session::renderFrame(double seconds)
     const auto end = std::chrono::steady_clock::now();
     fEvaluationMs.push_back(std::chrono::duration<double, std::milli>(end - begin).count());
 
-    // Before the drawing, which takes so long that it would hide a wait that is missing.
+    // Verify before drawing, whose duration would hide a missing wait.
     if (fOptions.verify) {
         const vyra::ProfileScope scope("Verify");
         if (!fDeviation)
@@ -189,17 +188,17 @@ Status Session::renderFrame(double seconds)
     return failure;
 }
 
-// The original, and its copy where there is one, on the left and the right.
+// Draws the scene, or the scene on the left and its CPU copy on the right.
 void Session::draw()
 {
     const vyra::ProfileScope scope("Draw");
     const QRect left(QPoint(), viewSize());
     fRenderer->draw(*fScene, fCamera, *fCanvas, left);
-    if (fCpuTwin)
-        fRenderer->draw(fCpuTwin->scene(), fCamera, *fCanvas, left.translated(left.width(), 0));
+    if (fCpuScene)
+        fRenderer->draw(fCpuScene->scene(), fCamera, *fCanvas, left.translated(left.width(), 0));
 }
 
-// From here to the return is what the report calls the evaluation time.
+// The report's evaluation time is the duration of this function.
 Status Session::evaluate()
 {
     const vyra::ProfileScope scope("Evaluate");
@@ -217,7 +216,7 @@ Status Session::evaluate()
     return {};
 }
 
-// Opens and closes the evaluation itself, as a host does whose graph has other users of the shared
+// Opens and closes the evaluation itself, like a host whose graph has other users of shared
 // buffers.
 void Session::evaluateWithLevelChange(const em::Id& id)
 {
@@ -231,8 +230,8 @@ void Session::evaluateWithLevelChange(const em::Id& id)
     TopenCLInfo::flush();
 }
 
-// --resize-every changes the level of detail in turn before and during an evaluation; the key does
-// so before.
+// --resize-every changes the level of detail alternately before and during an evaluation, the key
+// only before.
 bool Session::levelChangeIsDue(EvaluationState state) const
 {
     if (fChangeAll && state == EvaluationState::kClosed)
@@ -243,8 +242,8 @@ bool Session::levelChangeIsDue(EvaluationState state) const
     return isOddChange == (state == EvaluationState::kOpen);
 }
 
-// Of one mesh of each character, a different one each time, so that buffers in the batch and new
-// ones outside meet in one evaluation.
+// Changes one mesh of each character, a different one each time. So an evaluation has both old
+// buffers in the batch and new ones outside it.
 void Session::changeLevels()
 {
     const std::size_t count = fScene->meshesPerCharacter();
@@ -265,7 +264,7 @@ void Session::resize(const QSize& pictureSize)
 QSize Session::viewSize() const
 {
     const QSize size = fCanvas->size();
-    return fCpuTwin ? QSize(size.width() / 2, size.height()) : size;
+    return fCpuScene ? QSize(size.width() / 2, size.height()) : size;
 }
 
 void Session::frameScene()
@@ -273,12 +272,12 @@ void Session::frameScene()
     fCamera.frame(fScene->outline(), aspectOf(viewSize()));
 }
 
-void Session::toggleCpuTwin()
+void Session::toggleCpuScene()
 {
-    if (fCpuTwin)
-        fCpuTwin.reset();
+    if (fCpuScene)
+        fCpuScene.reset();
     else
-        fCpuTwin = std::make_unique<CpuTwin>(*fGL, fModel, fAnimation, fOptions.crowd);
+        fCpuScene = std::make_unique<CpuScene>(*fGL, fModel, fAnimation, fOptions.crowd);
     frameScene();
 }
 
@@ -312,64 +311,64 @@ Status Session::writePicture() const
                                           "; choose another folder with --output"};
 }
 
-OpenCLFacts Session::openCLFacts() const
+OpenCLStatistics Session::openCLStatistics() const
 {
     const TopenCLInfo& info = TopenCLInfo::theOne();
     const DeviceMemoryUse memory = deviceMemoryUse();
-    OpenCLFacts facts;
-    facts.device = deviceName(info.openCLDevice());
-    facts.graphicsToCL = nameOf(info.graphicsToCLSyncMode());
-    facts.clToGraphics = nameOf(info.clToGraphicsSyncMode());
-    facts.doublePrecision = info.supportsDoublePrecision();
-    facts.counts = fEvaluator->counts();
-    facts.deviceBytes = memory.currentBytes;
-    facts.peakDeviceBytes = memory.peakBytes;
-    return facts;
+    OpenCLStatistics statistics;
+    statistics.device = deviceName(info.openCLDevice());
+    statistics.graphicsToCL = nameOf(info.graphicsToCLSyncMode());
+    statistics.clToGraphics = nameOf(info.clToGraphicsSyncMode());
+    statistics.doublePrecision = info.supportsDoublePrecision();
+    statistics.counts = fEvaluator->counts();
+    statistics.deviceBytes = memory.currentBytes;
+    statistics.peakDeviceBytes = memory.peakBytes;
+    return statistics;
 }
 
-MeshShare Session::meshShare() const
+MeshDistribution Session::meshDistribution() const
 {
-    MeshShare share;
-    share.openCLIsUsed = fEvaluator->usesOpenCL();
-    if (share.openCLIsUsed)
-        share.minimumVertices = TopenCLInfo::theOne().minimumBufferSize();
-    share.meshes = fScene->meshes().size();
+    MeshDistribution distribution;
+    distribution.openCLIsUsed = fEvaluator->usesOpenCL();
+    if (distribution.openCLIsUsed)
+        distribution.minimumVertices = TopenCLInfo::theOne().minimumBufferSize();
+    distribution.meshes = fScene->meshes().size();
     for (const CharacterMesh* mesh : fScene->meshes())
-        share.meshesOnCpu += mesh->deformable->usesOpenCL() ? 0 : 1;
-    return share;
+        distribution.meshesOnCpu += mesh->deformable->usesOpenCL() ? 0 : 1;
+    return distribution;
 }
 
-OverlayFacts Session::overlayFacts() const
+OverlayContent Session::overlayContent() const
 {
-    OverlayFacts facts;
+    OverlayContent content;
     if (fEvaluator->usesOpenCL()) {
-        const OpenCLFacts cl = openCLFacts();
-        facts.openCL = {cl.device, cl.graphicsToCL, cl.clToGraphics, fEvaluator->batchSize()};
+        const OpenCLStatistics cl = openCLStatistics();
+        content.openCL = {cl.device, cl.graphicsToCL, cl.clToGraphics, fEvaluator->batchSize()};
     }
-    facts.share = meshShare();
+    content.distribution = meshDistribution();
     const std::size_t recent = std::min(fEvaluationMs.size(), kRecentFrames);
     const auto end = fEvaluationMs.end();
-    facts.evaluationMs = percentile({end - static_cast<std::ptrdiff_t>(recent), end}, 0.5);
-    if (fCpuTwin)
-        facts.cpuTwinMs = fCpuTwin->milliseconds();
-    facts.deformers = chainText(fScene->deformers());
-    return facts;
+    content.evaluationMs = percentile({end - static_cast<std::ptrdiff_t>(recent), end}, 0.5);
+    if (fCpuScene)
+        content.cpuSceneMs = fCpuScene->milliseconds();
+    content.deformers = chainText(fScene->deformers());
+    return content;
 }
 
 std::string Session::report() const
 {
-    RunFacts facts;
+    RunStatistics run;
     if (fEvaluator->usesOpenCL())
-        facts.openCL = openCLFacts();
-    facts.renderer = reinterpret_cast<const char*>(fGL->glGetString(GL_RENDERER));
-    facts.characters = fScene->characters().size();
-    facts.share = meshShare();
+        run.openCL = openCLStatistics();
+    run.renderer = reinterpret_cast<const char*>(fGL->glGetString(GL_RENDERER));
+    run.characters = fScene->characters().size();
+    run.distribution = meshDistribution();
     for (const CharacterMesh* mesh : fScene->meshes())
-        facts.vertices += mesh->mesh().vertexCount();
-    facts.deformers = chainText(fScene->deformers());
-    facts.evaluationMs = fEvaluationMs;
-    facts.deviation = fDeviation;
-    return reportText(facts);
+        run.vertices += mesh->mesh().vertexCount();
+    run.deformers = chainText(fScene->deformers());
+    run.evaluationMs = fEvaluationMs;
+    run.deviation = fDeviation;
+    return reportText(run);
 }
 
 } // namespace viewer

@@ -1,4 +1,4 @@
-// One run of the viewer: a model on a stage, deformed and drawn frame after frame.
+// One run of the viewer: loads a model, then deforms and draws frames.
 #pragma once
 
 #include "viewer/Failure.h"
@@ -9,7 +9,7 @@
 #include "viewer/overlay/OverlayText.h"
 #include "viewer/render/Camera.h"
 #include "viewer/render/Canvas.h"
-#include "viewer/render/CpuTwin.h"
+#include "viewer/render/CpuScene.h"
 #include "viewer/render/Renderer.h"
 #include "viewer/render/Scene.h"
 
@@ -27,74 +27,80 @@
 
 namespace viewer {
 
-// Whether an evaluation is open: its batch is acquired.
+// State of an evaluation. While it is open, its batch is acquired.
 enum class EvaluationState { kClosed, kOpen };
 
-// All operations, and the destruction, need the window's context to be current.
+// The window's OpenGL context must be current in all operations and the destructor.
 class Session {
 public:
-    // Borrows the options and the window, whose context is valid.
+    // Borrows the options and the window, which has a valid context.
     Session(const Options& options, QOpenGLWindow& window);
     ~Session();
     Session(const Session&) = delete;
     Session& operator=(const Session&) = delete;
 
-    // Loads the model and starts OpenCL, or goes on without it where that is allowed.
-    Status start(const QSize& pictureSize);
-    // Evaluates, draws and, where asked for, compares and writes one frame.
-    Status renderFrame(double seconds);
-    // Draws into a picture of this size from now on.
+    // Loads the model and starts OpenCL. Continues without OpenCL if Options::allowCpu. Must
+    // succeed before other operations.
+    [[nodiscard]] Status start(const QSize& pictureSize);
+    // Evaluates and draws one frame; compares it and writes it if the options require it.
+    [[nodiscard]] Status renderFrame(double seconds);
+    // Sets the size of the picture in pixels.
     void resize(const QSize& pictureSize);
-    // Before the next frame every mesh changes its level of detail.
+    // Changes the level of detail of every mesh before the next frame.
     void changeDetail() { fChangeAll = true; }
-    // From the next frame on the meshes stay at rest, or are deformed again.
+    // Disable or enable deformers from the next frame on, see Scene.
     void toggleDeformers() { fScene->toggleDeformers(); }
-    void toggleDeformer(std::size_t number) { fScene->toggleDeformer(number); }
-    // Shows a copy that the CPU deforms on the right half of the picture, or no longer. The camera
-    // comes to where everything is seen.
-    void toggleCpuTwin();
+    void toggleDeformer(std::size_t index) { fScene->toggleDeformer(index); }
+    // Shows or hides a copy that the CPU deforms, on the right half of the picture. Resets zoom and
+    // pan of the camera.
+    void toggleCpuScene();
 
-    // Where the kernel files are. Empty without OpenCL.
-    std::string kernelFolder() const;
-    // Evaluator::replaceKernelFile.
-    vyra::Status replaceKernelFile(const std::string& file, const std::string& source);
+    // Returns the folder of the kernel files, empty without OpenCL.
+    [[nodiscard]] std::string kernelFolder() const;
+    // Calls Evaluator::replaceKernelFile.
+    [[nodiscard]] vyra::Status replaceKernelFile(const std::string& file,
+                                                 const std::string& source);
 
-    Camera& camera() { return fCamera; }
-    Canvas& canvas() { return *fCanvas; }
-    // False when a frame was beyond the bound of --verify.
-    bool verified() const { return !fDeviation || fDeviation->withinBound(); }
-    // False if OpenCL deforms no mesh.
-    bool usesOpenCL() const { return deformsOnOpenCL(*fScene); }
-    std::string report() const;
-    // Of the present, all but the pause.
-    OverlayFacts overlayFacts() const;
+    [[nodiscard]] Camera& camera() noexcept { return fCamera; }
+    [[nodiscard]] Canvas& canvas() noexcept { return *fCanvas; }
+    // Returns false if a frame exceeded the bound of --verify.
+    [[nodiscard]] bool verified() const noexcept
+    {
+        return !fDeviation || fDeviation->withinBound();
+    }
+    // Returns whether OpenCL deforms any mesh.
+    [[nodiscard]] bool usesOpenCL() const { return deformsOnOpenCL(*fScene); }
+    // Returns the report for the end of the run.
+    [[nodiscard]] std::string report() const;
+    // Returns the current values for the overlay, except the fields that Player sets.
+    [[nodiscard]] OverlayContent overlayContent() const;
 
 private:
-    Status loadModel();
-    Result<Model> importChosenModel();
-    Status startOpenCLIfPossible();
+    [[nodiscard]] Status loadModel();
+    [[nodiscard]] Result<Model> importChosenModel();
+    [[nodiscard]] Status startOpenCLIfPossible();
     vyra::EvaluatorSettings evaluatorSettings();
-    Status attachEvaluator();
-    Status evaluate();
+    [[nodiscard]] Status attachEvaluator();
+    [[nodiscard]] Status evaluate();
     void evaluateWithLevelChange(const em::Id& id);
     void draw();
     void frameScene();
-    QSize viewSize() const; // of one scene in the picture
+    QSize viewSize() const; // size of one scene in the picture
     void changeLevels();
     bool levelChangeIsDue(EvaluationState state) const;
-    Status writePicture() const;
-    OpenCLFacts openCLFacts() const;
-    MeshShare meshShare() const;
+    [[nodiscard]] Status writePicture() const;
+    OpenCLStatistics openCLStatistics() const;
+    MeshDistribution meshDistribution() const;
 
     const Options& fOptions;
     QOpenGLWindow& fWindow;
-    QOpenGLFunctions_3_3_Core* fGL = nullptr; // the context's
+    QOpenGLFunctions_3_3_Core* fGL = nullptr; // owned by the context
     std::unique_ptr<GLHost> fHost;
     Model fModel;
-    const Animation* fAnimation = nullptr;       // of fModel
+    const Animation* fAnimation = nullptr;       // in fModel; null at rest
     std::unique_ptr<vyra::Evaluator> fEvaluator; // outlives the scene, whose meshes it owns
     std::unique_ptr<Scene> fScene;
-    std::unique_ptr<CpuTwin> fCpuTwin; // null: the scene fills the picture
+    std::unique_ptr<CpuScene> fCpuScene; // null while it is hidden
     std::unique_ptr<Renderer> fRenderer;
     std::unique_ptr<Canvas> fCanvas;
     Camera fCamera;

@@ -16,13 +16,13 @@ namespace {
 
 constexpr qint64 kOpenTimeoutMs = 10000;
 constexpr int kEventSliceMs = 10;
-// Pixels: what the overlay's first lines need.
+// Pixels that the first lines of the overlay need.
 constexpr QSize kSmallestSize(160, 90);
 constexpr float kDegreesPerPixel = 0.4f;
-// Qt counts eighths of a degree, and a notch of a usual wheel is 15 degrees.
-constexpr float kUnitsPerNotch = 120.0f;
+// Qt measures eighths of a degree; a wheel step is usually 15 degrees.
+constexpr float kUnitsPerStep = 120.0f;
 
-// A window whose context cannot be made ends the process, so this is asked first.
+// Must be checked first: Qt ends the process if a window cannot create its context.
 bool openGLIsUsable()
 {
     QOpenGLContext context;
@@ -51,7 +51,7 @@ Status ViewerWindow::open(const QSize& size)
     show();
     QElapsedTimer timer;
     timer.start();
-    // A Wayland compositor ends the program that draws into a window before it is exposed.
+    // A Wayland compositor ends a program that draws into a window before it is exposed.
     while (!(isValid() && isExposed()) && timer.elapsed() < kOpenTimeoutMs)
         QGuiApplication::processEvents(QEventLoop::WaitForMoreEvents | QEventLoop::AllEvents,
                                        kEventSliceMs);
@@ -87,7 +87,7 @@ QSize ViewerWindow::pixelSize() const
 
 void ViewerWindow::resizeGL(int, int)
 {
-    // A window manager, or none, may allow less.
+    // A window manager may ignore the minimum size, and without one nothing enforces it.
     if (fPlayer)
         fPlayer->session().resize(pixelSize().expandedTo(kSmallestSize * devicePixelRatio()));
 }
@@ -105,18 +105,18 @@ void ViewerWindow::paintGL()
     fPlayer->showIn(defaultFramebufferObject(), pixelSize(), devicePixelRatio());
 }
 
-// Events come with no context current, and a player wants one.
+// Qt sends events without a current context, which the player requires.
 void ViewerWindow::keyPressEvent(QKeyEvent* event)
 {
-    const std::optional<Action> action = actionOf(event->key());
+    const std::optional<Action> action = actionOfKey(event->key());
     if (action == Action::kQuit) {
         close();
     } else if (action && fPlayer) {
         makeCurrent();
         fPlayer->act(*action);
-    } else if (const auto number = deformerOf(event->key()); number && fPlayer) {
+    } else if (const auto index = deformerOfKey(event->key()); index && fPlayer) {
         makeCurrent();
-        fPlayer->toggleDeformer(*number);
+        fPlayer->toggleDeformer(*index);
     }
 }
 
@@ -147,7 +147,7 @@ void ViewerWindow::wheelEvent(QWheelEvent* event)
 {
     if (fPlayer)
         fPlayer->session().camera().zoom(static_cast<float>(event->angleDelta().y()) /
-                                         kUnitsPerNotch);
+                                         kUnitsPerStep);
 }
 
 } // namespace viewer

@@ -1,4 +1,4 @@
-// The window that plays.
+// Window of the viewer.
 #pragma once
 
 #include "viewer/Failure.h"
@@ -13,23 +13,24 @@ namespace viewer {
 class Player;
 class Session;
 
-// Without a session it stays empty. With one it draws frame after frame; the mouse orbits and
-// pans, the wheel zooms; Controls.h lists the keys.
+// Shows the frames of a session. While it plays, the mouse orbits and pans, the wheel zooms, and
+// Controls.h lists the keys.
 class ViewerWindow : public QOpenGLWindow {
 public:
     ViewerWindow();
     ~ViewerWindow() override;
 
-    // Shows the window and waits until its OpenGL context is there.
-    Status open(const QSize& size);
+    // Shows the window and waits until it is exposed and has an OpenGL context. Fails without
+    // OpenGL 3.3.
+    [[nodiscard]] Status open(const QSize& size);
 
-    // Starts to play. The session is borrowed until stop(), which leaves the context current.
+    // Starts playing. The session is borrowed until stop(), which makes the context current.
     void play(Session& session);
     void stop();
-    // Why playing ended by itself.
-    const Status& failure() const { return fFailure; }
+    // Returns the failure that ended playing, if any.
+    [[nodiscard]] const Status& failure() const noexcept { return fFailure; }
 
-    // Shows what the session has drawn; for a caller that draws by itself.
+    // Shows the last frame of a session that does not play.
     void present(Session& session);
 
 protected:
@@ -43,7 +44,7 @@ protected:
 private:
     QSize pixelSize() const;
 
-    std::unique_ptr<Player> fPlayer; // null: nothing plays
+    std::unique_ptr<Player> fPlayer; // null if nothing plays
     Status fFailure;
     QPointF fLastPosition; // of the mouse
 };

@@ -1,5 +1,5 @@
-// vyra-viewer: an animated character, deformed by OpenCL straight into the vertex buffers that
-// OpenGL draws from.
+// vyra-viewer: shows an animated character that OpenCL deforms in the vertex buffers that OpenGL
+// draws from.
 #include "viewer/app/Options.h"
 #include "viewer/app/Session.h"
 #include "viewer/app/ViewerWindow.h"
@@ -29,28 +29,30 @@ using viewer::Session;
 using viewer::Status;
 using viewer::ViewerWindow;
 
-// Time between two frames that are rendered without a clock.
+// Animation time between two frames of --frames.
 constexpr double kSecondsPerFrame = 1.0 / 30.0;
-// Milliseconds between two looks for Ctrl-C in a window that may be hidden and draw nothing.
-constexpr int kInterruptPeriod = 100;
+// Period of checks for Ctrl-C, which also work in a hidden window, which draws no frames.
+constexpr int kInterruptPeriodMs = 100;
 
 constexpr char kOutOfMemory[] = "vyra-viewer: there is not enough memory; use a smaller crowd or "
                                 "model, or allow the process more\n";
 
-int tell(const Failure& failure)
+// Returns the exit code.
+int printFailure(const Failure& failure)
 {
     std::fprintf(stderr, "vyra-viewer: %s\n", failure.text.c_str());
     return static_cast<int>(failure.code);
 }
 
-// Qt ends the process when it finds no display, after messages that are of no use to the user.
-void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QString&)
+// Handler of Qt's messages. Without a display, Qt ends the process after messages that do not help
+// the user; this replaces them.
+void exitWithoutDisplay(QtMsgType type, const QMessageLogContext&, const QString&)
 {
     if (type != QtFatalMsg)
         return;
     const int code =
-        tell({ExitCode::kNoGraphics, "there is no display; start one, or run "
-                                     "this under a virtual one: xvfb-run -a vyra-viewer"});
+        printFailure({ExitCode::kNoGraphics, "there is no display; start one, or run "
+                                             "this under a virtual one: xvfb-run -a vyra-viewer"});
     std::_Exit(code);
 }
 
@@ -60,7 +62,8 @@ void sayThatThereIsNoDisplay(QtMsgType type, const QMessageLogContext&, const QS
     std::_Exit(static_cast<int>(ExitCode::kOutOfMemory));
 }
 
-// Memory may run out on any thread and in any callback, where nothing catches the exception.
+// Terminate handler: memory may run out in any thread and callback, where nothing catches the
+// exception.
 [[noreturn]] void endAfterException()
 {
     try {
@@ -92,7 +95,7 @@ QSurfaceFormat surfaceFormat(bool waitForDisplay)
     return format;
 }
 
-Status renderFrames(Session& session, ViewerWindow& window, int frames)
+[[nodiscard]] Status renderFrames(Session& session, ViewerWindow& window, int frames)
 {
     for (int i = 0; i < frames && !viewer::interrupted(); ++i) {
         if (Status failure = session.renderFrame(i * kSecondsPerFrame))
@@ -104,7 +107,7 @@ Status renderFrames(Session& session, ViewerWindow& window, int frames)
     return {};
 }
 
-Status playInWindow(Session& session, ViewerWindow& window)
+[[nodiscard]] Status playInWindow(Session& session, ViewerWindow& window)
 {
     window.play(session);
     QTimer timer;
@@ -112,13 +115,13 @@ Status playInWindow(Session& session, ViewerWindow& window)
         if (viewer::interrupted())
             QGuiApplication::exit();
     });
-    timer.start(kInterruptPeriod);
+    timer.start(kInterruptPeriodMs);
     QGuiApplication::exec();
     window.stop();
     return window.failure();
 }
 
-Status run(const Options& options, bool& verified)
+[[nodiscard]] Status run(const Options& options, bool& verified)
 {
     ViewerWindow window;
     if (Status failure = window.open(options.size))
@@ -127,7 +130,7 @@ Status run(const Options& options, bool& verified)
     Session session(options, window);
     if (Status failure = session.start(options.size))
         return failure;
-    reportCrashes(); // LLVM, which compiled kernels and shaders meanwhile, handles SIGABRT, too
+    reportCrashes(); // again: LLVM, which has compiled kernels and shaders, replaced the handlers
 
     Status failure = options.frames ? renderFrames(session, window, *options.frames)
                                     : playInWindow(session, window);
@@ -141,7 +144,7 @@ Status run(const Options& options, bool& verified)
     return failure;
 }
 
-Status runTraced(const Options& options, bool& verified)
+[[nodiscard]] Status runTraced(const Options& options, bool& verified)
 {
     if (options.trace.empty())
         return run(options, verified);
@@ -174,7 +177,7 @@ int main(int argc, char* argv[])
     reportCrashes();
     viewer::Result<Options> options = viewer::parseOptions(argumentsOf(argc, argv));
     if (!options)
-        return tell(options.failure());
+        return printFailure(options.failure());
     if (options.value().version) {
         std::puts("vyra-viewer " VYRA_VERSION);
         return static_cast<int>(ExitCode::kSuccess);
@@ -187,8 +190,8 @@ int main(int argc, char* argv[])
 
     const bool plays = !options.value().frames;
     QSurfaceFormat::setDefaultFormat(surfaceFormat(plays));
-    qInstallMessageHandler(sayThatThereIsNoDisplay);
-    // Only the program's name: Qt would take --platform for an option of its own.
+    qInstallMessageHandler(exitWithoutDisplay);
+    // Passes only the program's name, because Qt has an option --platform, too.
     int ownArguments = 1;
     const QGuiApplication application(ownArguments, argv);
     qInstallMessageHandler(nullptr);
@@ -197,11 +200,12 @@ int main(int argc, char* argv[])
 
     bool verified = true;
     if (const Status failure = runTraced(options.value(), verified))
-        return tell(*failure);
+        return printFailure(*failure);
     if (!verified)
-        return tell({ExitCode::kDeviation, "a frame deviates from the CPU reference by more than "
-                                           "the bound; see the report"});
+        return printFailure({ExitCode::kDeviation,
+                             "a frame deviates from the CPU reference by more than "
+                             "the bound; see the report"});
     if (viewer::interrupted())
-        return tell({ExitCode::kInterrupted, "interrupted"});
+        return printFailure({ExitCode::kInterrupted, "interrupted"});
     return static_cast<int>(ExitCode::kSuccess);
 }

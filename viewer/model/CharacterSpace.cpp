@@ -12,8 +12,8 @@
 namespace viewer {
 namespace {
 
-// Moments of a cycle that are measured: a run has two steps, so a dozen poses of each.
-constexpr int kMeasuredPoses = 24;
+// Poses sampled in one cycle: a run cycle has two steps, so this is a dozen poses of each.
+constexpr int kSampledPoses = 24;
 constexpr float kLargest = std::numeric_limits<float>::max();
 
 struct Bounds {
@@ -29,7 +29,7 @@ struct Bounds {
     }
 };
 
-// Towards the faces, edges and corners of a cube.
+// Returns directions to the faces, edges and corners of a cube.
 std::vector<QVector3D> outlineDirections()
 {
     std::vector<QVector3D> directions;
@@ -42,7 +42,7 @@ std::vector<QVector3D> outlineDirections()
     return directions;
 }
 
-// All vertices of a pose, in the model's space. The shapes are those of the model's meshes.
+// Returns all vertices of a pose in model space. `shapes` belong to the model's meshes, in order.
 std::vector<QVector3D> vertices(const Model& model, const std::vector<MeshShape>& shapes,
                                 const Animation* animation, double seconds)
 {
@@ -66,7 +66,7 @@ std::vector<QVector3D> vertices(const Model& model, const std::vector<MeshShape>
     return points;
 }
 
-// Appends the outermost of the points in each direction.
+// Appends the outermost point in each direction.
 void appendOutline(const std::vector<QVector3D>& points, std::vector<QVector3D>& outline)
 {
     static const std::vector<QVector3D> directions = outlineDirections();
@@ -85,7 +85,7 @@ CharacterSpace characterSpace(const Model& model, const Animation* animation)
     std::vector<QVector3D> outline;
     std::vector<MeshShape> shapes(model.meshes.size());
     std::transform(model.meshes.begin(), model.meshes.end(), shapes.begin(), shapeOf);
-    const int poses = animation && animation->seconds > 0 ? kMeasuredPoses : 1;
+    const int poses = animation && animation->seconds > 0 ? kSampledPoses : 1;
     for (int i = 0; i < poses; ++i) {
         const double seconds = animation ? animation->seconds * i / poses : 0.0;
         const std::vector<QVector3D> points = vertices(model, shapes, animation, seconds);

@@ -1,4 +1,4 @@
-// The space in which every character has the same size, whatever its file's units and origin.
+// Normalised space of a character, independent of the units and the origin of its file.
 #pragma once
 
 #include "viewer/model/Model.h"
@@ -10,14 +10,16 @@
 
 namespace viewer {
 
-// Feet at y = 0, upright along y, centred on the y axis, the largest extent 1.
+// In character space, feet are at y = 0, up is y, the y axis is the centre, the largest extent
+// is 1.
 struct CharacterSpace {
-    QMatrix4x4 fromModel;
-    QVector3D size;                 // extent in this space, over the whole animation
-    std::vector<QVector3D> outline; // the outermost points of the measured poses, in this space
+    QMatrix4x4 fromModel;           // from model space
+    QVector3D size;                 // extent over the whole animation, in character space
+    std::vector<QVector3D> outline; // outermost points of the sampled poses, in character space
 };
 
-// Measures the model over one cycle of the animation (null: at rest), without the twist.
-CharacterSpace characterSpace(const Model& model, const Animation* animation);
+// Computes the character space from poses sampled over one cycle of the animation, or from the rest
+// pose if `animation` is null. Applies morph targets and bones only.
+[[nodiscard]] CharacterSpace characterSpace(const Model& model, const Animation* animation);
 
 } // namespace viewer

@@ -17,8 +17,8 @@ namespace viewer {
 namespace {
 
 constexpr double kFullTurn = 6.28318530718;
-constexpr double kTwistPeriod = 4.0; // seconds of one sway
-// The twist of a flat character stays finite.
+constexpr double kTwistPeriod = 4.0; // seconds
+// Keeps the twist of a flat character finite.
 constexpr float kLeastHeight = 0.25F;
 constexpr double kWavePeriod = 2.0; // seconds
 
@@ -27,16 +27,16 @@ bool always(const MeshShape& /*shape*/)
     return true;
 }
 
-// How the viewer makes and drives one type of deformer.
+// Operations of the viewer on one type of deformer.
 struct DeformerType {
     const char* name;
     const char* description;
     bool (*applies)(const MeshShape&);
     std::unique_ptr<vyra::Deformer> (*create)(const MeshShape&);
-    // Sets what changes from frame to frame. `prototype` has the parameters that the user chose;
-    // `toCharacter` starts from the space in which the deformers before leave the mesh.
-    void (*drive)(vyra::Deformer&, const vyra::Deformer& prototype, const MeshPose&,
-                  const QMatrix4x4& toCharacter);
+    // Sets the animated parameters. `prototype` has the parameters that the user chose;
+    // `toCharacter` is the transform to character space from the mesh after the previous ones.
+    void (*animate)(vyra::Deformer&, const vyra::Deformer& prototype, const MeshPose&,
+                    const QMatrix4x4& toCharacter);
 };
 
 template <typename T>
@@ -51,8 +51,8 @@ const T& as(const vyra::Deformer& deformer)
     return static_cast<const T&>(deformer);
 }
 
-void driveNothing(vyra::Deformer& /*deformer*/, const vyra::Deformer& /*prototype*/,
-                  const MeshPose& /*pose*/, const QMatrix4x4& /*toCharacter*/)
+void animateNothing(vyra::Deformer& /*deformer*/, const vyra::Deformer& /*prototype*/,
+                    const MeshPose& /*pose*/, const QMatrix4x4& /*toCharacter*/)
 {
 }
 
@@ -103,7 +103,7 @@ const DeformerType kTypes[] = {
      [](const MeshShape& shape) -> std::unique_ptr<vyra::Deformer> {
          return std::make_unique<vyra::SmoothDeformer>(shape.topology);
      },
-     driveNothing},
+     animateNothing},
 };
 
 const DeformerType* findType(const std::string& name)
@@ -132,13 +132,13 @@ std::vector<std::string> split(const std::string& text, char separator)
     return parts;
 }
 
-Failure wrongDeformers(const std::string& text)
+Failure deformerError(const std::string& text)
 {
     return {ExitCode::kUsage, "--deformers: " + text};
 }
 
-// A deformer without data, to look at its parameters.
-std::unique_ptr<vyra::Deformer> createEmpty(const DeformerType& type)
+// Creates a deformer without mesh data, as a holder of parameters.
+[[nodiscard]] std::unique_ptr<vyra::Deformer> createEmpty(const DeformerType& type)
 {
     return type.create(MeshShape());
 }
@@ -148,18 +148,18 @@ Result<DeformerChoice> parseDeformer(const std::string& text)
     const std::vector<std::string> parts = split(text, ':');
     const DeformerType* type = findType(parts.front());
     if (!type)
-        return wrongDeformers("there is no deformer '" + parts.front() + "'; there are " +
-                              typeNames());
+        return deformerError("there is no deformer '" + parts.front() + "'; there are " +
+                             typeNames());
     DeformerChoice choice{type->name, {}, createEmpty(*type)};
     for (auto part = parts.begin() + 1; part != parts.end(); ++part) {
         const std::size_t equals = part->find('=');
         if (equals == std::string::npos)
-            return wrongDeformers("'" + *part + "' is not PARAMETER=VALUE");
+            return deformerError("'" + *part + "' is not PARAMETER=VALUE");
         std::string name = part->substr(0, equals);
         std::string value = part->substr(equals + 1);
         if (const std::string problem = setParameter(*choice.prototype, name, value);
             !problem.empty())
-            return wrongDeformers(problem);
+            return deformerError(problem);
         choice.parameters.emplace_back(std::move(name), std::move(value));
     }
     return choice;
@@ -226,7 +226,7 @@ void applyPose(const std::vector<DeformerChoice>& choices, const MeshShape& shap
         if (!type.applies(shape))
             continue;
         (*deformer)->enabled = choice.enabled;
-        type.drive(**deformer, *choice.prototype, pose, pose.geometryMatrix);
+        type.animate(**deformer, *choice.prototype, pose, pose.geometryMatrix);
         if (choice.enabled && dynamic_cast<vyra::SkinDeformer*>(deformer->get()))
             pose.geometryMatrix = pose.skinnedToCharacter;
         ++deformer;

@@ -1,4 +1,4 @@
-// The deformers that the user chose, and how a pose drives them.
+// Chain of deformers that the user chose, and their animation.
 #pragma once
 
 #include "evaluator/DeformableMesh.h"
@@ -16,46 +16,45 @@
 
 namespace viewer {
 
-// One deformer of --deformers.
+// One deformer of --deformers. Copies share the prototype.
 struct DeformerChoice {
     std::string name;
     std::vector<std::pair<std::string, std::string>> parameters;
-    std::shared_ptr<vyra::Deformer> prototype; // with these parameters, without a mesh's data
+    std::shared_ptr<vyra::Deformer> prototype; // has these parameters and no mesh data
     bool enabled = true;
 };
 
-// Without --deformers: meshes without targets or bones leave the first two out.
+// Default of --deformers. Meshes without targets or bones skip the first two.
 inline constexpr const char kDefaultDeformers[] = "morph,skin,twist";
 
-// Reads "skin,twist,wave:amplitude=0.1:wavelength=0.5". A failure lists the names or values there
-// are.
-Result<std::vector<DeformerChoice>> parseDeformers(const std::string& text);
+// Parses text such as "skin,twist,wave:amplitude=0.1:wavelength=0.5". A failure lists the valid
+// names or values.
+[[nodiscard]] Result<std::vector<DeformerChoice>> parseDeformers(const std::string& text);
 
-// One line for each deformer and each of its parameters.
-std::string deformerHelp();
+// Returns help with one line for each deformer and each of its parameters.
+[[nodiscard]] std::string deformerHelp();
 
-// The chain in one line, with what is switched off.
-std::string chainText(const std::vector<DeformerChoice>& choices);
+// Returns the chain in one line; disabled deformers are marked with "(off)".
+[[nodiscard]] std::string chainText(const std::vector<DeformerChoice>& choices);
 
-// What the deformers of one mesh need in one frame.
+// Input of the deformers of one mesh in one frame.
 struct MeshPose {
     std::vector<vyra::MatrixRows> bones; // empty in a mesh without bones
     std::vector<float> morphWeights;     // one per target
-    double seconds = 0;                  // of the character's own time
-    float height = 1;                    // of the character, in its space
-    // To the character's space (feet at y = 0, upright along y, centred, its largest extent 1):
-    // from the mesh's rest pose, and from the space in which its bones leave it.
+    double seconds = 0;                  // animation time of the character
+    float height = 1;                    // of the character, in character space
+    // Transforms to character space, from the mesh at rest and from the mesh after skinning.
     QMatrix4x4 restToCharacter;
     QMatrix4x4 skinnedToCharacter;
-    // From the space in which the chain leaves the mesh. Set by applyPose.
+    // Transform to character space from the mesh after the whole chain. Set by applyPose.
     QMatrix4x4 geometryMatrix;
 };
 
-// Adds the chosen deformers that apply to the mesh.
+// Adds the chosen deformers to the mesh, except deformers that need bones or targets that it lacks.
 void addDeformers(const std::vector<DeformerChoice>& choices, const MeshShape& shape,
                   vyra::DeformableMesh& deformable);
 
-// Enables and drives the deformers that addDeformers added.
+// Sets `enabled` and the animated parameters of the deformers that addDeformers added.
 void applyPose(const std::vector<DeformerChoice>& choices, const MeshShape& shape, MeshPose& pose,
                vyra::DeformableMesh& deformable);
 

@@ -9,13 +9,13 @@
 namespace viewer {
 namespace {
 
-// Cells along the longest side of a mesh: at this number a character loses about half of its
-// vertices and keeps its shape.
+// Cells along the longest side of the bounding box. A character loses about half of its vertices
+// and keeps its shape.
 constexpr float kCellsAlongLongestSide = 64.0f;
 
 using Cell = std::tuple<int, int, int, int>;
 
-// The signs of a normal: vertices on different sides of a thin part stay apart.
+// Returns the signs of a normal. They separate the vertices on different sides of a thin part.
 int octant(const QVector3D& normal)
 {
     return (normal.x() < 0 ? 1 : 0) + (normal.y() < 0 ? 2 : 0) + (normal.z() < 0 ? 4 : 0);

@@ -1,13 +1,13 @@
-// A coarser mesh for a character that needs less detail.
+// Lower level of detail of a mesh.
 #pragma once
 
 #include "viewer/model/Model.h"
 
 namespace viewer {
 
-// Joins the vertices that share a cell of a grid over the mesh at rest and look the same way; the
-// first of them, with its normal and its bones, stands for all. Triangles that collapse are left
-// out. The result has at least one triangle, or it is the mesh itself.
-Mesh coarserMesh(const Mesh& mesh);
+// Simplifies by vertex clustering: vertices at rest in the same cell of a grid whose normals have
+// the same signs are merged into the first of them. Degenerate triangles are removed. If none would
+// be left, returns a copy of `mesh`.
+[[nodiscard]] Mesh coarserMesh(const Mesh& mesh);
 
 } // namespace viewer

@@ -1,4 +1,4 @@
-// A mesh of the model as the evaluator and its deformers take it.
+// Data of a mesh in the form that the evaluator and its deformers take.
 #pragma once
 
 #include "evaluator/Geometry.h"
@@ -11,7 +11,7 @@
 
 namespace viewer {
 
-// What all characters share of one mesh.
+// Constant data of one mesh, shared by all characters.
 struct MeshShape {
     std::shared_ptr<const vyra::MeshGeometry> geometry;
     vyra::SkinWeights skinWeights;   // empty in a mesh without bones
@@ -19,6 +19,7 @@ struct MeshShape {
     vyra::SmoothTopology topology;
 };
 
-MeshShape shapeOf(const Mesh& mesh);
+// Converts the geometry, weights and targets of `mesh`, and computes its topology.
+[[nodiscard]] MeshShape shapeOf(const Mesh& mesh);
 
 } // namespace viewer

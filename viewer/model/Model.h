@@ -1,4 +1,4 @@
-// A character as it comes from a file: meshes, skeleton, animations.
+// A model: meshes, skeleton, animations.
 #pragma once
 
 #include <array>
@@ -13,7 +13,7 @@
 
 namespace viewer {
 
-// A vertex follows at most this many bones.
+// Most bones that influence one vertex.
 inline constexpr std::size_t kBonesPerVertex = 4;
 
 using BoneIndices = std::array<std::uint32_t, kBonesPerVertex>;
@@ -21,40 +21,40 @@ using BoneWeights = std::array<float, kBonesPerVertex>;
 
 struct Bone {
     std::size_t node;  // index into Model::nodes
-    QMatrix4x4 offset; // from the mesh's space at rest to the bone's
+    QMatrix4x4 offset; // from the mesh's rest space to the bone's space (inverse bind matrix)
 };
 
-// What a morph target adds to each vertex of the mesh at rest, at weight 1.
+// Differences that a morph target adds to each vertex of the mesh at rest, at weight 1.
 struct MorphTarget {
     std::vector<QVector3D> positionDeltas;
-    std::vector<QVector3D> normalDeltas; // empty: normals stay
-    float weight = 0;                    // without an animation
+    std::vector<QVector3D> normalDeltas; // empty: normals do not change
+    float weight = 0;                    // while no animation sets it
 };
 
-// All per-vertex arrays have the same length. `bones`, `boneIndices` and `boneWeights` are empty in
-// a mesh without bones, which moves with its node as a whole; else the weights of a vertex add up
-// to 1.
+// All per-vertex arrays have the same length. The weights of a vertex add up to 1. In a mesh
+// without bones, which moves rigidly with its node, `bones`, `boneIndices` and `boneWeights` are
+// empty.
 struct Mesh {
     std::string name;
     std::size_t node = 0; // index into Model::nodes
-    QVector3D colour;     // of its material, sRGB
+    QVector3D colour;     // of the material, sRGB
 
     std::vector<QVector3D> positions; // at rest
     std::vector<QVector3D> normals;   // at rest, of length 1
     std::vector<BoneIndices> boneIndices;
     std::vector<BoneWeights> boneWeights;
-    std::vector<std::uint32_t> triangles; // three vertices each
+    std::vector<std::uint32_t> triangles; // three vertex indices each
     std::vector<Bone> bones;
     std::vector<MorphTarget> morphTargets;
 
-    std::size_t vertexCount() const { return positions.size(); }
-    bool hasBones() const { return !bones.empty(); }
+    [[nodiscard]] std::size_t vertexCount() const noexcept { return positions.size(); }
+    [[nodiscard]] bool hasBones() const noexcept { return !bones.empty(); }
 };
 
 struct Node {
     std::string name;
-    std::size_t parent; // smaller than the node's own index; the root's own index for the root
-    QMatrix4x4 local;   // to the parent's space, at rest
+    std::size_t parent; // less than the node's own index; the root is its own parent
+    QMatrix4x4 local;   // from the node's space to the parent's, at rest
 };
 
 template <typename T>
@@ -63,8 +63,8 @@ struct Key {
     T value;
 };
 
-// How one node moves: its local transform is replaced by translation * rotation * scale. Each list
-// is in the order of time; an empty one stands for none.
+// Motion of one node: translation * rotation * scale replaces its local transform. Each list is
+// sorted by time; an empty list is the identity.
 struct Channel {
     std::size_t node;
     std::vector<Key<QVector3D>> positions;
@@ -72,15 +72,15 @@ struct Channel {
     std::vector<Key<QVector3D>> scales;
 };
 
-// How the weights of the morph targets change in the meshes of one node: one weight per target.
+// Weights of the morph targets in the meshes of one node. A key has one weight per target.
 struct MorphChannel {
     std::size_t node;
-    std::vector<Key<std::vector<float>>> weights; // in the order of time, at least one
+    std::vector<Key<std::vector<float>>> weights; // sorted by time, at least one
 };
 
 struct Animation {
     std::string name;
-    double seconds; // length of one cycle; 0 for a still
+    double seconds; // length of one cycle; 0 for a static pose
     std::vector<Channel> channels;
     std::vector<MorphChannel> morphChannels = {};
 };

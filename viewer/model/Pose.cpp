@@ -16,7 +16,7 @@ QQuaternion mix(const QQuaternion& from, const QQuaternion& to, float fraction)
     return QQuaternion::slerp(from, to, fraction);
 }
 
-// A key may hold fewer weights than the next one: the others are 0.
+// A key may hold fewer weights than the next one; the missing weights are 0.
 std::vector<float> mix(const std::vector<float>& from, const std::vector<float>& to, float fraction)
 {
     std::vector<float> result(std::max(from.size(), to.size()));

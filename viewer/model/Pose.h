@@ -1,4 +1,4 @@
-// Where the nodes of a model are at a moment of an animation, and what that means for its meshes.
+// Poses of a model, and the matrices and weights that its deformers take from them.
 #pragma once
 
 #include "evaluator/Geometry.h"
@@ -10,38 +10,39 @@
 
 namespace viewer {
 
-// The value at a time between keys: linear for vectors, spherical for rotations (the shorter way).
-// Before the first key its value, behind the last key its value. `keys` is not empty.
-QVector3D sample(const std::vector<Key<QVector3D>>& keys, double seconds);
-QQuaternion sample(const std::vector<Key<QQuaternion>>& keys, double seconds);
+// Interpolates between keys: linearly for vectors, spherically along the shorter arc for rotations.
+// Returns the first value before the first key and the last value after the last key. `keys` is not
+// empty.
+[[nodiscard]] QVector3D sample(const std::vector<Key<QVector3D>>& keys, double seconds);
+[[nodiscard]] QQuaternion sample(const std::vector<Key<QQuaternion>>& keys, double seconds);
 
-// For each node of a model the transform from its space to the model's.
+// Transforms from the space of each node of a model to model space.
 using Pose = std::vector<QMatrix4x4>;
 
-// The pose at `seconds`, which wraps around the animation's length. Null stands for rest. The
-// second form reuses the storage of `pose`.
-Pose poseAt(const Model& model, const Animation* animation, double seconds);
+// Computes the pose at `seconds`, which wraps around the animation's length. A null animation gives
+// the rest pose. The second form reuses the storage of `pose`.
+[[nodiscard]] Pose poseAt(const Model& model, const Animation* animation, double seconds);
 void poseAt(const Model& model, const Animation* animation, double seconds, Pose& pose);
 
-// The upper three rows of a transform, as deformers take it.
-vyra::MatrixRows rowsOf(const QMatrix4x4& matrix);
+// Returns the upper three rows of a transform, the form that deformers take.
+[[nodiscard]] vyra::MatrixRows rowsOf(const QMatrix4x4& matrix);
 
-// For each bone of the mesh the transform from the mesh at rest to the model's space. The second
-// form reuses the storage of `matrices`.
-std::vector<vyra::MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
+// Computes the transform of each bone from the mesh at rest to model space. The second form reuses
+// the storage of `matrices`.
+[[nodiscard]] std::vector<vyra::MatrixRows> boneMatrices(const Mesh& mesh, const Pose& pose);
 void boneMatrices(const Mesh& mesh, const Pose& pose, std::vector<vyra::MatrixRows>& matrices);
 
-// The weight of each morph target of the mesh at `seconds`, which wraps around the animation's
-// length. Null stands for the weights at rest.
+// Computes the weight of each morph target of the mesh at `seconds`, which wraps around the
+// animation's length. A null animation gives the weights at rest.
 void morphWeights(const Mesh& mesh, const Animation* animation, double seconds,
                   std::vector<float>& weights);
 
-// The transform from the space in which the mesh's deformers leave it (the model's where bones took
-// it there, else its node's) to the model's.
-QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose);
+// Returns the transform to model space from the space of the mesh after skinning: that is model
+// space already in a mesh with bones, and its node's space in one without.
+[[nodiscard]] QMatrix4x4 meshToModel(const Mesh& mesh, const Pose& pose);
 
-// The transform from the space of the mesh at rest to the model's, by `pose`, which is at rest too:
-// all bones agree on it then.
-QMatrix4x4 restToModel(const Mesh& mesh, const Pose& pose);
+// Returns the transform from the mesh at rest to model space. `pose` is the rest pose, in which all
+// bones have the same transform.
+[[nodiscard]] QMatrix4x4 restToModel(const Mesh& mesh, const Pose& pose);
 
 } // namespace viewer

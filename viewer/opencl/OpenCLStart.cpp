@@ -8,7 +8,7 @@
 #include "standalone/OpenCLPlatforms.h"
 #include "viewer/opencl/StartFailure.h"
 
-#include <string>
+#include <utility>
 #include <vector>
 
 #include <QByteArray>
@@ -21,18 +21,18 @@ namespace {
 
 constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
 
-// The library's warnings while an object lives. One thread starts the library.
+// Records the library's warnings during its lifetime. Only one thread starts the library.
 class WarningList {
 public:
-    WarningList() : fFormer(setCLWarningSink(keep)) { sfTexts.clear(); }
-    ~WarningList() { setCLWarningSink(fFormer); }
+    WarningList() : fPrevious(setCLWarningSink(record)) { sfTexts.clear(); }
+    ~WarningList() { setCLWarningSink(fPrevious); }
     WarningList(const WarningList&) = delete;
     WarningList& operator=(const WarningList&) = delete;
 
-    std::vector<std::string> texts() const { return sfTexts; }
+    [[nodiscard]] std::vector<std::string> texts() const { return sfTexts; }
 
 private:
-    static void keep(const char* text)
+    static void record(const char* text)
     {
         std::string warning = text;
         while (warning.ends_with('\n'))
@@ -41,7 +41,7 @@ private:
     }
 
     static inline std::vector<std::string> sfTexts;
-    CLWarningSink fFormer;
+    CLWarningSink fPrevious;
 };
 
 std::string variable(const char* name)
@@ -49,41 +49,41 @@ std::string variable(const char* name)
     return qEnvironmentVariable(name).toStdString();
 }
 
-StartFacts gatherFacts(const Options& options, bool platformIsGiven, unsigned vendorId,
-                       const WarningList& warnings)
+StartDiagnostics collectDiagnostics(bool platformIsGiven, bool cpuIsAllowed, unsigned vendorId,
+                                    const WarningList& warnings)
 {
-    StartFacts facts;
-    facts.libraryFound = QLibrary(kOpenCLLibraryName).load();
-    facts.disabled = qEnvironmentVariableIsSet("VYRA_DISABLE_OPENCL");
-    facts.platformIsGiven = platformIsGiven;
-    facts.cpuIsAllowed = options.allowCpu;
-    facts.vendorId = vendorId;
-    facts.vendor = variable(kPlatformVariable);
-    facts.missingLayers = missingOpenCLLayers();
-    facts.platforms = openCLPlatforms();
-    facts.warnings = warnings.texts();
-    return facts;
+    StartDiagnostics diagnostics;
+    diagnostics.libraryFound = QLibrary(kOpenCLLibraryName).load();
+    diagnostics.disabled = qEnvironmentVariableIsSet("VYRA_DISABLE_OPENCL");
+    diagnostics.platformIsGiven = platformIsGiven;
+    diagnostics.cpuIsAllowed = cpuIsAllowed;
+    diagnostics.vendorId = vendorId;
+    diagnostics.vendor = variable(kPlatformVariable);
+    diagnostics.missingLayers = missingOpenCLLayers();
+    diagnostics.platforms = openCLPlatforms();
+    diagnostics.warnings = warnings.texts();
+    return diagnostics;
 }
 
 } // namespace
 
-Status startOpenCL(QOpenGLWindow& window, const Options& options)
+Status startOpenCL(QOpenGLWindow& window, const std::string& platform, bool cpuIsAllowed)
 {
-    if (!options.platform.empty())
-        qputenv(kPlatformVariable, QByteArray::fromStdString(options.platform));
+    if (!platform.empty())
+        qputenv(kPlatformVariable, QByteArray::fromStdString(platform));
     const bool platformIsGiven = qEnvironmentVariableIsSet(kPlatformVariable);
     QOpenGLContext& context = *window.context();
     const unsigned vendorId = chooseOpenCLPlatform(context);
 
     constexpr bool kUsingDirect3D = false;
     constexpr bool kUsingCoreProfile = true;
-    // NOLINTNEXTLINE(performance-no-int-to-ptr): the library takes a window's number as a pointer
-    void* const nativeWindow = reinterpret_cast<void*>(window.winId());
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): the library takes the window id as a pointer
+    void* nativeWindow = reinterpret_cast<void*>(window.winId());
     const WarningList warnings;
     if (TopenCLInfo::initialize(nativeWindow, nativeContext(context), nullptr, kUsingDirect3D,
                                 kUsingCoreProfile, vendorId))
         return {};
-    return startFailure(gatherFacts(options, platformIsGiven, vendorId, warnings));
+    return startFailure(collectDiagnostics(platformIsGiven, cpuIsAllowed, vendorId, warnings));
 }
 
 } // namespace viewer

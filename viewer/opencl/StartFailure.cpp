@@ -14,7 +14,7 @@ constexpr char kInstallDriver[] =
     "install an OpenCL driver (on Debian without a GPU: pocl-opencl-icd)";
 constexpr char kPoclVendor[] = "The pocl project";
 
-// Vendors in quotes, each once.
+// Returns the vendors in quotes, without duplicates.
 std::string listOf(const std::vector<OpenCLPlatform>& platforms)
 {
     std::vector<std::string> vendors;
@@ -28,7 +28,7 @@ std::string listOf(const std::vector<OpenCLPlatform>& platforms)
     return list;
 }
 
-std::vector<OpenCLPlatform> thatShare(std::vector<OpenCLPlatform> platforms)
+std::vector<OpenCLPlatform> withGLSharing(std::vector<OpenCLPlatform> platforms)
 {
     std::erase_if(platforms, [](const auto& platform) { return !platform.sharesWithOpenGL; });
     return platforms;
@@ -49,69 +49,71 @@ Reason noSharing(const std::string& subject)
             "use a GPU whose driver does, or set OPENCL_LAYERS to the path of libglshare.so"};
 }
 
-// The library looked for the platform of one vendor.
-Reason reasonOfPlatform(const StartFacts& facts)
+// For a library that looked for the platform of one vendor. An empty reason if there is no fault.
+Reason reasonOfVendor(const StartDiagnostics& diagnostics)
 {
-    const auto platform =
-        std::find_if(facts.platforms.begin(), facts.platforms.end(),
-                     [&facts](const OpenCLPlatform& each) { return each.vendor == facts.vendor; });
-    if (platform == facts.platforms.end())
-        return {"no OpenCL platform has the vendor '" + facts.vendor + "'",
-                "there is " + listOf(facts.platforms) + ": name one exactly like that"};
+    const auto platform = std::find_if(
+        diagnostics.platforms.begin(), diagnostics.platforms.end(),
+        [&diagnostics](const OpenCLPlatform& each) { return each.vendor == diagnostics.vendor; });
+    if (platform == diagnostics.platforms.end())
+        return {"no OpenCL platform has the vendor '" + diagnostics.vendor + "'",
+                "there is " + listOf(diagnostics.platforms) + ": name one exactly like that"};
     if (platform->deviceCount == 0)
         return noDevices(*platform);
     if (!platform->sharesWithOpenGL)
-        return noSharing("the OpenCL platform of '" + facts.vendor + "' does not offer");
+        return noSharing("the OpenCL platform of '" + diagnostics.vendor + "' does not offer");
     return {};
 }
 
-// The renderer's texts name no vendor.
-Reason reasonOfPlatforms(const StartFacts& facts)
+// For a renderer of an unknown vendor.
+Reason reasonWithoutVendor(const StartDiagnostics& diagnostics)
 {
-    const std::vector<OpenCLPlatform> sharing = thatShare(facts.platforms);
+    const std::vector<OpenCLPlatform> sharing = withGLSharing(diagnostics.platforms);
     const auto hasNoDevices = [](const auto& platform) { return platform.deviceCount == 0; };
-    if (std::all_of(facts.platforms.begin(), facts.platforms.end(), hasNoDevices))
-        return noDevices(facts.platforms.front());
+    if (std::all_of(diagnostics.platforms.begin(), diagnostics.platforms.end(), hasNoDevices))
+        return noDevices(diagnostics.platforms.front());
     if (sharing.empty())
         return noSharing("no OpenCL platform offers");
     return {"several OpenCL platforms share with OpenGL",
             "choose one with --platform: " + listOf(sharing)};
 }
 
-Reason reasonOf(const StartFacts& facts)
+Reason reasonOf(const StartDiagnostics& diagnostics)
 {
-    if (!facts.missingLayers.empty())
-        return {"OPENCL_LAYERS names '" + facts.missingLayers.front() + "', which is not a file",
+    if (!diagnostics.missingLayers.empty())
+        return {"OPENCL_LAYERS names '" + diagnostics.missingLayers.front() +
+                    "', which is not a file",
                 "correct the variable"};
-    if (facts.disabled)
+    if (diagnostics.disabled)
         return {"OpenCL is switched off, since VYRA_DISABLE_OPENCL is set", "unset the variable"};
-    if (!facts.libraryFound)
+    if (!diagnostics.libraryFound)
         return {"there is no OpenCL on this machine", kInstallDriver};
-    if (facts.platforms.empty())
+    if (diagnostics.platforms.empty())
         return {"OpenCL has no platform on this machine: the loader found no driver",
                 kInstallDriver};
-    if (!facts.vendor.empty()) {
-        if (Reason reason = reasonOfPlatform(facts); !reason.text.empty())
+    if (!diagnostics.vendor.empty()) {
+        if (Reason reason = reasonOfVendor(diagnostics); !reason.text.empty())
             return reason;
-    } else if (facts.vendorId == 0) {
-        return reasonOfPlatforms(facts);
+    } else if (diagnostics.vendorId == 0) {
+        return reasonWithoutVendor(diagnostics);
     }
-    const std::string advice = facts.platformIsGiven ? "" : "name another platform with --platform";
+    const std::string advice =
+        diagnostics.platformIsGiven ? "" : "name another platform with --platform";
     const std::string text = "OpenCL cannot be used with this renderer";
-    if (!facts.warnings.empty())
-        return {text + " (" + facts.warnings.back() + ")", advice};
+    if (!diagnostics.warnings.empty())
+        return {text + " (" + diagnostics.warnings.back() + ")", advice};
     return {text + ", for the reason above", advice};
 }
 
 } // namespace
 
-Failure startFailure(const StartFacts& facts)
+Failure startFailure(const StartDiagnostics& diagnostics)
 {
-    const Reason reason = reasonOf(facts);
+    const Reason reason = reasonOf(diagnostics);
     std::string text = reason.text;
     if (!reason.advice.empty())
         text += "; " + reason.advice;
-    if (!facts.cpuIsAllowed)
+    if (!diagnostics.cpuIsAllowed)
         text += (reason.advice.empty() ? "; use " : ", or use ") + std::string("--allow-cpu");
     return {ExitCode::kNoOpenCL, text};
 }

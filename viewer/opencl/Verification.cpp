@@ -10,8 +10,8 @@
 namespace viewer {
 namespace {
 
-// Unlike std::max it does not lose a value that is not a number.
-double larger(double a, double b)
+// Unlike std::max, returns infinity if a or b is NaN.
+double larger(double a, double b) noexcept
 {
     if (std::isnan(a) || std::isnan(b))
         return std::numeric_limits<double>::infinity();
@@ -23,18 +23,17 @@ QVector3D difference(const vyra::Vector3& a, const vyra::Vector3& b)
     return {a.x - b.x, a.y - b.y, a.z - b.z};
 }
 
-// The angles, in radians, by which the normals of a surface can turn when positions move by one
-// unit of the character's space. To first order: for edges a and b of a triangle, moving its
-// corners by d moves both edges by 2 d at most, and their product, which is perpendicular to the
-// triangle, by 2 d (|a| + |b|).
-std::vector<double> turnsOfNormals(const vyra::Surface& surface, const QMatrix4x4& toCharacter,
-                                   const vyra::SmoothTopology& topology)
+// Returns the angle in radians by which each normal can rotate per unit of position error in
+// character space, to first order: an error d at the corners of a triangle changes its edges a and
+// b by at most 2 d, and their cross product, which is the normal, by at most 2 d (|a| + |b|).
+std::vector<double> normalSensitivities(const vyra::Surface& surface, const QMatrix4x4& toCharacter,
+                                        const vyra::SmoothTopology& topology)
 {
     using Topology = vyra::SmoothTopology;
     const auto ranges = topology.cornerRanges().values<Topology::Range>();
     const auto corners = topology.corners().values<Topology::Corner>();
-    std::vector<double> turns(surface.vertexCount());
-    for (std::size_t i = 0; i < turns.size(); ++i) {
+    std::vector<double> angles(surface.vertexCount());
+    for (std::size_t i = 0; i < angles.size(); ++i) {
         const auto edgeTo = [&](std::uint32_t other) {
             return toCharacter.mapVector(
                 difference(surface.positions[other], surface.positions[i]));
@@ -48,12 +47,12 @@ std::vector<double> turnsOfNormals(const vyra::Surface& surface, const QMatrix4x
             lengths += a.length() + b.length();
             area += QVector3D::crossProduct(a, b);
         }
-        turns[i] = 2 * lengths / std::max(area.length(), std::numeric_limits<float>::min());
+        angles[i] = 2 * lengths / std::max(area.length(), std::numeric_limits<float>::min());
     }
-    return turns;
+    return angles;
 }
 
-// The topology from whose triangles a deformer of the mesh computes normals; null if none does.
+// Returns the topology of the deformer that computes normals from triangles, null if there is none.
 const vyra::SmoothTopology* topologyOfNormals(const vyra::DeformableMesh& mesh)
 {
     for (const auto& deformer : mesh.deformers()) {
@@ -66,7 +65,7 @@ const vyra::SmoothTopology* topologyOfNormals(const vyra::DeformableMesh& mesh)
 
 } // namespace
 
-void Deviation::include(const Deviation& other)
+void Deviation::include(const Deviation& other) noexcept
 {
     position = larger(position, other.position);
     if (!(other.normal * normalBound <= normal * other.normalBound)) {
@@ -75,7 +74,7 @@ void Deviation::include(const Deviation& other)
     }
 }
 
-bool Deviation::withinBound() const
+bool Deviation::withinBound() const noexcept
 {
     return position <= kPositionBound && normal <= normalBound;
 }
@@ -89,13 +88,13 @@ Deviation compare(const vyra::Surface& actual, const vyra::Surface& expected,
             toCharacter.mapVector(difference(actual.positions[i], expected.positions[i]));
         deviation.include({distance.length()});
     }
-    std::vector<double> turns(expected.vertexCount());
+    std::vector<double> sensitivities(expected.vertexCount());
     if (topology)
-        turns = turnsOfNormals(expected, toCharacter, *topology);
+        sensitivities = normalSensitivities(expected, toCharacter, *topology);
     for (std::size_t i = 0; i < expected.vertexCount(); ++i) {
-        const QVector3D turn = difference(actual.normals[i], expected.normals[i]);
-        const double bound = kNormalBound + std::min(turns[i] * deviation.position, 2.0);
-        deviation.include({0, turn.length(), bound});
+        const QVector3D change = difference(actual.normals[i], expected.normals[i]);
+        const double bound = kNormalBound + std::min(sensitivities[i] * deviation.position, 2.0);
+        deviation.include({0, change.length(), bound});
     }
     return deviation;
 }

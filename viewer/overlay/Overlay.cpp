@@ -6,8 +6,8 @@
 namespace viewer {
 namespace {
 
-constexpr double kLineHeight = 18; // pixels of the screen
-constexpr int kMargin = 12;        // pixels between a panel and the edge
+constexpr double kLineHeight = 18; // device-independent pixels
+constexpr int kMargin = 12;        // framebuffer pixels between a panel and the edge
 
 } // namespace
 
@@ -24,8 +24,8 @@ Overlay::~Overlay()
 void Overlay::setTexts(const OverlayTexts& texts, double pixelRatio)
 {
     const int lineHeight = static_cast<int>(kLineHeight * pixelRatio);
-    fFacts.setText(texts.facts, lineHeight);
-    fProblem.setText(texts.problem, lineHeight);
+    fStatistics.setText(texts.statistics, lineHeight);
+    fError.setText(texts.error, lineHeight);
     fLeftHalf.setText(texts.leftHalf, lineHeight);
     fRightHalf.setText(texts.rightHalf, lineHeight);
 }
@@ -53,8 +53,8 @@ void Overlay::drawPanels(const QSize& framebuffer)
     };
     fLeftHalf.draw(fBlitter, centred(fLeftHalf, 1), framebuffer);
     fRightHalf.draw(fBlitter, centred(fRightHalf, 3), framebuffer);
-    fFacts.draw(fBlitter, {kMargin, kMargin}, framebuffer);
-    fProblem.draw(fBlitter, {kMargin, above(fProblem)}, framebuffer);
+    fStatistics.draw(fBlitter, {kMargin, kMargin}, framebuffer);
+    fError.draw(fBlitter, {kMargin, above(fError)}, framebuffer);
 }
 
 } // namespace viewer

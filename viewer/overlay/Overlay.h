@@ -1,4 +1,4 @@
-// What the playing window shows over the picture.
+// Texts over the picture.
 #pragma once
 
 #include "viewer/overlay/TextPanel.h"
@@ -11,15 +11,15 @@
 namespace viewer {
 
 struct OverlayTexts {
-    std::string facts;   // upper left
-    std::string problem; // lower left
-    // Of the two halves of a split picture, at their lower ends.
+    std::string statistics; // upper left
+    std::string error;      // lower left
+    // At the lower ends of both halves of a split picture.
     std::string leftHalf;
     std::string rightHalf;
 };
 
-// Texts are drawn when they change, and cost the blending of a few rectangles in the frames
-// between. All operations, and the destruction, need the window's context to be current.
+// Texts are rasterised when they change; each frame only blends a few rectangles. The OpenGL
+// context must be current in all operations, the constructor and the destructor.
 class Overlay {
 public:
     Overlay();
@@ -27,17 +27,17 @@ public:
     Overlay(const Overlay&) = delete;
     Overlay& operator=(const Overlay&) = delete;
 
-    // `pixelRatio` is the number of the framebuffer's pixels in one of the screen's.
+    // `pixelRatio` is the number of framebuffer pixels per device-independent pixel.
     void setTexts(const OverlayTexts& texts, double pixelRatio);
-    // Into the framebuffer that is bound, which has this size in pixels.
+    // Draws into the bound framebuffer, which has this size in pixels.
     void draw(const QSize& framebuffer);
 
 private:
     void drawPanels(const QSize& framebuffer);
 
     QOpenGLTextureBlitter fBlitter;
-    TextPanel fFacts;
-    TextPanel fProblem;
+    TextPanel fStatistics;
+    TextPanel fError;
     TextPanel fLeftHalf;
     TextPanel fRightHalf;
 };

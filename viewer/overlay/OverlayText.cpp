@@ -1,14 +1,12 @@
 #include "viewer/overlay/OverlayText.h"
 
-#include "viewer/app/Controls.h"
-
 #include <iomanip>
 #include <sstream>
 
 namespace viewer {
 namespace {
 
-// So much of a build log can be read at a glance; the first error explains the others.
+// Size of the shown part of a build log. The first error usually explains the others.
 constexpr std::size_t kMostLines = 16;
 constexpr std::size_t kMostColumns = 110;
 
@@ -18,7 +16,7 @@ std::ostream& line(std::ostream& text, const char* label)
     return text << std::left << std::setw(kLabelWidth) << label;
 }
 
-void addOpenCL(const OverlayFacts::OpenCL& cl, std::ostream& text)
+void addOpenCL(const OverlayContent::OpenCL& cl, std::ostream& text)
 {
     line(text, "OpenCL device") << cl.device << '\n';
     line(text, "OpenGL to OpenCL") << cl.graphicsToCL << '\n';
@@ -28,25 +26,25 @@ void addOpenCL(const OverlayFacts::OpenCL& cl, std::ostream& text)
 
 } // namespace
 
-std::string overlayText(const OverlayFacts& facts)
+std::string overlayText(const OverlayContent& content)
 {
     std::ostringstream text;
     text << std::fixed << std::setprecision(2);
-    if (facts.framesPerSecond > 0)
-        line(text, "Frames per second") << facts.framesPerSecond << '\n';
-    line(text, "Evaluation") << facts.evaluationMs << " ms\n";
-    if (facts.cpuTwinMs)
-        line(text, "CPU, on the right") << *facts.cpuTwinMs << " ms\n";
-    line(text, "Deformed by") << deformedBy(facts.share) << '\n';
-    if (facts.openCL)
-        addOpenCL(*facts.openCL, text);
-    line(text, "Deformers") << facts.deformers << '\n';
-    line(text, "Time") << (facts.paused ? "paused\n" : "running\n");
-    text << '\n' << keyReminder() << '\n';
+    if (content.framesPerSecond > 0)
+        line(text, "Frames per second") << content.framesPerSecond << '\n';
+    line(text, "Evaluation") << content.evaluationMs << " ms\n";
+    if (content.cpuSceneMs)
+        line(text, "CPU, on the right") << *content.cpuSceneMs << " ms\n";
+    line(text, "Deformed by") << deformedBy(content.distribution) << '\n';
+    if (content.openCL)
+        addOpenCL(*content.openCL, text);
+    line(text, "Deformers") << content.deformers << '\n';
+    line(text, "Time") << (content.paused ? "paused\n" : "running\n");
+    text << '\n' << content.keys << '\n';
     return text.str();
 }
 
-std::string beginningOf(const std::string& text)
+std::string firstLines(const std::string& text)
 {
     std::istringstream lines(text);
     std::string beginning;

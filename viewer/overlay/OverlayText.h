@@ -1,7 +1,7 @@
-// What the overlay says.
+// Text of the overlay.
 #pragma once
 
-#include "viewer/opencl/MeshShare.h"
+#include "viewer/opencl/MeshDistribution.h"
 
 #include <cstddef>
 #include <optional>
@@ -9,27 +9,28 @@
 
 namespace viewer {
 
-struct OverlayFacts {
+struct OverlayContent {
     struct OpenCL {
         std::string device;
         std::string graphicsToCL; // the two synchronisation modes
         std::string clToGraphics;
         std::size_t batchSize = 0; // vertex buffers
     };
-    std::optional<OpenCL> openCL; // empty: everything is deformed on the CPU
-    MeshShare share;
-    double framesPerSecond = 0;      // 0: not measured yet
-    double evaluationMs = 0;         // of late, the median
-    std::optional<double> cpuTwinMs; // of the CPU's copy, where it is shown
+    std::optional<OpenCL> openCL; // empty if the CPU deforms everything
+    MeshDistribution distribution;
+    double framesPerSecond = 0;       // 0 before the first measurement
+    double evaluationMs = 0;          // median of the last frames
+    std::optional<double> cpuSceneMs; // of the CPU's copy; empty if it is not shown
     bool paused = false;
     std::string deformers; // the chain
+    std::string keys;      // summary of the keys
 };
 
-// Lines of a label and what belongs to it, then the keys in short.
-std::string overlayText(const OverlayFacts& facts);
+// Returns lines of a label and a value, and the summary of the keys.
+[[nodiscard]] std::string overlayText(const OverlayContent& content);
 
-// The first lines of a long text, each cut to a width that fits a window, and how many more there
-// are.
-std::string beginningOf(const std::string& text);
+// Returns the first lines of a long text, each truncated to a width that fits a window, and the
+// number of omitted lines.
+[[nodiscard]] std::string firstLines(const std::string& text);
 
 } // namespace viewer

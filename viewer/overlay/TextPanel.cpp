@@ -10,13 +10,13 @@
 namespace viewer {
 namespace {
 
-const QColor kGround(12, 14, 18, 175);
-const QColor kInk(236, 238, 242);
-// Letters' height and the free border, in the height of a line.
+const QColor kBackground(12, 14, 18, 175);
+const QColor kTextColour(236, 238, 242);
+// Font size and border, relative to the height of a line.
 constexpr double kLetterHeight = 0.75;
 constexpr double kBorder = 0.6;
 
-QImage drawn(const QString& text, int lineHeight)
+QImage rasterised(const QString& text, int lineHeight)
 {
     QFont font = QFontDatabase::systemFont(QFontDatabase::FixedFont);
     font.setPixelSize(std::max(1, static_cast<int>(kLetterHeight * lineHeight)));
@@ -24,10 +24,10 @@ QImage drawn(const QString& text, int lineHeight)
     const QSize area = QFontMetrics(font).size(0, text);
 
     QImage image(area + QSize(2 * border, 2 * border), QImage::Format_ARGB32_Premultiplied);
-    image.fill(kGround);
+    image.fill(kBackground);
     QPainter painter(&image);
     painter.setFont(font);
-    painter.setPen(kInk);
+    painter.setPen(kTextColour);
     painter.drawText(QRect(QPoint(border, border), area), Qt::AlignLeft | Qt::AlignTop, text);
     return image;
 }
@@ -44,7 +44,7 @@ void TextPanel::setText(const std::string& text, int lineHeight)
     const QString shown = QString::fromStdString(text).trimmed();
     if (shown.isEmpty())
         return;
-    fTexture = std::make_unique<QOpenGLTexture>(drawn(shown, lineHeight),
+    fTexture = std::make_unique<QOpenGLTexture>(rasterised(shown, lineHeight),
                                                 QOpenGLTexture::DontGenerateMipMaps);
     fTexture->setMinMagFilters(QOpenGLTexture::Nearest, QOpenGLTexture::Nearest);
 }

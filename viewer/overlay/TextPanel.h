@@ -1,4 +1,4 @@
-// Text on a dark, translucent ground, for the window.
+// Text on a dark, translucent background.
 #pragma once
 
 #include <memory>
@@ -11,17 +11,20 @@
 
 namespace viewer {
 
-// Is drawn by the CPU when its text changes, and is a texture from then on. All operations, and the
-// destruction, need the context to be current.
+// Texture that the CPU rasterises when the text changes. The OpenGL context must be current in all
+// operations and the destructor.
 class TextPanel {
 public:
-    // `lineHeight` in pixels.
+    // `lineHeight` is in pixels. An empty text makes the panel invisible.
     void setText(const std::string& text, int lineHeight);
 
-    // In pixels; empty without a text.
-    QSize size() const { return fTexture ? QSize(fTexture->width(), fTexture->height()) : QSize(); }
-    // `corner` is where its upper left corner goes, in pixels from the framebuffer's. The blitter
-    // is bound, and blending is on.
+    // Returns the size in pixels, empty without a text.
+    [[nodiscard]] QSize size() const
+    {
+        return fTexture ? QSize(fTexture->width(), fTexture->height()) : QSize();
+    }
+    // Draws into a framebuffer of the size `framebuffer`. `corner` is the upper left corner of the
+    // panel in pixels. The blitter must be bound, and blending enabled.
     void draw(QOpenGLTextureBlitter& blitter, const QPoint& corner, const QSize& framebuffer);
 
 private:

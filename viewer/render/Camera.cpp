@@ -10,29 +10,29 @@
 namespace viewer {
 namespace {
 
-// A portrait lens: little distortion.
+// That of a portrait lens: little distortion.
 constexpr float kVerticalFieldOfView = 30.0f; // degrees
-// Air around what is framed.
+// Factor of the extent of the picture relative to that of the framed points.
 constexpr float kMargin = 1.15f;
 constexpr float kLowestPitch = 2.0f;
 constexpr float kHighestPitch = 85.0f;
 constexpr float kZoomPerStep = 0.9f;
-// Limits of zooming, in parts of the distance that shows everything.
+// Limits of the zoom, relative to the distance that shows all points.
 constexpr float kNearest = 0.25f;
 constexpr float kFarthest = 4.0f;
-// How far the target may be moved away, in the same parts.
+// Limit of the pan, relative to the same distance.
 constexpr float kFarthestPan = 1.0f;
-// The camera stays away from the nearest point by this part of the radius of all.
+// Least distance from the nearest point, relative to the radius of all points.
 constexpr float kLeastGap = 0.1f;
-// Each step of centring halves the error: after these nothing is seen of it.
+// Each step of centring halves the error; after these it is below a pixel.
 constexpr int kCentringSteps = 16;
 
-// One axis of the picture, across the axis z that points to the camera.
+// One axis of the picture. The axis z points to the camera.
 class PictureAxis {
 public:
-    // `tangent` is that of half the picture. On the axis, a camera at (c, d) has a point (p, z) in
-    // the picture if |p - c| <= (d - z) tangent, so that d tangent + c and d tangent - c each have
-    // a least value.
+    // `tangent` is that of half the angle of view. A camera at the coordinate c on the axis and the
+    // distance d sees a point (p, z) if |p - c| <= (d - z) tangent. So each of d tangent + c and
+    // d tangent - c has a least value.
     PictureAxis(const std::vector<QVector3D>& points, int axis, float tangent)
         : fPoints(points), fAxis(axis), fTangent(tangent)
     {
@@ -44,7 +44,7 @@ public:
 
     float leastDistance() const { return (fLeastPlus + fLeastMinus) / (2 * fTangent); }
 
-    // The place of the camera from which the points reach as far to both sides of the picture.
+    // Returns the coordinate of the camera that centres the points in the picture.
     float centre(float distance) const
     {
         float low = fLeastPlus - distance * fTangent;
@@ -59,13 +59,13 @@ public:
 private:
     static constexpr float kLargest = std::numeric_limits<float>::max();
 
-    // How much farther the points reach to the positive side than to the other, as tangents.
-    float imbalance(float place, float distance) const
+    // Returns the sum of the greatest and the least tangent, 0 if the points are centred.
+    float imbalance(float camera, float distance) const
     {
         float most = -kLargest;
         float least = kLargest;
         for (const QVector3D& point : fPoints) {
-            const float tangent = (point[fAxis] - place) / (distance - point.z());
+            const float tangent = (point[fAxis] - camera) / (distance - point.z());
             most = std::max(most, tangent);
             least = std::min(least, tangent);
         }
@@ -79,7 +79,7 @@ private:
     float fLeastMinus = -kLargest;
 };
 
-// From where the points may be seen at all.
+// Returns the least distance at which the camera is in front of all points.
 float leastDistance(const std::vector<QVector3D>& points)
 {
     float nearest = 0;
@@ -121,11 +121,11 @@ void Camera::zoom(float steps)
 
 void Camera::pan(float right, float up)
 {
-    QMatrix4x4 toStage;
-    toStage.lookAt(direction(), {}, {0, 1, 0});
-    toStage = toStage.transposed(); // the inverse of a rotation
+    QMatrix4x4 toWorld;
+    toWorld.lookAt(direction(), {}, {0, 1, 0});
+    toWorld = toWorld.transposed(); // the inverse of a rotation
     const float height = 2 * fZoom * std::tan(qDegreesToRadians(kVerticalFieldOfView / 2));
-    fPan += toStage.mapVector({-right * height, -up * height, 0});
+    fPan += toWorld.mapVector({-right * height, -up * height, 0});
     if (fPan.length() > kFarthestPan)
         fPan *= kFarthestPan / fPan.length();
 }
@@ -146,7 +146,7 @@ QVector3D Camera::direction() const
     return {std::sin(yaw) * std::cos(pitch), std::sin(pitch), std::cos(yaw) * std::cos(pitch)};
 }
 
-// Not below the ground, where a camera that looks at it would be, too.
+// Limited to the ground and above: a camera that looks at a target below it could be below it, too.
 QVector3D Camera::target() const
 {
     QVector3D target = fFittingTarget + fPan * fFittingDistance;
@@ -177,7 +177,7 @@ void Camera::fit()
         middle += point / static_cast<float>(fPoints.size());
     QMatrix4x4 toView;
     toView.lookAt(direction(), {}, {0, 1, 0});
-    // As seen from the middle; the camera looks along -z.
+    // Relative to the middle, in view space; the camera looks along -z.
     std::vector<QVector3D> seen;
     seen.reserve(fPoints.size());
     for (const QVector3D& point : fPoints)

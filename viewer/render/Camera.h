@@ -1,4 +1,4 @@
-// A camera that circles around the stage and keeps it in the picture.
+// Orbit camera that keeps the scene in the picture.
 #pragma once
 
 #include <vector>
@@ -8,25 +8,29 @@
 
 namespace viewer {
 
+// World space: y is up, the ground is y = 0, lengths are in largest extents of a character.
 class Camera {
 public:
-    // Comes as near as it can with all of these points inside a picture of this shape (width by
-    // height), seen from the present angles, and keeps them inside from then on, unless zoom or pan
-    // leave that view. `points` is not empty.
+    // Moves as near as possible with all `points` inside a picture of this aspect ratio (width /
+    // height) at the current angles, and resets zoom and pan. Later calls of setAspect and orbit
+    // keep the points inside. `points` is not empty.
     void frame(std::vector<QVector3D> points, float aspect);
-    // Sets the shape of the picture.
+    // Sets the aspect ratio, width / height.
     void setAspect(float aspect);
-    // Angles in degrees; the camera stays above the ground and short of the zenith.
+    // Rotates by angles in degrees. The pitch is limited: the camera stays above the ground and
+    // below the zenith.
     void orbit(float yaw, float pitch);
-    // Steps of the wheel, positive to come nearer.
+    // Zooms by wheel steps, in if positive.
     void zoom(float steps);
-    // Moves the picture by parts of its height, to the right and up.
+    // Moves the picture to the right and up, in fractions of its height.
     void pan(float right, float up);
-    // Returns to the angles of the start, with everything in the picture.
+    // Restores the initial angles, zoom and pan.
     void reset();
 
-    QVector3D eye() const;
-    QMatrix4x4 toClip() const; // from the stage
+    // Position in world space.
+    [[nodiscard]] QVector3D eye() const;
+    // Transform from world space to clip space.
+    [[nodiscard]] QMatrix4x4 toClip() const;
 
 private:
     static constexpr float kFirstYaw = 28;
@@ -34,17 +38,17 @@ private:
 
     float distance() const { return fZoom * fFittingDistance; }
     QVector3D target() const;
-    QVector3D direction() const; // to the camera
+    QVector3D direction() const; // from the target to the camera
     void fit();
 
-    std::vector<QVector3D> fPoints; // that are kept in the picture
+    std::vector<QVector3D> fPoints; // kept in the picture
     QVector3D fFittingTarget;
     float fFittingDistance = 3;
     float fAspect = 1;
     float fYaw = kFirstYaw;     // degrees, from the front to the side
     float fPitch = kFirstPitch; // degrees above the horizon
-    float fZoom = 1;            // distance, in parts of the fitting one
-    QVector3D fPan;             // of the target, in parts of the fitting distance
+    float fZoom = 1;            // distance / fFittingDistance
+    QVector3D fPan;             // offset of the target / fFittingDistance
 };
 
 } // namespace viewer

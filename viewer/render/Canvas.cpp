@@ -21,7 +21,7 @@ Canvas::Canvas(const QSize& size)
 
 void Canvas::showIn(GLuint framebuffer, const QSize& framebufferSize)
 {
-    // Samples are resolved into a framebuffer of the same format; a window's may have another.
+    // Resolving samples requires the same format, and a window's framebuffer may have another.
     QOpenGLFramebufferObject::blitFramebuffer(fResolved.get(), fSamples.get());
     QOpenGLExtraFunctions* gl = QOpenGLContext::currentContext()->extraFunctions();
     gl->glBindFramebuffer(GL_READ_FRAMEBUFFER, fResolved->handle());

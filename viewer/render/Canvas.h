@@ -1,4 +1,4 @@
-// The picture that the renderer draws into.
+// Framebuffer that the renderer draws into.
 #pragma once
 
 #include <memory>
@@ -9,16 +9,18 @@
 
 namespace viewer {
 
-// An anti-aliased framebuffer. All operations need the context to be current.
+// Multisampled framebuffer. The OpenGL context must be current in all operations and the
+// destructor.
 class Canvas {
 public:
-    // `size` in pixels.
+    // `size` is in pixels.
     explicit Canvas(const QSize& size);
 
-    QSize size() const { return fSamples->size(); }
+    [[nodiscard]] QSize size() const { return fSamples->size(); }
     void bind() { fSamples->bind(); }
-    QImage image() const { return fSamples->toImage(); }
-    // Fills the framebuffer of this name and size with the picture.
+    [[nodiscard]] QImage image() const { return fSamples->toImage(); }
+    // Copies the picture to the framebuffer with the name `framebuffer`, scaled to its size in
+    // pixels.
     void showIn(GLuint framebuffer, const QSize& framebufferSize);
 
 private:

@@ -9,9 +9,10 @@
 namespace viewer {
 namespace {
 
-// Softness of the shadows' edges, in the characters' largest extent.
+// Width of the soft edges of shadows, in largest extents of a character.
 constexpr float kPenumbra = 0.02f;
-// How far the ground reaches beyond the stage, and the part of it before it fades.
+// Distance that the ground extends beyond the scene, in the same unit, and the fraction of the
+// ground that does not fade.
 constexpr float kGroundReach = 5.0f;
 constexpr float kClearGround = 0.45f;
 constexpr GLuint kShadowUnit = 0;
@@ -27,8 +28,8 @@ QByteArray shaderText(std::initializer_list<const char*> parts)
     return text;
 }
 
-bool build(QOpenGLShaderProgram& program, const char* vertexShader,
-           std::initializer_list<const char*> fragmentShader)
+[[nodiscard]] bool build(QOpenGLShaderProgram& program, const char* vertexShader,
+                         std::initializer_list<const char*> fragmentShader)
 {
     return program.addShaderFromSourceCode(QOpenGLShader::Vertex, shaderText({vertexShader})) &&
            program.addShaderFromSourceCode(QOpenGLShader::Fragment, shaderText(fragmentShader)) &&
@@ -85,10 +86,10 @@ void Renderer::drawShadows(const Scene& scene)
 {
     fShadowMap.bind();
     fDepth.bind();
-    fDepth.setUniformValue("toLight", fShadowMap.fromStage());
+    fDepth.setUniformValue("toLight", fShadowMap.fromWorld());
     for (const Character& character : scene.characters()) {
         for (const auto& mesh : character.meshes) {
-            fDepth.setUniformValue("toStage", character.placement * mesh->pose.geometryMatrix);
+            fDepth.setUniformValue("toWorld", character.placement * mesh->pose.geometryMatrix);
             drawMesh(*mesh);
         }
     }
@@ -126,9 +127,9 @@ void Renderer::drawCharacters(const Scene& scene, const Camera& camera)
     fCharacter.setUniformValue("eye", camera.eye());
     for (const Character& character : scene.characters()) {
         for (const auto& mesh : character.meshes) {
-            const QMatrix4x4 toStage = character.placement * mesh->pose.geometryMatrix;
-            fCharacter.setUniformValue("toStage", toStage);
-            fCharacter.setUniformValue("normalToStage", toStage.normalMatrix());
+            const QMatrix4x4 toWorld = character.placement * mesh->pose.geometryMatrix;
+            fCharacter.setUniformValue("toWorld", toWorld);
+            fCharacter.setUniformValue("normalToWorld", toWorld.normalMatrix());
             fCharacter.setUniformValue("albedo", mesh->mesh().colour * character.tint);
             drawMesh(*mesh);
         }
@@ -138,8 +139,8 @@ void Renderer::drawCharacters(const Scene& scene, const Camera& camera)
 void Renderer::setLight(QOpenGLShaderProgram& program)
 {
     program.setUniformValue("lightDirection", fShadowMap.towardsLight());
-    program.setUniformValue("toLight", fShadowMap.fromStage());
-    program.setUniformValue("shadowBlur", fShadowMap.partOf(kPenumbra));
+    program.setUniformValue("toLight", fShadowMap.fromWorld());
+    program.setUniformValue("shadowBlur", fShadowMap.toTextureLength(kPenumbra));
     program.setUniformValue("shadowMap", kShadowUnit);
 }
 

@@ -1,4 +1,4 @@
-// Draws the characters on their stage, from the vertex buffers that the deformers filled.
+// Draws a scene from the vertex buffers that the deformers wrote.
 #pragma once
 
 #include "viewer/Failure.h"
@@ -13,17 +13,18 @@
 
 namespace viewer {
 
-// OpenGL 3.3, core profile. All operations need the context to be current.
+// Uses OpenGL 3.3, core profile. The context must be current in all operations and the destructor.
 class Renderer {
 public:
+    // Borrows the OpenGL functions.
     explicit Renderer(QOpenGLFunctions_3_3_Core& gl);
     ~Renderer();
     Renderer(const Renderer&) = delete;
     Renderer& operator=(const Renderer&) = delete;
 
-    // Compiles the shaders.
-    Status initialize();
-    // Fills `area` of the canvas, in pixels; what is beside it stays.
+    // Compiles the shaders. Must succeed before draw().
+    [[nodiscard]] Status initialize();
+    // Draws into the rectangle `area` of the canvas, in pixels. Pixels outside it do not change.
     void draw(const Scene& scene, const Camera& camera, Canvas& canvas, const QRect& area);
 
 private:
@@ -40,7 +41,7 @@ private:
     QOpenGLShaderProgram fBackdrop;
     QOpenGLShaderProgram fGround;
     QOpenGLShaderProgram fCharacter;
-    GLuint fNoVertices = 0; // the vertex array of what has no vertex buffers
+    GLuint fNoVertices = 0; // vertex array without buffers, for the backdrop and the ground
 };
 
 } // namespace viewer

@@ -13,19 +13,19 @@
 namespace viewer {
 namespace {
 
-// Free ground between two characters, in their largest extent.
+// Distance between neighbours, in largest extents of a character.
 constexpr float kGap = 0.25f;
-// Neighbours differ by this part of a turn, the golden ratio's: no two move alike.
+// Difference of phase between neighbours, in cycles. With the golden ratio, no two move alike.
 constexpr double kPhaseStep = 0.61803398875;
-// Characters of a model without an animation start within this time.
+// Range of the phases of a model without an animation.
 constexpr double kPhaseSpread = 4.0; // seconds
-// Radians, head against feet, that the picture leaves room for.
+// Twist between feet and head that the framed outline includes, in radians.
 constexpr float kFramedTwist = 0.5f;
 constexpr double kFullTurn = 6.28318530718;
-// How much the tints of a crowd differ from white.
+// Largest difference of a tint from white.
 constexpr float kTintDepth = 0.13f;
 
-// Places for a crowd, as many rows as columns, the middle at the origin.
+// Square grid of characters, centred at the origin.
 class Grid {
 public:
     Grid(int crowd, const QVector3D& character)
@@ -72,7 +72,7 @@ QVector3D tintOf(int number)
     return {channel(0), channel(kFullTurn / 3), channel(2 * kFullTurn / 3)};
 }
 
-// The points, and where both ends of the twist of the first deformers bring them.
+// Returns the points, and the points after the largest twist in both directions.
 std::vector<QVector3D> twisted(const std::vector<QVector3D>& points, float height)
 {
     const float perHeight = qRadiansToDegrees(kFramedTwist) / std::max(height, kGap);
@@ -87,7 +87,7 @@ std::vector<QVector3D> twisted(const std::vector<QVector3D>& points, float heigh
     return result;
 }
 
-// Evenly over the sphere, on a spiral from pole to pole.
+// Returns directions spread evenly over the sphere, on a spiral from pole to pole.
 std::vector<QVector3D> evenDirections()
 {
     constexpr int kDirections = 200;
@@ -163,7 +163,7 @@ bool Scene::hasExtent() const
     return std::isfinite(extent) && extent > 0;
 }
 
-// All characters have the same outline, so the outermost point in a direction is that of the
+// All characters have the same outline, so the outermost point in a direction belongs to the
 // outermost character.
 std::vector<QVector3D> Scene::outline() const
 {
@@ -235,10 +235,10 @@ void Scene::toggleDeformers()
         deformer.enabled = !anyEnabled;
 }
 
-void Scene::toggleDeformer(std::size_t number)
+void Scene::toggleDeformer(std::size_t index)
 {
-    if (number < fDeformers.size())
-        fDeformers[number].enabled = !fDeformers[number].enabled;
+    if (index < fDeformers.size())
+        fDeformers[index].enabled = !fDeformers[index].enabled;
 }
 
 void Scene::changeLevel(CharacterMesh& mesh)

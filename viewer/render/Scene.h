@@ -1,4 +1,4 @@
-// The characters on the stage.
+// Characters of the viewer, with their vertex buffers.
 #pragma once
 
 #include "viewer/model/CharacterSpace.h"
@@ -22,10 +22,10 @@
 
 namespace viewer {
 
-// The two levels of detail of a mesh, which all characters share.
+// Levels of detail of one mesh, shared by all characters.
 struct MeshLevels {
     static constexpr std::size_t kCount = 2;
-    Mesh meshes[kCount]; // the finest first
+    Mesh meshes[kCount]; // finest first
     MeshShape shapes[kCount];
     GLuint indexBuffers[kCount] = {};
 };
@@ -37,63 +37,69 @@ struct CharacterMesh {
     VertexBuffer positions;
     VertexBuffer normals;
     GLuint vertexArray = 0;
-    vyra::DeformableMesh* deformable = nullptr; // the evaluator's; null in a scene without one
+    vyra::DeformableMesh* deformable = nullptr; // owned by the evaluator; null before attach()
     MeshPose pose;
 
-    const Mesh& mesh() const { return levels->meshes[level]; }
-    const MeshShape& shape() const { return levels->shapes[level]; }
+    [[nodiscard]] const Mesh& mesh() const noexcept { return levels->meshes[level]; }
+    [[nodiscard]] const MeshShape& shape() const noexcept { return levels->shapes[level]; }
 };
 
 struct Character {
-    QMatrix4x4 placement; // from the character's space to the stage
-    QVector3D tint;       // that tells it from its neighbours, near 1
-    double phase = 0;     // seconds ahead of the others
+    QMatrix4x4 placement; // from character space to world space
+    QVector3D tint;       // factor of the colours, near 1, to distinguish neighbours
+    double phase = 0;     // offset of the animation time, seconds
     Pose pose;
     std::vector<std::unique_ptr<CharacterMesh>> meshes;
 };
 
-// Characters on a grid, each at a moment of the animation of its own. All operations need the
-// renderer's context to be current.
+// Characters on a grid, each with its own animation time. In world space, the grid is centred at
+// the origin, y is up, feet are at y = 0, and the largest extent of a character is 1. The OpenGL
+// context must be current in all operations and the destructor.
 class Scene {
 public:
-    // Borrows the OpenGL functions and the model. `animation` is of the model, or null.
+    // Borrows the OpenGL functions, the model and the animation, which is one of the model or null.
+    // `crowd` is the number of characters.
     Scene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation, int crowd);
     ~Scene();
     Scene(const Scene&) = delete;
     Scene& operator=(const Scene&) = delete;
 
-    // Adds every mesh to the evaluator, with these deformers. The evaluator is borrowed, and
-    // destroyed after the scene.
+    // Adds every mesh to the evaluator with the chain `deformers`. The evaluator is borrowed and
+    // must outlive the scene.
     void attach(vyra::Evaluator& evaluator, std::vector<DeformerChoice> deformers);
 
-    // From the next pose on, all deformers are off, or on again.
+    // Disables all deformers if any is enabled, else enables all, from the next pose() on.
     void toggleDeformers();
-    // The same for one deformer of the chain, counted from 0. Ignores a number without a deformer.
-    void toggleDeformer(std::size_t number);
-    const std::vector<DeformerChoice>& deformers() const { return fDeformers; }
+    // Toggles the deformer at this index of the chain. Ignores an index past the end.
+    void toggleDeformer(std::size_t index);
+    [[nodiscard]] const std::vector<DeformerChoice>& deformers() const noexcept
+    {
+        return fDeformers;
+    }
 
-    // Moves every character to its pose at this time, in parallel.
+    // Computes the pose of every character at this time, in parallel.
     void pose(double seconds);
 
-    // Replaces both vertex buffers of a mesh by those of its other level of detail. Not while
-    // deformers run.
+    // Switches a mesh to its other level of detail, which re-creates both vertex buffers. Must not
+    // be called while deformers run.
     void changeLevel(CharacterMesh& mesh);
 
-    const std::vector<Character>& characters() const { return fCharacters; }
+    [[nodiscard]] const std::vector<Character>& characters() const noexcept { return fCharacters; }
     // All meshes of all characters.
-    const std::vector<CharacterMesh*>& meshes() const { return fMeshes; }
-    // The mesh that `deformable` deforms.
-    const CharacterMesh& meshOf(const vyra::DeformableMesh& deformable) const
+    [[nodiscard]] const std::vector<CharacterMesh*>& meshes() const noexcept { return fMeshes; }
+    // Returns the mesh of `deformable`. Throws std::out_of_range if it is not of this scene.
+    [[nodiscard]] const CharacterMesh& meshOf(const vyra::DeformableMesh& deformable) const
     {
         return *fByDeformable.at(&deformable);
     }
-    std::size_t meshesPerCharacter() const { return fLevels.size(); }
-    QVector3D size() const { return fSize; } // of the stage, centred at the origin, feet at y = 0
-    // Whether the model's extent over the animation is finite and not 0. Without it nothing is
-    // seen.
-    bool hasExtent() const;
-    // The outermost points of all characters over the animation, in many directions.
-    std::vector<QVector3D> outline() const;
+    [[nodiscard]] std::size_t meshesPerCharacter() const noexcept { return fLevels.size(); }
+    // Extent of the grid of characters in world space.
+    [[nodiscard]] QVector3D size() const noexcept { return fSize; }
+    // Returns whether the extent of the model over the animation is finite and not 0. A model
+    // without extent is invisible.
+    [[nodiscard]] bool hasExtent() const;
+    // Returns the outermost points of all characters over the animation, in many directions.
+    [[nodiscard]] std::vector<QVector3D> outline() const;
 
 private:
     void createCharacter(const QMatrix4x4& placement, int number, int crowd);

@@ -6,11 +6,11 @@ namespace viewer {
 namespace {
 
 constexpr int kTexels = 2048;
-// Steepness that keeps surfaces lit at a grazing angle from shading themselves, and a constant
-// part.
+// Depth offsets that keep surfaces from shading themselves: one by slope, for grazing light, and a
+// constant one.
 constexpr float kSlopeBias = 1.5f;
 constexpr float kConstantBias = 4.0f;
-// How far beyond the stage shadows fall, in the characters' height.
+// Length of shadows beyond the scene, relative to its height.
 constexpr float kShadowReach = 1.0f;
 
 } // namespace
@@ -51,15 +51,15 @@ QVector3D ShadowMap::towardsLight() const
     return QVector3D(-0.25f, 0.85f, 0.60f).normalized();
 }
 
-void ShadowMap::aim(const QVector3D& stageSize)
+void ShadowMap::aim(const QVector3D& sceneSize)
 {
-    fRadius = stageSize.length() / 2 + kShadowReach * stageSize.y();
-    const QVector3D middle(0, stageSize.y() / 2, 0);
+    fRadius = sceneSize.length() / 2 + kShadowReach * sceneSize.y();
+    const QVector3D middle(0, sceneSize.y() / 2, 0);
     QMatrix4x4 projection;
     projection.ortho(-fRadius, fRadius, -fRadius, fRadius, -fRadius, fRadius);
     QMatrix4x4 view;
     view.lookAt(middle, middle - towardsLight(), {0, 0, -1});
-    fFromStage = projection * view;
+    fFromWorld = projection * view;
 }
 
 void ShadowMap::bind()

@@ -1,4 +1,4 @@
-// What the key light sees.
+// Shadow map of the key light.
 #pragma once
 
 #include <QMatrix4x4>
@@ -7,33 +7,39 @@
 
 namespace viewer {
 
-// A depth texture that is compared when it is sampled. All operations need the context to be
-// current.
+// Depth texture with comparison on sampling, and its framebuffer. The OpenGL context must be
+// current in all operations and the destructor.
 class ShadowMap {
 public:
+    // Borrows the OpenGL functions.
     explicit ShadowMap(QOpenGLFunctions_3_3_Core& gl);
     ~ShadowMap();
     ShadowMap(const ShadowMap&) = delete;
     ShadowMap& operator=(const ShadowMap&) = delete;
 
-    // Aims the light at a stage of this size.
-    void aim(const QVector3D& stageSize);
-    // Directs drawing into the map, emptied.
+    // Sets the projection for a scene of this size, see Scene::size.
+    void aim(const QVector3D& sceneSize);
+    // Clears the map and makes it the render target.
     void bind();
-    // Makes the texture readable in this texture unit.
+    // Ends drawing into the map and binds it to this texture unit.
     void bindTexture(GLuint unit);
 
-    const QMatrix4x4& fromStage() const { return fFromStage; }
-    QVector3D towardsLight() const;
-    // From a length on the stage to parts of the map.
-    float partOf(float stageLength) const { return stageLength / (2 * fRadius); }
+    // Transform from world space to the clip space of the map.
+    [[nodiscard]] const QMatrix4x4& fromWorld() const noexcept { return fFromWorld; }
+    // Direction of length 1 to the light.
+    [[nodiscard]] QVector3D towardsLight() const;
+    // Converts a length in world space to texture coordinates of the map.
+    [[nodiscard]] float toTextureLength(float worldLength) const noexcept
+    {
+        return worldLength / (2 * fRadius);
+    }
 
 private:
     QOpenGLFunctions_3_3_Core& fGL;
     GLuint fTexture = 0;
     GLuint fFramebuffer = 0;
-    QMatrix4x4 fFromStage;
-    float fRadius = 1; // of the lit part of the stage
+    QMatrix4x4 fFromWorld;
+    float fRadius = 1; // half of the side of the map in world space
 };
 
 } // namespace viewer

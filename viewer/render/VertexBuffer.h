@@ -1,4 +1,4 @@
-// A vertex buffer of the renderer.
+// Vertex buffer of the renderer.
 #pragma once
 
 #include "evaluator/Geometry.h"
@@ -9,25 +9,28 @@
 
 namespace viewer {
 
-// Owns an OpenGL buffer of packed vectors. All operations need the renderer's context to be
-// current.
+// OpenGL buffer of packed vectors. The OpenGL context must be current in all operations; the
+// destructor does not delete the buffer, destroy() does.
 class VertexBuffer {
 public:
     VertexBuffer() = default;
-    // destroy() was called before.
+    // destroy() must have been called.
     ~VertexBuffer() = default;
     VertexBuffer(const VertexBuffer&) = delete;
     VertexBuffer& operator=(const VertexBuffer&) = delete;
 
-    // Creates the OpenGL buffer and fills it.
+    // Creates the OpenGL buffer with these contents.
     void create(QOpenGLFunctions_3_3_Core& gl, const std::vector<vyra::Vector3>& contents);
-    // Deletes it. Does nothing if there is none.
+    // Deletes the OpenGL buffer, if there is one.
     void destroy(QOpenGLFunctions_3_3_Core& gl);
 
+    // Replaces the contents. `contents` has as many elements as in create().
     void write(QOpenGLFunctions_3_3_Core& gl, const std::vector<vyra::Vector3>& contents) const;
-    std::vector<vyra::Vector3> read(QOpenGLFunctions_3_3_Core& gl) const;
+    // Reads the contents back. Waits for OpenGL.
+    [[nodiscard]] std::vector<vyra::Vector3> read(QOpenGLFunctions_3_3_Core& gl) const;
 
-    GLuint name() const { return fName; }
+    // Name of the OpenGL buffer, 0 if there is none.
+    [[nodiscard]] GLuint name() const noexcept { return fName; }
 
 private:
     GLuint fName = 0;

@@ -6,8 +6,8 @@
 namespace viewer {
 namespace {
 
-// A write that is cut short gives its reason only when it is continued.
-bool writeAll(QFile& file, const QByteArray& content)
+// Continues after a short write, because only the next write reports the reason.
+[[nodiscard]] bool writeAll(QFile& file, const QByteArray& content)
 {
     qint64 written = 0;
     while (written < content.size()) {

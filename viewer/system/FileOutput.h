@@ -1,4 +1,4 @@
-// Files that are written whole or not at all.
+// Writes files completely or not at all.
 #pragma once
 
 #include <optional>
@@ -8,8 +8,9 @@
 
 namespace viewer {
 
-// Writes a file of this content, replacing an earlier one. Returns the system's reason if that
-// fails, and leaves no part of the file. A device of that name stays.
-std::optional<std::string> writeFile(const std::string& path, const QByteArray& content);
+// Writes `content` to the file `path`, replacing an existing file. Returns nothing on success, else
+// the system's reason; a partly written file is removed, a device is not.
+[[nodiscard]] std::optional<std::string> writeFile(const std::string& path,
+                                                   const QByteArray& content);
 
 } // namespace viewer

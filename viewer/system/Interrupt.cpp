@@ -5,24 +5,24 @@
 namespace viewer {
 namespace {
 
-volatile std::sig_atomic_t interruptCount = 0;
+volatile std::sig_atomic_t isInterrupted = 0;
 
-void noteInterrupt(int)
+void handleInterrupt(int)
 {
-    interruptCount = 1;
+    isInterrupted = 1;
     std::signal(SIGINT, SIG_DFL);
 }
 
 } // namespace
 
-void catchInterrupt()
+void catchInterrupt() noexcept
 {
-    std::signal(SIGINT, noteInterrupt);
+    std::signal(SIGINT, handleInterrupt);
 }
 
-bool interrupted()
+bool interrupted() noexcept
 {
-    return interruptCount != 0;
+    return isInterrupted != 0;
 }
 
 } // namespace viewer

@@ -1,12 +1,13 @@
-// Ctrl-C, which ends the viewer after the frame in progress.
+// Ctrl-C, which ends the viewer after the current frame.
 #pragma once
 
 namespace viewer {
 
-// Makes the first Ctrl-C count as a request to end. The second one ends the process at once.
-void catchInterrupt();
+// Installs a handler for SIGINT. The first Ctrl-C requests the end, the second one ends the process
+// at once.
+void catchInterrupt() noexcept;
 
-// Whether Ctrl-C was pressed since. Safe from any thread.
-bool interrupted();
+// Returns whether Ctrl-C was pressed after catchInterrupt(). Any thread may call it.
+[[nodiscard]] bool interrupted() noexcept;
 
 } // namespace viewer

@@ -12,18 +12,19 @@ namespace viewer {
 namespace {
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool kReservesAddresses = true; // far more than the machine's memory
+// Sanitizers reserve more addresses than the machine has memory.
+constexpr bool kReservesAddresses = true;
 #else
 constexpr bool kReservesAddresses = false;
 #endif
 
-// Bytes. When that little cannot be had, a crash is put down to the lack of memory.
-constexpr std::size_t kLittleMemory = std::size_t{64} << 20;
+// Bytes. If this allocation fails, a crash counts as caused by lack of memory.
+constexpr std::size_t kSmallAllocation = std::size_t{64} << 20;
 
 const char* crashText = nullptr;
 int crashExitCode = 0;
 
-// Calls only what is safe in a signal handler.
+// Calls only functions that are safe in a signal handler.
 void endIfMemoryRanOut(int signal)
 {
     if (memoryIsShort()) {
@@ -35,7 +36,7 @@ void endIfMemoryRanOut(int signal)
     raise(signal);
 }
 
-void lower(int resource, rlim_t limit)
+void lowerLimit(int resource, rlim_t limit)
 {
     rlimit limits{};
     if (getrlimit(resource, &limits) != 0)
@@ -46,7 +47,7 @@ void lower(int resource, rlim_t limit)
 
 } // namespace
 
-std::FILE* takeStandardOutput()
+std::FILE* takeStandardOutput() noexcept
 {
     const int output = dup(STDOUT_FILENO);
     if (output < 0 || dup2(STDERR_FILENO, STDOUT_FILENO) < 0)
@@ -54,19 +55,19 @@ std::FILE* takeStandardOutput()
     return fdopen(output, "wb");
 }
 
-bool memoryIsShort()
+bool memoryIsShort() noexcept
 {
     void* memory =
-        mmap(nullptr, kLittleMemory, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+        mmap(nullptr, kSmallAllocation, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
     if (memory == MAP_FAILED)
         return true;
-    munmap(memory, kLittleMemory);
+    munmap(memory, kSmallAllocation);
     return false;
 }
 
-void reportCrashWithoutMemory(const char* text, int exitCode)
+void reportCrashWithoutMemory(const char* text, int exitCode) noexcept
 {
-    if (kReservesAddresses) // and has handlers of its own
+    if (kReservesAddresses) // sanitizers have handlers of their own
         return;
     crashText = text;
     crashExitCode = exitCode;
@@ -74,13 +75,13 @@ void reportCrashWithoutMemory(const char* text, int exitCode)
         std::signal(signal, endIfMemoryRanOut);
 }
 
-void limitResources()
+void limitResources() noexcept
 {
-    lower(RLIMIT_CORE, 0);
+    lowerLimit(RLIMIT_CORE, 0);
     const long pages = sysconf(_SC_PHYS_PAGES);
     const long pageSize = sysconf(_SC_PAGESIZE);
     if (!kReservesAddresses && pages > 0 && pageSize > 0)
-        lower(RLIMIT_AS, static_cast<rlim_t>(pages) / 2 * static_cast<rlim_t>(pageSize));
+        lowerLimit(RLIMIT_AS, static_cast<rlim_t>(pages) / 2 * static_cast<rlim_t>(pageSize));
 }
 
 } // namespace viewer

@@ -5,7 +5,7 @@
 
 namespace viewer {
 
-std::FILE* takeStandardOutput()
+std::FILE* takeStandardOutput() noexcept
 {
     const int output = _dup(_fileno(stdout));
     if (output < 0 || _dup2(_fileno(stderr), _fileno(stdout)) < 0 ||
@@ -14,15 +14,15 @@ std::FILE* takeStandardOutput()
     return _fdopen(output, "wb");
 }
 
-// Windows refuses memory beyond what it can provide, and writes no core files.
-void limitResources() {}
+// Windows does not overcommit memory and writes no core files.
+void limitResources() noexcept {}
 
-bool memoryIsShort()
+bool memoryIsShort() noexcept
 {
     return false;
 }
 
-// Nothing is known of drivers that crash there.
-void reportCrashWithoutMemory(const char*, int) {}
+// No driver is known to crash on Windows when memory runs out.
+void reportCrashWithoutMemory(const char*, int) noexcept {}
 
 } // namespace viewer

@@ -1,7 +1,7 @@
 #include "viewer/model/import/ImportProcess.h"
 
 #include "viewer/model/import/ModelFile.h"
-#include "viewer/model/import/ModelStream.h"
+#include "viewer/model/import/ModelSerialisation.h"
 #include "viewer/system/Process.h"
 
 #include <chrono>
@@ -17,20 +17,20 @@
 namespace viewer {
 namespace {
 
-// The arguments of the child: this, the time limit, the up axis, the crease angle, the model's
-// name.
+// First argument of the child. The time limit, the up axis, the crease angle and the model's name
+// follow.
 constexpr char kChildOption[] = "--import-child";
 enum ChildArgument { kOption = 1, kTimeLimit, kUpAxis, kCreaseAngle, kName, kChildArguments };
 constexpr int kNoUpAxis = -1;
 
-// The child's exit codes besides 0.
-constexpr int kTimeIsOver = 124;
+// Exit codes of the child, besides 0.
+constexpr int kTimedOut = 124;
 constexpr int kNoOutput = 125;
 
 // Milliseconds between two calls of the progress function.
-constexpr int kSlice = 50;
-// Milliseconds that the child gets to end itself when its time is over.
-constexpr qint64 kGrace = 5000;
+constexpr int kPollPeriodMs = 50;
+// Milliseconds after the time limit in which the child should end by itself.
+constexpr qint64 kGracePeriodMs = 5000;
 
 QStringList childArguments(const std::string& name, const ImportSettings& settings, int timeLimit)
 {
@@ -44,23 +44,23 @@ Failure failure(const std::string& name, const std::string& text)
     return {ExitCode::kModel, "the model '" + name + "' " + text};
 }
 
-Failure timeIsOver(const std::string& name, int timeLimit)
+Failure timedOut(const std::string& name, int timeLimit)
 {
     return failure(name, "takes longer than " + std::to_string(timeLimit) +
                              " s to load; it may be damaged: export it again, or allow more time "
                              "with --load-limit");
 }
 
-// Ends this process when its time is over, whatever it does.
+// Ends this process after the time limit, whatever other threads do.
 void startWatchdog(int seconds)
 {
     std::thread([seconds] {
         std::this_thread::sleep_for(std::chrono::seconds(seconds));
-        std::_Exit(kTimeIsOver);
+        std::_Exit(kTimedOut);
     }).detach();
 }
 
-Result<Model> importOrRunOutOfMemory(const std::string& name, const ImportSettings& settings)
+Result<Model> importOrReportMemory(const std::string& name, const ImportSettings& settings)
 {
     try {
         return importModel(name, settings);
@@ -89,21 +89,21 @@ Result<Model> importInChild(const ImportChild& child, const std::string& name,
     if (!process.waitForStarted())
         return failure(file.value(), "cannot be imported: the process for it does not start (" +
                                          process.errorString().toStdString() + ")");
-    const qint64 longest = child.timeLimit * qint64{1000} + kGrace;
-    while (!process.waitForFinished(kSlice) && process.state() != QProcess::NotRunning) {
-        const bool goesOn = child.progress(static_cast<int>(timer.elapsed() / 1000));
-        if (goesOn && timer.elapsed() < longest)
+    const qint64 limitMs = child.timeLimit * qint64{1000} + kGracePeriodMs;
+    while (!process.waitForFinished(kPollPeriodMs) && process.state() != QProcess::NotRunning) {
+        const bool goOn = child.progress(static_cast<int>(timer.elapsed() / 1000));
+        if (goOn && timer.elapsed() < limitMs)
             continue;
         process.kill();
         process.waitForFinished();
-        if (goesOn)
-            return timeIsOver(file.value(), child.timeLimit);
+        if (goOn)
+            return timedOut(file.value(), child.timeLimit);
         return Failure{ExitCode::kInterrupted, "interrupted while the model was loaded"};
     }
-    if (process.exitStatus() == QProcess::NormalExit && process.exitCode() == kTimeIsOver)
-        return timeIsOver(file.value(), child.timeLimit);
+    if (process.exitStatus() == QProcess::NormalExit && process.exitCode() == kTimedOut)
+        return timedOut(file.value(), child.timeLimit);
     if (process.exitStatus() == QProcess::NormalExit && process.exitCode() == 0) {
-        if (auto result = fromBytes(process.readAllStandardOutput()))
+        if (auto result = deserialiseModel(process.readAllStandardOutput()))
             return std::move(*result);
     }
     return failure(
@@ -114,7 +114,7 @@ Result<Model> importInChild(const ImportChild& child, const std::string& name,
             "); it is probably damaged: export it again, best as glTF");
 }
 
-bool isImportChild(int argc, char* argv[])
+bool isImportChild(int argc, char* argv[]) noexcept
 {
     return argc == kChildArguments && std::strcmp(argv[kOption], kChildOption) == 0;
 }
@@ -131,7 +131,7 @@ int runImportChild(char* argv[])
     if (up != kNoUpAxis)
         settings.up = static_cast<UpAxis>(up);
     settings.creaseAngle = std::atof(argv[kCreaseAngle]);
-    const QByteArray bytes = toBytes(importOrRunOutOfMemory(argv[kName], settings));
+    const QByteArray bytes = serialiseModel(importOrReportMemory(argv[kName], settings));
     const auto size = static_cast<std::size_t>(bytes.size());
     const bool written = std::fwrite(bytes.constData(), 1, size, output) == size;
     return std::fclose(output) == 0 && written ? 0 : kNoOutput;

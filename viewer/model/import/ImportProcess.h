@@ -1,4 +1,4 @@
-// The import of a model in a process of its own, which may crash or never end.
+// Imports a model in a child process, which protects the viewer from crashes and endless imports.
 #pragma once
 
 #include "viewer/Failure.h"
@@ -10,22 +10,24 @@
 
 namespace viewer {
 
+// How to start and watch the child process.
 struct ImportChild {
     std::string program; // the viewer's own executable
     int timeLimit = 60;  // seconds
-    // Called several times a second with the whole seconds since the start. False ends the import.
+    // Called several times a second with the whole seconds since the start. Returning false cancels
+    // the import.
     std::function<bool(int seconds)> progress;
 };
 
-// Same as importModel, but a crash, an import that takes longer than the time limit, and one that
-// needs more memory than there is are failures as well.
-Result<Model> importInChild(const ImportChild& child, const std::string& name,
-                            const ImportSettings& settings);
+// Does the same as importModel in a child process. A crash, a time-out and lack of memory are
+// failures, too. Blocks until the child has ended.
+[[nodiscard]] Result<Model> importInChild(const ImportChild& child, const std::string& name,
+                                          const ImportSettings& settings);
 
-// Whether these are the arguments of main with which importInChild starts the program.
-bool isImportChild(int argc, char* argv[]);
+// Returns whether the arguments of main are those with which importInChild starts the program.
+[[nodiscard]] bool isImportChild(int argc, char* argv[]) noexcept;
 
-// The main function of the child.
-int runImportChild(char* argv[]);
+// Runs the child: writes the serialised model to standard output. Returns the exit code.
+[[nodiscard]] int runImportChild(char* argv[]);
 
 } // namespace viewer

@@ -7,7 +7,7 @@
 namespace viewer {
 namespace {
 
-// Where Debian's package of sample models installs them.
+// Folder of the sample models of Debian's package assimp-testmodels.
 constexpr char kSampleModels[] = "/usr/share/assimp/models";
 
 Failure failure(const std::string& text)
@@ -15,7 +15,7 @@ Failure failure(const std::string& text)
     return {ExitCode::kModel, text};
 }
 
-Status checkReadable(const std::string& path)
+[[nodiscard]] Status checkReadable(const std::string& path)
 {
     QFile file(QString::fromStdString(path));
     char first = 0;

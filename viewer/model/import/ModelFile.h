@@ -1,4 +1,4 @@
-// Where a model file is, and whether it can be read at all.
+// Resolves the name of a model file.
 #pragma once
 
 #include "viewer/Failure.h"
@@ -7,9 +7,9 @@
 
 namespace viewer {
 
-// Returns the path of a model file that can be opened and read. A name that does not exist is
-// looked up among the sample models that Debian's package assimp-testmodels installs, so that
-// "X/Testwuson.X" works from every folder. The failure names the system's reason.
-Result<std::string> findModelFile(const std::string& name);
+// Returns the path of a regular, readable file that is not empty. If `name` does not exist, it is
+// looked up among the sample models of Debian's package assimp-testmodels, such as "X/Testwuson.X".
+// The failure contains the system's reason.
+[[nodiscard]] Result<std::string> findModelFile(const std::string& name);
 
 } // namespace viewer

@@ -10,7 +10,7 @@
 namespace viewer {
 namespace {
 
-// Extents that post-processing handles, in the file's units.
+// Range of extents that post-processing handles, in the file's units.
 constexpr float kSmallestExtent = 0.1f;
 constexpr float kLargestExtent = 1e6f;
 
@@ -100,7 +100,7 @@ std::optional<std::string> findInAnimation(const aiAnimation& animation)
     return named("animation", animation.mName) + " has a number that is not finite";
 }
 
-// The largest extent of a mesh in its own space.
+// Returns the largest extent of a mesh in its own space.
 float extentOf(const aiMesh& mesh)
 {
     constexpr float kLargest = std::numeric_limits<float>::max();

@@ -1,4 +1,4 @@
-// What is checked and mended in a scene between Assimp's importers and its post-processing.
+// Checks and corrections of a scene between Assimp's importers and its post-processing.
 #pragma once
 
 #include <optional>
@@ -8,13 +8,13 @@ struct aiScene;
 
 namespace viewer {
 
-// Returns what makes the scene useless because a number in it is infinite or not a number, such as
-// "vertex 7 of the mesh 'Cube' is at (inf, 0, 0)". Empty if all numbers are finite.
-std::optional<std::string> findNonFiniteNumber(const aiScene& scene);
+// Describes the first infinite number or NaN in the scene, such as "vertex 7 of the mesh 'Cube' is
+// at (inf, 0, 0)". Empty if all numbers are finite. Normals and colours are not checked.
+[[nodiscard]] std::optional<std::string> findNonFiniteNumber(const aiScene& scene);
 
-// Scales a scene whose largest mesh is very small or very large so that its extent becomes 1.
-// Post-processing compares positions with a fixed tolerance, and squares of coordinates must
-// neither vanish nor overflow.
+// Scales a scene whose largest mesh is very small or very large to an extent of 1. Post-processing
+// compares positions with a fixed tolerance, and squares of coordinates must not underflow or
+// overflow.
 void rescaleExtremeScene(aiScene& scene);
 
 } // namespace viewer

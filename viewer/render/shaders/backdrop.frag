@@ -1,4 +1,4 @@
-// Behind backdrop.glsl.
+// Appended to backdrop.glsl.
 in vec3 direction;
 out vec4 colour;
 

@@ -1,5 +1,5 @@
-// The paper behind the stage, by how far one looks up: the sine of the angle above the horizon. Up
-// to the horizon it has the colour of the lit ground, which fades into it.
+// Returns the colour of the backdrop in a direction of view; `elevation` is the sine of its angle
+// above the horizon. Below the horizon it is the colour of the lit ground, which fades into it.
 vec3 backdropColour(float elevation)
 {
     const vec3 kHorizon = vec3(0.80, 0.80, 0.80);

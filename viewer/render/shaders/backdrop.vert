@@ -1,7 +1,7 @@
 #version 330 core
-// One triangle over the whole picture, at the far end.
+// One triangle that covers the picture, at the far plane.
 
-uniform mat4 fromClip; // to the stage
+uniform mat4 fromClip; // to world space
 uniform vec3 eye;
 
 out vec3 direction;

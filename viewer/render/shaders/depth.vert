@@ -1,10 +1,10 @@
 #version 330 core
 layout(location = 0) in vec3 position;
 
-uniform mat4 toStage;
+uniform mat4 toWorld;
 uniform mat4 toLight;
 
 void main()
 {
-    gl_Position = toLight * (toStage * vec4(position, 1.0));
+    gl_Position = toLight * (toWorld * vec4(position, 1.0));
 }

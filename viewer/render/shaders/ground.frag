@@ -1,14 +1,14 @@
-// Behind lighting.glsl and backdrop.glsl.
-in vec3 stagePosition;
+// Appended to lighting.glsl and backdrop.glsl.
+in vec3 worldPosition;
 
-uniform float clearRadius; // up to here the ground is fully there; at twice as much it is gone
+uniform float clearRadius; // the ground is opaque up to here, and invisible at twice this radius
 
 out vec4 colour;
 
 const vec3 kGroundColour = vec3(0.80, 0.79, 0.78);
 const float kTile = 0.5;
 
-// 1 on the lines between tiles, anti-aliased; they fade before they would flicker.
+// Returns 1 on the lines between tiles, anti-aliased. Lines fade out before they alias.
 float tileLines(vec2 place)
 {
     vec2 width = fwidth(place);
@@ -19,10 +19,10 @@ float tileLines(vec2 place)
 
 void main()
 {
-    float fade = 1.0 - smoothstep(clearRadius, 2.0 * clearRadius, length(stagePosition.xz));
+    float fade = 1.0 - smoothstep(clearRadius, 2.0 * clearRadius, length(worldPosition.xz));
     vec3 up = vec3(0.0, 1.0, 0.0);
-    float key = lightDirection.y * keyVisibility(stagePosition);
-    vec3 albedo = toLinear(kGroundColour) * (1.0 - 0.16 * tileLines(stagePosition.xz / kTile));
+    float key = lightDirection.y * keyVisibility(worldPosition);
+    vec3 albedo = toLinear(kGroundColour) * (1.0 - 0.16 * tileLines(worldPosition.xz / kTile));
     vec3 lit = toScreen(albedo * (key * kKeyColour + ambientLight(up)) * 0.62);
     colour = vec4(mix(backdropColour(0.0), lit, fade), 1.0);
 }

@@ -1,4 +1,4 @@
-#include "viewer/render/CpuTwin.h"
+#include "viewer/render/CpuScene.h"
 
 #include "evaluator/ProfileScope.h"
 
@@ -9,13 +9,13 @@
 
 namespace viewer {
 
-CpuTwin::CpuTwin(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation,
-                 int crowd)
+CpuScene::CpuScene(QOpenGLFunctions_3_3_Core& gl, const Model& model, const Animation* animation,
+                   int crowd)
     : fGL(gl), fScene(gl, model, animation, crowd)
 {
 }
 
-void CpuTwin::follow(const Scene& original)
+void CpuScene::update(const Scene& original)
 {
     const std::vector<CharacterMesh*>& meshes = fScene.meshes();
     for (std::size_t i = 0; i < meshes.size(); ++i) {

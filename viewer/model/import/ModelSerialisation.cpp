@@ -1,4 +1,4 @@
-#include "viewer/model/import/ModelStream.h"
+#include "viewer/model/import/ModelSerialisation.h"
 
 #include <algorithm>
 #include <cstring>
@@ -17,7 +17,7 @@ public:
         fBytes.append(reinterpret_cast<const char*>(&value), sizeof(T));
     }
 
-    // A vector or a string of values that are copied byte by byte.
+    // Writes the size and the bytes of a vector or string of trivially copyable values.
     template <typename List>
     void plainList(const List& list)
     {
@@ -35,13 +35,13 @@ public:
         std::for_each(values.begin(), values.end(), transfer);
     }
 
-    QByteArray take() { return std::move(fBytes); }
+    [[nodiscard]] QByteArray take() { return std::move(fBytes); }
 
 private:
     QByteArray fBytes;
 };
 
-// Leaves the rest as it is once the bytes end too early.
+// Leaves values unchanged after the end of the bytes; finished() then returns false.
 class Reader {
 public:
     explicit Reader(const QByteArray& bytes) : fBytes(bytes) {}
@@ -52,7 +52,7 @@ public:
         if (sizeof(T) <= left())
             std::memcpy(static_cast<void*>(&value), take(sizeof(T)), sizeof(T));
         else
-            fWhole = false;
+            fComplete = false;
     }
 
     template <typename List>
@@ -73,7 +73,8 @@ public:
         std::for_each(values.begin(), values.end(), transfer);
     }
 
-    bool finished() const { return fWhole && left() == 0; }
+    // Returns whether all values were read and no bytes are left.
+    [[nodiscard]] bool finished() const { return fComplete && left() == 0; }
 
 private:
     std::size_t left() const { return static_cast<std::size_t>(fBytes.size()) - fNext; }
@@ -85,24 +86,25 @@ private:
         return bytes;
     }
 
-    // The number of elements of a list, of which each takes at least so many bytes.
-    std::size_t count(std::size_t least)
+    // Reads the size of a list whose elements take at least `elementBytes` each. Returns 0 if fewer
+    // bytes are left.
+    std::size_t count(std::size_t elementBytes)
     {
         std::size_t value = 0;
         plain(value);
-        if (value <= left() / least)
+        if (value <= left() / elementBytes)
             return value;
-        fWhole = false;
+        fComplete = false;
         return 0;
     }
 
     const QByteArray& fBytes;
     std::size_t fNext = 0;
-    bool fWhole = true;
+    bool fComplete = true;
 };
 
-// One description of the layout for both directions. Structures with padding go member by member,
-// so that no stale memory is sent.
+// The layout, described once for both directions. Structures with padding are transferred member by
+// member, which keeps uninitialised bytes out.
 
 template <typename Stream>
 void transferMesh(Stream& stream, Mesh& mesh)
@@ -165,7 +167,7 @@ void transferModel(Stream& stream, Model& model)
 
 } // namespace
 
-QByteArray toBytes(Result<Model> model)
+QByteArray serialiseModel(Result<Model> model)
 {
     Writer writer;
     writer.plain(model ? ExitCode::kSuccess : model.failure().code);
@@ -176,7 +178,7 @@ QByteArray toBytes(Result<Model> model)
     return writer.take();
 }
 
-std::optional<Result<Model>> fromBytes(const QByteArray& bytes)
+std::optional<Result<Model>> deserialiseModel(const QByteArray& bytes)
 {
     Reader reader(bytes);
     auto code = ExitCode::kModel;

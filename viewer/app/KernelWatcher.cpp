@@ -1,4 +1,4 @@
-#include "viewer/app/KernelWatch.h"
+#include "viewer/app/KernelWatcher.h"
 
 #include <utility>
 
@@ -9,32 +9,33 @@
 namespace viewer {
 namespace {
 
-// An editor writes a file in several steps, milliseconds apart.
+// Period without file events before files are read. Editors write a file in several steps,
+// milliseconds apart.
 constexpr qint64 kQuietMs = 50;
 
 } // namespace
 
-KernelWatch::KernelWatch(const QString& folder) : fFolder(folder)
+KernelWatcher::KernelWatcher(const QString& folder) : fFolder(folder)
 {
     if (folder.isEmpty())
         return;
-    const auto stir = [this] { fSinceStir.start(); };
-    QObject::connect(&fWatcher, &QFileSystemWatcher::fileChanged, &fWatcher, stir);
-    QObject::connect(&fWatcher, &QFileSystemWatcher::directoryChanged, &fWatcher, stir);
+    const auto restartTimer = [this] { fSinceChange.start(); };
+    QObject::connect(&fWatcher, &QFileSystemWatcher::fileChanged, &fWatcher, restartTimer);
+    QObject::connect(&fWatcher, &QFileSystemWatcher::directoryChanged, &fWatcher, restartTimer);
     fWatcher.addPath(folder);
     readFiles();
 }
 
-std::vector<ChangedFile> KernelWatch::changes()
+std::vector<ChangedFile> KernelWatcher::changes()
 {
-    if (!fSinceStir.isValid() || fSinceStir.elapsed() < kQuietMs)
+    if (!fSinceChange.isValid() || fSinceChange.elapsed() < kQuietMs)
         return {};
-    fSinceStir.invalidate();
+    fSinceChange.invalidate();
     return readFiles();
 }
 
-// A replaced file is another one for the watcher, which then has given up the path.
-void KernelWatch::watchFiles()
+// Adds new files, and replaced files, which QFileSystemWatcher no longer watches.
+void KernelWatcher::watchFiles()
 {
     const QDir folder(fFolder);
     for (const QString& name : folder.entryList({"*.cl"}, QDir::Files)) {
@@ -44,9 +45,9 @@ void KernelWatch::watchFiles()
     }
 }
 
-std::vector<ChangedFile> KernelWatch::readFiles()
+std::vector<ChangedFile> KernelWatcher::readFiles()
 {
-    // Watched before they are read, so that no change falls between.
+    // Watch before reading, to miss no change in between.
     watchFiles();
     std::vector<ChangedFile> changed;
     for (const QString& path : fWatcher.files()) {
