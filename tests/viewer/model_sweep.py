@@ -1,10 +1,10 @@
-"""Shows every sample model, and damaged copies of them, with the viewer.
+"""Runs the viewer on every sample model, or on damaged copies of them.
 
     model_sweep.py VIEWER [--damaged N] [--seed N] [--only PATTERN] [--keep FOLDER]
 
-Each run must end within the time limit, either with exit code 0 and a picture or with exit code 3 or 8
-and one sentence on standard error. Prints one line for each file; the exit code is 1 if a run ended in
-another way. The same seed makes the same damaged files.
+Each run must end within the time limit, either with exit code 0 and a picture, or with exit code 3 or 8
+and one message on standard error. Prints one line for each file. The exit code is 1 if a run ends in
+another way. The same seed creates the same damaged files.
 """
 import argparse
 import collections
@@ -17,14 +17,14 @@ import tempfile
 import time
 
 SAMPLES = pathlib.Path("/usr/share/assimp/models")
-# Seconds: what the viewer allows for a load, and as much for its start and the picture.
+# Seconds: the viewer's limit for loading, and the same for its start and the picture.
 TIME_LIMIT = 120
 LARGEST_DAMAGED = 1 << 20  # bytes
-SENTENCE_CODES = {3, 8}  # the model cannot be used, memory runs out
+MESSAGE_CODES = {3, 8}  # the model cannot be used, out of memory
 
 
 def sample_files():
-    # Textures, buffers, materials and texts, which belong to models.
+    # Textures, buffers, materials and texts that belong to models.
     others = set(".bin .bmp .dds .frag .gif .glsl .jpeg .jpg .material .md .mtl .png .source .tga .txt .vert".split())
     return [path for path in sorted(SAMPLES.rglob("*")) if path.is_file() and path.suffix.lower() not in others]
 
@@ -40,18 +40,10 @@ def with_random_bytes(data, chance):
     return bytes(data)
 
 
-def with_a_block(data, chance, filler):
+def with_constant_block(data, chance):
     start = chance.randrange(len(data))
     length = min(chance.choice([4, 16, 256]), len(data) - start)
-    return data[:start] + filler * length + data[start + length:]
-
-
-def with_zeros(data, chance):
-    return with_a_block(data, chance, b"\0")
-
-
-def with_ones(data, chance):
-    return with_a_block(data, chance, b"\xff")
+    return data[:start] + chance.choice([b"\0", b"\xff"]) * length + data[start + length:]
 
 
 def with_another_number(data, chance):
@@ -62,16 +54,16 @@ def with_another_number(data, chance):
     return data[:number.start()] + chance.choice([b"0", b"-1", b"4294967295", b"1e39", b"nan"]) + data[number.end():]
 
 
-def with_a_repeated_block(data, chance):
+def with_repeated_block(data, chance):
     start = chance.randrange(len(data))
     return data[:start] + data[start:start + 512] * 2 + data[start + 512:]
 
 
-DAMAGES = [truncated, with_random_bytes, with_zeros, with_ones, with_another_number, with_a_repeated_block]
+DAMAGES = [truncated, with_random_bytes, with_constant_block, with_another_number, with_repeated_block]
 
 
 def damaged_files(count, seed, folder):
-    """Damaged copies, each in a folder with links to the files beside the original."""
+    """Creates damaged copies, each in a folder with links to the files in the original's folder."""
     chance = random.Random(seed)
     originals = [path for path in sample_files() if 0 < path.stat().st_size <= LARGEST_DAMAGED]
     for number in range(count):
@@ -89,32 +81,32 @@ def damaged_files(count, seed, folder):
 
 
 def show(viewer, path, pictures):
-    """Returns a verdict, the last line of standard error, and the seconds that the run took."""
+    """Returns a verdict, the last line of standard error, and the duration in seconds."""
     begin = time.monotonic()
     try:
         run = subprocess.run(
             [viewer, "--allow-cpu", "--frames", "1", "--size", "320x180", "--output", pictures, path],
             capture_output=True, timeout=TIME_LIMIT, check=False)
     except subprocess.TimeoutExpired:
-        return "HANGS", "", TIME_LIMIT
+        return "TIMED OUT", "", TIME_LIMIT
     seconds = time.monotonic() - begin
     errors = run.stderr.decode(errors="replace").strip().splitlines()
     last = errors[-1] if errors else ""
     if run.returncode == 0:
         return "picture" if (pictures / "frame-0000.png").exists() else "NO PICTURE", "", seconds
-    sentences = [line for line in errors if line.startswith("vyra-viewer: ") and ": loading '" not in line]
-    if run.returncode in SENTENCE_CODES and sentences == [last]:
-        return "sentence", last, seconds
-    return f"ENDS WITH {run.returncode}", last, seconds
+    messages = [line for line in errors if line.startswith("vyra-viewer: ") and ": loading '" not in line]
+    if run.returncode in MESSAGE_CODES and messages == [last]:
+        return "message", last, seconds
+    return f"EXIT CODE {run.returncode}", last, seconds
 
 
 def main():
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("viewer")
-    parser.add_argument("--damaged", type=int, default=0, help="as many damaged files instead of the samples")
+    parser.add_argument("--damaged", type=int, default=0, help="number of damaged files to use instead of the samples")
     parser.add_argument("--seed", type=int, default=1)
-    parser.add_argument("--only", default="", help="only paths that match this expression")
-    parser.add_argument("--keep", type=pathlib.Path, help="keeps pictures and damaged files in this folder")
+    parser.add_argument("--only", default="", help="use only paths that match this expression")
+    parser.add_argument("--keep", type=pathlib.Path, help="folder in which pictures and damaged files are kept")
     options = parser.parse_args()
     counts = collections.Counter()
     with tempfile.TemporaryDirectory() as scratch:
@@ -124,11 +116,11 @@ def main():
             name = path.relative_to(folder / "damaged" if options.damaged else SAMPLES)
             if not re.search(options.only, str(name)):
                 continue
-            verdict, words, seconds = show(options.viewer, path, folder / "pictures" / name)
+            verdict, message, seconds = show(options.viewer, path, folder / "pictures" / name)
             counts[verdict] += 1
-            print(f"{seconds:6.1f} s  {verdict:10}  {name}  {words}", flush=True)
+            print(f"{seconds:6.1f} s  {verdict:10}  {name}  {message}", flush=True)
     print(", ".join(f"{verdict}: {count}" for verdict, count in counts.most_common()))
-    return 0 if counts and counts.keys() <= {"picture", "sentence"} else 1
+    return 0 if counts and counts.keys() <= {"picture", "message"} else 1
 
 
 if __name__ == "__main__":
