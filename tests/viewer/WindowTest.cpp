@@ -191,24 +191,16 @@ TEST_F(WindowTest, ChangedKernelIsReloadedUnlessItDoesNotBuild)
         file.write(QByteArray(original).replace(from, to));
         file.close();
     };
-    // Plays until the edited text is rejected. Returns what was written to standard error.
-    const auto playUntilRejected = [&](const char* from, const char* to) {
-        edit(from, to);
-        QElapsedTimer timer;
-        timer.start();
-        std::string written;
-        while (written.empty() && timer.elapsed() < kHangMs) {
-            testing::internal::CaptureStderr();
-            playWhileVerified(player, kSliceMs);
-            written = testing::internal::GetCapturedStderr();
-        }
-        return written;
-    };
-
-    EXPECT_THAT(playUntilRejected("unitScale(", "unitScal("),
-                AllOf(HasSubstr("does not compile"), HasSubstr("'unitScal'")));
-    EXPECT_THAT(playUntilRejected("twistPerHeight)\n{", "twistPerHeight, const int more)\n{"),
-                HasSubstr("takes 13 arguments"));
+    edit("unitScale(", "unitScal(");
+    QElapsedTimer timer;
+    timer.start();
+    std::string errors;
+    while (errors.empty() && timer.elapsed() < kHangMs) {
+        testing::internal::CaptureStderr();
+        playWhileVerified(player, kSliceMs);
+        errors = testing::internal::GetCapturedStderr();
+    }
+    EXPECT_THAT(errors, AllOf(HasSubstr("does not compile"), HasSubstr("'unitScal'")));
     EXPECT_TRUE(fSession->verified());
     edit("sineAndCosine(twist", "sineAndCosine(2.0f * twist");
     playWhileVerified(player, kHangMs);
