@@ -83,7 +83,8 @@ private:
     std::unique_ptr<KernelLibrary> fLibrary;
     std::vector<std::unique_ptr<DeformationQueue>> fQueues;
 
-    // The rest poses on the device, by geometry; the weak pointer shows that the geometry was destroyed.
+    // The rest poses on the device, by geometry; the weak pointer shows that the geometry was
+    // destroyed.
     struct SharedRestPose {
         std::weak_ptr<const MeshGeometry> geometry;
         RestPose rest;

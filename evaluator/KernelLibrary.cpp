@@ -191,11 +191,12 @@ Status KernelLibrary::replaceFile(const std::string& file, const std::string& te
         if (std::get<0>(key) != file)
             continue;
         LibraryKernel kernel = build(key, &next);
-        if (kernel.status.ok() && entry.passedCount && kernel.argumentCount != entry.passedCount)
+        if (kernel.status.ok() && entry.passedCount && kernel.argumentCount != entry.passedCount) {
             kernel.status =
                 Status("the kernel '" + std::get<1>(key) + "' of " + file + " takes " +
                        std::to_string(kernel.argumentCount) +
                        " arguments, and its deformer passes " + std::to_string(entry.passedCount));
+        }
         if (kernel.status.ok()) {
             replaced[key] = std::move(kernel.kernel);
             programs.insert(std::get<2>(key));

@@ -70,16 +70,18 @@ Status KernelPass::setArguments(FrameBlock& frame, KernelLibrary& library)
         library.noteArguments(fDeformer.kernel(fPass), fIndex);
         fNotedCount = fIndex;
     }
-    if (fIndex != fArguments.size())
+    if (fIndex != fArguments.size()) {
         return Status("the kernel '" + fFunction + "' of " + fFile + " takes " +
                       std::to_string(fArguments.size()) + " arguments, and its deformer passes " +
                       std::to_string(fIndex) + ", with the " + std::to_string(kCommonArguments) +
                       " common ones; make the two agree");
-    if (fStatus != CL_SUCCESS)
+    }
+    if (fStatus != CL_SUCCESS) {
         return Status("an argument of the kernel '" + fFunction + "' of " + fFile +
                           " cannot be set (" + CLErrorCodeStr(fStatus) +
                           "); check its type and size",
                       fStatus);
+    }
     return {};
 }
 

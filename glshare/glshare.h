@@ -18,7 +18,7 @@ typedef struct glshare_counters {
     uint64_t acquired_by_copy;  /* acquires that copied from the OpenGL buffer */
     uint64_t released_by_copy;  /* releases that copied to the OpenGL buffer */
     uint64_t bytes_copied;      /* in either direction */
-    uint64_t failed_copies;     /* copies that failed: the buffer was deleted, mapped or too small */
+    uint64_t failed_copies; /* copies that failed: the buffer was deleted, mapped or too small */
 } glshare_counters;
 
 /* Writes the totals to `counters`. Any thread. */

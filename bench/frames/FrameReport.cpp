@@ -167,11 +167,12 @@ void writeGoals(std::ostream& output, const std::vector<CrowdTimes>& crowds)
 {
     Table table({"content", "characters", "comparison", "ratio", "10 %", "90 %", "of the 10 %",
                  "goal", "verdict"});
-    for (const Comparison& comparison : comparisonsOf(crowds))
+    for (const Comparison& comparison : comparisonsOf(crowds)) {
         table.add({comparison.content, comparison.crowd, comparison.name,
                    fixed(comparison.ratio.median, 2), fixed(comparison.ratio.low, 2),
                    fixed(comparison.ratio.high, 2), fixed(comparison.undisturbed, 2),
                    limitOf(comparison), verdictOf(comparison)});
+    }
     table.write(output);
 }
 
@@ -183,7 +184,7 @@ QJsonObject toJson(const std::vector<CrowdTimes>& crowds)
             rows.append(toJson(crowd, path));
     }
     QJsonArray goals;
-    for (const Comparison& comparison : comparisonsOf(crowds))
+    for (const Comparison& comparison : comparisonsOf(crowds)) {
         goals.append(QJsonObject{{"content", QString::fromStdString(comparison.content)},
                                  {"characters", QString::fromStdString(comparison.crowd)},
                                  {"comparison", QString::fromStdString(comparison.name)},
@@ -191,5 +192,6 @@ QJsonObject toJson(const std::vector<CrowdTimes>& crowds)
                                  {"undisturbed", comparison.undisturbed},
                                  {"goal", QString::fromStdString(limitOf(comparison))},
                                  {"verdict", QString::fromStdString(verdictOf(comparison))}});
+    }
     return {{"rows", rows}, {"comparisons", goals}};
 }

@@ -61,11 +61,12 @@ public:
                 continue;
             const viewer::Deviation deviation = viewer::verify(fGL, *candidate.scene);
             if (!(deviation.position <= viewer::kPositionBound &&
-                  deviation.normal <= fContent.normalBound))
+                  deviation.normal <= fContent.normalBound)) {
                 throw std::runtime_error("the last frame of the path '" + candidate.times.name +
                                          "' deviates from the reference: positions by " +
                                          std::to_string(deviation.position) + ", normals by " +
                                          std::to_string(deviation.normal));
+            }
         }
     }
 

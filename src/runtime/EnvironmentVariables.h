@@ -1,5 +1,5 @@
-// Names of the environment variables that the library reads. docs/messages.md describes their values.
-// Internal.
+// Names of the environment variables that the library reads. docs/messages.md describes their
+// values. Internal.
 #pragma once
 
 inline constexpr char kDisableOpenCLVariable[] = "VYRA_DISABLE_OPENCL";

@@ -58,11 +58,12 @@ TEST_F(CommandOrderTest, ReleaseWithCurrentContextReturnsWhenCompleteOnlyWithGlE
     ASSERT_EQ(fQueue.acquire(fMemory), CL_SUCCESS);
     fQueue.fill(fMemory, 6, {gate});
     std::jthread opener;
-    if (offersGlEvent())
+    if (offersGlEvent()) {
         opener = std::jthread([&] {
             std::this_thread::sleep_for(kSettled);
             clSetUserEventStatus(gate, CL_COMPLETE);
         });
+    }
     Event event;
     EXPECT_EQ(fQueue.release(fMemory, {}, &event), CL_SUCCESS);
     if (offersGlEvent()) {

@@ -23,8 +23,8 @@ protected:
     // Sets the variables and initialises the library; a null value removes the variable. Skips the
     // test when the machine has no OpenGL; a runtime that cannot be initialised fails it.
     void start(std::initializer_list<Variable> environment = {});
-    // Sets VYRA_OPENCL_PLATFORM, if it is not set, to the vendor of the first platform: no PCI vendor
-    // id belongs to the software runtimes.
+    // Sets VYRA_OPENCL_PLATFORM, if it is not set, to the vendor of the first platform: no PCI
+    // vendor id belongs to the software runtimes.
     static void chooseFirstPlatform();
     ~LibraryTest() override;
 

@@ -43,5 +43,6 @@ TEST(Load, LoadingConstructsStaticObjectsAndUnloadingDestroysInReverse)
     *reinterpret_cast<cl_mem*>(null) = clCreateBuffer(context, 0, 64, nullptr, nullptr);
     runtime.takeCalls();
     unloadLibrary(library);
-    EXPECT_EQ(runtime.takeCalls(), (Lines{"trace destroyed: clKernel", "clReleaseMemObject(mem#1)"}));
+    EXPECT_EQ(runtime.takeCalls(),
+              (Lines{"trace destroyed: clKernel", "clReleaseMemObject(mem#1)"}));
 }

@@ -97,12 +97,13 @@ TEST(Profiler, EachThreadHasItsOwnTrack)
     ProfileRecorder::start();
     std::vector<std::jthread> threads;
     threads.reserve(threadCount);
-    for (int i = 0; i < threadCount; ++i)
+    for (int i = 0; i < threadCount; ++i) {
         threads.emplace_back([name = "work" + std::to_string(i)] {
             ProfileRecorder::nameThread("row of " + name);
             for (std::size_t event = 0; event < eventsPerThread; ++event)
                 profiler::eventEnd(begin(name.c_str()));
         });
+    }
     threads.clear();
     ProfileRecorder::stop();
 

@@ -95,7 +95,7 @@ TEST(UniqueString, EqualTextsHaveOneHandleOnAllThreads)
 
     std::vector handles(threadCount, std::vector<TuniqueString>(texts.size()));
     std::vector<std::jthread> threads;
-    for (std::size_t thread = 0; thread < threadCount; ++thread)
+    for (std::size_t thread = 0; thread < threadCount; ++thread) {
         threads.emplace_back([&, thread] {
             for (std::size_t i = 0; i < texts.size(); ++i) {
                 // Pairs of threads use the same order, so that both intern each text at once.
@@ -103,6 +103,7 @@ TEST(UniqueString, EqualTextsHaveOneHandleOnAllThreads)
                 handles[thread][at] = TuniqueString(texts[at].c_str());
             }
         });
+    }
     threads.clear();
     for (std::size_t text = 0; text < texts.size(); ++text)
         ASSERT_EQ(handles[0][text].asChar(), texts[text]);

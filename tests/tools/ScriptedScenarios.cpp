@@ -51,11 +51,12 @@ const bool kDescribed = [] {
     World world;
     scenario.describe(world);
     scripted::runtime().describe(world);
-    if (scenario.failing)
+    if (scenario.failing) {
         scripted::runtime().plan({.function = scenario.failing,
                                   .status = scenario.status,
                                   .nth = scenario.nth,
                                   .onwards = true});
+    }
     return true;
 }();
 

@@ -119,11 +119,12 @@ public:
         const auto match = pattern.match(fParser.value("size"));
         const QSize size(match.captured(1).toInt(), match.captured(2).toInt());
         if (std::min(size.width(), size.height()) < kSmallestPicture ||
-            std::max(size.width(), size.height()) > kLargestPicture)
+            std::max(size.width(), size.height()) > kLargestPicture) {
             reject(QString("--size takes WIDTHxHEIGHT, each from %1 to %2, not '%3'")
                        .arg(kSmallestPicture)
                        .arg(kLargestPicture)
                        .arg(fParser.value("size")));
+        }
         return size;
     }
 

@@ -135,11 +135,12 @@ QSurfaceFormat surfaceFormat(bool waitForDisplay)
     Status failure = options.frames ? renderFrames(session, window, *options.frames)
                                     : playInWindow(session, window);
     verified = session.verified();
-    if (!failure && options.verify && !session.usesOpenCL())
+    if (!failure && options.verify && !session.usesOpenCL()) {
         failure =
             Failure{ExitCode::kDeviation,
                     "--verify compared nothing that OpenCL deformed: all meshes were deformed "
                     "on the CPU; the report shows why"};
+    }
     std::fputs(session.report().c_str(), stdout);
     return failure;
 }

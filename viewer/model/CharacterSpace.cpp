@@ -70,11 +70,12 @@ std::vector<QVector3D> vertices(const Model& model, const std::vector<MeshShape>
 void appendOutline(const std::vector<QVector3D>& points, std::vector<QVector3D>& outline)
 {
     static const std::vector<QVector3D> directions = outlineDirections();
-    for (const QVector3D& direction : directions)
+    for (const QVector3D& direction : directions) {
         outline.push_back(*std::max_element(
             points.begin(), points.end(), [&](const QVector3D& a, const QVector3D& b) {
                 return QVector3D::dotProduct(a, direction) < QVector3D::dotProduct(b, direction);
             }));
+    }
 }
 
 } // namespace

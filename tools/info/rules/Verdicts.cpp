@@ -53,11 +53,12 @@ std::string rendererDeviceMismatch(const Diagnostics& diagnostics)
     if (!diagnostics.renderer.adapterVendorId)
         return pair + "; no GPU vendor can be derived from OpenGL's texts, so it draws in software "
                       "or with an unknown GPU";
-    if (device->vendorId && *device->vendorId != *diagnostics.renderer.adapterVendorId)
+    if (device->vendorId && *device->vendorId != *diagnostics.renderer.adapterVendorId) {
         return pair + "; the two are of different vendors (ids " +
                hex(*diagnostics.renderer.adapterVendorId) + " and " + hex(*device->vendorId) +
                "), so every shared buffer crosses from one to the other, if it can be shared at "
                "all";
+    }
     if (!device->drivesRenderer)
         return pair +
                "; the runtime does not report it as the device that drives the OpenGL context";
