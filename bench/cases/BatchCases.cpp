@@ -309,7 +309,7 @@ std::vector<GroupFactory> batchGroups(Runtime* runtime)
             count);
     add("batch rebuild, 4096 buffers", rebuild, std::size_t{4096});
     add("acquire of a batched buffer", acquireBatched);
-    add("reports events over, 1 thread", reportEvents, std::size_t{1});
-    add("reports events over, 2 threads", reportEvents, std::size_t{2});
+    add("reporting events, 1 thread", reportEvents, std::size_t{1});
+    add("reporting events, 2 threads", reportEvents, std::size_t{2});
     return groups;
 }
