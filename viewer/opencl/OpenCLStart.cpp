@@ -3,6 +3,7 @@
 #include "diagnostics/CLWarningSink.h"
 #include "host/Environment.h"
 #include "loader/OpenCLLibraryName.h"
+#include "runtime/EnvironmentVariables.h"
 #include "runtime/TopenCLInfo.h"
 #include "standalone/NativeContext.h"
 #include "standalone/OpenCLPlatforms.h"
@@ -18,8 +19,6 @@
 
 namespace viewer {
 namespace {
-
-constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
 
 // Records the library's warnings during its lifetime. Only one thread starts the library.
 class WarningList {
@@ -54,7 +53,7 @@ StartDiagnostics collectDiagnostics(bool platformIsGiven, bool cpuIsAllowed, uns
 {
     StartDiagnostics diagnostics;
     diagnostics.libraryFound = QLibrary(kOpenCLLibraryName).load();
-    diagnostics.disabled = qEnvironmentVariableIsSet("VYRA_DISABLE_OPENCL");
+    diagnostics.disabled = qEnvironmentVariableIsSet(kDisableOpenCLVariable);
     diagnostics.platformIsGiven = platformIsGiven;
     diagnostics.cpuIsAllowed = cpuIsAllowed;
     diagnostics.vendorId = vendorId;

@@ -1,6 +1,7 @@
 #include "tools/info/diagnostics/DiagnosticsCollection.h"
 
 #include "host/Environment.h"
+#include "runtime/EnvironmentVariables.h"
 #include "standalone/OpenCLPlatforms.h"
 #include "tools/info/diagnostics/PlatformSurvey.h"
 #include "tools/info/diagnostics/RenderWindow.h"
@@ -16,8 +17,6 @@
 
 namespace info {
 namespace {
-
-constexpr char kPlatformVariable[] = "VYRA_OPENCL_PLATFORM";
 
 // Variables of other components that select the OpenCL and the OpenGL in use. A name without "=" is
 // a prefix.
@@ -69,7 +68,7 @@ std::vector<Variable> variablesOfInterest()
 // Reads the variable as the library does.
 std::optional<int> readIgnoreDriverVersion()
 {
-    const char* value = std::getenv("VYRA_OPENCL_IGNORE_DRIVER_VERSION");
+    const char* value = std::getenv(kIgnoreDriverVersionVariable);
     return value ? std::optional<int>(std::atoi(value)) : std::nullopt;
 }
 
@@ -80,8 +79,7 @@ Environment readEnvironment(bool platformFromOption)
     environment.platformFromOption = platformFromOption;
     environment.syncModes = readSyncModeVariables();
     environment.ignoreDriverVersion = readIgnoreDriverVersion();
-    environment.requireDoublePrecision =
-        TenvironmentVariable("VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT").asInt32(0);
+    environment.requireDoublePrecision = TenvironmentVariable(kOffWithoutDoubleVariable).asInt32(0);
     return environment;
 }
 

@@ -5,6 +5,8 @@
 #include "tools/info/rules/SyncDecisions.h"
 #include "tools/info/text/TextFormatting.h"
 
+#include "runtime/EnvironmentVariables.h"
+
 #include <optional>
 
 namespace info {
@@ -16,11 +18,11 @@ Decision decidePlatform(const Diagnostics& diagnostics, const Platform& platform
     if (diagnostics.environment.platformWasChosen) {
         decision.reason = "no GPU vendor can be derived from the renderer, and this platform alone "
                           "shares with OpenGL";
-    } else if (diagnostics.environment.find("VYRA_OPENCL_PLATFORM")) {
+    } else if (diagnostics.environment.find(kPlatformVariable)) {
         decision.reason = diagnostics.environment.platformFromOption
                               ? "--platform names its vendor"
                               : "VYRA_OPENCL_PLATFORM names its vendor";
-        decision.variable = "VYRA_OPENCL_PLATFORM";
+        decision.variable = kPlatformVariable;
     } else {
         const bool fromRenderer =
             diagnostics.renderer.adapterVendorId == diagnostics.startUp.vendorId;
@@ -54,7 +56,7 @@ Decision decideDriver(const Diagnostics& diagnostics, const Device& device)
     } else {
         decision.reason = "it is in the range 361.92 to 368.85, whose OpenCL fails, and "
                           "VYRA_OPENCL_IGNORE_DRIVER_VERSION accepts it";
-        decision.variable = "VYRA_OPENCL_IGNORE_DRIVER_VERSION";
+        decision.variable = kIgnoreDriverVersionVariable;
     }
     return decision;
 }
@@ -92,12 +94,11 @@ Decision decideDoublePrecision(const Diagnostics& diagnostics, const Platform& p
 
 Decision decideMinimumVertices(const Diagnostics& diagnostics)
 {
-    constexpr char kVariable[] = "VYRA_OPENCL_DEFORMER_MIN_VERTS";
     Decision decision{"minimum-vertices", "Minimum vertices of a mesh",
                       std::to_string(diagnostics.startUp.minimumVertices), "", ""};
-    if (diagnostics.environment.find(kVariable)) {
-        decision.reason = std::string(kVariable) + " sets it";
-        decision.variable = kVariable;
+    if (diagnostics.environment.find(kMinimumVerticesVariable)) {
+        decision.reason = std::string(kMinimumVerticesVariable) + " sets it";
+        decision.variable = kMinimumVerticesVariable;
     } else {
         decision.reason = diagnostics.startUp.provider == kNVIDIAProvider
                               ? "it is the default with NVIDIA"

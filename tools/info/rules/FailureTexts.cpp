@@ -3,6 +3,8 @@
 #include "tools/info/text/NearestName.h"
 #include "tools/info/text/TextFormatting.h"
 
+#include "runtime/EnvironmentVariables.h"
+
 #include <algorithm>
 
 namespace info {
@@ -40,7 +42,7 @@ void explainRenderer(const Diagnostics& diagnostics, StartUpFailure& failure)
 
 void explainSwitch(const Diagnostics& diagnostics, StartUpFailure& failure)
 {
-    const std::string* value = diagnostics.environment.find("VYRA_DISABLE_OPENCL");
+    const std::string* value = diagnostics.environment.find(kDisableOpenCLVariable);
     failure.reason = "VYRA_DISABLE_OPENCL is set (to " + quoted(value ? *value : "") +
                      "). Its presence alone switches OpenCL off, whatever its value.";
     failure.remedy = "Remove the variable: unset VYRA_DISABLE_OPENCL.";
@@ -104,7 +106,7 @@ void explainPlatform(const Diagnostics& diagnostics, StartUpFailure& failure)
     const std::string wanted = diagnostics.wantedVendor.value_or("");
     failure.reason = "No platform has the vendor " + quoted(wanted) + "; this machine has " +
                      quotedList(vendors) + ".";
-    if (diagnostics.environment.find("VYRA_OPENCL_PLATFORM")) {
+    if (diagnostics.environment.find(kPlatformVariable)) {
         explainPlatformByName(vendors, wanted, failure);
         return;
     }
@@ -211,8 +213,7 @@ void explainDoublePrecision(const Diagnostics& diagnostics, StartUpFailure& fail
         failure.remedy = kDriverProblem;
         return;
     }
-    const std::string* value =
-        diagnostics.environment.find("VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT");
+    const std::string* value = diagnostics.environment.find(kOffWithoutDoubleVariable);
     failure.reason =
         "The device has no double precision, and VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT=" +
         (value ? *value : "") + " requires it.";

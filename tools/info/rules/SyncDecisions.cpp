@@ -2,11 +2,10 @@
 
 #include "tools/info/rules/DriverRules.h"
 
+#include "runtime/EnvironmentVariables.h"
+
 namespace info {
 namespace {
-
-constexpr char kForceFinish[] = "VYRA_OPENCL_FORCE_FINISH";
-constexpr char kForceThreading[] = "VYRA_OPENCL_FORCE_THREADING";
 
 // Returns the inputs of the library's choice.
 SyncAbilities abilitiesOf(const Diagnostics& diagnostics)
@@ -78,20 +77,20 @@ TopenCLInfo::CLToGraphicsSyncMode automaticCLToGraphicsMode(const Diagnostics& d
 
 Decision decideGraphicsToCL(const Diagnostics& diagnostics)
 {
-    constexpr char kVariable[] = "VYRA_GRAPHICSTOOPENCL_SYNC_MODE";
     const SyncModeVariables& requested = diagnostics.environment.syncModes;
     const SyncAbilities abilities = abilitiesOf(diagnostics);
     const TopenCLInfo::GraphicsToCLSyncMode mode = diagnostics.startUp.graphicsToCL;
     Decision decision{"graphics-to-opencl", "OpenCL waits for OpenGL by",
                       graphicsToCLModeName(mode), "", ""};
     if (requested.forceFinish != 0) {
-        decision.reason = std::string(kForceFinish) + " forces it";
-        decision.variable = kForceFinish;
+        decision.reason = std::string(kForceFinishVariable) + " forces it";
+        decision.variable = kForceFinishVariable;
     } else if (requested.graphicsToCL >= TopenCLInfo::kGraphicsToCLImplicit &&
                requested.graphicsToCL <= TopenCLInfo::kGraphicsToCLFinish) {
-        decision.reason = forcedReason(kVariable, requested.graphicsToCL, mode, abilities.glEvent);
+        decision.reason = forcedReason(kGraphicsToCLSyncVariable, requested.graphicsToCL, mode,
+                                       abilities.glEvent);
         if (mode != automaticGraphicsToCLMode(diagnostics))
-            decision.variable = kVariable;
+            decision.variable = kGraphicsToCLSyncVariable;
     } else if (abilities.glEvent) {
         decision.reason = "the platform lists cl_khr_gl_event";
     } else {
@@ -103,20 +102,20 @@ Decision decideGraphicsToCL(const Diagnostics& diagnostics)
 
 Decision decideCLToGraphics(const Diagnostics& diagnostics)
 {
-    constexpr char kVariable[] = "VYRA_OPENCLTOGRAPHICS_SYNC_MODE";
     const SyncModeVariables& requested = diagnostics.environment.syncModes;
     const SyncAbilities abilities = abilitiesOf(diagnostics);
     const TopenCLInfo::CLToGraphicsSyncMode mode = diagnostics.startUp.clToGraphics;
     Decision decision{"opencl-to-graphics", "OpenGL waits for OpenCL by",
                       clToGraphicsModeName(mode), "", ""};
     if (requested.forceFinish != 0) {
-        decision.reason = std::string(kForceFinish) + " forces it";
-        decision.variable = kForceFinish;
+        decision.reason = std::string(kForceFinishVariable) + " forces it";
+        decision.variable = kForceFinishVariable;
     } else if (requested.clToGraphics >= TopenCLInfo::kCLToGraphicsImplicit &&
                requested.clToGraphics <= TopenCLInfo::kCLToGraphicsFinish) {
-        decision.reason = forcedReason(kVariable, requested.clToGraphics, mode, true);
+        decision.reason =
+            forcedReason(kCLToGraphicsSyncVariable, requested.clToGraphics, mode, true);
         if (mode != automaticCLToGraphicsMode(diagnostics))
-            decision.variable = kVariable;
+            decision.variable = kCLToGraphicsSyncVariable;
     } else if (!abilities.glEvent) {
         decision.reason = "the platform does not list cl_khr_gl_event";
     } else if (!abilities.implicitSyncTrusted) {
@@ -126,7 +125,7 @@ Decision decideCLToGraphics(const Diagnostics& diagnostics)
         const bool trusted =
             judgeChosenDriver(diagnostics, std::nullopt).value_or(DriverVerdict{}).implicitSync;
         if (diagnostics.startUp.provider == kNVIDIAProvider && !trusted)
-            decision.variable = "VYRA_OPENCL_IGNORE_DRIVER_VERSION";
+            decision.variable = kIgnoreDriverVersionVariable;
     }
     return decision;
 }
@@ -137,9 +136,9 @@ Decision decideThreadedSharing(const Diagnostics& diagnostics)
                       diagnostics.startUp.threadedSharing ? "yes" : "no", "", ""};
     if (diagnostics.startUp.provider != kNVIDIAProvider) {
         decision.reason = "only NVIDIA's OpenGL sharing does not allow it";
-    } else if (diagnostics.environment.find(kForceThreading)) {
-        decision.reason = std::string(kForceThreading) + " is set";
-        decision.variable = kForceThreading;
+    } else if (diagnostics.environment.find(kForceThreadingVariable)) {
+        decision.reason = std::string(kForceThreadingVariable) + " is set";
+        decision.variable = kForceThreadingVariable;
     } else {
         decision.reason = "NVIDIA's OpenGL sharing does not allow it";
     }
@@ -148,11 +147,12 @@ Decision decideThreadedSharing(const Diagnostics& diagnostics)
 
 Decision decideBatching(const Diagnostics& diagnostics)
 {
-    const bool forced = diagnostics.environment.find(kForceThreading) != nullptr;
+    const bool forced = diagnostics.environment.find(kForceThreadingVariable) != nullptr;
     if (forced)
         return {"batching", "Shared buffers in one batch", "no",
-                std::string(kForceThreading) + " is set: each buffer is acquired on its own",
-                kForceThreading};
+                std::string(kForceThreadingVariable) +
+                    " is set: each buffer is acquired on its own",
+                kForceThreadingVariable};
     return {"batching", "Shared buffers in one batch", "yes",
             "one acquire and one release cover all buffers", ""};
 }

@@ -7,6 +7,8 @@
 #include "tools/info/text/NearestName.h"
 #include "tools/info/text/TextFormatting.h"
 
+#include "runtime/EnvironmentVariables.h"
+
 #include <algorithm>
 #include <cctype>
 #include <iterator>
@@ -128,15 +130,15 @@ struct KnownVariable {
 };
 
 constexpr KnownVariable kKnownVariables[] = {
-    {"VYRA_DISABLE_OPENCL", StartUpStep::kSwitch, explainDisable},
-    {"VYRA_OPENCL_PLATFORM", StartUpStep::kVendor, explainPlatform},
-    {"VYRA_OPENCL_DEFORMER_MIN_VERTS", StartUpStep::kDevice, explainMinimumVertices},
-    {"VYRA_OPENCL_IGNORE_DRIVER_VERSION", StartUpStep::kDriver, explainIgnoreDriver},
-    {"VYRA_OPENCL_FORCE_FINISH", StartUpStep::kSharingFunctions, explainForceFinish},
-    {"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", StartUpStep::kSharingFunctions, explainGraphicsToCL},
-    {"VYRA_OPENCLTOGRAPHICS_SYNC_MODE", StartUpStep::kSharingFunctions, explainCLToGraphics},
-    {"VYRA_OPENCL_OFF_WITHOUT_DOUBLE_SUPPORT", StartUpStep::kDoublePrecision, explainDoubleDemand},
-    {"VYRA_OPENCL_FORCE_THREADING", StartUpStep::kSwitch, explainForceThreading},
+    {kDisableOpenCLVariable, StartUpStep::kSwitch, explainDisable},
+    {kPlatformVariable, StartUpStep::kVendor, explainPlatform},
+    {kMinimumVerticesVariable, StartUpStep::kDevice, explainMinimumVertices},
+    {kIgnoreDriverVersionVariable, StartUpStep::kDriver, explainIgnoreDriver},
+    {kForceFinishVariable, StartUpStep::kSharingFunctions, explainForceFinish},
+    {kGraphicsToCLSyncVariable, StartUpStep::kSharingFunctions, explainGraphicsToCL},
+    {kCLToGraphicsSyncVariable, StartUpStep::kSharingFunctions, explainCLToGraphics},
+    {kOffWithoutDoubleVariable, StartUpStep::kDoublePrecision, explainDoubleDemand},
+    {kForceThreadingVariable, StartUpStep::kSwitch, explainForceThreading},
 };
 
 const KnownVariable* findKnown(const std::string& name)
