@@ -58,7 +58,7 @@ TEST_F(EvaluatorInputTest, InvalidMeshesAreRejectedWithReason)
 
 TEST_F(EvaluatorInputTest, InvalidVertexBuffersAreRejectedWithReason)
 {
-    world.sharedBytes[2] = 47;
+    machine.sharedBytes[2] = 47;
     startIn(1, 1);
     expectFailure(addMesh(grid(4, "small")), "mesh 'small': its buffer of normals has 47 bytes, "
                                              "and the vertices need 48");
@@ -115,7 +115,7 @@ protected:
 
 TEST_F(EvaluatorOnCpuTest, WithoutOpenCLMeshesAreDeformedAndFailuresReported)
 {
-    world.platforms.clear();
+    machine.platforms.clear();
     EXPECT_FALSE(start());
     settings.finishRenderer = nullptr;
     makeEvaluator();

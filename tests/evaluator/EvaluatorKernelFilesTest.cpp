@@ -64,9 +64,9 @@ TEST_F(EvaluatorKernelFileTest, FailedBuildReportsLogAndKeepsFormerKernel)
     const std::string path = "'" + (kernels / "own.cl").string() + "'";
     EXPECT_THAT(messageOfMesh(), StartsWith("mesh 'a': deformer 'skin': the kernel file " + path +
                                             " does not compile:\n"));
-    EXPECT_THAT(fMesh->status().message, HasSubstr(world.buildLog));
+    EXPECT_THAT(fMesh->status().message, HasSubstr(machine.buildLog));
     EXPECT_EQ(fMesh->status().openCL, CL_BUILD_PROGRAM_FAILURE);
-    EXPECT_EQ(warnings(), (Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE", world.buildLog}));
+    EXPECT_EQ(warnings(), (Lines{"OpenCL error: CL_BUILD_PROGRAM_FAILURE", machine.buildLog}));
     EXPECT_EQ(evaluator->prepare().message, fMesh->status().message);
     writeKernels("own.cl", "");
     EXPECT_THAT(messageOfMesh(), HasSubstr(path + " is empty"));
@@ -130,7 +130,7 @@ TEST_F(EvaluatorKernelFileTest, InvalidReplacementChangesNothing)
     };
     EXPECT_THAT(replace("test.cl", "#error"),
                 testing::AllOf(StartsWith("the kernel file 'test.cl' does not compile:\n"),
-                               HasSubstr(world.buildLog)));
+                               HasSubstr(machine.buildLog)));
     EXPECT_EQ(replace("test.cl", "kernel void plain(float* p)"),
               "the kernel 'plain' of test.cl takes 1 arguments, and its deformer passes 5");
     EXPECT_EQ(replace("test.cl", "nothing"),

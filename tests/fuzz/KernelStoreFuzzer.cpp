@@ -249,7 +249,7 @@ private:
 
 extern "C" int LLVMFuzzerInitialize(int* /*argumentCount*/, char*** /*arguments*/)
 {
-    scripted::runtime().describe(scripted::World());
+    scripted::runtime().describe(scripted::Machine());
     require(TopenCLInfo::initialize(nullptr, nullptr, nullptr, false, false, 0x8086));
     for (const std::string& name : kNames)
         std::ofstream(directory() + "/" + name) << name;

@@ -77,7 +77,7 @@ void FaultSweep::checkReports(const Fault& fault, const Lines& functions)
 {
     const Lines reported = warnings();
     for (const std::string& text : reported)
-        EXPECT_TRUE(text.starts_with("OpenCL error: CL_") || text == world.buildLog) << text;
+        EXPECT_TRUE(text.starts_with("OpenCL error: CL_") || text == machine.buildLog) << text;
     if (fault.onwards)
         return;
     const std::string& function = functions[fault.nth - 1];

@@ -214,9 +214,9 @@ class FailedBuild : public KernelStoreTest, public ::testing::WithParamInterface
 protected:
     void SetUp() override
     {
-        world.buildLog = GetParam().log;
+        machine.buildLog = GetParam().log;
         if (GetParam().unanswered)
-            world.emptyAnswers = {CL_PROGRAM_BUILD_LOG};
+            machine.emptyAnswers = {CL_PROGRAM_BUILD_LOG};
         KernelStoreTest::SetUp();
     }
 };

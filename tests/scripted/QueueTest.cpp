@@ -85,10 +85,10 @@ class EventQuery : public ScriptedTest, public ::testing::WithParamInterface<Eve
 TEST_P(EventQuery, IsEventCompleteMakesExpectedQueries)
 {
     const EventRow& row = GetParam();
-    world.platforms[0].vendor = row.vendor;
+    machine.platforms[0].vendor = row.vendor;
     setEnvironment("VYRA_OPENCL_PLATFORM", row.vendor);
     if (row.statuses.empty())
-        world.emptyAnswers = {CL_EVENT_COMMAND_EXECUTION_STATUS};
+        machine.emptyAnswers = {CL_EVENT_COMMAND_EXECUTION_STATUS};
     ASSERT_TRUE(start());
     if (!row.statuses.empty())
         runtime().scriptEventStatuses(row.statuses);
@@ -129,8 +129,8 @@ class WorkGroupSize : public QueueTest, public ::testing::WithParamInterface<Gro
 TEST_P(WorkGroupSize, IsKernelsOr256AndGlobalIsSmallestMultiple)
 {
     if (GetParam().unanswered)
-        world.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
-    world.platforms[0].devices[0].workGroupSize = GetParam().answer;
+        machine.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
+    machine.platforms[0].devices[0].workGroupSize = GetParam().answer;
     ASSERT_TRUE(start());
     const cl_kernel kernel = makeKernel();
     const std::size_t size = GetParam().expected;

@@ -4,12 +4,12 @@
 
 namespace scripted {
 
-std::string listing(const World& world, std::size_t taken)
+std::string listing(const Machine& machine, std::size_t taken)
 {
     std::string text =
-        "Detected " + std::to_string(world.platforms.size()) + " OpenCL Platforms: \n";
-    for (std::size_t i = 0; i < world.platforms.size(); ++i) {
-        const PlatformScript& p = world.platforms[i];
+        "Detected " + std::to_string(machine.platforms.size()) + " OpenCL Platforms: \n";
+    for (std::size_t i = 0; i < machine.platforms.size(); ++i) {
+        const PlatformScript& p = machine.platforms[i];
         text +=
             ' ' + std::to_string(i) + ": " + p.vendor + ". " + p.name + ". " + p.version + ".\n";
         text += " Supported extensions: " + p.extensions + " \n";
@@ -50,11 +50,11 @@ void StartUp::onDirect3D(const char* extensions)
 std::string StartUp::platformText() const
 {
     std::size_t taken = 0;
-    while (taken < world.platforms.size() &&
-           world.platforms[taken].vendor != world.platforms.back().vendor)
+    while (taken < machine.platforms.size() &&
+           machine.platforms[taken].vendor != machine.platforms.back().vendor)
         ++taken;
-    return kAttempt + listing(world, taken) + "OpenCL evaluator choosing OpenCL platform " +
-           world.platforms.back().vendor + ".\n";
+    return kAttempt + listing(machine, taken) + "OpenCL evaluator choosing OpenCL platform " +
+           machine.platforms.back().vendor + ".\n";
 }
 
 std::string StartUp::wholeText() const
@@ -75,7 +75,7 @@ void StartUp::stopsBeforePlatform(const std::string& text)
 void StartUp::stopsBeforeDevice(const std::string& text)
 {
     stopsWithContext("");
-    error = world.platforms.empty() ? text : platformText() + text;
+    error = machine.platforms.empty() ? text : platformText() + text;
     device = "null";
     asyncReadback = false;
     modes = arguments.usingDX ? std::pair{1, 1} : std::pair{3, 4};
@@ -86,7 +86,7 @@ void StartUp::stopsBeforeDevice(const std::string& text)
 
 void StartUp::stopsWithContext(const std::string& text)
 {
-    error = world.platforms.empty() ? text : platformText() + text;
+    error = machine.platforms.empty() ? text : platformText() + text;
     valid = false;
     doublePrecision = false;
     computeUnits = 0;
@@ -128,7 +128,7 @@ TEST_P(StartUpRows, InitializePrintsReturnsAndSetsExpectedState)
 {
     StartUp expected;
     GetParam().set(expected);
-    world = expected.world;
+    machine = expected.machine;
     arguments = expected.arguments;
     for (const auto& [name, value] : expected.environment)
         setEnvironment(name, value);

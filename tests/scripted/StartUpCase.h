@@ -14,7 +14,7 @@ namespace scripted {
 inline const std::string kForceThreading = "VyraGetEnv(VYRA_OPENCL_FORCE_THREADING)";
 
 struct StartUp {
-    World world;
+    Machine machine;
     StartArguments arguments;
     std::vector<std::pair<const char*, const char*>> environment;
     std::vector<Fault> faults;
@@ -38,8 +38,8 @@ struct StartUp {
     std::string table{"create pending final"}; // the filled entries of the interop function table
     Lines left{"context#1 x1", "queue#1 x1", "queue#2 x1"};
 
-    PlatformScript& platform() { return world.platforms[0]; }
-    DeviceScript& firstDevice() { return world.platforms[0].devices[0]; }
+    PlatformScript& platform() { return machine.platforms[0]; }
+    DeviceScript& firstDevice() { return machine.platforms[0].devices[0]; }
     // The platform has another vendor.
     void onVendor(const char* vendor, OpenCLProvider expectedProvider, unsigned id);
     void onNVIDIA(const char* driver);
@@ -69,7 +69,7 @@ struct StartUpRow : Named {
 class StartUpRows : public ScriptedTest, public ::testing::WithParamInterface<StartUpRow> {};
 
 // Returns the listing of all platforms, with the line of the chosen one.
-std::string listing(const World& world, std::size_t taken);
+std::string listing(const Machine& machine, std::size_t taken);
 
 inline constexpr std::size_t kNoPlatform = 64; // more than any test has
 inline const std::string kAttempt = "OpenCL evaluator is attempting to initialize OpenCL.\n";

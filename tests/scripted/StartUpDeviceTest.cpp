@@ -19,10 +19,10 @@ const std::string kNoGL = "Error: found cl_khr_gl_sharing but failed to get func
 void threeDevices(StartUp& c, const cl_device_type (&types)[3], int current, const char* device)
 {
     c.platform().devices = {{.type = types[0]}, {.type = types[1]}, {.type = types[2]}};
-    c.world.glDevices = {0, 1, 2};
-    c.world.currentGLDevice.reset();
+    c.machine.glDevices = {0, 1, 2};
+    c.machine.currentGLDevice.reset();
     if (current >= 0)
-        c.world.currentGLDevice = static_cast<std::size_t>(current);
+        c.machine.currentGLDevice = static_cast<std::size_t>(current);
     c.device = device;
 }
 
@@ -44,7 +44,7 @@ void demandModes(StartUp& c, const char* graphicsToCL, const char* clToGraphics)
 
 void withoutGLFunction(StartUp& c, const char* name)
 {
-    c.world.missing = {name};
+    c.machine.missing = {name};
     c.stopsWithContext(kNoGL);
     c.table = "";
 }
@@ -70,7 +70,7 @@ void unreadableDriver(StartUp& c)
 // clang-format off
 const StartUpRow kDeviceRows[] = {
     {"CurrentDeviceOfTheList", [](StartUp& c) { threeDevices(c, {4, 4, 4}, 1, "device#2"); }},
-    {"CurrentDeviceOutsideTheList", [](StartUp& c) { threeDevices(c, {2, 4, 4}, 2, "device#2"); c.world.glDevices = {0, 1}; }},
+    {"CurrentDeviceOutsideTheList", [](StartUp& c) { threeDevices(c, {2, 4, 4}, 2, "device#2"); c.machine.glDevices = {0, 1}; }},
     {"NoCurrentDevice", [](StartUp& c) { threeDevices(c, {2, 8, 4}, -1, "device#3"); }},
     {"CurrentDeviceNoGPU", [](StartUp& c) { threeDevices(c, {2, 4, 4}, 0, "device#2"); }},
     {"DefaultGPUIsNoGPU", [](StartUp& c) { threeDevices(c, {5, 2, 5}, 0, ""); c.stopsBeforeDevice(kNoGPU); }},
@@ -78,17 +78,17 @@ const StartUpRow kDeviceRows[] = {
          c.platform().devices.resize(64, {.type = CL_DEVICE_TYPE_CPU});
          c.firstDevice().type = CL_DEVICE_TYPE_CPU;
          c.platform().devices.back().type = CL_DEVICE_TYPE_GPU;
-         c.world.glDevices.resize(64);
-         std::iota(c.world.glDevices.begin(), c.world.glDevices.end(), 0U);
+         c.machine.glDevices.resize(64);
+         std::iota(c.machine.glDevices.begin(), c.machine.glDevices.end(), 0U);
          c.device = "device#64"; }},
-    {"NoDeviceShares", [](StartUp& c) { c.world.glDevices.clear(); c.stopsBeforeDevice(kNoGPU); }},
-    {"UnwrittenTypeIsNoGPU", [](StartUp& c) { c.world.emptyAnswers = {CL_DEVICE_TYPE}; c.stopsBeforeDevice(kNoGPU); }},
-    {"UnwrittenDevicesAreNone", [](StartUp& c) { c.world.emptyAnswers = {0x2007, 0x2006}; c.stopsBeforeDevice(kNoGPU); }},
-    {"GLContextQueryMissing", [](StartUp& c) { c.world.missing = {"clGetGLContextInfoKHR"}; c.stopsBeforeDevice(kNoGPU); }},
+    {"NoDeviceShares", [](StartUp& c) { c.machine.glDevices.clear(); c.stopsBeforeDevice(kNoGPU); }},
+    {"UnwrittenTypeIsNoGPU", [](StartUp& c) { c.machine.emptyAnswers = {CL_DEVICE_TYPE}; c.stopsBeforeDevice(kNoGPU); }},
+    {"UnwrittenDevicesAreNone", [](StartUp& c) { c.machine.emptyAnswers = {0x2007, 0x2006}; c.stopsBeforeDevice(kNoGPU); }},
+    {"GLContextQueryMissing", [](StartUp& c) { c.machine.missing = {"clGetGLContextInfoKHR"}; c.stopsBeforeDevice(kNoGPU); }},
     {"GLDevicesFail", [](StartUp& c) { c.fails("clGetGLContextInfoKHR", 1); c.stopsBeforeDevice(""); }},
     {"CurrentGLDeviceFails", [](StartUp& c) { c.fails("clGetGLContextInfoKHR", 2); c.stopsBeforeDevice(""); }},
     {"TypeOfCurrentDeviceFails", [](StartUp& c) { c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
-    {"TypeOfListedDeviceFails", [](StartUp& c) { c.world.currentGLDevice.reset(); c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
+    {"TypeOfListedDeviceFails", [](StartUp& c) { c.machine.currentGLDevice.reset(); c.fails("clGetDeviceInfo", 1); c.stopsBeforeDevice(""); }},
     {"ContextFails", [](StartUp& c) { c.stopsBeforeDevice(""); c.fails("clCreateContext"); c.device = "device#1"; c.asyncReadback = true; }},
     {"ContextOfNothing", [](StartUp& c) {
          c.faults = {{.function = "clCreateContext", .status = CL_SUCCESS}};
@@ -172,7 +172,7 @@ using DeviceStartUpOnce = ScriptedTest;
 TEST_F(DeviceStartUpOnce, StartUpWithoutQueueContinues)
 {
     setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
-    world.platforms[0].vendor = "NVIDIA Corporation";
+    machine.platforms[0].vendor = "NVIDIA Corporation";
     faults = {{.function = "clCreateCommandQueue"}};
     EXPECT_FALSE(startWatched());
     EXPECT_EQ(warnings(), Lines{kOutOfResources});
@@ -201,7 +201,7 @@ class DeviceName : public ScriptedTest, public ::testing::WithParamInterface<std
 TEST_P(DeviceName, AcceptsUpTo127Characters)
 {
     const bool fits = GetParam() == 127;
-    world.platforms[0].devices[0].name = std::string(GetParam(), 'n');
+    machine.platforms[0].devices[0].name = std::string(GetParam(), 'n');
     EXPECT_EQ(startWatched(), fits);
     EXPECT_EQ(warnings(), fits ? Lines{} : Lines{"OpenCL error: CL_INVALID_VALUE\n"});
     EXPECT_EQ(printedError.find("Device " + std::string(127, 'n') + ".  ") != std::string::npos,
@@ -214,7 +214,7 @@ INSTANTIATE_TEST_SUITE_P(Device, DeviceName, ::testing::Values(127, 128));
 TEST_F(DeviceStartUpOnce, SupportsThreadedSharingReadsVariableOnce)
 {
     setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
-    world.platforms[0].vendor = "NVIDIA Corporation";
+    machine.platforms[0].vendor = "NVIDIA Corporation";
     ASSERT_TRUE(start());
     EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
     setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");

@@ -21,8 +21,8 @@ StartUp onDirect3D(const char* extensions, const char* missing)
     c.onDirect3D(extensions);
     c.firstDevice().type = CL_DEVICE_TYPE_CPU;
     c.platform().devices.emplace_back();
-    c.world.d3dDevices = {0, 1};
-    c.world.missing = {missing};
+    c.machine.d3dDevices = {0, 1};
+    c.machine.missing = {missing};
     c.environment = {{"VYRA_OPENCL_FORCE_FINISH", "1"}, {"VYRA_GRAPHICSTOOPENCL_SYNC_MODE", "2"}};
     c.error = c.platformText() + kNamed + "Device Type: Non-GPU  Device is available.\n\n";
     return c;
@@ -61,7 +61,7 @@ const StartUpRow kDirect3DRows[] = {
     {"KHRWithoutCreate", [](StartUp& c) { incomplete(c, kKHR, "clCreateFromD3D11BufferKHR", kKHRIncomplete); }},
     {"KHRWithoutAcquire", [](StartUp& c) { incomplete(c, kKHR, "clEnqueueAcquireD3D11ObjectsKHR", kKHRIncomplete); }},
     {"KHRWithoutRelease", [](StartUp& c) { incomplete(c, kKHR, "clEnqueueReleaseD3D11ObjectsKHR", kKHRIncomplete); }},
-    {"NoDevice", [](StartUp& c) { c.onDirect3D(kNV); c.world.d3dDevices.clear(); c.stopsBeforeDevice(""); }},
+    {"NoDevice", [](StartUp& c) { c.onDirect3D(kNV); c.machine.d3dDevices.clear(); c.stopsBeforeDevice(""); }},
     {"DeviceQueryFails", [](StartUp& c) { c.onDirect3D(kKHR); c.stopsBeforeDevice(""); c.fails("clGetDeviceIDsFromD3D11KHR"); }},
 };
 // clang-format on
@@ -73,7 +73,7 @@ class Direct3DFunctions : public ManagerTest, public ::testing::WithParamInterfa
 // The device query, the property list and the functions that create and transfer a shared buffer.
 TEST_P(Direct3DFunctions, AreTakenFromSupportedExtension)
 {
-    world.platforms[0].extensions = GetParam().first;
+    machine.platforms[0].extensions = GetParam().first;
     const std::string suffix = GetParam().second;
     arguments.usingDX = true;
     ASSERT_TRUE(startWatched());

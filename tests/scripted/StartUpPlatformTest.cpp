@@ -42,7 +42,7 @@ const StartUpRow kPlatformRows[] = {
          c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
     {"EmptyVendorName", [](StartUp& c) {
          c.environment = {{"VYRA_OPENCL_PLATFORM", ""}};
-         c.stopsBeforePlatform(listing(c.world, kNoPlatform) + "OpenCL evaluator failed to find OpenCL device with vendor .\n"); }},
+         c.stopsBeforePlatform(listing(c.machine, kNoPlatform) + "OpenCL evaluator failed to find OpenCL device with vendor .\n"); }},
     {"DriverIgnoredByAnEmptyVariable", [](StartUp& c) {
          c.onNVIDIA("365.10");
          c.environment = {{"VYRA_OPENCL_IGNORE_DRIVER_VERSION", ""}};
@@ -57,27 +57,27 @@ const StartUpRow kPlatformRows[] = {
          c.environment = {{"VYRA_OPENCL_FORCE_THREADING", "0"}};
          c.error = "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n" + c.wholeText(); }},
     {"LoadingThrowsAnException", [](StartUp& c) {
-         c.world.lookUp = LookUp::kThrowsStandardException;
+         c.machine.lookUp = LookUp::kThrowsStandardException;
          c.stopsBeforePlatform("CLEW failed to initialize: scripted look-up  Vyra running without OpenCL support.\n"); }},
     {"LoadingThrowsSomethingElse", [](StartUp& c) {
-         c.world.lookUp = LookUp::kThrowsNumber;
+         c.machine.lookUp = LookUp::kThrowsNumber;
          c.arguments.vendorId = 1; // read only later
          c.stopsBeforePlatform("CLEW failed to initialize.  Vyra running without OpenCL support.\n"); }},
     {"UnknownVendorId", [](StartUp& c) {
          c.arguments.vendorId = 0x1AB8;
          c.stopsBeforePlatform("OpenCL evaluator encountered an unknown vendor id 1ab8 while trying to initialize OpenCL.\n"); }},
-    {"NoPlatforms", [](StartUp& c) { c.world.platforms.clear(); c.stopsBeforePlatform(kNotFound); }},
+    {"NoPlatforms", [](StartUp& c) { c.machine.platforms.clear(); c.stopsBeforePlatform(kNotFound); }},
     {"CountingPlatformsFails", [](StartUp& c) { c.fails("clGetPlatformIDs", 1); c.warnings = {}; c.stopsBeforePlatform(kNotFound); }},
     {"ReadingPlatformIdsFails", [](StartUp& c) { c.fails("clGetPlatformIDs", 2); c.stopsBeforePlatform(kNotFound); }},
     {"NoPlatformOfTheVendor", [](StartUp& c) {
          c.platform().vendor = "intel(r) corporation";
-         c.stopsBeforePlatform(listing(c.world, kNoPlatform) + kNotFound); }},
+         c.stopsBeforePlatform(listing(c.machine, kNoPlatform) + kNotFound); }},
     {"VendorsAreWholeNames", [](StartUp& c) {
          c.platform().vendor = "Intel(R) Corporation and others";
-         c.world.platforms.push_back({.vendor = "Intel(R)"});
-         c.stopsBeforePlatform(listing(c.world, kNoPlatform) + kNotFound); }},
+         c.machine.platforms.push_back({.vendor = "Intel(R)"});
+         c.stopsBeforePlatform(listing(c.machine, kNoPlatform) + kNotFound); }},
     {"QueryFailsBeforeTheMatch", [](StartUp& c) {
-         c.world.platforms.insert(c.world.platforms.begin(), kSomebody);
+         c.machine.platforms.insert(c.machine.platforms.begin(), kSomebody);
          c.fails("clGetPlatformInfo", 1);
          c.stopsBeforePlatform("Detected 2 OpenCL Platforms: \n" + kNotFound); }},
     {"PlatformNameFails", [](StartUp& c) { c.fails("clGetPlatformInfo", 3); c.stopsBeforePlatform("Detected 1 OpenCL Platforms: \n" + kNotFound); }},
@@ -88,11 +88,11 @@ const StartUpRow kPlatformRows[] = {
     {"QueryFailsAfterTheMatch", [](StartUp& c) {
          const std::string whole = c.wholeText();
          c.error = std::string(whole).replace(whole.find("Detected 1"), 10, "Detected 2");
-         c.world.platforms.push_back(kSomebody);
+         c.machine.platforms.push_back(kSomebody);
          c.fails("clGetPlatformInfo", 9); }},
     {"FirstOfTwoPlatformsOfTheVendor", [](StartUp& c) {
-         c.world.platforms.insert(c.world.platforms.begin(), kSomebody);
-         c.world.platforms.push_back({.extensions = "none"}); }},
+         c.machine.platforms.insert(c.machine.platforms.begin(), kSomebody);
+         c.machine.platforms.push_back({.extensions = "none"}); }},
     {"AMDById", [](StartUp& c) { c.onVendor("Advanced Micro Devices, Inc.", kAMDProvider, 0x1002); }},
     {"AMDByDecimalId", [](StartUp& c) { c.onVendor("Advanced Micro Devices, Inc.", kAMDProvider, 0x3EA); }},
     {"NVIDIAById", [](StartUp& c) { c.onNVIDIA("385.31"); }},
@@ -145,7 +145,7 @@ TEST_F(StartUpOnce, OnlyExtensionFunctionsAreLookedUpThroughRuntime)
 
 TEST_F(StartUpOnce, OptionSettersReturnWhetherValueChanged)
 {
-    world.platforms[0].devices[0].doublePrecision = 0;
+    machine.platforms[0].devices[0].doublePrecision = 0;
     ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
 
@@ -195,7 +195,7 @@ TEST_F(StartUpOnce, PlatformsAreListedUntilOneListIsComplete)
     faults = {{.function = "clGetPlatformInfo"}};
     EXPECT_FALSE(start());
     EXPECT_EQ(warnings(), Lines{kOutOfResources});
-    for (const std::string& expected : {listing(world, 0), std::string()}) {
+    for (const std::string& expected : {listing(machine, 0), std::string()}) {
         cl_platform_id platform = nullptr;
         Tstring extensions;
         testing::internal::CaptureStderr();

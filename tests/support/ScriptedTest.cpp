@@ -53,7 +53,7 @@ void ScriptedTest::TearDown()
 
 bool ScriptedTest::startWatched()
 {
-    runtime().describe(world);
+    runtime().describe(machine);
     for (const Fault& fault : faults)
         runtime().plan(fault);
     testing::internal::CaptureStderr();

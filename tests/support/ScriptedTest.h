@@ -42,7 +42,7 @@ protected:
     ScriptedTest();
     void TearDown() override;
 
-    // Describes `world` to the runtime and starts the library; returns whether it is valid. The
+    // Describes `machine` to the runtime and starts the library; returns whether it is valid. The
     // output, calls and objects of start-up are dropped.
     bool start();
     // The same, but keeps the output and calls of start-up for the test.
@@ -61,7 +61,7 @@ protected:
     // Declares objects that remain at the end, besides those of start-up.
     void expectLeft(const Lines& objects) { fExpectedLeft = objects; }
 
-    World world;
+    Machine machine;
     StartArguments arguments;
     std::vector<Fault> faults; // of start-up
     std::string printedError;  // what start-up wrote to standard error

@@ -208,7 +208,7 @@ unsigned Entry::nextClientWait()
 cl_int Entry::answer(cl_uint query, const void* data, std::size_t size, std::size_t capacity,
                      void* value, std::size_t* sizeReturned)
 {
-    if (ok() && world().emptyAnswers.contains(query)) {
+    if (ok() && machine().emptyAnswers.contains(query)) {
         if (sizeReturned)
             *sizeReturned = 0;
         return fStatus;

@@ -39,7 +39,7 @@ public:
     Entry(const Entry&) = delete;
     Entry& operator=(const Entry&) = delete;
 
-    const World& world() const { return fRuntime.fWorld; }
+    const Machine& machine() const { return fRuntime.fMachine; }
     const std::vector<cl_platform_id>& platforms() const { return fRuntime.fPlatforms; }
     const std::vector<cl_device_id>& devices() const { return fRuntime.fDevices; }
     const DeviceScript& script(const Object& device) const

@@ -61,7 +61,7 @@ cl_int clGetProgramBuildInfo(cl_program program, cl_device_id device, cl_program
     if (!call.ok())
         return call.status();
     if (query == CL_PROGRAM_BUILD_LOG)
-        return call.answer(query, call.world().buildLog, capacity, value, size);
+        return call.answer(query, call.machine().buildLog, capacity, value, size);
     call.require(query == CL_PROGRAM_BUILD_STATUS, CL_INVALID_VALUE, "unknown query");
     const cl_build_status status = object->built ? CL_BUILD_SUCCESS : CL_BUILD_ERROR;
     return call.answer(query, &status, sizeof status, capacity, value, size);

@@ -41,7 +41,7 @@ cl_int clGetPlatformInfo(cl_platform_id platform, cl_platform_info query, std::s
     const auto text = kPlatformTexts.find(query);
     if (!call.require(text != kPlatformTexts.end(), CL_INVALID_VALUE, "unknown query"))
         return call.status();
-    const PlatformScript& script = call.world().platforms[object->index];
+    const PlatformScript& script = call.machine().platforms[object->index];
     return call.answer(query, script.*text->second, capacity, value, size);
 }
 

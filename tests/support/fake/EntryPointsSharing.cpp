@@ -44,10 +44,10 @@ cl_mem createShared(const SharingNames& names, cl_context context, cl_mem_flags 
     const auto mem = call.create<cl_mem>(Kind::kMem);
     if (mem) {
         constexpr std::size_t kUsualBytes = 1 << 20;
-        const auto bytes = call.world().sharedBytes.find(resource);
+        const auto bytes = call.machine().sharedBytes.find(resource);
         Object* object = call.object(Kind::kMem, mem);
         object->shared = true;
-        object->size = bytes == call.world().sharedBytes.end() ? kUsualBytes : bytes->second;
+        object->size = bytes == call.machine().sharedBytes.end() ? kUsualBytes : bytes->second;
     }
     return call.result(mem, error);
 }
@@ -92,10 +92,10 @@ cl_int getGLContextInfo(const cl_context_properties* properties, cl_gl_context_i
     const auto& all = call.devices();
     std::vector<cl_device_id> answer;
     if (query == CL_DEVICES_FOR_GL_CONTEXT_KHR) {
-        for (const std::size_t index : call.world().glDevices)
+        for (const std::size_t index : call.machine().glDevices)
             answer.push_back(all[index]);
     } else if (query == CL_CURRENT_DEVICE_FOR_GL_CONTEXT_KHR) {
-        const auto current = call.world().currentGLDevice;
+        const auto current = call.machine().currentGLDevice;
         answer.push_back(current ? all[*current] : nullptr);
     } else {
         call.require(false, CL_INVALID_VALUE, "unknown query");
@@ -113,7 +113,7 @@ cl_int getDeviceIDsFromD3D11(cl_platform_id platform, cl_uint source, void* obje
     call.object(Kind::kPlatform, platform);
     if (!call.ok())
         return call.status();
-    const auto& indices = call.world().d3dDevices;
+    const auto& indices = call.machine().d3dDevices;
     for (std::size_t i = 0; devices && i < std::min<std::size_t>(capacity, indices.size()); ++i)
         devices[i] = call.devices()[indices[i]];
     if (count)
@@ -146,11 +146,11 @@ const std::map<std::string, void*> kExtensionFunctions = {
 extern "C" void* clGetExtensionFunctionAddress(const char* name)
 {
     const Entry call("clGetExtensionFunctionAddress", name);
-    if (call.world().lookUp == LookUp::kThrowsStandardException)
+    if (call.machine().lookUp == LookUp::kThrowsStandardException)
         throw std::runtime_error("scripted look-up");
-    if (call.world().lookUp == LookUp::kThrowsNumber)
+    if (call.machine().lookUp == LookUp::kThrowsNumber)
         throw 1;
     const auto found = kExtensionFunctions.find(name);
-    const bool there = found != kExtensionFunctions.end() && !call.world().missing.contains(name);
+    const bool there = found != kExtensionFunctions.end() && !call.machine().missing.contains(name);
     return there ? found->second : nullptr;
 }

@@ -13,9 +13,9 @@ void FakeRuntime::add(Kind kind, std::vector<T>& list)
     list.push_back(static_cast<T>(handle));
 }
 
-void FakeRuntime::describe(const World& world)
+void FakeRuntime::describe(const Machine& machine)
 {
-    fWorld = world;
+    fMachine = machine;
     fLedger = {};
     fCommands = {};
     fPlans.clear();
@@ -24,7 +24,7 @@ void FakeRuntime::describe(const World& world)
     fDeviceScripts.clear();
     fCalls.clear();
     fMisuse.clear();
-    for (const PlatformScript& platform : world.platforms) {
+    for (const PlatformScript& platform : machine.platforms) {
         add(Kind::kPlatform, fPlatforms);
         for (const DeviceScript& device : platform.devices) {
             add(Kind::kDevice, fDevices);

@@ -3,15 +3,15 @@
 // The entry points live in a shared library that has the name of the OpenCL library. The tests'
 // executables are linked to it, so it is in the process already when the code under test opens
 // OpenCL by name, and the loader returns it. Extension entry points are not exported: they are
-// found only through clGetExtensionFunctionAddress, unless the world leaves them out.
+// found only through clGetExtensionFunctionAddress, unless the machine leaves them out.
 //
 // Any thread may call an entry point. The functions declared here are for the test's own thread,
 // while no other thread makes calls.
 #pragma once
 
-#include "World.h"
 #include "fake/CommandOrder.h"
 #include "fake/Ledger.h"
+#include "fake/Machine.h"
 
 #include <atomic>
 #include <deque>
@@ -40,8 +40,8 @@ using ContextNotify = void(CL_CALLBACK*)(const char*, const void*, std::size_t, 
 
 class FakeRuntime {
 public:
-    // Removes all objects and creates the platforms and devices of `world`.
-    void describe(const World& world);
+    // Removes all objects and creates the platforms and devices of `machine`.
+    void describe(const Machine& machine);
 
     // The calls since the last take, OpenCL's, OpenGL's and the host's in one order, each as text:
     //     clEnqueueWriteBuffer(queue#1, mem#2, 0, 16, 64, host+16, [event#1]) = event#3
@@ -108,11 +108,11 @@ private:
     const Fault* meetFault(const std::string& function);
 
     QuietLock fLock;
-    World fWorld;
+    Machine fMachine;
     Ledger fLedger;
     CommandOrder fCommands;
     std::vector<Plan> fPlans;
-    std::vector<cl_platform_id> fPlatforms; // in the world's order, as the devices
+    std::vector<cl_platform_id> fPlatforms; // in the machine's order, as the devices
     std::vector<cl_device_id> fDevices;
     std::vector<DeviceScript> fDeviceScripts;
     std::pair<const void*, std::size_t> fHostMemory{};

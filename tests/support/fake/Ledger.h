@@ -29,7 +29,7 @@ struct Object {
     std::string name; // "mem#2"
     unsigned references = 1;
 
-    std::size_t index = 0; // platforms and devices: place in the world
+    std::size_t index = 0; // platforms and devices: place in the machine
     std::size_t size = 0;  // memory objects: bytes
     bool shared = false;   // memory objects: made from a renderer's buffer
     bool acquired = false; // shared memory objects

@@ -1,5 +1,5 @@
-// The world that a test describes to the scripted OpenCL runtime, and which calls fail in it: plain
-// data, no behaviour.
+// The machine that a test describes to the scripted OpenCL runtime, and which calls fail in it:
+// plain data, no behaviour.
 #pragma once
 
 #include <cstddef>
@@ -33,10 +33,10 @@ struct PlatformScript {
     std::vector<DeviceScript> devices{1};
 };
 
-// What looking an extension entry point up does besides answering.
+// The effect of looking up an extension entry point.
 enum class LookUp { kAnswers, kThrowsStandardException, kThrowsNumber };
 
-struct World {
+struct Machine {
     std::vector<PlatformScript> platforms{1};
 
     // Devices are numbered from 0 across all platforms.
@@ -51,14 +51,14 @@ struct World {
     std::string buildLog = "line 1: 100%s wrong"; // of a program that does not build
 };
 
-// A plan for the calls of one function. Retains and releases that fail still count; everything else
-// that fails does nothing, save for a create function, a mapping or a build `withHandle`.
+// A planned failure of one function. A failing retain or release still counts; any other failing
+// call has no effect, except a create function, a mapping or a build `withHandle`.
 struct Fault {
-    std::string function;                // "*": every function, OpenGL's included
-    cl_int status = CL_OUT_OF_RESOURCES; // CL_SUCCESS: all is well, but nothing is handed out
-    unsigned nth = 1;                    // the call that fails, counted from the moment of planning
+    std::string function;                // "*": every function, including OpenGL's
+    cl_int status = CL_OUT_OF_RESOURCES; // CL_SUCCESS: returns no object, but reports success
+    unsigned nth = 1;                    // the call that fails, counted from the planning
     bool onwards = false;                // all later calls fail, too
-    bool withHandle = false; // hands out an object or an address, or builds, despite the status
+    bool withHandle = false; // returns an object or an address, or builds, despite the status
 };
 
 } // namespace scripted
