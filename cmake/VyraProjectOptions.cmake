@@ -6,9 +6,19 @@ set(VYRA_SANITIZE "" CACHE STRING "Sanitizers to build with, as -fsanitize takes
 add_library(vyra_options INTERFACE)
 add_library(vyra::options ALIAS vyra_options)
 target_compile_features(vyra_options INTERFACE cxx_std_20)
-target_compile_options(vyra_options INTERFACE
-    -Wall -Wextra -Wpedantic -Wshadow -Wconversion
-    $<$<BOOL:${VYRA_WARNINGS_AS_ERRORS}>:-Werror>)
+if(MSVC)
+    target_compile_options(vyra_options INTERFACE
+        /W4 /permissive- /utf-8 /Zc:__cplusplus $<$<BOOL:${VYRA_WARNINGS_AS_ERRORS}>:/WX>)
+    # std::getenv and its like are no mistake.
+    target_compile_definitions(vyra_options INTERFACE _CRT_SECURE_NO_WARNINGS)
+else()
+    target_compile_options(vyra_options INTERFACE
+        -Wall -Wextra -Wpedantic -Wshadow -Wconversion
+        $<$<BOOL:${VYRA_WARNINGS_AS_ERRORS}>:-Werror>)
+endif()
+if(WIN32) # the system's header has macros of these names
+    target_compile_definitions(vyra_options INTERFACE NOMINMAX)
+endif()
 # Qt's `emit` and `slots` macros break oneTBB's headers.
 target_compile_definitions(vyra_options INTERFACE QT_NO_KEYWORDS)
 # The library is written for version 1.2 of OpenCL.
@@ -31,7 +41,7 @@ endif()
 # Debug information that names files relative to the project: equal in every clone, so that ccache can
 # share the objects between them. A debugger that starts in the project's directory finds the files.
 option(VYRA_RELATIVE_DEBUG_PATHS "Name source files in debug information relative to the project" OFF)
-if(VYRA_RELATIVE_DEBUG_PATHS)
+if(VYRA_RELATIVE_DEBUG_PATHS AND NOT MSVC)
     add_compile_options(-fdebug-prefix-map=${PROJECT_SOURCE_DIR}=.)
 endif()
 
