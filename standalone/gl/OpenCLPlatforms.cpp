@@ -6,6 +6,7 @@
 #include <algorithm>
 
 #include <CL/cl.h>
+#include <QDir>
 #include <QFileInfo>
 #include <QLibrary>
 #include <QOpenGLContext>
@@ -121,9 +122,10 @@ std::vector<OpenCLPlatform> openCLPlatforms()
 std::vector<std::string> missingOpenCLLayers()
 {
     std::vector<std::string> missing;
-    const QStringList layers = qEnvironmentVariable("OPENCL_LAYERS").split(':', Qt::SkipEmptyParts);
+    const QStringList layers =
+        qEnvironmentVariable("OPENCL_LAYERS").split(QDir::listSeparator(), Qt::SkipEmptyParts);
     for (const QString& layer : layers) {
-        if (layer.contains('/') && !QFileInfo(layer).isFile())
+        if (QDir::fromNativeSeparators(layer).contains('/') && !QFileInfo(layer).isFile())
             missing.push_back(layer.toStdString());
     }
     return missing;

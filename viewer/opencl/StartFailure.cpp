@@ -12,6 +12,11 @@ struct Reason {
 
 constexpr char kInstallDriver[] =
     "install an OpenCL driver (on Debian without a GPU: pocl-opencl-icd)";
+#if defined(_WIN32)
+constexpr char kUseGlshare[] = "copy glshare's OpenCL.dll to the folder of the program";
+#else
+constexpr char kUseGlshare[] = "set OPENCL_LAYERS to the path of libglshare.so";
+#endif
 constexpr char kPoclVendor[] = "The pocl project";
 
 // Returns the vendors in quotes, without duplicates.
@@ -46,7 +51,7 @@ Reason noDevices(const OpenCLPlatform& platform)
 Reason noSharing(const std::string& subject)
 {
     return {subject + " cl_khr_gl_sharing",
-            "use a GPU whose driver does, or set OPENCL_LAYERS to the path of libglshare.so"};
+            std::string("use a GPU whose driver does, or ") + kUseGlshare};
 }
 
 // For a library that looked for the platform of one vendor. An empty reason if there is no fault.

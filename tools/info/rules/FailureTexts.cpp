@@ -12,7 +12,12 @@ namespace {
 
 constexpr char kUseSharingDriver[] =
     "Use a GPU whose OpenCL driver lists cl_khr_gl_sharing and draw on that same GPU. On a machine "
-    "without one, set OPENCL_LAYERS to the path of libglshare.so, which shares in software.";
+    "without one, "
+#if defined(_WIN32)
+    "copy glshare's OpenCL.dll to the folder of the program; it shares in software.";
+#else
+    "set OPENCL_LAYERS to the path of libglshare.so, which shares in software.";
+#endif
 constexpr char kInstallDriver[] =
     "Install the OpenCL driver of the GPU that draws the window; on a machine without a GPU, a "
     "driver for the CPU (on Debian: pocl-opencl-icd).";
