@@ -29,9 +29,10 @@ protected:
     }
 };
 
-TEST_F(EvaluatorInputTest, InvalidMeshesAreRejectedWithReason)
+TEST_F(EvaluatorInputTest, InvalidMeshesAndBuffersAreRejectedWithReason)
 {
     using Spoil = void (*)(vyra::MeshGeometry&);
+    machine.sharedBytes[91] = 47;
     startIn(1, 1);
     for (const auto& [spoil, message] : std::initializer_list<std::pair<Spoil, const char*>>{
              {[](auto& g) { g.rest = {}; }, "it has no vertices"},
@@ -54,26 +55,10 @@ TEST_F(EvaluatorInputTest, InvalidMeshesAreRejectedWithReason)
     makeEvaluator();
     vyra::DeformableMesh& none = addMesh(std::shared_ptr<const vyra::MeshGeometry>());
     expectFailure(none, "mesh '': it has no geometry");
-}
-
-TEST_F(EvaluatorInputTest, InvalidVertexBuffersAreRejectedWithReason)
-{
-    machine.sharedBytes[2] = 47;
-    startIn(1, 1);
-    expectFailure(addMesh(grid(4, "small")), "mesh 'small': its buffer of normals has 47 bytes, "
-                                             "and the vertices need 48");
+    makeEvaluator();
+    expectFailure(evaluator->createMesh(grid(4, "small"), {.positions = 90, .normals = 91}),
+                  "mesh 'small': its buffer of normals has 47 bytes, and the vertices need 48");
     EXPECT_EQ(evaluator->batchSize(), 2U) << "the buffers of the other mesh";
-    makeEvaluator();
-    runtime().plan({.function = "clCreateFromGLBuffer", .status = CL_INVALID_GL_OBJECT, .nth = 2});
-    expectFailure(addMesh(grid(4, "gone")),
-                  "mesh 'gone': OpenCL cannot share its buffer of normals "
-                  "(CL_INVALID_GL_OBJECT); check that the renderer created it");
-    makeEvaluator();
-    runtime().clearFaults();
-    runtime().plan({.function = "clGetMemObjectInfo", .status = CL_OUT_OF_RESOURCES});
-    expectFailure(addMesh(grid(4, "unknown")),
-                  "mesh 'unknown': the size of its buffer of positions is unknown "
-                  "(CL_OUT_OF_RESOURCES); check the OpenCL driver");
 }
 
 TEST_F(EvaluatorInputTest, InvalidOrThrowingDeformersAreReported)
@@ -150,17 +135,6 @@ TEST_F(EvaluatorOnCpuTest, WithoutOpenCLMeshesAreDeformedAndFailuresReported)
     EXPECT_EQ(calls(), Lines{});
 }
 
-TEST_F(EvaluatorOnCpuTest, SmallMeshesAreDeformedOnCpu)
-{
-    startIn(1, 1);
-    vyra::DeformableMesh& small = addMesh(kSmallest - 1);
-    small.add<TestDeformer>();
-    addChain();
-    EXPECT_EQ(countOf(callsOfEvaluation(), "clEnqueueNDRangeKernel"), 2U);
-    EXPECT_EQ(written, Lines{"a 1"});
-    EXPECT_FALSE(small.usesOpenCL());
-}
-
 // Calls the evaluator from functions of the settings, which run during an evaluation.
 TEST_F(EvaluatorOnCpuTest, MeshesChangeAndNestedEvaluationsAreRejectedDuringEvaluation)
 {
@@ -188,6 +162,7 @@ TEST_F(EvaluatorOnCpuTest, MeshesChangeAndNestedEvaluationsAreRejectedDuringEval
     makeEvaluator();
     vyra::DeformableMesh& large = addChain();
     gone = {&large, &addMesh(kSmallest - 1)}; // when the small mesh is written
+    EXPECT_FALSE(gone[1]->usesOpenCL());
     frame();
     EXPECT_THAT(evaluator->status().message, HasSubstr("inside an evaluation"));
     EXPECT_EQ(evaluator->batchSize(), 2U);
@@ -198,9 +173,8 @@ TEST_F(EvaluatorOnCpuTest, MeshesChangeAndNestedEvaluationsAreRejectedDuringEval
     EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U);
 }
 
-TEST_F(EvaluatorTest, InvalidEvaluationsAreRejectedWithoutCalls)
+TEST_F(ImplicitModesTest, InvalidEvaluationsAreRejectedWithoutCalls)
 {
-    startIn(1, 1);
     addChain();
     calls();
     evaluator->evaluate(em::Id(0xFFFE));

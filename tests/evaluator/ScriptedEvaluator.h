@@ -94,6 +94,12 @@ private:
     unsigned fMeshes = 0;
 };
 
+// Starts in the modes that order OpenCL and OpenGL without waits.
+class ImplicitModesTest : public EvaluatorTest {
+protected:
+    void SetUp() override { startIn(1, 1); }
+};
+
 inline constexpr const char* kKernelText =
     "kernel void plain(const uint count, global const float* positions, global const float* "
     "normals, global float* newPositions, global float* newNormals) {}\n"

@@ -12,6 +12,7 @@
 #include <fstream>
 #include <numeric>
 #include <set>
+#include <stdexcept>
 
 #include <QTemporaryDir>
 #include <gmock/gmock.h>
@@ -115,8 +116,8 @@ INSTANTIATE_TEST_SUITE_P(All, SampleModel,
                          [](const auto& sample) { return "Model" + std::to_string(sample.index); });
 
 // A temporary folder with model files.
-class ModelFolder {
-public:
+class ModelFolder : public testing::Test {
+protected:
     std::string path(const char* name) const { return fFolder.filePath(name).toStdString(); }
 
     std::string write(const char* name, const std::string& content) const
@@ -125,9 +126,19 @@ public:
         return path(name);
     }
 
+    // Imports a file of this content.
+    Model imported(const char* name, const std::string& content,
+                   const ImportSettings& settings = {}) const
+    {
+        const Result<Model> model = importModel(write(name, content), settings);
+        return model ? model.value() : throw std::runtime_error(model.failure().text);
+    }
+
 private:
     QTemporaryDir fFolder;
 };
+using ModelImport = ModelFolder;
+using ImportProcess = ModelFolder;
 
 // A cube without normals, with its corners at 0 and `size`.
 std::string cube(const char* size)
@@ -140,10 +151,9 @@ std::string cube(const char* size)
     return QString::fromStdString(text).replace("S", size).toStdString();
 }
 
-TEST(ModelImport, UnusableFileFailsWithAReason)
+TEST_F(ModelImport, UnusableFileFailsWithAReason)
 {
-    const ModelFolder folder;
-    std::filesystem::create_symlink("loop.obj", folder.path("loop.obj"));
+    std::filesystem::create_symlink("loop.obj", path("loop.obj"));
     const std::string longWord =
         "solid a\nfacet normal 0 0 1\nouter loop\nvertex " + std::string(9999, 'x');
     const std::tuple<const char*, const char*, const char*> rows[] = {
@@ -151,9 +161,6 @@ TEST(ModelImport, UnusableFileFailsWithAReason)
         {"points.obj", "v 0 0 0\nv 1 0 0\np 1\np 2\n", "no meshes"},
         {"text.txt", "not a model\n", "(No suitable reader"},
         {"cut.obj", "v 0 0 0\nv 1 0 0\nv 0 1 0\nf 1 2 9\n", "truncated or damaged"},
-        {"nan.obj", "v 0 0 0\nv 1 nan 0\nv 0 1 0\nf 1 2 3\n",
-         "vertex 1 of the mesh 'defaultobject' is at (1, nan, 0)"},
-        {"point.obj", "v 1 1 1\nv 1 1 1\nv 1 1 1\nf 1 2 3\n", "no triangle with an area"},
         {"long.stl", longWord.c_str(), "xxx ...); it may be truncated"},
         {"empty.obj", "", "is empty"},
         {"missing.obj", nullptr, "there is no model file"},
@@ -161,27 +168,22 @@ TEST(ModelImport, UnusableFileFailsWithAReason)
         {"loop.obj", nullptr, "cannot be opened: Too many levels of symbolic links"},
     };
     for (const auto& [name, content, reason] : rows) {
-        const Result<Model> model =
-            importModel(content ? folder.write(name, content) : folder.path(name));
+        const Result<Model> model = importModel(content ? write(name, content) : path(name));
         ASSERT_FALSE(model) << name;
         EXPECT_EQ(model.failure().code, ExitCode::kModel);
         EXPECT_THAT(model.failure().text, testing::HasSubstr(reason));
     }
     EXPECT_THAT(importModel("").failure().text, testing::HasSubstr("there is no model file"));
-    EXPECT_THAT(importModel("/dev/null").failure().text, testing::HasSubstr("not a regular file"));
 }
 
 // The vertices of a cube: 24 with sharp edges, 8 with smooth ones.
-TEST(ModelImport, MissingNormalsAreSmoothUpToTheCreaseAngle)
+TEST_F(ModelImport, MissingNormalsAreSmoothUpToTheCreaseAngle)
 {
-    const ModelFolder folder;
     const std::tuple<const char*, double, std::size_t> rows[] = {
         {"1", 60, 24}, {"1", 120, 8}, {"0.000001", 60, 24}, {"1e20", 60, 24}};
     for (const auto& [size, creaseAngle, vertices] : rows) {
-        const Result<Model> model =
-            importModel(folder.write("cube.obj", cube(size)), {std::nullopt, creaseAngle});
-        ASSERT_TRUE(model) << model.failure().text;
-        const Mesh& mesh = model.value().meshes.front();
+        const Mesh mesh =
+            imported("cube.obj", cube(size), {std::nullopt, creaseAngle}).meshes.front();
         EXPECT_EQ(mesh.vertexCount(), vertices) << size << ' ' << creaseAngle;
         const auto [low, high] = boundsOf(mesh.normals);
         const float expected = vertices == 24 ? 1 : std::sqrt(1.0f / 3);
@@ -189,22 +191,18 @@ TEST(ModelImport, MissingNormalsAreSmoothUpToTheCreaseAngle)
     }
 }
 
-TEST(ModelImport, ZeroNormalsAreComputedFromTriangles)
+TEST_F(ModelImport, ZeroNormalsAreComputedFromTriangles)
 {
-    const ModelFolder folder;
     const std::string triangle = "v 0 0 0\nv 1 0 0\nv 0 0 -1\nv 0 1 0\nvn 0 0 0\nvn -1 0 0\n";
     for (const char* faces : {"f 1//1 2//1 3//1\n", "f 1//1 2//1 3//1\nf 1//2 3//2 4//2\n"}) {
-        const Result<Model> model = importModel(folder.write("zero.obj", triangle + faces));
-        ASSERT_TRUE(model) << model.failure().text;
-        EXPECT_LT((model.value().meshes[0].normals[1] - QVector3D(0, 1, 0)).length(), 1e-5f);
+        const Model model = imported("zero.obj", triangle + faces);
+        EXPECT_LT((model.meshes[0].normals[1] - QVector3D(0, 1, 0)).length(), 1e-5f);
     }
 }
 
-TEST(ModelImport, UpAxisIsRotatedToY)
+TEST_F(ModelImport, UpAxisIsRotatedToY)
 {
-    const ModelFolder folder;
-    const std::string file =
-        folder.write("up.obj", "v 0 0 0\nv 3 0 0\nv 3 0 2\nv 0 1 0\nf 1 2 3\nf 1 2 4\n");
+    const char* shape = "v 0 0 0\nv 3 0 0\nv 3 0 2\nv 0 1 0\nf 1 2 3\nf 1 2 4\n";
     const std::pair<std::optional<UpAxis>, QVector3D> rows[] = {{std::nullopt, {3, 1, 2}},
                                                                 {UpAxis::kX, {1, 3, 2}},
                                                                 {UpAxis::kY, {3, 1, 2}},
@@ -212,13 +210,12 @@ TEST(ModelImport, UpAxisIsRotatedToY)
     for (const auto& [up, size] : rows) {
         ImportSettings settings;
         settings.up = up;
-        const Result<Model> model = importModel(file, settings);
-        ASSERT_TRUE(model) << model.failure().text;
-        EXPECT_LT((characterSpace(model.value(), nullptr).size - size / 3).length(), 1e-5f);
+        const Model model = imported("up.obj", shape, settings);
+        EXPECT_LT((characterSpace(model, nullptr).size - size / 3).length(), 1e-5f);
     }
 }
 
-TEST(ImportProcess, ImportInChildReturnsTheSameModelAsImportModel)
+TEST_F(ImportProcess, ImportInChildReturnsTheSameModelAsImportModel)
 {
     if (!std::filesystem::exists("/usr/share/assimp/models"))
         GTEST_SKIP() << "the sample models (package assimp-testmodels) are not installed";
@@ -233,11 +230,10 @@ TEST(ImportProcess, ImportInChildReturnsTheSameModelAsImportModel)
     EXPECT_THAT(wrong.failure().text, testing::HasSubstr("not a regular file"));
 }
 
-TEST(ImportProcess, FailingChildReturnsOneSentence)
+TEST_F(ImportProcess, FailingChildReturnsOneSentence)
 {
-    const ModelFolder folder;
-    const std::string file = folder.write("cube.obj", cube("1"));
-    const std::string program = folder.path("program");
+    const std::string file = write("cube.obj", cube("1"));
+    const std::string program = path("program");
     const std::tuple<const char*, int, bool, const char*> rows[] = {
         {"kill -SEGV $$", 60, true, "makes Assimp crash (signal 11)"},
         {"echo surprise", 60, true, "makes Assimp crash (exit code 0)"},
@@ -247,7 +243,7 @@ TEST(ImportProcess, FailingChildReturnsOneSentence)
         {"exec sleep 1000", 60, false, "interrupted"},
     };
     for (const auto& [command, timeLimit, goOn, sentence] : rows) {
-        folder.write("program", std::string("#!/bin/sh\n") + command + '\n');
+        write("program", std::string("#!/bin/sh\n") + command + '\n');
         std::filesystem::permissions(program, std::filesystem::perms::owner_all);
         const bool answer = goOn;
         const auto model =
@@ -255,7 +251,7 @@ TEST(ImportProcess, FailingChildReturnsOneSentence)
         ASSERT_FALSE(model) << command;
         EXPECT_THAT(model.failure().text, testing::HasSubstr(sentence));
     }
-    const auto model = importInChild({folder.path("none"), 60, {}}, file, {});
+    const auto model = importInChild({path("none"), 60, {}}, file, {});
     EXPECT_THAT(model.failure().text, testing::HasSubstr("the process for it does not start"));
 }
 
