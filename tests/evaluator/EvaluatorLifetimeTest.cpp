@@ -90,17 +90,6 @@ TEST_F(EvaluatorLifetimeTest, DestructorInHostsEvaluationLeavesNothingAcquired)
     manager().PostEvaluate(kHosts);
 }
 
-TEST_F(EvaluatorLifetimeTest, DeformTwiceReleasesUnbatchedBufferEachTime)
-{
-    startWithMeshes(3);
-    manager().PreEvaluate(kHosts);
-    addChain();
-    for (int i = 0; i < 3; ++i)
-        EXPECT_TRUE(evaluator->deform().ok()) << evaluator->status().message;
-    manager().PostEvaluate(kHosts);
-    evaluator->waitUntilDrawable();
-}
-
 TEST_F(EvaluatorLifetimeTest, ReplacedConstantsAndKernelsOutliveCommands)
 {
     startWithMeshes();
@@ -169,19 +158,6 @@ TEST_F(EvaluatorLifetimeTest, HostsEvaluationStaysOpenWithoutBatching)
     startWithMeshes();
     expectHostsStaysOpen(false, false);
     evaluator->destroyMesh(*fMesh); // its buffers are acquired after their last release
-}
-
-TEST_F(EvaluatorLifetimeTest, BatchedBufferWithoutAcquireEventIsNotWritten)
-{
-    startWithMeshes();
-    runtime().plan({.function = "clEnqueueAcquireGLObjects", .status = CL_SUCCESS});
-    const Lines lines = callsOfEvaluation();
-    runtime().clearFaults();
-    EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U) << "only the first deformers";
-    EXPECT_EQ(fMesh->status().openCL, CL_INVALID_EVENT);
-    EXPECT_EQ(runtime().acquired(), Lines{});
-    evaluate();
-    EXPECT_TRUE(evaluator->status().ok()) << evaluator->status().message;
 }
 
 TEST_F(EvaluatorLifetimeTest, DestructorWithdrawsOnlyItselfFromBridge)
