@@ -20,8 +20,8 @@ const TopenCLDataBuffer TopenCLDataBuffer::fsNULL;
 namespace {
 
 // Registered for developers' traces of the kernel store; nothing writes to it.
-const TdbTrace clKernelTrace(1, "clKernel", TdebugOutput::sCerr(),
-                             "Errors and warnings from the OpenCL Kernel Store");
+const TdbTrace kKernelTrace(1, "clKernel", TdebugOutput::sCerr(),
+                            "Errors and warnings from the OpenCL Kernel Store");
 
 } // namespace
 

@@ -13,13 +13,13 @@ namespace vyra::host {
 namespace {
 
 // Values of the OpenGL registry, which the OpenGL ES headers that Qt may choose lack.
-constexpr unsigned int glSyncGpuCommandsComplete = 0x9117;
-constexpr unsigned int glTimeoutExpired = 0x911B;
-constexpr std::uint64_t glTimeoutIgnored = ~std::uint64_t{0};
+constexpr unsigned int kGlSyncGpuCommandsComplete = 0x9117;
+constexpr unsigned int kGlTimeoutExpired = 0x911B;
+constexpr std::uint64_t kGlTimeoutIgnored = ~std::uint64_t{0};
 
 // The longest time, in nanoseconds, for which one wait occupies the hidden context: long compared
 // with passing a call to its thread (microseconds).
-constexpr std::uint64_t turnNs = 1'000'000;
+constexpr std::uint64_t kTurnNs = 1'000'000;
 
 template <class Function>
 void resolve(QOpenGLContext& context, const char* name, Function*& function)
@@ -113,7 +113,7 @@ GLsync SyncFunctions::fromCLEvent(cl_context context, cl_event event, unsigned i
     const auto create = [&] {
         return fDriver.syncFromCLEventUsable()
                    ? fDriver.glCreateSyncFromCLeventARB(context, event, flags)
-                   : fenceAndFlush(glSyncGpuCommandsComplete, 0);
+                   : fenceAndFlush(kGlSyncGpuCommandsComplete, 0);
     };
     if (!fDriver.syncFromCLEventUsable() && (flags != 0 || !waitForCLEvent(event))) {
         return nullptr;
@@ -140,13 +140,13 @@ unsigned int SyncFunctions::waitInTurns(GLsync sync, unsigned int flags, std::ui
 {
     std::uint64_t remaining = timeoutNs;
     while (true) {
-        const std::uint64_t turn = std::min(remaining, turnNs);
+        const std::uint64_t turn = std::min(remaining, kTurnNs);
         const unsigned int result =
             fHidden.call([&] { return fDriver.glClientWaitSync(sync, flags, turn); });
-        if (result != glTimeoutExpired || turn == remaining) {
+        if (result != kGlTimeoutExpired || turn == remaining) {
             return result;
         }
-        remaining -= timeoutNs == glTimeoutIgnored ? 0 : turn;
+        remaining -= timeoutNs == kGlTimeoutIgnored ? 0 : turn;
     }
 }
 

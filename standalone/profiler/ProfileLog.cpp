@@ -8,15 +8,15 @@ namespace {
 
 // An identifier consists of, from its lowest bit: the event's index in its log plus 1, the log's
 // index, the log's generation.
-constexpr unsigned int placeBits = 32;
-constexpr unsigned int logBits = 20;
-constexpr std::uint64_t placeMask = (std::uint64_t{1} << placeBits) - 1;
-constexpr std::uint64_t logMask = (std::uint64_t{1} << logBits) - 1;
-constexpr std::uint64_t generationMask = (std::uint64_t{1} << (64 - placeBits - logBits)) - 1;
+constexpr unsigned int kPlaceBits = 32;
+constexpr unsigned int kLogBits = 20;
+constexpr std::uint64_t kPlaceMask = (std::uint64_t{1} << kPlaceBits) - 1;
+constexpr std::uint64_t kLogMask = (std::uint64_t{1} << kLogBits) - 1;
+constexpr std::uint64_t kGenerationMask = (std::uint64_t{1} << (64 - kPlaceBits - kLogBits)) - 1;
 
 std::size_t logIndex(profiler::EventId id)
 {
-    return (id >> placeBits) & logMask;
+    return (id >> kPlaceBits) & kLogMask;
 }
 
 struct Registry {
@@ -83,9 +83,9 @@ profiler::EventId ProfileLog::append(ProfileEvent event)
 {
     const std::scoped_lock lock(fMutex);
     fProfile.events.push_back(event);
-    const std::uint64_t generation = fGeneration & generationMask;
-    const std::uint64_t place = fProfile.events.size() & placeMask;
-    return generation << (placeBits + logBits) | std::uint64_t{fIndex} << placeBits | place;
+    const std::uint64_t generation = fGeneration & kGenerationMask;
+    const std::uint64_t place = fProfile.events.size() & kPlaceMask;
+    return generation << (kPlaceBits + kLogBits) | std::uint64_t{fIndex} << kPlaceBits | place;
 }
 
 void ProfileLog::end(profiler::EventId id, std::int64_t endNs)
@@ -104,8 +104,8 @@ void ProfileLog::end(profiler::EventId id, std::int64_t endNs)
 void ProfileLog::endHere(profiler::EventId id, std::int64_t endNs)
 {
     const std::scoped_lock lock(fMutex);
-    const std::uint64_t place = id & placeMask;
-    const bool current = id >> (placeBits + logBits) == (fGeneration & generationMask);
+    const std::uint64_t place = id & kPlaceMask;
+    const bool current = id >> (kPlaceBits + kLogBits) == (fGeneration & kGenerationMask);
     if (current && place >= 1 && place <= fProfile.events.size()) {
         fProfile.events[place - 1].endNs = endNs;
     }

@@ -16,20 +16,20 @@
 namespace vyra::host {
 
 // The identifier of profiler::categories().main().
-inline constexpr std::uint32_t mainCategoryId = 1;
+inline constexpr std::uint32_t kMainCategoryId = 1;
 
 // `endNs` of an event that has not ended.
-inline constexpr std::int64_t stillOpen = -1;
+inline constexpr std::int64_t kStillOpen = -1;
 
 struct ProfileEvent {
     TuniqueString name;
     TuniqueString description;
     // The track of the event; empty for the thread that recorded it.
     TuniqueString track;
-    std::uint32_t categoryId = mainCategoryId;
+    std::uint32_t categoryId = kMainCategoryId;
     profiler::Color color = 0;
     std::int64_t beginNs = 0;
-    std::int64_t endNs = stillOpen;
+    std::int64_t endNs = kStillOpen;
 };
 
 // The events that one thread has recorded.

@@ -19,8 +19,8 @@ using vyra::host::ProfileEvent;
 using vyra::host::ThreadProfile;
 
 // All rows are of one process. Tracks are rows, too, with numbers after those of threads.
-constexpr int processId = 1;
-constexpr int firstTrackRow = 1'000'000;
+constexpr int kProcessId = 1;
+constexpr int kFirstTrackRow = 1'000'000;
 
 double microseconds(std::int64_t nanoseconds)
 {
@@ -29,17 +29,17 @@ double microseconds(std::int64_t nanoseconds)
 
 QString categoryName(std::uint32_t id)
 {
-    return id == vyra::host::mainCategoryId ? QStringLiteral("main") : QString::number(id);
+    return id == vyra::host::kMainCategoryId ? QStringLiteral("main") : QString::number(id);
 }
 
 QJsonObject eventObject(const ProfileEvent& event, int row)
 {
     QJsonObject object{{"name", QString::fromUtf8(event.name.asChar())},
                        {"cat", categoryName(event.categoryId)},
-                       {"pid", processId},
+                       {"pid", kProcessId},
                        {"tid", row},
                        {"ts", microseconds(event.beginNs)}};
-    if (event.endNs == vyra::host::stillOpen) {
+    if (event.endNs == vyra::host::kStillOpen) {
         object["ph"] = "B";
     } else {
         object["ph"] = "X";
@@ -57,7 +57,7 @@ QJsonObject rowName(const std::string& name, int row)
 {
     return {{"name", "thread_name"},
             {"ph", "M"},
-            {"pid", processId},
+            {"pid", kProcessId},
             {"tid", row},
             {"args", QJsonObject{{"name", QString::fromStdString(name)}}}};
 }
@@ -129,7 +129,7 @@ public:
         if (track.empty()) {
             return named(threadRow, threadName);
         }
-        const int newRow = firstTrackRow + static_cast<int>(fTracks.size());
+        const int newRow = kFirstTrackRow + static_cast<int>(fTracks.size());
         return named(fTracks.try_emplace(track, newRow).first->second, track);
     }
 

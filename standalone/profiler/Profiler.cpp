@@ -12,7 +12,7 @@ namespace {
 constinit std::atomic<bool> sampling = false;
 
 // The identifier of no event, returned if the profiler does not record.
-constexpr profiler::EventId noEvent = 0;
+constexpr profiler::EventId kNoEvent = 0;
 
 } // namespace
 
@@ -27,7 +27,7 @@ EventId eventBegin(std::uint32_t categoryId, Color color, const char* name, cons
                    const void* /*data*/, std::uint32_t /*dataSize*/)
 {
     if (!samplingActive()) {
-        return noEvent;
+        return kNoEvent;
     }
     vyra::host::ProfileEvent event;
     event.name = TuniqueString(name);
@@ -40,7 +40,7 @@ EventId eventBegin(std::uint32_t categoryId, Color color, const char* name, cons
 
 void eventEnd(EventId event)
 {
-    if (event != noEvent) {
+    if (event != kNoEvent) {
         vyra::host::ProfileLog::end(event, ProfileRecorder::nowNs());
     }
 }

@@ -5,8 +5,8 @@
 
 namespace {
 
-constinit const profiler::Category mainCategory{vyra::host::mainCategoryId};
-constinit const profiler::Categories allCategories{};
+constinit const profiler::Category kMainCategory{vyra::host::kMainCategoryId};
+constinit const profiler::Categories kAllCategories{};
 
 } // namespace
 
@@ -14,12 +14,12 @@ namespace profiler {
 
 const Category& Categories::main() const
 {
-    return mainCategory;
+    return kMainCategory;
 }
 
 const Categories& categories()
 {
-    return allCategories;
+    return kAllCategories;
 }
 
 EventType::EventType(const Category& category, Color color, const char* name,

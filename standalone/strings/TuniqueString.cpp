@@ -23,14 +23,14 @@ struct TuniqueString::Entry {
 
 private:
     // Texts are names of attributes and data, some thousands in a large scene: chains are short.
-    static constexpr std::size_t bucketCount = 1u << 14;
-    static std::array<std::atomic<const Entry*>, bucketCount> buckets;
+    static constexpr std::size_t kBucketCount = 1u << 14;
+    static std::array<std::atomic<const Entry*>, kBucketCount> buckets;
 
     static const Entry* find(const Entry* head, const Entry* end, std::string_view text,
                              std::uint64_t hash);
 };
 
-constinit std::array<std::atomic<const TuniqueString::Entry*>, TuniqueString::Entry::bucketCount>
+constinit std::array<std::atomic<const TuniqueString::Entry*>, TuniqueString::Entry::kBucketCount>
     TuniqueString::Entry::buckets{};
 
 // Returns the entry of `text` in the chain from `head` to, not including, `end`, or null.
@@ -48,7 +48,7 @@ const TuniqueString::Entry* TuniqueString::Entry::find(const Entry* head, const 
 const TuniqueString::Entry* TuniqueString::Entry::intern(std::string_view text)
 {
     const auto hash = vyra::host::fnv1a<std::uint64_t>(text);
-    std::atomic<const Entry*>& bucket = buckets[hash % bucketCount];
+    std::atomic<const Entry*>& bucket = buckets[hash % kBucketCount];
     const Entry* searched = bucket.load(std::memory_order_acquire);
     if (const Entry* known = find(searched, nullptr, text, hash)) {
         return known;

@@ -119,7 +119,7 @@ std::size_t failingMeshes(const std::string& function, bool batching)
         "clGetKernelWorkGroupInfo clCreateFromGLBuffer clGetMemObjectInfo";
     if (function == "clEnqueueAcquireGLObjects")
         return batching ? kMeshes : 1;
-    return kOne.find(function) != kOne.npos ? 1 : 0;
+    return kOne.find(function) != std::string_view::npos ? 1 : 0;
 }
 
 void EvaluatorFaultTest::checkFailure(const Fault& fault, const Lines& functions,

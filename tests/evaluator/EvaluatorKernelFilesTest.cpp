@@ -104,7 +104,7 @@ TEST_F(EvaluatorKernelFileTest, InvalidReplacementChangesNothing)
     startWithMesh();
     evaluate();
     const auto replace = [this](const std::string& file, const std::string& text) {
-        const std::string message = evaluator->replaceKernelFile(file, text).message;
+        std::string message = evaluator->replaceKernelFile(file, text).message;
         const Lines lines = callsOfEvaluation();
         EXPECT_EQ(countOf(lines, "clCreateKernel"), 0U) << message;
         EXPECT_EQ(countOf(lines, "clEnqueueNDRangeKernel"), 2U);
@@ -182,6 +182,7 @@ TEST_F(EvaluatorKernelFileTest, ConcurrentCapturesKeepHostsWarnings)
     constexpr int kRounds = 2000;
     setCLWarningSink(receive);
     std::vector<std::jthread> threads;
+    threads.reserve(kThreads);
     for (int thread = 0; thread < kThreads; ++thread) {
         threads.emplace_back([thread] {
             for (int round = 0; round < kRounds; ++round) {

@@ -43,7 +43,9 @@ bool isCalledByLayer()
         if (dladdr(frame, &caller) == 0)
             return false;
         const std::string_view file = caller.dli_fname;
-        const auto isIn = [&](const char* name) { return file.find(name) != file.npos; };
+        const auto isIn = [&](const char* name) {
+            return file.find(name) != std::string_view::npos;
+        };
         if (caller.dli_fbase != own.dli_fbase && !isIn("libstdc++") && !isIn("san.so"))
             return isIn("libglshare");
     }
