@@ -2,20 +2,15 @@
 
 #include <array>
 
-#include <unistd.h>
-
 namespace info {
 
-CapturedOutput::CapturedOutput() : fFile(std::tmpfile())
+CapturedOutput::CapturedOutput() : fFile(openTemporaryFile())
 {
     if (!fFile)
         return;
     std::fflush(stdout);
     std::fflush(stderr);
-    fOutput = dup(STDOUT_FILENO);
-    fError = dup(STDERR_FILENO);
-    dup2(fileno(fFile), STDOUT_FILENO);
-    dup2(fileno(fFile), STDERR_FILENO);
+    fStreams = redirectStandardStreams(fFile);
 }
 
 CapturedOutput::~CapturedOutput()
@@ -40,16 +35,11 @@ std::string CapturedOutput::finish()
 
 void CapturedOutput::restore()
 {
-    if (fOutput < 0)
+    if (fStreams.output < 0)
         return;
     std::fflush(stdout);
     std::fflush(stderr);
-    dup2(fOutput, STDOUT_FILENO);
-    dup2(fError, STDERR_FILENO);
-    close(fOutput);
-    close(fError);
-    fOutput = -1;
-    fError = -1;
+    restoreStandardStreams(fStreams);
 }
 
 } // namespace info

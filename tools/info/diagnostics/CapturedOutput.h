@@ -1,6 +1,8 @@
 // Capture of the standard streams.
 #pragma once
 
+#include "tools/info/diagnostics/Platform.h"
+
 #include <cstdio>
 #include <string>
 
@@ -25,8 +27,7 @@ private:
     void restore();
 
     std::FILE* fFile = nullptr;
-    int fOutput = -1; // duplicates of the original streams; -1 if not redirected
-    int fError = -1;
+    StandardStreams fStreams; // the original ones
 };
 
 } // namespace info

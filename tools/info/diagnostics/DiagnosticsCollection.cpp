@@ -3,6 +3,7 @@
 #include "host/Environment.h"
 #include "runtime/EnvironmentVariables.h"
 #include "standalone/OpenCLPlatforms.h"
+#include "tools/info/diagnostics/Platform.h"
 #include "tools/info/diagnostics/PlatformSurvey.h"
 #include "tools/info/diagnostics/RenderWindow.h"
 #include "tools/info/diagnostics/StartUpRun.h"
@@ -12,8 +13,6 @@
 #include <cctype>
 #include <cstdlib>
 #include <string_view>
-
-#include <unistd.h>
 
 namespace info {
 namespace {
@@ -52,8 +51,7 @@ bool isOfInterest(std::string_view entry)
 std::vector<Variable> variablesOfInterest()
 {
     std::vector<Variable> variables;
-    for (char** entry = environ; *entry; ++entry) {
-        const std::string_view text = *entry;
+    for (const std::string_view text : environmentEntries()) {
         const std::size_t equals = text.find('=');
         if (equals == std::string_view::npos || !isOfInterest(text))
             continue;
@@ -88,7 +86,7 @@ Environment readEnvironment(bool platformFromOption)
 Diagnostics collectDiagnostics(const Options& options, RenderWindow& window, WarningLog& warnings)
 {
     if (options.platform)
-        setenv(kPlatformVariable, options.platform->c_str(), 1);
+        setEnvironmentVariable(kPlatformVariable, *options.platform);
     Diagnostics diagnostics;
     diagnostics.environment = readEnvironment(options.platform.has_value());
     diagnostics.renderer = window.renderer();

@@ -3,11 +3,10 @@
 #include "loader/OpenCLLoader.h"
 #include "runtime/PlatformSelection.h"
 #include "tools/info/diagnostics/DeviceSurvey.h"
+#include "tools/info/diagnostics/Platform.h"
 #include "tools/info/diagnostics/RenderWindow.h"
 
 #include <exception>
-
-#include <dlfcn.h>
 
 namespace info {
 namespace {
@@ -25,12 +24,6 @@ std::vector<std::string> missingOf(std::initializer_list<EntryPoint> entries)
             names.emplace_back(entry.name);
     }
     return names;
-}
-
-std::string fileOf(void* function)
-{
-    Dl_info where{};
-    return function && dladdr(function, &where) && where.dli_fname ? where.dli_fname : "";
 }
 
 // Returns a text of the platform. `status` keeps the first failure of several queries.
@@ -66,12 +59,11 @@ Loader surveyLoader()
 {
     Loader loader;
     try {
-        dlerror(); // clears earlier errors
+        clearLibraryError();
         const OpenCLLoadStatus status = loadOpenCL();
         loader.loaded = status == OpenCLLoadStatus::kLoaded;
         if (status == OpenCLLoadStatus::kNoLibrary) {
-            const char* problem = dlerror();
-            loader.problem = problem ? problem : "the system reports no reason";
+            loader.problem = libraryError();
             return loader;
         }
     } catch (const std::exception& error) {
@@ -81,7 +73,7 @@ Loader surveyLoader()
         loader.problem = "loading it threw an exception";
         return loader;
     }
-    loader.file = fileOf(reinterpret_cast<void*>(ocl.clGetPlatformIDs));
+    loader.file = fileOfFunction(reinterpret_cast<void*>(ocl.clGetPlatformIDs));
 #define VYRA_MISSING(name) {#name, ocl.name == nullptr},
     loader.missingCore = missingOf({VYRA_OPENCL_CORE_ENTRY_POINTS(VYRA_MISSING)});
     loader.missingSharing = missingOf({VYRA_OPENCL_GL_ENTRY_POINTS(VYRA_MISSING)});

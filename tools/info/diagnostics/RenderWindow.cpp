@@ -2,6 +2,7 @@
 
 #include "standalone/NativeContext.h"
 #include "standalone/OpenCLPlatforms.h"
+#include "tools/info/diagnostics/Platform.h"
 
 #include <string_view>
 
@@ -32,7 +33,7 @@ void setWindowSystems()
     constexpr char kLastResort[] = "offscreen";
     QByteArray systems = qgetenv(kPlatformVariable);
     if (systems.isEmpty())
-        systems = qEnvironmentVariableIsSet("WAYLAND_DISPLAY") ? "xcb;wayland" : "xcb";
+        systems = defaultWindowSystems();
     qputenv(kPlatformVariable, systems + ";" + kLastResort);
 }
 
@@ -87,6 +88,12 @@ void RenderWindow::open()
     fRenderer.version = glText(*fContext, GL_VERSION);
     fRenderer.adapterVendorId = ::adapterVendorId(fRenderer.vendor, fRenderer.renderer);
     fRenderer.syncObjects = fHost->syncObjectsUsable();
+}
+
+void* RenderWindow::nativeWindow() const
+{
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): the library takes a window's number as a pointer
+    return fWindow ? reinterpret_cast<void*>(fWindow->winId()) : nullptr;
 }
 
 void* RenderWindow::nativeContext() const

@@ -29,6 +29,8 @@ public:
     // Returns the window system's handle of the context, as TopenCLInfo::initialize takes it. Null
     // if the renderer is not usable.
     void* nativeContext() const;
+    // The same for the window. Null if there is none.
+    void* nativeWindow() const;
 
     QOpenGLContext& context() noexcept { return *fContext; }
 

@@ -8,9 +8,6 @@
 namespace info {
 namespace {
 
-// The native window counts only on Windows.
-constexpr void* kNoWindow = nullptr;
-
 // No decision depends on it: the library only stores it for the host.
 constexpr bool kUsingCoreProfile = false;
 
@@ -36,8 +33,8 @@ StartUp runStartUp(const RenderWindow& window, unsigned vendorId, WarningLog& wa
         return startUp;
     startUp.attempted = true;
     CapturedOutput output;
-    startUp.valid = TopenCLInfo::initialize(kNoWindow, window.nativeContext(), nullptr, false,
-                                            kUsingCoreProfile, vendorId);
+    startUp.valid = TopenCLInfo::initialize(window.nativeWindow(), window.nativeContext(), nullptr,
+                                            false, kUsingCoreProfile, vendorId);
     startUp.lastStep = startUpStep();
     startUp.output = output.finish();
     startUp.warnings = warnings.take();
