@@ -27,8 +27,8 @@ protected:
     void SetUp() override
     {
         makeDevice();
-        ASSERT_NO_FATAL_FAILURE(chooseFirstPlatform());
         setEnvironment("GLSHARE_D3D11", GetParam());
+        ASSERT_NO_FATAL_FAILURE(chooseFirstPlatform());
         ASSERT_TRUE(TopenCLInfo::initialize(nullptr, fDevice.get(), nullptr, true, false, 0));
         ASSERT_TRUE(TopenCLInfo::theOne().usingDX());
     }
