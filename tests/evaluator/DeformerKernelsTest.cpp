@@ -310,4 +310,34 @@ TEST_F(DeformerKernels, SineAndCosineStayWithinBound)
     }
 }
 
+// Runs each kernel once, for tools that check memory accesses.
+TEST_F(DeformerKernels, TestKernelsLeavePaddingUnchanged)
+{
+    constexpr cl_uint kCount = kWorkGroup + 1;
+    for (const char* function : {"add", "scale", "sinesAndCosines"}) {
+        SCOPED_TRACE(function);
+        const bool isDeformer = std::string_view(function) != "sinesAndCosines";
+        cl::Kernel tested =
+            kernel(isDeformer ? VYRA_TEST_KERNELS "/library/kernels/deform.cl"
+                              : VYRA_TEST_KERNELS "/evaluator/kernels/sine_and_cosine.cl",
+                   function, "");
+        std::vector<float> values(2 * kWorkGroup, 0.5f);
+        const std::array buffers{memory(values), memory(values), memory(values)};
+        Arguments arguments(fContext, tested);
+        if (isDeformer) {
+            arguments.add(buffers[1]);
+            arguments.value(3.0f);
+        }
+        arguments.value(kCount);
+        if (!isDeformer) {
+            for (const cl::Buffer& buffer : buffers)
+                arguments.add(buffer);
+        }
+        run(tested, kCount);
+        read(buffers[1], values);
+        EXPECT_NE(values[kCount - 1], 0.5f);
+        EXPECT_EQ(values[kCount], 0.5f);
+    }
+}
+
 } // namespace
