@@ -22,7 +22,7 @@ struct Row : Named {
     std::function<int(Bench&)> run;
 };
 
-class OutOfMemory : public ScriptedTest, public ::testing::WithParamInterface<Row> {};
+class OutOfMemory : public StartedTest, public ::testing::WithParamInterface<Row> {};
 
 // A built program stays cached even if its kernel could not be listed.
 Lines withoutPrograms()
@@ -34,7 +34,6 @@ Lines withoutPrograms()
 
 TEST_P(OutOfMemory, FailedAllocationChangesNothingAndRetrySucceeds)
 {
-    ASSERT_TRUE(start());
     const Lines before = runtime().balance();
     bool failed = true;
     for (unsigned nth = 1; failed; ++nth) {
@@ -173,9 +172,8 @@ TEST_P(FullLists, FullListsMakeOperationsWaitForEvents)
 INSTANTIATE_TEST_SUITE_P(Allocation, FullLists, ::testing::Bool());
 #endif
 
-TEST_F(ScriptedTest, FailedGrowthLeavesEventListUnchanged)
+TEST_F(StartedTest, FailedGrowthLeavesEventListUnchanged)
 {
-    ASSERT_TRUE(start());
     Bench bench;
     bench.makeBuffer(64, true);
     const AutoCLObject<cl_event>& event = bench.buffer->bufferReadyEvent();
@@ -197,9 +195,8 @@ TEST_F(ScriptedTest, FailedGrowthLeavesEventListUnchanged)
     EXPECT_EQ(untilMemorySuffices(assign, [&] { EXPECT_EQ(target.size(), 1U); }), 2U);
 }
 
-TEST_F(ScriptedTest, FailedBuildIsReleasedWhenMemoryRunsOut)
+TEST_F(StartedTest, FailedBuildIsReleasedWhenMemoryRunsOut)
 {
-    ASSERT_TRUE(start());
     Bench bench;
     bench.makeStore();
     const Lines before = runtime().balance();
@@ -212,9 +209,8 @@ TEST_F(ScriptedTest, FailedBuildIsReleasedWhenMemoryRunsOut)
 }
 
 // A list that kept entries of failed requests would allocate from time to time.
-TEST_F(ScriptedTest, FailedRequestStoresNothing)
+TEST_F(StartedTest, FailedRequestStoresNothing)
 {
-    ASSERT_TRUE(start());
     Bench bench;
     bench.makeStore();
     runtime().plan({.function = "clCreateProgramWithSource", .onwards = true});
@@ -266,16 +262,8 @@ TEST(Allocation, FailedAppendIsNotListed)
 }
 #endif
 
-TEST_F(ScriptedTest, WarningWithoutMemoryIsEmpty)
+TEST_F(StartedTest, FailedRebuildKeepsBatch)
 {
-    allocationsLeft = 1;
-    CLInternalWarning("%s", "lost");
-    EXPECT_EQ(warnings(), Lines{""});
-}
-
-TEST_F(ScriptedTest, FailedRebuildKeepsBatch)
-{
-    ASSERT_TRUE(start());
     Bench bench;
     bench.makeManager(2);
     bench.evaluate();

@@ -1,12 +1,10 @@
-// Data buffers, the evaluation data map, and the pool against a plain model.
+// Data buffers, the evaluation data map, and the pool.
 #include "Objects.h"
 #include "ScriptedTest.h"
 #include "buffers/TopenCLData.h"
 #include "buffers/TopenCLDataBufferPool.h"
 
-#include <algorithm>
 #include <array>
-#include <random>
 
 using namespace scripted;
 
@@ -30,9 +28,8 @@ Descriptor describe(unsigned bytes, const Tplug& plug = kPlug)
     return {plug, kName, Descriptor::kReadWrite, 1, bytes, 0};
 }
 
-class DataTest : public ScriptedTest {
+class DataTest : public StartedTest {
 protected:
-    void SetUp() override { ASSERT_TRUE(start()); }
     // A data buffer with memory of its own.
     static TopenCLDataBuffer makeData(const Descriptor& descriptor = describe(4))
     {
@@ -173,47 +170,33 @@ TEST_F(DataTest, KeyHashFollowsFormula)
     }
 }
 
-struct PoolEntry {
-    unsigned capacity;
-    cl_mem mem;
-};
-
 TEST_F(DataTest, PoolReturnsBestFitAndFirstOfEquals)
 {
-    std::mt19937 random(20); // an arbitrary seed
-    for (int sequence = 0; sequence < 200; ++sequence) {
-        std::vector<PoolEntry> free;
-        std::vector<PoolEntry> used;
-        TopenCLDataBufferPool pool;
-        for (int step = 0; step < 60; ++step) {
-            if (random() % 6 == 0) {
-                pool.releaseBuffers();
-                free.insert(free.end(), used.begin(), used.end());
-                used.clear();
-                continue;
-            }
-            // few sizes, so that many fit exactly
-            const auto bytes = static_cast<unsigned>(random() % 9) * 50;
-            const auto excess = [bytes](const PoolEntry& entry) {
-                return entry.capacity - bytes; // wraps to a large number if the entry is too small
-            };
-            const auto best = std::ranges::min_element(free, {}, excess);
-            const bool reused = best != free.end() && best->capacity >= bytes;
-            const PoolEntry expected = reused ? *best : PoolEntry{bytes, nullptr};
-            calls();
-            const TopenCLDataBuffer buffer = pool.createBuffer(describe(bytes));
-            const cl_mem mem = buffer.buffer().get();
-            ASSERT_EQ(buffer.descriptor().capacityInBytes(), expected.capacity);
-            ASSERT_EQ(runtime().memSize(mem), expected.capacity);
-            ASSERT_EQ(callsOf("clCreateBuffer").empty(), reused || bytes == 0);
-            ASSERT_EQ(deviceMemory(), 0U);
-            if (reused) {
-                ASSERT_EQ(mem, expected.mem);
-                free.erase(best);
-            }
-            used.push_back({expected.capacity, mem});
+    TopenCLDataBufferPool pool;
+    const auto expectBuffers = [&](const std::vector<std::pair<unsigned, std::string>>& rows) {
+        for (const auto& [bytes, expected] : rows) {
+            const TopenCLDataBuffer made = pool.createBuffer(describe(bytes));
+            EXPECT_EQ(runtime().name(made.buffer().get()) + " of " +
+                          std::to_string(made.descriptor().capacityInBytes()),
+                      expected);
         }
-    }
+        pool.releaseBuffers();
+    };
+    calls();
+    expectBuffers({{200, "mem#1 of 200"},
+                   {50, "mem#2 of 50"},
+                   {100, "mem#3 of 100"},
+                   {50, "mem#4 of 50"},
+                   {0, "null of 0"}});
+    EXPECT_EQ(callsOf("clCreate"), (Lines{"clCreateBuffer(context#1, 1, 200, null) = mem#1",
+                                          "clCreateBuffer(context#1, 1, 50, null) = mem#2",
+                                          "clCreateBuffer(context#1, 1, 100, null) = mem#3",
+                                          "clCreateBuffer(context#1, 1, 50, null) = mem#4"}));
+    expectBuffers({{60, "mem#3 of 100"}, {51, "mem#1 of 200"}, {50, "mem#2 of 50"}});
+    // The latest released buffer of a size is the last one that is used again.
+    expectBuffers({{1, "mem#4 of 50"}, {50, "mem#2 of 50"}, {0, "null of 0"}, {0, "mem#3 of 100"}});
+    EXPECT_EQ(callsOf("clCreate"), Lines{});
+    EXPECT_EQ(deviceMemory(), 0U) << "memory of the pool is not counted";
 }
 
 TEST_F(DataTest, PoolBufferHasRequestedDescriptor)

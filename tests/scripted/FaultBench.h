@@ -23,12 +23,7 @@ public:
     Bench() = default;
     Bench(const Bench&) = delete;
     Bench& operator=(const Bench&) = delete;
-    ~Bench()
-    {
-        dropManager();
-        for (cl_command_queue queue : fQueues)
-            clReleaseCommandQueue(queue);
-    }
+    ~Bench() { dropManager(); }
 
     // Creates a buffer with a mapping, and with a pending write if `pending`.
     void makeBuffer(std::size_t bytes, bool pending = false)
@@ -52,17 +47,6 @@ public:
         buffer->reset();
         return static_cast<int>(buffer->capacityInBytes());
     }
-    int wrap() // a buffer that wraps the buffer's data, and copies of it
-    {
-        TopenCLBuffer wrapped(info().openCLContext(), 1, buffer->openCLDataBuffer());
-        TopenCLBuffer copy(wrapped);
-        copy = *buffer;
-        return int{copy.buffer().get() == buffer->buffer().get()};
-    }
-    int eventComplete()
-    {
-        return int{TopenCLInfo::IsEventComplete(buffer->bufferReadyEvent().get())};
-    }
 
     // Creates a pool with one free buffer; with none if `bytes` is 0.
     void makePool(unsigned bytes)
@@ -77,10 +61,6 @@ public:
     int fromPool(unsigned bytes)
     {
         return int{pool->createBuffer(describe(bytes)).buffer().get() != nullptr};
-    }
-    int output()
-    {
-        return int{pool->createOutputBuffer(data, Tplug()).buffer().get() == data.buffer().get()};
     }
     int mapTwice() // a map, its copy and an overwrite
     {
@@ -103,19 +83,6 @@ public:
         kernel = store->getKernelFromString("skin", "program", "", "skin", nullptr);
         return int{kernel.get() != nullptr};
     }
-    int workGroupSizes()
-    {
-        std::size_t global = 0;
-        std::size_t local = 0;
-        return info().getWorkGroupSizes(kernel.get(), 100, global, local);
-    }
-    int makeQueue()
-    {
-        const cl_command_queue made = info().createOpenCLCommandQueue(nullptr);
-        if (made)
-            fQueues.push_back(made);
-        return int{made != nullptr};
-    }
 
     // Creates a manager with this number of buffers.
     void makeManager(int buffers)
@@ -136,17 +103,13 @@ public:
     }
     int destroy() { return manager->DestroySharedCLBuffer(takeFirst()); }
     int leaveBatch() { return manager->DestroyBatchedSharedCLBuffer(takeFirst()); }
-    int open()
+    void open() { manager->PreEvaluate(em::Id(1)); }
+    void close() { manager->PostEvaluate(em::Id(1)); }
+    void evaluate()
     {
-        manager->PreEvaluate(em::Id(1));
-        return 0;
+        open();
+        close();
     }
-    int close()
-    {
-        manager->PostEvaluate(em::Id(1));
-        return 0;
-    }
-    int evaluate() { return open() + close(); }
     int acquire()
     {
         return manager->EnqueueAcquireSharedCLBuffer(queue(), shared.front(),
@@ -162,13 +125,6 @@ public:
     {
         const cl_event event = fEvents.back().get();
         return int{*manager->EnqueueReleaseBatchedSharedCLBuffer(1, &event) != nullptr};
-    }
-    int copyManager()
-    {
-        const TopenCLSharedBufferMgr copy(*manager);
-        TopenCLSharedBufferMgr assigned;
-        assigned = copy;
-        return 0;
     }
 
     std::optional<TopenCLBuffer> buffer;
@@ -206,7 +162,6 @@ private:
     }
 
     std::vector<AutoCLObject<cl_event>> fEvents;
-    std::vector<cl_command_queue> fQueues;
     std::array<char, 128> fBytes{};
 };
 

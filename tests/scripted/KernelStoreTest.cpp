@@ -4,11 +4,9 @@
 #include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
-#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <memory>
-#include <random>
 
 using namespace scripted;
 
@@ -154,22 +152,6 @@ TEST_F(KernelStoreTest, CacheHitCreatesKernelAndFreeingLastKernelDropsProgram)
     }
 }
 
-TEST_F(KernelStoreTest, KernelsAreFreedInAnyOrder)
-{
-    const Lines before = runtime().balance();
-    std::mt19937 random(4); // an arbitrary seed
-    for (int round = 0; round < 30; ++round) {
-        std::vector<Kernel> kernels(9);
-        for (std::size_t i = 0; i < kernels.size(); ++i)
-            kernels[i] = fromText(i % 2 ? "skin" : "wave", "", i % 3 ? "a" : "b");
-        std::shuffle(kernels.begin(), kernels.end(), random);
-        for (const Kernel& kernel : kernels)
-            ASSERT_TRUE(fStore->freeKernel(kernel));
-        kernels.clear();
-        ASSERT_EQ(runtime().balance(), before);
-    }
-}
-
 TEST_F(KernelStoreTest, DestructorReleasesProgramsLast)
 {
     const Kernel kernel = fromText();
@@ -208,7 +190,6 @@ TEST_F(KernelStoreTest, HandleIsUsedWhateverTheStatus)
 struct LogRow : Named {
     const char* log;
     bool unanswered = false; // not even an empty text
-    unsigned fails = 0;      // the query that fails, or 0
 };
 class FailedBuild : public KernelStoreTest, public ::testing::WithParamInterface<LogRow> {
 protected:
@@ -224,7 +205,9 @@ protected:
 TEST_P(FailedBuild, IsReportedWithLogAndNotCached)
 {
     runtime().plan({.function = "clReleaseProgram"}); // not reported
-    for (const unsigned fails : {GetParam().fails, 0U}) {
+    for (const unsigned fails : {2U, 3U, 0U}) { // the query that fails: size or text of the log
+        if (fails > 0 && !*GetParam().log)
+            continue;
         runtime().plan({.function = "clGetProgramBuildInfo", .nth = fails});
         EXPECT_EQ(fStore->getKernelFromString("#error", "bad", "", "skin", nullptr).get(), nullptr);
         Lines expected{"OpenCL error: CL_BUILD_PROGRAM_FAILURE"};
@@ -238,8 +221,6 @@ TEST_P(FailedBuild, IsReportedWithLogAndNotCached)
 }
 INSTANTIATE_TEST_SUITE_P(KernelStore, FailedBuild,
                          ::testing::Values(LogRow{"Log", "line 1: 100%s wrong"},
-                                           LogRow{"LogSizeFails", "line 1", false, 2},
-                                           LogRow{"LogTextFails", "line 1", false, 3},
                                            LogRow{"EmptyLog", ""}, LogRow{"NoLog", "", true}),
                          ::testing::PrintToStringParamName());
 

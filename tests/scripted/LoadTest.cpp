@@ -1,20 +1,9 @@
 // The shared library, loaded and unloaded: the order in which its static objects are constructed
 // and destroyed.
 #include "Platform.h"
-#include "buffers/TopenCLDataBuffer.h"
 #include "fake/FakeRuntime.h"
 
 #include <gtest/gtest.h>
-
-namespace {
-
-template <typename T>
-T* find(void* library, const char* mangledName)
-{
-    return reinterpret_cast<T*>(symbolOf(library, mangledName));
-}
-
-} // namespace
 
 TEST(Load, LoadingConstructsStaticObjectsAndUnloadingDestroysInReverse)
 {
@@ -34,13 +23,14 @@ TEST(Load, LoadingConstructsStaticObjectsAndUnloadingDestroysInReverse)
                "event type GPUOverrideReleaseQuorSharedBufferBatch"}));
 
     // Destroying the null buffer makes no call.
-    auto* initialize = find<Initialize>(library, "_ZN11TopenCLInfo10initializeEPvS0_S0_bbj");
-    auto* null = find<TopenCLDataBuffer>(library, "_ZN17TopenCLDataBuffer6fsNULLE");
+    auto* initialize = reinterpret_cast<Initialize*>(
+        symbolOf(library, "_ZN11TopenCLInfo10initializeEPvS0_S0_bbj"));
+    void* null = symbolOf(library, "_ZN17TopenCLDataBuffer6fsNULLE");
     ASSERT_TRUE(initialize && null);
     ASSERT_TRUE(initialize(nullptr, nullptr, nullptr, false, true, 0x8086));
     const cl_context_properties none[] = {0};
     const cl_context context = clCreateContext(none, 0, nullptr, nullptr, nullptr, nullptr);
-    *reinterpret_cast<cl_mem*>(null) = clCreateBuffer(context, 0, 64, nullptr, nullptr);
+    *static_cast<cl_mem*>(null) = clCreateBuffer(context, 0, 64, nullptr, nullptr);
     runtime.takeCalls();
     unloadLibrary(library);
     EXPECT_EQ(runtime.takeCalls(),

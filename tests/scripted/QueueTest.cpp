@@ -1,30 +1,11 @@
 // Queues, events and work-group sizes.
-#include "Objects.h"
-#include "ScriptedTest.h"
+#include "FaultBench.h"
 
 using namespace scripted;
 
 namespace {
 
-class QueueTest : public ScriptedTest {
-protected:
-    cl_kernel makeKernel()
-    {
-        fProgram.adopt(makeProgram());
-        fKernel.adopt(ocl.clCreateKernel(fProgram.get(), "deform", nullptr));
-        return fKernel.get();
-    }
-    void TearDown() override
-    {
-        fKernel.reset();
-        fProgram.reset();
-        ScriptedTest::TearDown();
-    }
-
-private:
-    AutoCLObject<cl_kernel> fKernel;
-    AutoCLObject<cl_program> fProgram;
-};
+using QueueTest = ScriptedTest;
 
 TEST_F(QueueTest, FinishAndFlushCallBothQueuesInOrder)
 {
@@ -50,9 +31,8 @@ TEST_F(QueueTest, FinishAndFlushSkipNullSecondaryQueue)
     expectMisuse("clFlush: null");
 }
 
-TEST_F(QueueTest, CreateOpenCLCommandQueueIsInOrder)
+TEST_F(StartedTest, CreateOpenCLCommandQueueIsInOrder)
 {
-    ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
     bool outOfOrder = true;
     runtime().plan({.function = "clCreateCommandQueue", .status = CL_INVALID_VALUE});
@@ -124,7 +104,7 @@ struct GroupRow : Named {
     bool unanswered;
     std::size_t expected;
 };
-class WorkGroupSize : public QueueTest, public ::testing::WithParamInterface<GroupRow> {};
+class WorkGroupSize : public ScriptedTest, public ::testing::WithParamInterface<GroupRow> {};
 
 TEST_P(WorkGroupSize, IsKernelsOr256AndGlobalIsSmallestMultiple)
 {
@@ -132,7 +112,10 @@ TEST_P(WorkGroupSize, IsKernelsOr256AndGlobalIsSmallestMultiple)
         machine.emptyAnswers = {CL_KERNEL_WORK_GROUP_SIZE};
     machine.platforms[0].devices[0].workGroupSize = GetParam().answer;
     ASSERT_TRUE(start());
-    const cl_kernel kernel = makeKernel();
+    Bench bench;
+    bench.makeStore();
+    ASSERT_TRUE(bench.getKernel());
+    const cl_kernel kernel = bench.kernel.get();
     const std::size_t size = GetParam().expected;
     for (const std::size_t groups : {std::size_t{1}, std::size_t{2}, std::size_t{16}}) {
         for (const std::size_t count :
@@ -155,25 +138,25 @@ INSTANTIATE_TEST_SUITE_P(Queue, WorkGroupSize,
                                            GroupRow{"Unanswered", 64, true, 256}),
                          ::testing::PrintToStringParamName());
 
-TEST_F(QueueTest, FailedWorkGroupQueryWritesNothing)
+TEST_F(StartedTest, FailedWorkGroupQueryWritesNothing)
 {
-    ASSERT_TRUE(start());
     std::size_t global = 3;
     std::size_t local = 4;
     TopenCLInfo& info = TopenCLInfo::theOne();
     EXPECT_EQ(info.getWorkGroupSizes(nullptr, 1, global, local), CL_INVALID_KERNEL);
-    const cl_kernel kernel = makeKernel();
+    Bench bench;
+    bench.makeStore();
+    ASSERT_TRUE(bench.getKernel());
     runtime().plan({.function = "clGetKernelWorkGroupInfo", .status = CL_INVALID_KERNEL});
-    EXPECT_EQ(info.getWorkGroupSizes(kernel, 1, global, local), CL_INVALID_KERNEL);
+    EXPECT_EQ(info.getWorkGroupSizes(bench.kernel.get(), 1, global, local), CL_INVALID_KERNEL);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL\n"});
     EXPECT_EQ(global, 3U);
     EXPECT_EQ(local, 4U);
 }
 
 // The destructor is private to the library, so the copy stays, in static memory.
-TEST_F(QueueTest, CopyOfRuntimeObjectBorrowsSameHandles)
+TEST_F(StartedTest, CopyOfRuntimeObjectBorrowsSameHandles)
 {
-    ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
     alignas(TopenCLInfo) static std::byte memory[sizeof(TopenCLInfo)];
     auto* copy = new (memory) TopenCLInfo(info);

@@ -148,6 +148,7 @@ TEST_P(StartUpRows, InitializePrintsReturnsAndSetsExpectedState)
     EXPECT_EQ(printedError, expected.error ? *expected.error : expected.wholeText());
     EXPECT_EQ(printedOutput, expected.output);
     EXPECT_EQ(warnings(), expected.warnings);
+    EXPECT_EQ(runtime().takeMisuse(), expected.misuse);
     EXPECT_EQ(leftByStart, expected.left);
     const TopenCLInfo& info = TopenCLInfo::theOne();
     EXPECT_EQ(TopenCLInfo::isValid(), expected.valid);

@@ -23,6 +23,7 @@ struct StartUp {
     std::optional<std::string> error; // on standard error; unset: that of a successful start-up
     std::string output;               // on standard output
     Lines warnings;
+    Lines misuse;
     bool valid = true;
     OpenCLProvider provider = kIntelProvider;
     int minimumBufferSize = 500;

@@ -33,9 +33,6 @@ const StartUpRow kPlatformRows[] = {
                    " Selected matching OpenCL Platform: Intel(R) Corporation Scripted platform OpenCL 1.2 scripted.\n"
                    "OpenCL evaluator choosing OpenCL platform Intel(R) Corporation.\n"
                    "Choosing OpenCL Device Scripted GPU.  Device Type: GPU  Device is available.\n\n"; }},
-    {"DisabledByTheUser", [](StartUp& c) {
-         c.environment = {{"VYRA_DISABLE_OPENCL", "0"}};
-         c.stopsBeforePlatform("OpenCL initialization has been disabled by user\n"); }},
 #if !defined(_WIN32) // a variable cannot be empty there
     {"DisabledByAnEmptyVariable", [](StartUp& c) {
          c.environment = {{"VYRA_DISABLE_OPENCL", ""}};
@@ -53,9 +50,6 @@ const StartUpRow kPlatformRows[] = {
          c.error = "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n" + c.wholeText();
          c.threadedSharing = true; }},
 #endif
-    {"ForcedThreadingIsAnnouncedFirst", [](StartUp& c) {
-         c.environment = {{"VYRA_OPENCL_FORCE_THREADING", "0"}};
-         c.error = "Deformer evaluator detected VYRA_OPENCL_FORCE_THREADING is set\n" + c.wholeText(); }},
     {"LoadingThrowsAnException", [](StartUp& c) {
          c.machine.lookUp = LookUp::kThrowsStandardException;
          c.stopsBeforePlatform("CLEW failed to initialize: scripted look-up  Vyra running without OpenCL support.\n"); }},
@@ -69,12 +63,10 @@ const StartUpRow kPlatformRows[] = {
     {"NoPlatforms", [](StartUp& c) { c.machine.platforms.clear(); c.stopsBeforePlatform(kNotFound); }},
     {"CountingPlatformsFails", [](StartUp& c) { c.fails("clGetPlatformIDs", 1); c.warnings = {}; c.stopsBeforePlatform(kNotFound); }},
     {"ReadingPlatformIdsFails", [](StartUp& c) { c.fails("clGetPlatformIDs", 2); c.stopsBeforePlatform(kNotFound); }},
-    {"NoPlatformOfTheVendor", [](StartUp& c) {
-         c.platform().vendor = "intel(r) corporation";
-         c.stopsBeforePlatform(listing(c.machine, kNoPlatform) + kNotFound); }},
     {"VendorsAreWholeNames", [](StartUp& c) {
          c.platform().vendor = "Intel(R) Corporation and others";
          c.machine.platforms.push_back({.vendor = "Intel(R)"});
+         c.machine.platforms.push_back({.vendor = "intel(r) corporation"});
          c.stopsBeforePlatform(listing(c.machine, kNoPlatform) + kNotFound); }},
     {"QueryFailsBeforeTheMatch", [](StartUp& c) {
          c.machine.platforms.insert(c.machine.platforms.begin(), kSomebody);
@@ -95,7 +87,6 @@ const StartUpRow kPlatformRows[] = {
          c.machine.platforms.push_back({.extensions = "none"}); }},
     {"AMDById", [](StartUp& c) { c.onVendor("Advanced Micro Devices, Inc.", kAMDProvider, 0x1002); }},
     {"AMDByDecimalId", [](StartUp& c) { c.onVendor("Advanced Micro Devices, Inc.", kAMDProvider, 0x3EA); }},
-    {"NVIDIAById", [](StartUp& c) { c.onNVIDIA("385.31"); }},
     {"AppleByNameWhateverTheId", [](StartUp& c) {
          c.environment = {{"VYRA_OPENCL_PLATFORM", "Apple"}};
          c.onVendor("Apple", kAppleProvider, 0x8086); }},
@@ -107,10 +98,6 @@ const StartUpRow kPlatformRows[] = {
          c.environment = {{"VYRA_OPENCL_DEFORMER_MIN_VERTS", "12x"}};
          c.minimumBufferSize = 12;
          c.error = c.platformText() + "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 12.\n" + kReported + "\n"; }},
-    {"MinimumFromTheEnvironment", [](StartUp& c) {
-         c.environment = {{"VYRA_OPENCL_DEFORMER_MIN_VERTS", "-5"}};
-         c.minimumBufferSize = 0;
-         c.error = c.platformText() + "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 0.\n" + kReported + "\n"; }},
 };
 // clang-format on
 INSTANTIATE_TEST_SUITE_P(Platform, StartUpRows, ::testing::ValuesIn(kPlatformRows), kName);
@@ -158,7 +145,7 @@ TEST_F(StartUpOnce, OptionSettersReturnWhetherValueChanged)
     EXPECT_TRUE(info.setUseMinimumBufferSize(true));
     EXPECT_EQ(info.minimumBufferSize(), 7);
 
-    setEnvironment("VYRA_OPENCL_DEFORMER_MIN_VERTS", "many");
+    setEnvironment("VYRA_OPENCL_DEFORMER_MIN_VERTS", "-5");
     testing::internal::CaptureStderr();
     EXPECT_TRUE(info.setMinimumBufferSize(-1));
     EXPECT_FALSE(info.setMinimumBufferSize(-1));
@@ -174,9 +161,8 @@ TEST_F(StartUpOnce, OptionSettersReturnWhetherValueChanged)
     EXPECT_FALSE(info.setAllowDoublePrecisionSupport(true));
 }
 
-TEST_F(StartUpOnce, CleanUpReleasesKernelStoreOnly)
+TEST_F(StartedTest, CleanUpReleasesKernelStoreOnly)
 {
-    ASSERT_TRUE(start());
     TopenCLInfo& info = TopenCLInfo::theOne();
     const auto kernel =
         info.kernelStore().getKernelFromString("skin", "program", "", "skin", nullptr);
@@ -204,9 +190,8 @@ TEST_F(StartUpOnce, PlatformsAreListedUntilOneListIsComplete)
     }
 }
 
-TEST_F(StartUpOnce, ContextErrorsAreWrittenToStandardError)
+TEST_F(StartedTest, ContextErrorsAreWrittenToStandardError)
 {
-    ASSERT_TRUE(start());
     testing::internal::CaptureStderr();
     runtime().raiseContextError("the device is lost");
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "OpenCL Error: the device is lost\n");

@@ -1,8 +1,6 @@
 // Operating-system functions for tests.
 #pragma once
 
-#include <string>
-
 // Windows removes a variable that is set to the empty text.
 void setEnvironment(const char* name, const char* value);
 void removeEnvironment(const char* name);
@@ -11,6 +9,3 @@ void removeEnvironment(const char* name);
 void* loadLibrary(const char* path);
 void* symbolOf(void* library, const char* name);
 void unloadLibrary(void* library);
-
-// Runs `program` without arguments. Returns its standard output without the final line break.
-std::string outputOf(const std::string& program);

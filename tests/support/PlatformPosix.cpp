@@ -1,6 +1,5 @@
 #include "Platform.h"
 
-#include <cstdio>
 #include <cstdlib>
 
 #include <dlfcn.h>
@@ -28,15 +27,4 @@ void* symbolOf(void* library, const char* name)
 void unloadLibrary(void* library)
 {
     dlclose(library);
-}
-
-std::string outputOf(const std::string& program)
-{
-    std::string output;
-    if (FILE* pipe = popen(program.c_str(), "r")) {
-        for (int character = std::fgetc(pipe); character != EOF; character = std::fgetc(pipe))
-            output += static_cast<char>(character);
-        pclose(pipe);
-    }
-    return output.substr(0, output.find_last_not_of('\n') + 1);
 }

@@ -82,13 +82,6 @@ void ScriptedTest::startInModes(int graphicsToCL, int clToGraphics)
     ASSERT_TRUE(start());
 }
 
-Lines ScriptedTest::callsOf(const std::string& prefix)
-{
-    Lines lines = calls();
-    std::erase_if(lines, [&prefix](const std::string& line) { return !line.starts_with(prefix); });
-    return lines;
-}
-
 Lines ScriptedTest::warnings()
 {
     const std::scoped_lock guard(warningsLock);

@@ -51,9 +51,16 @@ protected:
     // Starts in these synchronisation modes, set by environment variables.
     void startInModes(int graphicsToCL, int clToGraphics);
 
-    // Since the last reading: all calls, those whose text begins with `prefix`, and the warnings.
+    // Since the last reading: all calls, those whose text begins with a prefix, and the warnings.
     Lines calls() { return runtime().takeCalls(); }
-    Lines callsOf(const std::string& prefix);
+    template <typename... Prefixes>
+    Lines callsOf(const Prefixes&... prefixes)
+    {
+        Lines lines = calls();
+        std::erase_if(lines,
+                      [&](const auto& line) { return !(line.starts_with(prefixes) || ...); });
+        return lines;
+    }
     static Lines warnings();
 
     // Declares misuse, which some rules require after a failure; in order.
@@ -71,6 +78,12 @@ protected:
 private:
     Lines fExpectedMisuse;
     Lines fExpectedLeft;
+};
+
+// The fixture of tests that start the library without a change of the machine.
+class StartedTest : public ScriptedTest {
+protected:
+    void SetUp() override { ASSERT_TRUE(start()); }
 };
 
 } // namespace scripted

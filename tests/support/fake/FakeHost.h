@@ -30,11 +30,10 @@ HostScript& host();
 class ResourceWindow {
 public:
     ResourceWindow();
-    ~ResourceWindow();
+    ~ResourceWindow() { host().resourceWindow = nullptr; }
 
 private:
-    struct Window;
-    std::unique_ptr<Window> fWindow;
+    std::shared_ptr<void> fWindow;
 };
 
 // Returns the bytes that the memory monitor counts.

@@ -65,22 +65,6 @@ unsigned FakeRuntime::references(Kind kind, const void* handle)
     return object ? object->references : 0;
 }
 
-std::vector<std::string> FakeRuntime::acquired() const
-{
-    std::vector<std::string> names;
-    fLedger.forEach([&names](const Object& object) {
-        if (object.acquired)
-            names.push_back(object.name);
-    });
-    return names;
-}
-
-std::size_t FakeRuntime::memSize(cl_mem mem)
-{
-    const Object* object = fLedger.alive(Kind::kMem, mem);
-    return object ? object->size : 0;
-}
-
 FakeRuntime& runtime()
 {
     static FakeRuntime theRuntime;

@@ -69,11 +69,9 @@ public:
     unsigned created(Kind kind) const { return fLedger.created(kind); }
     // Returns the references of an existing object, else 0.
     unsigned references(Kind kind, const void* handle);
-    // Returns the bytes of an existing memory object.
-    std::size_t memSize(cl_mem mem);
 
     // Returns the names of the acquired shared buffers.
-    std::vector<std::string> acquired() const;
+    std::vector<std::string> acquired() const { return fLedger.acquired(); }
     // Sets whether commands stay incomplete until the host waits for them, or until
     // completeCommands.
     void holdCommands(bool hold) { fCommands.hold(hold); }

@@ -6,22 +6,22 @@
 
 namespace scripted {
 
-struct ResourceWindow::Window {
+namespace {
+
+struct Window {
     int argumentCount = 0;
     QGuiApplication application{argumentCount, nullptr};
     QOpenGLWindow window;
 };
 
+} // namespace
+
 ResourceWindow::ResourceWindow()
 {
     setEnvironment("QT_QPA_PLATFORM", "offscreen");
-    fWindow = std::make_unique<Window>();
-    host().resourceWindow = &fWindow->window;
-}
-
-ResourceWindow::~ResourceWindow()
-{
-    host().resourceWindow = nullptr;
+    const auto window = std::make_shared<Window>();
+    host().resourceWindow = &window->window;
+    fWindow = window;
 }
 
 } // namespace scripted

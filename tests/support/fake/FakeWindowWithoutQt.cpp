@@ -4,18 +4,9 @@
 
 namespace scripted {
 
-struct ResourceWindow::Window {
-    void* opaque = nullptr;
-};
-
-ResourceWindow::ResourceWindow() : fWindow(std::make_unique<Window>())
+ResourceWindow::ResourceWindow() : fWindow(std::make_shared<int>())
 {
     host().resourceWindow = reinterpret_cast<QOpenGLWindow*>(fWindow.get());
-}
-
-ResourceWindow::~ResourceWindow()
-{
-    host().resourceWindow = nullptr;
 }
 
 } // namespace scripted

@@ -71,4 +71,14 @@ std::vector<std::string> Ledger::balance() const
     return lines;
 }
 
+std::vector<std::string> Ledger::acquired() const
+{
+    std::vector<std::string> names;
+    for (const auto& [handle, object] : fAlive) {
+        if (object.acquired)
+            names.push_back(object.name);
+    }
+    return names;
+}
+
 } // namespace scripted

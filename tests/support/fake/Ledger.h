@@ -57,14 +57,6 @@ public:
     // Removes one reference, and the object with the last one.
     void release(const void* handle);
 
-    // Calls `use` with every existing object.
-    template <typename Use>
-    void forEach(const Use& use) const
-    {
-        for (const auto& [handle, object] : fAlive)
-            use(object);
-    }
-
     // Returns "mem#2" for any object that ever existed, "null", or "ptr".
     std::string name(const void* handle) const;
     // Removes the records of released objects; their handles then have no name.
@@ -73,6 +65,8 @@ public:
     unsigned created(Kind kind) const { return fCreated[static_cast<std::size_t>(kind)]; }
     // Returns one line per existing object, in order of kind and creation: "mem#2 x1".
     std::vector<std::string> balance() const;
+    // Returns the names of the acquired memory objects.
+    std::vector<std::string> acquired() const;
 
 private:
     std::map<const void*, Object> fAlive;
