@@ -245,7 +245,8 @@ TEST(Allocation, FailedAppendIsNotListed)
     std::vector<cl_event> events;
     events.reserve(1000);
     allocationsLeft = 1;
-    EXPECT_THROW(for (;;) list.append(nullptr), std::bad_alloc);
+    EXPECT_THROW(
+        for (;;) { list.append(nullptr); }, std::bad_alloc);
     std::vector<cl_event> tooSmall = {nullptr};
     allocationsLeft = 1;
     EXPECT_THROW(list.copyTo(tooSmall), std::bad_alloc);

@@ -148,11 +148,12 @@ Decision decideThreadedSharing(const Diagnostics& diagnostics)
 Decision decideBatching(const Diagnostics& diagnostics)
 {
     const bool forced = diagnostics.environment.find(kForceThreadingVariable) != nullptr;
-    if (forced)
+    if (forced) {
         return {"batching", "Shared buffers in one batch", "no",
                 std::string(kForceThreadingVariable) +
                     " is set: each buffer is acquired on its own",
                 kForceThreadingVariable};
+    }
     return {"batching", "Shared buffers in one batch", "yes",
             "one acquire and one release cover all buffers", ""};
 }
