@@ -59,6 +59,17 @@ TEST_F(EvaluatorInputTest, InvalidMeshesAndBuffersAreRejectedWithReason)
     expectFailure(evaluator->createMesh(grid(4, "small"), {.positions = 90, .normals = 91}),
                   "mesh 'small': its buffer of normals has 47 bytes, and the vertices need 48");
     EXPECT_EQ(evaluator->batchSize(), 2U) << "the buffers of the other mesh";
+    makeEvaluator();
+    runtime().plan({.function = "clCreateFromGLBuffer", .status = CL_INVALID_GL_OBJECT, .nth = 2});
+    expectFailure(addMesh(grid(4, "gone")),
+                  "mesh 'gone': OpenCL cannot share its buffer of normals "
+                  "(CL_INVALID_GL_OBJECT); check that the renderer created it");
+    makeEvaluator();
+    runtime().clearFaults();
+    runtime().plan({.function = "clGetMemObjectInfo", .status = CL_OUT_OF_RESOURCES});
+    expectFailure(addMesh(grid(4, "unknown")),
+                  "mesh 'unknown': the size of its buffer of positions is unknown "
+                  "(CL_OUT_OF_RESOURCES); check the OpenCL driver");
 }
 
 TEST_F(EvaluatorInputTest, InvalidOrThrowingDeformersAreReported)

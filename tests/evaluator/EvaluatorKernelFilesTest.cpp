@@ -71,6 +71,12 @@ TEST_F(EvaluatorKernelFileTest, FailedBuildReportsLogAndKeepsFormerKernel)
     writeKernels("own.cl", "");
     EXPECT_THAT(messageOfMesh(), HasSubstr(path + " is empty"));
     writeKernels("own.cl", kKernelText);
+    runtime().plan({.function = "clCreateProgramWithSource", .status = CL_OUT_OF_HOST_MEMORY});
+    EXPECT_THAT(messageOfMesh(), HasSubstr(path + " cannot be built:\nOpenCL error: CL_OUT_OF_HOST_"
+                                                  "MEMORY"));
+    runtime().plan({.function = "clGetKernelInfo", .status = CL_OUT_OF_RESOURCES});
+    EXPECT_THAT(messageOfMesh(), HasSubstr("the kernel 'plain' of own.cl cannot be examined "
+                                           "(CL_OUT_OF_RESOURCES)"));
     EXPECT_EQ(messageOfMesh(), "");
     warnings();
 }

@@ -208,7 +208,7 @@ class Info(unittest.TestCase):
                 self.check(scripted(scenario) | environment, *rest)
 
     def test_second_run_prints_same_report(self):
-        """A run leaves no state behind. This scenario reports no times."""
+        """A run keeps no state. This scenario reports no times."""
         first, second = (run_info(scripted("ordinary"), [*INTEL, "--json"]).stdout for _ in range(2))
         self.assertEqual(first, second)
         self.assertTrue(first)
