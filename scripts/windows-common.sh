@@ -1,6 +1,8 @@
 # What the commands for Windows have in common. Sourced after common.sh.
 
 windows_libraries=$project_dir/build/windows-libraries
+# Libraries that take an hour to build, kept for all clones.
+windows_kept=${XDG_CACHE_HOME:-$HOME/.cache}/vyra-opencl/windows
 
 # Installs what scripts/packages-windows.txt, scripts/packages.txt and the arguments name.
 install_windows_packages() {
@@ -67,5 +69,79 @@ provide_windows_libraries() {
     if [[ ! -f $root/lib/libgmock.a ]]; then
         echo "Building GoogleTest for Windows ..."
         run_quietly "$root/googletest.log" cross_build "$root" googletest /usr/src/googletest
+    fi
+}
+
+# Whether Qt and Assimp have been built.
+has_kept_windows_libraries() {
+    [[ -f $windows_kept/qt-is-built && -f $windows_kept/assimp-is-built ]]
+}
+
+# Debian's source of Qt, without the modules that the viewer and the tool do not use.
+build_qt() {
+    local feature off=()
+    # The tablet's header is not in Debian's source; DirectWrite 3 needs Direct2D to be complete.
+    for feature in network sql dbus testlib xml printsupport concurrent widgets vulkan icu tabletevent direct2d \
+        directwrite3 gif ico system_zlib system_png system_jpeg system_pcre2 system_freetype system_harfbuzz \
+        system_doubleconversion; do
+        off+=("-DFEATURE_$feature=OFF")
+    done
+    fetch_source "$windows_kept" qt qt6-base &&
+        cross_build "$windows_kept" qt "$windows_kept/source/qt" -DVYRA_WINDOWS_QT="$windows_kept" \
+            -DQT_HOST_PATH=/usr -DQT_HOST_PATH_CMAKE_DIR="/usr/lib/$(uname -m)-linux-gnu/cmake" \
+            -DBUILD_SHARED_LIBS=ON -DQT_BUILD_EXAMPLES=OFF -DQT_BUILD_TESTS=OFF -DINPUT_opengl=desktop "${off[@]}" &&
+        touch "$windows_kept/qt-is-built"
+}
+
+# Completes Debian's source of Assimp: minizip is a package of its own, the DLL has no resources, and
+# the library for compressed glTF has no Windows build.
+complete_assimp() {
+    local source=$windows_kept/source/assimp minizip=$windows_kept/source/minizip
+    if [[ -d $source/contrib/unzip ]]; then return; fi
+    patch -R -p1 -d "$source" -i "$source/debian/patches/use-system-libdraco.patch" &&
+        sed -i '/res\/assimp\.rc/d' "$source/code/CMakeLists.txt" &&
+        mkdir "$source/contrib/unzip" &&
+        touch "$source/contrib/unzip/crypt.c" &&
+        cp "$minizip/"{unzip,ioapi,crypt}.h "$minizip/"{unzip,ioapi}.c "$source/contrib/unzip"
+}
+
+# Lets the cross-compiler find some of the machine's headers, and never its whole include folder.
+link_headers() {
+    local header
+    mkdir -p "$windows_kept/include"
+    for header in "$@"; do
+        ln -sfn "/usr/include/$header" "$windows_kept/include/$header"
+    done
+}
+
+# Assimp, with the importers of formats that artists exchange.
+build_assimp() {
+    local source=$windows_kept/source/assimp mingw=/usr/x86_64-w64-mingw32 importer importers=()
+    for importer in 3DS BVH COLLADA FBX GLTF MD5 OBJ PLY SMD STL X; do
+        importers+=("-DASSIMP_BUILD_${importer}_IMPORTER=ON")
+    done
+    fetch_source "$windows_kept" minizip minizip &&
+        fetch_source "$windows_kept" assimp assimp &&
+        complete_assimp &&
+        link_headers utf8.h utf8 stb &&
+        cross_build "$windows_kept" assimp "$source" -DVYRA_WINDOWS_QT="$windows_kept" \
+            -DBUILD_SHARED_LIBS=ON -DASSIMP_BUILD_TESTS=OFF -DASSIMP_BUILD_ASSIMP_TOOLS=OFF \
+            -DCMAKE_CXX_FLAGS="-isystem $windows_kept/include" -DASSIMP_NO_EXPORT=ON -DASSIMP_BUILD_MINIZIP=ON -DASSIMP_WARNINGS_AS_ERRORS=OFF \
+            -DASSIMP_INSTALL_PDB=OFF -DZLIB_LIBRARY_REL="$mingw/lib/libz.a" -DZLIB_INCLUDE_DIR="$mingw/include" \
+            -DCMAKE_PROJECT_INCLUDE="$project_dir/cmake/windows/no-prefix.cmake" \
+            -DASSIMP_BUILD_ALL_IMPORTERS_BY_DEFAULT=OFF "${importers[@]}" &&
+        touch "$windows_kept/assimp-is-built"
+}
+
+# Builds Qt and Assimp for Windows, once.
+provide_kept_windows_libraries() {
+    mkdir -p "$windows_kept"
+    if [[ ! -f $windows_kept/qt-is-built ]]; then
+        echo "Building Qt for Windows, which takes an hour on two cores ..."
+        run_quietly "$windows_kept/qt.log" build_qt
+    fi
+    if [[ ! -f $windows_kept/assimp-is-built ]]; then
+        echo "Building Assimp for Windows ..."
+        run_quietly "$windows_kept/assimp.log" build_assimp
     fi
 }

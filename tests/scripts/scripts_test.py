@@ -24,6 +24,7 @@ WRONG_USE = [
     ("abi", "--bogus"), ("bench", "--bogus"), ("bench", "--against", "bogus"), ("check", "--bogus"),
     ("check", "tests", "bogus"), ("demo", "--bogus"), ("demo", "--crowd=3", "-x", "a.fbx"), ("docs", "--bogus"),
     ("docs", "one", "two"), ("format", "--bogus"), ("gpu-check", "--bogus"), ("gpu-kit", "--bogus"), ("package", "--bogus"),
+    ("package-windows", "--bogus"),
     ("pictures", "--bogus"), ("test", "--bogus"), ("test", "--asan", "--bogus"), ("test", "--fuzz", "--bogus"),
     ("test", "KernelStore"), ("test", "-R"), ("test", "--runtime"), ("test-debian", "--bogus"),
     ("test-debian", "buster"), ("test-windows", "--bogus"), ("test-windows", "-R", "A", "B"),
