@@ -110,15 +110,22 @@ void SyncFunctions::serverWait(GLsync sync, unsigned int flags, std::uint64_t ti
 
 GLsync SyncFunctions::fromCLEvent(cl_context context, cl_event event, unsigned int flags)
 {
-    const auto create = [&] {
-        return fDriver.syncFromCLEventUsable()
-                   ? fDriver.glCreateSyncFromCLeventARB(context, event, flags)
-                   : fenceAndFlush(kGlSyncGpuCommandsComplete, 0);
+    const auto inContext = [this](const auto& create) {
+        return callerHasContext() ? create() : fHidden.call(create);
     };
-    if (!fDriver.syncFromCLEventUsable() && (flags != 0 || !waitForCLEvent(event))) {
+    if (fDriver.syncFromCLEventUsable()) {
+        // Fails if the event's context is not the driver's own sharing one, for example if a layer
+        // shares.
+        const GLsync sync =
+            inContext([&] { return fDriver.glCreateSyncFromCLeventARB(context, event, flags); });
+        if (sync != nullptr) {
+            return sync;
+        }
+    }
+    if (flags != 0 || !waitForCLEvent(event)) {
         return nullptr;
     }
-    return callerHasContext() ? create() : fHidden.call(create);
+    return inContext([this] { return fenceAndFlush(kGlSyncGpuCommandsComplete, 0); });
 }
 
 bool SyncFunctions::callerHasContext() const
