@@ -96,19 +96,19 @@ class Scripts(unittest.TestCase):
             "test": "case $1 in --asan)\n" + ctest(75, 1, 4, "FAILED", "Fence (Failed)") + "exit 8 ;;\n"
                     "--tsan) echo broken build; exit 1 ;; --fuzz | --kernels) ;; *)\n"
                     + ctest(100, 0, 7, "did not run", "Direct3D (Skipped)") + "esac",
-            "abi": "echo changed; exit 1", "bench": "", "test-windows": "", "format": ""}
+            "abi": "echo changed; exit 1", "bench": "", "test-windows": "", "package-windows": "", "format": ""}
         for name, text in scripts.items():
             self.stand_in(self.root / "project/scripts" / name, f"#!/bin/sh\n{text}\n")
         run, _ = self.run_script("check", "--ci")
         self.assertEqual(run.returncode, 1, run.stderr)
         self.assertEqual(
             [tuple(line.split()[:2]) for line in run.stdout.splitlines() if " processor " in line],
-            [("passed", "tests"), ("passed", "counts"), ("passed", "windows"), ("passed", "format"),
-             ("FAILED", "asan"), ("FAILED", "tsan"), ("passed", "clang"), ("passed", "fuzz"),
-             ("passed", "kernels"), ("FAILED", "abi")])
+            [("passed", "tests"), ("passed", "counts"), ("passed", "windows"),
+             ("passed", "windows-package"), ("passed", "format"), ("FAILED", "asan"), ("FAILED", "tsan"),
+             ("passed", "clang"), ("passed", "fuzz"), ("passed", "kernels"), ("FAILED", "abi")])
         self.assertRegex(run.stdout, "(?s)broken build.*FAILED  tsan.*changed.*FAILED  abi")
-        # 7 in tests and in clang, 4 in asan; one for each of the seven other checks.
-        self.assertIn("\n88% tests passed, 3 tests failed out of 25\n", run.stdout)
+        # 7 in tests and in clang, 4 in asan; one for each of the eight other checks.
+        self.assertIn("\n88% tests passed, 3 tests failed out of 26\n", run.stdout)
         self.assertRegex(run.stdout, r"did not run:\n\ttests: library.Direct3D \(Skipped\)\n\tclang: ")
         self.assertTrue(run.stdout.endswith(
             "FAILED:\n\tasan: library.Fence (Failed)\n\ttsan (exit code 1)\n\tabi (exit code 1)\n"), run.stdout)
