@@ -4,7 +4,9 @@ The environment variables TEST_... name the program, its schema, and the parts o
 """
 import json
 import os
+import pathlib
 import subprocess
+import tempfile
 import unittest
 
 import jsonschema
@@ -212,6 +214,15 @@ class Info(unittest.TestCase):
         first, second = (run_info(scripted("ordinary"), [*INTEL, "--json"]).stdout for _ in range(2))
         self.assertEqual(first, second)
         self.assertTrue(first)
+
+    def test_display_without_usable_opengl_prints_error_and_returns_4(self):
+        with tempfile.TemporaryDirectory() as folder:
+            # Empty files take precedence over the real libraries.
+            for name in ("libGLX_mesa.so.0", "libGLX_indirect.so.0"):
+                pathlib.Path(folder, name).touch()
+            run = run_info({"LD_LIBRARY_PATH": folder, "QT_QPA_PLATFORM": "xcb"}, [])
+        self.assertEqual(run.returncode, NO_GRAPHICS, run.stderr)
+        self.assertIn("OpenGL cannot be started on this display", run.stderr)
 
     def test_help_returns_0_and_wrong_option_prints_error_and_returns_2(self):
         run = run_info({}, ["--help"])

@@ -8,10 +8,28 @@
 #include "tools/info/selftest/SelfTestRun.h"
 
 #include <cstdio>
+#include <cstdlib>
 
 #include <QCoreApplication>
 
 namespace {
+
+// Handler of Qt's messages: Qt ends the process if the display's OpenGL has no usable
+// configuration.
+void exitWithoutOpenGL(QtMsgType type, const QMessageLogContext& context, const QString& message)
+{
+    if (type != QtFatalMsg) {
+        std::fprintf(stderr, "%s\n",
+                     qFormatLogMessage(type, context, message).toStdString().c_str());
+        return;
+    }
+    std::fprintf(stderr,
+                 "vyra-opencl-info: OpenGL cannot be started on this display (%s); install the "
+                 "driver of the GPU that draws, or correct the variable that selects it, such as "
+                 "__GLX_VENDOR_LIBRARY_NAME\n",
+                 message.toStdString().c_str());
+    std::_Exit(static_cast<int>(info::ExitCode::kNoGraphics));
+}
 
 info::Diagnostics examineMachine(const info::Options& options)
 {
@@ -50,6 +68,7 @@ int main(int argc, char* argv[])
         std::fputs(info::helpText().c_str(), stdout);
         return 0;
     }
+    qInstallMessageHandler(exitWithoutOpenGL);
     const info::Explanation explanation = info::explain(examineMachine(*options));
     const std::string report =
         options->json ? info::jsonReport(explanation) : info::textReport(explanation);

@@ -56,6 +56,21 @@ void exitWithoutDisplay(QtMsgType type, const QMessageLogContext&, const QString
     std::_Exit(code);
 }
 
+// The same if the display's OpenGL has no usable configuration.
+void exitWithoutOpenGL(QtMsgType type, const QMessageLogContext& context, const QString& message)
+{
+    if (type != QtFatalMsg) {
+        std::fprintf(stderr, "%s\n",
+                     qFormatLogMessage(type, context, message).toStdString().c_str());
+        return;
+    }
+    const int code =
+        printFailure({ExitCode::kNoGraphics,
+                      "OpenGL cannot be started on this display (" + message.toStdString() +
+                          "); install a graphics driver, or Mesa's software renderer"});
+    std::_Exit(code);
+}
+
 [[noreturn]] void endWithoutMemory()
 {
     std::fputs(kOutOfMemory, stderr);
@@ -195,7 +210,7 @@ int main(int argc, char* argv[])
     // Passes only the program's name, because Qt has an option --platform, too.
     int ownArguments = 1;
     const QGuiApplication application(ownArguments, argv);
-    qInstallMessageHandler(nullptr);
+    qInstallMessageHandler(exitWithoutOpenGL);
     options.value().importProgram = QGuiApplication::applicationFilePath().toStdString();
     viewer::catchInterrupt();
 

@@ -15,11 +15,14 @@ constexpr char kPlatformVariable[] = "QT_QPA_PLATFORM";
 
 // Qt's warnings during the search for a display: the reason if there is none.
 std::string sfWindowSystemErrors;
+QtMessageHandler sfPreviousHandler = nullptr;
 
 void keepWindowSystemError(QtMsgType type, const QMessageLogContext& context,
                            const QString& message)
 {
     constexpr std::string_view kWindowSystem = "qt.qpa";
+    if (type == QtFatalMsg && sfPreviousHandler)
+        sfPreviousHandler(type, context, message);
     if (type != QtWarningMsg || !std::string_view(context.category).starts_with(kWindowSystem))
         return;
     sfWindowSystemErrors +=
@@ -57,11 +60,11 @@ std::string glText(QOpenGLContext& context, unsigned name)
 RenderWindow::RenderWindow()
 {
     sfWindowSystemErrors.clear();
-    const QtMessageHandler previousHandler = qInstallMessageHandler(keepWindowSystemError);
+    sfPreviousHandler = qInstallMessageHandler(keepWindowSystemError);
     fApplication = makeApplication();
     fRenderer.windowSystem = QGuiApplication::platformName().toStdString();
     open();
-    qInstallMessageHandler(previousHandler);
+    qInstallMessageHandler(sfPreviousHandler);
 }
 
 RenderWindow::~RenderWindow() = default;
