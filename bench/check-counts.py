@@ -3,7 +3,8 @@
 
 Compares the ratio of each operation's count to that of the direct OpenCL calls, as vyra-opencl-bench counts them
 under valgrind. The same binary gives the same counts; compilers and runtimes differ a little, so growth of up to
-a tenth is accepted. --record replaces the record with the results. The exit code is 1 if a ratio has grown more.
+a tenth is accepted. --record replaces the record with the results. The exit code is 1 if a ratio has grown more, or if
+a recorded operation was not counted.
 """
 import json
 import sys
@@ -39,8 +40,11 @@ def main():
              if name in record and ratio > record[name] * ALLOWED_GROWTH}
     for name, (ratio, before) in grown.items():
         print(f"{name}: {ratio} times the instructions of the direct calls, {before} recorded")
-    compared = len(counted.keys() & record.keys())
-    if grown or not compared:
+    missing = record.keys() - counted.keys()
+    if missing:
+        sys.exit("recorded, and not counted: " + ", ".join(sorted(missing)))
+    compared = len(record)
+    if grown:
         sys.exit(f"{len(grown)} of {compared} operations take more instructions than bench/counts.json allows")
     print(f"{compared} operations take no more instructions than recorded.")
 
