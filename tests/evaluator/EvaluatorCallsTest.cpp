@@ -24,7 +24,8 @@ TEST_F(ImplicitModesTest, SteadyStateMakesThreeCommandsPerMeshAndOnlyLastWaitsFo
         const Lines lines = callsOfEvaluation();
         const Lines releases = linesOf(lines, "clEnqueueRelease");
         ASSERT_EQ(releases.size(), 1U);
-        EXPECT_EQ(lastListOf(releases[0]).size(), 1 + queues) << "the acquire, one event a queue";
+        EXPECT_EQ(namesAt(releases[0], releases[0].rfind('[')).size(), 1 + queues)
+            << "the acquire, one event a queue";
         const Lines acquires = linesOf(lines, "clEnqueueAcquire");
         ASSERT_EQ(acquires.size(), 1U);
         const std::string acquired = acquires[0].substr(acquires[0].rfind(' ') + 1);
@@ -81,9 +82,7 @@ std::string memoryOf(const Lines& kernelLines, std::size_t first)
     std::string text;
     char next = 'A';
     for (std::size_t i = 0; i < kernelLines.size(); ++i) {
-        std::string line = kernelLines[i];
-        line.resize(line.rfind(']') + 1);
-        const Lines memory = lastListOf(line);
+        const Lines memory = namesAt(kernelLines[i], kernelLines[i].rfind('['));
         text += text.empty() ? "" : " ";
         letters.try_emplace(memory[first], i == 0 ? 'R' : next);
         text += letters[memory[first]];
@@ -212,7 +211,7 @@ protected:
         std::string names;
         for (const std::string& line : calls()) {
             if (!line.starts_with("clFlush("))
-                names += line.substr(0, line.find('(')) + ' ';
+                names += functionOf(line) + ' ';
         }
         return names;
     }

@@ -32,11 +32,6 @@ struct Row : Named {
     int clToGraphics;
 };
 
-std::string functionOf(const std::string& line)
-{
-    return line.substr(0, line.find('('));
-}
-
 bool isRelease(const std::string& function)
 {
     return function == "clEnqueueReleaseGLObjects";
@@ -162,7 +157,7 @@ void EvaluatorFaultTest::checkReported(const Lines& lines)
     for (const std::string& line : linesOf(lines, "clEnqueue")) {
         const std::size_t event = line.rfind(" = event#");
         if (isRelease(functionOf(line))) {
-            std::ranges::copy(lastListOf(line), std::back_inserter(reported));
+            std::ranges::copy(namesAt(line, line.rfind('[')), std::back_inserter(reported));
         } else if (event != std::string::npos) {
             const std::size_t begin = line.find("queue#");
             const std::string queue = line.substr(begin, line.find_first_of(",)", begin) - begin);
@@ -235,15 +230,10 @@ TEST_P(EvaluatorFaultTest, EachFailingCallIsReportedAndRetrySucceeds)
     for (int i = 0; i < 2; ++i) {
         prepareSubject();
         run();
-        functions = calls();
+        functions = functionsOf(calls());
         ASSERT_TRUE(evaluator->status().ok()) << evaluator->status().message;
         EXPECT_EQ(leftOver(), Lines{});
     }
-    std::erase_if(functions, [](const std::string& line) {
-        return !line.starts_with("cl") && !line.starts_with("gl");
-    });
-    for (std::string& line : functions)
-        line = functionOf(line);
     for (unsigned nth = 1; nth <= functions.size(); ++nth) {
         for (const bool onwards : {false, true})
             runWith({.function = "*", .nth = nth, .onwards = onwards}, functions);

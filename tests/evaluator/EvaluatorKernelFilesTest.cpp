@@ -8,7 +8,6 @@
 
 #include <atomic>
 #include <optional>
-#include <thread>
 
 using namespace scripted;
 using testing::HasSubstr;
@@ -151,11 +150,7 @@ TEST_F(EvaluatorKernelFileTest, OptionsSelectSeparatePrograms)
 }
 
 std::atomic<int> received = 0;
-
-void receive(const char* /*text*/)
-{
-    ++received;
-}
+const CLWarningSink receive = [](const char* /*text*/) { ++received; };
 
 TEST_F(EvaluatorKernelFileTest, SinkReplacedDuringBuildIsKeptAndCalledOnce)
 {
@@ -187,20 +182,15 @@ TEST_F(EvaluatorKernelFileTest, ConcurrentCapturesKeepHostsWarnings)
     constexpr int kThreads = 4;
     constexpr int kRounds = 2000;
     setCLWarningSink(receive);
-    std::vector<std::jthread> threads;
-    threads.reserve(kThreads);
-    for (int thread = 0; thread < kThreads; ++thread) {
-        threads.emplace_back([thread] {
-            for (int round = 0; round < kRounds; ++round) {
-                std::optional<vyra::WarningCapture> capture;
-                if (thread > 0)
-                    capture.emplace();
-                CLInternalWarning("%d", thread);
-                EXPECT_TRUE(!capture || capture->text() == std::to_string(thread) + "\n");
-            }
-        });
-    }
-    threads.clear();
+    onThreads(kThreads, [](int thread) {
+        for (int round = 0; round < kRounds; ++round) {
+            std::optional<vyra::WarningCapture> capture;
+            if (thread > 0)
+                capture.emplace();
+            CLInternalWarning("%d", thread);
+            EXPECT_TRUE(!capture || capture->text() == std::to_string(thread) + "\n");
+        }
+    });
     EXPECT_EQ(received, kThreads * kRounds);
     EXPECT_EQ(setCLWarningSink(receive), receive);
 }

@@ -4,7 +4,6 @@
 #include <fstream>
 #include <random>
 #include <span>
-#include <sstream>
 
 #include <gtest/gtest.h>
 
@@ -60,8 +59,7 @@ Lines EvaluatorTest::objectsSinceStart() const
 {
     Lines lines = runtime().balance();
     std::erase_if(lines, [this](const std::string& line) {
-        return std::ranges::count(leftByStart, line) > 0 || line.starts_with("platform") ||
-               line.starts_with("device");
+        return std::ranges::count(leftByStart, line) > 0;
     });
     return lines;
 }
@@ -86,7 +84,7 @@ Lines EvaluatorTest::leftOver()
 void EvaluatorTest::startIn(int graphicsToCL, int clToGraphics)
 {
     startInModes(graphicsToCL, clToGraphics);
-    TopenCLInfo::theOne().setMinimumBufferSize(kSmallest);
+    info().setMinimumBufferSize(kSmallest);
     makeEvaluator();
     calls();
 }
@@ -148,27 +146,6 @@ Lines EvaluatorTest::callsOfEvaluation()
 void EvaluatorTest::writeKernels(const std::string& file, const std::string& text) const
 {
     std::ofstream(kernels / file) << text;
-}
-
-std::size_t countOf(const Lines& lines, const std::string& prefix)
-{
-    return linesOf(lines, prefix).size();
-}
-
-Lines linesOf(Lines lines, const std::string& prefix)
-{
-    std::erase_if(lines, [&prefix](const std::string& line) { return !line.starts_with(prefix); });
-    return lines;
-}
-
-Lines lastListOf(const std::string& line)
-{
-    const std::size_t begin = line.rfind('[') + 1;
-    std::istringstream list(line.substr(begin, line.rfind(']') - begin));
-    Lines names;
-    for (std::string name; std::getline(list >> std::ws, name, ',');)
-        names.push_back(name);
-    return names;
 }
 
 } // namespace scripted

@@ -5,7 +5,6 @@
 #include "ScriptedTest.h"
 #include "evaluator/Evaluator.h"
 #include "host/EvaluationId.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <filesystem>
 #include <functional>
@@ -80,7 +79,7 @@ protected:
     // library keeps: the event of the last batch acquire, and the renderer's fence.
     Lines leftOver();
     void writeKernels(const std::string& file, const std::string& text) const;
-    static TopenCLSharedBufferMgr& manager() { return TopenCLInfo::theOne().sharedBufferMgr(); }
+    static TopenCLSharedBufferMgr& manager() { return info().sharedBufferMgr(); }
 
     vyra::EvaluatorSettings settings; // of the next evaluator
     std::unique_ptr<vyra::Evaluator> evaluator;
@@ -106,11 +105,5 @@ inline constexpr const char* kKernelText =
     "kernel void full(const uint count, global const float* positions, global const float* "
     "normals, global float* newPositions, global float* newNormals, global const float* weights, "
     "global const float4* numbers, const uint first, const float amount) {}\n";
-
-std::size_t countOf(const Lines& lines, const std::string& prefix);
-// Returns the lines that begin with the prefix.
-Lines linesOf(Lines lines, const std::string& prefix);
-// Returns the names in the last list of a line: "[event#1, event#2]".
-Lines lastListOf(const std::string& line);
 
 } // namespace scripted

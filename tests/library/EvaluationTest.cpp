@@ -1,12 +1,11 @@
 // Whole evaluations: the renderer writes, OpenCL deforms, the renderer reads the expected values,
 // in every pair of synchronisation modes.
 #include "LibraryTest.h"
+#include "Named.h"
 
 #include "host/EvaluationId.h"
-#include "kernels/TopenCLKernelStore.h"
 #include "runtime/TopenCLInfo.h"
 
-#include <algorithm>
 #include <functional>
 #include <thread>
 
@@ -15,17 +14,11 @@ namespace {
 constexpr std::size_t kElements = 3000;
 constexpr int kFrames = 12;
 
-struct Modes {
-    const char* description;
+struct Modes : Named {
     const char* graphicsToCL;
     const char* clToGraphics;
     const char* forceThreading = nullptr;
 };
-
-void PrintTo(const Modes& modes, std::ostream* stream)
-{
-    *stream << modes.description;
-}
 
 // One mesh: its vertex buffer at the renderer, its record, its kernels and its queue.
 struct Mesh {

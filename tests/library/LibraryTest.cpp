@@ -24,12 +24,8 @@ void LibraryTest::chooseFirstPlatform()
 void LibraryTest::start(std::initializer_list<Variable> environment)
 {
     ASSERT_NO_FATAL_FAILURE(chooseFirstPlatform());
-    for (const Variable& variable : environment) {
-        if (variable.value)
-            setEnvironment(variable.name, variable.value);
-        else
-            removeEnvironment(variable.name);
-    }
+    for (const auto& [name, value] : environment)
+        setEnvironment(name, value);
     fRenderer = Renderer::make();
     if (!fRenderer)
         GTEST_SKIP() << "this display has no OpenGL";

@@ -7,14 +7,12 @@
 
 #include <initializer_list>
 #include <memory>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
 
-struct Variable {
-    const char* name;
-    const char* value;
-};
+using Variable = std::pair<const char*, const char*>; // of the environment: name and value
 
 // The runtime object lives once per process, so each test is a process of its own.
 class LibraryTest : public testing::Test {

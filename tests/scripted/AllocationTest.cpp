@@ -5,24 +5,15 @@
 #include "FaultBench.h"
 #include "ManagerTest.h"
 #include "diagnostics/AutoCLEventList.h"
-#include "diagnostics/CLInternalWarning.h"
 #include "interop/ConcurrentEventList.h"
 
 #include <algorithm>
-#include <functional>
 #include <iterator>
 #include <new>
 #include <set>
 
 namespace scripted {
 namespace {
-
-struct Row : Named {
-    std::function<void(Bench&)> prepare;
-    std::function<int(Bench&)> run;
-};
-
-class OutOfMemory : public StartedTest, public ::testing::WithParamInterface<Row> {};
 
 // A built program stays cached even if its kernel could not be listed.
 Lines withoutPrograms()
@@ -32,38 +23,43 @@ Lines withoutPrograms()
     return lines;
 }
 
-TEST_P(OutOfMemory, FailedAllocationChangesNothingAndRetrySucceeds)
+// Requires that `run`, on a bench that is prepared, changes nothing with each of its allocations
+// failing in turn, and then succeeds.
+void expectRetrySucceeds(const char* what, void (*prepare)(Bench&), int (*run)(Bench&))
 {
     const Lines before = runtime().balance();
     bool failed = true;
     for (unsigned nth = 1; failed; ++nth) {
-        SCOPED_TRACE(nth);
+        SCOPED_TRACE(testing::Message() << what << ' ' << nth);
         {
             Bench bench;
-            GetParam().prepare(bench);
+            prepare(bench);
             const Lines prepared = withoutPrograms();
             allocationsLeft = nth;
             try {
-                GetParam().run(bench);
+                run(bench);
                 failed = false;
                 EXPECT_GT(nth, 1U);
             } catch (const std::bad_alloc&) {
                 EXPECT_EQ(withoutPrograms(), prepared) << "objects were leaked or released";
             }
             allocationsLeft = 0;
-            EXPECT_EQ(GetParam().run(bench), 1) << "retry";
+            EXPECT_EQ(run(bench), 1) << "retry";
         }
         EXPECT_EQ(runtime().balance(), before);
     }
 }
-INSTANTIATE_TEST_SUITE_P(Allocation, OutOfMemory,
-                         ::testing::Values(Row{"KernelBuilt", [](Bench& b) { b.makeStore(); },
-                                               [](Bench& b) { return b.getKernel(); }},
-                                           Row{"PoolCreates", [](Bench& b) { b.makePool(0); },
-                                               [](Bench& b) { return b.fromPool(64); }},
-                                           Row{"SharedBuffer", [](Bench& b) { b.makeManager(0); },
-                                               [](Bench& b) { return b.createShared(); }}),
-                         ::testing::PrintToStringParamName());
+
+TEST_F(StartedTest, FailedAllocationChangesNothingAndRetrySucceeds)
+{
+    using B = Bench;
+    expectRetrySucceeds(
+        "kernel", [](B& b) { b.makeStore(); }, [](B& b) { return b.getKernel(); });
+    expectRetrySucceeds(
+        "pool", [](B& b) { b.makePool(0); }, [](B& b) { return b.fromPool(64); });
+    expectRetrySucceeds(
+        "shared", [](B& b) { b.makeManager(0); }, [](B& b) { return b.createShared(); });
+}
 
 // Runs `operation` with each of its allocations failing in turn, until none does, and `check` each
 // time that it ran out of memory. Returns how often it ran.
@@ -116,8 +112,7 @@ protected:
         }
         runtime().clearFaults();
         fCalls = calls();
-        Lines waits = fCalls;
-        std::erase_if(waits, [](const auto& line) { return !line.starts_with("clWaitFor"); });
+        const Lines waits = linesOf(fCalls, "clWaitFor");
         Lines expected;
         for (const std::string& event : events)
             expected.push_back("clWaitForEvents([" + event + (GetParam() ? "]) ! -5" : "])"));
@@ -133,9 +128,8 @@ TEST_P(FullLists, FullListsMakeOperationsWaitForEvents)
     constexpr std::size_t kReserved = 100; // the initial capacity of a list
     const auto* leaving = startWithBuffer(1, 3);
     create();
-    evaluate(); // event#1, event#2
-    AutoCLObject<cl_event> last;
-    last.adopt(makeEvent()); // event#3
+    evaluate();                                      // event#1, event#2
+    const AutoCLObject<cl_event> last = makeEvent(); // event#3
     const cl_event reported = last.get();
     const auto report = [&] { manager().EnqueueReleaseBatchedSharedCLBuffer(1, &reported); };
     for (std::size_t i = 0; i < kReserved; ++i)
@@ -162,9 +156,8 @@ TEST_P(FullLists, FullListsMakeOperationsWaitForEvents)
     expectWaits(waits, [&] { manager().PostEvaluate(kId); });
     EXPECT_THAT(fCalls,
                 ::testing::Contains("clEnqueueReleaseGLObjects(queue#1, [mem#2], []) = event#107"));
-    EXPECT_EQ(std::ranges::count(fCalls, "clReleaseEvent(event#3)"), std::ptrdiff_t{kReserved});
-    const auto isWait = [](const std::string& line) { return line.starts_with("glWaitSync"); };
-    EXPECT_EQ(std::ranges::count_if(fCalls, isWait), std::ptrdiff_t{kReserved} + 1);
+    EXPECT_EQ(countOf(fCalls, "clReleaseEvent(event#3)"), kReserved);
+    EXPECT_EQ(countOf(fCalls, "glWaitSync"), kReserved + 1);
     EXPECT_FALSE(unbatched[0]->fInBatch) << "there was no memory for the batch";
     evaluate();
     EXPECT_TRUE(unbatched[0]->fInBatch && unbatched[1]->fInBatch);

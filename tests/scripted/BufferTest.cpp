@@ -1,7 +1,6 @@
 // The growable device buffer: the calls of its operations, its limits, its copies.
 #include "ScriptedTest.h"
 #include "buffers/TopenCLBuffer.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <array>
 #include <utility>
@@ -23,14 +22,8 @@ protected:
         ASSERT_TRUE(start());
         runtime().setHostMemory(fBytes.data(), fBytes.size());
     }
-    void TearDown() override
-    {
-        ScriptedTest::TearDown();
-        EXPECT_EQ(deviceMemory(), 0U);
-    }
-    static cl_context context() { return TopenCLInfo::theOne().openCLContext(); }
     // Differs from the queue that the library uses for its own commands.
-    static cl_command_queue queue() { return TopenCLInfo::theOne().secondaryOpenCLCommandQueue(); }
+    static cl_command_queue queue() { return info().secondaryOpenCLCommandQueue(); }
     int upload(TopenCLBuffer& buffer, std::size_t offset, std::size_t size, cl_uint waitCount = 0,
                const cl_event* waitList = nullptr)
     {

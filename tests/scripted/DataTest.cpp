@@ -33,9 +33,7 @@ protected:
     // A data buffer with memory of its own.
     static TopenCLDataBuffer makeData(const Descriptor& descriptor = describe(4))
     {
-        AutoCLObject<cl_mem> mem;
-        mem.adopt(makeMem());
-        return {descriptor, mem, {}};
+        return {descriptor, makeMem(), {}};
     }
 };
 
@@ -79,12 +77,9 @@ TEST_F(DataTest, PermissionsAreStoredUnchangedAndFoldedForOutputs)
 // NOLINTBEGIN(bugprone-use-after-move,clang-analyzer-cplusplus.Move)
 TEST_F(DataTest, CopiesAndMovesKeepEventAndDescriptor)
 {
-    AutoCLObject<cl_mem> mem;
-    AutoCLObject<cl_event> event; // event#1
-    AutoCLObject<cl_event> other;
-    event.adopt(makeEvent());
-    other.adopt(makeEvent());
-    mem.adopt(makeMem()); // mem#3, after those of the events
+    const AutoCLObject<cl_event> event = makeEvent(); // event#1
+    const AutoCLObject<cl_event> other = makeEvent();
+    const AutoCLObject<cl_mem> mem = makeMem(); // mem#3, after those of the events
     const TopenCLDataBuffer source({kPlug, kName, Descriptor::kReadOnly, 12, 10, 120}, mem, event);
     const auto expectSource = [&](const TopenCLDataBuffer& data) {
         EXPECT_EQ(data.buffer().get(), mem.get());
@@ -225,7 +220,7 @@ TEST_F(DataTest, OutputReusesWritableInputElsePoolMemory)
 {
     TopenCLDataBufferPool pool;
     TopenCLDataBuffer input = makeData({kPlug, kName, Descriptor::kReadWrite, 12, 10, 130});
-    input.bufferReadyEvent().adopt(makeEvent());
+    input.bufferReadyEvent() = makeEvent();
     const TopenCLDataBuffer inPlace = pool.createOutputBuffer(input, kOtherPlug);
     EXPECT_EQ(numbersOf(inPlace.descriptor()), (std::array{12U, 10U, 130U}));
     EXPECT_TRUE(inPlace.descriptor().name() == kName && !inPlace.descriptor().isReadOnly());

@@ -9,6 +9,7 @@
 #include <cwchar>
 #include <map>
 #include <thread>
+#include <utility>
 
 #include <CL/cl_gl.h>
 
@@ -16,18 +17,13 @@ using namespace scripted;
 
 namespace {
 
-struct NamedStatus {
-    int code;
-    const char* name;
-};
-
 // The codes are those of the OpenCL headers.
 #define STATUS(name)                                                                               \
     {                                                                                              \
         name, #name                                                                                \
     }
 // clang-format off
-const NamedStatus kStatuses[] = {
+const std::pair<int, const char*> kStatuses[] = {
     STATUS(CL_SUCCESS), STATUS(CL_DEVICE_NOT_FOUND), STATUS(CL_DEVICE_NOT_AVAILABLE),
     STATUS(CL_COMPILER_NOT_AVAILABLE), STATUS(CL_MEM_OBJECT_ALLOCATION_FAILURE),
     STATUS(CL_OUT_OF_RESOURCES), STATUS(CL_OUT_OF_HOST_MEMORY),
@@ -63,8 +59,8 @@ TEST(ErrorNames, MatchHeadersElseNumber)
     std::map<int, std::string> expected{{INT_MIN, "-2147483648"}, {INT_MAX, "2147483647"}};
     for (int code = -1200; code <= 100; ++code)
         expected[code] = std::to_string(code);
-    for (const NamedStatus& status : kStatuses)
-        expected[status.code] = status.name;
+    for (const auto& [code, name] : kStatuses)
+        expected[code] = name;
     for (const auto& [code, name] : expected)
         EXPECT_EQ(CLErrorCodeStr(code), name);
 
@@ -90,13 +86,8 @@ TEST_F(WarningTest, WarningIsWholeOrEmptyWhenFormattingFails)
 }
 
 std::string lastText;
-
-void keepText(const char* text)
-{
-    lastText = text;
-}
-
-void dropText(const char*) {}
+const CLWarningSink keepText = [](const char* text) { lastText = text; };
+const CLWarningSink dropText = [](const char*) {};
 
 // Without the fixture, which replaces the built-in sink.
 TEST(WarningSink, BuiltInSinkWritesNothingAndNullRestoresIt)

@@ -29,7 +29,7 @@ public:
     void makeBuffer(std::size_t bytes, bool pending = false)
     {
         buffer.reset();
-        buffer.emplace(info().openCLContext(), CL_MEM_ALLOC_HOST_PTR | CL_MEM_HOST_WRITE_ONLY);
+        buffer.emplace(context(), CL_MEM_ALLOC_HOST_PTR | CL_MEM_HOST_WRITE_ONLY);
         buffer->ensureBufferCapacity(bytes);
         if (pending)
             upload(0, 1);
@@ -76,7 +76,7 @@ public:
     {
         kernel.reset();
         store = std::make_unique<TopenCLKernelStore>();
-        store->initialize(info().openCLContext(), info().openCLDevice(), kIntelProvider);
+        store->initialize(context(), info().openCLDevice(), kIntelProvider);
     }
     int getKernel()
     {
@@ -136,8 +136,6 @@ public:
     std::vector<const TopenCLSharedBuffer*> shared;
 
 private:
-    static TopenCLInfo& info() { return TopenCLInfo::theOne(); }
-    static cl_command_queue queue() { return info().openCLCommandQueue(); }
     static TopenCLDataBufferDescriptor describe(unsigned bytes)
     {
         using Descriptor = TopenCLDataBufferDescriptor;

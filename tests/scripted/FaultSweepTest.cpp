@@ -25,22 +25,6 @@ struct Row : Named {
     bool fresh = false;
 };
 
-std::string functionOf(const std::string& line)
-{
-    return line.substr(0, line.find('('));
-}
-
-// The calls that can fail, by name.
-Lines functionsOf(const Lines& lines)
-{
-    Lines functions;
-    for (const std::string& line : lines) {
-        if (line.starts_with("cl") || line.starts_with("gl"))
-            functions.push_back(functionOf(line));
-    }
-    return functions;
-}
-
 class FaultSweep : public ScriptedTest, public ::testing::WithParamInterface<Row> {
 protected:
     void SetUp() override { startInModes(2, 3); }

@@ -2,11 +2,11 @@
 #include "ScriptedTest.h"
 #include "host/TstringArray.h"
 #include "kernels/TopenCLKernelStore.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <filesystem>
 #include <fstream>
 #include <memory>
+#include <tuple>
 
 using namespace scripted;
 
@@ -33,9 +33,8 @@ protected:
     }
     void makeStore(OpenCLProvider provider)
     {
-        const TopenCLInfo& info = TopenCLInfo::theOne();
         fStore = std::make_unique<TopenCLKernelStore>();
-        fStore->initialize(info.openCLContext(), info.openCLDevice(), provider);
+        fStore->initialize(context(), info().openCLDevice(), provider);
     }
     void TearDown() override
     {
@@ -85,24 +84,21 @@ TEST_F(KernelStoreTest, KernelReturnedTwiceIsFreedTwice)
 TEST_F(KernelStoreTest, CacheKeyIsNameAndOptionsNotText)
 {
     constexpr const char* kLong = "-DA -D THE_SAME_ENDING";
-    const struct {
-        const char* name;
-        const char* flags;
-        std::vector<const char*> directories; // options, too
-        std::size_t builds;
-    } rows[] = {{"name", "-DA", {}, 1},
-                {"name", "-DB", {}, 1},
-                {"name", "-DA", {"a"}, 1},
-                {"name", "-DA", {"b"}, 1},
-                {"name", "-DA", {"a", "b"}, 1},
-                {"name", "-DA", {"b", "a"}, 1},
-                {"name", "-DA", {"a", "c"}, 1},
-                {"name", "-DA -I a", {}, 0}, // the same options
-                {"name", "", {}, 1},
-                {"name", nullptr, {}, 1},
-                {"a/the-same-ending.cl", kLong, {}, 1},
-                {"a/the-same-ending.cl", "-DB -D THE_SAME_ENDING", {}, 1},
-                {"b/the-same-ending.cl", kLong, {}, 1}};
+    // Directories are options, too.
+    const std::tuple<const char*, const char*, std::vector<const char*>, std::size_t> rows[] = {
+        {"name", "-DA", {}, 1},
+        {"name", "-DB", {}, 1},
+        {"name", "-DA", {"a"}, 1},
+        {"name", "-DA", {"b"}, 1},
+        {"name", "-DA", {"a", "b"}, 1},
+        {"name", "-DA", {"b", "a"}, 1},
+        {"name", "-DA", {"a", "c"}, 1},
+        {"name", "-DA -I a", {}, 0}, // the same options
+        {"name", "", {}, 1},
+        {"name", nullptr, {}, 1},
+        {"a/the-same-ending.cl", kLong, {}, 1},
+        {"a/the-same-ending.cl", "-DB -D THE_SAME_ENDING", {}, 1},
+        {"b/the-same-ending.cl", kLong, {}, 1}};
     for (const auto& [name, flags, list, expected] : rows) {
         const TstringArray directories = arrayOf(list);
         const auto kernel = fStore->getKernelFromString(kSource, name, flags, "skin", &directories);
@@ -116,7 +112,7 @@ TEST_F(KernelStoreTest, CacheKeyIsNameAndOptionsNotText)
     EXPECT_NE(fStore->getKernel("name", "-DA -I b", "wave", nullptr).get(), nullptr);
     EXPECT_EQ(builds(), 0U);
     // Without double precision the options differ, and so does the key.
-    TopenCLInfo::theOne().setAllowDoublePrecisionSupport(false);
+    info().setAllowDoublePrecisionSupport(false);
     fromText("skin", "-DA", "name");
     EXPECT_EQ(callsOf("clBuildProgram"), Lines{"clBuildProgram(program#13, [device#1], \"-DA\")"});
 }
@@ -237,7 +233,7 @@ TEST_F(KernelStoreTest, BuildWithFailedStatusIsFailure)
 
 TEST_F(KernelStoreTest, InitializeWithoutContextChangesNothing)
 {
-    const cl_device_id device = TopenCLInfo::theOne().openCLDevice();
+    const cl_device_id device = info().openCLDevice();
     fStore->initialize(nullptr, nullptr, kNVIDIAProvider);
     fromText("skin", "-DA");
     EXPECT_EQ(callsOf("clBuildProgram"),
@@ -251,10 +247,9 @@ TEST_F(KernelStoreTest, InitializeWithoutContextChangesNothing)
 
 TEST_F(KernelStoreTest, CacheKeyOmitsVendorFlag)
 {
-    const TopenCLInfo& info = TopenCLInfo::theOne();
     const TstringArray folders = arrayOf({"a"});
     fromText("skin", " -I a");
-    fStore->initialize(info.openCLContext(), info.openCLDevice(), kNVIDIAProvider);
+    fStore->initialize(context(), info().openCLDevice(), kNVIDIAProvider);
     const auto kernel =
         fStore->getKernelFromString(kSource, "text", "", "skin", &folders); // the same options
     EXPECT_EQ(builds(), 1U);
@@ -290,32 +285,27 @@ TEST_F(KernelStoreTest, SourceIsReadUnchangedAfterPreamble)
 
 TEST_F(KernelStoreTest, ResourceDirectoryIsQueriedOnce)
 {
-    TopenCLInfo& info = TopenCLInfo::theOne();
-    EXPECT_STREQ(info.getAbsolutePathToResources().asChar(), "scripted/resources");
-    EXPECT_EQ(&info.getAbsolutePathToResources(), &info.getAbsolutePathToResources());
+    EXPECT_STREQ(info().getAbsolutePathToResources().asChar(), "scripted/resources");
+    EXPECT_EQ(&info().getAbsolutePathToResources(), &info().getAbsolutePathToResources());
     EXPECT_EQ(calls(), Lines{"getResourcesLocation()"});
 }
 
 TEST_F(KernelStoreTest, BuildOptionsArePassedExactly)
 {
     const std::string standard = "-cl-fast-relaxed-math -cl-mad-enable -cl-no-signed-zeros -Werror";
-    const struct {
-        OpenCLProvider provider;
-        const char* flags;
-        std::vector<const char*> directories;
-        std::string options;
-    } rows[] = {{kIntelProvider, nullptr, {}, standard},
-                {kIntelProvider, "-DFOO", {"inc"}, "-DFOO -I inc"},
-                {kIntelProvider, "", {" ab ", " a b "}, " -I ab -I \"a b\""},
-                {kIntelProvider, "", {"\ta\tb\t"}, " -I \ta\tb\t"},
-                {kIntelProvider, "", {"a \"b\"", "\"", "", "  "}, " -I \"a \"b\"\" -I \" -I  -I "},
-                {kNVIDIAProvider, nullptr, {" C:/My Res "}, standard + " -I \"C:/My Res\""},
-                {kAMDProvider, "", {}, ""},
-                {kAppleProvider, "", {}, ""},
-                {kUnknownProvider, "", {}, ""}};
+    const std::tuple<OpenCLProvider, const char*, std::vector<const char*>, std::string> rows[] = {
+        {kIntelProvider, nullptr, {}, standard},
+        {kIntelProvider, "-DFOO", {"inc"}, "-DFOO -I inc"},
+        {kIntelProvider, "", {" ab ", " a b "}, " -I ab -I \"a b\""},
+        {kIntelProvider, "", {"\ta\tb\t"}, " -I \ta\tb\t"},
+        {kIntelProvider, "", {"a \"b\"", "\"", "", "  "}, " -I \"a \"b\"\" -I \" -I  -I "},
+        {kNVIDIAProvider, nullptr, {" C:/My Res "}, standard + " -I \"C:/My Res\""},
+        {kAMDProvider, "", {}, ""},
+        {kAppleProvider, "", {}, ""},
+        {kUnknownProvider, "", {}, ""}};
     for (const auto& [provider, flags, list, options] : rows) {
         for (const bool doublePrecision : {true, false}) {
-            TopenCLInfo::theOne().setAllowDoublePrecisionSupport(doublePrecision);
+            info().setAllowDoublePrecisionSupport(doublePrecision);
             makeStore(provider);
             const TstringArray directories = arrayOf(list);
             const auto kernel =

@@ -55,8 +55,6 @@ protected:
         const cl_mem mem = buffer->fMem.get();
         return manager().EnqueueReleaseSharedCLBuffer(queue(), 1, &mem, 0, nullptr, event);
     }
-    static cl_context context() { return TopenCLInfo::theOne().openCLContext(); }
-    static cl_command_queue queue() { return TopenCLInfo::theOne().openCLCommandQueue(); }
     TopenCLSharedBufferMgr& manager() { return *fManager; }
 
 private:

@@ -33,14 +33,13 @@ TEST_F(QueueTest, FinishAndFlushSkipNullSecondaryQueue)
 
 TEST_F(StartedTest, CreateOpenCLCommandQueueIsInOrder)
 {
-    TopenCLInfo& info = TopenCLInfo::theOne();
     bool outOfOrder = true;
     runtime().plan({.function = "clCreateCommandQueue", .status = CL_INVALID_VALUE});
     runtime().plan({.function = "clCreateCommandQueue", .nth = 4, .withHandle = true});
-    const cl_command_queue first = info.createOpenCLCommandQueue(&outOfOrder);
-    EXPECT_NE(first, info.createOpenCLCommandQueue(nullptr));
+    const cl_command_queue first = info().createOpenCLCommandQueue(&outOfOrder);
+    EXPECT_NE(first, info().createOpenCLCommandQueue(nullptr));
     EXPECT_FALSE(outOfOrder);
-    EXPECT_EQ(info.createOpenCLCommandQueue(nullptr), nullptr) << "a handle with an error status";
+    EXPECT_EQ(info().createOpenCLCommandQueue(nullptr), nullptr) << "a handle with an error status";
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_OUT_OF_RESOURCES\n"});
     EXPECT_EQ(callsOf("clCreate"),
               (Lines{"clCreateCommandQueue(context#1, device#1, 0) ! -30",
@@ -72,17 +71,16 @@ TEST_P(EventQuery, IsEventCompleteMakesExpectedQueries)
     ASSERT_TRUE(start());
     if (!row.statuses.empty())
         runtime().scriptEventStatuses(row.statuses);
-    const cl_event event = makeEvent();
+    const AutoCLObject<cl_event> event = makeEvent();
     calls();
     if (row.failing != 0)
         runtime().plan({.function = "clGetEventInfo", .nth = row.failing});
 
-    EXPECT_EQ(TopenCLInfo::IsEventComplete(event), row.complete);
+    EXPECT_EQ(TopenCLInfo::IsEventComplete(event.get()), row.complete);
     EXPECT_EQ(calls().size(), row.queries);
     EXPECT_EQ(warnings(), row.failing ? Lines{"OpenCL error: CL_OUT_OF_RESOURCES"} : Lines{});
     EXPECT_TRUE(TopenCLInfo::IsEventComplete(nullptr));
     EXPECT_EQ(calls(), Lines{});
-    ocl.clReleaseEvent(event);
 }
 INSTANTIATE_TEST_SUITE_P(
     Queue, EventQuery,
@@ -122,14 +120,14 @@ TEST_P(WorkGroupSize, IsKernelsOr256AndGlobalIsSmallestMultiple)
              {size * groups - size + 1, size * groups - 1, size * groups}) {
             std::size_t global = 1;
             std::size_t local = 1;
-            EXPECT_EQ(TopenCLInfo::theOne().getWorkGroupSizes(kernel, count, global, local), 0);
+            EXPECT_EQ(info().getWorkGroupSizes(kernel, count, global, local), 0);
             EXPECT_EQ(global, size * groups) << count;
             EXPECT_EQ(local, size);
         }
     }
     std::size_t none = 1;
     std::size_t local = 1;
-    TopenCLInfo::theOne().getWorkGroupSizes(kernel, 0, none, local);
+    info().getWorkGroupSizes(kernel, 0, none, local);
     EXPECT_EQ(none, 0U);
 }
 INSTANTIATE_TEST_SUITE_P(Queue, WorkGroupSize,
@@ -142,13 +140,12 @@ TEST_F(StartedTest, FailedWorkGroupQueryWritesNothing)
 {
     std::size_t global = 3;
     std::size_t local = 4;
-    TopenCLInfo& info = TopenCLInfo::theOne();
-    EXPECT_EQ(info.getWorkGroupSizes(nullptr, 1, global, local), CL_INVALID_KERNEL);
+    EXPECT_EQ(info().getWorkGroupSizes(nullptr, 1, global, local), CL_INVALID_KERNEL);
     Bench bench;
     bench.makeStore();
     ASSERT_TRUE(bench.getKernel());
     runtime().plan({.function = "clGetKernelWorkGroupInfo", .status = CL_INVALID_KERNEL});
-    EXPECT_EQ(info.getWorkGroupSizes(bench.kernel.get(), 1, global, local), CL_INVALID_KERNEL);
+    EXPECT_EQ(info().getWorkGroupSizes(bench.kernel.get(), 1, global, local), CL_INVALID_KERNEL);
     EXPECT_EQ(warnings(), Lines{"OpenCL error: CL_INVALID_KERNEL\n"});
     EXPECT_EQ(global, 3U);
     EXPECT_EQ(local, 4U);
@@ -157,16 +154,16 @@ TEST_F(StartedTest, FailedWorkGroupQueryWritesNothing)
 // The destructor is private to the library, so the copy stays, in static memory.
 TEST_F(StartedTest, CopyOfRuntimeObjectBorrowsSameHandles)
 {
-    TopenCLInfo& info = TopenCLInfo::theOne();
     alignas(TopenCLInfo) static std::byte memory[sizeof(TopenCLInfo)];
-    auto* copy = new (memory) TopenCLInfo(info);
-    EXPECT_EQ(copy->openCLContext(), info.openCLContext());
-    EXPECT_EQ(&copy->kernelStore(), &info.kernelStore());
-    EXPECT_EQ(&TopenCLInfo::theOne(), &info);
-    EXPECT_TRUE(copy->setUseMinimumBufferSize(!info.useMinimumBufferSize()));
-    EXPECT_NE(copy->useMinimumBufferSize(), info.useMinimumBufferSize());
-    *copy = info;
-    EXPECT_EQ(copy->useMinimumBufferSize(), info.useMinimumBufferSize());
+    const TopenCLInfo* original = &info();
+    auto* copy = new (memory) TopenCLInfo(info());
+    EXPECT_EQ(copy->openCLContext(), context());
+    EXPECT_EQ(&copy->kernelStore(), &info().kernelStore());
+    EXPECT_EQ(&info(), original);
+    EXPECT_TRUE(copy->setUseMinimumBufferSize(!info().useMinimumBufferSize()));
+    EXPECT_NE(copy->useMinimumBufferSize(), info().useMinimumBufferSize());
+    *copy = info();
+    EXPECT_EQ(copy->useMinimumBufferSize(), info().useMinimumBufferSize());
     EXPECT_EQ(calls(), Lines{});
 }
 

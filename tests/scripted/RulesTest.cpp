@@ -2,7 +2,7 @@
 #include "runtime/DriverVersion.h"
 #include "runtime/SyncModes.h"
 
-#include <stdexcept>
+#include <exception>
 #include <string>
 #include <vector>
 

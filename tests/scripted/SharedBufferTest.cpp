@@ -1,7 +1,6 @@
 // The shared-buffer manager: the exact calls of an evaluation, failures, the host's window,
 // time-outs, profiling, missing functions, copies.
 #include "ManagerTest.h"
-#include "host/GLFunctionTable.h"
 #include "interop/ProfilerScope.h"
 
 #include <cstddef>
@@ -29,8 +28,7 @@ TEST_F(SharedBufferTest, EvaluationAcquiresOnceAndReleasesOnceAfterReportedEvent
         retains.push_back("clRetainMemObject(" + runtime().name(one->fMem.get()) + ')');
         list += (list.empty() ? "" : ", ") + runtime().name(one->fMem.get());
     }
-    AutoCLObject<cl_event> reported; // event#1
-    reported.adopt(makeEvent());
+    const AutoCLObject<cl_event> reported = makeEvent(); // event#1
     manager().RenderingComplete();
     calls();
     manager().PreEvaluate(kId);
@@ -251,7 +249,7 @@ TEST_F(SharedBufferTest, UnbatchedCommandsPassWholeListsAndRejectEmptyBuffers)
     EXPECT_EQ(calls(), Lines{});
     const TopenCLSharedBuffer* buffers[] = {create(), create()};
     const cl_mem mems[] = {buffers[0]->fMem.get(), buffers[1]->fMem.get()};
-    const cl_command_queue queue = TopenCLInfo::theOne().secondaryOpenCLCommandQueue();
+    const cl_command_queue queue = info().secondaryOpenCLCommandQueue();
     AutoCLObject<cl_event> events[2];
     for (int i = 0; i < 2; ++i)
         manager().EnqueueAcquireSharedCLBuffer(queue, buffers[i], events[i].receive());
@@ -318,7 +316,7 @@ TEST_F(SharedBufferTest, ReportedNullEventIsPassedToRelease)
 TEST_F(SharedBufferTest, FenceWaitRepeatsOneSecondInHostContext)
 {
     const auto* buffer = startWithBuffer(2, 1);
-    const ResourceWindow window;
+    const auto window = makeResourceWindow();
     for (const unsigned last : {0x911AU, 0x911CU, 0x911DU}) { // signalled, satisfied, failed
         manager().RenderingComplete();
         runtime().scriptClientWaits({0x911B, 0x911B, last});
@@ -335,7 +333,7 @@ TEST_F(SharedBufferTest, FenceWaitRepeatsOneSecondInHostContext)
 TEST_F(SharedBufferTest, PreEvaluateOpensNothingWhenFenceWaitThrows)
 {
     startWithBuffer(2, 1);
-    const ResourceWindow window;
+    const auto window = makeResourceWindow();
     for (const bool hostCloses : {false, true}) {
         calls();
         host().makeCurrentThrows = true;
@@ -379,7 +377,7 @@ class CopyTest : public SharedBufferTest, public ::testing::WithParamInterface<b
 protected:
     std::unique_ptr<TopenCLSharedBufferMgr> copied()
     {
-        removeEnvironment("VYRA_OPENCL_FORCE_THREADING");
+        setEnvironment("VYRA_OPENCL_FORCE_THREADING", nullptr);
         if (GetParam())
             return std::make_unique<TopenCLSharedBufferMgr>(manager());
         auto target = std::make_unique<TopenCLSharedBufferMgr>();
@@ -406,7 +404,7 @@ TEST_P(CopyTest, CopyContinuesOriginalsStateWithOwnReferences)
     EXPECT_EQ(calls(), Lines{}) << "its evaluation is open already";
     TopenCLSharedBuffer batched; // as in the destroyed original
     batched.fInBatch = true;
-    *batched.fMem.receive() = makeMem();
+    batched.fMem = makeMem();
     AutoCLObject<cl_event> acquired;
     copy->EnqueueAcquireSharedCLBuffer(queue(), &batched, acquired.receive());
     EXPECT_EQ(runtime().name(acquired.get()), "event#3");
@@ -441,8 +439,7 @@ INSTANTIATE_TEST_SUITE_P(SharedBuffers, CopyTest, ::testing::Bool(),
 TEST_F(SharedBufferTest, AssignmentReleasesTargetsEvents)
 {
     startIn(1, 1);
-    AutoCLObject<cl_event> event;
-    event.adopt(makeEvent());
+    const AutoCLObject<cl_event> event = makeEvent();
     const cl_event reported = event.get();
     manager().EnqueueReleaseBatchedSharedCLBuffer(1, &reported);
     TopenCLSharedBufferMgr& itself = manager();

@@ -110,16 +110,13 @@ namespace {
 // Returns the entries of the interop function table that are set; those of a pair are set together.
 std::string interopTable()
 {
-    std::string names;
-    const auto add = [&names](bool set, const char* name) {
-        if (set)
-            names += (names.empty() ? "" : " ") + std::string(name);
-    };
-    add(sfGetDeviceIDsFromD3D11, "devices");
-    add(sfCreateSharedCLBuffer, "create");
-    add(sfPendingEnqueueAcquireSharedObjects && sfPendingEnqueueReleaseSharedObjects, "pending");
-    add(sfEnqueueAcquireSharedObjects && sfEnqueueReleaseSharedObjects, "final");
-    return names;
+    std::string names = sfGetDeviceIDsFromD3D11 ? " devices" : "";
+    names += sfCreateSharedCLBuffer ? " create" : "";
+    if (sfPendingEnqueueAcquireSharedObjects && sfPendingEnqueueReleaseSharedObjects)
+        names += " pending";
+    if (sfEnqueueAcquireSharedObjects && sfEnqueueReleaseSharedObjects)
+        names += " final";
+    return names.substr(names.empty() ? 0 : 1);
 }
 
 } // namespace
@@ -137,12 +134,9 @@ TEST_P(StartUpRows, InitializePrintsReturnsAndSetsExpectedState)
         expected.prepareHost();
 
     EXPECT_EQ(startWatched(), expected.valid);
-    Lines lookUps = calls();
+    const Lines lookUps = calls();
     EXPECT_EQ(lookUps.back() == "initializeOffset()", expected.computeUnits != 0);
-    std::erase_if(lookUps, [](const std::string& line) {
-        return !line.starts_with("VyraGetEnv") && !line.starts_with("asInt32");
-    });
-    EXPECT_EQ(lookUps, expected.lookUps);
+    EXPECT_EQ(linesOf(lookUps, "VyraGetEnv", "asInt32"), expected.lookUps);
     EXPECT_EQ(interopTable(), expected.table);
 
     EXPECT_EQ(printedError, expected.error ? *expected.error : expected.wholeText());
@@ -150,20 +144,19 @@ TEST_P(StartUpRows, InitializePrintsReturnsAndSetsExpectedState)
     EXPECT_EQ(warnings(), expected.warnings);
     EXPECT_EQ(runtime().takeMisuse(), expected.misuse);
     EXPECT_EQ(leftByStart, expected.left);
-    const TopenCLInfo& info = TopenCLInfo::theOne();
     EXPECT_EQ(TopenCLInfo::isValid(), expected.valid);
-    EXPECT_EQ(info.openCLProvider(), expected.provider);
-    EXPECT_EQ(info.computeUnitCount(), expected.computeUnits);
-    EXPECT_EQ(info.minimumBufferSize(), expected.minimumBufferSize);
-    EXPECT_EQ(info.supportsAsyncReadback(), expected.asyncReadback);
-    EXPECT_EQ(info.platformSupportsDoublePrecision(), expected.doublePrecision);
-    EXPECT_EQ(runtime().name(info.openCLDevice()), expected.device);
-    EXPECT_EQ(info.graphicsToCLSyncMode(), expected.modes.first);
-    EXPECT_EQ(info.clToGraphicsSyncMode(), expected.modes.second);
-    EXPECT_EQ(info.useGLFinish(), expected.modes.first == 3 && !expected.arguments.usingDX);
-    EXPECT_EQ(info.usingGLCoreProfile(), expected.arguments.usingGLCoreProfile);
-    EXPECT_EQ(info.useCLFinish(), expected.modes.second == 4);
-    EXPECT_EQ(info.supportsThreadedSharing(), expected.threadedSharing);
+    EXPECT_EQ(info().openCLProvider(), expected.provider);
+    EXPECT_EQ(info().computeUnitCount(), expected.computeUnits);
+    EXPECT_EQ(info().minimumBufferSize(), expected.minimumBufferSize);
+    EXPECT_EQ(info().supportsAsyncReadback(), expected.asyncReadback);
+    EXPECT_EQ(info().platformSupportsDoublePrecision(), expected.doublePrecision);
+    EXPECT_EQ(runtime().name(info().openCLDevice()), expected.device);
+    EXPECT_EQ(info().graphicsToCLSyncMode(), expected.modes.first);
+    EXPECT_EQ(info().clToGraphicsSyncMode(), expected.modes.second);
+    EXPECT_EQ(info().useGLFinish(), expected.modes.first == 3 && !expected.arguments.usingDX);
+    EXPECT_EQ(info().usingGLCoreProfile(), expected.arguments.usingGLCoreProfile);
+    EXPECT_EQ(info().useCLFinish(), expected.modes.second == 4);
+    EXPECT_EQ(info().supportsThreadedSharing(), expected.threadedSharing);
 }
 
 } // namespace scripted

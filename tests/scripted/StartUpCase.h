@@ -2,11 +2,9 @@
 #pragma once
 
 #include "ScriptedTest.h"
-#include "runtime/TopenCLInfo.h"
 
 #include <functional>
 #include <optional>
-#include <ostream>
 #include <utility>
 
 namespace scripted {

@@ -169,9 +169,8 @@ TEST_F(DeviceStartUpOnce, StartUpWithoutQueueContinues)
     EXPECT_FALSE(startWatched());
     EXPECT_EQ(warnings(), Lines{kOutOfResources});
     EXPECT_EQ(calls().back(), "initializeOffset()");
-    TopenCLInfo& info = TopenCLInfo::theOne();
-    EXPECT_EQ(info.computeUnitCount(), 8U);
-    EXPECT_TRUE(info.kernelStore().getKernelFromString("skin", "p", "", "skin", nullptr).get());
+    EXPECT_EQ(info().computeUnitCount(), 8U);
+    EXPECT_TRUE(info().kernelStore().getKernelFromString("skin", "p", "", "skin", nullptr).get());
     EXPECT_THAT(callsOf("clBuildProgram"),
                 ::testing::ElementsAre(::testing::HasSubstr("-cl-nv-verbose")));
     expectLeft({"program#1 x1", "kernel#1 x1"});
@@ -183,7 +182,7 @@ TEST_F(DeviceStartUpOnce, StartUpWithoutContextCreatesNoQueue)
     EXPECT_FALSE(start());
     EXPECT_EQ(warnings(), Lines{kOutOfResources});
     bool outOfOrder = true;
-    EXPECT_EQ(TopenCLInfo::theOne().createOpenCLCommandQueue(&outOfOrder), nullptr);
+    EXPECT_EQ(info().createOpenCLCommandQueue(&outOfOrder), nullptr);
     EXPECT_FALSE(outOfOrder);
     EXPECT_EQ(calls(), Lines{});
 }
@@ -193,9 +192,9 @@ TEST_F(DeviceStartUpOnce, SupportsThreadedSharingReadsVariableOnce)
     setEnvironment("VYRA_OPENCL_PLATFORM", "NVIDIA Corporation");
     machine.platforms[0].vendor = "NVIDIA Corporation";
     ASSERT_TRUE(start());
-    EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
+    EXPECT_FALSE(info().supportsThreadedSharing());
     setEnvironment("VYRA_OPENCL_FORCE_THREADING", "1");
-    EXPECT_FALSE(TopenCLInfo::theOne().supportsThreadedSharing());
+    EXPECT_FALSE(info().supportsThreadedSharing());
     EXPECT_EQ(calls(), Lines{kForceThreading});
 }
 

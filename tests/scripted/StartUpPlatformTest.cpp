@@ -112,12 +112,12 @@ TEST_P(StartUpAgain, InitializeAgainChangesAndPrintsNothing)
     if (disabled)
         setEnvironment("VYRA_DISABLE_OPENCL", "0");
     EXPECT_EQ(start(), !disabled);
-    removeEnvironment("VYRA_DISABLE_OPENCL");
+    setEnvironment("VYRA_DISABLE_OPENCL", nullptr);
     testing::internal::CaptureStderr();
     EXPECT_EQ(TopenCLInfo::initialize(nullptr, nullptr, nullptr, true, false, 0x8086), !disabled);
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
     EXPECT_EQ(calls(), Lines{});
-    EXPECT_FALSE(TopenCLInfo::theOne().usingDX());
+    EXPECT_FALSE(info().usingDX());
 }
 INSTANTIATE_TEST_SUITE_P(StartUp, StartUpAgain, ::testing::Bool());
 
@@ -134,46 +134,44 @@ TEST_F(StartUpOnce, OptionSettersReturnWhetherValueChanged)
 {
     machine.platforms[0].devices[0].doublePrecision = 0;
     ASSERT_TRUE(start());
-    TopenCLInfo& info = TopenCLInfo::theOne();
 
-    EXPECT_FALSE(info.setMinimumBufferSize(-1)); // it is the default already
-    EXPECT_TRUE(info.setMinimumBufferSize(7));
-    EXPECT_EQ(info.minimumBufferSize(), 7);
-    EXPECT_TRUE(info.setUseMinimumBufferSize(false));
-    EXPECT_FALSE(info.setUseMinimumBufferSize(false));
-    EXPECT_EQ(info.minimumBufferSize(), 0);
-    EXPECT_TRUE(info.setUseMinimumBufferSize(true));
-    EXPECT_EQ(info.minimumBufferSize(), 7);
+    EXPECT_FALSE(info().setMinimumBufferSize(-1)); // it is the default already
+    EXPECT_TRUE(info().setMinimumBufferSize(7));
+    EXPECT_EQ(info().minimumBufferSize(), 7);
+    EXPECT_TRUE(info().setUseMinimumBufferSize(false));
+    EXPECT_FALSE(info().setUseMinimumBufferSize(false));
+    EXPECT_EQ(info().minimumBufferSize(), 0);
+    EXPECT_TRUE(info().setUseMinimumBufferSize(true));
+    EXPECT_EQ(info().minimumBufferSize(), 7);
 
     setEnvironment("VYRA_OPENCL_DEFORMER_MIN_VERTS", "-5");
     testing::internal::CaptureStderr();
-    EXPECT_TRUE(info.setMinimumBufferSize(-1));
-    EXPECT_FALSE(info.setMinimumBufferSize(-1));
-    EXPECT_FALSE(info.setMinimumBufferSize(0)) << "0 does not select the default";
+    EXPECT_TRUE(info().setMinimumBufferSize(-1));
+    EXPECT_FALSE(info().setMinimumBufferSize(-1));
+    EXPECT_FALSE(info().setMinimumBufferSize(0)) << "0 does not select the default";
     const std::string line =
         "OpenCL evaluator detected VYRA_OPENCL_DEFORMER_MIN_VERTS defined to 0.\n";
     EXPECT_EQ(testing::internal::GetCapturedStderr(), line + line);
 
-    EXPECT_TRUE(info.usingGPU());
-    EXPECT_FALSE(info.usingOutOfOrderExecution());
-    EXPECT_TRUE(info.setAllowDoublePrecisionSupport(true)); // becomes false: no double precision
-    EXPECT_FALSE(info.allowDoublePrecisionSupport());
-    EXPECT_FALSE(info.setAllowDoublePrecisionSupport(true));
+    EXPECT_TRUE(info().usingGPU());
+    EXPECT_FALSE(info().usingOutOfOrderExecution());
+    EXPECT_TRUE(info().setAllowDoublePrecisionSupport(true)); // becomes false: no double precision
+    EXPECT_FALSE(info().allowDoublePrecisionSupport());
+    EXPECT_FALSE(info().setAllowDoublePrecisionSupport(true));
 }
 
 TEST_F(StartedTest, CleanUpReleasesKernelStoreOnly)
 {
-    TopenCLInfo& info = TopenCLInfo::theOne();
     const auto kernel =
-        info.kernelStore().getKernelFromString("skin", "program", "", "skin", nullptr);
+        info().kernelStore().getKernelFromString("skin", "program", "", "skin", nullptr);
     calls();
-    (info.*memberOf(CleanUp()))();
-    (info.*memberOf(CleanUp()))();
+    (info().*memberOf(CleanUp()))();
+    (info().*memberOf(CleanUp()))();
     EXPECT_EQ(calls(), (Lines{"clReleaseKernel(kernel#1)", "clReleaseProgram(program#1)"}));
-    EXPECT_EQ(info.openCLContext(), nullptr);
-    EXPECT_EQ(info.openCLCommandQueue(), nullptr);
-    EXPECT_EQ(info.secondaryOpenCLCommandQueue(), nullptr);
-    EXPECT_EQ(runtime().name(info.openCLDevice()), "device#1");
+    EXPECT_EQ(context(), nullptr);
+    EXPECT_EQ(info().openCLCommandQueue(), nullptr);
+    EXPECT_EQ(info().secondaryOpenCLCommandQueue(), nullptr);
+    EXPECT_EQ(runtime().name(info().openCLDevice()), "device#1");
 }
 
 TEST_F(StartUpOnce, PlatformsAreListedUntilOneListIsComplete)

@@ -14,7 +14,6 @@
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <thread>
 #include <utility>
 
@@ -30,31 +29,15 @@ namespace {
 constexpr int kThreads = 4;
 constexpr int kRounds = 200;
 
-// Runs `body` on all threads, which start together; the argument is the thread's number.
-void onThreads(const std::function<void(int)>& body)
-{
-    std::atomic<int> arrived = 0;
-    std::vector<std::jthread> threads;
-    threads.reserve(kThreads);
-    for (int thread = 0; thread < kThreads; ++thread) {
-        threads.emplace_back([&, thread] {
-            ++arrived;
-            while (arrived < kThreads)
-                std::this_thread::yield();
-            body(thread);
-        });
-    }
-}
-
 using ThreadTest = ManagerTest;
 
 TEST_F(ThreadTest, ConcurrentKernelRequestsAreSerialised)
 {
     startInModes(1, 1);
-    TopenCLKernelStore& store = TopenCLInfo::theOne().kernelStore();
+    TopenCLKernelStore& store = info().kernelStore();
     const std::string file = testing::TempDir() + "vyra-threads.cl";
     std::ofstream(file) << "skin";
-    onThreads([&](int thread) {
+    onThreads(kThreads, [&](int thread) {
         for (int round = 0; round < kRounds; ++round) {
             const int choice = (thread + round) % 3;
             const char* name = choice == 0 ? "a" : "b";
@@ -75,7 +58,7 @@ TEST_F(ThreadTest, ConcurrentPoolRequestsNeverShareBuffer)
     const TopenCLDataBufferDescriptor descriptor(Tplug(1, 2), TuniqueString("positions"),
                                                  TopenCLDataBufferDescriptor::kReadWrite, 4, 16, 0);
     for (const bool takeBack : {false, true}) {
-        onThreads([&](int) {
+        onThreads(kThreads, [&](int) {
             for (int round = 0; round < kRounds; ++round) {
                 EXPECT_NE(pool.createBuffer(descriptor).buffer().get(), nullptr);
                 if (takeBack)
@@ -91,7 +74,7 @@ TEST_F(ThreadTest, ConcurrentDataMapUseKeepsAllEntries)
 {
     startInModes(1, 1);
     TopenCLData data;
-    onThreads([&data](int thread) {
+    onThreads(kThreads, [&data](int thread) {
         const TuniqueString name("positions");
         for (unsigned round = 0; round < kRounds; ++round) {
             const Tplug own(static_cast<unsigned>(thread), round);
@@ -112,7 +95,7 @@ TEST_F(ThreadTest, ConcurrentlyReportedEventsAreAwaitedOnce)
     for (auto& buffer : unbatched)
         buffer = create();
     AutoCLObject<cl_event> released[kThreads][kRounds];
-    onThreads([&](int thread) {
+    onThreads(kThreads, [&](int thread) {
         for (AutoCLObject<cl_event>& event : released[thread]) {
             AutoCLObject<cl_event> acquired;
             acquire(batched, acquired.receive());
@@ -126,15 +109,14 @@ TEST_F(ThreadTest, ConcurrentlyReportedEventsAreAwaitedOnce)
     manager().PostEvaluate(kId);
     const Lines lines = calls();
     // Plus one: the batch's own acquire, and the batch's release.
-    EXPECT_EQ(std::ranges::count(lines, "clReleaseEvent(event#1)"), kThreads * kRounds + 1);
-    const auto isWait = [](const std::string& line) { return line.starts_with("glWaitSync"); };
-    EXPECT_EQ(std::ranges::count_if(lines, isWait), kThreads * kRounds + 1);
+    EXPECT_EQ(countOf(lines, "clReleaseEvent(event#1)"), std::size_t{kThreads * kRounds + 1});
+    EXPECT_EQ(countOf(lines, "glWaitSync"), std::size_t{kThreads * kRounds + 1});
 }
 
 TEST_F(ThreadTest, ConcurrentCreateAndDestroyKeepBatchConsistent)
 {
     startIn(1, 1);
-    onThreads([this](int thread) {
+    onThreads(kThreads, [this](int thread) {
         for (int round = 0; round < kRounds; ++round) {
             const auto* buffer = create();
             ASSERT_NE(buffer, nullptr);
@@ -156,7 +138,7 @@ TEST_F(ThreadTest, OneThreadWaitsForFenceAndOthersFollow)
         manager().RenderingComplete();
         runtime().scriptClientWaits(std::deque<unsigned>(20, 0x911B)); // a long wait
         calls();
-        onThreads([&](int thread) { acquire(buffers[thread]); });
+        onThreads(kThreads, [&](int thread) { acquire(buffers[thread]); });
         Lines lines = calls();
         std::erase(lines, "resourceWindow()");
         // 21 waits, one deletion, and only then the acquires.
@@ -210,7 +192,7 @@ TEST(ConcurrentEventList, CopiesDuringAppendsGrowToAllEvents)
                     grows = grows && beginsWith(copy, former);
                 }
             });
-            onThreads([&list](int thread) {
+            onThreads(kThreads, [&list](int thread) {
                 for (std::uintptr_t number = 0; number < kEventsEach; ++number)
                     list.append(fakeEvent(static_cast<std::uintptr_t>(thread), number));
             });

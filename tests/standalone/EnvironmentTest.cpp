@@ -33,7 +33,7 @@ TEST(Environment, AsInt32ReadsWholeIntegersOnly)
 
 TEST(Environment, AsInt32ReturnsDefaultForMissingVariable)
 {
-    removeEnvironment(variable);
+    setEnvironment(variable, nullptr);
     EXPECT_EQ(VyraGetEnv(variable), nullptr);
     EXPECT_EQ(TenvironmentVariable(variable).asInt32(defaultValue), defaultValue);
 #ifndef _WIN32 // setting the empty text removes a variable there

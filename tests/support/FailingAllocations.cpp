@@ -4,7 +4,6 @@
 #include "ReplacedOperators.h"
 #include "fake/FakeRuntime.h"
 
-#include <cstdlib>
 #include <new>
 
 namespace scripted {
@@ -34,6 +33,8 @@ bool nextAllocationFails()
 // precedence over TBB's, except on Windows, where the tests of such containers are left out.
 namespace tbb::detail::r1 {
 
+constexpr std::align_val_t kCacheLine{128};
+
 void* allocate_memory(std::size_t size)
 {
     return operator new(size);
@@ -44,17 +45,11 @@ void deallocate_memory(void* memory)
 }
 void* cache_aligned_allocate(std::size_t size)
 {
-    constexpr std::size_t kLine = 128;
-    void* memory = nextAllocationFails()
-                       ? nullptr
-                       : std::aligned_alloc(kLine, (size + kLine - 1) / kLine * kLine);
-    if (!memory)
-        throw std::bad_alloc();
-    return memory;
+    return operator new(size, kCacheLine);
 }
 void cache_aligned_deallocate(void* memory)
 {
-    std::free(memory);
+    operator delete(memory, kCacheLine);
 }
 
 } // namespace tbb::detail::r1

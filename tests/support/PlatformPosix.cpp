@@ -6,12 +6,7 @@
 
 void setEnvironment(const char* name, const char* value)
 {
-    setenv(name, value, 1);
-}
-
-void removeEnvironment(const char* name)
-{
-    unsetenv(name);
+    value ? setenv(name, value, 1) : unsetenv(name);
 }
 
 void* loadLibrary(const char* path)

@@ -6,12 +6,7 @@
 
 void setEnvironment(const char* name, const char* value)
 {
-    _putenv_s(name, value);
-}
-
-void removeEnvironment(const char* name)
-{
-    _putenv_s(name, "");
+    _putenv_s(name, value ? value : "");
 }
 
 void* loadLibrary(const char* path)

@@ -3,35 +3,6 @@
 #include <cstdlib>
 #include <new>
 
-#ifdef _WIN32
-#include <malloc.h>
-#endif
-
-namespace {
-
-// On Windows, free() does not accept aligned memory.
-#ifdef _WIN32
-void* allocateAligned(std::size_t size, std::size_t alignment)
-{
-    return _aligned_malloc(size, alignment);
-}
-void freeAligned(void* memory)
-{
-    _aligned_free(memory);
-}
-#else
-void* allocateAligned(std::size_t size, std::size_t alignment)
-{
-    return std::aligned_alloc(alignment, (size + alignment - 1) / alignment * alignment);
-}
-void freeAligned(void* memory)
-{
-    std::free(memory);
-}
-#endif
-
-} // namespace
-
 void* operator new(std::size_t size, const std::nothrow_t&) noexcept
 {
     return nextAllocationFails() ? nullptr : std::malloc(size ? size : 1);
@@ -39,15 +10,6 @@ void* operator new(std::size_t size, const std::nothrow_t&) noexcept
 void* operator new(std::size_t size)
 {
     void* memory = operator new(size, std::nothrow);
-    if (!memory)
-        throw std::bad_alloc();
-    return memory;
-}
-void* operator new(std::size_t size, std::align_val_t alignment)
-{
-    void* memory = nextAllocationFails()
-                       ? nullptr
-                       : allocateAligned(size, static_cast<std::size_t>(alignment));
     if (!memory)
         throw std::bad_alloc();
     return memory;
@@ -70,14 +32,6 @@ void* operator new[](std::size_t size)
 {
     std::free(memory);
 }
-[[gnu::noinline]] void operator delete(void* memory, std::align_val_t) noexcept
-{
-    freeAligned(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::size_t, std::align_val_t) noexcept
-{
-    freeAligned(memory);
-}
 [[gnu::noinline]] void operator delete[](void* memory) noexcept
 {
     std::free(memory);
@@ -86,3 +40,23 @@ void* operator new[](std::size_t size)
 {
     std::free(memory);
 }
+
+#ifndef _WIN32 // where free() does not accept aligned memory, and where none is tested
+void* operator new(std::size_t size, std::align_val_t alignment)
+{
+    const auto unit = static_cast<std::size_t>(alignment);
+    void* memory =
+        nextAllocationFails() ? nullptr : std::aligned_alloc(unit, (size + unit - 1) / unit * unit);
+    if (!memory)
+        throw std::bad_alloc();
+    return memory;
+}
+[[gnu::noinline]] void operator delete(void* memory, std::align_val_t) noexcept
+{
+    std::free(memory);
+}
+[[gnu::noinline]] void operator delete(void* memory, std::size_t, std::align_val_t) noexcept
+{
+    std::free(memory);
+}
+#endif

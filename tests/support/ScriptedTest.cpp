@@ -1,9 +1,12 @@
 #include "ScriptedTest.h"
 
 #include "diagnostics/CLWarningSink.h"
-#include "runtime/TopenCLInfo.h"
 
+#include <algorithm>
+#include <atomic>
 #include <mutex>
+#include <sstream>
+#include <thread>
 #include <utility>
 
 namespace scripted {
@@ -25,16 +28,43 @@ void* opaque(std::uintptr_t number)
     return reinterpret_cast<void*>(number);
 }
 
-Lines livingObjects()
+} // namespace
+
+void onThreads(int count, const std::function<void(int)>& body)
 {
-    Lines objects = runtime().balance();
-    std::erase_if(objects, [](const std::string& line) {
-        return line.starts_with("platform") || line.starts_with("device");
-    });
-    return objects;
+    std::atomic<int> arrived = 0;
+    std::vector<std::jthread> threads;
+    threads.reserve(static_cast<std::size_t>(count));
+    for (int thread = 0; thread < count; ++thread) {
+        threads.emplace_back([&, thread] {
+            ++arrived;
+            while (arrived < count)
+                std::this_thread::yield();
+            body(thread);
+        });
+    }
 }
 
-} // namespace
+std::string functionOf(const std::string& line)
+{
+    return line.substr(0, line.find('('));
+}
+
+Lines namesAt(const std::string& line, std::size_t begin)
+{
+    std::istringstream text(line.substr(begin + 1, line.find(']', begin) - begin - 1));
+    Lines names;
+    for (std::string name; std::getline(text >> std::ws, name, ',');)
+        names.push_back(name);
+    return names;
+}
+
+Lines functionsOf(const Lines& lines)
+{
+    Lines functions = linesOf(lines, "cl", "gl");
+    std::ranges::transform(functions, functions.begin(), functionOf);
+    return functions;
+}
 
 ScriptedTest::ScriptedTest()
 {
@@ -46,7 +76,8 @@ void ScriptedTest::TearDown()
 {
     Lines expected = leftByStart;
     expected.insert(expected.end(), fExpectedLeft.begin(), fExpectedLeft.end());
-    EXPECT_EQ(livingObjects(), expected) << "objects left alive";
+    EXPECT_EQ(runtime().balance(), expected) << "objects left alive";
+    EXPECT_EQ(deviceMemory(), 0U) << "memory that the library counts";
     EXPECT_EQ(runtime().takeMisuse(), fExpectedMisuse) << "misuse of the runtime";
     EXPECT_EQ(warnings(), Lines{}) << "warnings that the test did not read";
 }
@@ -58,12 +89,11 @@ bool ScriptedTest::startWatched()
         runtime().plan(fault);
     testing::internal::CaptureStderr();
     testing::internal::CaptureStdout();
-    const bool valid = TopenCLInfo::initialize(
-        opaque(arguments.window), opaque(arguments.graphicsContext), nullptr, arguments.usingDX,
-        arguments.usingGLCoreProfile, arguments.vendorId);
+    const bool valid = TopenCLInfo::initialize(opaque(3), opaque(5), nullptr, arguments.usingDX,
+                                               arguments.usingGLCoreProfile, arguments.vendorId);
     printedError = testing::internal::GetCapturedStderr();
     printedOutput = testing::internal::GetCapturedStdout();
-    leftByStart = livingObjects();
+    leftByStart = runtime().balance();
     runtime().clearFaults();
     return valid;
 }

@@ -1,14 +1,17 @@
 // The fixture of all tests on the scripted runtime.
 //
 // Start-up happens once per process, so each test is a process of its own: run them through CTest.
-// When a test ends, every object must be released, every misuse declared and every warning read.
+// When a test ends, every object must be released, no device memory counted, every misuse declared
+// and every warning read.
 #pragma once
 
+#include "Named.h"
 #include "Platform.h"
 #include "fake/FakeHost.h"
 #include "fake/FakeRuntime.h"
+#include "runtime/TopenCLInfo.h"
 
-#include <ostream>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -19,22 +22,47 @@ namespace scripted {
 
 using Lines = std::vector<std::string>;
 
-// The arguments of TopenCLInfo::initialize.
+// The library's runtime object, its context and the queue of its own commands.
+inline TopenCLInfo& info()
+{
+    return TopenCLInfo::theOne();
+}
+inline cl_context context()
+{
+    return info().openCLContext();
+}
+inline cl_command_queue queue()
+{
+    return info().openCLCommandQueue();
+}
+
+// Return the lines that begin with one of the prefixes, and their number.
+template <typename... Prefixes>
+Lines linesOf(Lines lines, const Prefixes&... prefixes)
+{
+    std::erase_if(lines, [&](const auto& line) { return !(line.starts_with(prefixes) || ...); });
+    return lines;
+}
+inline std::size_t countOf(const Lines& lines, const std::string& prefix)
+{
+    return linesOf(lines, prefix).size();
+}
+
+// Runs `body` on this number of threads, which start together; the argument is the thread's number.
+void onThreads(int count, const std::function<void(int)>& body);
+
+// Returns the name of the function that a line of the log calls.
+std::string functionOf(const std::string& line);
+// Returns the names in the brackets that open at `begin`: "[event#1, event#2]".
+Lines namesAt(const std::string& line, std::size_t begin);
+// Returns the names of the OpenCL and OpenGL functions, which can fail, in these lines.
+Lines functionsOf(const Lines& lines);
+
+// The arguments of TopenCLInfo::initialize, besides the window 3 and the graphics context 5.
 struct StartArguments {
-    std::uintptr_t window = 3;
-    std::uintptr_t graphicsContext = 5;
     bool usingDX = false;
     bool usingGLCoreProfile = true;
     unsigned vendorId = 0x8086;
-};
-
-// A row of a table of tests is derived from its name, which is its first initialiser.
-struct Named {
-    // Implicit, so that a row begins with the text.
-    Named(const char* text) : name(text) {}
-
-    const char* name;
-    friend std::ostream& operator<<(std::ostream& out, const Named& row) { return out << row.name; }
 };
 
 class ScriptedTest : public ::testing::Test {
@@ -56,10 +84,7 @@ protected:
     template <typename... Prefixes>
     Lines callsOf(const Prefixes&... prefixes)
     {
-        Lines lines = calls();
-        std::erase_if(lines,
-                      [&](const auto& line) { return !(line.starts_with(prefixes) || ...); });
-        return lines;
+        return linesOf(calls(), prefixes...);
     }
     static Lines warnings();
 
@@ -73,7 +98,7 @@ protected:
     std::vector<Fault> faults; // of start-up
     std::string printedError;  // what start-up wrote to standard error
     std::string printedOutput; // and to standard output
-    Lines leftByStart;         // objects that start-up left, except platforms and devices
+    Lines leftByStart;         // objects that start-up left
 
 private:
     Lines fExpectedMisuse;

@@ -20,12 +20,6 @@ cl_int transfer(const char* function, cl_command_queue queue, cl_mem mem, cl_boo
     return call.command(queue, list, event, call.ok() ? Mems{mem} : Mems{}, blocking != CL_FALSE);
 }
 
-void complete(Entry& call, Object& event)
-{
-    event.statuses = {CL_COMPLETE};
-    call.waitFor(event);
-}
-
 // The address of a mapping: a unique number that is never dereferenced.
 void* mappedAddress(cl_mem mem)
 {
@@ -129,8 +123,11 @@ cl_int clWaitForEvents(cl_uint count, const cl_event* events)
     Entry call("clWaitForEvents", list);
     call.require(count > 0, CL_INVALID_VALUE, "for no event");
     call.requireWaitList(list);
-    for (cl_uint i = 0; call.ok() && i < count; ++i)
-        complete(call, *call.object(Kind::kEvent, events[i]));
+    for (cl_uint i = 0; call.ok() && i < count; ++i) {
+        Object& event = *call.object(Kind::kEvent, events[i]);
+        event.statuses = {CL_COMPLETE};
+        call.waitFor(event);
+    }
     return call.status();
 }
 

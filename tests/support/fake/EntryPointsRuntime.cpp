@@ -68,7 +68,7 @@ cl_int clGetDeviceInfo(cl_device_id device, cl_device_info query, std::size_t ca
     case CL_DEVICE_DOUBLE_FP_CONFIG:
         return number(script.doublePrecision);
     case CL_DEVICE_QUEUE_PROPERTIES:
-        return number(script.queueProperties);
+        return number(cl_command_queue_properties{0});
     case CL_DEVICE_MAX_COMPUTE_UNITS:
         return number(script.computeUnits);
     default:

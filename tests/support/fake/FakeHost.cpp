@@ -11,7 +11,6 @@
 #include <cstdlib>
 #include <new>
 #include <sstream>
-#include <string>
 
 #include <QOpenGLWindow>
 
@@ -32,25 +31,15 @@ class CountingMonitor : public Zyl::Objects::AMemoryMonitor {
 public:
     void AddToDeviceMemory(std::size_t size) override
     {
-        fTotal += size;
+        host().deviceMemory += size;
         log("AddToDeviceMemory(", size, ")");
     }
     void ReduceFromDeviceMemory(std::size_t size) override
     {
-        fTotal -= size;
+        host().deviceMemory -= size;
         log("ReduceFromDeviceMemory(", size, ")");
     }
-    std::size_t total() const { return fTotal; }
-
-private:
-    std::atomic<std::size_t> fTotal = 0;
 };
-
-CountingMonitor& monitor()
-{
-    static CountingMonitor theMonitor;
-    return theMonitor;
-}
 
 } // namespace
 
@@ -58,11 +47,6 @@ HostScript& host()
 {
     static HostScript theHost;
     return theHost;
-}
-
-std::size_t deviceMemory()
-{
-    return monitor().total();
 }
 
 } // namespace scripted
@@ -73,9 +57,10 @@ using scripted::runtime;
 
 Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int adapter)
 {
+    static scripted::CountingMonitor theMonitor;
     if (adapter != 0)
         log("MemoryMonitor of another adapter");
-    return scripted::monitor();
+    return theMonitor;
 }
 
 // The log distinguishes a look-up through the host from getenv.

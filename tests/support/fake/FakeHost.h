@@ -9,6 +9,7 @@
 
 #include "host/GLDisplay.h"
 
+#include <atomic>
 #include <cstddef>
 #include <functional>
 #include <memory>
@@ -23,21 +24,18 @@ struct HostScript {
     QOpenGLWindow* resourceWindow = nullptr;
     std::function<void()> duringFenceWait; // runs once, at the next wait of an OpenGL client
     bool makeCurrentThrows = false;        // std::bad_alloc
+    // The bytes that the memory monitor counts.
+    std::atomic<std::size_t> deviceMemory = 0;
 };
 HostScript& host();
 
-// Provides a resource window while it exists.
-class ResourceWindow {
-public:
-    ResourceWindow();
-    ~ResourceWindow() { host().resourceWindow = nullptr; }
+// Provides a resource window while the result exists.
+[[nodiscard]] std::shared_ptr<void> makeResourceWindow();
 
-private:
-    std::shared_ptr<void> fWindow;
-};
-
-// Returns the bytes that the memory monitor counts.
-std::size_t deviceMemory();
+inline std::size_t deviceMemory()
+{
+    return host().deviceMemory;
+}
 
 // Installs or removes the renderer's OpenGL function table.
 void installFunctionTable(bool syncObjects, bool syncFromCLEvent);

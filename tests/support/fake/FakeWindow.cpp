@@ -9,6 +9,8 @@ namespace scripted {
 namespace {
 
 struct Window {
+    ~Window() { host().resourceWindow = nullptr; }
+
     int argumentCount = 0;
     QGuiApplication application{argumentCount, nullptr};
     QOpenGLWindow window;
@@ -16,12 +18,12 @@ struct Window {
 
 } // namespace
 
-ResourceWindow::ResourceWindow()
+std::shared_ptr<void> makeResourceWindow()
 {
     setEnvironment("QT_QPA_PLATFORM", "offscreen");
     const auto window = std::make_shared<Window>();
     host().resourceWindow = &window->window;
-    fWindow = window;
+    return window;
 }
 
 } // namespace scripted

@@ -4,9 +4,11 @@
 
 namespace scripted {
 
-ResourceWindow::ResourceWindow() : fWindow(std::make_shared<int>())
+std::shared_ptr<void> makeResourceWindow()
 {
-    host().resourceWindow = reinterpret_cast<QOpenGLWindow*>(fWindow.get());
+    static int theWindow;
+    host().resourceWindow = reinterpret_cast<QOpenGLWindow*>(&theWindow);
+    return {&theWindow, [](void*) { host().resourceWindow = nullptr; }};
 }
 
 } // namespace scripted

@@ -62,8 +62,10 @@ std::string Ledger::name(const void* handle) const
 std::vector<std::string> Ledger::balance() const
 {
     std::map<std::pair<Kind, unsigned>, const Object*> sorted;
-    for (const auto& [handle, object] : fAlive)
-        sorted[{object.kind, object.ordinal}] = &object;
+    for (const auto& [handle, object] : fAlive) {
+        if (object.kind != Kind::kPlatform && object.kind != Kind::kDevice)
+            sorted[{object.kind, object.ordinal}] = &object;
+    }
     std::vector<std::string> lines;
     lines.reserve(sorted.size());
     for (const auto& [place, object] : sorted)

@@ -63,7 +63,8 @@ public:
     void forgetDead() { fDead.clear(); }
     // Returns the number of objects of that kind created so far.
     unsigned created(Kind kind) const { return fCreated[static_cast<std::size_t>(kind)]; }
-    // Returns one line per existing object, in order of kind and creation: "mem#2 x1".
+    // Returns one line per existing object, in order of kind and creation: "mem#2 x1". Platforms
+    // and devices, which are never released, are left out.
     std::vector<std::string> balance() const;
     // Returns the names of the acquired memory objects.
     std::vector<std::string> acquired() const;

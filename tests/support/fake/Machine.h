@@ -20,7 +20,6 @@ struct DeviceScript {
     std::string driverVersion = "1.0";
     bool available = true;
     cl_device_fp_config doublePrecision = CL_FP_FMA; // 0: none
-    cl_command_queue_properties queueProperties = 0;
     cl_uint computeUnits = 8;
     std::size_t workGroupSize = 64; // of every kernel
 };
