@@ -1,19 +1,19 @@
 #include "DeformerCases.h"
 
-#include "evaluator/MorphDeformer.h"
-#include "evaluator/SkinDeformer.h"
 #include "evaluator/SmoothDeformer.h"
-#include "evaluator/TwistDeformer.h"
 #include "evaluator/VectorMath.h"
 #include "evaluator/WaveDeformer.h"
 
 #include <cmath>
+#include <utility>
 
 #include <gtest/gtest.h>
 
+using namespace vyra;
+
 namespace {
 
-using namespace vyra;
+using ::skin, ::morph;
 
 // Neither a rotation nor symmetrical, and not at the origin.
 constexpr MatrixRows kSpace{0.5f, 0.1f, 0, 1, 0, 0.7f, 0.2f, -1, 0.3f, 0, 0.9f, 0.5f};
@@ -28,21 +28,13 @@ std::unique_ptr<SkinDeformer> skin(const MeshGeometry& geometry, float side, uns
         indices.push_back({group % 3, 2, 0, 1});
         weights.push_back({0.125f, part, 0.625f - part, 0.25f});
     }
-    auto result = std::make_unique<SkinDeformer>(SkinWeights(indices, weights));
-    result->bones = {{side * 0.8f, -0.6f, 0, 1, side * 0.6f, 0.8f, 0, 2, 0, 0, 1, 3},
-                     {side, 0.5f, 0, 0, 0, 1, 0, -1, 0, 0.2f, 1, 0},
-                     {side * 2, 0, 0, 0, 0, 0.7f, -0.7f, 0, 0, 0.7f, 0.7f, 1}};
+    auto result = skin(SkinWeights(indices, weights),
+                       {{side * 0.8f, -0.6f, 0, 1, side * 0.6f, 0.8f, 0, 2, 0, 0, 1, 3},
+                        {side, 0.5f, 0, 0, 0, 1, 0, -1, 0, 0.2f, 1, 0},
+                        {side * 2, 0, 0, 0, 0, 0.7f, -0.7f, 0, 0, 0.7f, 0.7f, 1}});
     if (side == 0) // all bones move all vertices to one point, which has no normal
         result->bones.assign(3, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3});
     result->precision = precision;
-    return result;
-}
-
-std::unique_ptr<TwistDeformer> twist()
-{
-    auto result = std::make_unique<TwistDeformer>();
-    result->angle = 2;
-    result->space = kSpace;
     return result;
 }
 
@@ -61,7 +53,9 @@ std::unique_ptr<MorphDeformer> morph(const MeshGeometry& geometry, unsigned targ
                                      bool withNormals)
 {
     std::vector<MorphTarget> list(targets);
+    std::vector<float> weights(targets);
     for (unsigned t = 0; t < targets; ++t) {
+        weights[t] = t == 1 ? 0 : 0.1f + 0.05f * static_cast<float>(t);
         for (const Vector3& p : geometry.rest.positions) {
             const float x = t == 1 ? NAN : std::sin(static_cast<float>(t + 1) * p.x);
             list[t].positionDeltas.push_back({x, p.y, p.z * x});
@@ -69,9 +63,7 @@ std::unique_ptr<MorphDeformer> morph(const MeshGeometry& geometry, unsigned targ
                 list[t].normalDeltas.push_back({p.y, x, p.z});
         }
     }
-    auto result = std::make_unique<MorphDeformer>(MorphTargets(list));
-    for (unsigned t = 0; t < targets; ++t)
-        result->weights[t] = t == 1 ? 0 : 0.1f + 0.05f * static_cast<float>(t);
+    auto result = morph(list, std::move(weights));
     result->strength = 0.5f;
     return result;
 }
@@ -94,7 +86,7 @@ const std::vector<DeformerCase>& deformerCases()
         {"skinMirrored", [](Mesh m) { return skin(m, -1); }, true},
         {"skinInDouble", [](Mesh m) { return skin(m, 1, SkinDeformer::kDouble); }, true},
         {"skinCollapsed", [](Mesh m) { return skin(m, 0); }, false},
-        {"twist", [](Mesh) { return twist(); }, true},
+        {"twist", [](Mesh) { return twist(2, kSpace); }, true},
         {"wave", [](Mesh) { return wave(WaveDeformer::kY, 0.05f); }, true},
         {"waveOfCompression", [](Mesh) { return wave(WaveDeformer::kX, 0.05f); }, true},
         {"waveInsideOut", [](Mesh) { return wave(WaveDeformer::kX, 0.3f); }, true},
@@ -104,6 +96,29 @@ const std::vector<DeformerCase>& deformerCases()
         {"smoothOnce", [](Mesh m) { return smooth(m, 1); }, false},
         {"smoothSevenTimes", [](Mesh m) { return smooth(m, 7); }, false}};
     return cases;
+}
+
+std::unique_ptr<SkinDeformer> skin(const SkinWeights& weights, std::vector<MatrixRows> bones)
+{
+    auto result = std::make_unique<SkinDeformer>(weights);
+    result->bones = std::move(bones);
+    return result;
+}
+
+std::unique_ptr<TwistDeformer> twist(float angle, const MatrixRows& space)
+{
+    auto result = std::make_unique<TwistDeformer>();
+    result->angle = angle;
+    result->space = space;
+    return result;
+}
+
+std::unique_ptr<MorphDeformer> morph(const std::vector<MorphTarget>& targets,
+                                     std::vector<float> weights)
+{
+    auto result = std::make_unique<MorphDeformer>(MorphTargets(targets));
+    result->weights = std::move(weights);
+    return result;
 }
 
 void expectNear(const Vector3& actual, const Vector3& expected)

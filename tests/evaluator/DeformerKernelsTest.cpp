@@ -6,7 +6,6 @@
 #include <CL/opencl.hpp>
 
 #include "DeformerCases.h"
-#include "evaluator/SkinDeformer.h"
 #include "evaluator/VectorMath.h"
 
 #include <algorithm>
@@ -171,7 +170,7 @@ protected:
 class DeformerKernel : public DeformerKernels, public testing::WithParamInterface<DeformerCase> {};
 
 INSTANTIATE_TEST_SUITE_P(All, DeformerKernel, testing::ValuesIn(deformerCases()),
-                         [](const auto& row) { return std::string(row.param.name); });
+                         testing::PrintToStringParamName());
 
 TEST_P(DeformerKernel, KernelMatchesCpu)
 {

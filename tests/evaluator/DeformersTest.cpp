@@ -1,10 +1,7 @@
 // The CPU sides of skin, morph, twist and wave against closed forms and finite differences, and the
 // settings that deformers reject.
 #include "DeformerCases.h"
-#include "evaluator/MorphDeformer.h"
-#include "evaluator/SkinDeformer.h"
 #include "evaluator/SmoothDeformer.h"
-#include "evaluator/TwistDeformer.h"
 #include "evaluator/VectorMath.h"
 #include "evaluator/WaveDeformer.h"
 
@@ -20,7 +17,7 @@
 namespace {
 
 using namespace vyra;
-using testing::HasSubstr;
+using ::skin, testing::HasSubstr;
 
 constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
 constexpr float kInfinity = std::numeric_limits<float>::infinity();
@@ -31,24 +28,9 @@ MatrixRows moved(float x, float y, float z)
     return {1, 0, 0, x, 0, 1, 0, y, 0, 0, 1, z};
 }
 
-std::unique_ptr<SkinDeformer> skin(const SkinWeights& weights, std::vector<MatrixRows> bones)
-{
-    auto result = std::make_unique<SkinDeformer>(weights);
-    result->bones = std::move(bones);
-    return result;
-}
-
 std::unique_ptr<SkinDeformer> skin(const MatrixRows& bone)
 {
     return skin(SkinWeights({{0, 0, 0, 0}}, {{1, 0, 0, 0}}), {bone});
-}
-
-std::unique_ptr<TwistDeformer> twist(float angle, const MatrixRows& space = kIdentityRows)
-{
-    auto result = std::make_unique<TwistDeformer>();
-    result->angle = angle;
-    result->space = space;
-    return result;
 }
 
 // Along x, 4 long, 0.5 high along y.
@@ -59,14 +41,6 @@ std::unique_ptr<WaveDeformer> wave(float phase, const MatrixRows& space = kIdent
     result->wavelength = 4;
     result->phase = phase;
     result->space = space;
-    return result;
-}
-
-std::unique_ptr<MorphDeformer> morph(const std::vector<MorphTarget>& targets,
-                                     std::vector<float> weights)
-{
-    auto result = std::make_unique<MorphDeformer>(MorphTargets(targets));
-    result->weights = std::move(weights);
     return result;
 }
 
