@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <fstream>
 #include <sstream>
+#include <tuple>
 
 #include <QTemporaryDir>
 #include <gmock/gmock.h>
@@ -89,12 +90,7 @@ TEST(Verdicts, JudgeDependsOnGoalAndMeasurement)
         return Measurement{{}, {median, low, high}, {}, {}, byCount};
     };
     const Goal ratio = Goal::ratio(1.2);
-    const struct {
-        const char* description;
-        Goal goal;
-        Measurement measurement;
-        Verdict verdict;
-    } rows[] = {
+    const std::tuple<const char*, Goal, Measurement, Verdict> rows[] = {
         {"no goal", {}, ratios(5, 6, 7), Verdict::kReported},
         {"at the limit", ratio, ratios(1.1, 1.2, 1.9), Verdict::kMet},
         {"within, counts beyond", ratio, ratios(1.0, 1.1, 1.3, 1.5), Verdict::kMet},
@@ -107,8 +103,8 @@ TEST(Verdicts, JudgeDependsOnGoalAndMeasurement)
         {"time within", Goal::nanoseconds(1000), times(900, 800), Verdict::kMet},
         {"time beyond", Goal::nanoseconds(1000), times(1100, 800), Verdict::kMissed},
     };
-    for (const auto& row : rows)
-        EXPECT_EQ(judge(row.goal, row.measurement), row.verdict) << row.description;
+    for (const auto& [description, goal, measurement, verdict] : rows)
+        EXPECT_EQ(judge(goal, measurement), verdict) << description;
 }
 
 std::vector<GroupResult> someResults(double ratio)

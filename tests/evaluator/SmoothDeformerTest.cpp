@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <cmath>
 #include <numbers>
+#include <tuple>
 
 #include <gtest/gtest.h>
 
@@ -134,11 +135,8 @@ TEST(SmoothDeformer, InvalidMeshesHaveDefinedResults)
     const Vector3 c{0, 0, -2};
     const Vector3 away{9, 9, 9};
     const Vector3 tilted{0.6f, 0.8f, 0};
-    const struct {
-        const char* name;
-        MeshGeometry mesh;
-        Vector3 position, normal; // of vertex 0, whose normal at rest is tilted
-    } rows[] = {
+    // The position and the normal are those of vertex 0, whose normal at rest is tilted.
+    const std::tuple<const char*, MeshGeometry, Vector3, Vector3> rows[] = {
         {"no triangle", meshOf({a, b, c}, {}), a, tilted},
         {"triangle with a corner twice", meshOf({a, b, a}, {0, 1, 2, 0, 0, 1}), a, tilted},
         {"one triangle", meshOf({a, b, c}, {0, 1, 2}), {0.25f, 0, -0.25f}, kUp},
@@ -158,14 +156,14 @@ TEST(SmoothDeformer, InvalidMeshesHaveDefinedResults)
          {}},
         {"vertex of no triangle", meshOf({away, a, b, c}, {1, 2, 3}), away, tilted},
     };
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.name);
-        MeshGeometry mesh = row.mesh;
+    for (const auto& [name, given, position, normal] : rows) {
+        SCOPED_TRACE(name);
+        MeshGeometry mesh = given;
         mesh.rest.normals[0] = tilted;
         const Surface surface = smoothed(mesh, mesh.rest, 1, 0.25f);
-        expectNear(surface.positions[0], row.position);
-        if (length(wide(row.normal)) > 0)
-            expectNear(surface.normals[0], row.normal);
+        expectNear(surface.positions[0], position);
+        if (length(wide(normal)) > 0)
+            expectNear(surface.normals[0], normal);
         EXPECT_NEAR(length(wide(surface.normals[0])), 1, kTolerance);
     }
 }

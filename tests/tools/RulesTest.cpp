@@ -6,6 +6,8 @@
 #include "tools/info/rules/Variables.h"
 #include "tools/info/rules/Verdicts.h"
 
+#include <tuple>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -108,14 +110,8 @@ TEST(Decisions, SyncModeReportsReasonAndVariable)
     constexpr auto kImplicit = TopenCLInfo::kGraphicsToCLImplicit;
     constexpr auto kExplicit = TopenCLInfo::kGraphicsToCLExplicit;
     constexpr auto kFinish = TopenCLInfo::kGraphicsToCLFinish;
-    const struct {
-        const char* extensions;
-        bool syncObjects;
-        int requested;
-        TopenCLInfo::GraphicsToCLSyncMode mode;
-        const char* reason;
-        bool byVariable;
-    } rows[] = {
+    using Mode = TopenCLInfo::GraphicsToCLSyncMode;
+    const std::tuple<const char*, bool, int, Mode, const char*, bool> rows[] = {
         {kEvent, true, 0, kImplicit, "lists", false},
         {"", true, 0, kExplicit, "OpenGL has GL_ARB_sync", false},
         {"", false, 0, kFinish, "OpenGL lacks GL_ARB_sync", false},
@@ -124,16 +120,16 @@ TEST(Decisions, SyncModeReportsReasonAndVariable)
         {"", true, 1, kImplicit, "wrong pictures", true},
         {"", false, 2, kFinish, "does not support", false},
     };
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.reason);
+    for (const auto& [extensions, syncObjects, requested, mode, reason, byVariable] : rows) {
+        SCOPED_TRACE(reason);
         Diagnostics diagnostics = workingDiagnostics();
-        diagnostics.platforms[0].extensions = row.extensions;
-        diagnostics.renderer.syncObjects = row.syncObjects;
-        diagnostics.environment.syncModes.graphicsToCL = row.requested;
-        diagnostics.startUp.graphicsToCL = row.mode;
+        diagnostics.platforms[0].extensions = extensions;
+        diagnostics.renderer.syncObjects = syncObjects;
+        diagnostics.environment.syncModes.graphicsToCL = requested;
+        diagnostics.startUp.graphicsToCL = mode;
         const info::Decision decision = info::decideGraphicsToCL(diagnostics);
-        EXPECT_THAT(decision.reason, HasSubstr(row.reason));
-        EXPECT_EQ(!decision.variable.empty(), row.byVariable);
+        EXPECT_THAT(decision.reason, HasSubstr(reason));
+        EXPECT_EQ(!decision.variable.empty(), byVariable);
     }
 }
 
