@@ -8,14 +8,14 @@
 
 namespace {
 
-constexpr const char* variable = "VYRA_HOST_TEST_VARIABLE";
-constexpr std::int32_t defaultValue = -77;
+constexpr const char* kVariable = "VYRA_HOST_TEST_VARIABLE";
+constexpr std::int32_t kDefaultValue = -77;
 
 // Returns the value of the variable with this text.
 std::int32_t read(const char* text)
 {
-    setEnvironment(variable, text);
-    return TenvironmentVariable(variable).asInt32(defaultValue);
+    setEnvironment(kVariable, text);
+    return TenvironmentVariable(kVariable).asInt32(kDefaultValue);
 }
 
 TEST(Environment, AsInt32ReadsWholeIntegersOnly)
@@ -28,17 +28,17 @@ TEST(Environment, AsInt32ReadsWholeIntegersOnly)
     for (const char* text :
          {"", "  ", "4 2", "42x", "x42", "4.0", "0x10", "+", "-", "+-1", "--1", "++1", "- 1",
           "true", "2147483648", "-2147483649", "99999999999999999999"})
-        EXPECT_EQ(read(text), defaultValue) << text;
+        EXPECT_EQ(read(text), kDefaultValue) << text;
 }
 
 TEST(Environment, AsInt32ReturnsDefaultForMissingVariable)
 {
-    setEnvironment(variable, nullptr);
-    EXPECT_EQ(VyraGetEnv(variable), nullptr);
-    EXPECT_EQ(TenvironmentVariable(variable).asInt32(defaultValue), defaultValue);
+    setEnvironment(kVariable, nullptr);
+    EXPECT_EQ(VyraGetEnv(kVariable), nullptr);
+    EXPECT_EQ(TenvironmentVariable(kVariable).asInt32(kDefaultValue), kDefaultValue);
 #ifndef _WIN32 // setting the empty text removes a variable there
-    setEnvironment(variable, "");
-    EXPECT_STREQ(VyraGetEnv(variable), "");
+    setEnvironment(kVariable, "");
+    EXPECT_STREQ(VyraGetEnv(kVariable), "");
 #endif
 }
 

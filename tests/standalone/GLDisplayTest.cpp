@@ -30,6 +30,6 @@ TEST_P(GLDisplayTest, DisplayIsThatOfCurrentContext)
     }).join();
 }
 
-INSTANTIATE_TEST_SUITE_P(Contexts, GLDisplayTest, allGLKinds, nameOf);
+INSTANTIATE_TEST_SUITE_P(Contexts, GLDisplayTest, kAllGLKinds, nameOf);
 
 } // namespace

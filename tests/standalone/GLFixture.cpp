@@ -11,7 +11,7 @@ int argumentCount = 1;
 char programName[] = "vyra-host-gl-tests";
 char* arguments[] = {programName, nullptr};
 
-constexpr int windowTimeoutMs = 20'000;
+constexpr int kWindowTimeoutMs = 20'000;
 
 } // namespace
 
@@ -33,7 +33,7 @@ void GLTest::SetUp()
         fWindow = std::make_unique<QOpenGLWindow>();
         fWindow->resize(64, 64);
         fWindow->show();
-        if (!QTest::qWaitFor([this] { return fWindow->isValid(); }, windowTimeoutMs))
+        if (!QTest::qWaitFor([this] { return fWindow->isValid(); }, kWindowTimeoutMs))
             GTEST_SKIP() << "no OpenGL window on this display";
     } else {
         fSurface = std::make_unique<QOffscreenSurface>();

@@ -17,7 +17,7 @@
 using GLKind = std::tuple<std::string, bool>;
 
 // All kinds, to instantiate a test with, and their names.
-inline const auto allGLKinds = testing::Combine(
+inline const auto kAllGLKinds = testing::Combine(
     testing::Values(std::string("xcb_glx"), std::string("xcb_egl")), testing::Bool());
 std::string nameOf(const testing::TestParamInfo<GLKind>& info);
 

@@ -21,7 +21,7 @@ namespace {
 using namespace std::chrono_literals;
 using Clock = std::chrono::steady_clock;
 
-constexpr std::uint64_t aSecondNs = 1'000'000'000;
+constexpr std::uint64_t kOneSecondNs = 1'000'000'000;
 
 // Returns the result of `function`, run on a thread that has no OpenGL context.
 template <class Function>
@@ -59,7 +59,7 @@ protected:
 };
 
 using GLHostAnyContext = GLHostTest;
-INSTANTIATE_TEST_SUITE_P(Contexts, GLHostAnyContext, allGLKinds, nameOf);
+INSTANTIATE_TEST_SUITE_P(Contexts, GLHostAnyContext, kAllGLKinds, nameOf);
 
 TEST_P(GLHostAnyContext, ConstructorRegistersOnItsThreadUntilDestruction)
 {
@@ -83,7 +83,7 @@ TEST_P(GLHostAnyContext, FencesWorkAcrossThreads)
     gl().glFlush();
     const unsigned int waited = onForeignThread([ours] {
         table().glWaitSync(ours, 0, GL_TIMEOUT_IGNORED);
-        return table().glClientWaitSync(ours, GL_SYNC_FLUSH_COMMANDS_BIT, 10 * aSecondNs);
+        return table().glClientWaitSync(ours, GL_SYNC_FLUSH_COMMANDS_BIT, 10 * kOneSecondNs);
     });
     EXPECT_TRUE(isSignalled(waited)) << waited;
     onForeignThread([ours] { table().glDeleteSync(ours); });
@@ -93,7 +93,7 @@ TEST_P(GLHostAnyContext, FencesWorkAcrossThreads)
     const GLsync theirs = onForeignThread(makeFence);
     ASSERT_TRUE(isSync(theirs));
     table().glWaitSync(theirs, 0, GL_TIMEOUT_IGNORED);
-    EXPECT_TRUE(isSignalled(table().glClientWaitSync(theirs, 0, 10 * aSecondNs)));
+    EXPECT_TRUE(isSignalled(table().glClientWaitSync(theirs, 0, 10 * kOneSecondNs)));
     table().glDeleteSync(theirs);
     EXPECT_FALSE(isSync(theirs));
     EXPECT_EQ(gl().glGetError(), static_cast<GLenum>(GL_NO_ERROR));
@@ -191,7 +191,7 @@ TEST_P(GLHostOnce, SyncFromCLEventFollowsEvent)
     };
     // Deletes it too.
     const auto signals = [](GLsync sync) {
-        const bool isSignalledNow = isSignalled(table().glClientWaitSync(sync, 0, aSecondNs));
+        const bool isSignalledNow = isSignalled(table().glClientWaitSync(sync, 0, kOneSecondNs));
         table().glDeleteSync(sync);
         return isSignalledNow;
     };
