@@ -12,9 +12,7 @@
 #include <array>
 #include <atomic>
 #include <chrono>
-#include <cstdlib>
 #include <functional>
-#include <new>
 #include <span>
 #include <string_view>
 #include <thread>

@@ -4,7 +4,6 @@
 #include <array>
 #include <chrono>
 #include <thread>
-#include <utility>
 
 namespace {
 

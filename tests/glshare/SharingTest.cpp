@@ -146,16 +146,10 @@ void SharingTest::openGl()
     fGlEntries = fGl->entries();
 }
 
-bool SharingTest::isOn(const char* variable)
+bool SharingTest::isOn(const char* variable, bool byDefault)
 {
     const char* value = std::getenv(variable);
-    return value == nullptr || std::string_view(value) != "0";
-}
-
-bool SharingTest::isZeroCopy()
-{
-    const char* value = std::getenv("GLSHARE_ZERO_COPY");
-    return value != nullptr && std::string_view(value) == "1";
+    return value == nullptr ? byDefault : std::string_view(value) != "0";
 }
 
 std::string SharingTest::extensionsOf(cl_platform_id platform)

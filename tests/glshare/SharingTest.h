@@ -122,10 +122,10 @@ protected:
     // Makes an OpenGL context current and sets `fGlEntries`.
     virtual void openGl();
 
-    // Returns whether an environment variable of the layer is not 0.
-    static bool isOn(const char* variable);
+    // Returns whether an environment variable of the layer, if it is set, is not 0.
+    static bool isOn(const char* variable, bool byDefault = true);
     static bool offersGlEvent() { return isOn("GLSHARE_GL_EVENT"); }
-    static bool isZeroCopy();
+    static bool isZeroCopy() { return isOn("GLSHARE_ZERO_COPY", false); }
 
     static std::string extensionsOf(cl_platform_id platform);
 

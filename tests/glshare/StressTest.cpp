@@ -6,10 +6,8 @@
 
 #include <algorithm>
 #include <atomic>
-#include <cstdlib>
 #include <shared_mutex>
 #include <thread>
-#include <utility>
 
 namespace {
 

@@ -3,7 +3,6 @@
 #include "viewer/model/Pose.h"
 #include "viewer/opencl/Verification.h"
 
-#include <cmath>
 #include <limits>
 
 #include <gmock/gmock.h>
