@@ -48,7 +48,7 @@ TEST_F(BufferTest, OperationsMakeExactCalls)
         EXPECT_EQ(status, CL_SUCCESS);
         EXPECT_EQ(calls(), expected);
         EXPECT_EQ(buffer.capacityInBytes(), capacity);
-        EXPECT_EQ(deviceMemory(), capacity);
+        EXPECT_EQ(host().deviceMemory, capacity);
         EXPECT_EQ(buffer.mappedPointer() != nullptr, mapped);
     };
     expect(buffer.ensureBufferCapacity(0), 0, false, {});
@@ -149,7 +149,7 @@ TEST_F(BufferTest, CopiesAndWrappersShareMemoryAndEventOnly)
                                   "clCreateBuffer(context#1, 528, 65, null) = mem#2"}));
     }
     EXPECT_EQ(callsOf("clEnqueueUnmap"), Lines{});
-    EXPECT_EQ(deviceMemory(), kSize);
+    EXPECT_EQ(host().deviceMemory, kSize);
 }
 
 TEST_F(BufferTest, WritesPassWaitListAlwaysAndReadsOnlyWithCount)
@@ -239,7 +239,7 @@ TEST_F(BufferTest, FailedMappingKeepsCountedMemoryWithoutAddress)
     EXPECT_EQ(buffer.ensureBufferCapacity(kSize), CL_OUT_OF_RESOURCES);
     EXPECT_EQ(buffer.mappedPointer(), nullptr);
     EXPECT_NE(buffer.buffer().get(), nullptr);
-    EXPECT_EQ(deviceMemory(), kSize);
+    EXPECT_EQ(host().deviceMemory, kSize);
 }
 
 TEST_F(BufferTest, ConstructorsCreateMemoryAndCopiesShareIt)

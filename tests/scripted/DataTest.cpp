@@ -191,7 +191,7 @@ TEST_F(DataTest, PoolReturnsBestFitAndFirstOfEquals)
     // The latest released buffer of a size is the last one that is used again.
     expectBuffers({{1, "mem#4 of 50"}, {50, "mem#2 of 50"}, {0, "null of 0"}, {0, "mem#3 of 100"}});
     EXPECT_EQ(callsOf("clCreate"), Lines{});
-    EXPECT_EQ(deviceMemory(), 0U) << "memory of the pool is not counted";
+    EXPECT_EQ(host().deviceMemory, 0U) << "memory of the pool is not counted";
 }
 
 TEST_F(DataTest, PoolBufferHasRequestedDescriptor)

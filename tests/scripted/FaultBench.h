@@ -42,11 +42,6 @@ public:
     {
         return buffer->readBackDataFromGPU(queue(), CL_FALSE, 0, 8, fBytes.data(), 0, nullptr);
     }
-    int reset()
-    {
-        buffer->reset();
-        return static_cast<int>(buffer->capacityInBytes());
-    }
 
     // Creates a pool with one free buffer; with none if `bytes` is 0.
     void makePool(unsigned bytes)

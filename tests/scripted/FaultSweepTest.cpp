@@ -91,7 +91,7 @@ void FaultSweep::runWith(const Fault& fault, const Lines& functions)
         EXPECT_EQ(row.run(bench), fResult) << "retry";
     }
     EXPECT_EQ(runtime().balance(), before);
-    EXPECT_EQ(deviceMemory(), 0U);
+    EXPECT_EQ(host().deviceMemory, 0U);
     for (const std::string& note : runtime().takeMisuse())
         EXPECT_TRUE(row.prescribed.contains(note)) << note;
     warnings();
@@ -141,7 +141,7 @@ const Row kBufferRows[] = {
     {"UploadGrowsElsewhere", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.upload(8, 64); },
      {{kCreate, CL_INVALID_MEM_OBJECT}, {kWrite, kTheStatus}}, {{kCreate, 2}}, {kNoMemory}, true},
     {"ReadBack", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.readBack(); }, {{kRead, kTheStatus}}, {{kRead, 0}}},
-    {"Reset", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { return b.reset(); }, {}, {}, {}, true},
+    {"Reset", [](B& b) { b.makeBuffer(64, true); }, [](B& b) { b.buffer->reset(); return int(b.buffer->capacityInBytes()); }, {}, {}, {}, true},
     {"PoolCreates", [](B& b) { b.makePool(0); }, [](B& b) { return b.fromPool(64); }, {{kCreate, 0}}, {{kCreate, 0}}},
     {"PoolReuses", [](B& b) { b.makePool(64); }, [](B& b) { return b.fromPool(64); }, {}, {}, {}, true},
     {"DataMap", [](B& b) { b.makePool(64); }, [](B& b) { return b.mapTwice(); }},

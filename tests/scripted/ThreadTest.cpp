@@ -174,8 +174,7 @@ std::vector<cl_event> contentsOf(const ConcurrentEventList& list)
 
 bool beginsWith(const std::vector<cl_event>& whole, const std::vector<cl_event>& beginning)
 {
-    return beginning.size() <= whole.size() &&
-           std::equal(beginning.begin(), beginning.end(), whole.begin());
+    return std::ranges::mismatch(beginning, whole).in1 == beginning.end();
 }
 
 TEST(ConcurrentEventList, CopiesDuringAppendsGrowToAllEvents)

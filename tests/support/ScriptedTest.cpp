@@ -22,12 +22,6 @@ void keepWarning(const char* text)
     pendingWarnings.emplace_back(text);
 }
 
-void* opaque(std::uintptr_t number)
-{
-    // NOLINTNEXTLINE(performance-no-int-to-ptr): the host's handles are never dereferenced.
-    return reinterpret_cast<void*>(number);
-}
-
 } // namespace
 
 void onThreads(int count, const std::function<void(int)>& body)
@@ -77,7 +71,7 @@ void ScriptedTest::TearDown()
     Lines expected = leftByStart;
     expected.insert(expected.end(), fExpectedLeft.begin(), fExpectedLeft.end());
     EXPECT_EQ(runtime().balance(), expected) << "objects left alive";
-    EXPECT_EQ(deviceMemory(), 0U) << "memory that the library counts";
+    EXPECT_EQ(host().deviceMemory, 0U) << "memory that the library counts";
     EXPECT_EQ(runtime().takeMisuse(), fExpectedMisuse) << "misuse of the runtime";
     EXPECT_EQ(warnings(), Lines{}) << "warnings that the test did not read";
 }
@@ -89,8 +83,11 @@ bool ScriptedTest::startWatched()
         runtime().plan(fault);
     testing::internal::CaptureStderr();
     testing::internal::CaptureStdout();
-    const bool valid = TopenCLInfo::initialize(opaque(3), opaque(5), nullptr, arguments.usingDX,
-                                               arguments.usingGLCoreProfile, arguments.vendorId);
+    // NOLINTBEGIN(performance-no-int-to-ptr): the host's handles are never dereferenced.
+    const bool valid = TopenCLInfo::initialize(
+        reinterpret_cast<void*>(3), reinterpret_cast<void*>(5), nullptr, arguments.usingDX,
+        arguments.usingGLCoreProfile, arguments.vendorId);
+    // NOLINTEND(performance-no-int-to-ptr)
     printedError = testing::internal::GetCapturedStderr();
     printedOutput = testing::internal::GetCapturedStdout();
     leftByStart = runtime().balance();

@@ -32,11 +32,6 @@ HostScript& host();
 // Provides a resource window while the result exists.
 [[nodiscard]] std::shared_ptr<void> makeResourceWindow();
 
-inline std::size_t deviceMemory()
-{
-    return host().deviceMemory;
-}
-
 // Installs or removes the renderer's OpenGL function table.
 void installFunctionTable(bool syncObjects, bool syncFromCLEvent);
 void removeFunctionTable();
