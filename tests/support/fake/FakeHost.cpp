@@ -53,7 +53,6 @@ HostScript& host()
 
 using scripted::host;
 using scripted::log;
-using scripted::runtime;
 
 Zyl::Objects::AMemoryMonitor& Zyl::Objects::ObjModel::MemoryMonitor(unsigned int adapter)
 {
