@@ -150,7 +150,7 @@ TEST_F(EvaluatorKernelFileTest, OptionsSelectSeparatePrograms)
 }
 
 std::atomic<int> received = 0;
-const CLWarningSink receive = [](const char* /*text*/) { ++received; };
+const CLWarningSink kReceive = [](const char* /*text*/) { ++received; };
 
 TEST_F(EvaluatorKernelFileTest, SinkReplacedDuringBuildIsKeptAndCalledOnce)
 {
@@ -161,12 +161,12 @@ TEST_F(EvaluatorKernelFileTest, SinkReplacedDuringBuildIsKeptAndCalledOnce)
         const vyra::WarningCapture capture;
         CLInternalWarning("first");
         EXPECT_EQ(capture.text(), "first\n");
-        former = setCLWarningSink(receive);
+        former = setCLWarningSink(kReceive);
         CLInternalWarning("second");
     }
     EXPECT_EQ(warnings(), Lines{"first"});
     EXPECT_EQ(received, 1);
-    EXPECT_EQ(setCLWarningSink(former), receive) << "the host's new sink stayed installed";
+    EXPECT_EQ(setCLWarningSink(former), kReceive) << "the host's new sink stayed installed";
     CLInternalWarning("third"); // the former sink forwards to the host's
     {
         const vyra::WarningCapture capture;
@@ -181,7 +181,7 @@ TEST_F(EvaluatorKernelFileTest, ConcurrentCapturesKeepHostsWarnings)
 {
     constexpr int kThreads = 4;
     constexpr int kRounds = 2000;
-    setCLWarningSink(receive);
+    setCLWarningSink(kReceive);
     onThreads(kThreads, [](int thread) {
         for (int round = 0; round < kRounds; ++round) {
             std::optional<vyra::WarningCapture> capture;
@@ -192,7 +192,7 @@ TEST_F(EvaluatorKernelFileTest, ConcurrentCapturesKeepHostsWarnings)
         }
     });
     EXPECT_EQ(received, kThreads * kRounds);
-    EXPECT_EQ(setCLWarningSink(receive), receive);
+    EXPECT_EQ(setCLWarningSink(kReceive), kReceive);
 }
 
 } // namespace

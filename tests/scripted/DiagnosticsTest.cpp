@@ -86,8 +86,8 @@ TEST_F(WarningTest, WarningIsWholeOrEmptyWhenFormattingFails)
 }
 
 std::string lastText;
-const CLWarningSink keepText = [](const char* text) { lastText = text; };
-const CLWarningSink dropText = [](const char*) {};
+const CLWarningSink kKeepText = [](const char* text) { lastText = text; };
+const CLWarningSink kDropText = [](const char*) {};
 
 // Without the fixture, which replaces the built-in sink.
 TEST(WarningSink, BuiltInSinkWritesNothingAndNullRestoresIt)
@@ -95,11 +95,11 @@ TEST(WarningSink, BuiltInSinkWritesNothingAndNullRestoresIt)
     testing::internal::CaptureStderr();
     testing::internal::CaptureStdout();
     CLInternalWarning("before");
-    EXPECT_EQ(setCLWarningSink(keepText), nullptr) << "the built-in sink";
+    EXPECT_EQ(setCLWarningSink(kKeepText), nullptr) << "the built-in sink";
     CLInternalWarning("kept %d", 1);
     EXPECT_EQ(lastText, "kept 1");
-    EXPECT_EQ(setCLWarningSink(dropText), keepText);
-    EXPECT_EQ(setCLWarningSink(nullptr), dropText);
+    EXPECT_EQ(setCLWarningSink(kDropText), kKeepText);
+    EXPECT_EQ(setCLWarningSink(nullptr), kDropText);
     CLInternalWarning("after");
     EXPECT_EQ(setCLWarningSink(nullptr), nullptr);
     EXPECT_EQ(lastText, "kept 1");
@@ -111,7 +111,7 @@ TEST(WarningSink, BuiltInSinkWritesNothingAndNullRestoresIt)
 TEST(WarningSink, ConcurrentReplacementsReturnEachSinkOnce)
 {
     constexpr int kReplacements = 2'000'000; // of each thread
-    const std::array<CLWarningSink, 3> sinks = {nullptr, dropText, [](const char*) {}};
+    const std::array<CLWarningSink, 3> sinks = {nullptr, kDropText, [](const char*) {}};
     std::array<std::array<int, 3>, 3> returned{}; // by thread and sink
     const auto replace = [&](std::size_t thread) {
         for (int i = 0; i < kReplacements; ++i) {
