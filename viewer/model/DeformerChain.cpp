@@ -196,7 +196,7 @@ std::string chainText(const std::vector<DeformerChoice>& choices)
     for (const DeformerChoice& choice : choices) {
         text += (text.empty() ? "" : ", ") + choice.name;
         for (const auto& [name, value] : choice.parameters)
-            text += ':' + name + '=' + value;
+            text.append(":").append(name).append("=").append(value);
         text += choice.enabled ? "" : " (off)";
     }
     return text;
