@@ -24,8 +24,9 @@ public:
         using Value = typename List::value_type;
         static_assert(std::is_trivially_copyable_v<Value>);
         plain(list.size());
+        constexpr qsizetype kValueBytes = sizeof(Value);
         fBytes.append(reinterpret_cast<const char*>(list.data()),
-                      static_cast<qsizetype>(list.size() * sizeof(Value)));
+                      static_cast<qsizetype>(list.size()) * kValueBytes);
     }
 
     template <typename T, typename Transfer>
