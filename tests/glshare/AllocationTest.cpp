@@ -102,7 +102,7 @@ protected:
     // Repeats a call, and fails its first allocation, its second, and so on until none fails. If
     // `maySucceed`, allocations of callbacks may fail, which the call does not report.
     void failEachAllocation(const char* name, const Call& call, cl_int expected = CL_SUCCESS,
-                            bool maySucceed = false)
+                            bool maySucceed = false, int fewest = 1)
     {
         SCOPED_TRACE(name);
         EXPECT_EQ(call(), expected);
@@ -117,7 +117,7 @@ protected:
             if (!fHasFailed)
                 break;
         }
-        EXPECT_GT(std::exchange(fFailing, 0), 1) << "nothing was allocated";
+        EXPECT_GT(std::exchange(fFailing, 0), fewest) << "too few allocations";
     }
 
     // An information query that returns at most a Value.
@@ -231,7 +231,9 @@ TEST_F(AllocationTest, CommandsWithoutMemoryReturnOutOfHostMemory)
             EXPECT_EQ(readGl(fBuffer, fCount), from(value));
             return error;
         };
-        failEachAllocation(isRelease ? "release" : "acquire", call, CL_SUCCESS, true);
+        // A release reuses the memory of the acquire if the layer's thread has returned it by then.
+        failEachAllocation(isRelease ? "release" : "acquire", call, CL_SUCCESS, true,
+                           isRelease ? 0 : 1);
     }
 }
 
