@@ -1,7 +1,6 @@
 // The harness of the benchmarks. The bodies of the cases return made-up times; nothing is timed.
 #include "harness/InstructionCount.h"
 #include "harness/Report.h"
-#include "harness/Table.h"
 
 #include <algorithm>
 #include <fstream>
@@ -131,19 +130,6 @@ TEST(Results, TableMarksMissedGoalsAndThirdPartyBaselines)
     const QJsonValue json = toJson(RunDescription{}, results)["groups"][0]["cases"];
     EXPECT_EQ(json[1]["thirdParty"].toString(), "another");
     EXPECT_TRUE(json[0]["thirdParty"].isUndefined());
-}
-
-TEST(Table, WriteAlignsColumns)
-{
-    Table table({"name", "n"});
-    table.add({"a", "1"});
-    table.add({"long name", "12345"});
-    std::ostringstream output;
-    table.write(output);
-    EXPECT_EQ(output.str(), "| name      |     n |\n"
-                            "| --------- | ----: |\n"
-                            "| a         |     1 |\n"
-                            "| long name | 12345 |\n");
 }
 
 TEST(ResultFiles, ReadInstructionCountsReturnsCountPerOperationByCase)

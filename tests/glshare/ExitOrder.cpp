@@ -47,10 +47,19 @@ std::unique_ptr<TestObjects, void (*)(TestObjects*)> theOwner(nullptr, [](TestOb
     objects->closeCl();
 });
 
+// The number that a copy writes last; 0 before.
+const volatile cl_int* theLastOfCopy = nullptr;
+
 class ExitOrder : public SharingTest {
 protected:
-    // Large enough to be unmapped when it is freed.
-    ExitOrder() : SharingTest(std::size_t{1} << 18) {}
+    // The buffer is large enough to be unmapped when it is freed.
+    ExitOrder() : SharingTest(std::size_t{1} << 18)
+    {
+        std::atexit([] { // runs after the layer's exit handler
+            if (theLastOfCopy != nullptr && *theLastOfCopy == 0)
+                _exit(1);
+        });
+    }
 
     void SetUp() override
     {
@@ -98,6 +107,27 @@ TEST_F(ExitOrder, ExitWithPendingCommandsSucceeds)
     EXPECT_EQ(theObjects().queue.acquire(theObjects().memory, {gate}), CL_SUCCESS);
     EXPECT_EQ(theObjects().queue.release(theObjects().memory), CL_SUCCESS);
     clFlush(theObjects().queue);
+}
+
+TEST_F(ExitOrder, ExitWaitsForCopyInProgress)
+{
+    if (isZeroCopy())
+        GTEST_SKIP() << "nothing is copied";
+    constexpr std::size_t kCount = std::size_t{1} << 24; // copied in some milliseconds
+    const Queue& queue = theObjects().queue;
+    theObjects().memory = share(theObjects().context, makeGlBuffer(numbersFrom(1, kCount)));
+    auto* const copy = static_cast<volatile cl_int*>(
+        clEnqueueMapBuffer(queue, theObjects().memory, CL_TRUE, CL_MAP_READ | CL_MAP_WRITE, 0,
+                           kCount * sizeof(cl_int), 0, nullptr, nullptr, nullptr));
+    ASSERT_NE(copy, nullptr);
+    copy[0] = 0;
+    copy[kCount - 1] = 0;
+    EXPECT_EQ(queue.acquire(theObjects().memory), CL_SUCCESS);
+    clFlush(queue);
+    if (!becomesTrue([&] { return copy[0] != 0; }))
+        GTEST_SKIP() << "the runtime does not copy into mapped memory";
+    theLastOfCopy = copy + kCount - 1;
+    std::exit(HasFailure() ? 1 : 0);
 }
 
 // Acquires and releases until the process ends, on a thread without an OpenGL context.

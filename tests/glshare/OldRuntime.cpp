@@ -1,9 +1,32 @@
-// A test layer below glshare: a runtime of OpenCL 1.2 that rejects a null platform.
+// A test layer below glshare: a runtime of OpenCL 1.2 that rejects a null platform. It ends the
+// process when it is to destroy a context that glshare has not forgotten.
 #include "PassThroughLayer.h"
 
+#include <cstdio>
+#include <cstdlib>
+
 namespace {
+
 cl_icd_dispatch below;
+
+// Another thread may get the handle as soon as the context is destroyed.
+cl_int releaseContext(cl_context context)
+{
+    cl_uint references = 0;
+    std::size_t size = 0;
+    std::size_t sizeBelow = 0;
+    below.clGetContextInfo(context, CL_CONTEXT_REFERENCE_COUNT, sizeof references, &references,
+                           nullptr);
+    below.clGetContextInfo(context, CL_CONTEXT_PROPERTIES, 0, nullptr, &sizeBelow);
+    clGetContextInfo(context, CL_CONTEXT_PROPERTIES, 0, nullptr, &size); // asks glshare
+    if (references == 1 && size != sizeBelow) {
+        std::fputs("glshare has not forgotten a context that is destroyed\n", stderr);
+        std::abort();
+    }
+    return below.clReleaseContext(context);
 }
+
+} // namespace
 
 void changeTable(cl_icd_dispatch& table)
 {
@@ -19,5 +42,6 @@ void changeTable(cl_icd_dispatch& table)
         return platform == nullptr ? CL_INVALID_PLATFORM
                                    : below.clGetDeviceIDs(platform, type, capacity, devices, count);
     };
+    table.clReleaseContext = releaseContext;
     table.clSetContextDestructorCallback = nullptr;
 }

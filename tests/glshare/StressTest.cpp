@@ -47,6 +47,7 @@ protected:
             const Memory memory = share(context, fBuffer);
             if (noGlUse)
                 noGlUse.unlock();
+            EXPECT_NE(infoOf<cl_mem_flags>(clGetMemObjectInfo, memory, CL_MEM_FLAGS), 0U);
             if (i % 10 == 0)
                 useObject(queue, memory);
         }

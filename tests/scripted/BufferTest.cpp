@@ -136,6 +136,7 @@ TEST_F(BufferTest, CopiesAndWrappersShareMemoryAndEventOnly)
         TopenCLBuffer& itself = copy;
         copy = itself;
         EXPECT_EQ(calls(), (Lines{"clRetainMemObject(mem#1)", "clRetainEvent(event#1)"}));
+        copy.ensureBufferCapacity(65); // memory that is counted
         copy = buffer;
         EXPECT_EQ(copy.buffer().get(), buffer.buffer().get());
         EXPECT_EQ(copy.mappedPointer(), nullptr);
@@ -146,7 +147,7 @@ TEST_F(BufferTest, CopiesAndWrappersShareMemoryAndEventOnly)
         wrapper.ensureBufferCapacity(65);
         EXPECT_EQ(calls(), (Lines{"clReleaseMemObject(mem#1)", "clReleaseEvent(event#1)",
                                   "AddToDeviceMemory(65)",
-                                  "clCreateBuffer(context#1, 528, 65, null) = mem#2"}));
+                                  "clCreateBuffer(context#1, 528, 65, null) = mem#3"}));
     }
     EXPECT_EQ(callsOf("clEnqueueUnmap"), Lines{});
     EXPECT_EQ(host().deviceMemory, kSize);
@@ -188,6 +189,8 @@ TEST_F(BufferTest, UploadThatGrowsWaitsForWaitListFirst)
     const Lines elsewhere = calls();
     EXPECT_EQ(elsewhere.front(), "clWaitForEvents([event#1])");
     EXPECT_THAT(elsewhere.back(), ::testing::HasSubstr("mem#3, 0, 65, 4, host+0, [event#1])"));
+    upload(buffer, 0, 4, 1, &handle);
+    EXPECT_EQ(callsOf("clWait"), Lines{}) << "does not grow";
 }
 
 TEST_F(BufferTest, ReadBackChecksNeitherPermissionsNorCapacity)
@@ -228,8 +231,12 @@ TEST_F(BufferTest, WrappedBufferKeepsDescriptor)
     EXPECT_TRUE(wrapped.openCLDataBuffer() == data); // name and plug
     EXPECT_EQ(wrapped.capacityInBytes(), 120U);
     EXPECT_TRUE(wrapped.openCLDataBuffer().descriptor().isReadOnly());
-    const TopenCLDataBuffer large(Tplug(), TuniqueString(), {}, 65536, 65537, 7);
-    EXPECT_EQ(TopenCLBuffer(nullptr, 0, large).capacityInBytes(), 65536U) << "a 32-bit product";
+    const auto capacityOf = [](unsigned elementSize, unsigned count) {
+        const TopenCLDataBuffer row({}, TuniqueString(), {}, elementSize, count, 7);
+        return TopenCLBuffer(nullptr, 0, row).capacityInBytes();
+    };
+    EXPECT_EQ(capacityOf(65536, 65537), 65536U) << "a 32-bit product";
+    EXPECT_EQ(capacityOf(12, 0), 0U);
 }
 
 TEST_F(BufferTest, FailedMappingKeepsCountedMemoryWithoutAddress)

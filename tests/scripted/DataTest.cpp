@@ -40,7 +40,8 @@ protected:
 TEST_F(DataTest, DescriptorsAreEqualIfNameAndPlugAre)
 {
     const TopenCLDataBuffer data(describe(4));
-    const TopenCLDataBuffer same = makeData({kPlug, kName, Descriptor::kReadOnly, 12, 10, 99});
+    const TopenCLDataBuffer same({kPlug, kName, Descriptor::kReadOnly, 12, 10, 99}, makeMem(),
+                                 makeEvent());
     EXPECT_TRUE(data == same && !(data != same));
     for (const TopenCLDataBuffer& other :
          {TopenCLDataBuffer(describe(4, kOtherPlug)),
@@ -134,9 +135,9 @@ TEST_F(DataTest, DataMapKeepsOneBufferPerKey)
     TopenCLData copy(data);
     EXPECT_EQ(std::distance(copy.begin(), copy.end()), 2);
     EXPECT_EQ(runtime().references(Kind::kMem, copy.getData(kName, kPlug).buffer().get()), 2U);
-    for (std::uint64_t node = 10; node < 20; ++node) { // at any position of the map
+    for (std::uint64_t node = 10; node < 100; ++node) { // at any position of the map
         TopenCLData severalPlugs(copy);
-        severalPlugs.setData(kName, Tplug(node, 0), {});
+        severalPlugs.setData(TuniqueString(std::to_string(node).c_str()), Tplug(node, node), {});
         EXPECT_TRUE(severalPlugs.getSinglePlug() == Tplug::fsNULL);
     }
     data.setData(kName, kOtherPlug, makeData());

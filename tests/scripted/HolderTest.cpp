@@ -80,20 +80,23 @@ TEST_F(HolderTest, EventListBorrowsEventsInOrder)
         list.add(event);
     buffer.bufferReadyEvent() = events[0];
     calls();
-    list.add(buffer);
-    const AutoCLEventList copy(list);
     AutoCLEventList assigned;
-    assigned.add(events[2]);
-    assigned = copy;
+    for (int i = 0; i < 4; ++i)
+        assigned.add(buffer);
+    for (int i = 0; i < 3; ++i)
+        list.add(buffer);
+    const AutoCLEventList copy(list);
+    assigned = copy; // 5 events; the capacity grows from 4 to 6
     AutoCLEventList& itself = assigned;
     assigned = itself;
-    ASSERT_EQ(assigned.size(), 3U);
-    const std::vector<cl_event> expected{events[0].get(), events[2].get(), events[0].get()};
-    EXPECT_EQ(std::vector<cl_event>(assigned.array(), assigned.array() + 3), expected);
+    const cl_event first = events[0].get();
+    const std::vector<cl_event> expected{first, events[2].get(), first, first, first};
     const cl_event* storage = assigned.array();
+    EXPECT_EQ(std::vector<cl_event>(storage, storage + assigned.size()), expected);
     assigned = AutoCLEventList();
     EXPECT_EQ(assigned.array(), nullptr);
     assigned = copy;
+    assigned.add(buffer);
     EXPECT_EQ(assigned.array(), storage) << "sufficient storage is kept";
     EXPECT_EQ(calls(), Lines{}) << "lists count no references";
 }

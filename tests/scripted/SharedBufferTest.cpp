@@ -39,19 +39,19 @@ TEST_F(SharedBufferTest, EvaluationAcquiresOnceAndReleasesOnceAfterReportedEvent
 
     AutoCLObject<cl_event> acquired;
     EXPECT_EQ(manager().EnqueueAcquireSharedCLBuffer(nullptr, buffer, acquired.receive()), 0);
-    const cl_event events[] = {reported.get(), acquired.get()};
-    const cl_event* slot = manager().EnqueueReleaseBatchedSharedCLBuffer(2, events);
+    const cl_event events[] = {reported.get(), reported.get(), acquired.get()};
+    const cl_event* slot = manager().EnqueueReleaseBatchedSharedCLBuffer(3, events);
     EXPECT_EQ(manager().EnqueueReleaseBatchedSharedCLBuffer(3, nullptr), slot);
     EXPECT_EQ(calls(), (Lines{"clRetainEvent(event#2)", "clRetainEvent(event#1)",
-                              "clRetainEvent(event#2)"}));
+                              "clRetainEvent(event#1)", "clRetainEvent(event#2)"}));
     manager().PostEvaluate(kId);
-    EXPECT_EQ(
-        calls(),
-        (Lines{"clEnqueueReleaseGLObjects(queue#1, [" + list +
-                   "], [event#2, event#1, event#2]) = event#3",
-               "clReleaseEvent(event#2)", "clReleaseEvent(event#1)", "clReleaseEvent(event#2)",
-               "glCreateSyncFromCLeventARB(context#1, event#3, 0) = sync#2",
-               "glWaitSync(sync#2, 0, 18446744073709551615)", "glDeleteSync(sync#2)"}));
+    EXPECT_EQ(calls(),
+              (Lines{"clEnqueueReleaseGLObjects(queue#1, [" + list +
+                         "], [event#2, event#1, event#1, event#2]) = event#3",
+                     "clReleaseEvent(event#2)", "clReleaseEvent(event#1)",
+                     "clReleaseEvent(event#1)", "clReleaseEvent(event#2)",
+                     "glCreateSyncFromCLeventARB(context#1, event#3, 0) = sync#2",
+                     "glWaitSync(sync#2, 0, 18446744073709551615)", "glDeleteSync(sync#2)"}));
     EXPECT_EQ(runtime().name(*slot), "event#3");
 }
 

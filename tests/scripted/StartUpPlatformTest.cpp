@@ -111,7 +111,8 @@ TEST_P(StartUpAgain, InitializeAgainChangesAndPrintsNothing)
     const bool disabled = GetParam();
     if (disabled)
         setEnvironment("VYRA_DISABLE_OPENCL", "0");
-    EXPECT_EQ(start(), !disabled);
+    EXPECT_EQ(startWatched(), !disabled);
+    EXPECT_EQ(callsOf("cl").empty(), disabled);
     setEnvironment("VYRA_DISABLE_OPENCL", nullptr);
     testing::internal::CaptureStderr();
     EXPECT_EQ(TopenCLInfo::initialize(nullptr, nullptr, nullptr, true, false, 0x8086), !disabled);
